@@ -1,0 +1,25 @@
+// The console port: the C library's standard output and standard error of this process. They are not the
+// process's standard-handle slots: redirecting a slot never redirects what is written here.
+#pragma once
+
+#include <string_view>
+
+#include "install/platform/status.h"
+
+namespace kz7 {
+
+// Texts are written as they are, whole and uncut; a line feed ends a line in the host's own way. A reader
+// that is gone is a status, never a signal. One thread.
+class IConsole {
+public:
+    virtual ~IConsole() = default;
+
+    virtual Status writeOutput(std::string_view text) = 0;
+
+    // Flushes standard output first, so that both in one file keep their order.
+    virtual Status writeError(std::string_view text) = 0;
+
+    virtual Status flush() = 0;
+};
+
+}  // namespace kz7

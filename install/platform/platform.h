@@ -1,0 +1,42 @@
+// This machine's ports, built on first use: a run that only prints its usage creates nothing.
+#pragma once
+
+#include <memory>
+#include <string>
+
+#include "install/platform/console.h"
+#include "install/platform/debug_output.h"
+#include "install/platform/file_system.h"
+#include "install/platform/registry_store.h"
+#include "install/platform/service_manager.h"
+
+namespace kz7 {
+
+struct PlatformOptions {
+    std::string program;         // begins the lines that the platform itself writes on standard error
+    std::string stateDirectory;  // where an embedded store lives; empty: this user's usual place
+    bool readOnly = false;       // reads what is there, takes no writer's lock, creates nothing
+};
+
+// The references stay valid as long as the platform. One thread.
+class IPlatform {
+public:
+    virtual ~IPlatform() = default;
+
+    virtual IRegistryStore& registry() = 0;
+    virtual IServiceManager& services() = 0;
+    virtual IConsole& console() = 0;
+    virtual IDebugOutput& debugOutput() = 0;
+    virtual IFileSystem& files() = 0;
+
+    // The store's name for people: the file it is kept in, or the machine's registry.
+    virtual std::string storeName() = 0;
+};
+
+std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options);
+
+// The number a process exits with for a status. Where the host keeps only 8 bits of it, a failure whose
+// low 8 bits are 0 exits with 1, so that it is never read as success.
+int hostExitCode(Status status);
+
+}  // namespace kz7

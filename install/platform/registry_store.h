@@ -1,0 +1,109 @@
+// The registry port: a tree of keys with typed values. One operation for each platform call that the
+// flows make; nothing here prints, retries or substitutes.
+#pragma once
+
+#include <cstdint>
+#include <string_view>
+
+#include "install/platform/buffer.h"
+#include "install/platform/owned_handle.h"
+#include "install/platform/status.h"
+
+namespace kz7 {
+
+// An open key, or one of the roots, which are always open.
+enum class KeyHandle : std::uint64_t {
+    none = 0,
+    currentUser = 0x80000001,
+    localMachine = 0x80000002,
+    users = 0x80000003,
+};
+
+// Rights a key is opened with; the numbers are the platform's.
+using AccessMask = std::uint32_t;
+// clang-format off
+inline constexpr AccessMask kKeyQueryValue       = 0x00001;
+inline constexpr AccessMask kKeySetValue         = 0x00002;
+inline constexpr AccessMask kKeyCreateSubkey     = 0x00004;
+inline constexpr AccessMask kKeyEnumerateSubkeys = 0x00008;
+inline constexpr AccessMask kKeyView64           = 0x00100;
+inline constexpr AccessMask kKeyView32           = 0x00200;  // addresses the Wow6432Node path of the key
+inline constexpr AccessMask kKeyCopyTarget       = 0x20007;
+inline constexpr AccessMask kKeyRead             = 0x20019;
+inline constexpr AccessMask kKeyReadSet          = 0x2001B;
+inline constexpr AccessMask kKeyFull             = 0xF003F;
+// clang-format on
+
+enum class ValueType : std::uint32_t {
+    none = 0,
+    sz = 1,
+    expandSz = 2,
+    binary = 3,
+    dword = 4,
+    multiSz = 7,
+    qword = 11,
+};
+
+inline constexpr std::uint32_t kMaxKeyName = 255;      // characters of one key name
+inline constexpr std::uint32_t kMaxValueName = 16383;  // characters of a value name
+
+// Paths are narrow texts below a key, parts separated by backslashes; the empty path is the key itself.
+// Names keep their case and compare without it (ASCII). Subkeys enumerate in the order of their
+// upper-cased names, values in the order they were first set; the first spelling of a name is kept.
+// Outputs are written on success only, but for Buffer::size, which kMoreData fills.
+//
+// Common results: kFileNotFound no such key or value; kAccessDenied a right that the handle was not
+// opened with; kInvalidHandle not an open key; kKeyDeleted the key behind the handle was deleted;
+// kInvalidParameter a key name over 255 or a value name over 16,383 characters; any other number is a
+// fault of the store itself. One store belongs to one thread.
+class IRegistryStore {
+public:
+    virtual ~IRegistryStore() = default;
+
+    // Opens an existing key. The caller closes `key`.
+    virtual Status openKey(KeyHandle parent, std::string_view path, AccessMask access, KeyHandle& key) = 0;
+
+    // Opens a key, creating it and its missing parents; `keyClass` is given to a key that is created and
+    // otherwise ignored. The caller closes `key`.
+    virtual Status createKey(KeyHandle parent, std::string_view path, std::string_view keyClass, AccessMask access,
+                             KeyHandle& key) = 0;
+
+    // kInvalidHandle for one that is not open; closing a root does nothing.
+    virtual Status closeKey(KeyHandle key) = 0;
+
+    // Reads a value's type (where asked for) and its bytes as stored. kMoreData: `data` is too small, its
+    // size tells the bytes needed and its content is not to be read.
+    virtual Status queryValue(KeyHandle key, std::string_view name, ValueType* type, Buffer& data) = 0;
+
+    // Stores exactly the bytes given. The empty name is the key's default value.
+    virtual Status setValue(KeyHandle key, std::string_view name, ValueType type, std::string_view data) = 0;
+
+    virtual Status deleteValue(KeyHandle key, std::string_view name) = 0;
+
+    // The index-th subkey's name, NUL-terminated, and its class where `keyClass` is given. kNoMoreItems
+    // past the last; kMoreData when the name or the class with its NUL does not fit.
+    virtual Status enumerateKey(KeyHandle key, std::uint32_t index, Buffer& name, Buffer* keyClass) = 0;
+
+    // The index-th value's name, NUL-terminated; its type and bytes where `type` and `data` are given.
+    // kNoMoreItems past the last; kMoreData when the name with its NUL or the data does not fit, `data`
+    // then tells the bytes needed.
+    virtual Status enumerateValue(KeyHandle key, std::uint32_t index, Buffer& name, ValueType* type, Buffer* data) = 0;
+
+    // Deletes a key and its values. kAccessDenied: it has subkeys. `view` is 0 or one of the view bits.
+    // Handles that are open on it stay and answer kKeyDeleted.
+    virtual Status deleteKey(KeyHandle parent, std::string_view path, AccessMask view) = 0;
+
+    // A mark of the flow: what was done since the last one is now to be seen by others, and whole. Success
+    // means that it is on disk; on failure nothing of it is. Without marks a store may drop the changes.
+    virtual Status commit() = 0;
+};
+
+struct KeyTraits {
+    using Port = IRegistryStore;
+    using Handle = KeyHandle;
+    static constexpr Handle kNone = KeyHandle::none;
+    static void close(Port& port, Handle key) { port.closeKey(key); }
+};
+using OwnedKey = OwnedHandle<KeyTraits>;
+
+}  // namespace kz7

@@ -1,0 +1,84 @@
+// The service port: the machine's service manager, one operation for each call that can fail on its own.
+#pragma once
+
+#include <cstdint>
+#include <string_view>
+
+#include "install/platform/owned_handle.h"
+#include "install/platform/status.h"
+
+namespace kz7 {
+
+// The manager or one service, open; they are closed alike.
+enum class ServiceHandle : std::uint64_t { none = 0 };
+
+inline constexpr std::uint32_t kServiceManagerAllAccess = 0xF003F;
+inline constexpr std::uint32_t kServiceAllAccess = 0xF01FF;
+inline constexpr std::uint32_t kServiceQueryStatus = 0x0004;
+
+inline constexpr std::uint32_t kServiceOwnProcess = 0x10;
+inline constexpr std::uint32_t kServiceErrorNormal = 1;
+
+enum class ServiceStart : std::uint32_t { automatic = 2, demand = 3, disabled = 4 };
+
+enum class ServiceState : std::uint32_t {
+    stopped = 1,
+    startPending = 2,
+    stopPending = 3,
+    running = 4,
+};
+
+// A service that runs as LocalSystem in a process of its own, without load order group or dependencies.
+struct ServiceDefinition {
+    std::string_view name;
+    std::string_view displayName;
+    std::string_view programPath;  // stored as it stands, without quotation marks around it
+    std::uint32_t type = kServiceOwnProcess;
+    ServiceStart start = ServiceStart::automatic;
+    std::uint32_t errorControl = kServiceErrorNormal;
+};
+
+// Every handle given out is the caller's to close. Outputs are written on success only. Service names
+// compare without case (ASCII). Common results: kServiceDoesNotExist, kAccessDenied, kInvalidHandle,
+// kServiceMarkedForDelete for a service that was deleted while the handle was open. One thread.
+class IServiceManager {
+public:
+    virtual ~IServiceManager() = default;
+
+    virtual Status openManager(std::uint32_t access, ServiceHandle& manager) = 0;
+
+    // kServiceExists: there is one of that name. kDuplicateServiceName: its display name is taken.
+    virtual Status createService(ServiceHandle manager, const ServiceDefinition& definition,
+                                 ServiceHandle& service) = 0;
+
+    virtual Status openService(ServiceHandle manager, std::string_view name, std::uint32_t access,
+                               ServiceHandle& service) = 0;
+
+    // Sets the start type and leaves everything else of the service unchanged.
+    virtual Status changeStartType(ServiceHandle service, ServiceStart start) = 0;
+
+    // Starts without arguments. kServiceAlreadyRunning; kFileNotFound when the program is missing.
+    virtual Status startService(ServiceHandle service) = 0;
+
+    // Sends the stop control. kSuccess when the control was taken, which the platform's call reports as a
+    // non-zero result: whoever judges that raw result sees 1 for success and 0 for failure.
+    // kServiceNotActive when it does not run.
+    virtual Status stopService(ServiceHandle service) = 0;
+
+    virtual Status queryState(ServiceHandle service, ServiceState& state) = 0;
+
+    // Deletes the service; it is gone once its handles are closed.
+    virtual Status deleteService(ServiceHandle service) = 0;
+
+    virtual Status closeHandle(ServiceHandle handle) = 0;
+};
+
+struct ServiceTraits {
+    using Port = IServiceManager;
+    using Handle = ServiceHandle;
+    static constexpr Handle kNone = ServiceHandle::none;
+    static void close(Port& port, Handle handle) { port.closeHandle(handle); }
+};
+using OwnedService = OwnedHandle<ServiceTraits>;
+
+}  // namespace kz7

@@ -1,0 +1,63 @@
+// Narrow text as the whole system handles it: case folds in ASCII only, fixed buffers cut and always
+// terminate, and only the system's own message texts are ever patterns.
+#pragma once
+
+#include <cstdint>
+#include <cstring>
+#include <initializer_list>
+#include <string>
+#include <string_view>
+#include <variant>
+
+namespace kz7 {
+
+constexpr char foldUpper(char c) {
+    return c >= 'a' && c <= 'z' ? static_cast<char>(c - 'a' + 'A') : c;
+}
+
+// The text with ASCII letters in upper case; other bytes stay.
+std::string foldUpper(std::string_view text);
+
+bool equalsIgnoreCase(std::string_view left, std::string_view right);
+
+// A text kept in `Size` bytes, its terminator included. What does not fit is cut; the terminator never is.
+template <std::size_t Size>
+class FixedText {
+public:
+    FixedText() = default;
+    explicit FixedText(std::string_view text) { assign(text); }
+
+    // False when the text was cut.
+    bool assign(std::string_view text) {
+        length_ = 0;
+        return append(text);
+    }
+    bool append(std::string_view text) {
+        const std::size_t room = Size - 1 - length_;
+        const std::size_t taken = text.size() < room ? text.size() : room;
+        if (taken != 0) {
+            std::memmove(room_ + length_, text.data(), taken);
+        }
+        length_ += taken;
+        room_[length_] = '\0';
+        return taken == text.size();
+    }
+
+    std::string_view view() const { return {room_, length_}; }
+    const char* c_str() const { return room_; }
+    bool empty() const { return length_ == 0; }
+
+private:
+    char room_[Size] = {};
+    std::size_t length_ = 0;
+};
+
+// What stands in for a placeholder: %s takes a text, %d and %u a number (%d shows it signed, as the
+// messages always did with a status).
+using Insert = std::variant<std::string_view, std::uint32_t>;
+
+// The pattern with its placeholders replaced in order. Patterns are message texts of this system, never
+// foreign text; inserts are taken as they are. "%%" is a percent sign.
+std::string compose(std::string_view pattern, std::initializer_list<Insert> inserts);
+
+}  // namespace kz7
