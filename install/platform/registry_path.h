@@ -1,0 +1,31 @@
+// Key paths and names as every store of our own understands them. On Windows the system does this itself.
+#pragma once
+
+#include <string>
+#include <string_view>
+
+#include "install/platform/registry_store.h"
+
+namespace kz7 {
+
+// Takes the first name off `path`; runs of separators count as one. False when no name is left.
+bool takeName(std::string_view& path, std::string_view& name);
+
+// kSuccess, kBadPathname for a path that begins with a separator, kInvalidParameter for a name over 255
+// characters or a NUL in the path.
+Status checkKeyPath(std::string_view path);
+
+// kSuccess, or kInvalidParameter for more than 16,383 characters or a NUL.
+Status checkValueName(std::string_view name);
+
+// The plain path that `path` below `parent` stands for: the 32-bit view bit leads SOFTWARE of the machine
+// to its Wow6432Node, unless the path goes there already.
+std::string plainKeyPath(KeyHandle parent, std::string_view path, AccessMask access);
+
+// Gives a name to a lent buffer with its NUL: kMoreData when that does not fit.
+Status giveName(std::string_view name, Buffer& buffer);
+
+// Gives bytes to a lent buffer: kMoreData with the size needed when they do not fit.
+Status giveBytes(std::string_view bytes, Buffer& buffer);
+
+}  // namespace kz7
