@@ -13,9 +13,9 @@
 namespace kz7 {
 
 struct PlatformOptions {
-    std::string program;         // begins the lines that the platform itself writes on standard error
-    std::string stateDirectory;  // where an embedded store lives; empty: this user's usual place
-    bool readOnly = false;       // reads what is there, takes no writer's lock, creates nothing
+    std::string program;              // begins the lines that the platform itself writes on standard error
+    std::string stateDirectory = {};  // where an embedded store lives; empty: this user's usual place
+    bool readOnly = false;            // reads what is there, takes no writer's lock, creates nothing
 };
 
 // The references stay valid as long as the platform. One thread.

@@ -47,7 +47,8 @@ public:
 
     virtual Status openManager(std::uint32_t access, ServiceHandle& manager) = 0;
 
-    // kServiceExists: there is one of that name. kDuplicateServiceName: its display name is taken.
+    // kServiceExists: there is one of that name. kInvalidName: an empty name, one over 256 characters or with
+    // a slash of either kind. kDuplicateServiceName: its display name is taken, on a host that judges it.
     virtual Status createService(ServiceHandle manager, const ServiceDefinition& definition,
                                  ServiceHandle& service) = 0;
 

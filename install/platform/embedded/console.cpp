@@ -1,0 +1,31 @@
+#include "install/platform/embedded/console.h"
+
+#include <cerrno>
+#include <cstdio>
+
+namespace kz7 {
+namespace {
+
+Status write(std::FILE* stream, std::string_view text) {
+    if (std::fwrite(text.data(), 1, text.size(), stream) == text.size()) {
+        return kSuccess;
+    }
+    return errno == ENOSPC ? kDiskFull : kWriteFault;
+}
+
+}  // namespace
+
+Status EmbeddedConsole::writeOutput(std::string_view text) {
+    return write(stdout, text);
+}
+
+Status EmbeddedConsole::writeError(std::string_view text) {
+    flush();
+    return write(stderr, text);
+}
+
+Status EmbeddedConsole::flush() {
+    return std::fflush(stdout) == 0 ? kSuccess : kWriteFault;
+}
+
+}  // namespace kz7

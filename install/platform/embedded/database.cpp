@@ -1,0 +1,57 @@
+#include "install/platform/embedded/database.h"
+
+namespace kz7 {
+
+Query& Query::bind(std::int64_t number) {
+    if (error_ == SQLITE_OK) {
+        error_ = sqlite3_bind_int64(statement_, ++bound_, number);
+    }
+    return *this;
+}
+
+Query& Query::bind(std::string_view text) {
+    if (error_ == SQLITE_OK) {
+        error_ = sqlite3_bind_text64(statement_, ++bound_, text.empty() ? "" : text.data(), text.size(), SQLITE_STATIC,
+                                     SQLITE_UTF8);
+    }
+    return *this;
+}
+
+Query& Query::bindBytes(std::string_view bytes) {
+    if (error_ == SQLITE_OK) {
+        error_ =
+            sqlite3_bind_blob64(statement_, ++bound_, bytes.empty() ? "" : bytes.data(), bytes.size(), SQLITE_STATIC);
+    }
+    return *this;
+}
+
+int Query::step() {
+    return error_ == SQLITE_OK ? sqlite3_step(statement_) : error_;
+}
+
+std::string_view Query::bytes(int column) const {
+    const void* data = sqlite3_column_blob(statement_, column);
+    const int size = sqlite3_column_bytes(statement_, column);
+    return data == nullptr ? std::string_view{}
+                           : std::string_view(static_cast<const char*>(data), static_cast<std::size_t>(size));
+}
+
+int execute(sqlite3* connection, const char* sql) {
+    return sqlite3_exec(connection, sql, nullptr, nullptr, nullptr);
+}
+
+int queryNumber(sqlite3* connection, const char* sql, std::int64_t& number) {
+    sqlite3_stmt* prepared = nullptr;
+    int result = sqlite3_prepare_v2(connection, sql, -1, &prepared, nullptr);
+    const Statement owner(prepared);
+    if (result == SQLITE_OK) {
+        result = sqlite3_step(prepared);
+    }
+    if (result != SQLITE_ROW) {
+        return result == SQLITE_DONE ? SQLITE_ERROR : result;
+    }
+    number = sqlite3_column_int64(prepared, 0);
+    return SQLITE_OK;
+}
+
+}  // namespace kz7

@@ -1,0 +1,19 @@
+#include "install/platform/embedded/debug_output.h"
+
+#include <cstdlib>
+#include <string>
+
+namespace kz7 {
+
+EmbeddedDebugOutput::EmbeddedDebugOutput(IConsole& console) : console_(console) {
+    const char* asked = std::getenv("KZ7_DEBUG");
+    shown_ = asked != nullptr && std::string_view(asked) == "1";
+}
+
+void EmbeddedDebugOutput::write(std::string_view text) {
+    if (shown_) {
+        console_.writeError("debug: " + std::string(text) + "\n");
+    }
+}
+
+}  // namespace kz7

@@ -1,0 +1,106 @@
+// The registry port on an embedded SQLite store. Everything between two marks is one transaction, begun as
+// a writer before the first read: what a flow reads decides what it deletes.
+#pragma once
+
+#include <array>
+#include <functional>
+#include <string>
+#include <vector>
+
+#include "install/platform/embedded/database.h"
+#include "install/platform/embedded/store_file.h"
+#include "install/platform/registry_store.h"
+
+namespace kz7 {
+
+class EmbeddedRegistry final : public IRegistryStore {
+public:
+    // Told once for each fault of the store, before the operation that met it returns.
+    using FaultListener = std::function<void(const StoreFault&)>;
+
+    // Opens nothing yet. A read-only store takes no writer's lock and makes nothing: one that is not there
+    // reads as empty.
+    EmbeddedRegistry(const std::string& directory, bool readOnly, FaultListener listener);
+    EmbeddedRegistry(const EmbeddedRegistry&) = delete;
+    EmbeddedRegistry& operator=(const EmbeddedRegistry&) = delete;
+
+    // What was not committed is dropped.
+    ~EmbeddedRegistry() override;
+
+    const std::string& path() const { return file_.path(); }
+
+    Status openKey(KeyHandle parent, std::string_view path, AccessMask access, KeyHandle& key) override;
+    Status createKey(KeyHandle parent, std::string_view path, std::string_view keyClass, AccessMask access,
+                     KeyHandle& key) override;
+    Status closeKey(KeyHandle key) override;
+    Status queryValue(KeyHandle key, std::string_view name, ValueType* type, Buffer& data) override;
+    Status setValue(KeyHandle key, std::string_view name, ValueType type, std::string_view data) override;
+    Status deleteValue(KeyHandle key, std::string_view name) override;
+    Status enumerateKey(KeyHandle key, std::uint32_t index, Buffer& name, Buffer* keyClass) override;
+    Status enumerateValue(KeyHandle key, std::uint32_t index, Buffer& name, ValueType* type, Buffer* data) override;
+    Status deleteKey(KeyHandle parent, std::string_view path, AccessMask view) override;
+    Status commit() override;
+
+private:
+    enum class Sql : std::size_t;
+    using KeyId = std::int64_t;
+
+    // Where an enumeration stands: `index` items lie before the mark. Kept as a name or number, never as an
+    // open cursor.
+    struct KeyPlace {
+        std::uint32_t index = 0;
+        std::string fold;  // empty: before the first
+    };
+    struct ValuePlace {
+        std::uint32_t index = 0;
+        std::int64_t place = 0;
+    };
+    struct OpenKey {
+        bool used = false;
+        bool deleted = false;
+        std::uint32_t generation = 0;  // how often the slot was given out
+        AccessMask access = 0;
+        KeyId id = 0;
+        std::uint64_t checkedIn = 0;  // the transaction that last saw the key exist
+        KeyPlace keys;
+        ValuePlace values;
+    };
+    // One name of the path that was followed last, so that the next one starts where they part.
+    struct Step {
+        std::string fold;
+        KeyId id;
+    };
+
+    Status begin();
+    Status fail(int result);
+    Status fail(const StoreFault& fault);
+    void endTransaction();
+    Query query(Sql which);
+
+    OpenKey* slotOf(KeyHandle handle);
+    KeyHandle giveOut(KeyId id, AccessMask access);
+    // The key behind a handle that has the rights needed. The pointer is good until the next key is given out.
+    Status keyOf(KeyHandle handle, AccessMask needed, OpenKey*& open);
+    Status currentUser(KeyId& id);
+    Status child(KeyId parent, std::string_view fold, KeyId& id);
+    Status addChild(KeyId parent, std::string_view name, std::string_view fold, std::string_view keyClass, KeyId& id);
+    Status find(KeyHandle parent, std::string_view path, AccessMask access, bool create, std::string_view keyClass,
+                KeyId& id);
+
+    StoreFile file_;
+    bool readOnly_;
+    FaultListener listener_;
+    // Before the statements: they must be gone when the connection closes.
+    Connection connection_;
+    std::array<Statement, 11> statements_;
+    Status fault_ = kSuccess;  // met in this transaction; every operation answers it until the next mark
+    bool inTransaction_ = false;
+    std::uint64_t transaction_ = 0;
+    std::int64_t logPages_ = 0;
+    std::vector<OpenKey> open_;  // the roots first
+    std::vector<std::uint32_t> free_;
+    std::vector<Step> lastPath_;  // below lastRoot_
+    KeyId lastRoot_ = 0;
+};
+
+}  // namespace kz7

@@ -1,0 +1,225 @@
+#include "install/platform/embedded/services.h"
+
+#include <array>
+
+namespace kz7 {
+namespace {
+
+constexpr std::string_view kServices = "SYSTEM\\CurrentControlSet\\Services\\";
+constexpr std::size_t kMaxServiceName = 256;
+
+constexpr std::string_view kStart = "Start";
+constexpr std::string_view kImagePath = "ImagePath";
+constexpr std::string_view kRunState = "CurrentState";  // a number of ServiceState; none: stopped
+
+std::string bytesOf(std::uint32_t number) {
+    std::string bytes(sizeof number, '\0');
+    for (char& byte : bytes) {
+        byte = static_cast<char>(number & 0xFF);
+        number >>= 8;
+    }
+    return bytes;
+}
+
+std::string terminated(std::string_view text) {
+    return std::string(text) + '\0';
+}
+
+}  // namespace
+
+EmbeddedServiceManager::EmbeddedServiceManager(IRegistryStore& registry, IFileSystem& files)
+    : registry_(registry), files_(files) {}
+
+ServiceHandle EmbeddedServiceManager::giveOut(std::string recordPath) {
+    std::size_t slot = 0;
+    while (slot < open_.size() && open_[slot].used) {
+        ++slot;
+    }
+    if (slot == open_.size()) {
+        open_.emplace_back();
+    }
+    open_[slot] = {true, std::move(recordPath)};
+    return static_cast<ServiceHandle>(slot + 1);
+}
+
+EmbeddedServiceManager::Open* EmbeddedServiceManager::slotOf(ServiceHandle handle) {
+    const auto number = static_cast<std::size_t>(handle);
+    return number == 0 || number > open_.size() || !open_[number - 1].used ? nullptr : &open_[number - 1];
+}
+
+Status EmbeddedServiceManager::managerOf(ServiceHandle handle) {
+    const Open* open = slotOf(handle);
+    return open == nullptr || !open->recordPath.empty() ? kInvalidHandle : kSuccess;
+}
+
+Status EmbeddedServiceManager::recordOf(ServiceHandle handle, AccessMask access, OwnedKey& record) {
+    const Open* open = slotOf(handle);
+    if (open == nullptr || open->recordPath.empty()) {
+        return kInvalidHandle;
+    }
+    const Status status = registry_.openKey(KeyHandle::localMachine, open->recordPath, access, record.receive());
+    return isNotFound(status) ? kServiceMarkedForDelete : status;
+}
+
+Status EmbeddedServiceManager::openManager(std::uint32_t, ServiceHandle& manager) {
+    manager = giveOut({});
+    return kSuccess;
+}
+
+Status EmbeddedServiceManager::createService(ServiceHandle manager, const ServiceDefinition& definition,
+                                             ServiceHandle& service) {
+    if (const Status status = managerOf(manager); status != kSuccess) {
+        return status;
+    }
+    if (definition.name.empty() || definition.name.size() > kMaxServiceName ||
+        definition.name.find_first_of("/\\") != std::string_view::npos) {
+        return kInvalidName;
+    }
+    const std::string path = std::string(kServices) + std::string(definition.name);
+    OwnedKey record(registry_);
+    Status status = registry_.openKey(KeyHandle::localMachine, path, kKeyQueryValue, record.receive());
+    if (status == kSuccess) {
+        return kServiceExists;
+    }
+    if (isNotFound(status)) {
+        status = registry_.createKey(KeyHandle::localMachine, path, {}, kKeyFull, record.receive());
+    }
+    struct Row {
+        std::string_view name;
+        ValueType type;
+        std::string data;
+    };
+    const std::array rows = {
+        Row{"Type", ValueType::dword, bytesOf(definition.type)},
+        Row{kStart, ValueType::dword, bytesOf(static_cast<std::uint32_t>(definition.start))},
+        Row{"ErrorControl", ValueType::dword, bytesOf(definition.errorControl)},
+        Row{kImagePath, ValueType::expandSz, terminated(definition.programPath)},
+        Row{"DisplayName", ValueType::sz, terminated(definition.displayName)},
+        Row{"ObjectName", ValueType::sz, terminated("LocalSystem")},
+    };
+    for (const Row& row : rows) {
+        if (status == kSuccess) {
+            status = registry_.setValue(record.get(), row.name, row.type, row.data);
+        }
+    }
+    if (status == kSuccess) {
+        service = giveOut(path);
+    }
+    return status;
+}
+
+Status EmbeddedServiceManager::openService(ServiceHandle manager, std::string_view name, std::uint32_t,
+                                           ServiceHandle& service) {
+    if (const Status status = managerOf(manager); status != kSuccess) {
+        return status;
+    }
+    if (name.empty() || name.find_first_of("/\\") != std::string_view::npos) {
+        return kInvalidName;
+    }
+    const std::string path = std::string(kServices) + std::string(name);
+    OwnedKey record(registry_);
+    const Status status = registry_.openKey(KeyHandle::localMachine, path, kKeyQueryValue, record.receive());
+    if (status != kSuccess) {
+        return isNotFound(status) ? kServiceDoesNotExist : status;
+    }
+    service = giveOut(path);
+    return kSuccess;
+}
+
+Status EmbeddedServiceManager::changeStartType(ServiceHandle service, ServiceStart start) {
+    OwnedKey record(registry_);
+    const Status status = recordOf(service, kKeySetValue, record);
+    return status != kSuccess
+               ? status
+               : registry_.setValue(record.get(), kStart, ValueType::dword, bytesOf(static_cast<std::uint32_t>(start)));
+}
+
+Status EmbeddedServiceManager::state(KeyHandle record, ServiceState& state) {
+    FixedBuffer<4> number;
+    const Status status = registry_.queryValue(record, kRunState, nullptr, number);
+    if (status != kSuccess && !isNotFound(status) && status != kMoreData) {
+        return status;
+    }
+    state = status == kSuccess && number.view() == bytesOf(static_cast<std::uint32_t>(ServiceState::running))
+                ? ServiceState::running
+                : ServiceState::stopped;
+    return kSuccess;
+}
+
+Status EmbeddedServiceManager::startService(ServiceHandle service) {
+    OwnedKey record(registry_);
+    ServiceState now{};
+    Status status = recordOf(service, kKeyQueryValue | kKeySetValue, record);
+    if (status == kSuccess) {
+        status = state(record.get(), now);
+    }
+    if (status != kSuccess) {
+        return status;
+    }
+    if (now == ServiceState::running) {
+        return kServiceAlreadyRunning;
+    }
+    FixedBuffer<1024> program;
+    status = registry_.queryValue(record.get(), kImagePath, nullptr, program);
+    if (status == kSuccess) {
+        status = files_.probe(program.text());
+    }
+    return status != kSuccess ? status
+                              : registry_.setValue(record.get(), kRunState, ValueType::dword,
+                                                   bytesOf(static_cast<std::uint32_t>(ServiceState::running)));
+}
+
+Status EmbeddedServiceManager::stopService(ServiceHandle service) {
+    OwnedKey record(registry_);
+    ServiceState now{};
+    Status status = recordOf(service, kKeyQueryValue | kKeySetValue, record);
+    if (status == kSuccess) {
+        status = state(record.get(), now);
+    }
+    if (status != kSuccess) {
+        return status;
+    }
+    return now == ServiceState::running ? registry_.deleteValue(record.get(), kRunState) : kServiceNotActive;
+}
+
+Status EmbeddedServiceManager::queryState(ServiceHandle service, ServiceState& state) {
+    OwnedKey record(registry_);
+    const Status status = recordOf(service, kKeyQueryValue, record);
+    return status != kSuccess ? status : this->state(record.get(), state);
+}
+
+Status EmbeddedServiceManager::deleteRecord(const std::string& path) {
+    Status status = registry_.deleteKey(KeyHandle::localMachine, path, 0);
+    while (status == kAccessDenied) {
+        OwnedKey record(registry_);
+        FixedBuffer<kMaxKeyName + 1> below;
+        status = registry_.openKey(KeyHandle::localMachine, path, kKeyEnumerateSubkeys, record.receive());
+        if (status == kSuccess) {
+            status = registry_.enumerateKey(record.get(), 0, below, nullptr);
+        }
+        if (status == kSuccess) {
+            status = deleteRecord(path + '\\' + std::string(below.view()));
+        }
+        if (status == kSuccess) {
+            status = registry_.deleteKey(KeyHandle::localMachine, path, 0);
+        }
+    }
+    return status;
+}
+
+Status EmbeddedServiceManager::deleteService(ServiceHandle service) {
+    OwnedKey record(registry_);
+    const Status status = recordOf(service, kKeyQueryValue, record);
+    return status != kSuccess ? status : deleteRecord(slotOf(service)->recordPath);
+}
+
+Status EmbeddedServiceManager::closeHandle(ServiceHandle handle) {
+    Open* open = slotOf(handle);
+    if (open == nullptr) {
+        return kInvalidHandle;
+    }
+    *open = {};
+    return kSuccess;
+}
+
+}  // namespace kz7

@@ -1,0 +1,49 @@
+// The service port as records in the registry, where the machine's own service manager keeps them, so that
+// a service is seen with the same tools as the rest. No process is started for a service: its run state is
+// a value of its record.
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "install/platform/file_system.h"
+#include "install/platform/registry_store.h"
+#include "install/platform/service_manager.h"
+
+namespace kz7 {
+
+class EmbeddedServiceManager final : public IServiceManager {
+public:
+    // Writes through the registry, in its transaction.
+    EmbeddedServiceManager(IRegistryStore& registry, IFileSystem& files);
+
+    Status openManager(std::uint32_t access, ServiceHandle& manager) override;
+    Status createService(ServiceHandle manager, const ServiceDefinition& definition, ServiceHandle& service) override;
+    Status openService(ServiceHandle manager, std::string_view name, std::uint32_t access,
+                       ServiceHandle& service) override;
+    Status changeStartType(ServiceHandle service, ServiceStart start) override;
+    Status startService(ServiceHandle service) override;
+    Status stopService(ServiceHandle service) override;
+    Status queryState(ServiceHandle service, ServiceState& state) override;
+    Status deleteService(ServiceHandle service) override;
+    Status closeHandle(ServiceHandle handle) override;
+
+private:
+    struct Open {
+        bool used = false;
+        std::string recordPath;  // empty: the manager
+    };
+
+    ServiceHandle giveOut(std::string recordPath);
+    Open* slotOf(ServiceHandle handle);
+    Status managerOf(ServiceHandle handle);
+    Status recordOf(ServiceHandle handle, AccessMask access, OwnedKey& record);
+    Status state(KeyHandle record, ServiceState& state);
+    Status deleteRecord(const std::string& path);
+
+    IRegistryStore& registry_;
+    IFileSystem& files_;
+    std::vector<Open> open_;
+};
+
+}  // namespace kz7

@@ -1,0 +1,56 @@
+#include "install/runtime/copy_name.h"
+
+#include "install/platform/text.h"
+
+namespace kz7 {
+namespace {
+
+constexpr std::string_view kCurrentName = "$CurrentInstallationName$";
+constexpr std::string_view kDefaultName = "$DefaultInstallationName$";
+
+// Deliberate: one buffer for the whole process; callers that pass no output of their own share it, and a
+// later call overwrites what an earlier one returned.
+FixedText<kSubstitutedSize> sharedOutput;
+
+// Copies a text into a caller's buffer, cut to its size and terminated.
+void copyOut(std::string_view text, std::uint32_t size, char* output) {
+    const std::size_t taken = text.substr(0, size - 1).copy(output, size - 1);
+    output[taken] = '\0';
+}
+
+}  // namespace
+
+std::string substituteCopyName(std::string_view text, std::string_view copyName) {
+    const std::string_view token = text.find(kCurrentName) != std::string_view::npos ? kCurrentName : kDefaultName;
+    std::string result;
+    std::size_t at = copyName.empty() ? std::string_view::npos : text.find(token);
+    while (at != std::string_view::npos) {
+        result.append(text.substr(0, at)).append(copyName);
+        text.remove_prefix(at + token.size());
+        at = text.find(token);
+    }
+    return result.append(text);
+}
+
+const char* iSubstituteCopyName(const char* text, const char* copyName, std::uint32_t outputSize, char* output) {
+    const std::string_view given = text;
+    // Deliberate: the room is judged before substituting, so a text that only its placeholder makes too long
+    // is refused; callers size their buffers by the template.
+    if (outputSize != 0 && given.size() + 1 > outputSize) {
+        return nullptr;
+    }
+    const FixedText<kSubstitutedSize> result(
+        substituteCopyName(given, copyName == nullptr ? std::string_view{} : copyName));
+    const bool same = result.view() == given;
+    if (outputSize != 0) {
+        copyOut(same ? given : result.view(), outputSize, output);
+        return same ? text : output;
+    }
+    if (same) {
+        return text;
+    }
+    sharedOutput = result;
+    return sharedOutput.c_str();
+}
+
+}  // namespace kz7

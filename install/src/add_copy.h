@@ -1,0 +1,29 @@
+// Adds one installed copy: its keys in both registry views and its management service.
+#pragma once
+
+#include <functional>
+#include <string>
+#include <string_view>
+
+#include "install/platform/registry_store.h"
+#include "install/platform/service_manager.h"
+#include "install/src/report.h"
+
+namespace kz7 {
+
+// Asks the product library of a location for its level, a dotted text such as "9.1.0.0"; empty when there is
+// none to be had.
+using LevelQuery = std::function<std::string(std::string_view location)>;
+
+struct CopyRequest {
+    std::string_view name;
+    std::string_view location;
+    bool isV9 = false;  // also names the copy as the default and by its level
+};
+
+// Returns the status of the step that failed; everything before it stays. The level is asked for with isV9
+// only. What was written is committed before the closing line.
+Status addCopy(IRegistryStore& registry, IServiceManager& services, Report& report, const LevelQuery& level,
+               const CopyRequest& request);
+
+}  // namespace kz7

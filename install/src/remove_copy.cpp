@@ -1,0 +1,43 @@
+#include "install/src/remove_copy.h"
+
+#include "install/runtime/copy_name.h"
+#include "install/src/copies/install_copy_list.h"
+#include "install/src/copy_layout.h"
+#include "install/src/registry_access.h"
+#include "install/src/services/management_service.h"
+
+namespace kz7 {
+namespace {
+
+// clang-format off
+constexpr std::string_view kNotFound = "The KZ7 Copy %s was not found\n";
+// Deliberate: no line feed; installers match the output to its end.
+constexpr std::string_view kRemoved  = "The KZ7 Copy %s has been removed";
+// clang-format on
+
+}  // namespace
+
+Status removeCopy(IRegistryStore& registry, IServiceManager& services, IDebugOutput& debug, Report& report,
+                  const char* copyName) {
+    InstallCopyList copies(registry, debug, false, false);
+    if (copies.findByName(copyName) == nullptr) {
+        report.line(kNotFound, {std::string_view(copyName)});
+        return kMissingItem;
+    }
+    // Deliberate: a list that could not be read whole counts like the last copy, and the whole product goes.
+    // The copy's 32-bit key and the values that name it stay.
+    if (copies.status() == 0 && copies.count() > 1) {
+        deleteTree(registry, KeyHandle::localMachine, layout::kCopy, 0, copyName, {});
+        registry.deleteKey(KeyHandle::localMachine, substituteCopyName(layout::kCopy, copyName), 0);
+    } else {
+        deleteTree(registry, KeyHandle::localMachine, layout::kProduct, 0, {}, {});
+    }
+    deleteServiceByName(services, managementServiceName(copyName).view());
+    if (const Status kept = registry.commit(); kept != kSuccess) {
+        return kept;
+    }
+    report.line(kRemoved, {std::string_view(copyName)});
+    return kSuccess;
+}
+
+}  // namespace kz7

@@ -1,0 +1,148 @@
+#include "install/src/services/management_service.h"
+
+#include <string>
+
+namespace kz7 {
+namespace {
+
+// clang-format off
+constexpr ErrorText kServiceManagerFailed  {1510, "Failed open the SCM - error code %d\n"};
+constexpr ErrorText kServiceOpenFailed     {1523, "Failed open the Service %s - error code %d\n"};
+constexpr ErrorText kStartTypeFailed       {1541, "Unable to update the start type of the service %s - error %d\n"};
+constexpr ErrorText kStartFailed           {1552, "Unable to start the service %s - error %d\n"};
+constexpr ErrorText kCreateManagerFailed   {1739, "Failed open the SCM - error code %d\n"};
+constexpr ErrorText kCreateFailed          {1775, "Failed to create service- error code %d\n"};
+constexpr ErrorText kEventLogKeyFailed     {1800, "Failed to create Event log registry key -error %d\n"};
+constexpr ErrorText kMessageFileFailed     {1816, "Failed to set EventMessageFile -error %d\n"};
+constexpr ErrorText kTypesFailed           {1838, "Failed to set TypesSupported -error %d\n"};
+
+constexpr std::string_view kNotStarted =
+    "The KZ7 Management service could not be started - some function not\n"
+    "yet ported to the new registry layout may not function properly\n";
+constexpr std::string_view kEventLogKey =
+    "SYSTEM\\CurrentControlSet\\Services\\EventLog\\Application\\KZ7 Management Service";
+// clang-format on
+
+using FilePath = FixedText<261>;
+
+// Deliberate: a location that ends in a backslash gets a second one; the stored paths have always had it.
+FilePath binPath(std::string_view location, std::string_view file) {
+    FilePath path(location);
+    path.append("\\bin\\");
+    path.append(file);
+    return path;
+}
+
+Status createService(IServiceManager& services, Report& report, std::string_view location, std::string_view copyName) {
+    OwnedService manager(services);
+    Status status = services.openManager(kServiceManagerAllAccess, manager.receive());
+    if (status != kSuccess) {
+        report.error(kCreateManagerFailed, {status});
+        return status;
+    }
+    const ServiceName name = managementServiceName(copyName);
+    const FixedText<1024> displayName(compose("KZ7 Management Service (%s)", {copyName}));
+    const FilePath program = binPath(location, "kz7mgmtsvc.exe");
+    OwnedService service(services);
+    status =
+        services.createService(manager.get(), {name.view(), displayName.view(), program.view()}, service.receive());
+    if (status != kSuccess && status != kServiceExists) {
+        report.error(kCreateFailed, {status});
+    }
+    return status;
+}
+
+Status registerEventSource(IRegistryStore& registry, Report& report, std::string_view location) {
+    OwnedKey key(registry);
+    Status status = registry.createKey(KeyHandle::localMachine, kEventLogKey, {}, kKeyFull, key.receive());
+    if (status != kSuccess) {
+        report.error(kEventLogKeyFailed, {status});
+        return status;
+    }
+    std::string messageFile(binPath(location, "kz7wint64.dll").view());
+    messageFile += '\0';
+    status = registry.setValue(key.get(), "EventMessageFile", ValueType::expandSz, messageFile);
+    if (status != kSuccess) {
+        report.error(kMessageFileFailed, {status});
+        return status;
+    }
+    status = registry.setValue(key.get(), "TypesSupported", ValueType::dword, std::string_view("\7\0\0\0", 4));
+    if (status != kSuccess) {
+        report.error(kTypesFailed, {status});
+    }
+    return status;
+}
+
+Status startService(IServiceManager& services, Report& report, std::string_view name) {
+    OwnedService manager(services);
+    OwnedService service(services);
+    Status status = services.openManager(kServiceManagerAllAccess, manager.receive());
+    if (status != kSuccess) {
+        report.error(kServiceManagerFailed, {status});
+        return status;
+    }
+    status = services.openService(manager.get(), name, kServiceAllAccess, service.receive());
+    if (status != kSuccess) {
+        report.error(kServiceOpenFailed, {name, status});
+    } else {
+        if (const Status changed = services.changeStartType(service.get(), ServiceStart::automatic);
+            changed != kSuccess) {
+            report.error(kStartTypeFailed, {name, changed});
+        }
+        status = services.startService(service.get());
+        if (status == kServiceAlreadyRunning) {
+            status = kSuccess;
+        }
+        if (status != kSuccess) {
+            report.error(kStartFailed, {name, status});
+        }
+    }
+    // Deliberate: the handles of a start stay open to the end of the process, which holds off a deletion of
+    // the service meanwhile.
+    service.leaveOpen();
+    manager.leaveOpen();
+    return status;
+}
+
+}  // namespace
+
+ServiceName managementServiceName(std::string_view copyName) {
+    return ServiceName(compose("KZ7MGMTSVC_%s", {copyName}));
+}
+
+Status registerManagementService(IRegistryStore& registry, IServiceManager& services, Report& report,
+                                 std::string_view location, std::string_view copyName, bool start) {
+    Status status = createService(services, report, location, copyName);
+    // Deliberate: an existing service is left as it is, its event source and start included; a re-run does
+    // not repair it.
+    if (status == kServiceExists) {
+        return kSuccess;
+    }
+    if (status == kSuccess) {
+        status = registerEventSource(registry, report, location);
+    }
+    if (status == kSuccess && start) {
+        status = startService(services, report, managementServiceName(copyName).view());
+        if (status != kSuccess) {
+            report.line(kNotStarted);
+        }
+    }
+    return status;
+}
+
+Status deleteServiceByName(IServiceManager& services, std::string_view name) {
+    OwnedService manager(services);
+    OwnedService service(services);
+    Status status = services.openManager(kServiceManagerAllAccess, manager.receive());
+    if (status == kSuccess) {
+        status = services.openService(manager.get(), name, kServiceAllAccess, service.receive());
+    }
+    if (status != kSuccess) {
+        return status == kServiceDoesNotExist ? kSuccess : status;
+    }
+    // One that does not run, or will not stop, is deleted all the same.
+    services.stopService(service.get());
+    return services.deleteService(service.get());
+}
+
+}  // namespace kz7

@@ -1,0 +1,25 @@
+// The management service of a copy and its event-log source.
+#pragma once
+
+#include <string_view>
+
+#include "install/platform/registry_store.h"
+#include "install/platform/service_manager.h"
+#include "install/platform/text.h"
+#include "install/src/report.h"
+
+namespace kz7 {
+
+using ServiceName = FixedText<1024>;
+
+ServiceName managementServiceName(std::string_view copyName);
+
+// Creates the copy's service and the event-log source, and starts the service where asked. A service that
+// exists ends the work with 0 and nothing more. Every failure is reported once and returned.
+Status registerManagementService(IRegistryStore& registry, IServiceManager& services, Report& report,
+                                 std::string_view location, std::string_view copyName, bool start);
+
+// Stops a service that runs and deletes it; one that is missing is no failure.
+Status deleteServiceByName(IServiceManager& services, std::string_view name);
+
+}  // namespace kz7

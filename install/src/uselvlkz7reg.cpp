@@ -1,0 +1,71 @@
+#include "install/src/uselvlkz7reg.h"
+
+#include "install/src/add_copy.h"
+#include "install/src/remove_copy.h"
+#include "install/src/report.h"
+
+namespace kz7 {
+namespace {
+
+constexpr std::string_view kUsage =
+    "Supported Command Line Options\n\n\n"
+    " -addKZ7Copy [installName] [installLocation] - this will set up a computer to for \n"
+    " very basic KZ7 functionality. This option depends on a valid directory existing \n"
+    " with all of the files needed for KZ7 to operate properly that is specified with \n"
+    " the [installLocation] parameter.  The [installname] parameter is a name specified \n"
+    " to refer to this copy.  This will only have very basic functionality - no  \n"
+    " instance and no KZ7 Administration server will be setup \n"
+    " installName without any instances and this copy can be used like a \n"
+    " multiple copy version.  This option will also not set up any shortcuts \n"
+    " or system environment variables.\n\n\n"
+    " -removeKZ7Copy [installName] - this can remove a copy that has been created using \n"
+    " -addKZ7Copy.  This cannot be used to remove a copy installed with the KZ7 Setup Wizard\n"
+    " \n";
+
+class Tool {
+public:
+    explicit Tool(IPlatform& platform) : platform_(platform), report_(platform.console()) {}
+
+    Status run(std::span<const char* const> arguments) {
+        if (arguments.size() == 3) {
+            const std::string_view option = arguments[1];
+            if (equalsIgnoreCase(option, "-v9") || equalsIgnoreCase(option, "-v8") ||
+                equalsIgnoreCase(option, "-dotnet")) {
+                return notYet(option);
+            }
+            if (equalsIgnoreCase(option, "-removeKZ7Copy")) {
+                return removeCopy(platform_.registry(), platform_.services(), platform_.debugOutput(), report_,
+                                  arguments[2]);
+            }
+        }
+        if (arguments.size() == 4) {
+            const std::string_view option = arguments[1];
+            if (equalsIgnoreCase(option, "-addv9")) {
+                return notYet(option);
+            }
+            if (equalsIgnoreCase(option, "-addKZ7Copy")) {
+                return addCopy(platform_.registry(), platform_.services(), report_, {}, {arguments[2], arguments[3]});
+            }
+        }
+        // Deliberate: the usage names the two copy options only; the others are the installer's.
+        report_.line(kUsage);
+        return kInvalidParameter;
+    }
+
+private:
+    Status notYet(std::string_view option) {
+        report_.bareError("kz7InstallReg: %s cannot be run by this version\n", {option});
+        return kCallNotImplemented;
+    }
+
+    IPlatform& platform_;
+    Report report_;
+};
+
+}  // namespace
+
+Status runTool(IPlatform& platform, std::span<const char* const> arguments) {
+    return Tool(platform).run(arguments);
+}
+
+}  // namespace kz7

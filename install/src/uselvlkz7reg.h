@@ -1,0 +1,14 @@
+// The tool's entry: picks the one flow that the command line asks for.
+#pragma once
+
+#include <span>
+
+#include "install/platform/platform.h"
+
+namespace kz7 {
+
+// Runs a command; `arguments` begins with the program's name. Returns the flow's status, which is the exit
+// code; kInvalidParameter after the usage text.
+Status runTool(IPlatform& platform, std::span<const char* const> arguments);
+
+}  // namespace kz7
