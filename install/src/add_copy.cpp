@@ -98,8 +98,8 @@ Status addCopy(IRegistryStore& registry, IServiceManager& services, Report& repo
             report.line(kServiceFailed);
         }
     }
-    const Status kept = registry.commit();
-    if (status == kSuccess) {
+    // As part of a migration the copy becomes visible with the rest of it.
+    if (const Status kept = request.isV9 ? kSuccess : registry.commit(); status == kSuccess) {
         status = kept;
     }
     if (status != kSuccess) {

@@ -22,7 +22,7 @@ struct CopyRequest {
 };
 
 // Returns the status of the step that failed; everything before it stays. The level is asked for with isV9
-// only. What was written is committed before the closing line.
+// only. What was written is committed before the closing line; with isV9 that is left to the migration.
 Status addCopy(IRegistryStore& registry, IServiceManager& services, Report& report, const LevelQuery& level,
                const CopyRequest& request);
 

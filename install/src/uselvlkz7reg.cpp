@@ -3,6 +3,7 @@
 #include "install/src/add_copy.h"
 #include "install/src/remove_copy.h"
 #include "install/src/report.h"
+#include "install/src/version8.h"
 
 namespace kz7 {
 namespace {
@@ -29,9 +30,11 @@ public:
     Status run(std::span<const char* const> arguments) {
         if (arguments.size() == 3) {
             const std::string_view option = arguments[1];
-            if (equalsIgnoreCase(option, "-v9") || equalsIgnoreCase(option, "-v8") ||
-                equalsIgnoreCase(option, "-dotnet")) {
+            if (equalsIgnoreCase(option, "-v9") || equalsIgnoreCase(option, "-dotnet")) {
                 return notYet(option);
+            }
+            if (equalsIgnoreCase(option, "-v8")) {
+                return restoreVersion8(platform_.registry(), platform_.services(), platform_.console(), arguments[2]);
             }
             if (equalsIgnoreCase(option, "-removeKZ7Copy")) {
                 return removeCopy(platform_.registry(), platform_.services(), platform_.debugOutput(), report_,

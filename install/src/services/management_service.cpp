@@ -10,6 +10,7 @@ constexpr ErrorText kServiceManagerFailed  {1510, "Failed open the SCM - error c
 constexpr ErrorText kServiceOpenFailed     {1523, "Failed open the Service %s - error code %d\n"};
 constexpr ErrorText kStartTypeFailed       {1541, "Unable to update the start type of the service %s - error %d\n"};
 constexpr ErrorText kStartFailed           {1552, "Unable to start the service %s - error %d\n"};
+constexpr ErrorText kStopFailed            {1566, "Unable to stop the service %s - error %d\n"};
 constexpr ErrorText kCreateManagerFailed   {1739, "Failed open the SCM - error code %d\n"};
 constexpr ErrorText kCreateFailed          {1775, "Failed to create service- error code %d\n"};
 constexpr ErrorText kEventLogKeyFailed     {1800, "Failed to create Event log registry key -error %d\n"};
@@ -73,9 +74,10 @@ Status registerEventSource(IRegistryStore& registry, Report& report, std::string
     return status;
 }
 
-Status startService(IServiceManager& services, Report& report, std::string_view name) {
+// Opens the service to change it and sets its start type; that step alone is reported and passed over.
+Status openWithStartType(IServiceManager& services, Report& report, std::string_view name, ServiceStart start,
+                         OwnedService& service) {
     OwnedService manager(services);
-    OwnedService service(services);
     Status status = services.openManager(kServiceManagerAllAccess, manager.receive());
     if (status != kSuccess) {
         report.error(kServiceManagerFailed, {status});
@@ -84,23 +86,29 @@ Status startService(IServiceManager& services, Report& report, std::string_view 
     status = services.openService(manager.get(), name, kServiceAllAccess, service.receive());
     if (status != kSuccess) {
         report.error(kServiceOpenFailed, {name, status});
-    } else {
-        if (const Status changed = services.changeStartType(service.get(), ServiceStart::automatic);
-            changed != kSuccess) {
-            report.error(kStartTypeFailed, {name, changed});
-        }
-        status = services.startService(service.get());
-        if (status == kServiceAlreadyRunning) {
-            status = kSuccess;
-        }
-        if (status != kSuccess) {
-            report.error(kStartFailed, {name, status});
-        }
+    } else if (const Status changed = services.changeStartType(service.get(), start); changed != kSuccess) {
+        report.error(kStartTypeFailed, {name, changed});
     }
-    // Deliberate: the handles of a start stay open to the end of the process, which holds off a deletion of
-    // the service meanwhile.
-    service.leaveOpen();
+    // Deliberate: the handles of a start or a switch-off stay open to the end of the process, which holds off
+    // a deletion of the service meanwhile.
     manager.leaveOpen();
+    return status;
+}
+
+Status startService(IServiceManager& services, Report& report, std::string_view name) {
+    OwnedService service(services);
+    Status status = openWithStartType(services, report, name, ServiceStart::automatic, service);
+    if (status != kSuccess) {
+        return status;
+    }
+    status = services.startService(service.get());
+    if (status == kServiceAlreadyRunning) {
+        status = kSuccess;
+    }
+    if (status != kSuccess) {
+        report.error(kStartFailed, {name, status});
+    }
+    service.leaveOpen();
     return status;
 }
 
@@ -128,6 +136,20 @@ Status registerManagementService(IRegistryStore& registry, IServiceManager& serv
         }
     }
     return status;
+}
+
+void switchOffService(IServiceManager& services, Report& report, std::string_view name) {
+    OwnedService service(services);
+    if (openWithStartType(services, report, name, ServiceStart::demand, service) != kSuccess) {
+        return;
+    }
+    // Deliberate: the platform's result of the stop is judged inverted; a stop that succeeds is told as
+    // error 1, one that fails not at all. Logs of every switch-off so far read that way.
+    const std::uint32_t result = services.stopService(service.get()) == kSuccess ? 1 : 0;
+    if (result != 0) {
+        report.error(kStopFailed, {name, result});
+    }
+    service.leaveOpen();
 }
 
 Status deleteServiceByName(IServiceManager& services, std::string_view name) {

@@ -19,6 +19,9 @@ ServiceName managementServiceName(std::string_view copyName);
 Status registerManagementService(IRegistryStore& registry, IServiceManager& services, Report& report,
                                  std::string_view location, std::string_view copyName, bool start);
 
+// Sets a service to start on demand only and stops it. What fails is reported.
+void switchOffService(IServiceManager& services, Report& report, std::string_view name);
+
 // Stops a service that runs and deletes it; one that is missing is no failure.
 Status deleteServiceByName(IServiceManager& services, std::string_view name);
 
