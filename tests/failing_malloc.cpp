@@ -1,5 +1,5 @@
-// Preloaded into a program under test: the n-th allocation fails, once or from there on. The first one of a
-// process is the C++ library's own reserve for exceptions and always succeeds.
+// Preloaded into a program under test: the n-th allocation fails, once or from there on. The first two of a
+// process, the loader's own and the C++ library's reserve for exceptions, always succeed.
 #include <dlfcn.h>
 
 #include <cerrno>
@@ -10,7 +10,7 @@ namespace {
 bool fails() {
     static const char* chosen = std::getenv("KZ7_FAIL_ALLOCATION");
     static const char* lasting = std::getenv("KZ7_FAIL_FOR_GOOD");
-    static long count = -1;
+    static long count = -2;
     if (chosen == nullptr) {
         return false;
     }
