@@ -3,7 +3,7 @@
 
 #include <csignal>
 
-#include "install/platform/embedded/console.h"
+#include "install/platform/standard_console.h"
 #include "install/platform/embedded/debug_output.h"
 #include "install/platform/embedded/file_system.h"
 #include "install/platform/embedded/registry.h"
@@ -35,7 +35,7 @@ public:
 private:
     std::string program_;
     std::string directory_;
-    EmbeddedConsole console_;
+    StandardConsole console_;
     EmbeddedDebugOutput debugOutput_;
     EmbeddedFileSystem files_;
     EmbeddedRegistry registry_;
