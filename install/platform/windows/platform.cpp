@@ -20,6 +20,9 @@ public:
     IDebugOutput& debugOutput() override { return debugOutput_; }
     IFileSystem& files() override { return files_; }
     std::string storeName() override { return "the registry of this machine"; }
+    std::string storeNote() override { return {}; }
+    bool storeIsOwn() override { return false; }
+    bool storeFaultTold() override { return false; }
 
 private:
     StandardConsole console_;
