@@ -1,6 +1,5 @@
 #include "install/platform/registry_path.h"
 
-
 #include "install/platform/text.h"
 
 namespace kz7 {

@@ -45,8 +45,9 @@ private:
 }  // namespace
 
 std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options) {
-    // A reader that went away is a status of the write, never the end of a half-done run.
+    // A reader that went away or a file at its limit is a status of the write, never the end of a half-done run.
     std::signal(SIGPIPE, SIG_IGN);
+    std::signal(SIGXFSZ, SIG_IGN);
     return std::make_unique<EmbeddedPlatform>(options);
 }
 

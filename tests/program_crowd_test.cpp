@@ -1,0 +1,179 @@
+// Many runs at once, and runs that are killed: nothing is lost that was reported, nothing is ever half there.
+#include <gtest/gtest.h>
+#include <signal.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <chrono>
+#include <cstdlib>
+#include <fstream>
+#include <random>
+#include <thread>
+
+#include "tests/support/state_directory.h"
+
+namespace kz7::test {
+namespace {
+
+std::size_t occurrences(const std::string& text, const std::string& part) {
+    std::size_t count = 0;
+    for (std::size_t at = 0; (at = text.find(part, at)) != std::string::npos; at += part.size()) {
+        ++count;
+    }
+    return count;
+}
+
+std::string copyName(std::size_t process, int run) {
+    return "P" + std::to_string(process) + "R" + std::to_string(run);
+}
+
+class Crowd : public testing::TestWithParam<std::size_t> {};
+
+TEST_P(Crowd, AddsAtTheSameTimeOnAnEmptyMachineLoseNothing) {
+    constexpr int kRuns = 200;
+    const StateDirectory state;
+    std::vector<std::thread> processes;
+    std::vector<std::string> faults(GetParam());
+    for (std::size_t process = 0; process < GetParam(); ++process) {
+        processes.emplace_back([&, process] {
+            for (int run = 0; run < kRuns; ++run) {
+                const ProgramResult result = state.tool({"-addKZ7Copy", copyName(process, run), "C:\\KZ7"});
+                if (result.exitCode != 0 || !result.error.empty()) {
+                    faults[process] +=
+                        copyName(process, run) + ": " + std::to_string(result.exitCode) + " " + result.error + "\n";
+                }
+            }
+        });
+    }
+    for (std::thread& process : processes) {
+        process.join();
+    }
+    for (const std::string& fault : faults) {
+        EXPECT_EQ(fault, "");
+    }
+    const std::string found = state.dump();
+    const std::size_t copies = GetParam() * kRuns;
+    EXPECT_EQ(occurrences(found, "KZ7 Path Name = 1:C:\\KZ7\\x00\n"), 2 * copies);
+    EXPECT_EQ(occurrences(found, "DAS_PROFILES :  = 1:\\x00\n") + occurrences(found, "Das_PROFILES :  = 1:\\x00\n"),
+              2 * copies);
+    EXPECT_EQ(occurrences(found, "DisplayName = 1:KZ7 Management Service ("), copies);
+    EXPECT_EQ(state.integrity(), "ok");
+}
+
+INSTANTIATE_TEST_SUITE_P(Processes, Crowd, testing::Values(2, 8));
+
+// A command that is killed at random moments. Adding a flow is adding a row.
+struct KilledFlow {
+    const char* name;
+    std::vector<std::vector<std::string>> before;  // commands that make the state it starts from
+    std::vector<std::string> command;
+};
+
+class Kills : public testing::TestWithParam<KilledFlow> {};
+
+const KilledFlow kFlows[] = {
+    {"add", {{"-addKZ7Copy", "FIRST", "C:\\KZ7\\first"}}, {"-addKZ7Copy", "SECOND", "C:\\KZ7\\second"}},
+    {"addToAnEmptyMachine", {}, {"-addKZ7Copy", "FIRST", "C:\\KZ7\\first"}},
+    {"remove",
+     {{"-addKZ7Copy", "FIRST", "C:\\KZ7\\first"}, {"-addKZ7Copy", "SECOND", "C:\\KZ7\\second"}},
+     {"-removeKZ7Copy", "SECOND"}},
+    {"removeTheLast", {{"-addKZ7Copy", "FIRST", "C:\\KZ7\\first"}}, {"-removeKZ7Copy", "FIRST"}},
+    {"version8", {{"-addKZ7Copy", "FIRST", "C:\\KZ7\\first"}}, {"-v8", "C:\\KZ8"}},
+};
+
+// How often each flow is killed: KZ7_KILLS for a soak, else enough to meet every part of a run.
+int killCount() {
+    const char* asked = std::getenv("KZ7_KILLS");
+    return asked == nullptr ? 100 : std::atoi(asked);
+}
+
+TEST_P(Kills, LeaveTheStateBeforeOrAfter) {
+    const KilledFlow& flow = GetParam();
+    const StateDirectory start;
+    for (const auto& command : flow.before) {
+        ASSERT_EQ(start.tool(command).exitCode, 0);
+    }
+    const std::string before = start.dump();
+    const StateDirectory done;
+    done.copyFrom(start);
+    const auto begun = std::chrono::steady_clock::now();
+    ASSERT_EQ(done.tool(flow.command).exitCode, 0);
+    const auto usual = std::chrono::steady_clock::now() - begun;
+    const std::string after = done.dump();
+    ASSERT_NE(before, after);
+
+    std::vector<std::string> command = flow.command;
+    command.insert(command.begin(), programPath("kz7InstallReg"));
+    std::mt19937_64 random(20240607);
+    int killed = 0;
+    for (int round = 0; round < killCount(); ++round) {
+        const StateDirectory state;
+        state.copyFrom(start);
+        ProgramOptions options;
+        options.environment = {"KZ7_STATE_DIR=" + state.path()};
+        const pid_t child = startProgram(command, options);
+        const auto moment = std::chrono::nanoseconds(
+            std::uniform_int_distribution<std::int64_t>(0, std::chrono::nanoseconds(usual).count())(random));
+        // A busy wait: the moments of interest are microseconds apart.
+        for (const auto from = std::chrono::steady_clock::now(); std::chrono::steady_clock::now() - from < moment;) {
+        }
+        kill(child, SIGKILL);
+        int status = 0;
+        waitpid(child, &status, 0);
+        const std::string found = state.dump();
+        if (WIFSIGNALED(status)) {
+            ++killed;
+            EXPECT_TRUE(found == before || found == after) << "round " << round << "\n" << found;
+        } else {
+            EXPECT_EQ(found, after) << "round " << round;
+        }
+        if (found == before) {
+            EXPECT_EQ(state.tool(flow.command).exitCode, 0) << "round " << round;
+        }
+        EXPECT_EQ(state.integrity(), "ok") << "round " << round;
+    }
+    EXPECT_GT(killed, killCount() / 20);
+}
+
+INSTANTIATE_TEST_SUITE_P(Flows, Kills, testing::ValuesIn(kFlows),
+                         [](const testing::TestParamInfo<KilledFlow>& row) { return row.param.name; });
+
+// The log of a store that lost its end, as after a power cut on a disk that had not written it yet, or that has
+// noise there: what is left is the state after some whole run, and the next run works.
+TEST(LogFile, ACutOrNoisyEndLeavesWholeRuns) {
+    constexpr int kRuns = 6;
+    const StateDirectory start;
+    std::vector<std::string> states;
+    for (int run = 0; run < kRuns; ++run) {
+        ASSERT_EQ(start.tool({"-addKZ7Copy", copyName(0, run), "C:\\KZ7"}).exitCode, 0);
+        states.push_back(start.dump());
+    }
+    std::ifstream file(start.file("registry.db-wal"), std::ios::binary);
+    const std::string log{std::istreambuf_iterator<char>(file), {}};
+    ASSERT_GT(log.size(), 10000U);
+    std::mt19937_64 random(7);
+    for (int round = 0; round < 60; ++round) {
+        const StateDirectory state;
+        state.copyFrom(start);
+        const std::size_t kept = std::uniform_int_distribution<std::size_t>(0, log.size())(random);
+        const bool noisy = round % 3 != 0;
+        std::string spoiled = log.substr(0, kept);
+        for (std::size_t at = 0; noisy && at < 5000; ++at) {
+            spoiled += static_cast<char>(random());
+        }
+        std::ofstream(state.file("registry.db-wal"), std::ios::binary | std::ios::trunc) << spoiled;
+        const std::string found = state.dump();
+        bool whole = found.empty();
+        for (const std::string& candidate : states) {
+            whole = whole || found == candidate;
+        }
+        EXPECT_TRUE(whole) << "kept " << kept << " bytes of the log\n" << found;
+        EXPECT_EQ(state.tool({"-addKZ7Copy", "NEXT", "C:\\KZ7"}).exitCode, 0);
+        EXPECT_EQ(state.integrity(), "ok");
+    }
+    std::ofstream(start.file("registry.db-wal"), std::ios::binary | std::ios::app) << std::string(5000, '\xA5');
+    EXPECT_EQ(start.dump(), states.back()) << "noise behind the log's end cost a run that was reported";
+}
+
+}  // namespace
+}  // namespace kz7::test

@@ -1,0 +1,47 @@
+// Runs a built program as a user does and tells what came of it.
+#pragma once
+
+#include <sys/types.h>
+
+#include <functional>
+#include <string>
+#include <vector>
+
+namespace kz7::test {
+
+struct ProgramResult {
+    int exitCode = -1;
+    int signal = 0;  // that ended it, if one did
+    std::string output;
+    std::string error;
+};
+
+struct ProgramOptions {
+    std::vector<std::string> environment;  // added to the parent's, NAME=value
+    std::function<void()> inChild;         // after the fork, for limits
+};
+
+// The path of one of the project's programs.
+std::string programPath(const std::string& name);
+
+// Standard input is empty.
+ProgramResult runProgram(const std::vector<std::string>& command, const ProgramOptions& options = {});
+
+// Starts without waiting; output and errors are dropped.
+pid_t startProgram(const std::vector<std::string>& command, const ProgramOptions& options = {});
+
+// A folder of its own that goes when the object does.
+class TemporaryDirectory {
+public:
+    TemporaryDirectory();
+    ~TemporaryDirectory();
+    TemporaryDirectory(const TemporaryDirectory&) = delete;
+    TemporaryDirectory& operator=(const TemporaryDirectory&) = delete;
+
+    const std::string& path() const { return path_; }
+
+private:
+    std::string path_;
+};
+
+}  // namespace kz7::test

@@ -1,0 +1,53 @@
+#include "tests/support/state_directory.h"
+
+#include <sqlite3.h>
+
+#include <filesystem>
+
+#include "install/platform/embedded/registry.h"
+#include "tests/support/registry_dump.h"
+
+namespace kz7::test {
+
+ProgramResult StateDirectory::run(const std::string& program, std::vector<std::string> arguments,
+                                  ProgramOptions options) const {
+    arguments.insert(arguments.begin(), programPath(program));
+    options.environment.push_back("KZ7_STATE_DIR=" + path());
+    return runProgram(arguments, options);
+}
+
+ProgramResult StateDirectory::tool(std::vector<std::string> arguments, ProgramOptions options) const {
+    return run("kz7InstallReg", std::move(arguments), std::move(options));
+}
+
+std::string StateDirectory::dump() const {
+    std::string faults;
+    EmbeddedRegistry registry(path(), true,
+                              [&](const StoreFault& fault) { faults += "fault: " + fault.reason + "\n"; });
+    std::string text = dumpRegistry(registry);
+    return faults + text;
+}
+
+std::string StateDirectory::integrity() const {
+    sqlite3* database = nullptr;
+    std::string found;
+    if (sqlite3_open_v2(file("registry.db").c_str(), &database, SQLITE_OPEN_READWRITE, nullptr) != SQLITE_OK ||
+        sqlite3_exec(
+            database, "PRAGMA integrity_check",
+            [](void* text, int, char** row, char**) {
+                *static_cast<std::string*>(text) += row[0];
+                return 0;
+            },
+            &found, nullptr) != SQLITE_OK) {
+        found = sqlite3_errmsg(database);
+    }
+    sqlite3_close(database);
+    return found;
+}
+
+void StateDirectory::copyFrom(const StateDirectory& other) const {
+    std::filesystem::copy(other.path(), path(),
+                          std::filesystem::copy_options::recursive | std::filesystem::copy_options::overwrite_existing);
+}
+
+}  // namespace kz7::test
