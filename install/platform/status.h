@@ -23,6 +23,7 @@ inline constexpr Status kDiskFull                = 112;
 inline constexpr Status kCallNotImplemented      = 120;
 inline constexpr Status kInvalidName             = 123;   // a service name that no service can have
 inline constexpr Status kBadPathname             = 161;
+inline constexpr Status kTooManyThreads          = 164;   // the host starts no further thread
 inline constexpr Status kBusy                    = 170;   // the store stayed locked by another writer
 inline constexpr Status kFilenameExceedsRange    = 206;   // a path that does not fit its buffer
 inline constexpr Status kPipeClosing             = 232;   // the read end of a pipe that is written is closed

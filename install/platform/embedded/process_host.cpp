@@ -26,6 +26,7 @@ namespace kz7 {
 namespace {
 
 constexpr int kFirstOwnDescriptor = STDERR_FILENO + 1;
+constexpr int kSignalExitCode = 128;  // a child ended by signal n has the exit code 128 + n
 constexpr std::string_view kUsualSearchPath = "/usr/local/bin:/usr/bin:/bin";  // where PATH is not set
 
 Status statusOf(int error) {
@@ -43,6 +44,18 @@ Status statusOf(int error) {
         default:
             return kGeneralFailure;
     }
+}
+
+// Keeps a descriptor out of the three numbers that a child's streams are put on; -1 and none left on failure.
+int moveUp(int descriptor) {
+    if (descriptor >= kFirstOwnDescriptor) {
+        return descriptor;
+    }
+    const int moved = fcntl(descriptor, F_DUPFD_CLOEXEC, kFirstOwnDescriptor);
+    const int error = errno;
+    close(descriptor);
+    errno = error;
+    return moved;
 }
 
 // What says that a file is none that this host can execute.
@@ -106,6 +119,54 @@ private:
     bool wasPending_ = false;
 };
 
+// How a child begins: descriptors 0 to 2 as told and no others, no signal blocked, ignored or caught. It is not
+// forked: a fork would cost by the memory that this process has in use.
+class SpawnPlan {
+public:
+    SpawnPlan() {
+        note(posix_spawn_file_actions_init(&actions_));
+        note(posix_spawnattr_init(&attributes_));
+    }
+    ~SpawnPlan() {
+        posix_spawnattr_destroy(&attributes_);
+        posix_spawn_file_actions_destroy(&actions_);
+    }
+    SpawnPlan(const SpawnPlan&) = delete;
+    SpawnPlan& operator=(const SpawnPlan&) = delete;
+
+    void openNull(int target, int mode) {
+        note(posix_spawn_file_actions_addopen(&actions_, target, "/dev/null", mode, 0));
+    }
+    void give(int descriptor, int target) { note(posix_spawn_file_actions_adddup2(&actions_, descriptor, target)); }
+
+    // An error number, 0 for a child that executes the file.
+    int run(pid_t& id, const char* file, const std::string& directory, char* const* argv) {
+        // One system call, whatever the limit of open files is.
+        note(posix_spawn_file_actions_addclosefrom_np(&actions_, kFirstOwnDescriptor));
+        if (!directory.empty()) {
+            note(posix_spawn_file_actions_addchdir_np(&actions_, directory.c_str()));
+        }
+        sigset_t signals;
+        sigemptyset(&signals);
+        note(posix_spawnattr_setsigmask(&attributes_, &signals));
+        sigfillset(&signals);
+        note(posix_spawnattr_setsigdefault(&attributes_, &signals));
+        note(posix_spawnattr_setflags(&attributes_, POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF));
+        return error_ != 0 ? error_ : posix_spawn(&id, file, &actions_, &attributes_, argv, environ);
+    }
+
+private:
+    void note(int error) {
+        if (error_ == 0) {
+            error_ = error;
+        }
+    }
+
+    posix_spawn_file_actions_t actions_{};
+    posix_spawnattr_t attributes_{};
+    int error_ = 0;
+};
+
 // waitpid() that no signal of the program's interrupts.
 pid_t waitForChild(pid_t id, int* ending, int options) {
     pid_t found = -1;
@@ -115,13 +176,13 @@ pid_t waitForChild(pid_t id, int* ending, int options) {
     return found;
 }
 
-// Waits for the end of a child without taking its exit code. False: it runs on, or cannot be waited for.
-bool endsWithin(pid_t id, std::uint32_t milliseconds) {
+// Waits for the end of a child, but no longer than that; its exit code is still to be taken.
+void waitWithin(pid_t id, std::uint32_t milliseconds) {
     using Clock = std::chrono::steady_clock;
     const auto deadline = Clock::now() + std::chrono::milliseconds(milliseconds);
     pollfd watched{pidfd_open(id, 0), POLLIN, 0};
     if (watched.fd == -1) {
-        return false;
+        return;
     }
     int ready = -1;
     do {
@@ -129,7 +190,6 @@ bool endsWithin(pid_t id, std::uint32_t milliseconds) {
         ready = poll(&watched, 1, static_cast<int>(std::clamp<std::int64_t>(left, 0, INT_MAX)));
     } while ((ready == -1 && errno == EINTR) || (ready == 0 && Clock::now() < deadline));
     close(watched.fd);
-    return ready == 1;
 }
 
 // Takes the ending of a child that nobody asks about any more, so that it does not stay a zombie. A thread of
@@ -140,7 +200,7 @@ void leaveToItself(pid_t id) {
         return nullptr;
     };
     pthread_attr_t attributes;
-    if (!makeThreadAttributes(PTHREAD_STACK_MIN, attributes)) {
+    if (makeThreadAttributes(1, attributes) != 0) {
         return;
     }
     pthread_attr_setdetachstate(&attributes, PTHREAD_CREATE_DETACHED);
@@ -198,13 +258,21 @@ int EmbeddedProcessHost::descriptorOf(StreamHandle stream) {
 }
 
 Status EmbeddedProcessHost::createPipe(StreamHandle& readEnd, StreamHandle& writeEnd) {
+    // A child is given its ends by name: none of ours passes an exec by itself.
     int ends[2];
     if (pipe2(ends, O_CLOEXEC) == -1) {
         return statusOf(errno);
     }
-    // A child gets its ends by name; nothing else of ours passes an exec.
-    readEnd = giveOut(ends[0]);
-    writeEnd = giveOut(ends[1]);
+    const int reading = moveUp(ends[0]);
+    const int writing = moveUp(ends[1]);
+    if (reading == -1 || writing == -1) {
+        const Status status = statusOf(errno);
+        close(reading);
+        close(writing);
+        return status;
+    }
+    readEnd = giveOut(reading);
+    writeEnd = giveOut(writing);
     return kSuccess;
 }
 
@@ -291,34 +359,17 @@ Status EmbeddedProcessHost::spawn(const std::string& file, std::string_view prog
     }
     argv.push_back(nullptr);
 
-    posix_spawn_file_actions_t actions;
-    posix_spawn_file_actions_init(&actions);
-    // Whatever number a pipe has, it is moved above the three before they are filled.
-    posix_spawnattr_t attributes;
-    posix_spawnattr_init(&attributes);
-    posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
+    SpawnPlan plan;
+    plan.openNull(STDIN_FILENO, O_RDONLY);
     for (const auto& [stream, target] : {std::pair{start.output, STDOUT_FILENO}, {start.error, STDERR_FILENO}}) {
         if (stream == StreamHandle::none) {
-            posix_spawn_file_actions_addopen(&actions, target, "/dev/null", O_WRONLY, 0);
+            plan.openNull(target, O_WRONLY);
         } else {
-            posix_spawn_file_actions_adddup2(&actions, descriptorOf(stream), target);
+            plan.give(descriptorOf(stream), target);
         }
     }
-    posix_spawn_file_actions_addclosefrom_np(&actions, kFirstOwnDescriptor);
-    if (!directory.empty()) {
-        posix_spawn_file_actions_addchdir_np(&actions, directory.c_str());
-    }
-    sigset_t signals;
-    sigemptyset(&signals);
-    posix_spawnattr_setsigmask(&attributes, &signals);
-    sigfillset(&signals);
-    posix_spawnattr_setsigdefault(&attributes, &signals);
-    posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF);
-
     pid_t id = 0;
-    const int error = posix_spawn(&id, file.c_str(), &actions, &attributes, argv.data(), environ);
-    posix_spawnattr_destroy(&attributes);
-    posix_spawn_file_actions_destroy(&actions);
+    const int error = plan.run(id, file.c_str(), directory, argv.data());
     if (error != 0) {
         return isNoProgram(error) ? kFileNotFound : statusOf(error);
     }
@@ -326,6 +377,72 @@ Status EmbeddedProcessHost::spawn(const std::string& file, std::string_view prog
     children_.emplace(process, Child{.id = id});
     started = {process, ProcessHandle::none, static_cast<std::uint32_t>(id), static_cast<std::uint32_t>(id)};
     return kSuccess;
+}
+
+EmbeddedProcessHost::Child* EmbeddedProcessHost::childOf(ProcessHandle process) {
+    const auto found = children_.find(process);
+    return found != children_.end() ? &found->second : nullptr;
+}
+
+Status EmbeddedProcessHost::takeEnding(Child& child, int options) {
+    if (child.ended) {
+        return kSuccess;
+    }
+    int ending = 0;
+    const pid_t found = waitForChild(child.id, &ending, options);
+    if (found == 0) {
+        return kWaitTimedOut;
+    }
+    if (found == -1) {
+        return statusOf(errno);
+    }
+    child.ended = true;
+    child.exitCode =
+        static_cast<std::uint32_t>(WIFSIGNALED(ending) ? kSignalExitCode + WTERMSIG(ending) : WEXITSTATUS(ending));
+    return kSuccess;
+}
+
+Status EmbeddedProcessHost::waitProcess(ProcessHandle process, std::uint32_t milliseconds) {
+    Child* child = childOf(process);
+    if (child == nullptr) {
+        return kInvalidHandle;
+    }
+    if (milliseconds == kInfiniteWait) {
+        return takeEnding(*child, 0);
+    }
+    if (!child->ended && milliseconds != 0) {
+        waitWithin(child->id, milliseconds);
+    }
+    return takeEnding(*child, WNOHANG);
+}
+
+Status EmbeddedProcessHost::exitCode(ProcessHandle process, std::uint32_t& code) {
+    Child* child = childOf(process);
+    if (child == nullptr) {
+        return kInvalidHandle;
+    }
+    const Status status = takeEnding(*child, WNOHANG);
+    if (status != kSuccess && status != kWaitTimedOut) {
+        return status;
+    }
+    code = child->exitCode;
+    return kSuccess;
+}
+
+Status EmbeddedProcessHost::closeProcess(ProcessHandle process) {
+    Child* child = childOf(process);
+    if (child == nullptr) {
+        return kInvalidHandle;
+    }
+    if (takeEnding(*child, WNOHANG) == kWaitTimedOut) {
+        leaveToItself(child->id);
+    }
+    children_.erase(process);
+    return kSuccess;
+}
+
+Status EmbeddedProcessHost::shortPath(std::string_view, Buffer&) {
+    return kCallNotImplemented;
 }
 
 }  // namespace kz7

@@ -48,6 +48,7 @@ private:
     StreamHandle giveOut(int descriptor);
     int descriptorOf(StreamHandle stream);
     Child* childOf(ProcessHandle process);
+    Status takeEnding(Child& child, int options);
     Status spawn(const std::string& file, std::string_view program, std::string_view arguments,
                  const ProcessStart& start, ProcessInformation& started);
 
