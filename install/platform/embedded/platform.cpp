@@ -1,9 +1,13 @@
 // This machine's ports on the embedded store.
 #include "install/platform/platform.h"
 
-#include <csignal>
+#include <unistd.h>
 
-#include "install/platform/embedded/console.h"
+#include <cerrno>
+#include <csignal>
+#include <cstdlib>
+
+#include "install/platform/standard_console.h"
 #include "install/platform/embedded/debug_output.h"
 #include "install/platform/embedded/file_system.h"
 #include "install/platform/embedded/process_host.h"
@@ -17,11 +21,13 @@ class EmbeddedPlatform final : public IPlatform {
 public:
     explicit EmbeddedPlatform(const PlatformOptions& options)
         : program_(options.program),
+          byDefault_(options.stateDirectory.empty() && std::getenv("KZ7_STATE_DIR") == nullptr),
           directory_(options.stateDirectory.empty() ? usualStateDirectory() : options.stateDirectory),
           debugOutput_(console_),
           files_(directory_),
           registry_(directory_, options.readOnly,
                     [this](const StoreFault& fault) {
+                        faultTold_ = true;
                         console_.writeError(program_ + ": " + fault.file + ": " + fault.reason + "\n");
                     }),
           services_(registry_, files_) {}
@@ -32,11 +38,21 @@ public:
     IDebugOutput& debugOutput() override { return debugOutput_; }
     IFileSystem& files() override { return files_; }
     std::string storeName() override { return registry_.path(); }
+    bool storeIsOwn() override { return true; }
+    bool storeFaultTold() override { return faultTold_; }
+
+    std::string storeNote() override {
+        const std::string machine(kMachineStateDirectory);
+        const bool hidden = access((machine + "/registry.db").c_str(), R_OK) != 0 && errno == EACCES;
+        return byDefault_ && hidden ? machine + " exists too and cannot be read by you" : std::string{};
+    }
 
 private:
     std::string program_;
+    bool byDefault_;
+    bool faultTold_ = false;
     std::string directory_;
-    EmbeddedConsole console_;
+    StandardConsole console_;
     EmbeddedDebugOutput debugOutput_;
     EmbeddedFileSystem files_;
     EmbeddedRegistry registry_;

@@ -12,20 +12,21 @@ constexpr std::int64_t kMachineId = 1;
 constexpr std::int64_t kUsersId = 2;
 constexpr std::uint32_t kRoots = 3;  // the first slots of the open keys
 constexpr std::int64_t kPageSize = 4096;
-constexpr std::int64_t kLogLimit = 256 * 1024;  // bytes of log that a run leaves to the next one
+constexpr std::int64_t kLogLimit = std::int64_t{256} * 1024;  // bytes of log that a run leaves to the next one
 
 // clang-format off
 constexpr std::array kSql = {
     "SELECT id FROM key WHERE parent = ? AND fold = ?",
     "INSERT INTO key (parent, fold, name, class) VALUES (?, ?, ?, ?)",
     "SELECT 1 FROM key WHERE id = ?",
-    "SELECT fold, name, class FROM key WHERE parent = ? AND fold >= ? ORDER BY fold LIMIT 1 OFFSET ?",
+    "SELECT id, fold, name, class FROM key WHERE parent = ? AND fold >= ? ORDER BY fold LIMIT 64 OFFSET ?",
     "SELECT 1 FROM key WHERE parent = ? LIMIT 1",
-    "DELETE FROM key WHERE id = ? RETURNING parent, fold",
+    "SELECT parent, fold FROM key WHERE id = ?",
+    "DELETE FROM key WHERE id = ?",
     "DELETE FROM value WHERE key = ?",
     "SELECT type, data FROM value WHERE key = ? AND fold = ?",
-    "INSERT INTO value (key, fold, name, type, data, place) VALUES (?1, ?2, ?3, ?4, ?5,"
-        " (SELECT coalesce(max(place), 0) + 1 FROM value WHERE key = ?1))"
+    "SELECT coalesce(max(place), 0) FROM value WHERE key = ?",
+    "INSERT INTO value (key, fold, name, type, data, place) VALUES (?, ?, ?, ?, ?, ?)"
         " ON CONFLICT (key, fold) DO UPDATE SET type = excluded.type, data = excluded.data",
     "DELETE FROM value WHERE key = ? AND fold = ? RETURNING place",
     "SELECT place, name, type, data FROM value WHERE key = ? AND place >= ? ORDER BY place LIMIT 1 OFFSET ?",
@@ -38,11 +39,13 @@ enum class EmbeddedRegistry::Sql : std::size_t {
     findKey,
     addKey,
     keyExists,
-    nextKey,
+    nextKeys,
     hasSubkey,
+    keyAbove,
     deleteKey,
     deleteValues,
     getValue,
+    highestPlace,
     setValue,
     deleteValue,
     nextValue,
@@ -108,7 +111,8 @@ Status EmbeddedRegistry::begin() {
     }
     inTransaction_ = true;
     ++transaction_;
-    lastPath_.clear();
+    childless_ = 0;
+    placedKey_ = 0;
     return kSuccess;
 }
 
@@ -117,7 +121,6 @@ void EmbeddedRegistry::endTransaction() {
         execute(connection_.get(), "ROLLBACK");
     }
     inTransaction_ = false;
-    lastPath_.clear();
 }
 
 Status EmbeddedRegistry::commit() {
@@ -145,7 +148,7 @@ Query EmbeddedRegistry::query(Sql which) {
 EmbeddedRegistry::OpenKey* EmbeddedRegistry::slotOf(KeyHandle handle) {
     switch (handle) {
         case KeyHandle::localMachine:
-            return &open_[0];
+            return open_.data();
         case KeyHandle::users:
             return &open_[1];
         case KeyHandle::currentUser:
@@ -233,14 +236,33 @@ Status EmbeddedRegistry::currentUser(KeyId& id) {
     return isNotFound(status) && !readOnly_ ? addChild(kUsersId, sid, sid, {}, id) : status;
 }
 
+EmbeddedRegistry::KnownSubkey& EmbeddedRegistry::knownSlot(KeyId parent, std::string_view fold) {
+    const std::size_t mixed = std::hash<std::string_view>{}(fold) + static_cast<std::size_t>(parent) * 31;
+    return known_[mixed % known_.size()];
+}
+
+void EmbeddedRegistry::remember(KeyId parent, std::string_view fold, KeyId id) {
+    KnownSubkey& slot = knownSlot(parent, fold);
+    slot.transaction = transaction_;
+    slot.parent = parent;
+    slot.id = id;
+    slot.fold = fold;
+}
+
 Status EmbeddedRegistry::child(KeyId parent, std::string_view fold, KeyId& id) {
-    Query find = query(Sql::findKey);
-    const int result = find.bind(parent).bind(fold).step();
-    if (result == SQLITE_ROW) {
-        id = find.number(0);
+    const KnownSubkey& known = knownSlot(parent, fold);
+    if (known.transaction == transaction_ && known.parent == parent && known.fold == fold) {
+        id = known.id;
         return kSuccess;
     }
-    return result == SQLITE_DONE ? kFileNotFound : fail(result);
+    Query find = query(Sql::findKey);
+    const int result = find.bind(parent).bind(fold).step();
+    if (result != SQLITE_ROW) {
+        return result == SQLITE_DONE ? kFileNotFound : fail(result);
+    }
+    id = find.number(0);
+    remember(parent, fold, id);
+    return kSuccess;
 }
 
 Status EmbeddedRegistry::addChild(KeyId parent, std::string_view name, std::string_view fold, std::string_view keyClass,
@@ -250,16 +272,50 @@ Status EmbeddedRegistry::addChild(KeyId parent, std::string_view name, std::stri
         return fail(result);
     }
     id = sqlite3_last_insert_rowid(connection_.get());
-    for (OpenKey& open : open_) {
-        if (open.used && open.id == parent && fold < open.keys.fold) {
-            ++open.keys.index;
-        }
-    }
+    remember(parent, fold, id);
+    subkeyAdded(parent, fold);
+    // A new key has no values yet.
+    placedKey_ = id;
+    highestPlace_ = 0;
     return kSuccess;
 }
 
+void EmbeddedRegistry::subkeyAdded(KeyId parent, std::string_view fold) {
+    if (childless_ == parent) {
+        childless_ = 0;
+    }
+    for (OpenKey& open : open_) {
+        if (!open.used || open.id != parent) {
+            continue;
+        }
+        if (fold < open.keys.fold) {
+            ++open.keys.index;
+        } else {
+            open.keys.ahead.clear();
+        }
+    }
+}
+
+void EmbeddedRegistry::subkeyDeleted(const Found& gone) {
+    knownSlot(gone.parent, gone.fold).transaction = 0;
+    for (OpenKey& open : open_) {
+        open.deleted = open.deleted || open.id == gone.id;
+        if (!open.used || open.id != gone.parent) {
+            continue;
+        }
+        KeyPlace& place = open.keys;
+        if (gone.fold < place.fold) {
+            --place.index;
+        } else if (place.next < place.ahead.size() && place.ahead[place.next].id == gone.id) {
+            ++place.next;
+        } else {
+            place.ahead.clear();
+        }
+    }
+}
+
 Status EmbeddedRegistry::find(KeyHandle parent, std::string_view path, AccessMask access, bool create,
-                              std::string_view keyClass, KeyId& id) {
+                              std::string_view keyClass, Found& found) {
     if (const Status status = checkKeyPath(path); status != kSuccess) {
         return status;
     }
@@ -267,52 +323,40 @@ Status EmbeddedRegistry::find(KeyHandle parent, std::string_view path, AccessMas
     if (const Status status = keyOf(parent, 0, base); status != kSuccess) {
         return status;
     }
-    if (lastRoot_ != base->id) {
-        lastRoot_ = base->id;
-        lastPath_.clear();
-    }
+    found.id = base->id;
     const std::string plain = plainKeyPath(parent, path, access);
     std::string_view rest = plain;
     std::string_view name;
-    KeyId at = base->id;
-    for (std::size_t depth = 0; takeName(rest, name); ++depth) {
-        std::string fold = foldUpper(name);
-        if (depth < lastPath_.size() && lastPath_[depth].fold == fold) {
-            at = lastPath_[depth].id;
-            continue;
-        }
-        lastPath_.resize(depth);
-        KeyId below = 0;
-        Status status = child(at, fold, below);
+    while (takeName(rest, name)) {
+        found.parent = found.id;
+        found.fold = foldUpper(name);
+        Status status = child(found.parent, found.fold, found.id);
         if (isNotFound(status) && create) {
             const bool last = rest.find_first_not_of('\\') == std::string_view::npos;
-            status = addChild(at, name, fold, last ? keyClass : std::string_view{}, below);
+            status = addChild(found.parent, name, found.fold, last ? keyClass : std::string_view{}, found.id);
         }
         if (status != kSuccess) {
             return status;
         }
-        lastPath_.push_back({std::move(fold), below});
-        at = below;
     }
-    id = at;
     return kSuccess;
 }
 
 Status EmbeddedRegistry::openKey(KeyHandle parent, std::string_view path, AccessMask access, KeyHandle& key) {
-    KeyId id = 0;
-    const Status status = find(parent, path, access, false, {}, id);
+    Found found;
+    const Status status = find(parent, path, access, false, {}, found);
     if (status == kSuccess) {
-        key = giveOut(id, access);
+        key = giveOut(found.id, access);
     }
     return status;
 }
 
 Status EmbeddedRegistry::createKey(KeyHandle parent, std::string_view path, std::string_view keyClass,
                                    AccessMask access, KeyHandle& key) {
-    KeyId id = 0;
-    const Status status = find(parent, path, access, true, keyClass, id);
+    Found found;
+    const Status status = find(parent, path, access, true, keyClass, found);
     if (status == kSuccess) {
-        key = giveOut(id, access);
+        key = giveOut(found.id, access);
     }
     return status;
 }
@@ -339,6 +383,20 @@ Status EmbeddedRegistry::queryValue(KeyHandle key, std::string_view name, ValueT
     return status;
 }
 
+Status EmbeddedRegistry::nextPlace(KeyId key, std::int64_t& place) {
+    if (placedKey_ != key) {
+        Query highest = query(Sql::highestPlace);
+        if (const int result = highest.bind(key).step(); result != SQLITE_ROW) {
+            return fail(result);
+        }
+        highestPlace_ = highest.number(0);
+        placedKey_ = key;
+    }
+    // A value that is there already keeps its own place; the number it was offered is left out.
+    place = ++highestPlace_;
+    return kSuccess;
+}
+
 Status EmbeddedRegistry::setValue(KeyHandle key, std::string_view name, ValueType type, std::string_view data) {
     OpenKey* open = nullptr;
     Status status = keyOf(key, kKeySetValue, open);
@@ -348,6 +406,10 @@ Status EmbeddedRegistry::setValue(KeyHandle key, std::string_view name, ValueTyp
     if (status != kSuccess) {
         return status;
     }
+    std::int64_t place = 0;
+    if (status = nextPlace(open->id, place); status != kSuccess) {
+        return status;
+    }
     const std::string fold = foldUpper(name);
     const int result = query(Sql::setValue)
                            .bind(open->id)
@@ -355,6 +417,7 @@ Status EmbeddedRegistry::setValue(KeyHandle key, std::string_view name, ValueTyp
                            .bind(name)
                            .bind(static_cast<std::int64_t>(type))
                            .bindBytes(data)
+                           .bind(place)
                            .step();
     return result == SQLITE_DONE ? kSuccess : fail(result);
 }
@@ -383,24 +446,46 @@ Status EmbeddedRegistry::deleteValue(KeyHandle key, std::string_view name) {
     return kSuccess;
 }
 
+Status EmbeddedRegistry::readAhead(const OpenKey& open, std::uint32_t skip, std::vector<Subkey>& rows) {
+    Query next = query(Sql::nextKeys);
+    int result = next.bind(open.id).bind(std::string_view(open.keys.fold)).bind(skip).step();
+    for (; result == SQLITE_ROW; result = next.step()) {
+        rows.push_back(
+            {next.number(0), std::string(next.bytes(1)), std::string(next.bytes(2)), std::string(next.bytes(3))});
+    }
+    return result == SQLITE_DONE ? kSuccess : fail(result);
+}
+
 Status EmbeddedRegistry::enumerateKey(KeyHandle key, std::uint32_t index, Buffer& name, Buffer* keyClass) {
     OpenKey* open = nullptr;
     if (const Status status = keyOf(key, kKeyEnumerateSubkeys, open); status != kSuccess) {
         return status;
     }
-    if (index < open->keys.index) {
-        open->keys = {};
+    KeyPlace& place = open->keys;
+    if (index < place.index) {
+        place = {};
     }
-    Query next = query(Sql::nextKey);
-    const int result =
-        next.bind(open->id).bind(std::string_view(open->keys.fold)).bind(index - open->keys.index).step();
-    if (result != SQLITE_ROW) {
-        return result == SQLITE_DONE ? kNoMoreItems : fail(result);
+    const std::uint32_t skip = index - place.index;
+    if (place.next + skip < place.ahead.size()) {
+        place.next += skip;
+    } else {
+        std::vector<Subkey> rows;
+        if (const Status status = readAhead(*open, skip, rows); status != kSuccess) {
+            return status;
+        }
+        if (rows.empty()) {
+            childless_ = index == 0 ? open->id : childless_;
+            return kNoMoreItems;
+        }
+        place.ahead = std::move(rows);
+        place.next = 0;
     }
-    const Status named = giveName(next.bytes(1), name);
-    const Status classed = keyClass == nullptr ? kSuccess : giveName(next.bytes(2), *keyClass);
-    const std::string fold(next.bytes(0));
-    open->keys = {index, fold};
+    const Subkey& found = place.ahead[place.next];
+    place.index = index;
+    place.fold = found.fold;
+    remember(open->id, found.fold, found.id);
+    const Status named = giveName(found.name, name);
+    const Status classed = keyClass == nullptr ? kSuccess : giveName(found.keyClass, *keyClass);
     return named != kSuccess ? named : classed;
 }
 
@@ -428,39 +513,32 @@ Status EmbeddedRegistry::enumerateValue(KeyHandle key, std::uint32_t index, Buff
 }
 
 Status EmbeddedRegistry::deleteKey(KeyHandle parent, std::string_view path, AccessMask view) {
-    KeyId id = 0;
-    if (const Status status = find(parent, path, view, false, {}, id); status != kSuccess) {
+    Found found;
+    if (const Status status = find(parent, path, view, false, {}, found); status != kSuccess) {
         return status;
     }
-    if (id == kMachineId || id == kUsersId) {
+    if (found.id == kMachineId || found.id == kUsersId) {
         return kAccessDenied;
     }
-    int result = query(Sql::hasSubkey).bind(id).step();
-    if (result != SQLITE_DONE) {
-        return result == SQLITE_ROW ? kAccessDenied : fail(result);
-    }
-    result = query(Sql::deleteValues).bind(id).step();
-    if (result != SQLITE_DONE) {
-        return fail(result);
-    }
-    Query remove = query(Sql::deleteKey);
-    result = remove.bind(id).step();
-    if (result != SQLITE_ROW) {
-        return fail(result);
-    }
-    const KeyId above = remove.number(0);
-    const std::string_view fold = remove.bytes(1);
-    for (OpenKey& open : open_) {
-        if (open.used && open.id == above && fold < open.keys.fold) {
-            --open.keys.index;
+    if (found.fold.empty()) {
+        Query above = query(Sql::keyAbove);
+        if (const int result = above.bind(found.id).step(); result != SQLITE_ROW) {
+            return fail(result);
         }
-        open.deleted = open.deleted || open.id == id;
+        found.parent = above.number(0);
+        found.fold = above.bytes(1);
     }
-    for (std::size_t depth = 0; depth < lastPath_.size(); ++depth) {
-        if (lastPath_[depth].id == id) {
-            lastPath_.resize(depth);
+    if (childless_ != found.id) {
+        if (const int result = query(Sql::hasSubkey).bind(found.id).step(); result != SQLITE_DONE) {
+            return result == SQLITE_ROW ? kAccessDenied : fail(result);
         }
     }
+    for (const Sql step : {Sql::deleteValues, Sql::deleteKey}) {
+        if (const int result = query(step).bind(found.id).step(); result != SQLITE_DONE) {
+            return fail(result);
+        }
+    }
+    subkeyDeleted(found);
     return kSuccess;
 }
 

@@ -45,11 +45,19 @@ private:
     enum class Sql : std::size_t;
     using KeyId = std::int64_t;
 
+    struct Subkey {
+        KeyId id = 0;
+        std::string fold;
+        std::string name;
+        std::string keyClass;
+    };
     // Where an enumeration stands: `index` items lie before the mark. Kept as a name or number, never as an
     // open cursor.
     struct KeyPlace {
         std::uint32_t index = 0;
-        std::string fold;  // empty: before the first
+        std::string fold;           // empty: before the first
+        std::vector<Subkey> ahead;  // read already; the one at `next` is the first behind the mark
+        std::size_t next = 0;
     };
     struct ValuePlace {
         std::uint32_t index = 0;
@@ -65,10 +73,18 @@ private:
         KeyPlace keys;
         ValuePlace values;
     };
-    // One name of the path that was followed last, so that the next one starts where they part.
-    struct Step {
+    // A subkey that was looked up, made or enumerated in this transaction.
+    struct KnownSubkey {
+        std::uint64_t transaction = 0;
+        KeyId parent = 0;
+        KeyId id = 0;
         std::string fold;
-        KeyId id;
+    };
+    // Where a path led.
+    struct Found {
+        KeyId id = 0;
+        KeyId parent = 0;
+        std::string fold;  // empty: no step was made
     };
 
     Status begin();
@@ -83,24 +99,33 @@ private:
     Status keyOf(KeyHandle handle, AccessMask needed, OpenKey*& open);
     Status currentUser(KeyId& id);
     Status child(KeyId parent, std::string_view fold, KeyId& id);
+    Status nextPlace(KeyId key, std::int64_t& place);
     Status addChild(KeyId parent, std::string_view name, std::string_view fold, std::string_view keyClass, KeyId& id);
     Status find(KeyHandle parent, std::string_view path, AccessMask access, bool create, std::string_view keyClass,
-                KeyId& id);
+                Found& found);
+    KnownSubkey& knownSlot(KeyId parent, std::string_view fold);
+    void remember(KeyId parent, std::string_view fold, KeyId id);
+    Status readAhead(const OpenKey& open, std::uint32_t skip, std::vector<Subkey>& rows);
+    void subkeyAdded(KeyId parent, std::string_view fold);
+    void subkeyDeleted(const Found& gone);
 
     StoreFile file_;
     bool readOnly_;
     FaultListener listener_;
     // Before the statements: they must be gone when the connection closes.
     Connection connection_;
-    std::array<Statement, 11> statements_;
+    std::array<Statement, 13> statements_;
     Status fault_ = kSuccess;  // met in this transaction; every operation answers it until the next mark
     bool inTransaction_ = false;
     std::uint64_t transaction_ = 0;
     std::int64_t logPages_ = 0;
     std::vector<OpenKey> open_;  // the roots first
     std::vector<std::uint32_t> free_;
-    std::vector<Step> lastPath_;  // below lastRoot_
-    KeyId lastRoot_ = 0;
+    std::array<KnownSubkey, 256> known_;
+    KeyId childless_ = 0;  // the key that was last seen to have no subkey
+    // The key that got the last new value, and the highest place in it.
+    KeyId placedKey_ = 0;
+    std::int64_t highestPlace_ = 0;
 };
 
 }  // namespace kz7

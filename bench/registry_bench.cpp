@@ -1,0 +1,290 @@
+// The registry layer on the embedded store against bare SQLite: the writes of an add, copies and deletions of
+// trees in three shapes, enumeration by index, the list of copies.
+#include <benchmark/benchmark.h>
+
+#include <cstdlib>
+#include <filesystem>
+#include <string>
+#include <vector>
+
+#include "install/platform/standard_console.h"
+#include "install/platform/embedded/debug_output.h"
+#include "install/platform/embedded/registry.h"
+#include "install/src/copies/install_copy_list.h"
+#include "install/src/registry_access.h"
+
+namespace kz7 {
+namespace {
+
+class Scratch {
+public:
+    Scratch() {
+        std::string pattern = std::filesystem::temp_directory_path() / "kz7bench.XXXXXX";
+        if (mkdtemp(pattern.data()) == nullptr) {
+            std::abort();
+        }
+        path_ = pattern;
+    }
+    ~Scratch() { std::filesystem::remove_all(path_); }
+    Scratch(const Scratch&) = delete;
+    Scratch& operator=(const Scratch&) = delete;
+
+    const std::string& path() const { return path_; }
+
+private:
+    std::string path_;
+};
+
+void require(bool held) {
+    if (!held) {
+        std::abort();
+    }
+}
+
+EmbeddedRegistry openStore(const Scratch& scratch) {
+    return {scratch.path(), false, [](const StoreFault&) { std::abort(); }};
+}
+
+// The tables of the store without anything around them.
+class BareStore {
+public:
+    explicit BareStore(const Scratch& scratch) {
+        const StoreFile file(scratch.path());
+        require(file.openForWriting(connection_).status == kSuccess);
+        addKey_ = prepare("INSERT INTO key (parent, fold, name, class) VALUES (?, ?, ?, '')");
+        addValue_ = prepare("INSERT INTO value (key, fold, name, type, data, place) VALUES (?, ?, ?, 1, ?, ?)");
+        values_ = prepare("SELECT fold, data, place FROM value WHERE key = ? ORDER BY place");
+        deleteValues_ = prepare("DELETE FROM value WHERE key = ?");
+        deleteKey_ = prepare("DELETE FROM key WHERE id = ?");
+        findKey_ = prepare("SELECT id FROM key WHERE parent = ? AND fold = ?");
+    }
+
+    void run(const char* sql) { require(execute(connection_.get(), sql) == SQLITE_OK); }
+
+    std::int64_t addKey(std::int64_t parent, std::string_view name) {
+        require(Query(addKey_.get(), SQLITE_OK).bind(parent).bind(name).bind(name).step() == SQLITE_DONE);
+        return sqlite3_last_insert_rowid(connection_.get());
+    }
+    void addValue(std::int64_t key, std::string_view name, std::string_view data, std::int64_t place) {
+        require(Query(addValue_.get(), SQLITE_OK).bind(key).bind(name).bind(name).bindBytes(data).bind(place).step() ==
+                SQLITE_DONE);
+    }
+    std::int64_t find(std::int64_t parent, std::string_view name) {
+        Query query(findKey_.get(), SQLITE_OK);
+        require(query.bind(parent).bind(name).step() == SQLITE_ROW);
+        return query.number(0);
+    }
+
+    // The hand-written loops: a prepared statement for each level, its cursor kept open.
+    void copy(std::int64_t source, std::int64_t target, std::size_t depth = 0) {
+        {
+            Query values(values_.get(), SQLITE_OK);
+            values.bind(source);
+            while (values.step() == SQLITE_ROW) {
+                addValue(target, values.bytes(0), values.bytes(1), values.number(2));
+            }
+        }
+        Query rows(children(depth), SQLITE_OK);
+        rows.bind(source);
+        while (rows.step() == SQLITE_ROW) {
+            copy(rows.number(0), addKey(target, rows.bytes(1)), depth + 1);
+        }
+    }
+    void remove(std::int64_t key, std::size_t depth = 0) {
+        {
+            Query rows(children(depth), SQLITE_OK);
+            rows.bind(key);
+            while (rows.step() == SQLITE_ROW) {
+                remove(rows.number(0), depth + 1);
+            }
+        }
+        require(Query(deleteValues_.get(), SQLITE_OK).bind(key).step() == SQLITE_DONE);
+        require(Query(deleteKey_.get(), SQLITE_OK).bind(key).step() == SQLITE_DONE);
+    }
+
+private:
+    Statement prepare(const char* sql) {
+        sqlite3_stmt* statement = nullptr;
+        require(sqlite3_prepare_v2(connection_.get(), sql, -1, &statement, nullptr) == SQLITE_OK);
+        return Statement(statement);
+    }
+
+    sqlite3_stmt* children(std::size_t depth) {
+        if (depth == children_.size()) {
+            children_.push_back(prepare("SELECT id, fold FROM key WHERE parent = ? ORDER BY fold"));
+        }
+        return children_[depth].get();
+    }
+
+    Connection connection_;
+    std::vector<Statement> children_;
+    Statement addKey_, addValue_, values_, deleteValues_, deleteKey_, findKey_;
+};
+
+// Shapes of a tree with about `count` values below SOURCE: up to a hundred to a key in a balanced tree, one in
+// each of as many keys under one parent, all in one key.
+enum Shape { balanced, wide, flat };
+
+void fillBalanced(BareStore& store, std::int64_t key, std::int64_t count) {
+    const std::int64_t here = count <= 100 ? count : 10;
+    for (std::int64_t i = 0; i < here; ++i) {
+        store.addValue(key, "VALUE" + std::to_string(i), "some text of a value", i + 1);
+    }
+    for (std::int64_t i = 0; here < count && i < 10; ++i) {
+        fillBalanced(store, store.addKey(key, "KEY" + std::to_string(i)), (count - here) / 10);
+    }
+}
+
+void fill(const Scratch& scratch, Shape shape, std::int64_t count) {
+    BareStore store(scratch);
+    store.run("BEGIN IMMEDIATE");
+    const std::int64_t source = store.addKey(1, "SOURCE");
+    if (shape == balanced) {
+        fillBalanced(store, source, count);
+    }
+    for (std::int64_t i = 0; shape == wide && i < count; ++i) {
+        store.addValue(store.addKey(source, "KEY" + std::to_string(i)), "VALUE", "some text of a value", 1);
+    }
+    for (std::int64_t i = 0; shape == flat && i < count; ++i) {
+        store.addValue(source, "VALUE" + std::to_string(i), "some text of a value", i + 1);
+    }
+    store.run("COMMIT; PRAGMA wal_checkpoint(TRUNCATE)");
+}
+
+void arguments(benchmark::internal::Benchmark* bench) {
+    for (const int shape : {balanced, wide, flat}) {
+        for (const std::int64_t count : {1000, 10000, 100000, 1000000}) {
+            bench->Args({shape, count});
+        }
+    }
+    bench->ArgNames({"shape", "values"})->Iterations(1)->Unit(benchmark::kMillisecond);
+}
+
+void treeCopy(benchmark::State& state) {
+    const Scratch scratch;
+    fill(scratch, static_cast<Shape>(state.range(0)), state.range(1));
+    EmbeddedRegistry registry = openStore(scratch);
+    for (auto step : state) {
+        require(TreeCopy(registry).copy(KeyHandle::localMachine, "SOURCE", KeyHandle::localMachine, "TARGET", true) ==
+                1);
+    }
+    state.SetItemsProcessed(state.range(1));
+}
+BENCHMARK(treeCopy)->Apply(arguments);
+
+void treeCopyBare(benchmark::State& state) {
+    const Scratch scratch;
+    fill(scratch, static_cast<Shape>(state.range(0)), state.range(1));
+    BareStore store(scratch);
+    store.run("BEGIN IMMEDIATE");
+    for (auto step : state) {
+        store.copy(store.find(1, "SOURCE"), store.addKey(1, "TARGET"));
+    }
+    state.SetItemsProcessed(state.range(1));
+}
+BENCHMARK(treeCopyBare)->Apply(arguments);
+
+void treeDelete(benchmark::State& state) {
+    const Scratch scratch;
+    fill(scratch, static_cast<Shape>(state.range(0)), state.range(1));
+    EmbeddedRegistry registry = openStore(scratch);
+    for (auto step : state) {
+        require(deleteTree(registry, KeyHandle::localMachine, "SOURCE", 0, {}, {}) == kSuccess);
+    }
+    state.SetItemsProcessed(state.range(1));
+}
+BENCHMARK(treeDelete)->Apply(arguments);
+
+void treeDeleteBare(benchmark::State& state) {
+    const Scratch scratch;
+    fill(scratch, static_cast<Shape>(state.range(0)), state.range(1));
+    BareStore store(scratch);
+    store.run("BEGIN IMMEDIATE");
+    for (auto step : state) {
+        store.remove(store.find(1, "SOURCE"));
+    }
+    state.SetItemsProcessed(state.range(1));
+}
+BENCHMARK(treeDeleteBare)->Apply(arguments);
+
+// One step of an enumeration that stands at the index asked for.
+void enumerateAt(benchmark::State& state) {
+    const Scratch scratch;
+    fill(scratch, state.range(0) == 0 ? wide : flat, 100000 + 10000);
+    EmbeddedRegistry registry = openStore(scratch);
+    OwnedKey key(registry);
+    FixedBuffer<260> name;
+    require(registry.openKey(KeyHandle::localMachine, "SOURCE", kKeyRead, key.receive()) == kSuccess);
+    const auto enumerate = [&](std::uint32_t index) {
+        return state.range(0) == 0 ? registry.enumerateKey(key.get(), index, name, nullptr)
+                                   : registry.enumerateValue(key.get(), index, name, nullptr, nullptr);
+    };
+    auto index = static_cast<std::uint32_t>(state.range(1));
+    require(enumerate(index) == kSuccess);
+    for (auto step : state) {
+        require(enumerate(++index) == kSuccess);
+    }
+}
+BENCHMARK(enumerateAt)->ArgNames({"values", "index"})->ArgsProduct({{0, 1}, {10, 100000}})->Iterations(9000);
+
+// The forty-some writes of an add, in one transaction that is committed.
+void addWrites(benchmark::State& state) {
+    const Scratch scratch;
+    EmbeddedRegistry registry = openStore(scratch);
+    std::int64_t round = 0;
+    for (auto step : state) {
+        const std::string root = "SOFTWARE\\NVQ\\KZ7\\InstalledCopies\\COPY" + std::to_string(++round);
+        for (int key = 0; key < 9; ++key) {
+            const std::string path = root + "\\KEY" + std::to_string(key);
+            for (int value = 0; value < 5; ++value) {
+                require(setText(registry, path, "VALUE" + std::to_string(value), "some text of a value") == kSuccess);
+            }
+        }
+        require(registry.commit() == kSuccess);
+    }
+}
+BENCHMARK(addWrites)->Iterations(2000)->Unit(benchmark::kMicrosecond);
+
+void addWritesBare(benchmark::State& state) {
+    const Scratch scratch;
+    BareStore store(scratch);
+    store.run("BEGIN IMMEDIATE");
+    const std::int64_t root = store.addKey(1, "ROOT");
+    store.run("COMMIT");
+    std::int64_t round = 0;
+    for (auto step : state) {
+        store.run("BEGIN IMMEDIATE");
+        const std::int64_t copy = store.addKey(root, "COPY" + std::to_string(++round));
+        for (int key = 0; key < 9; ++key) {
+            const std::int64_t id = store.addKey(copy, "KEY" + std::to_string(key));
+            for (int value = 0; value < 5; ++value) {
+                store.addValue(id, "VALUE" + std::to_string(value), "some text of a value", value + 1);
+            }
+        }
+        store.run("COMMIT");
+    }
+}
+BENCHMARK(addWritesBare)->Iterations(2000)->Unit(benchmark::kMicrosecond);
+
+// Building the list of installed copies and finding the last one by name.
+void copiesList(benchmark::State& state) {
+    const Scratch scratch;
+    EmbeddedRegistry registry = openStore(scratch);
+    for (std::int64_t i = 0; i < state.range(0); ++i) {
+        const std::string path = "SOFTWARE\\NVQ\\KZ7\\InstalledCopies\\COPY" + std::to_string(i);
+        require(setText(registry, path, "KZ7 Path Name", "C:\\KZ7") == kSuccess &&
+                setText(registry, path + "\\Components", "BASE_CLIENT", "") == kSuccess);
+    }
+    StandardConsole console;
+    EmbeddedDebugOutput debug(console);
+    for (auto step : state) {
+        InstallCopyList copies(registry, debug, false, false);
+        require(copies.count() == state.range(0) && copies.findByName("copy9") != nullptr);
+        require(copies.findByName("none") == nullptr);
+    }
+    state.SetItemsProcessed(state.iterations() * state.range(0));
+}
+BENCHMARK(copiesList)->Arg(100)->Arg(1000)->Arg(10000)->Unit(benchmark::kMillisecond);
+
+}  // namespace
+}  // namespace kz7
