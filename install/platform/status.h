@@ -11,19 +11,27 @@ using Status = std::uint32_t;
 // clang-format off
 inline constexpr Status kSuccess                 = 0;
 inline constexpr Status kFileNotFound            = 2;     // also: no such key, no such value
+inline constexpr Status kPathNotFound            = 3;     // a folder of a path is missing
+inline constexpr Status kTooManyOpenFiles        = 4;
 inline constexpr Status kAccessDenied            = 5;     // also: a key that still has subkeys, a right the handle lacks
 inline constexpr Status kInvalidHandle           = 6;
 inline constexpr Status kOutOfMemory             = 14;
 inline constexpr Status kWriteFault              = 29;    // a stream does not take what is written
+inline constexpr Status kGeneralFailure          = 31;    // a device or resource failed in a way that has no number
 inline constexpr Status kInvalidParameter        = 87;
+inline constexpr Status kBrokenPipe              = 109;   // every write end of a pipe that is read is closed
 inline constexpr Status kDiskFull                = 112;
 inline constexpr Status kCallNotImplemented      = 120;
 inline constexpr Status kInvalidName             = 123;   // a service name that no service can have
 inline constexpr Status kBadPathname             = 161;
+inline constexpr Status kTooManyThreads          = 164;   // the host starts no further thread
 inline constexpr Status kBusy                    = 170;   // the store stayed locked by another writer
 inline constexpr Status kFilenameExceedsRange    = 206;   // a path that does not fit its buffer
+inline constexpr Status kPipeClosing             = 232;   // the read end of a pipe that is written is closed
 inline constexpr Status kMoreData                = 234;
+inline constexpr Status kWaitTimedOut            = 258;   // what is waited for has not ended
 inline constexpr Status kNoMoreItems             = 259;
+inline constexpr Status kBadDirectory            = 267;   // a program's working directory is none
 inline constexpr Status kBadKey                  = 1010;
 inline constexpr Status kCannotOpen              = 1011;  // the store cannot be opened or made
 inline constexpr Status kRegistryCorrupt         = 1015;
@@ -37,7 +45,14 @@ inline constexpr Status kServiceMarkedForDelete  = 1072;
 inline constexpr Status kServiceExists           = 1073;
 inline constexpr Status kDuplicateServiceName    = 1078;
 inline constexpr Status kRevisionMismatch        = 1306;  // the store was written by a newer program
+inline constexpr Status kNoMemoryForThread       = 5002;
+inline constexpr Status kNullArgument            = 5003;
+inline constexpr Status kNoProgramType           = 5005;  // a command that names no file of a known program type
+inline constexpr Status kBufferTooSmall          = 5006;
 inline constexpr Status kMissingItem             = 5021;  // the installer runtime's "not there"
+inline constexpr Status kNotExecuted             = 5030;  // a run that was waited for before it was executed
+inline constexpr Status kExitCodeUnavailable     = 5082;  // also: the program could not be started
+inline constexpr Status kThreadStartFailed       = 5111;
 // clang-format on
 
 constexpr bool succeeded(Status status) {

@@ -7,9 +7,10 @@
 #include <csignal>
 #include <cstdlib>
 
-#include "install/platform/embedded/console.h"
+#include "install/platform/standard_console.h"
 #include "install/platform/embedded/debug_output.h"
 #include "install/platform/embedded/file_system.h"
+#include "install/platform/embedded/process_host.h"
 #include "install/platform/embedded/registry.h"
 #include "install/platform/embedded/services.h"
 
@@ -51,7 +52,7 @@ private:
     bool byDefault_;
     bool faultTold_ = false;
     std::string directory_;
-    EmbeddedConsole console_;
+    StandardConsole console_;
     EmbeddedDebugOutput debugOutput_;
     EmbeddedFileSystem files_;
     EmbeddedRegistry registry_;
@@ -61,6 +62,7 @@ private:
 }  // namespace
 
 std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options) {
+    settleInheritedState();
     // A reader that went away or a file at its limit is a status of the write, never the end of a half-done run.
     std::signal(SIGPIPE, SIG_IGN);
     std::signal(SIGXFSZ, SIG_IGN);
