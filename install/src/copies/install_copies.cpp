@@ -1,0 +1,84 @@
+#include "install/src/copies/install_copies.h"
+
+#include <algorithm>
+
+namespace kz7 {
+namespace {
+
+constexpr std::uint32_t kCopyNameRoom = 256;  // bytes, the terminator included
+
+}  // namespace
+
+InstallCopyInfo::InstallCopyInfo(RegistryValues& values, std::string_view name, std::string_view copiesKey)
+    : name_(name) {
+    const std::string key = compose("%s\\%s\\CurrentVersion", {copiesKey, name});
+    version_ = values.getValue(key, "Version");
+    release_ = values.getValue(key, "Release");
+    modification_ = values.getValue(key, "Modification");
+    fixLevel_ = values.getValue(key, "Fix Level");
+    if (fixLevel_.empty()) {
+        fixLevel_.push_back('0');
+    }
+    versionText_ = version_ + '.' + release_ + '.' + modification_ + '.' + fixLevel_;
+    valid_ = !version_.empty() && !release_.empty() && !modification_.empty();
+}
+
+Status readInstallCopies(RegistryValues& values, CopiesByName& byName, CopiesByVersion& byVersion) {
+    byName.clear();
+    byVersion.clear();
+    IRegistryStore& registry = values.registry();
+    OwnedKey key(registry);
+    if (!succeeded(registry.openKey(KeyHandle::localMachine, kCopiesKey, kKeyReadSet, key.receive()))) {
+        values.debug().write(compose("Failed to open the registry key:%s", {kCopiesKey}));
+        return kFailed;
+    }
+    FixedBuffer<kCopyNameRoom> name;
+    for (std::uint32_t index = 0; succeeded(registry.enumerateKey(key.get(), index, name, nullptr)); ++index) {
+        const InstallCopyInfo copy(values, name.text());
+        byName.insert_or_assign(copy.getName(), copy);
+        if (copy.isValid()) {
+            byVersion.insert_or_assign(copy.getVersion(), copy);
+        }
+        values.debug().write(compose("%s version info of Install Copy '%s'",
+                                     {std::string_view(copy.isValid() ? "Valid" : "Invalid"), copy.getName()}));
+    }
+    return kSuccess;
+}
+
+std::size_t commonLength(std::string_view left, std::string_view right) {
+    const auto [end, other] = std::mismatch(left.begin(), left.end(), right.begin(), right.end());
+    return static_cast<std::size_t>(end - left.begin());
+}
+
+HighestVersions::HighestVersions(const CopiesByVersion& copies) {
+    leading_.reserve(copies.size());
+    exact_.reserve(copies.size());
+    // From the greatest text down, the first that has a prefix is the one to keep.
+    std::string_view greater;
+    for (auto copy = copies.rbegin(); copy != copies.rend(); ++copy) {
+        const std::string_view text = copy->first;
+        exact_.try_emplace(text, &copy->second);
+        // A dot within what both texts share ends a prefix that the greater one has answered.
+        std::size_t dot = text.find('.', commonLength(text, greater));
+        for (; dot != std::string_view::npos; dot = text.find('.', dot + 1)) {
+            leading_.try_emplace(text.substr(0, dot), &copy->second);
+        }
+        greater = text;
+    }
+}
+
+const InstallCopyInfo* HighestVersions::leadingBy(std::string_view prefix, bool exact) const {
+    const Table& table = exact ? exact_ : leading_;
+    const auto found = table.find(prefix);
+    return found == table.end() ? nullptr : found->second;
+}
+
+std::size_t HighestVersions::Hash::operator()(std::string_view text) const {
+    std::uint64_t hash = 14695981039346656037U;  // FNV-1a
+    for (const char c : text) {
+        hash = (hash ^ static_cast<unsigned char>(foldUpper(c))) * 1099511628211U;
+    }
+    return static_cast<std::size_t>(hash);
+}
+
+}  // namespace kz7

@@ -1,0 +1,79 @@
+// The installed copies as the version aliases see them: the record of one copy, the list of all, and the
+// answer to "which copy is the highest of those whose version begins with this?".
+#pragma once
+
+#include <map>
+#include <string>
+#include <string_view>
+#include <unordered_map>
+
+#include "install/platform/text.h"
+#include "install/src/copies/registry_values.h"
+
+namespace kz7 {
+
+// The two views of the key that holds a subkey for every copy and, as values, the version aliases.
+inline constexpr std::string_view kCopiesKey = "SOFTWARE\\NVQ\\KZ7\\InstalledCopies";
+inline constexpr std::string_view kCopiesKey32 = "SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies";
+
+// One copy. The version text joins its four fields with dots; texts, not numbers, are what orders copies:
+// 10.1.0.0 is below 9.7.0.0.
+class InstallCopyInfo {
+public:
+    InstallCopyInfo() = default;
+
+    // Reads the copy below `copiesKey`. It never fails: what cannot be read stays empty.
+    InstallCopyInfo(RegistryValues& values, std::string_view name, std::string_view copiesKey = kCopiesKey);
+
+    const std::string& getName() const { return name_; }
+    const std::string& getVersion() const { return versionText_; }
+
+    // Version, release and modification are there; a missing fix level counts as "0".
+    bool isValid() const { return valid_; }
+
+private:
+    std::string name_;
+    std::string versionText_;
+    std::string version_;
+    std::string release_;
+    std::string modification_;
+    std::string fixLevel_;
+    bool valid_ = false;
+};
+
+using CopiesByName = std::map<std::string, InstallCopyInfo>;
+using CopiesByVersion = std::map<std::string, InstallCopyInfo>;  // valid copies only; bytes compare unsigned
+
+// Reads the copies below the native view's key, in the order in which it lists them: of two copies with one
+// version text the later stays. kFailed when the key cannot be opened, both maps are then empty.
+Status readInstallCopies(RegistryValues& values, CopiesByName& byName, CopiesByVersion& byVersion);
+
+// The highest copy for every prefix, from one pass over the copies in the order of their version texts. It
+// refers to the map, which must stay as it is.
+class HighestVersions {
+public:
+    explicit HighestVersions(const CopiesByVersion& copies);
+
+    // The copy with the greatest version text that begins with `prefix` and a dot, or that is `exact`ly
+    // `prefix`, without regard to case. Null when there is none.
+    const InstallCopyInfo* leadingBy(std::string_view prefix, bool exact) const;
+
+private:
+    // Prefixes that are equal but for case are no neighbours in the order of texts (a lower-case letter sorts
+    // above every upper-case one), so they meet in a table of their own.
+    struct Hash {
+        std::size_t operator()(std::string_view text) const;
+    };
+    struct Equal {
+        bool operator()(std::string_view left, std::string_view right) const { return equalsIgnoreCase(left, right); }
+    };
+    using Table = std::unordered_map<std::string_view, const InstallCopyInfo*, Hash, Equal>;
+
+    Table leading_;
+    Table exact_;
+};
+
+// How many bytes two texts have in common from their beginning.
+std::size_t commonLength(std::string_view left, std::string_view right);
+
+}  // namespace kz7
