@@ -18,12 +18,9 @@ inline constexpr Status kWriteFault              = 29;    // a stream does not t
 inline constexpr Status kInvalidParameter        = 87;
 inline constexpr Status kDiskFull                = 112;
 inline constexpr Status kCallNotImplemented      = 120;
-<<<<<<< HEAD
 inline constexpr Status kInvalidName             = 123;   // a service name that no service can have
-=======
 inline constexpr Status kModuleNotFound          = 126;   // no library of that path, or one that cannot be loaded
 inline constexpr Status kProcedureNotFound       = 127;   // the library has no such entry point
->>>>>>> 44e6fd4 (Compute the version aliases in one pass and rewrite them in both views)
 inline constexpr Status kBadPathname             = 161;
 inline constexpr Status kBusy                    = 170;   // the store stayed locked by another writer
 inline constexpr Status kFilenameExceedsRange    = 206;   // a path that does not fit its buffer
@@ -43,7 +40,7 @@ inline constexpr Status kServiceExists           = 1073;
 inline constexpr Status kDuplicateServiceName    = 1078;
 inline constexpr Status kRevisionMismatch        = 1306;  // the store was written by a newer program
 inline constexpr Status kMissingItem             = 5021;  // the installer runtime's "not there"
-inline constexpr Status kFailed                  = 0xFFFFFFFF;  // -1: the copies list and the alias rewrite say no more
+inline constexpr Status kFailed                  = 0xFFFFFFFF;  // -1: the alias rewrite says no more
 // clang-format on
 
 constexpr bool succeeded(Status status) {

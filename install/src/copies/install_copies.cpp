@@ -28,8 +28,8 @@ Status readInstallCopies(RegistryValues& values, CopiesByName& byName, CopiesByV
     byVersion.clear();
     IRegistryStore& registry = values.registry();
     OwnedKey key(registry);
-    if (!succeeded(registry.openKey(KeyHandle::localMachine, kCopiesKey, kKeyReadSet, key.receive()))) {
-        values.debug().write(compose("Failed to open the registry key:%s", {kCopiesKey}));
+    if (!succeeded(registry.openKey(KeyHandle::localMachine, layout::kCopies, kKeyReadSet, key.receive()))) {
+        values.debug().write(compose("Failed to open the registry key:%s", {layout::kCopies}));
         return kFailed;
     }
     FixedBuffer<kCopyNameRoom> name;

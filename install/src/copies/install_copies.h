@@ -9,12 +9,9 @@
 
 #include "install/platform/text.h"
 #include "install/src/copies/registry_values.h"
+#include "install/src/copy_layout.h"
 
 namespace kz7 {
-
-// The two views of the key that holds a subkey for every copy and, as values, the version aliases.
-inline constexpr std::string_view kCopiesKey = "SOFTWARE\\NVQ\\KZ7\\InstalledCopies";
-inline constexpr std::string_view kCopiesKey32 = "SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies";
 
 // One copy. The version text joins its four fields with dots; texts, not numbers, are what orders copies:
 // 10.1.0.0 is below 9.7.0.0.
@@ -23,7 +20,7 @@ public:
     InstallCopyInfo() = default;
 
     // Reads the copy below `copiesKey`. It never fails: what cannot be read stays empty.
-    InstallCopyInfo(RegistryValues& values, std::string_view name, std::string_view copiesKey = kCopiesKey);
+    InstallCopyInfo(RegistryValues& values, std::string_view name, std::string_view copiesKey = layout::kCopies);
 
     const std::string& getName() const { return name_; }
     const std::string& getVersion() const { return versionText_; }

@@ -63,8 +63,8 @@ Status InstallCopiesProfile::openFully(std::string_view path, OwnedKey& key) {
 }
 
 Status InstallCopiesProfile::backupOldProfile() {
-    const Status status = backup(kCopiesKey, oldProfile_);
-    return succeeded(status) ? backup(kCopiesKey32, oldProfileWow_) : status;
+    const Status status = backup(layout::kCopies, oldProfile_);
+    return succeeded(status) ? backup(layout::kCopies32, oldProfileWow_) : status;
 }
 
 Status InstallCopiesProfile::backup(std::string_view path, AliasMap& profile) {
@@ -123,7 +123,7 @@ std::string InstallCopiesProfile::highestVersionLeadingBy(const HighestVersions&
 
 Status InstallCopiesProfile::deleteOldProfile() {
     bool allDeleted = true;
-    for (const std::string_view path : {kCopiesKey, kCopiesKey32}) {
+    for (const std::string_view path : {layout::kCopies, layout::kCopies32}) {
         if (!succeeded(deleteAliases(path, allDeleted))) {
             return kFailed;
         }
@@ -153,14 +153,14 @@ void InstallCopiesProfile::restoreOldProfile() {
             }
         }
     };
-    restore(kCopiesKey, oldProfile_);
-    restore(kCopiesKey32, oldProfileWow_);
+    restore(layout::kCopies, oldProfile_);
+    restore(layout::kCopies32, oldProfileWow_);
 }
 
 Status InstallCopiesProfile::writeProfile() {
     Status status = kSuccess;
     for (const auto& [prefix, copy] : profileInfo_) {
-        for (const std::string_view path : {kCopiesKey, kCopiesKey32}) {
+        for (const std::string_view path : {layout::kCopies, layout::kCopies32}) {
             if (!succeeded(values_.setValue(path, prefix, copy))) {
                 values_.debug().write(compose("Failed to update the value of '%s\\%s'", {path, prefix}));
                 status = kFailed;

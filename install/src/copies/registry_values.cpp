@@ -1,11 +1,12 @@
 #include "install/src/copies/registry_values.h"
 
 #include "install/platform/text.h"
+#include "install/src/registry_access.h"
 
 namespace kz7 {
 namespace {
 
-constexpr std::uint32_t kValueRoom = 100;  // bytes; a text without a terminator must leave room for one
+constexpr std::uint32_t kValueRoom = 100;  // bytes, the terminator included
 
 }  // namespace
 
@@ -23,8 +24,7 @@ std::string RegistryValues::query(std::string_view path, std::string_view name, 
         return {};
     }
     FixedBuffer<kValueRoom> data;
-    const Status status = registry_.queryValue(key.get(), name, nullptr, data);
-    if (!succeeded(status) || data.text().size() >= kValueRoom) {
+    if (!succeeded(queryText(registry_, key.get(), name, data))) {
         debug_.write(compose(complaint, {path, name}));
         return {};
     }
