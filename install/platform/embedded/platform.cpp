@@ -3,9 +3,11 @@
 
 #include <csignal>
 
+#include "install/platform/embedded/assembly_cache.h"
 #include "install/platform/embedded/console.h"
 #include "install/platform/embedded/debug_output.h"
 #include "install/platform/embedded/file_system.h"
+#include "install/platform/embedded/library_loader.h"
 #include "install/platform/embedded/registry.h"
 #include "install/platform/embedded/services.h"
 
@@ -23,13 +25,17 @@ public:
                     [this](const StoreFault& fault) {
                         console_.writeError(program_ + ": " + fault.file + ": " + fault.reason + "\n");
                     }),
-          services_(registry_, files_) {}
+          services_(registry_, files_),
+          libraries_(directory_),
+          assemblies_(registry_, directory_) {}
 
     IRegistryStore& registry() override { return registry_; }
     IServiceManager& services() override { return services_; }
     IConsole& console() override { return console_; }
     IDebugOutput& debugOutput() override { return debugOutput_; }
     IFileSystem& files() override { return files_; }
+    ILibraryLoader& libraries() override { return libraries_; }
+    IAssemblyCache& assemblies() override { return assemblies_; }
     std::string storeName() override { return registry_.path(); }
 
 private:
@@ -40,6 +46,8 @@ private:
     EmbeddedFileSystem files_;
     EmbeddedRegistry registry_;
     EmbeddedServiceManager services_;
+    EmbeddedLibraryLoader libraries_;
+    EmbeddedAssemblyCache assemblies_;
 };
 
 }  // namespace
