@@ -34,8 +34,8 @@ Status readInstallCopies(RegistryValues& values, CopiesByName& byName, CopiesByV
     }
     FixedBuffer<kCopyNameRoom> name;
     for (std::uint32_t index = 0; succeeded(registry.enumerateKey(key.get(), index, name, nullptr)); ++index) {
-        const InstallCopyInfo copy(values, name.text());
-        byName.insert_or_assign(copy.getName(), copy);
+        const InstallCopyInfo& copy =
+            byName.insert_or_assign(std::string(name.text()), InstallCopyInfo(values, name.text())).first->second;
         if (copy.isValid()) {
             byVersion.insert_or_assign(copy.getVersion(), copy);
         }

@@ -53,12 +53,14 @@ Status InstallCopiesProfile::rewrite() {
     return writeProfile();
 }
 
-Status InstallCopiesProfile::openFully(std::string_view path, OwnedKey& key) {
-    const Status status = values_.registry().openKey(KeyHandle::localMachine, path, kKeyFull, key.receive());
-    if (!succeeded(status)) {
+Status InstallCopiesProfile::listAliases(std::string_view path, std::vector<std::string>& names) {
+    IRegistryStore& registry = values_.registry();
+    OwnedKey key(registry);
+    if (!succeeded(registry.openKey(KeyHandle::localMachine, path, kKeyFull, key.receive()))) {
         values_.debug().write(compose("Failed to open the registry key: %s", {path}));
         return kFailed;
     }
+    names = kz7::listAliases(registry, key.get());
     return kSuccess;
 }
 
@@ -69,11 +71,11 @@ Status InstallCopiesProfile::backupOldProfile() {
 
 Status InstallCopiesProfile::backup(std::string_view path, AliasMap& profile) {
     profile.clear();
-    OwnedKey key(values_.registry());
-    if (!succeeded(openFully(path, key))) {
+    std::vector<std::string> names;
+    if (!succeeded(listAliases(path, names))) {
         return kFailed;
     }
-    for (const std::string& name : listAliases(values_.registry(), key.get())) {
+    for (const std::string& name : names) {
         profile[name] = values_.readValue(path, name);
     }
     return kSuccess;
@@ -132,11 +134,11 @@ Status InstallCopiesProfile::deleteOldProfile() {
 }
 
 Status InstallCopiesProfile::deleteAliases(std::string_view path, bool& allDeleted) {
-    OwnedKey key(values_.registry());
-    if (!succeeded(openFully(path, key))) {
+    std::vector<std::string> names;
+    if (!succeeded(listAliases(path, names))) {
         return kFailed;
     }
-    for (const std::string& name : listAliases(values_.registry(), key.get())) {
+    for (const std::string& name : names) {
         if (!succeeded(values_.deleteValue(path, name))) {
             values_.debug().write(compose("Failed to delete value name: %s\\%s", {path, name}));
             allDeleted = false;

@@ -46,7 +46,7 @@ public:
 
 private:
     Status rewrite();
-    Status openFully(std::string_view path, OwnedKey& key);
+    Status listAliases(std::string_view path, std::vector<std::string>& names);
     Status backup(std::string_view path, AliasMap& profile);
     Status deleteAliases(std::string_view path, bool& allDeleted);
     Status writeProfile();
