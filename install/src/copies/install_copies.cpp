@@ -1,11 +1,18 @@
 #include "install/src/copies/install_copies.h"
 
 #include <algorithm>
+#include <iterator>
 
 namespace kz7 {
 namespace {
 
 constexpr std::uint32_t kCopyNameRoom = 256;  // bytes, the terminator included
+
+std::size_t firstLetter(std::string_view text) {
+    const auto* letter =
+        std::find_if(text.begin(), text.end(), [](char c) { return foldUpper(c) >= 'A' && foldUpper(c) <= 'Z'; });
+    return letter == text.end() ? std::string_view::npos : static_cast<std::size_t>(letter - text.begin());
+}
 
 }  // namespace
 
@@ -50,27 +57,43 @@ std::size_t commonLength(std::string_view left, std::string_view right) {
     return static_cast<std::size_t>(end - left.begin());
 }
 
-HighestVersions::HighestVersions(const CopiesByVersion& copies) {
-    leading_.reserve(copies.size());
-    exact_.reserve(copies.size());
+void HighestVersions::fillTables() {
     // From the greatest text down, the first that has a prefix is the one to keep.
-    std::string_view greater;
-    for (auto copy = copies.rbegin(); copy != copies.rend(); ++copy) {
+    for (auto copy = copies_.rbegin(); copy != copies_.rend(); ++copy) {
         const std::string_view text = copy->first;
+        const std::size_t letter = firstLetter(text);
+        if (letter == std::string_view::npos) {
+            continue;
+        }
         exact_.try_emplace(text, &copy->second);
-        // A dot within what both texts share ends a prefix that the greater one has answered.
-        std::size_t dot = text.find('.', commonLength(text, greater));
-        for (; dot != std::string_view::npos; dot = text.find('.', dot + 1)) {
+        for (std::size_t dot = text.find('.', letter); dot != std::string_view::npos; dot = text.find('.', dot + 1)) {
             leading_.try_emplace(text.substr(0, dot), &copy->second);
         }
-        greater = text;
     }
 }
 
-const InstallCopyInfo* HighestVersions::leadingBy(std::string_view prefix, bool exact) const {
-    const Table& table = exact ? exact_ : leading_;
-    const auto found = table.find(prefix);
-    return found == table.end() ? nullptr : found->second;
+const InstallCopyInfo* HighestVersions::leadingBy(std::string_view prefix, bool exact) {
+    if (firstLetter(prefix) != std::string_view::npos) {
+        if (exact_.empty()) {
+            fillTables();
+        }
+        const Table& table = exact ? exact_ : leading_;
+        const auto found = table.find(prefix);
+        return found == table.end() ? nullptr : found->second;
+    }
+    if (exact) {
+        const auto copy = copies_.find(std::string(prefix));
+        return copy == copies_.end() ? nullptr : &copy->second;
+    }
+    // The texts that go on behind a dot lie together; the character behind the dot bounds them.
+    const std::string begin = std::string(prefix) + '.';
+    const auto behind = copies_.lower_bound(std::string(prefix) + static_cast<char>('.' + 1));
+    const auto last = behind == copies_.begin() ? copies_.end() : std::prev(behind);
+    return last != copies_.end() && last->first.starts_with(begin) ? &last->second : nullptr;
+}
+
+const InstallCopyInfo* HighestVersions::leadingByWhole(const CopiesByVersion::value_type& copy) {
+    return firstLetter(copy.first) == std::string::npos ? &copy.second : leadingBy(copy.first, true);
 }
 
 std::size_t HighestVersions::Hash::operator()(std::string_view text) const {

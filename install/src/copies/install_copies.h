@@ -45,19 +45,22 @@ using CopiesByVersion = std::map<std::string, InstallCopyInfo>;  // valid copies
 // version text the later stays. kFailed when the key cannot be opened, both maps are then empty.
 Status readInstallCopies(RegistryValues& values, CopiesByName& byName, CopiesByVersion& byVersion);
 
-// The highest copy for every prefix, from one pass over the copies in the order of their version texts. It
-// refers to the map, which must stay as it is.
+// The highest copy for every prefix. It refers to the map, which must stay as it is.
 class HighestVersions {
 public:
-    explicit HighestVersions(const CopiesByVersion& copies);
+    explicit HighestVersions(const CopiesByVersion& copies) : copies_(copies) {}
 
     // The copy with the greatest version text that begins with `prefix` and a dot, or that is `exact`ly
     // `prefix`, without regard to case. Null when there is none.
-    const InstallCopyInfo* leadingBy(std::string_view prefix, bool exact) const;
+    const InstallCopyInfo* leadingBy(std::string_view prefix, bool exact);
+
+    // The same for the whole text of a copy in the map, exactly: itself, unless another case of it is higher.
+    const InstallCopyInfo* leadingByWhole(const CopiesByVersion::value_type& copy);
 
 private:
-    // Prefixes that are equal but for case are no neighbours in the order of texts (a lower-case letter sorts
-    // above every upper-case one), so they meet in a table of their own.
+    // The texts that share a prefix lie together in the map, unless there are letters in it: those that are
+    // equal but for case lie apart (every lower-case letter is above every upper-case one) and meet in tables,
+    // which are made when the first such prefix is asked for.
     struct Hash {
         std::size_t operator()(std::string_view text) const;
     };
@@ -66,6 +69,9 @@ private:
     };
     using Table = std::unordered_map<std::string_view, const InstallCopyInfo*, Hash, Equal>;
 
+    void fillTables();
+
+    const CopiesByVersion& copies_;
     Table leading_;
     Table exact_;
 };

@@ -87,9 +87,10 @@ Status InstallCopiesProfile::generateInstallCopiesList() {
 
 Status InstallCopiesProfile::generateProfileInfo() {
     profileInfo_.clear();
-    const HighestVersions highest(copiesByVersion_);
+    HighestVersions highest(copiesByVersion_);
     std::string_view lesser;
-    for (const auto& [text, copy] : copiesByVersion_) {
+    for (const auto& copy : copiesByVersion_) {
+        const std::string_view text = copy.first;
         const std::size_t shared = commonLength(text, lesser);
         std::size_t component = 0;
         for (std::size_t end = 0; end <= text.size(); ++end) {
@@ -98,29 +99,29 @@ Status InstallCopiesProfile::generateProfileInfo() {
             if (end < shared) {
                 continue;  // the text before has this prefix too, and it answers alike
             }
-            const std::string_view prefix = std::string_view(text).substr(0, end);
-            std::string name = highestVersionLeadingBy(highest, prefix, component == kExactComponent);
-            if (name.empty()) {
-                values_.debug().write(compose("Did not find corrsponding install name for '%s'", {prefix}));
-            }
-            profileInfo_.insert_or_assign(profileInfo_.end(), std::string(prefix), std::move(name));
+            const std::string_view prefix = text.substr(0, end);
+            const bool exact = component == kExactComponent;
+            profileInfo_.insert_or_assign(
+                profileInfo_.end(), std::string(prefix),
+                nameFor(prefix,
+                        exact && end == text.size() ? highest.leadingByWhole(copy) : highest.leadingBy(prefix, exact)));
         }
         lesser = text;
     }
     return kSuccess;
 }
 
-std::string InstallCopiesProfile::highestVersionLeadingBy(const HighestVersions& highest, std::string_view prefix,
-                                                          bool exact) {
-    const InstallCopyInfo* copy = highest.leadingBy(prefix, exact);
-    if (copy == nullptr) {
-        values_.debug().write(compose("The highest version leading by '%s': ( none )", {prefix}));
+std::string InstallCopiesProfile::nameFor(std::string_view prefix, const InstallCopyInfo* highest) {
+    IDebugOutput& debug = values_.debug();
+    if (highest == nullptr) {
+        debug.write(compose("The highest version leading by '%s': ( none )", {prefix}));
+        debug.write(compose("Did not find corrsponding install name for '%s'", {prefix}));
         return {};
     }
     // Deliberate: the quotation mark is never closed; whoever searches traces knows the text so.
-    values_.debug().write(
-        compose("The highest version leading by '%s:%s--%s", {prefix, copy->getVersion(), copy->getName()}));
-    return copy->getName();
+    debug.write(
+        compose("The highest version leading by '%s:%s--%s", {prefix, highest->getVersion(), highest->getName()}));
+    return highest->getName();
 }
 
 Status InstallCopiesProfile::deleteOldProfile() {

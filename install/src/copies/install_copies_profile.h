@@ -50,7 +50,7 @@ private:
     Status backup(std::string_view path, AliasMap& profile);
     Status deleteAliases(std::string_view path, bool& allDeleted);
     Status writeProfile();
-    std::string highestVersionLeadingBy(const HighestVersions& highest, std::string_view prefix, bool exact);
+    std::string nameFor(std::string_view prefix, const InstallCopyInfo* highest);
 
     RegistryValues values_;
     CopiesByName copiesByName_;
