@@ -7,7 +7,7 @@
 #include <string>
 #include <vector>
 
-#include "install/platform/embedded/console.h"
+#include "install/platform/standard_console.h"
 #include "install/platform/embedded/debug_output.h"
 #include "install/platform/embedded/registry.h"
 #include "install/src/copies/install_copy_list.h"
@@ -275,7 +275,7 @@ void copiesList(benchmark::State& state) {
         require(setText(registry, path, "KZ7 Path Name", "C:\\KZ7") == kSuccess &&
                 setText(registry, path + "\\Components", "BASE_CLIENT", "") == kSuccess);
     }
-    EmbeddedConsole console;
+    StandardConsole console;
     EmbeddedDebugOutput debug(console);
     for (auto step : state) {
         InstallCopyList copies(registry, debug, false, false);

@@ -9,8 +9,10 @@
 #include "install/platform/debug_output.h"
 #include "install/platform/file_system.h"
 #include "install/platform/library_loader.h"
+#include "install/platform/process_host.h"
 #include "install/platform/registry_store.h"
 #include "install/platform/service_manager.h"
+#include "install/platform/threads.h"
 
 namespace kz7 {
 
@@ -18,6 +20,7 @@ struct PlatformOptions {
     std::string program;              // begins the lines that the platform itself writes on standard error
     std::string stateDirectory = {};  // where an embedded store lives; empty: this user's usual place
     bool readOnly = false;            // reads what is there, takes no writer's lock, creates nothing
+    bool plainStreams = false;        // standard input and output carry bytes, their line ends stay as they are
 };
 
 // The references stay valid as long as the platform. One thread.
@@ -30,11 +33,23 @@ public:
     virtual IConsole& console() = 0;
     virtual IDebugOutput& debugOutput() = 0;
     virtual IFileSystem& files() = 0;
+    virtual IProcessHost& processes() = 0;
+    virtual IThreads& threads() = 0;
     virtual ILibraryLoader& libraries() = 0;
     virtual IAssemblyCache& assemblies() = 0;
 
     // The store's name for people: the file it is kept in, or the machine's registry.
     virtual std::string storeName() = 0;
+
+    // What a person who looks at that store should know about its choice: a sentence without an end, mostly
+    // none.
+    virtual std::string storeNote() = 0;
+
+    // Whether the store is the programs' own and holds nothing else; else it is the whole machine's.
+    virtual bool storeIsOwn() = 0;
+
+    // Whether a fault of the store was told on standard error, so that its status needs no further line.
+    virtual bool storeFaultTold() = 0;
 };
 
 std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options);

@@ -1,15 +1,21 @@
 // This machine's ports on the embedded store.
 #include "install/platform/platform.h"
 
+#include <unistd.h>
+
+#include <cerrno>
 #include <csignal>
+#include <cstdlib>
 
 #include "install/platform/embedded/assembly_cache.h"
-#include "install/platform/embedded/console.h"
 #include "install/platform/embedded/debug_output.h"
 #include "install/platform/embedded/file_system.h"
 #include "install/platform/embedded/library_loader.h"
+#include "install/platform/embedded/process_host.h"
 #include "install/platform/embedded/registry.h"
 #include "install/platform/embedded/services.h"
+#include "install/platform/embedded/threads.h"
+#include "install/platform/standard_console.h"
 
 namespace kz7 {
 namespace {
@@ -18,14 +24,17 @@ class EmbeddedPlatform final : public IPlatform {
 public:
     explicit EmbeddedPlatform(const PlatformOptions& options)
         : program_(options.program),
+          byDefault_(options.stateDirectory.empty() && std::getenv("KZ7_STATE_DIR") == nullptr),
           directory_(options.stateDirectory.empty() ? usualStateDirectory() : options.stateDirectory),
           debugOutput_(console_),
           files_(directory_),
           registry_(directory_, options.readOnly,
                     [this](const StoreFault& fault) {
+                        faultTold_ = true;
                         console_.writeError(program_ + ": " + fault.file + ": " + fault.reason + "\n");
                     }),
           services_(registry_, files_),
+          processes_(directory_),
           libraries_(directory_),
           assemblies_(registry_, directory_) {}
 
@@ -34,18 +43,32 @@ public:
     IConsole& console() override { return console_; }
     IDebugOutput& debugOutput() override { return debugOutput_; }
     IFileSystem& files() override { return files_; }
+    IProcessHost& processes() override { return processes_; }
+    IThreads& threads() override { return threads_; }
     ILibraryLoader& libraries() override { return libraries_; }
     IAssemblyCache& assemblies() override { return assemblies_; }
     std::string storeName() override { return registry_.path(); }
+    bool storeIsOwn() override { return true; }
+    bool storeFaultTold() override { return faultTold_; }
+
+    std::string storeNote() override {
+        const std::string machine(kMachineStateDirectory);
+        const bool hidden = access((machine + "/registry.db").c_str(), R_OK) != 0 && errno == EACCES;
+        return byDefault_ && hidden ? machine + " exists too and cannot be read by you" : std::string{};
+    }
 
 private:
     std::string program_;
+    bool byDefault_;
+    bool faultTold_ = false;
     std::string directory_;
-    EmbeddedConsole console_;
+    StandardConsole console_;
     EmbeddedDebugOutput debugOutput_;
     EmbeddedFileSystem files_;
     EmbeddedRegistry registry_;
     EmbeddedServiceManager services_;
+    EmbeddedProcessHost processes_;
+    EmbeddedThreads threads_;
     EmbeddedLibraryLoader libraries_;
     EmbeddedAssemblyCache assemblies_;
 };
@@ -53,6 +76,7 @@ private:
 }  // namespace
 
 std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options) {
+    settleInheritedState();
     // A reader that went away or a file at its limit is a status of the write, never the end of a half-done run.
     std::signal(SIGPIPE, SIG_IGN);
     std::signal(SIGXFSZ, SIG_IGN);

@@ -14,7 +14,7 @@ constexpr std::int64_t kMachineId = 1;
 constexpr std::int64_t kUsersId = 2;
 constexpr std::uint32_t kRoots = 3;  // the first slots of the open keys
 constexpr std::int64_t kPageSize = 4096;
-constexpr std::int64_t kLogLimit = 256 * 1024;  // bytes of log that a run leaves to the next one
+constexpr std::int64_t kLogLimit = std::int64_t{256} * 1024;  // bytes of log that a run leaves to the next one
 
 // clang-format off
 constexpr std::array kSql = {
@@ -154,7 +154,7 @@ Query EmbeddedRegistry::query(Sql which) {
 EmbeddedRegistry::OpenKey* EmbeddedRegistry::slotOf(KeyHandle handle) {
     switch (handle) {
         case KeyHandle::localMachine:
-            return &open_[0];
+            return open_.data();
         case KeyHandle::users:
             return &open_[1];
         case KeyHandle::currentUser:

@@ -90,7 +90,7 @@ std::string usualStateDirectory() {
         return named;
     }
     if (geteuid() == 0) {
-        return "/var/lib/kz7";
+        return kMachineStateDirectory;
     }
     if (const std::string state = environment("XDG_STATE_HOME"); !state.empty()) {
         return state + "/kz7";

@@ -9,6 +9,8 @@
 
 namespace kz7 {
 
+inline constexpr const char* kMachineStateDirectory = "/var/lib/kz7";
+
 // $KZ7_STATE_DIR; else /var/lib/kz7 for root; else $XDG_STATE_HOME/kz7 or ~/.local/state/kz7; else empty.
 std::string usualStateDirectory();
 

@@ -1,4 +1,4 @@
-#include "install/platform/embedded/console.h"
+#include "install/platform/standard_console.h"
 
 #include <cerrno>
 #include <cstdio>
@@ -15,16 +15,16 @@ Status write(std::FILE* stream, std::string_view text) {
 
 }  // namespace
 
-Status EmbeddedConsole::writeOutput(std::string_view text) {
+Status StandardConsole::writeOutput(std::string_view text) {
     return write(stdout, text);
 }
 
-Status EmbeddedConsole::writeError(std::string_view text) {
+Status StandardConsole::writeError(std::string_view text) {
     flush();
     return write(stderr, text);
 }
 
-Status EmbeddedConsole::flush() {
+Status StandardConsole::flush() {
     return std::fflush(stdout) == 0 ? kSuccess : kWriteFault;
 }
 

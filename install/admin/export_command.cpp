@@ -1,0 +1,96 @@
+#include "install/admin/export_command.h"
+
+#include <CLI/CLI.hpp>
+
+#include "install/admin/json_text.h"
+#include "install/admin/reg_text.h"
+#include "install/admin/value_type.h"
+
+namespace kz7 {
+namespace {
+
+struct ExportOptions {
+    std::string key;
+    bool utf16 = false;
+    bool json = false;
+};
+
+void appendJsonValue(const KeyValue& value, std::string& json) {
+    static constexpr char kDigits[] = "0123456789abcdef";
+    json += "{\"name\":";
+    appendJsonText(value.name, json);
+    json += ",\"type\":" + std::to_string(static_cast<std::uint32_t>(value.type)) + ",\"bytes\":\"";
+    for (const char c : value.data) {
+        json += kDigits[static_cast<unsigned char>(c) >> 4];
+        json += kDigits[static_cast<unsigned char>(c) & 15];
+    }
+    json += '"';
+    std::uint64_t number = 0;
+    if (value.type == ValueType::sz || value.type == ValueType::expandSz) {
+        json += ",\"text\":";
+        appendJsonText(std::string_view(value.data).substr(0, value.data.find('\0')), json);
+    } else if (numberOf(value.type, value.data, number)) {
+        json += ",\"number\":" + std::to_string(number);
+    }
+    json += '}';
+}
+
+void appendJsonKey(const KeyRecord& key, std::string& json) {
+    json += "{\"key\":";
+    appendJsonText(key.name, json);
+    json += ",\"class\":";
+    appendJsonText(key.keyClass, json);
+    json += ",\"values\":[";
+    std::string_view separator = "\n  ";
+    for (const KeyValue& value : key.values) {
+        json += separator;
+        appendJsonValue(value, json);
+        separator = ",\n  ";
+    }
+    json += "]}";
+}
+
+Answer exportKeys(Admin& admin, const ExportOptions& options) {
+    if (!admin.open(true)) {
+        return kAnswerFault;
+    }
+    admin.tell(admin.storeLine());
+    std::string separator = "\n";
+    if (options.json) {
+        std::string head = "{\"store\":";
+        appendJsonText(admin.platform().storeName(), head);
+        return admin.showKeys(
+            options.key, head + ",\"keys\":[",
+            [&](const KeyRecord& key, std::string& json) {
+                if (!isBareRoot(key)) {
+                    json += std::exchange(separator, ",\n");
+                    appendJsonKey(key, json);
+                }
+            },
+            "]}\n");
+    }
+    std::string head = regTextHeader();
+    return admin.showKeys(options.key, options.utf16 ? std::string(kUtf16Mark) + utf16FileText(head) : head,
+                          [&](const KeyRecord& key, std::string& text) {
+                              if (isBareRoot(key)) {
+                                  return;
+                              }
+                              std::string shown;
+                              appendRegText(key, shown);
+                              text += options.utf16 ? utf16FileText(shown) : shown;
+                          },
+                          {});
+}
+
+}  // namespace
+
+void addExportCommand(CLI::App& program, Admin& admin) {
+    auto* command = program.add_subcommand("export", "Write keys as registry-editor text to standard output");
+    auto options = std::make_shared<ExportOptions>();
+    command->add_option("KEY", options->key, "The key to begin at; without it everything there is to show");
+    auto* utf16 = command->add_flag("--utf16", options->utf16, "Write UTF-16 as Windows' own editor does");
+    command->add_flag("--json", options->json, "Write JSON for programs")->excludes(utf16);
+    command->callback([&admin, options] { admin.answer = [&admin, options] { return exportKeys(admin, *options); }; });
+}
+
+}  // namespace kz7

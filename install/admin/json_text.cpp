@@ -1,0 +1,28 @@
+#include "install/admin/json_text.h"
+
+#include "install/platform/encoding.h"
+
+namespace kz7 {
+
+void appendJsonText(std::string_view narrow, std::string& json) {
+    static constexpr char kDigits[] = "0123456789abcdef";
+    const std::u16string utf16 = utf16FromNarrow(narrow);
+    json += '"';
+    for (std::u16string_view rest = utf16; !rest.empty();) {
+        const char32_t character = takeUtf16(rest);
+        if (character < 0x20 || character == 0x7F || isSurrogate(character)) {
+            json += "\\u";
+            for (int shift = 12; shift >= 0; shift -= 4) {
+                json += kDigits[character >> shift & 15];
+            }
+            continue;
+        }
+        if (character == '"' || character == '\\') {
+            json += '\\';
+        }
+        appendUtf8(json, character);
+    }
+    json += '"';
+}
+
+}  // namespace kz7

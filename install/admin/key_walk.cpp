@@ -1,0 +1,209 @@
+#include "install/admin/key_walk.h"
+
+#include <algorithm>
+
+#include "install/platform/registry_path.h"
+#include "install/platform/text.h"
+
+namespace kz7 {
+namespace {
+
+constexpr AccessMask kKeyWalk = kKeyQueryValue | kKeyEnumerateSubkeys;
+constexpr std::size_t kBytesOfCharacter = 4;  // at most, in any narrow encoding
+constexpr std::size_t kRoomLimit = std::size_t{1} << 31;
+
+struct Subkey {
+    std::string name;
+    std::string keyClass;
+};
+
+template <typename Named>
+void sortByName(std::vector<Named>& items) {
+    std::vector<std::pair<std::string, Named>> keyed;
+    for (Named& item : items) {
+        std::string fold = foldUpper(item.name);
+        keyed.emplace_back(std::move(fold), std::move(item));
+    }
+    std::stable_sort(keyed.begin(), keyed.end(), [](const auto& a, const auto& b) { return a.first < b.first; });
+    for (std::size_t i = 0; i < items.size(); ++i) {
+        items[i] = std::move(keyed[i].second);
+    }
+}
+
+// One set of room serves a whole walk; it grows with the data and classes that it meets.
+class Reader {
+public:
+    explicit Reader(IRegistryStore& registry) : registry_(registry) {}
+
+    Status subkeys(KeyHandle key, std::vector<Subkey>& found) {
+        return all(found, class_, [&](std::uint32_t index, Buffer& name, Buffer& keyClass) {
+            const Status status = registry_.enumerateKey(key, index, name, &keyClass);
+            return std::pair(status, Subkey{std::string(name.view()), std::string(keyClass.view())});
+        });
+    }
+
+    Status values(KeyHandle key, std::vector<KeyValue>& found) {
+        return all(found, data_, [&](std::uint32_t index, Buffer& name, Buffer& data) {
+            ValueType type{};
+            const Status status = registry_.enumerateValue(key, index, name, &type, &data);
+            return std::pair(status, KeyValue{std::string(name.view()), type, std::string(data.view())});
+        });
+    }
+
+private:
+    template <typename Item, typename Read>
+    Status all(std::vector<Item>& found, std::string& room, Read read) {
+        std::vector<Item> items;
+        for (;;) {
+            Buffer name(name_.data(), static_cast<std::uint32_t>(name_.size()));
+            Buffer data(room.data(), static_cast<std::uint32_t>(room.size()));
+            auto [status, item] = read(static_cast<std::uint32_t>(items.size()), name, data);
+            if (status == kMoreData && room.size() < kRoomLimit) {
+                room.resize(std::min(std::max<std::size_t>(2 * room.size(), data.size), kRoomLimit));
+            } else if (isEndOfItems(status)) {
+                sortByName(items);
+                found = std::move(items);
+                return kSuccess;
+            } else if (status != kSuccess) {
+                return status;
+            } else {
+                items.push_back(std::move(item));
+            }
+        }
+    }
+
+    IRegistryStore& registry_;
+    std::string name_ = std::string(kBytesOfCharacter * (kMaxValueName + 1), '\0');
+    std::string class_ = std::string(256, '\0');
+    std::string data_ = std::string(4096, '\0');
+};
+
+// The keys that one of kProductKeys stands for; kFileNotFound where not even their parent is there.
+Status addMatches(IRegistryStore& registry, std::string_view pattern, std::vector<KeyStart>& starts) {
+    const std::size_t cut = pattern.find_last_of('\\');
+    const std::string parent(pattern.substr(0, cut + 1));
+    std::string last = foldUpper(pattern.substr(cut + 1));
+    const bool prefix = last.ends_with('*');
+    last.resize(last.size() - (prefix ? 1 : 0));
+    OwnedKey key(registry);
+    Status status = registry.openKey(KeyHandle::localMachine, parent.substr(0, cut), kKeyWalk, key.receive());
+    std::vector<Subkey> subkeys;
+    if (status == kSuccess) {
+        status = Reader(registry).subkeys(key.get(), subkeys);
+    }
+    for (Subkey& subkey : subkeys) {
+        const std::string fold = foldUpper(subkey.name);
+        if (prefix ? fold.starts_with(last) : fold == last) {
+            starts.push_back({{KeyHandle::localMachine, parent + subkey.name}, std::move(subkey.keyClass)});
+        }
+    }
+    return status;
+}
+
+struct Level {
+    OwnedKey key;
+    std::vector<Subkey> subkeys;
+    std::size_t next = 0;
+    std::size_t nameSize = 0;  // of the key's own full name
+};
+
+}  // namespace
+
+bool isBareRoot(const KeyRecord& record) {
+    return record.values.empty() && record.name.find('\\') == std::string::npos;
+}
+
+// Follows the path name by name, so that it comes out in the store's own spelling with the last one's class.
+Status findKey(IRegistryStore& registry, const KeyName& name, KeyStart& start) {
+    Reader reader(registry);
+    KeyStart found{{name.root, {}}, {}};
+    OwnedKey key(registry);
+    Status status = registry.openKey(name.root, {}, kKeyWalk, key.receive());
+    std::string_view rest = name.path;
+    for (std::string_view part; status == kSuccess && takeName(rest, part);) {
+        std::vector<Subkey> siblings;
+        status = reader.subkeys(key.get(), siblings);
+        OwnedKey below(registry);
+        if (status == kSuccess) {
+            status = registry.openKey(key.get(), part, kKeyWalk, below.receive());
+        }
+        if (status == kSuccess) {
+            // A host that folds more letters than ours may know the key by another spelling.
+            Subkey spelled{std::string(part), {}};
+            const auto same = std::find_if(siblings.begin(), siblings.end(),
+                                           [&](const Subkey& subkey) { return equalsIgnoreCase(subkey.name, part); });
+            if (same != siblings.end()) {
+                spelled = *same;
+            }
+            found.name.path.append(found.name.path.empty() ? "" : "\\").append(spelled.name);
+            found.keyClass = std::move(spelled.keyClass);
+            key = std::move(below);
+        }
+    }
+    if (status == kSuccess) {
+        start = std::move(found);
+    }
+    return status;
+}
+
+Status findEverything(IRegistryStore& registry, bool storeIsOwn, std::vector<KeyStart>& starts) {
+    if (storeIsOwn) {
+        starts = {{{KeyHandle::localMachine, {}}, {}}, {{KeyHandle::users, {}}, {}}};
+        return kSuccess;
+    }
+    std::vector<KeyStart> found;
+    for (const std::string_view path : kProductKeys) {
+        if (const Status status = addMatches(registry, path, found); status != kSuccess && !isNotFound(status)) {
+            return status;
+        }
+    }
+    starts = std::move(found);
+    return kSuccess;
+}
+
+Status walkKeys(IRegistryStore& registry, const KeyStart& start, const KeyVisitor& visit) {
+    Reader reader(registry);
+    KeyRecord record;
+    record.name = fullKeyName(start.name);
+    record.keyClass = start.keyClass;
+    std::vector<Level> levels;
+    const auto enter = [&](KeyHandle parent, std::string_view path) {
+        Level level{OwnedKey(registry), {}, 0, record.name.size()};
+        Status status = registry.openKey(parent, path, kKeyWalk, level.key.receive());
+        if (status == kSuccess) {
+            status = reader.values(level.key.get(), record.values);
+        }
+        if (status == kSuccess) {
+            status = reader.subkeys(level.key.get(), level.subkeys);
+        }
+        if (status == kSuccess) {
+            record.depth = levels.size();
+            record.hasSubkeys = !level.subkeys.empty();
+            status = visit(record);
+        }
+        if (status == kSuccess) {
+            levels.push_back(std::move(level));
+        }
+        return status;
+    };
+    Status status = enter(start.name.root, start.name.path);
+    while (status == kSuccess && !levels.empty()) {
+        Level& level = levels.back();
+        record.name.resize(level.nameSize);
+        if (level.next == level.subkeys.size()) {
+            levels.pop_back();
+            continue;
+        }
+        Subkey& subkey = level.subkeys[level.next++];
+        record.name.append(1, '\\').append(subkey.name);
+        record.keyClass = std::move(subkey.keyClass);
+        status = enter(level.key.get(), subkey.name);
+        // On a live registry a key may go while its siblings are read.
+        if (isNotFound(status)) {
+            status = kSuccess;
+        }
+    }
+    return status;
+}
+
+}  // namespace kz7

@@ -1,0 +1,85 @@
+#include "install/platform/command_line.h"
+
+namespace kz7 {
+namespace {
+
+constexpr std::string_view kBlanks = " \t";
+
+constexpr bool isBlank(char c) {
+    return c == ' ' || c == '\t';
+}
+
+// Takes one argument off `text`, which does not begin with a blank.
+std::string takeArgument(std::string_view& text) {
+    std::string argument;
+    bool quoted = false;
+    while (!text.empty() && (quoted || !isBlank(text.front()))) {
+        std::size_t backslashes = text.find_first_not_of('\\');
+        backslashes = backslashes == std::string_view::npos ? text.size() : backslashes;
+        text.remove_prefix(backslashes);
+        if (text.empty() || text.front() != '"') {
+            argument.append(backslashes, '\\');
+            if (!text.empty() && (quoted || !isBlank(text.front()))) {
+                argument += text.front();
+                text.remove_prefix(1);
+            }
+            continue;
+        }
+        argument.append(backslashes / 2, '\\');
+        text.remove_prefix(1);
+        if (backslashes % 2 != 0) {
+            argument += '"';
+        } else if (quoted && !text.empty() && text.front() == '"') {
+            argument += '"';
+            text.remove_prefix(1);
+        } else {
+            quoted = !quoted;
+        }
+    }
+    return argument;
+}
+
+}  // namespace
+
+std::vector<CommandReading> commandReadings(std::string_view commandLine) {
+    const std::size_t begin = commandLine.find_first_not_of(kBlanks);
+    if (begin == std::string_view::npos) {
+        return {};
+    }
+    const std::string_view line = commandLine.substr(begin);
+    const auto readingTo = [line](std::size_t programEnd, std::size_t argumentsBegin) {
+        return CommandReading{line.substr(0, programEnd),
+                              argumentsBegin < line.size() ? line.substr(argumentsBegin) : std::string_view{}};
+    };
+    if (line.front() == '"') {
+        const std::size_t close = line.find('"', 1);
+        CommandReading reading = readingTo(close, line.find_first_of(kBlanks, close));
+        reading.program.remove_prefix(1);
+        return {reading};
+    }
+    std::vector<CommandReading> readings;
+    for (std::size_t end = 0; end < line.size();) {
+        end = line.find_first_of(kBlanks, end);
+        readings.push_back(readingTo(end, end));
+        end = line.find_first_not_of(kBlanks, end);
+    }
+    return readings;
+}
+
+std::vector<std::string> splitArguments(std::string_view arguments) {
+    std::vector<std::string> split;
+    for (;;) {
+        const std::size_t begin = arguments.find_first_not_of(kBlanks);
+        if (begin == std::string_view::npos) {
+            return split;
+        }
+        arguments.remove_prefix(begin);
+        split.push_back(takeArgument(arguments));
+    }
+}
+
+bool isBareName(std::string_view program) {
+    return program.find_first_of("/\\:") == std::string_view::npos;
+}
+
+}  // namespace kz7

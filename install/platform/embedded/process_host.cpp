@@ -1,0 +1,448 @@
+#include "install/platform/embedded/process_host.h"
+
+#include <fcntl.h>
+#include <poll.h>
+#include <pthread.h>
+#include <spawn.h>
+#include <sys/pidfd.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <chrono>
+#include <climits>
+#include <csignal>
+#include <cstdlib>
+#include <utility>
+#include <vector>
+
+#include "install/platform/command_line.h"
+#include "install/platform/embedded/paths.h"
+#include "install/platform/embedded/threads.h"
+
+namespace kz7 {
+namespace {
+
+constexpr int kFirstOwnDescriptor = STDERR_FILENO + 1;
+constexpr int kSignalExitCode = 128;  // a child ended by signal n has the exit code 128 + n
+constexpr std::string_view kUsualSearchPath = "/usr/local/bin:/usr/bin:/bin";  // where PATH is not set
+
+Status statusOf(int error) {
+    switch (error) {
+        case EBADF:
+            return kInvalidHandle;
+        case EMFILE:
+        case ENFILE:
+            return kTooManyOpenFiles;
+        case ENOMEM:
+        case EAGAIN:
+            return kOutOfMemory;
+        case EPIPE:
+            return kPipeClosing;
+        default:
+            return kGeneralFailure;
+    }
+}
+
+// Keeps a descriptor out of the three numbers that a child's streams are put on; -1 and none left on failure.
+int moveUp(int descriptor) {
+    if (descriptor >= kFirstOwnDescriptor) {
+        return descriptor;
+    }
+    const int moved = fcntl(descriptor, F_DUPFD_CLOEXEC, kFirstOwnDescriptor);
+    const int error = errno;
+    close(descriptor);
+    errno = error;
+    return moved;
+}
+
+// What says that a file is none that this host can execute.
+bool isNoProgram(int error) {
+    return error == ENOENT || error == ENOTDIR || error == EACCES || error == ENOEXEC || error == ELOOP ||
+           error == ENAMETOOLONG;
+}
+
+bool isProgram(const std::string& file) {
+    struct stat found {};
+    return stat(file.c_str(), &found) == 0 && S_ISREG(found.st_mode) && access(file.c_str(), X_OK) == 0;
+}
+
+// The files that a program's name may stand for, in the order of the search.
+std::vector<std::string> programFiles(std::string_view program, const std::string& stateDirectory) {
+    if (!isBareName(program)) {
+        std::string file = hostPath(program, stateDirectory);
+        return file.empty() ? std::vector<std::string>{} : std::vector<std::string>{std::move(file)};
+    }
+    const char* variable = std::getenv("PATH");
+    std::string_view rest = variable != nullptr ? std::string_view(variable) : kUsualSearchPath;
+    std::vector<std::string> files;
+    while (!rest.empty()) {
+        const std::string_view folder = rest.substr(0, rest.find(':'));
+        rest.remove_prefix(std::min(folder.size() + 1, rest.size()));
+        if (!folder.starts_with('/')) {
+            continue;
+        }
+        files.push_back(std::string(folder) + '/' + std::string(program));
+        if (program.find('.') == std::string_view::npos) {
+            files.push_back(files.back() + ".exe");
+        }
+    }
+    return files;
+}
+
+// A write to a pipe without reader raises SIGPIPE in this thread: it is held back here and taken out again,
+// so that the program's own choice for that signal stays as it is.
+class WithoutPipeSignal {
+public:
+    WithoutPipeSignal() {
+        sigemptyset(&signal_);
+        sigaddset(&signal_, SIGPIPE);
+        sigset_t pending;
+        sigpending(&pending);
+        wasPending_ = sigismember(&pending, SIGPIPE) == 1;
+        pthread_sigmask(SIG_BLOCK, &signal_, &before_);
+    }
+    ~WithoutPipeSignal() {
+        const timespec now{};
+        while (!wasPending_ && sigtimedwait(&signal_, nullptr, &now) == -1 && errno == EINTR) {
+        }
+        pthread_sigmask(SIG_SETMASK, &before_, nullptr);
+    }
+    WithoutPipeSignal(const WithoutPipeSignal&) = delete;
+    WithoutPipeSignal& operator=(const WithoutPipeSignal&) = delete;
+
+private:
+    sigset_t signal_{};
+    sigset_t before_{};
+    bool wasPending_ = false;
+};
+
+// How a child begins: descriptors 0 to 2 as told and no others, no signal blocked, ignored or caught. It is not
+// forked: a fork would cost by the memory that this process has in use.
+class SpawnPlan {
+public:
+    SpawnPlan() {
+        note(posix_spawn_file_actions_init(&actions_));
+        note(posix_spawnattr_init(&attributes_));
+    }
+    ~SpawnPlan() {
+        posix_spawnattr_destroy(&attributes_);
+        posix_spawn_file_actions_destroy(&actions_);
+    }
+    SpawnPlan(const SpawnPlan&) = delete;
+    SpawnPlan& operator=(const SpawnPlan&) = delete;
+
+    void openNull(int target, int mode) {
+        note(posix_spawn_file_actions_addopen(&actions_, target, "/dev/null", mode, 0));
+    }
+    void give(int descriptor, int target) { note(posix_spawn_file_actions_adddup2(&actions_, descriptor, target)); }
+
+    // An error number, 0 for a child that executes the file.
+    int run(pid_t& id, const char* file, const std::string& directory, char* const* argv) {
+        // One system call, whatever the limit of open files is.
+        note(posix_spawn_file_actions_addclosefrom_np(&actions_, kFirstOwnDescriptor));
+        if (!directory.empty()) {
+            note(posix_spawn_file_actions_addchdir_np(&actions_, directory.c_str()));
+        }
+        sigset_t signals;
+        sigemptyset(&signals);
+        note(posix_spawnattr_setsigmask(&attributes_, &signals));
+        sigfillset(&signals);
+        note(posix_spawnattr_setsigdefault(&attributes_, &signals));
+        note(posix_spawnattr_setflags(&attributes_, POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF));
+        return error_ != 0 ? error_ : posix_spawn(&id, file, &actions_, &attributes_, argv, environ);
+    }
+
+private:
+    void note(int error) {
+        if (error_ == 0) {
+            error_ = error;
+        }
+    }
+
+    posix_spawn_file_actions_t actions_{};
+    posix_spawnattr_t attributes_{};
+    int error_ = 0;
+};
+
+// waitpid() that no signal of the program's interrupts.
+pid_t waitForChild(pid_t id, int* ending, int options) {
+    pid_t found = -1;
+    do {
+        found = waitpid(id, ending, options);
+    } while (found == -1 && errno == EINTR);
+    return found;
+}
+
+// Waits for the end of a child, but no longer than that; its exit code is still to be taken.
+void waitWithin(pid_t id, std::uint32_t milliseconds) {
+    using Clock = std::chrono::steady_clock;
+    const auto deadline = Clock::now() + std::chrono::milliseconds(milliseconds);
+    pollfd watched{pidfd_open(id, 0), POLLIN, 0};
+    if (watched.fd == -1) {
+        return;
+    }
+    int ready = -1;
+    do {
+        const auto left = std::chrono::ceil<std::chrono::milliseconds>(deadline - Clock::now()).count();
+        ready = poll(&watched, 1, static_cast<int>(std::clamp<std::int64_t>(left, 0, INT_MAX)));
+    } while ((ready == -1 && errno == EINTR) || (ready == 0 && Clock::now() < deadline));
+    close(watched.fd);
+}
+
+// Takes the ending of a child that nobody asks about any more, so that it does not stay a zombie. A thread of
+// its own waits for one that runs on; it holds nothing of ours and ends with the child or with this process.
+void leaveToItself(pid_t id) {
+    const auto take = [](void* given) -> void* {
+        waitForChild(static_cast<pid_t>(reinterpret_cast<std::intptr_t>(given)), nullptr, 0);
+        return nullptr;
+    };
+    pthread_attr_t attributes;
+    if (makeThreadAttributes(1, attributes) != 0) {
+        return;
+    }
+    pthread_attr_setdetachstate(&attributes, PTHREAD_CREATE_DETACHED);
+    pthread_t thread{};
+    pthread_create(&thread, &attributes, take, reinterpret_cast<void*>(static_cast<std::intptr_t>(id)));
+    pthread_attr_destroy(&attributes);
+}
+
+}  // namespace
+
+void settleInheritedState() {
+    for (int descriptor = 0; descriptor < kFirstOwnDescriptor; ++descriptor) {
+        if (fcntl(descriptor, F_GETFD) == -1 && errno == EBADF) {
+            // The lowest free number is the one that is missing.
+            const int opened = open("/dev/null", O_RDWR);
+            if (opened == -1) {
+                return;
+            }
+        }
+    }
+    // Where it is ignored, children vanish with their exit codes.
+    std::signal(SIGCHLD, SIG_DFL);
+}
+
+EmbeddedProcessHost::EmbeddedProcessHost(std::string stateDirectory)
+    : stateDirectory_(std::move(stateDirectory)), slots_{StreamHandle{1}, StreamHandle{2}}, lastToken_(2) {}
+
+EmbeddedProcessHost::~EmbeddedProcessHost() {
+    for (const auto& [stream, descriptor] : streams_) {
+        close(descriptor);
+    }
+}
+
+Status EmbeddedProcessHost::getSlot(StandardSlot slot, StreamHandle& stream) {
+    stream = slots_[static_cast<std::size_t>(slot)];
+    return kSuccess;
+}
+
+Status EmbeddedProcessHost::setSlot(StandardSlot slot, StreamHandle stream) {
+    slots_[static_cast<std::size_t>(slot)] = stream;
+    return kSuccess;
+}
+
+StreamHandle EmbeddedProcessHost::giveOut(int descriptor) {
+    const std::lock_guard<std::mutex> held(streamsLock_);
+    const StreamHandle stream{++lastToken_};
+    streams_.emplace(stream, descriptor);
+    return stream;
+}
+
+int EmbeddedProcessHost::descriptorOf(StreamHandle stream) {
+    const std::lock_guard<std::mutex> held(streamsLock_);
+    const auto found = streams_.find(stream);
+    return found != streams_.end() ? found->second : -1;
+}
+
+Status EmbeddedProcessHost::createPipe(StreamHandle& readEnd, StreamHandle& writeEnd) {
+    // A child is given its ends by name: none of ours passes an exec by itself.
+    int ends[2];
+    if (pipe2(ends, O_CLOEXEC) == -1) {
+        return statusOf(errno);
+    }
+    const int reading = moveUp(ends[0]);
+    const int writing = moveUp(ends[1]);
+    if (reading == -1 || writing == -1) {
+        const Status status = statusOf(errno);
+        close(reading);
+        close(writing);
+        return status;
+    }
+    readEnd = giveOut(reading);
+    writeEnd = giveOut(writing);
+    return kSuccess;
+}
+
+Status EmbeddedProcessHost::duplicate(StreamHandle stream, StreamHandle& copy) {
+    const int descriptor = fcntl(descriptorOf(stream), F_DUPFD_CLOEXEC, kFirstOwnDescriptor);
+    if (descriptor == -1) {
+        return statusOf(errno);
+    }
+    copy = giveOut(descriptor);
+    return kSuccess;
+}
+
+Status EmbeddedProcessHost::read(StreamHandle stream, Buffer& data) {
+    const int descriptor = descriptorOf(stream);
+    ssize_t count = -1;
+    do {
+        count = ::read(descriptor, data.data, data.capacity);
+    } while (count == -1 && errno == EINTR);
+    if (count == -1) {
+        return statusOf(errno);
+    }
+    data.size = static_cast<std::uint32_t>(count);
+    return count == 0 && data.capacity != 0 ? kBrokenPipe : kSuccess;
+}
+
+Status EmbeddedProcessHost::write(StreamHandle stream, std::string_view data) {
+    const int descriptor = descriptorOf(stream);
+    const WithoutPipeSignal guard;
+    while (!data.empty()) {
+        const ssize_t count = ::write(descriptor, data.data(), data.size());
+        if (count == -1 && errno != EINTR) {
+            return statusOf(errno);
+        }
+        data.remove_prefix(count == -1 ? 0 : static_cast<std::size_t>(count));
+    }
+    return kSuccess;
+}
+
+Status EmbeddedProcessHost::closeStream(StreamHandle stream) {
+    int descriptor = -1;
+    {
+        const std::lock_guard<std::mutex> held(streamsLock_);
+        const auto found = streams_.find(stream);
+        if (found == streams_.end()) {
+            return kInvalidHandle;
+        }
+        descriptor = found->second;
+        streams_.erase(found);
+    }
+    close(descriptor);
+    return kSuccess;
+}
+
+Status EmbeddedProcessHost::startProcess(const ProcessStart& start, ProcessInformation& started) {
+    for (const CommandReading& reading : commandReadings(start.commandLine)) {
+        for (const std::string& file : programFiles(reading.program, stateDirectory_)) {
+            if (!isProgram(file)) {
+                continue;
+            }
+            const Status status = spawn(file, reading.program, reading.arguments, start, started);
+            if (!isNotFound(status)) {
+                return status;
+            }
+        }
+    }
+    return kFileNotFound;
+}
+
+Status EmbeddedProcessHost::spawn(const std::string& file, std::string_view program, std::string_view arguments,
+                                  const ProcessStart& start, ProcessInformation& started) {
+    std::string directory;
+    if (!start.workingDirectory.empty()) {
+        directory = hostPath(start.workingDirectory, stateDirectory_);
+        struct stat found {};
+        if (directory.empty() || stat(directory.c_str(), &found) == -1 || !S_ISDIR(found.st_mode)) {
+            return kBadDirectory;
+        }
+    }
+    std::vector<std::string> words = splitArguments(arguments);
+    words.insert(words.begin(), std::string(program));
+    std::vector<char*> argv;
+    for (std::string& word : words) {
+        argv.push_back(word.data());
+    }
+    argv.push_back(nullptr);
+
+    SpawnPlan plan;
+    plan.openNull(STDIN_FILENO, O_RDONLY);
+    for (const auto& [stream, target] : {std::pair{start.output, STDOUT_FILENO}, {start.error, STDERR_FILENO}}) {
+        if (stream == StreamHandle::none) {
+            plan.openNull(target, O_WRONLY);
+        } else {
+            plan.give(descriptorOf(stream), target);
+        }
+    }
+    pid_t id = 0;
+    const int error = plan.run(id, file.c_str(), directory, argv.data());
+    if (error != 0) {
+        return isNoProgram(error) ? kFileNotFound : statusOf(error);
+    }
+    const ProcessHandle process{++lastToken_};
+    children_.emplace(process, Child{.id = id});
+    started = {process, ProcessHandle::none, static_cast<std::uint32_t>(id), static_cast<std::uint32_t>(id)};
+    return kSuccess;
+}
+
+EmbeddedProcessHost::Child* EmbeddedProcessHost::childOf(ProcessHandle process) {
+    const auto found = children_.find(process);
+    return found != children_.end() ? &found->second : nullptr;
+}
+
+Status EmbeddedProcessHost::takeEnding(Child& child, int options) {
+    if (child.ended) {
+        return kSuccess;
+    }
+    int ending = 0;
+    const pid_t found = waitForChild(child.id, &ending, options);
+    if (found == 0) {
+        return kWaitTimedOut;
+    }
+    if (found == -1) {
+        return statusOf(errno);
+    }
+    child.ended = true;
+    child.exitCode =
+        static_cast<std::uint32_t>(WIFSIGNALED(ending) ? kSignalExitCode + WTERMSIG(ending) : WEXITSTATUS(ending));
+    return kSuccess;
+}
+
+Status EmbeddedProcessHost::waitProcess(ProcessHandle process, std::uint32_t milliseconds) {
+    Child* child = childOf(process);
+    if (child == nullptr) {
+        return kInvalidHandle;
+    }
+    if (milliseconds == kInfiniteWait) {
+        return takeEnding(*child, 0);
+    }
+    if (!child->ended && milliseconds != 0) {
+        waitWithin(child->id, milliseconds);
+    }
+    return takeEnding(*child, WNOHANG);
+}
+
+Status EmbeddedProcessHost::exitCode(ProcessHandle process, std::uint32_t& code) {
+    Child* child = childOf(process);
+    if (child == nullptr) {
+        return kInvalidHandle;
+    }
+    const Status status = takeEnding(*child, WNOHANG);
+    if (status != kSuccess && status != kWaitTimedOut) {
+        return status;
+    }
+    code = child->exitCode;
+    return kSuccess;
+}
+
+Status EmbeddedProcessHost::closeProcess(ProcessHandle process) {
+    Child* child = childOf(process);
+    if (child == nullptr) {
+        return kInvalidHandle;
+    }
+    if (takeEnding(*child, WNOHANG) == kWaitTimedOut) {
+        leaveToItself(child->id);
+    }
+    children_.erase(process);
+    return kSuccess;
+}
+
+Status EmbeddedProcessHost::shortPath(std::string_view, Buffer&) {
+    return kCallNotImplemented;
+}
+
+}  // namespace kz7

@@ -1,0 +1,86 @@
+#include "install/platform/embedded/threads.h"
+
+#include <unistd.h>
+
+#include <algorithm>
+#include <climits>
+#include <csignal>
+
+namespace kz7 {
+namespace {
+
+// The host's page size and its smallest stack are known at run time only.
+std::size_t usableStack(std::size_t bytes) {
+    const auto page = static_cast<std::size_t>(sysconf(_SC_PAGESIZE));
+    const std::size_t wanted = std::max(bytes, static_cast<std::size_t>(PTHREAD_STACK_MIN));
+    return (wanted + page - 1) / page * page;
+}
+
+}  // namespace
+
+int makeThreadAttributes(std::size_t stackBytes, pthread_attr_t& attributes) {
+    int error = pthread_attr_init(&attributes);
+    if (error != 0) {
+        return error;
+    }
+    sigset_t signals;
+    sigfillset(&signals);
+    error = pthread_attr_setsigmask_np(&attributes, &signals);
+    if (error == 0 && stackBytes != 0) {
+        error = pthread_attr_setstacksize(&attributes, usableStack(stackBytes));
+    }
+    if (error != 0) {
+        pthread_attr_destroy(&attributes);
+    }
+    return error;
+}
+
+Status EmbeddedThreads::start(std::unique_ptr<ThreadStart>& record, std::uint32_t stackBytes, std::uint32_t& id,
+                              ThreadHandle& thread) {
+    pthread_attr_t attributes;
+    if (makeThreadAttributes(stackBytes, attributes) != 0) {
+        return kOutOfMemory;
+    }
+    const ThreadHandle handle{lastId_ + 1};
+    Thread& entry = threads_[handle];
+    const auto enter = [](void* given) -> void* {
+        ThreadStart::run(given);
+        return nullptr;
+    };
+    const int error = pthread_create(&entry.id, &attributes, enter, record.get());
+    pthread_attr_destroy(&attributes);
+    if (error != 0) {
+        threads_.erase(handle);
+        return kTooManyThreads;
+    }
+    record.release();
+    id = ++lastId_;
+    thread = handle;
+    return kSuccess;
+}
+
+Status EmbeddedThreads::wait(ThreadHandle thread) {
+    const auto found = threads_.find(thread);
+    if (found == threads_.end()) {
+        return kInvalidHandle;
+    }
+    if (!found->second.joined && pthread_join(found->second.id, nullptr) != 0) {
+        return kInvalidHandle;
+    }
+    found->second.joined = true;
+    return kSuccess;
+}
+
+Status EmbeddedThreads::close(ThreadHandle thread) {
+    const auto found = threads_.find(thread);
+    if (found == threads_.end()) {
+        return kInvalidHandle;
+    }
+    if (!found->second.joined) {
+        pthread_detach(found->second.id);
+    }
+    threads_.erase(found);
+    return kSuccess;
+}
+
+}  // namespace kz7

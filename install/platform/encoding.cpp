@@ -1,0 +1,97 @@
+#include "install/platform/encoding.h"
+
+#include <array>
+
+namespace kz7 {
+
+char32_t takeUtf16(std::u16string_view& text) {
+    const char32_t first = text[0];
+    if (first >= 0xD800 && first <= 0xDBFF && text.size() > 1 && text[1] >= 0xDC00 && text[1] <= 0xDFFF) {
+        const char32_t second = text[1];
+        text.remove_prefix(2);
+        return 0x10000 + ((first - 0xD800) << 10) + (second - 0xDC00);
+    }
+    text.remove_prefix(1);
+    return first;
+}
+
+bool takeUtf8(std::string_view& text, char32_t& character) {
+    struct Form {
+        unsigned mask, lead;  // of the first byte
+        char32_t least;       // a smaller character has a shorter form
+    };
+    static constexpr std::array<Form, 4> kForms = {
+        {{0x80, 0x00, 0}, {0xE0, 0xC0, 0x80}, {0xF0, 0xE0, 0x800}, {0xF8, 0xF0, 0x10000}}};
+    const auto byteAt = [&](std::size_t at) { return static_cast<unsigned>(static_cast<unsigned char>(text[at])); };
+    for (std::size_t more = 0; more < kForms.size() && more < text.size(); ++more) {
+        if ((byteAt(0) & kForms[more].mask) != kForms[more].lead) {
+            continue;
+        }
+        char32_t taken = byteAt(0) & ~kForms[more].mask;
+        for (std::size_t at = 1; at <= more; ++at) {
+            if ((byteAt(at) & 0xC0) != 0x80) {
+                return false;
+            }
+            taken = taken << 6 | (byteAt(at) & 0x3F);
+        }
+        if (taken < kForms[more].least || taken > 0x10FFFF) {
+            return false;
+        }
+        character = taken;
+        text.remove_prefix(more + 1);
+        return true;
+    }
+    return false;
+}
+
+void appendUtf16(std::u16string& text, char32_t character) {
+    if (character < 0x10000) {
+        text += static_cast<char16_t>(character);
+        return;
+    }
+    text += static_cast<char16_t>(0xD800 + ((character - 0x10000) >> 10));
+    text += static_cast<char16_t>(0xDC00 + ((character - 0x10000) & 0x3FF));
+}
+
+void appendUtf8(std::string& text, char32_t character) {
+    const auto trail = [&](unsigned shift) { text += static_cast<char>(0x80 | (character >> shift & 0x3F)); };
+    if (character < 0x80) {
+        text += static_cast<char>(character);
+    } else if (character < 0x800) {
+        text += static_cast<char>(0xC0 | character >> 6);
+        trail(0);
+    } else if (character < 0x10000) {
+        text += static_cast<char>(0xE0 | character >> 12);
+        trail(6);
+        trail(0);
+    } else {
+        text += static_cast<char>(0xF0 | character >> 18);
+        trail(12);
+        trail(6);
+        trail(0);
+    }
+}
+
+bool utf16FromUtf8(std::string_view utf8, std::u16string& utf16) {
+    std::u16string taken;
+    taken.reserve(utf8.size());
+    for (char32_t character = 0; !utf8.empty();) {
+        if (!takeUtf8(utf8, character)) {
+            return false;
+        }
+        appendUtf16(taken, character);
+    }
+    utf16 = std::move(taken);
+    return true;
+}
+
+std::string utf8FromUtf16(std::u16string_view utf16) {
+    std::string utf8;
+    utf8.reserve(utf16.size());
+    while (!utf16.empty()) {
+        appendUtf8(utf8, takeUtf16(utf16));
+    }
+    return utf8;
+}
+
+}  // namespace kz7

@@ -1,0 +1,75 @@
+// The process port in memory: programs are rows of a table that say what each writes and how it ends. A
+// program runs to its end while it is started, in this thread; use it with MemoryThreads.
+#pragma once
+
+#include <array>
+#include <map>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "install/platform/process_host.h"
+
+namespace kz7 {
+
+struct ScriptedProgram {
+    std::string output = {};
+    std::string error = {};
+    std::uint32_t exitCode = 0;
+    bool runsOn = false;  // outlasts every wait that has a limit, holding its pipes; ends in one without
+};
+
+class MemoryProcessHost final : public IProcessHost {
+public:
+    // Paths compare without case and stand as in the command lines, without quotes.
+    void addProgram(std::string_view path, ScriptedProgram program);
+
+    std::optional<ScriptedProgram> otherPrograms;  // what programs that were not added do; none: they do not exist
+    std::vector<std::string> started;              // the command lines of the programs that were started, in order
+    std::size_t openHandles() const { return streams_.size() + children_.size(); }
+
+    Status getSlot(StandardSlot slot, StreamHandle& stream) override;
+    Status setSlot(StandardSlot slot, StreamHandle stream) override;
+    Status createPipe(StreamHandle& readEnd, StreamHandle& writeEnd) override;
+    Status duplicate(StreamHandle stream, StreamHandle& copy) override;
+
+    // Where the wait would have no end, kWaitTimedOut: nothing else runs here that could write.
+    Status read(StreamHandle stream, Buffer& data) override;
+    Status write(StreamHandle stream, std::string_view data) override;
+    Status closeStream(StreamHandle stream) override;
+    Status startProcess(const ProcessStart& start, ProcessInformation& information) override;
+    Status waitProcess(ProcessHandle process, std::uint32_t milliseconds) override;
+    Status exitCode(ProcessHandle process, std::uint32_t& code) override;
+    Status closeProcess(ProcessHandle process) override;
+    Status shortPath(std::string_view path, Buffer& shortened) override;
+
+private:
+    // The ends of a pipe share its bytes; an end is closed when nobody holds its token any more.
+    struct End {};
+    struct Pipe {
+        std::string bytes;
+        std::weak_ptr<End> readers;
+        std::weak_ptr<End> writers;
+    };
+    struct Stream {
+        std::shared_ptr<Pipe> pipe;
+        std::shared_ptr<End> end;
+    };
+    struct Child {
+        std::uint32_t exitCode = 0;
+        bool runsOn = false;
+        std::vector<Stream> held;
+    };
+
+    const ScriptedProgram* find(std::string_view commandLine) const;
+    StreamHandle giveOut(Stream stream);
+
+    std::map<std::string, ScriptedProgram> programs_;  // by upper-cased path
+    std::array<StreamHandle, 2> slots_{StreamHandle{1}, StreamHandle{2}};
+    std::map<StreamHandle, Stream> streams_;
+    std::map<ProcessHandle, Child> children_;
+    std::uint64_t lastToken_ = 2;
+};
+
+}  // namespace kz7

@@ -1,0 +1,95 @@
+// The process port: child programs with captured output, at the level of the platform's calls. One operation
+// for each call that can fail on its own; what is odd about running a program hangs on single calls.
+#pragma once
+
+#include <cstdint>
+#include <string_view>
+
+#include "install/platform/buffer.h"
+#include "install/platform/owned_handle.h"
+#include "install/platform/status.h"
+
+namespace kz7 {
+
+// One end of a pipe, or whatever a standard-handle slot holds.
+enum class StreamHandle : std::uint64_t { none = 0 };
+
+// A started program or its main thread; they are closed alike.
+enum class ProcessHandle : std::uint64_t { none = 0 };
+
+// The standard handles of this process that it may exchange. They are numbers only: what a slot holds may be
+// closed long since, and nothing written to the console ever follows a slot.
+enum class StandardSlot { output, error };
+
+inline constexpr std::uint32_t kInfiniteWait = 0xFFFFFFFF;  // a timeout, in milliseconds
+inline constexpr std::uint32_t kExitCodeRunning = 259;      // the exit code of a program that has not ended
+
+struct ProcessStart {
+    std::string_view commandLine;       // the program first, in quotes or not
+    std::string_view workingDirectory;  // empty: this process's own
+    StreamHandle output;
+    StreamHandle error;
+};
+
+// The caller closes both handles; a host without a handle for a main thread gives none.
+struct ProcessInformation {
+    ProcessHandle process = ProcessHandle::none;
+    ProcessHandle mainThread = ProcessHandle::none;
+    std::uint32_t processId = 0;
+    std::uint32_t mainThreadId = 0;
+};
+
+// Outputs are written on success only. kInvalidHandle: a handle that is none or not open. `read`, `write`
+// and `closeStream` may be called from any thread, each stream by one at a time; all else by one thread.
+class IProcessHost {
+public:
+    virtual ~IProcessHost() = default;
+
+    virtual Status getSlot(StandardSlot slot, StreamHandle& stream) = 0;
+
+    // Takes any number, open or not.
+    virtual Status setSlot(StandardSlot slot, StreamHandle stream) = 0;
+
+    // A pipe whose ends a child can inherit. The caller closes both.
+    virtual Status createPipe(StreamHandle& readEnd, StreamHandle& writeEnd) = 0;
+
+    // A second handle of a stream, with the same access, that no child inherits. The caller closes it.
+    virtual Status duplicate(StreamHandle stream, StreamHandle& copy) = 0;
+
+    // Waits for bytes and gives those that are there, up to the capacity. kBrokenPipe: every write end is
+    // closed and all was read. A success with 0 bytes is a write of nothing at the other end.
+    virtual Status read(StreamHandle stream, Buffer& data) = 0;
+
+    // Writes all of it, waiting for room. kPipeClosing: the read end is closed, also while waiting.
+    virtual Status write(StreamHandle stream, std::string_view data) = 0;
+
+    virtual Status closeStream(StreamHandle stream) = 0;
+
+    // Starts a program, hidden, with this process's environment, the two streams and an empty standard input.
+    // A program path with blanks and no quotes is looked for piece by piece. kFileNotFound: no such program;
+    // also, where the host has no drives, one it cannot execute. kBadDirectory: no such working directory.
+    virtual Status startProcess(const ProcessStart& start, ProcessInformation& started) = 0;
+
+    // Waits for the program's end. kWaitTimedOut: it runs on.
+    virtual Status waitProcess(ProcessHandle process, std::uint32_t milliseconds) = 0;
+
+    // kExitCodeRunning while it runs; 128 and the signal's number for a program that a signal ended.
+    virtual Status exitCode(ProcessHandle process, std::uint32_t& code) = 0;
+
+    // A program that still runs is left running, and nothing of it is left over once it ends.
+    virtual Status closeProcess(ProcessHandle process) = 0;
+
+    // The short form of the path of an existing file, without its NUL. kMoreData: it does not fit with its
+    // NUL; kCallNotImplemented: the host has no short paths.
+    virtual Status shortPath(std::string_view path, Buffer& shortened) = 0;
+};
+
+struct StreamTraits {
+    using Port = IProcessHost;
+    using Handle = StreamHandle;
+    static constexpr Handle kNone = StreamHandle::none;
+    static void close(Port& port, Handle stream) { port.closeStream(stream); }
+};
+using OwnedStream = OwnedHandle<StreamTraits>;
+
+}  // namespace kz7

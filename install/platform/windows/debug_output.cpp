@@ -1,0 +1,22 @@
+#include "install/platform/windows/debug_output.h"
+
+#include <windows.h>
+
+#include <cstdlib>
+#include <string>
+
+namespace kz7 {
+
+WindowsDebugOutput::WindowsDebugOutput(IConsole& console) : console_(console) {
+    const char* asked = std::getenv("KZ7_DEBUG");
+    shown_ = asked != nullptr && std::string_view(asked) == "1";
+}
+
+void WindowsDebugOutput::write(std::string_view text) {
+    OutputDebugStringA(std::string(text).c_str());
+    if (shown_) {
+        console_.writeError("debug: " + std::string(text) + "\n");
+    }
+}
+
+}  // namespace kz7

@@ -1,0 +1,57 @@
+// This machine's ports on Windows.
+#include "install/platform/platform.h"
+
+#include "install/platform/standard_console.h"
+#include "install/platform/windows/assembly_cache.h"
+#include "install/platform/windows/debug_output.h"
+#include "install/platform/windows/file_system.h"
+#include "install/platform/windows/library_loader.h"
+#include "install/platform/windows/process_host.h"
+#include "install/platform/windows/registry.h"
+#include "install/platform/windows/services.h"
+#include "install/platform/windows/threads.h"
+
+namespace kz7 {
+namespace {
+
+class WindowsPlatform final : public IPlatform {
+public:
+    WindowsPlatform() : debugOutput_(console_) {}
+
+    IRegistryStore& registry() override { return registry_; }
+    IServiceManager& services() override { return services_; }
+    IConsole& console() override { return console_; }
+    IDebugOutput& debugOutput() override { return debugOutput_; }
+    IFileSystem& files() override { return files_; }
+    IProcessHost& processes() override { return processes_; }
+    IThreads& threads() override { return threads_; }
+    ILibraryLoader& libraries() override { return libraries_; }
+    IAssemblyCache& assemblies() override { return assemblies_; }
+    std::string storeName() override { return "the registry of this machine"; }
+    std::string storeNote() override { return {}; }
+    bool storeIsOwn() override { return false; }
+    bool storeFaultTold() override { return false; }
+
+private:
+    StandardConsole console_;
+    WindowsDebugOutput debugOutput_;
+    WindowsFileSystem files_;
+    WindowsRegistry registry_;
+    WindowsServiceManager services_;
+    WindowsProcessHost processes_;
+    WindowsThreads threads_;
+    WindowsLibraryLoader libraries_;
+    WindowsAssemblyCache assemblies_;
+};
+
+}  // namespace
+
+std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions&) {
+    return std::make_unique<WindowsPlatform>();
+}
+
+int hostExitCode(Status status) {
+    return static_cast<int>(status);
+}
+
+}  // namespace kz7

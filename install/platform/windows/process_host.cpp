@@ -1,0 +1,180 @@
+#include "install/platform/windows/process_host.h"
+
+#include <windows.h>
+
+#include <string>
+#include <vector>
+
+#include "install/platform/command_line.h"
+
+namespace kz7 {
+namespace {
+
+template <typename Handle>
+HANDLE native(Handle handle) {
+    return reinterpret_cast<HANDLE>(static_cast<std::uintptr_t>(handle));
+}
+
+template <typename Handle>
+Handle portHandle(HANDLE handle) {
+    return Handle{reinterpret_cast<std::uintptr_t>(handle)};
+}
+
+Status judged(BOOL succeeded) {
+    return succeeded != FALSE ? kSuccess : GetLastError();
+}
+
+DWORD slotNumber(StandardSlot slot) {
+    return slot == StandardSlot::output ? STD_OUTPUT_HANDLE : STD_ERROR_HANDLE;
+}
+
+// While it lives, the system searches for bare program names without the current folder: nothing is taken from
+// the folder that the tool happens to be run in. A child gets the environment as it was before.
+class SearchWithoutCurrentFolder {
+public:
+    SearchWithoutCurrentFolder() : environment_(GetEnvironmentStringsW()) {
+        wasSet_ = GetEnvironmentVariableW(kSwitch, nullptr, 0) != 0;
+        if (!wasSet_) {
+            SetEnvironmentVariableW(kSwitch, L"1");
+        }
+    }
+    ~SearchWithoutCurrentFolder() {
+        if (!wasSet_) {
+            SetEnvironmentVariableW(kSwitch, nullptr);
+        }
+        if (environment_ != nullptr) {
+            FreeEnvironmentStringsW(environment_);
+        }
+    }
+    SearchWithoutCurrentFolder(const SearchWithoutCurrentFolder&) = delete;
+    SearchWithoutCurrentFolder& operator=(const SearchWithoutCurrentFolder&) = delete;
+
+    void* environment() const { return environment_; }
+
+private:
+    static constexpr const wchar_t* kSwitch = L"NoDefaultCurrentDirectoryInExePath";
+    wchar_t* environment_;
+    bool wasSet_ = false;
+};
+
+// A program with a folder in its path that hangs on the current folder or drive.
+bool hangsOnCurrentFolder(std::string_view program) {
+    const bool hasDrive = program.size() > 2 && program[1] == ':' && (program[2] == '\\' || program[2] == '/');
+    return !isBareName(program) && !hasDrive && !program.starts_with('\\') && !program.starts_with('/');
+}
+
+}  // namespace
+
+Status WindowsProcessHost::getSlot(StandardSlot slot, StreamHandle& stream) {
+    const HANDLE handle = GetStdHandle(slotNumber(slot));
+    if (handle == INVALID_HANDLE_VALUE) {
+        return GetLastError();
+    }
+    stream = portHandle<StreamHandle>(handle);
+    return kSuccess;
+}
+
+Status WindowsProcessHost::setSlot(StandardSlot slot, StreamHandle stream) {
+    return judged(SetStdHandle(slotNumber(slot), native(stream)));
+}
+
+Status WindowsProcessHost::createPipe(StreamHandle& readEnd, StreamHandle& writeEnd) {
+    SECURITY_ATTRIBUTES inherited{sizeof inherited, nullptr, TRUE};
+    HANDLE reading = nullptr;
+    HANDLE writing = nullptr;
+    const Status status = judged(CreatePipe(&reading, &writing, &inherited, 0));
+    if (status == kSuccess) {
+        readEnd = portHandle<StreamHandle>(reading);
+        writeEnd = portHandle<StreamHandle>(writing);
+    }
+    return status;
+}
+
+Status WindowsProcessHost::duplicate(StreamHandle stream, StreamHandle& copy) {
+    HANDLE handle = nullptr;
+    const Status status = judged(DuplicateHandle(GetCurrentProcess(), native(stream), GetCurrentProcess(), &handle, 0,
+                                                 FALSE, DUPLICATE_SAME_ACCESS));
+    if (status == kSuccess) {
+        copy = portHandle<StreamHandle>(handle);
+    }
+    return status;
+}
+
+Status WindowsProcessHost::read(StreamHandle stream, Buffer& data) {
+    DWORD count = 0;
+    const Status status = judged(ReadFile(native(stream), data.data, data.capacity, &count, nullptr));
+    if (status == kSuccess) {
+        data.size = count;
+    }
+    return status;
+}
+
+Status WindowsProcessHost::write(StreamHandle stream, std::string_view data) {
+    DWORD count = 0;
+    return judged(WriteFile(native(stream), data.data(), static_cast<DWORD>(data.size()), &count, nullptr));
+}
+
+Status WindowsProcessHost::closeStream(StreamHandle stream) {
+    return judged(CloseHandle(native(stream)));
+}
+
+Status WindowsProcessHost::startProcess(const ProcessStart& start, ProcessInformation& started) {
+    const std::vector<CommandReading> readings = commandReadings(start.commandLine);
+    if (readings.empty() || hangsOnCurrentFolder(readings.front().program)) {
+        return kFileNotFound;
+    }
+    STARTUPINFOA startup{};
+    startup.cb = sizeof startup;
+    startup.dwFlags = STARTF_USESTDHANDLES | STARTF_USESHOWWINDOW;
+    startup.wShowWindow = SW_HIDE;
+    startup.hStdOutput = native(start.output);
+    startup.hStdError = native(start.error);
+    std::string commandLine(start.commandLine);  // the call writes into it
+    const std::string directory(start.workingDirectory);
+    const SearchWithoutCurrentFolder search;
+    PROCESS_INFORMATION information{};
+    const Status status = judged(CreateProcessA(
+        nullptr, commandLine.data(), nullptr, nullptr, TRUE, NORMAL_PRIORITY_CLASS | CREATE_UNICODE_ENVIRONMENT,
+        search.environment(), directory.empty() ? nullptr : directory.c_str(), &startup, &information));
+    if (status == kSuccess) {
+        started = {portHandle<ProcessHandle>(information.hProcess), portHandle<ProcessHandle>(information.hThread),
+                   information.dwProcessId, information.dwThreadId};
+    }
+    return status;
+}
+
+Status WindowsProcessHost::waitProcess(ProcessHandle process, std::uint32_t milliseconds) {
+    switch (WaitForSingleObject(native(process), milliseconds)) {
+        case WAIT_OBJECT_0:
+            return kSuccess;
+        case WAIT_TIMEOUT:
+            return kWaitTimedOut;
+        default:
+            return GetLastError();
+    }
+}
+
+Status WindowsProcessHost::exitCode(ProcessHandle process, std::uint32_t& code) {
+    DWORD found = 0;
+    const Status status = judged(GetExitCodeProcess(native(process), &found));
+    if (status == kSuccess) {
+        code = found;
+    }
+    return status;
+}
+
+Status WindowsProcessHost::closeProcess(ProcessHandle process) {
+    return judged(CloseHandle(native(process)));
+}
+
+Status WindowsProcessHost::shortPath(std::string_view path, Buffer& shortened) {
+    const std::string text(path);
+    const DWORD length = GetShortPathNameA(text.c_str(), shortened.data, shortened.capacity);
+    if (length == 0) {
+        return GetLastError();
+    }
+    shortened.size = length;
+    return length < shortened.capacity ? kSuccess : kMoreData;
+}
+
+}  // namespace kz7

@@ -1,0 +1,25 @@
+// The registry port on the Windows registry, narrow calls.
+#pragma once
+
+#include "install/platform/registry_store.h"
+
+namespace kz7 {
+
+class WindowsRegistry final : public IRegistryStore {
+public:
+    Status openKey(KeyHandle parent, std::string_view path, AccessMask access, KeyHandle& key) override;
+    Status createKey(KeyHandle parent, std::string_view path, std::string_view keyClass, AccessMask access,
+                     KeyHandle& key) override;
+    Status closeKey(KeyHandle key) override;
+    Status queryValue(KeyHandle key, std::string_view name, ValueType* type, Buffer& data) override;
+    Status setValue(KeyHandle key, std::string_view name, ValueType type, std::string_view data) override;
+    Status deleteValue(KeyHandle key, std::string_view name) override;
+    Status enumerateKey(KeyHandle key, std::uint32_t index, Buffer& name, Buffer* keyClass) override;
+    Status enumerateValue(KeyHandle key, std::uint32_t index, Buffer& name, ValueType* type, Buffer* data) override;
+    Status deleteKey(KeyHandle parent, std::string_view path, AccessMask view) override;
+
+    // Every call is seen by others at once.
+    Status commit() override { return kSuccess; }
+};
+
+}  // namespace kz7

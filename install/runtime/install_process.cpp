@@ -1,0 +1,391 @@
+#include "install/runtime/install_process.h"
+
+#include <algorithm>
+#include <cstdlib>
+#include <cstring>
+#include <new>
+
+namespace kz7 {
+namespace {
+
+constexpr std::size_t kFirstCapacity = 1024;   // bytes of captured text before the first doubling
+constexpr std::uint32_t kPieceSize = 512;      // bytes of one read from a pipe
+constexpr std::uint32_t kShortPathSize = 261;  // bytes of a short path with its terminator
+constexpr std::string_view kWakingBytes("\0\0\0", 3);
+constexpr std::string_view kWrapperProgram = "kz7.exe";
+
+// clang-format off
+struct ProgramType { std::string_view ending; bool quoted; };
+constexpr ProgramType kProgramTypes[] = {  // in the order of the search, not by their place in a command
+    {".exe", true },
+    {".bat", false},
+    {".com", true },
+    {".cmd", false},
+};
+// clang-format on
+
+// Every wait leaves the message text of its process here.
+FixedText<256> lastMessageText;
+
+std::size_t findIgnoringCase(std::string_view text, std::string_view part) {
+    const auto found = std::search(text.begin(), text.end(), part.begin(), part.end(),
+                                   [](char a, char b) { return foldUpper(a) == foldUpper(b); });
+    return found != text.end() ? static_cast<std::size_t>(found - text.begin()) : std::string_view::npos;
+}
+
+}  // namespace
+
+// What a reader has collected: its own until it was joined.
+class InstallProcess::CollectedText {
+public:
+    CollectedText() = default;
+    ~CollectedText() { std::free(room_); }
+    CollectedText(const CollectedText&) = delete;
+    CollectedText& operator=(const CollectedText&) = delete;
+
+    // False when there is no memory; the text so far stays.
+    bool begin() { return grow(kFirstCapacity); }
+
+    bool append(std::string_view piece) {
+        while (length_ + piece.size() > capacity_) {
+            if (!grow(capacity_ * 2)) {
+                return false;
+            }
+        }
+        std::memcpy(room_ + length_, piece.data(), piece.size());
+        length_ += piece.size();
+        return true;
+    }
+
+    void terminate() { room_[length_] = '\0'; }
+
+    bool begun() const { return room_ != nullptr; }
+    std::string_view view() const { return begun() ? std::string_view(room_) : std::string_view{}; }
+
+private:
+    bool grow(std::size_t capacity) {
+        // A text that fills its capacity is terminated one past it.
+        void* room = std::realloc(room_, capacity + 1);
+        if (room == nullptr) {
+            return false;
+        }
+        room_ = static_cast<char*>(room);
+        capacity_ = capacity;
+        return true;
+    }
+
+    char* room_ = nullptr;
+    std::size_t capacity_ = 0;
+    std::size_t length_ = 0;
+};
+
+// A reader thread's argument, which it frees. The reader ends by closing its read end, so that neither a
+// waking byte nor the program can wait for a reader that is gone.
+struct InstallProcess::Reader {
+    IProcessHost& host;
+    OwnedStream readEnd;
+    Collected text;
+    std::shared_ptr<const std::atomic<bool>> stop;
+
+    static void run(void* argument) {
+        const std::unique_ptr<Reader> reader(static_cast<Reader*>(argument));
+        if (reader->text->begin()) {
+            reader->collect();
+            reader->text->terminate();
+        }
+    }
+
+    void collect() {
+        FixedBuffer<kPieceSize> piece;
+        bool kept = true;
+        // Deliberate: a read of 0 bytes ends the reader, and what is read in the pass that sees the stop flag
+        // is dropped, the waking bytes among it; callers know captured texts this way.
+        while (host.read(readEnd.get(), piece) == kSuccess && piece.size != 0 && !stop->load()) {
+            // Out of memory, the rest is read and dropped: the program's own result stays true.
+            kept = kept && text->append(piece.view());
+        }
+    }
+};
+
+InstallProcess::InstallProcess(IProcessHost& host, IThreads& threads, IReportSink& sink, const char* command,
+                               const char* workingDirectory, bool wrapperMode, bool wrapperSwitch, bool spare)
+    : host_(host),
+      threads_(threads),
+      sink_(sink),
+      wrapperSwitch_(wrapperSwitch),
+      errorWriteEnd_(host),
+      outputWriteEnd_(host),
+      wrapperMode_(wrapperMode),
+      workingDirectory_(workingDirectory != nullptr ? std::make_unique<std::string>(workingDirectory) : nullptr),
+      spare_(spare) {
+    if (build(command) == kNoProgramType) {
+        commandLine_.assign(command);
+    }
+}
+
+InstallProcess::~InstallProcess() {
+    giveUpRun();
+}
+
+std::string_view InstallProcess::lastMessage() {
+    return lastMessageText.view();
+}
+
+Status InstallProcess::buildCommandLine(IProcessHost& host, CommandLine& commandLine, std::string_view command) {
+    commandLine.assign({});
+    for (const ProgramType& type : kProgramTypes) {
+        const std::size_t found = findIgnoringCase(command, type.ending);
+        if (found == std::string_view::npos) {
+            continue;
+        }
+        const std::string_view program = command.substr(0, found + type.ending.size());
+        std::string_view rest = command.substr(program.size());
+        if (type.quoted) {
+            commandLine.append(program.starts_with('"') ? "" : "\"");
+            commandLine.append(program);
+            commandLine.append("\"");
+            rest.remove_prefix(rest.starts_with('"') ? 1 : 0);
+        } else {
+            commandLine.append(program);
+            FixedBuffer<kShortPathSize> shortened;
+            // Deliberate: a leading quotation mark goes into the shortening, which then finds no such file
+            // and leaves the text alone; the closing mark that follows makes it whole again.
+            if (host.shortPath(commandLine.view(), shortened) == kSuccess) {
+                commandLine.assign(shortened.view());
+            }
+        }
+        commandLine.append(rest);
+        return kSuccess;
+    }
+    return kNoProgramType;
+}
+
+// The command line of the object: kNoProgramType leaves it empty.
+Status InstallProcess::build(const char* command) {
+    commandLine_.assign({});
+    if (command == nullptr) {
+        return kSuccess;
+    }
+    if (!wrapperMode_) {
+        timeout_ = kInfiniteWait;
+        return buildCommandLine(host_, commandLine_, command);
+    }
+    statement_.assign(command);
+    const Status status = buildCommandLine(host_, commandLine_, kWrapperProgram);
+    commandLine_.append(wrapperSwitch_ ? " -a -v \"" : " -ec -v \"");
+    commandLine_.append(statement_.view());
+    commandLine_.append("\"");
+    return status;
+}
+
+void InstallProcess::setCommand(const char* command) {
+    giveUpRun();
+    build(command);
+}
+
+Status InstallProcess::execute(bool wait, bool trace) {
+    giveUpRun();
+    if (trace) {
+        sink_.trace(kTraceError, "InstallProcess::execute", 10, kSuccess, commandLine_.view());
+    }
+    StreamHandle output = StreamHandle::none;
+    StreamHandle error = StreamHandle::none;
+    host_.getSlot(StandardSlot::output, output);
+    host_.getSlot(StandardSlot::error, error);
+    const Status status = run(wait);
+    // Deliberate: both go back through the output slot, so that it ends with the old standard error and the
+    // error slot still names a closed pipe; what inspects the slots afterwards knows them so. Nothing may
+    // write through a slot, close it or test it.
+    host_.setSlot(StandardSlot::output, output);
+    host_.setSlot(StandardSlot::output, error);
+    return status;
+}
+
+Status InstallProcess::run(bool wait) {
+    OwnedStream outputReadEnd(host_);
+    OwnedStream errorReadEnd(host_);
+    if (openPipes(outputReadEnd, errorReadEnd) != kSuccess) {
+        // Deliberate: not reported here; the wait that follows tells that nothing was executed.
+        closeWriteEnds();
+        return kSuccess;
+    }
+    stop_ = std::make_shared<std::atomic<bool>>(false);
+    // Deliberate: only the second start is the result, and the program is started whatever it is; a stream
+    // without reader is a closed pipe to the program.
+    startReader(outputReadEnd, standardOutputText_, outputReader_);
+    const Status status = startReader(errorReadEnd, standardErrorText_, errorReader_);
+    const ProcessStart start{commandLine_.view(), workingDirectory_ ? std::string_view(*workingDirectory_) : "",
+                             outputWriteEnd_.get(), errorWriteEnd_.get()};
+    const Status created = host_.startProcess(start, process_);
+    if (wait) {
+        waitOrWake();
+    }
+    // Deliberate: set for a program that could not be started too; the wait then tells that it has no exit code.
+    executed_ = true;
+    if (created != kSuccess) {
+        timeout_ = 0;
+        waitOrWake();
+        joinReader(outputReader_);
+        joinReader(errorReader_);
+    }
+    return status;
+}
+
+Status InstallProcess::openPipes(OwnedStream& outputEnd, OwnedStream& errorEnd) {
+    OwnedStream outputInheritable(host_);
+    OwnedStream errorInheritable(host_);
+    Status status = host_.createPipe(outputInheritable.receive(), outputWriteEnd_.receive());
+    if (status == kSuccess) {
+        status = host_.createPipe(errorInheritable.receive(), errorWriteEnd_.receive());
+    }
+    if (status == kSuccess) {
+        status = host_.setSlot(StandardSlot::output, outputWriteEnd_.get());
+    }
+    if (status == kSuccess) {
+        status = host_.setSlot(StandardSlot::error, errorWriteEnd_.get());
+    }
+    // The program must not hold the read ends, or a reader's end would never be seen.
+    if (status == kSuccess) {
+        status = host_.duplicate(outputInheritable.get(), outputEnd.receive());
+    }
+    if (status == kSuccess) {
+        status = host_.duplicate(errorInheritable.get(), errorEnd.receive());
+    }
+    return status;
+}
+
+Status InstallProcess::startReader(OwnedStream& readEnd, Collected& text, ThreadRecord& record) {
+    text = std::make_shared<CollectedText>();
+    auto reader = std::make_unique<Reader>(Reader{host_, std::move(readEnd), text, stop_});
+    const Status status = ureCreateThread(threads_, sink_, Reader::run, reader.get(), &record);
+    if (status == kSuccess) {
+        reader.release();
+    } else {
+        text.reset();
+    }
+    return status;
+}
+
+// Waits for the program up to the timeout; readers of one that did not end are stopped.
+void InstallProcess::waitOrWake() {
+    if (host_.waitProcess(process_.process, timeout_) != kSuccess) {
+        wakeReaders();
+    }
+    closeWriteEnds();
+}
+
+void InstallProcess::wakeReaders() {
+    if (stop_ != nullptr) {
+        stop_->store(true);
+    }
+    for (const OwnedStream* end : {&outputWriteEnd_, &errorWriteEnd_}) {
+        if (*end) {
+            host_.write(end->get(), kWakingBytes);
+        }
+    }
+}
+
+void InstallProcess::closeWriteEnds() {
+    outputWriteEnd_.reset();
+    errorWriteEnd_.reset();
+}
+
+Status InstallProcess::waitForCompletion(std::uint32_t& exitCode, std::uint32_t timeout) {
+    timeout_ = timeout;
+    waitOrWake();
+    if (!executed_) {
+        exitCode = kNotExecuted;
+        return kNotExecuted;
+    }
+    lastMessageText = messageText_;
+    if (!messageText_.empty()) {
+        exitCode = static_cast<std::uint32_t>(resultCode_);
+        return kSuccess;
+    }
+    std::uint32_t code = kExitCodeUnavailable;
+    const Status status = host_.exitCode(process_.process, code);
+    joinReader(outputReader_);
+    joinReader(errorReader_);
+    exitCode = code;
+    return status == kSuccess ? kSuccess : kExitCodeUnavailable;
+}
+
+// True when the reader has ended, or there is none: what it collected may be read.
+bool InstallProcess::joinReader(ThreadRecord& record) {
+    if (record.handle == ThreadHandle::none) {
+        return true;
+    }
+    if (threads_.wait(record.handle) != kSuccess) {
+        return false;
+    }
+    threads_.close(std::exchange(record.handle, ThreadHandle::none));
+    return true;
+}
+
+std::string_view InstallProcess::collected(const Collected& text, ThreadRecord& record) {
+    return joinReader(record) && text != nullptr ? text->view() : std::string_view{};
+}
+
+Status InstallProcess::copyOut(const Collected& text, ThreadRecord& record, char* buffer, std::size_t size) {
+    const std::string_view all = collected(text, record);
+    if (size != 0) {
+        buffer[all.substr(0, size - 1).copy(buffer, size - 1)] = '\0';
+    }
+    return all.data() == nullptr || all.size() < size ? kSuccess : kBufferTooSmall;
+}
+
+Status InstallProcess::copyStandardOutput(char* buffer, std::size_t size) {
+    return copyOut(standardOutputText_, outputReader_, buffer, size);
+}
+
+Status InstallProcess::copyStandardError(char* buffer, std::size_t size) {
+    return copyOut(standardErrorText_, errorReader_, buffer, size);
+}
+
+std::size_t InstallProcess::standardOutputLength() {
+    return collected(standardOutputText_, outputReader_).size();
+}
+
+void InstallProcess::postOutput(std::string_view source, std::uint32_t flags) {
+    postStandardOutput(source, flags);
+    postStandardError(source, flags);
+}
+
+void InstallProcess::postStandardOutput(std::string_view source, std::uint32_t flags) {
+    post(kStandardOutputMessage, collected(standardOutputText_, outputReader_), source, flags);
+}
+
+void InstallProcess::postStandardError(std::string_view source, std::uint32_t flags) {
+    post(kStandardErrorMessage, collected(standardErrorText_, errorReader_), source, flags);
+}
+
+void InstallProcess::post(std::uint32_t number, std::string_view text, std::string_view source, std::uint32_t flags) {
+    if (!text.empty()) {
+        sink_.post(number, flags | kPostedByProcess, source, text);
+    }
+}
+
+// Ends what an earlier run left: no reader of it writes into the object any more.
+void InstallProcess::giveUpRun() {
+    wakeReaders();
+    closeWriteEnds();
+    for (ThreadRecord* record : {&outputReader_, &errorReader_}) {
+        if (!joinReader(*record)) {
+            // It has its text to itself.
+            threads_.close(record->handle);
+        }
+        *record = {};
+    }
+    for (const ProcessHandle handle : {process_.process, process_.mainThread}) {
+        if (handle != ProcessHandle::none) {
+            host_.closeProcess(handle);
+        }
+    }
+    process_ = {};
+    stop_.reset();
+    standardOutputText_.reset();
+    standardErrorText_.reset();
+    executed_ = false;
+}
+
+}  // namespace kz7

@@ -1,0 +1,135 @@
+// Runs one command for the installer runtime: turns it into a command line that starts the right program,
+// starts it hidden with its output captured, waits, and hands the captured output out or posts it.
+#pragma once
+
+#include <array>
+#include <atomic>
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <string_view>
+
+#include "install/platform/process_host.h"
+#include "install/platform/text.h"
+#include "install/platform/threads.h"
+#include "install/runtime/create_thread.h"
+#include "install/runtime/report_sink.h"
+
+namespace kz7 {
+
+inline constexpr std::size_t kCommandLineSize = 780;          // bytes of a command line with its terminator
+inline constexpr std::uint32_t kStandardOutputMessage = 997;  // posts what a program wrote
+inline constexpr std::uint32_t kStandardErrorMessage = 999;   // posts what a program wrote on standard error
+inline constexpr std::uint32_t kPostedByProcess = 0x4000000;  // added to the flags of either post
+
+using CommandLine = FixedText<kCommandLineSize>;
+
+// Calling order: construct, `execute(true, false)`, `waitForCompletion` without limit, then the output.
+// `execute` exchanges the process-wide standard handles, so no two threads execute at once, and one object
+// belongs to one thread. The two readers share the captured texts and the stop flag only.
+//
+// Whoever writes to the console flushes it before `execute`: the program's own lines may follow at once.
+// Whoever keeps a store open commits it before: the program reads it.
+class InstallProcess {
+public:
+    // `command` may be null, which leaves nothing to run; `workingDirectory` null is this process's own.
+    // `wrapperMode` runs the command as a statement of the product's command processor, with the first or the
+    // second of its option texts by `wrapperSwitch`. The ports and the sink outlive the object.
+    InstallProcess(IProcessHost& host, IThreads& threads, IReportSink& sink, const char* command,
+                   const char* workingDirectory = nullptr, bool wrapperMode = false, bool wrapperSwitch = false,
+                   bool spare = false);
+
+    // Wakes and joins both readers. A program that still runs is neither killed nor waited for. Where a
+    // program that has ended left its pipes to another, the readers are waited for until that one ends.
+    ~InstallProcess();
+    InstallProcess(const InstallProcess&) = delete;
+    InstallProcess& operator=(const InstallProcess&) = delete;
+
+    // Starts the program; with `wait`, returns once it has ended or the timeout passed, which is infinite
+    // unless an earlier wait set another. Returns the status of starting the reader of standard error and
+    // nothing else: whether the program runs is for the wait to say. An earlier run of the object is given up.
+    Status execute(bool wait, bool trace);
+
+    // Waits for the program and its readers. kNotExecuted; kExitCodeUnavailable: the program could not be
+    // started; `exitCode` is then that status too, so that it never reads as a success. After the timeout, in
+    // milliseconds, the readers are stopped, and the exit code is what the system tells of a running program.
+    Status waitForCompletion(std::uint32_t& exitCode, std::uint32_t timeout);
+
+    // Copies what was captured, cut to `size` bytes with a terminator in the last one. kBufferTooSmall: the
+    // text with its terminator does not fit. Captured texts end at their first NUL.
+    Status copyStandardOutput(char* buffer, std::size_t size);
+    Status copyStandardError(char* buffer, std::size_t size);
+    std::size_t standardOutputLength();
+
+    // Posts what was captured and is not empty.
+    void postOutput(std::string_view source, std::uint32_t flags);
+    void postStandardOutput(std::string_view source, std::uint32_t flags);
+    void postStandardError(std::string_view source, std::uint32_t flags);
+
+    // Gives the object another command to run; one without a known program type leaves nothing to run.
+    void setCommand(const char* command);
+
+    // The command line of a command, or kNoProgramType and an empty one.
+    static Status buildCommandLine(IProcessHost& host, CommandLine& commandLine, std::string_view command);
+
+    std::string_view commandLine() const { return commandLine_.view(); }
+
+    // The message text of the process that was waited for last.
+    static std::string_view lastMessage();
+
+private:
+    class CollectedText;
+    struct Reader;
+    using Collected = std::shared_ptr<CollectedText>;
+
+    Status build(const char* command);
+    Status run(bool wait);
+    Status openPipes(OwnedStream& outputEnd, OwnedStream& errorEnd);
+    Status startReader(OwnedStream& readEnd, Collected& text, ThreadRecord& record);
+    void waitOrWake();
+    void wakeReaders();
+    void closeWriteEnds();
+    bool joinReader(ThreadRecord& record);
+    std::string_view collected(const Collected& text, ThreadRecord& record);
+    Status copyOut(const Collected& text, ThreadRecord& record, char* buffer, std::size_t size);
+    void post(std::uint32_t number, std::string_view text, std::string_view source, std::uint32_t flags);
+    void giveUpRun();
+
+    IProcessHost& host_;
+    IThreads& threads_;
+    IReportSink& sink_;
+
+    CommandLine commandLine_;
+    CommandLine statement_;
+
+protected:
+    // What is reported in place of the exit code where the text is not empty.
+    FixedText<256> messageText_;
+
+private:
+    [[maybe_unused]] std::array<char, 16> reservedText_{};
+    Collected standardErrorText_;
+    Collected standardOutputText_;
+    bool wrapperSwitch_;
+    [[maybe_unused]] void* reservedPointer_ = nullptr;
+
+protected:
+    std::int32_t resultCode_ = 0;
+
+private:
+    ThreadRecord outputReader_;
+    ThreadRecord errorReader_;
+    OwnedStream errorWriteEnd_;
+    OwnedStream outputWriteEnd_;
+    std::shared_ptr<std::atomic<bool>> stop_;
+    ProcessInformation process_;
+    [[maybe_unused]] bool wrapperEnvironment_ = false;  // no runtime here offers that environment
+    [[maybe_unused]] bool secondEnvironment_ = false;
+    std::uint32_t timeout_ = kInfiniteWait;  // milliseconds
+    bool executed_ = false;
+    bool wrapperMode_;
+    std::unique_ptr<std::string> workingDirectory_;
+    [[maybe_unused]] bool spare_;
+};
+
+}  // namespace kz7

@@ -1,0 +1,114 @@
+// What the embedded store adds to the port's contract: transactions, other processes, faults.
+#include "install/platform/embedded/registry.h"
+
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <filesystem>
+
+#include "install/src/registry_access.h"
+#include "tests/support/registry_dump.h"
+#include "tests/support/run_program.h"
+
+namespace kz7::test {
+namespace {
+
+constexpr KeyHandle kMachine = KeyHandle::localMachine;
+
+// One process's view of a store; two of them are two processes to SQLite.
+class EmbeddedStore : public testing::Test {
+protected:
+    EmbeddedRegistry open(bool readOnly = false) {
+        return {directory_.path(), readOnly, [this](const StoreFault& fault) { faults_.push_back(fault.reason); }};
+    }
+
+    TemporaryDirectory directory_;
+    std::vector<std::string> faults_;
+};
+
+TEST_F(EmbeddedStore, OnlyWhatWasCommittedStays) {
+    {
+        EmbeddedRegistry registry = open();
+        EXPECT_EQ(setText(registry, "Kept", "v", "1"), kSuccess);
+        EXPECT_EQ(registry.commit(), kSuccess);
+        EXPECT_EQ(registry.commit(), kSuccess) << "nothing to commit";
+        EXPECT_EQ(setText(registry, "Dropped", "v", "1"), kSuccess);
+    }
+    EmbeddedRegistry again = open();
+    EXPECT_EQ(dumpRegistry(again), "[Kept] \nKept : v = 1:1\\x00\n");
+}
+
+TEST_F(EmbeddedStore, AHandleOutlivesAMarkAndSeesWhatOthersDid) {
+    EmbeddedRegistry mine = open();
+    for (const char* path : {"K\\a", "K\\b", "Gone"}) {
+        ASSERT_EQ(setText(mine, path, "v", "1"), kSuccess);
+    }
+    OwnedKey key(mine);
+    OwnedKey gone(mine);
+    ASSERT_EQ(mine.openKey(kMachine, "K", kKeyFull, key.receive()), kSuccess);
+    ASSERT_EQ(mine.openKey(kMachine, "Gone", kKeyFull, gone.receive()), kSuccess);
+    FixedBuffer<16> name;
+    ASSERT_EQ(mine.enumerateKey(key.get(), 1, name, nullptr), kSuccess);
+    ASSERT_EQ(mine.commit(), kSuccess);
+    {
+        EmbeddedRegistry other = open();
+        ASSERT_EQ(setText(other, "K\\aa", "v", "1"), kSuccess);
+        ASSERT_EQ(other.deleteKey(kMachine, "Gone", 0), kSuccess);
+        ASSERT_EQ(setText(other, "Gone", "another key of that name", ""), kSuccess);
+        ASSERT_EQ(other.commit(), kSuccess);
+    }
+    EXPECT_EQ(mine.enumerateKey(key.get(), 1, name, nullptr), kSuccess);
+    EXPECT_EQ(name.view(), "aa");
+    EXPECT_EQ(mine.enumerateKey(key.get(), 3, name, nullptr), kNoMoreItems);
+    EXPECT_EQ(mine.setValue(gone.get(), "v", ValueType::sz, {}), kKeyDeleted);
+}
+
+TEST_F(EmbeddedStore, ReadingMakesNothingAndTakesNoLock) {
+    const std::string inside = directory_.path() + "/state";
+    EmbeddedRegistry none(inside, true, [](const StoreFault&) {});
+    EXPECT_EQ(dumpRegistry(none), "");
+    KeyHandle key{};
+    EXPECT_EQ(none.openKey(KeyHandle::currentUser, "x", kKeyRead, key), kFileNotFound);
+    EXPECT_FALSE(std::filesystem::exists(inside));
+
+    EmbeddedRegistry writer = open();
+    ASSERT_EQ(setText(writer, "K", "v", "1"), kSuccess);
+    EmbeddedRegistry reader = open(true);
+    EXPECT_EQ(dumpRegistry(reader), "") << "what a writer has not committed is not there yet";
+    EXPECT_EQ(writer.commit(), kSuccess);
+    EXPECT_TRUE(faults_.empty());
+}
+
+TEST_F(EmbeddedStore, AFaultIsToldOnceAndAnswersUntilTheMark) {
+    const std::string path = directory_.path() + "/registry.db";
+    std::filesystem::create_directory(path);
+    EmbeddedRegistry registry = open();
+    const Status status = setText(registry, "K", "v", "1");
+    EXPECT_NE(status, kSuccess);
+    EXPECT_EQ(setText(registry, "K", "v", "1"), status);
+    EXPECT_EQ(faults_.size(), 1U);
+    std::filesystem::remove(path);
+    EXPECT_EQ(setText(registry, "K", "v", "1"), status) << "half of a run must not become the whole of it";
+    EXPECT_EQ(registry.commit(), status);
+    EXPECT_EQ(setText(registry, "K", "v", "1"), kSuccess) << "a new run starts over";
+}
+
+TEST_F(EmbeddedStore, TheCallersKeyIsMadeOnFirstUse) {
+    EmbeddedRegistry registry = open();
+    OwnedKey key(registry);
+    ASSERT_EQ(registry.createKey(KeyHandle::currentUser, "Mine", {}, kKeyFull, key.receive()), kSuccess);
+    EXPECT_EQ(dumpRegistry(registry, KeyHandle::users),
+              "[S-1-22-1-" + std::to_string(geteuid()) + "] \n[S-1-22-1-" + std::to_string(geteuid()) + "\\Mine] \n");
+}
+
+TEST_F(EmbeddedStore, TheLogDoesNotGrowForEver) {
+    for (int run = 0; run < 40; ++run) {
+        EmbeddedRegistry registry = open();
+        ASSERT_EQ(setText(registry, "K", "v" + std::to_string(run), std::string(20000, 'x')), kSuccess);
+        ASSERT_EQ(registry.commit(), kSuccess);
+    }
+    EXPECT_LT(std::filesystem::file_size(directory_.path() + "/registry.db-wal"), std::size_t{400} * 1024);
+}
+
+}  // namespace
+}  // namespace kz7::test
