@@ -11,6 +11,7 @@ using Status = std::uint32_t;
 // clang-format off
 inline constexpr Status kSuccess                 = 0;
 inline constexpr Status kFileNotFound            = 2;     // also: no such key, no such value
+inline constexpr Status kPathNotFound            = 3;     // a folder of a path is missing
 inline constexpr Status kTooManyOpenFiles        = 4;
 inline constexpr Status kAccessDenied            = 5;     // also: a key that still has subkeys, a right the handle lacks
 inline constexpr Status kInvalidHandle           = 6;

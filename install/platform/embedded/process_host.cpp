@@ -4,8 +4,8 @@
 #include <poll.h>
 #include <pthread.h>
 #include <spawn.h>
-#include <sys/pidfd.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -180,7 +180,7 @@ pid_t waitForChild(pid_t id, int* ending, int options) {
 void waitWithin(pid_t id, std::uint32_t milliseconds) {
     using Clock = std::chrono::steady_clock;
     const auto deadline = Clock::now() + std::chrono::milliseconds(milliseconds);
-    pollfd watched{pidfd_open(id, 0), POLLIN, 0};
+    pollfd watched{static_cast<int>(syscall(SYS_pidfd_open, id, 0)), POLLIN, 0};
     if (watched.fd == -1) {
         return;
     }

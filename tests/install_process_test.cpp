@@ -1,0 +1,371 @@
+// Running a command with its output captured: the command lines that are built, and what each kind of program
+// leaves behind, on scripted programs and on real ones.
+#include "install/runtime/install_process.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+
+#include "install/platform/memory/process_host.h"
+#include "install/platform/memory/threads.h"
+#include "tests/support/gate.h"
+#include "tests/support/host_processes.h"
+
+namespace kz7::test {
+namespace {
+
+// Keeps what is said, a line each.
+class ListedSink final : public IReportSink {
+public:
+    void trace(std::uint32_t code, std::string_view function, std::uint32_t probe, Status value,
+               std::string_view text) override {
+        lines.push_back(compose("trace %u %s %u %u %s", {code, function, probe, value, text}));
+    }
+    void error(std::uint32_t code, std::string_view function, std::uint32_t probe, Status value) override {
+        lines.push_back(compose("error %u %s %u %u", {code, function, probe, value}));
+    }
+    void post(std::uint32_t number, std::uint32_t flags, std::string_view source, std::string_view insert) override {
+        lines.push_back(compose("post %u %u %s ", {number, flags, source}) + std::string(insert));
+    }
+
+    std::vector<std::string> lines;
+};
+
+std::string outputOf(InstallProcess& process) {
+    std::string text(process.standardOutputLength() + 1, '#');
+    EXPECT_EQ(process.copyStandardOutput(text.data(), text.size()), kSuccess);
+    text.pop_back();
+    return text;
+}
+
+std::string errorOf(InstallProcess& process, std::size_t room = 100) {
+    std::string text(room + 1, '#');
+    EXPECT_EQ(process.copyStandardError(text.data(), text.size()), kSuccess);
+    text.resize(text.find('\0'));
+    return text;
+}
+
+// Programs in a table.
+class ScriptedProcess : public testing::Test {
+protected:
+    ~ScriptedProcess() override {
+        EXPECT_EQ(host_.openHandles(), 0U);
+        EXPECT_EQ(threads_.openHandles(), 0U);
+    }
+
+    MemoryProcessHost host_;
+    MemoryThreads threads_;
+    ListedSink sink_;
+};
+
+TEST_F(ScriptedProcess, BuildsCommandLines) {
+    host_.addProgram(R"(C:\Program Files\x\run.cmd)", {});
+    // clang-format off
+    const struct { const char* command; const char* built; const char* why; } rows[] = {
+        {R"(setup.exe /q)",                        R"("setup.exe" /q)",                         "quoted"},
+        {R"(C:\a b\SETUP.EXE /q)",                 R"("C:\a b\SETUP.EXE" /q)",                  "the type in capitals"},
+        {R"("C:\a b\setup.exe" /q)",               R"("C:\a b\setup.exe" /q)",                  "quoted already: one pair stays"},
+        {R"("C:\a b\setup.exe /q)",                R"("C:\a b\setup.exe" /q)",                  "an opening quote alone is closed"},
+        {R"(more.com)",                            R"("more.com")",                             "nothing behind the program"},
+        {R"(a.cmd b.exe c)",                       R"("a.cmd b.exe" c)",                        "the order of the types, not of their places"},
+        {R"(a.com b.bat c)",                       R"(a.com b.bat c)",                          ".bat before .com"},
+        {R"(C:\my.exe d\bin\t.exe -x)",            R"("C:\my.exe" d\bin\t.exe -x)",             "a type inside a folder's name cuts the program there"},
+        {R"(C:\Program Files\x\run.cmd arg)",      R"(C:\ProgramFiles\x\run.cmd arg)",          "the short path, unquoted"},
+        {R"("C:\Program Files\x\run.cmd" arg)",    R"("C:\Program Files\x\run.cmd" arg)",       "a leading quote is part of what is shortened, in vain"},
+        {R"(C:\not there\run.bat arg)",            R"(C:\not there\run.bat arg)",               "no short path to be had"},
+        {"C:\\k\\c.exe -p C:\\k\\\n -migratev8 ",  "\"C:\\k\\c.exe\" -p C:\\k\\\n -migratev8 ", "a line feed is part of the arguments"},
+        {R"(100%\t.exe %s%n %d)",                  R"("100%\t.exe" %s%n %d)",                   "percent signs are text"},
+    };
+    // clang-format on
+    for (const auto& row : rows) {
+        CommandLine built;
+        EXPECT_EQ(InstallProcess::buildCommandLine(host_, built, row.command), kSuccess) << row.why;
+        EXPECT_EQ(built.view(), row.built) << row.why;
+        InstallProcess process(host_, threads_, sink_, row.command);
+        EXPECT_EQ(process.commandLine(), row.built) << row.why;
+        process.setCommand("again.exe");
+        EXPECT_EQ(process.commandLine(), "\"again.exe\"") << row.why;
+    }
+    CommandLine built("left over");
+    EXPECT_EQ(InstallProcess::buildCommandLine(host_, built, "notepad x"), kNoProgramType);
+    EXPECT_EQ(built.view(), "");
+    InstallProcess untyped(host_, threads_, sink_, "notepad x");
+    EXPECT_EQ(untyped.commandLine(), "notepad x");
+    untyped.setCommand("notepad x");
+    EXPECT_EQ(untyped.commandLine(), "") << "a later command needs its type";
+
+    const std::string tooLong = "t.exe " + std::string(1000, 'a');
+    EXPECT_EQ(InstallProcess(host_, threads_, sink_, tooLong.c_str()).commandLine(),
+              "\"t.exe\" " + std::string(779 - 8, 'a'));
+    EXPECT_EQ(InstallProcess(host_, threads_, sink_, nullptr).commandLine(), "");
+    EXPECT_EQ(InstallProcess(host_, threads_, sink_, "CATALOG X", nullptr, true, false).commandLine(),
+              R"("kz7.exe" -ec -v "CATALOG X")");
+    EXPECT_EQ(InstallProcess(host_, threads_, sink_, "run.cmd x", nullptr, true, true).commandLine(),
+              R"("kz7.exe" -a -v "run.cmd x")");
+}
+
+TEST_F(ScriptedProcess, HandsOutAndPostsWhatWasWritten) {
+    host_.addProgram("t.exe", {.output = "five5", .error = std::string("cut\0off", 7), .exitCode = 7});
+    InstallProcess process(host_, threads_, sink_, "t.exe %n");
+    EXPECT_EQ(process.standardOutputLength(), 0U) << "nothing was collected yet";
+    EXPECT_EQ(process.execute(true, true), kSuccess);
+    std::uint32_t code = 0;
+    EXPECT_EQ(process.waitForCompletion(code, kInfiniteWait), kSuccess);
+    EXPECT_EQ(code, 7U);
+    EXPECT_EQ(process.standardOutputLength(), 5U);
+
+    // clang-format off
+    const struct { std::size_t size; Status status; const char* copied; const char* why; } rows[] = {
+        {0, kBufferTooSmall, "######", "no room at all"},
+        {1, kBufferTooSmall, "",       "room for the terminator"},
+        {5, kBufferTooSmall, "five",   "a buffer of the text's length cuts its last character"},
+        {6, kSuccess,        "five5",  "text and terminator"},
+    };
+    // clang-format on
+    for (const auto& row : rows) {
+        char buffer[] = "######";
+        EXPECT_EQ(process.copyStandardOutput(buffer, row.size), row.status) << row.why;
+        EXPECT_STREQ(buffer, row.copied) << row.why;
+    }
+    char error[] = "########";
+    EXPECT_EQ(process.copyStandardError(error, 4), kSuccess) << "the text ends at its first NUL";
+    EXPECT_STREQ(error, "cut");
+
+    process.postOutput("setDBMUsingProcess", 1);
+    const std::vector<std::string> expected{
+        "trace 67108865 InstallProcess::execute 10 0 \"t.exe\" %n",
+        "post 997 67108865 setDBMUsingProcess five5",
+        "post 999 67108865 setDBMUsingProcess cut",
+    };
+    EXPECT_EQ(sink_.lines, expected);
+    EXPECT_EQ(host_.started, std::vector<std::string>{"\"t.exe\" %n"});
+}
+
+TEST_F(ScriptedProcess, CapturedTextsKeepTheirLengthAroundEveryDoubling) {
+    for (const std::size_t length : {0U, 1U, 511U, 512U, 513U, 1023U, 1024U, 1025U, 2048U, 2049U, 100000U}) {
+        const std::string text(length, 'x');
+        host_.addProgram("t.exe", {.output = text});
+        InstallProcess process(host_, threads_, sink_, "t.exe");
+        process.execute(true, false);
+        EXPECT_TRUE(outputOf(process) == text) << length;
+        process.postOutput("silent", 0);
+        EXPECT_EQ(sink_.lines.size(), length == 0 ? 0U : 1U) << length;
+        sink_.lines.clear();
+    }
+}
+
+TEST_F(ScriptedProcess, TellsWhatWasNotExecutedAndWhatCouldNotBe) {
+    std::uint32_t code = 0;
+    InstallProcess process(host_, threads_, sink_, "missing.exe");
+    EXPECT_EQ(process.waitForCompletion(code, kInfiniteWait), kNotExecuted);
+    EXPECT_EQ(code, kNotExecuted);
+    EXPECT_EQ(process.execute(true, false), kSuccess);
+    code = 0;
+    EXPECT_EQ(process.waitForCompletion(code, kInfiniteWait), kExitCodeUnavailable);
+    EXPECT_EQ(code, kExitCodeUnavailable);
+    EXPECT_EQ(outputOf(process), "");
+
+    host_.addProgram("t.exe", {.output = "now"});
+    process.setCommand("t.exe");
+    EXPECT_EQ(process.waitForCompletion(code, kInfiniteWait), kNotExecuted) << "another command is another run";
+    EXPECT_EQ(process.execute(true, false), kSuccess);
+    EXPECT_EQ(process.waitForCompletion(code, kInfiniteWait), kSuccess);
+    EXPECT_EQ(code, 0U);
+    EXPECT_EQ(outputOf(process), "now");
+
+    InstallProcess nothing(host_, threads_, sink_, nullptr);
+    EXPECT_EQ(nothing.execute(true, false), kSuccess);
+    EXPECT_EQ(nothing.waitForCompletion(code, kInfiniteWait), kExitCodeUnavailable);
+}
+
+TEST_F(ScriptedProcess, StopsItsReadersAfterTheTimeoutAndForgetsNothingElse) {
+    host_.addProgram("t.exe", {.output = "dropped", .exitCode = 4, .runsOn = true});
+    InstallProcess process(host_, threads_, sink_, "t.exe");
+    process.execute(false, false);
+    std::uint32_t code = 0;
+    EXPECT_EQ(process.waitForCompletion(code, 100), kSuccess);
+    EXPECT_EQ(code, kExitCodeRunning);
+    EXPECT_EQ(outputOf(process), "") << "what is read beside the stop flag is dropped, waking bytes and all";
+    EXPECT_EQ(process.waitForCompletion(code, kInfiniteWait), kSuccess);
+    EXPECT_EQ(code, 4U) << "it was not killed";
+
+    process.execute(false, false);
+    process.execute(true, false);
+    EXPECT_EQ(host_.started.size(), 3U);
+    EXPECT_EQ(outputOf(process), "dropped") << "the timeout of the last wait stays: none";
+}
+
+TEST_F(ScriptedProcess, AMessageTextStandsForTheExitCode) {
+    struct Reporting : InstallProcess {
+        using InstallProcess::InstallProcess;
+        void report(std::string_view text, std::int32_t code) {
+            messageText_.assign(text);
+            resultCode_ = code;
+        }
+    };
+    host_.addProgram("t.exe", {.exitCode = 3});
+    Reporting process(host_, threads_, sink_, "t.exe");
+    process.execute(true, false);
+    process.report("refused", -2);
+    std::uint32_t code = 0;
+    EXPECT_EQ(process.waitForCompletion(code, kInfiniteWait), kSuccess);
+    EXPECT_EQ(code, 0xFFFFFFFEU);
+    EXPECT_EQ(InstallProcess::lastMessage(), "refused");
+    process.report("", -2);
+    EXPECT_EQ(process.waitForCompletion(code, kInfiniteWait), kSuccess);
+    EXPECT_EQ(code, 3U);
+    EXPECT_EQ(InstallProcess::lastMessage(), "");
+}
+
+TEST_F(ScriptedProcess, ThreadsNeedAFunctionAndARecord) {
+    ThreadRecord record;
+    EXPECT_EQ(ureCreateThread(threads_, sink_, nullptr, nullptr, &record), kNullArgument);
+    EXPECT_EQ(ureCreateThread(
+                  threads_, sink_, [](void*) {}, nullptr, nullptr),
+              kNullArgument);
+    const std::string line = "trace 67108865 ureCreateThread 10 5003 ";
+    EXPECT_EQ(sink_.lines, (std::vector<std::string>{line, line}));
+}
+
+// Real programs of this machine, and what they leave in the two slots.
+class RealProcess : public testing::Test {
+protected:
+    RealProcess() {
+        host_->getSlot(StandardSlot::output, output_);
+        host_->getSlot(StandardSlot::error, error_);
+    }
+    ~RealProcess() override {
+        host_->setSlot(StandardSlot::output, output_);
+        host_->setSlot(StandardSlot::error, error_);
+    }
+
+    InstallProcess make(const std::string& arguments) {
+        return InstallProcess(*host_, *threads_, sink_, (childProgram() + " " + arguments).c_str());
+    }
+
+    std::unique_ptr<IProcessHost> host_ = hostProcesses();
+    std::unique_ptr<IThreads> threads_ = hostThreads();
+    ListedSink sink_;
+    std::uint32_t code_ = 77;
+
+    StreamHandle output_ = StreamHandle::none;
+    StreamHandle error_ = StreamHandle::none;
+};
+
+TEST_F(RealProcess, CapturesWhatProgramsWriteAndHowTheyEnd) {
+    const std::string lineFeed = "arguments a\\\n -m ";
+    // clang-format off
+    const struct { std::string arguments; std::uint32_t code; const char* output; const char* error; const char* why; } rows[] = {
+        {"print said cried 5",                    5, "said", "cried", "both streams and the exit code"},
+        {"print \"\" cried 0",                    0, "",     "cried", "one stream stays empty"},
+        {"input",                                 0, "0 bytes of input", "", "standard input is empty"},
+        {R"(arguments a "b c" "d\"e" f\\g "h\\" %n%s)", 0, R"([a][b c][d"e][f\\g][h\][%n%s])", "", "arguments arrive as the C runtime splits them"},
+        {lineFeed,                                0, "[a\\\n][-m]", "", "a line feed is no blank"},
+    };
+    // clang-format on
+    for (const auto& row : rows) {
+        InstallProcess process = make(row.arguments);
+        EXPECT_EQ(process.execute(true, false), kSuccess) << row.why;
+        EXPECT_EQ(process.waitForCompletion(code_, kInfiniteWait), kSuccess) << row.why;
+        EXPECT_EQ(code_, row.code) << row.why;
+        std::string output = outputOf(process);
+        std::erase(output, '\r');
+        EXPECT_EQ(output, row.output) << row.why;
+        EXPECT_EQ(errorOf(process), row.error) << row.why;
+    }
+}
+
+TEST_F(RealProcess, RestoresBothSlotsThroughTheOneOfStandardOutput) {
+    StreamHandle output = StreamHandle::none;
+    StreamHandle error = StreamHandle::none;
+    for (int run = 0; run < 3; ++run) {
+        host_->getSlot(StandardSlot::error, error);
+        InstallProcess process = make("print said cried 0");
+        process.execute(true, false);
+        process.waitForCompletion(code_, kInfiniteWait);
+        EXPECT_EQ(outputOf(process), "said") << run;
+        host_->getSlot(StandardSlot::output, output);
+        EXPECT_EQ(output, error) << "standard output holds the old standard error";
+        host_->getSlot(StandardSlot::error, error);
+        EXPECT_NE(error, error_) << "standard error names a closed pipe";
+    }
+}
+
+TEST_F(RealProcess, CapturesAFloodOnBothStreams) {
+    InstallProcess process = make("flood 100 6");
+    process.execute(true, false);
+    EXPECT_EQ(process.waitForCompletion(code_, kInfiniteWait), kSuccess);
+    EXPECT_EQ(code_, 6U);
+    EXPECT_EQ(process.standardOutputLength(), 100U << 20);
+    const std::string error = errorOf(process, 100U << 20);
+    EXPECT_EQ(error.size(), 100U << 20);
+    EXPECT_EQ(std::count(error.begin(), error.end(), 'x'), 100 << 20);
+}
+
+TEST_F(RealProcess, ReadsOnUntilTheLastHolderOfThePipesIsGone) {
+    Gate gate;
+    InstallProcess process = make("leave " + gate.name());
+    process.execute(true, false);
+    gate.open();
+    EXPECT_EQ(process.waitForCompletion(code_, kInfiniteWait), kSuccess);
+    EXPECT_EQ(code_, 3U) << "the program's own, which ended before";
+    EXPECT_EQ(outputOf(process), "before and after");
+}
+
+TEST_F(RealProcess, WaitsForAProgramThatClosesItsOutputAtOnce) {
+    Gate gate;
+    InstallProcess process = make("close " + gate.name() + " 9");
+    process.execute(false, false);
+    gate.open();
+    EXPECT_EQ(process.waitForCompletion(code_, kInfiniteWait), kSuccess);
+    EXPECT_EQ(code_, 9U);
+    EXPECT_EQ(outputOf(process), "");
+}
+
+TEST_F(RealProcess, ATimeoutStopsTheReadersAndLeavesTheProgram) {
+    Gate gate;
+    InstallProcess process = make("gate " + gate.name() + " 8");
+    process.execute(false, false);
+    EXPECT_EQ(process.waitForCompletion(code_, 1), kSuccess);
+    EXPECT_EQ(code_, kExitCodeRunning);
+    EXPECT_EQ(process.standardOutputLength(), 0U);
+    gate.open();
+    std::uint32_t later = 0;
+    EXPECT_EQ(process.waitForCompletion(later, kInfiniteWait), kSuccess);
+    EXPECT_NE(later, kExitCodeRunning) << "it ran to an end of its own";
+}
+
+TEST_F(RealProcess, ATimeoutStopsTheReadersOfAFlood) {
+    for (const std::uint32_t timeout : {0U, 1U, 20U}) {
+        InstallProcess process = make("flood 0 0");
+        process.execute(false, false);
+        EXPECT_EQ(process.waitForCompletion(code_, timeout), kSuccess);
+        const std::string text = outputOf(process);
+        EXPECT_EQ(text.find_first_not_of('x'), std::string::npos) << "no waking byte among what was read";
+        EXPECT_EQ(process.waitForCompletion(code_, kInfiniteWait), kSuccess) << "nobody reads: its writing ends it";
+        EXPECT_NE(code_, kExitCodeRunning);
+    }
+}
+
+TEST_F(RealProcess, AnObjectMayGoWhileItsProgramRuns) {
+    Gate gate;
+    {
+        InstallProcess process = make("gate " + gate.name() + " 0");
+        process.execute(false, false);
+        InstallProcess flood = make("flood 0 0");
+        flood.execute(false, false);
+        flood.setCommand("other.exe");
+        EXPECT_EQ(flood.waitForCompletion(code_, 0), kNotExecuted);
+    }
+    gate.open();
+}
+
+TEST_F(RealProcess, AProgramThatNeverStartsHasNoExitCode) {
+    InstallProcess process(*host_, *threads_, sink_, "kz7-no-such-program.exe");
+    EXPECT_EQ(process.execute(true, false), kSuccess);
+    EXPECT_EQ(process.waitForCompletion(code_, kInfiniteWait), kExitCodeUnavailable);
+    EXPECT_EQ(process.standardOutputLength(), 0U);
+}
+
+}  // namespace
+}  // namespace kz7::test

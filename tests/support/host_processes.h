@@ -1,0 +1,18 @@
+// This machine's process and thread ports, and the program that the tests start with them.
+#pragma once
+
+#include <memory>
+#include <string>
+
+#include "install/platform/process_host.h"
+#include "install/platform/threads.h"
+
+namespace kz7::test {
+
+std::unique_ptr<IProcessHost> hostProcesses();
+std::unique_ptr<IThreads> hostThreads();
+
+// The path of the test's child program, in the host's form.
+std::string childProgram();
+
+}  // namespace kz7::test
