@@ -36,7 +36,7 @@ Status readInstallCopies(RegistryValues& values, CopiesByName& byName, CopiesByV
     IRegistryStore& registry = values.registry();
     OwnedKey key(registry);
     if (!succeeded(registry.openKey(KeyHandle::localMachine, layout::kCopies, kKeyReadSet, key.receive()))) {
-        values.debug().write(compose("Failed to open the registry key:%s", {layout::kCopies}));
+        values.tell("Failed to open the registry key:%s", {layout::kCopies});
         return kFailed;
     }
     FixedBuffer<kCopyNameRoom> name;
@@ -46,8 +46,8 @@ Status readInstallCopies(RegistryValues& values, CopiesByName& byName, CopiesByV
         if (copy.isValid()) {
             byVersion.insert_or_assign(copy.getVersion(), copy);
         }
-        values.debug().write(compose("%s version info of Install Copy '%s'",
-                                     {std::string_view(copy.isValid() ? "Valid" : "Invalid"), copy.getName()}));
+        values.tell("%s version info of Install Copy '%s'",
+                    {std::string_view(copy.isValid() ? "Valid" : "Invalid"), copy.getName()});
     }
     return kSuccess;
 }

@@ -33,7 +33,7 @@ Status InstallCopiesProfile::run() {
 
 Status InstallCopiesProfile::rewrite() {
     const auto fail = [this](std::string_view complaint) {
-        values_.debug().write(complaint);
+        values_.tell(complaint);
         return kFailed;
     };
     if (!succeeded(backupOldProfile())) {
@@ -57,7 +57,7 @@ Status InstallCopiesProfile::listAliases(std::string_view path, std::vector<std:
     IRegistryStore& registry = values_.registry();
     OwnedKey key(registry);
     if (!succeeded(registry.openKey(KeyHandle::localMachine, path, kKeyFull, key.receive()))) {
-        values_.debug().write(compose("Failed to open the registry key: %s", {path}));
+        values_.tell("Failed to open the registry key: %s", {path});
         return kFailed;
     }
     names = kz7::listAliases(registry, key.get());
@@ -112,15 +112,13 @@ Status InstallCopiesProfile::generateProfileInfo() {
 }
 
 std::string InstallCopiesProfile::nameFor(std::string_view prefix, const InstallCopyInfo* highest) {
-    IDebugOutput& debug = values_.debug();
     if (highest == nullptr) {
-        debug.write(compose("The highest version leading by '%s': ( none )", {prefix}));
-        debug.write(compose("Did not find corrsponding install name for '%s'", {prefix}));
+        values_.tell("The highest version leading by '%s': ( none )", {prefix});
+        values_.tell("Did not find corrsponding install name for '%s'", {prefix});
         return {};
     }
     // Deliberate: the quotation mark is never closed; whoever searches traces knows the text so.
-    debug.write(
-        compose("The highest version leading by '%s:%s--%s", {prefix, highest->getVersion(), highest->getName()}));
+    values_.tell("The highest version leading by '%s:%s--%s", {prefix, highest->getVersion(), highest->getName()});
     return highest->getName();
 }
 
@@ -141,7 +139,7 @@ Status InstallCopiesProfile::deleteAliases(std::string_view path, bool& allDelet
     }
     for (const std::string& name : names) {
         if (!succeeded(values_.deleteValue(path, name))) {
-            values_.debug().write(compose("Failed to delete value name: %s\\%s", {path, name}));
+            values_.tell("Failed to delete value name: %s\\%s", {path, name});
             allDeleted = false;
         }
     }
@@ -152,7 +150,7 @@ void InstallCopiesProfile::restoreOldProfile() {
     const auto restore = [this](std::string_view path, const AliasMap& profile) {
         for (const auto& [name, copy] : profile) {
             if (!succeeded(values_.setValue(path, name, copy))) {
-                values_.debug().write(compose("Failed to restore the value of: %s\\%s", {path, name}));
+                values_.tell("Failed to restore the value of: %s\\%s", {path, name});
             }
         }
     };
@@ -165,7 +163,7 @@ Status InstallCopiesProfile::writeProfile() {
     for (const auto& [prefix, copy] : profileInfo_) {
         for (const std::string_view path : {layout::kCopies, layout::kCopies32}) {
             if (!succeeded(values_.setValue(path, prefix, copy))) {
-                values_.debug().write(compose("Failed to update the value of '%s\\%s'", {path, prefix}));
+                values_.tell("Failed to update the value of '%s\\%s'", {path, prefix});
                 status = kFailed;
             }
         }

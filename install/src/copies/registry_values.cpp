@@ -1,6 +1,5 @@
 #include "install/src/copies/registry_values.h"
 
-#include "install/platform/text.h"
 #include "install/src/registry_access.h"
 
 namespace kz7 {
@@ -13,7 +12,7 @@ constexpr std::uint32_t kValueRoom = 100;  // bytes, the terminator included
 Status RegistryValues::open(std::string_view path, AccessMask access, OwnedKey& key) {
     const Status status = registry_.openKey(KeyHandle::localMachine, path, access, key.receive());
     if (!succeeded(status)) {
-        debug_.write(compose("Failed to open the registry key:%s", {path}));
+        tell("Failed to open the registry key:%s", {path});
     }
     return status;
 }
@@ -25,7 +24,7 @@ std::string RegistryValues::query(std::string_view path, std::string_view name, 
     }
     FixedBuffer<kValueRoom> data;
     if (!succeeded(queryText(registry_, key.get(), name, data))) {
-        debug_.write(compose(complaint, {path, name}));
+        tell(complaint, {path, name});
         return {};
     }
     return std::string(data.text());

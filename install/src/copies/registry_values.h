@@ -3,11 +3,13 @@
 // the debugger output alone.
 #pragma once
 
+#include <initializer_list>
 #include <string>
 #include <string_view>
 
 #include "install/platform/debug_output.h"
 #include "install/platform/registry_store.h"
+#include "install/platform/text.h"
 
 namespace kz7 {
 
@@ -26,8 +28,14 @@ public:
     Status setValue(std::string_view path, std::string_view name, std::string_view data);
     Status deleteValue(std::string_view path, std::string_view name);
 
+    // Composes a message for the debugger output, if anybody sees it.
+    void tell(std::string_view pattern, std::initializer_list<Insert> inserts = {}) {
+        if (debug_.isHeard()) {
+            debug_.write(compose(pattern, inserts));
+        }
+    }
+
     IRegistryStore& registry() { return registry_; }
-    IDebugOutput& debug() { return debug_; }
 
 private:
     Status open(std::string_view path, AccessMask access, OwnedKey& key);
