@@ -25,3 +25,11 @@ elseif(NOT KZ7_SANITIZERS)
   # A dynamic C++ start costs half a millisecond more; a fully static program could not load a level library.
   target_link_options(kz7_options INTERFACE -static-libstdc++ -static-libgcc)
 endif()
+
+# CLI11 is header only and lies in the host's own include folder, which a cross compiler must never see: only
+# its folder is linked into the build tree.
+find_path(KZ7_CLI11_FOLDER CLI/CLI.hpp PATHS /usr/include NO_DEFAULT_PATH NO_CMAKE_FIND_ROOT_PATH REQUIRED)
+file(MAKE_DIRECTORY ${PROJECT_BINARY_DIR}/cli11)
+file(CREATE_LINK ${KZ7_CLI11_FOLDER}/CLI ${PROJECT_BINARY_DIR}/cli11/CLI SYMBOLIC)
+add_library(kz7_cli11 INTERFACE)
+target_include_directories(kz7_cli11 SYSTEM INTERFACE ${PROJECT_BINARY_DIR}/cli11)
