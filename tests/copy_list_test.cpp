@@ -88,8 +88,8 @@ TEST(InstalledCopies, AreListedInRegistryOrder) {
     EXPECT_EQ(names(list), "A=" + std::string(255, 'p') + ";b=C:\\b;_=C:\\_\\;");
     EXPECT_EQ(list.status(), 0U);
     EXPECT_EQ(list.count(), 3U);
-    const std::vector<std::string> rejected = {"Invalid Installation Name", "no path",
-                                               "Invalid Installation Name", std::string(230, 'n'),
+    const std::vector<std::string> rejected = {"Invalid Installation Name", std::string(230, 'n'),
+                                               "Invalid Installation Name", "no path",
                                                "Invalid Installation Name", "too long a path"};
     EXPECT_EQ(machine.debugOutput_.messages, rejected);
     InstallCopy* first = list.first();

@@ -81,7 +81,7 @@ TEST(DeleteTreeTest, StatusAndWhatIsLeft) {
     const struct {
         const char* why;
         const char* path;
-        const char* copyName;
+        std::string copyName;
         const char* spared;
         Status status;
         std::string left;
@@ -91,8 +91,8 @@ TEST(DeleteTreeTest, StatusAndWhatIsLeft) {
         {"a path that is not there", "Nowhere", "", "", kFileNotFound, "everything"},
         {"the placeholder stands for the name", "$CurrentInstallationName$", "T", "", kSuccess, "[Beside] \n"},
         {"a placeholder without a name is literal", "$CurrentInstallationName$", "", "", kFileNotFound, "everything"},
-        {"a path over its 1,024 bytes", "$CurrentInstallationName$", std::string(1024, 'T').c_str(), "",
-         kFilenameExceedsRange, "everything"},
+        {"a path over its 1,024 bytes", "$CurrentInstallationName$", std::string(1024, 'T'), "", kFilenameExceedsRange,
+         "everything"},
         // The key with the spared one below it cannot go, and that failure ends the walk there.
         {"a spared name deeper down ends the walk at the key above it", "T", "", "w", kAccessDenied,
          "[Beside] \n[T] \n[T\\z] \n[T\\z\\Spared] \n[T\\z\\Spared\\w] \n"},

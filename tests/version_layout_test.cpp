@@ -209,7 +209,7 @@ TEST_F(Version9, WithoutARegistryOnlyTheProvidersAreRegistered) {
                           "421: Failed to copy copy SOFTWARE\\NVQ\\KZ7 to SOFTWARE\\NVQ\\KZ7BackupV8\n" + kPrefix +
                           "1345: Error occurred while backing up old registry\n");
     EXPECT_EQ(registeredFor, "C:\\KZ9");
-    EXPECT_EQ(machine.dump("SOFTWARE"), "");
+    EXPECT_EQ(machine.dump(), "");
 }
 
 TEST_F(Version9, MissingProfilesAndALevelWithoutADot) {

@@ -145,4 +145,9 @@ Status MemoryServiceManager::closeHandle(ServiceHandle handle) {
     return open_.erase(handle) == 0 ? kInvalidHandle : kSuccess;
 }
 
+const MemoryServiceManager::Service* MemoryServiceManager::find(std::string_view name) const {
+    const auto found = services_.find(foldUpper(name));
+    return found == services_.end() ? nullptr : found->second.get();
+}
+
 }  // namespace kz7
