@@ -14,7 +14,11 @@ enum class ServiceHandle : std::uint64_t { none = 0 };
 
 inline constexpr std::uint32_t kServiceManagerAllAccess = 0xF003F;
 inline constexpr std::uint32_t kServiceAllAccess = 0xF01FF;
+inline constexpr std::uint32_t kServiceChangeConfig = 0x0002;
 inline constexpr std::uint32_t kServiceQueryStatus = 0x0004;
+inline constexpr std::uint32_t kServiceStartRight = 0x0010;
+inline constexpr std::uint32_t kServiceStop = 0x0020;
+inline constexpr std::uint32_t kServiceDelete = 0x10000;
 
 inline constexpr std::uint32_t kServiceOwnProcess = 0x10;
 inline constexpr std::uint32_t kServiceErrorNormal = 1;

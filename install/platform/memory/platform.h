@@ -1,0 +1,32 @@
+// A whole machine in memory. Its ports are plain members, so that a test sets them up and reads them.
+#pragma once
+
+#include "install/platform/memory/console.h"
+#include "install/platform/memory/debug_output.h"
+#include "install/platform/memory/file_system.h"
+#include "install/platform/memory/registry.h"
+#include "install/platform/memory/services.h"
+#include "install/platform/platform.h"
+
+namespace kz7 {
+
+class MemoryPlatform : public IPlatform {
+public:
+    IRegistryStore& registry() override { return registry_; }
+    IServiceManager& services() override { return services_; }
+    IConsole& console() override { return console_; }
+    IDebugOutput& debugOutput() override { return debugOutput_; }
+    IFileSystem& files() override { return files_; }
+    std::string storeName() override { return "memory"; }
+    std::string storeNote() override { return {}; }
+    bool storeIsOwn() override { return true; }
+    bool storeFaultTold() override { return false; }
+
+    MemoryRegistry registry_;
+    MemoryFileSystem files_;
+    MemoryServiceManager services_{files_};
+    MemoryConsole console_;
+    MemoryDebugOutput debugOutput_;
+};
+
+}  // namespace kz7

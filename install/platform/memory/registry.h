@@ -1,0 +1,73 @@
+// The registry port in memory, for tests and for looking at what a run would change. Handles are numbers in
+// a table, so that a closed one, and one whose key was deleted, answer what they do elsewhere.
+#pragma once
+
+#include <map>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "install/platform/registry_store.h"
+
+namespace kz7 {
+
+class MemoryRegistry final : public IRegistryStore {
+public:
+    MemoryRegistry();
+
+    Status openKey(KeyHandle parent, std::string_view path, AccessMask access, KeyHandle& key) override;
+    Status createKey(KeyHandle parent, std::string_view path, std::string_view keyClass, AccessMask access,
+                     KeyHandle& key) override;
+    Status closeKey(KeyHandle key) override;
+    Status queryValue(KeyHandle key, std::string_view name, ValueType* type, Buffer& data) override;
+    Status setValue(KeyHandle key, std::string_view name, ValueType type, std::string_view data) override;
+    Status deleteValue(KeyHandle key, std::string_view name) override;
+    Status enumerateKey(KeyHandle key, std::uint32_t index, Buffer& name, Buffer* keyClass) override;
+    Status enumerateValue(KeyHandle key, std::uint32_t index, Buffer& name, ValueType* type, Buffer* data) override;
+    Status deleteKey(KeyHandle parent, std::string_view path, AccessMask view) override;
+    Status commit() override;
+
+    // Handles given out and not closed yet, those of deleted keys among them.
+    std::size_t openHandles() const { return open_.size(); }
+
+    std::size_t commits() const { return commits_; }
+
+private:
+    struct Value {
+        std::string name;
+        std::uint64_t place;  // grows with every name that is new in its key
+        ValueType type{};
+        std::string data;
+    };
+    struct Node {
+        std::string name;
+        std::string fold;
+        std::string keyClass;
+        Node* parent = nullptr;  // good while the key is not deleted
+        bool deleted = false;
+        std::vector<std::shared_ptr<Node>> subkeys;        // by folded name
+        std::map<std::string, Value, std::less<>> byName;  // folded
+        std::vector<const Value*> inOrder;                 // by place
+    };
+    using NodePointer = std::shared_ptr<Node>;
+    struct OpenKey {
+        NodePointer node;
+        AccessMask access;
+    };
+
+    static std::vector<NodePointer>::iterator lowerBound(Node& parent, std::string_view fold);
+    static NodePointer child(Node& parent, std::string_view name, bool create);
+    // The key behind a handle that has the rights needed.
+    Status nodeOf(KeyHandle handle, AccessMask needed, NodePointer& node);
+    Status find(KeyHandle parent, std::string_view path, AccessMask access, NodePointer& node);
+    KeyHandle giveOut(NodePointer node, AccessMask access);
+
+    NodePointer machine_;
+    NodePointer users_;
+    std::map<KeyHandle, OpenKey> open_;
+    std::uint64_t lastHandle_;
+    std::uint64_t lastPlace_ = 0;
+    std::size_t commits_ = 0;
+};
+
+}  // namespace kz7

@@ -1,0 +1,57 @@
+#include "install/runtime/copy_name.h"
+
+#include <gtest/gtest.h>
+
+namespace kz7 {
+namespace {
+
+TEST(CopyName, Substitution) {
+    const struct {
+        const char* why;
+        const char* text;
+        const char* name;
+        const char* result;
+    } rows[] = {
+        {"the token at the end", "A\\$CurrentInstallationName$", "X", "A\\X"},
+        {"every occurrence", "$CurrentInstallationName$-$CurrentInstallationName$", "X", "X-X"},
+        {"the other token where the first is missing", "$DefaultInstallationName$", "X", "X"},
+        {"only one of the two", "$DefaultInstallationName$$CurrentInstallationName$", "X",
+         "$DefaultInstallationName$X"},
+        {"what is inserted is not searched", "$CurrentInstallationName$", "a$CurrentInstallationName$b",
+         "a$CurrentInstallationName$b"},
+        {"an empty name leaves the text", "A\\$CurrentInstallationName$", "", "A\\$CurrentInstallationName$"},
+        {"case counts", "$currentinstallationname$", "X", "$currentinstallationname$"},
+    };
+    for (const auto& row : rows) {
+        EXPECT_EQ(substituteCopyName(row.text, row.name), row.result) << row.why;
+    }
+}
+
+TEST(CopyName, ResultGoesWhereTheCallerSays) {
+    const char* const text = "$CurrentInstallationName$";
+    EXPECT_EQ(iSubstituteCopyName(text, nullptr, 0, nullptr), text) << "no name: the input itself";
+    EXPECT_EQ(iSubstituteCopyName("none", "X", 0, nullptr), std::string("none"));
+
+    const char* const shared = iSubstituteCopyName(text, "first", 0, nullptr);
+    EXPECT_STREQ(shared, "first");
+    EXPECT_EQ(iSubstituteCopyName(text, "second", 0, nullptr), shared) << "one buffer for all";
+    EXPECT_STREQ(shared, "second");
+
+    char output[40];
+    EXPECT_EQ(iSubstituteCopyName(text, "X", 25, output), nullptr) << "refused although the result would fit";
+    EXPECT_EQ(iSubstituteCopyName(text, "X", 26, output), output);
+    EXPECT_STREQ(output, "X");
+    EXPECT_EQ(iSubstituteCopyName("none", "X", sizeof output, output), std::string("none"));
+    EXPECT_STREQ(output, "none");
+
+    output[26] = '#';
+    EXPECT_EQ(iSubstituteCopyName(text, std::string(60, 'n').c_str(), 26, output), output);
+    EXPECT_EQ(std::string(output), std::string(25, 'n')) << "cut to the size and terminated";
+    EXPECT_EQ(output[26], '#') << "never past it";
+
+    const std::string filled = std::string(iSubstituteCopyName(text, std::string(2000, 'n').c_str(), 0, nullptr));
+    EXPECT_EQ(filled.size(), kSubstitutedSize - 1);
+}
+
+}  // namespace
+}  // namespace kz7

@@ -1,0 +1,59 @@
+// Runs a flow again and again, failing its first call, its second, and so on until a run passes untouched.
+#pragma once
+
+#include <gtest/gtest.h>
+
+#include <functional>
+#include <string>
+
+#include "install/platform/faulty/console.h"
+#include "install/platform/faulty/fault_counter.h"
+#include "install/platform/faulty/file_system.h"
+#include "install/platform/faulty/registry.h"
+#include "install/platform/faulty/services.h"
+#include "tests/support/machine.h"
+
+namespace kz7::test {
+
+// A machine whose flows meet the faults; what a test asks of it meets none.
+class FaultyMachine : public Machine {
+public:
+    explicit FaultyMachine(FaultCounter faults) : faults_(faults) {}
+
+    IRegistryStore& registry() override { return faultyRegistry_; }
+    IServiceManager& services() override { return faultyServices_; }
+    IConsole& console() override { return faultyConsole_; }
+    IFileSystem& files() override { return faultyFiles_; }
+
+    FaultCounter faults_;
+
+private:
+    FaultyRegistry faultyRegistry_{registry_, faults_};
+    FaultyServiceManager faultyServices_{services_, faults_};
+    FaultyConsole faultyConsole_{console_, faults_};
+    FaultyFileSystem faultyFiles_{files_, faults_};
+};
+
+inline constexpr Status kFault = 4321;  // no platform's number, so that it is recognised wherever it goes
+
+// `check` sees every run: the machine afterwards and the flow's status. Returns the number of calls of the run
+// that passed.
+inline std::uint64_t sweepFaults(bool forGood, const std::function<void(FaultyMachine&)>& prepare,
+                                 const std::function<Status(FaultyMachine&)>& flow,
+                                 const std::function<void(FaultyMachine&, Status, const std::string& row)>& check) {
+    for (std::uint64_t call = 1;; ++call) {
+        FaultyMachine machine(FaultCounter(0, false, kFault));
+        prepare(machine);
+        machine.faults_ = FaultCounter(call, forGood, kFault);
+        const Status status = flow(machine);
+        const std::string failed = machine.faults_.failed();
+        check(machine, status,
+              "call " + std::to_string(call) + " (" + (failed.empty() ? "none" : failed) + ")" +
+                  (forGood ? " and every later one fail" : " fails"));
+        if (failed.empty()) {
+            return machine.faults_.calls();
+        }
+    }
+}
+
+}  // namespace kz7::test

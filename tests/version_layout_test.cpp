@@ -1,0 +1,294 @@
+// The migrations between the version-8 layout and the copies: exact lines and registries, there and back.
+#include <gtest/gtest.h>
+
+#include "install/src/version8.h"
+#include "install/src/version9.h"
+#include "tests/support/machine.h"
+
+namespace kz7::test {
+namespace {
+
+const std::string kPrefix = "install\\src\\uselvlkz7reg.cpp:";
+
+const std::string kDefaultLines =
+    "Creating registry key KZ7 Path Name under SOFTWARE\\NVQ\\KZ7 with value C:\\KZ8\n"
+    "Creating registry key BASE_CLIENT under SOFTWARE\\NVQ\\KZ7\\Components with value \n"
+    "Creating registry key Modification under SOFTWARE\\NVQ\\KZ7\\CurrentVersion with value 3\n"
+    "Creating registry key Release under SOFTWARE\\NVQ\\KZ7\\CurrentVersion with value 2\n"
+    "Creating registry key Version under SOFTWARE\\NVQ\\KZ7\\CurrentVersion with value 8\n"
+    "Creating registry key Service Level under SOFTWARE\\NVQ\\KZ7\\CurrentVersion with value BUILD\n"
+    "Creating registry key  under SOFTWARE\\NVQ\\KZ7\\PROFILES with value \n"
+    "Creating registry key KZ7PATH under SOFTWARE\\NVQ\\KZ7\\GLOBAL_PROFILE with value C:\\KZ8\n"
+    "Creating registry key  under SOFTWARE\\NVQ\\KZ7\\DAS_PROFILES with value \n"
+    "Creating registry key  under SOFTWARE\\NVQ\\KZ7\\InstalledCopies with value KZ7V8\n";
+
+void makeService(Machine& machine, bool running) {
+    machine.files_.add("C:\\svc.exe");
+    OwnedService manager(machine.services_);
+    OwnedService service(machine.services_);
+    machine.services_.openManager(kServiceManagerAllAccess, manager.receive());
+    machine.services_.createService(manager.get(), {"KZ7MGMTSVC", "KZ7 Management Service", "C:\\svc.exe"},
+                                    service.receive());
+    if (running) {
+        machine.services_.startService(service.get());
+    }
+}
+
+TEST(Version8, RestoresTheBackupAndWritesTheDefaults) {
+    Machine machine;
+    machine.set("SOFTWARE\\NVQ\\KZ7", "KZ7 Path Name", "C:\\now");
+    machine.set("SOFTWARE\\NVQ\\KZ7", "stays", "now");
+    machine.set("SOFTWARE\\NVQ\\KZ7", "top", "now");
+    machine.set("SOFTWARE\\NVQ\\KZ7BackupV8", "top", "backup");
+    machine.set("SOFTWARE\\NVQ\\KZ7BackupV8\\PROFILES\\I", "", "instance");
+    makeService(machine, false);
+
+    EXPECT_EQ(machine.run({"-V8", "C:\\KZ8"}), kSuccess);
+
+    EXPECT_EQ(machine.console_.output, "Creating version 8 registry\n" + kDefaultLines +
+                                           "Version 8 default registry keys created successfully\n");
+    EXPECT_EQ(machine.console_.error, "") << "a stop that fails says nothing";
+    EXPECT_EQ(machine.dump("SOFTWARE\\NVQ"),
+              "[SOFTWARE\\NVQ\\KZ7] \n"
+              "SOFTWARE\\NVQ\\KZ7 : KZ7 Path Name = 1:C:\\KZ8\\x00\n"
+              "SOFTWARE\\NVQ\\KZ7 : stays = 1:now\\x00\n"
+              "SOFTWARE\\NVQ\\KZ7 : top = 1:backup\\x00\n"
+              "[SOFTWARE\\NVQ\\KZ7\\CurrentVersion] \n"
+              "SOFTWARE\\NVQ\\KZ7\\CurrentVersion : Modification = 1:3\\x00\n"
+              "SOFTWARE\\NVQ\\KZ7\\CurrentVersion : Release = 1:2\\x00\n"
+              "SOFTWARE\\NVQ\\KZ7\\CurrentVersion : Version = 1:8\\x00\n"
+              "SOFTWARE\\NVQ\\KZ7\\CurrentVersion : Service Level = 1:BUILD\\x00\n"
+              "[SOFTWARE\\NVQ\\KZ7\\DAS_PROFILES] \n"
+              "SOFTWARE\\NVQ\\KZ7\\DAS_PROFILES :  = 1:\\x00\n"
+              "[SOFTWARE\\NVQ\\KZ7\\GLOBAL_PROFILE] \n"
+              "SOFTWARE\\NVQ\\KZ7\\GLOBAL_PROFILE : KZ7PATH = 1:C:\\KZ8\\x00\n"
+              "[SOFTWARE\\NVQ\\KZ7\\InstalledCopies] \n"
+              "SOFTWARE\\NVQ\\KZ7\\InstalledCopies :  = 1:KZ7V8\\x00\n"
+              "[SOFTWARE\\NVQ\\KZ7\\PROFILES] \n"
+              "SOFTWARE\\NVQ\\KZ7\\PROFILES :  = 1:\\x00\n"
+              "[SOFTWARE\\NVQ\\KZ7\\PROFILES\\I] \n"
+              "SOFTWARE\\NVQ\\KZ7\\PROFILES\\I :  = 1:instance\\x00\n")
+        << "the components that were just written are gone, and so is the backup";
+    EXPECT_EQ(machine.services_.find("KZ7MGMTSVC")->start, ServiceStart::demand);
+    EXPECT_EQ(machine.services_.openHandles(), 2U) << "the switch-off leaves its handles open";
+    EXPECT_EQ(machine.registry_.openHandles(), 0U);
+}
+
+TEST(Version8, WithoutBackupAndServiceTheDefaultsAreStillWritten) {
+    Machine machine;
+    EXPECT_EQ(machine.run({"-v8", "C:\\KZ8"}), kSuccess);
+    EXPECT_EQ(machine.console_.both,
+              "Creating version 8 registry\n" + kPrefix +
+                  "1466: Failed to copy copy SOFTWARE\\NVQ\\KZ7BackupV8 to SOFTWARE\\NVQ\\KZ7\n" + kPrefix +
+                  "1467: Create empty version 8 registry\n" + kDefaultLines +
+                  "Version 8 default registry keys created successfully\n" + kPrefix +
+                  "1523: Failed open the Service KZ7MGMTSVC - error code 1060\n");
+}
+
+TEST(Version8, AStopThatSucceedsIsToldAsError1) {
+    Machine machine;
+    makeService(machine, true);
+    EXPECT_EQ(machine.run({"-v8", "C:\\KZ8"}), kSuccess);
+    EXPECT_NE(machine.console_.error.find(kPrefix + "1566: Unable to stop the service KZ7MGMTSVC - error 1\n"),
+              std::string::npos);
+    EXPECT_EQ(machine.services_.find("KZ7MGMTSVC")->state, ServiceState::stopped);
+}
+
+TEST(Version8, ABackupThatCannotBeRestoredStays) {
+    Machine machine;
+    machine.set("SOFTWARE\\NVQ\\KZ7BackupV8", "too large", std::string(10001, 'x'));
+    EXPECT_EQ(machine.run({"-v8", "C:\\KZ8"}), kSuccess);
+    EXPECT_TRUE(machine.has("SOFTWARE\\NVQ\\KZ7BackupV8"));
+}
+
+class Version9 : public testing::Test {
+protected:
+    Status migrate(const std::string& level = "9.1.0.0") {
+        console().both.clear();
+        return migrateToVersion9(
+            machine.registry_, machine.services_, report, [&](std::string_view) { return level; },
+            [&](std::string_view location) {
+                registeredFor = location;
+                return Status{77};
+            },
+            "C:\\KZ9");
+    }
+    MemoryConsole& console() { return machine.console_; }
+
+    // The lines of the console without those that announce a value.
+    std::string told() {
+        std::string text;
+        std::string_view rest = console().both;
+        while (!rest.empty()) {
+            const std::size_t end = rest.find('\n') + 1;
+            if (rest.substr(0, 9) != "Creating " || rest.substr(0, 21) != "Creating registry key") {
+                text += rest.substr(0, end);
+            }
+            rest.remove_prefix(end);
+        }
+        return text;
+    }
+
+    Machine machine;
+    Report report{machine.console_};
+    std::string registeredFor;
+};
+
+const std::string kLevelLines =
+    "Creating full version 9 registry\n"
+    "Full Version registry key set to 9.1.0.0\n"
+    "Full Version registry key set to 9.1.0.0 in the 32-bit registry hive. \n"
+    "Full Version registry key set to 9.1.0\n"
+    "Full Version registry key set to 9.1.0 in the 32-bit registry hive. \n"
+    "Full Version registry key set to 9.1\n"
+    "Full Version registry key set to 9.1 in the 32-bit registry hive. \n"
+    "Full Version registry key set to 9\n"
+    "Full Version registry key set to 9 in the 32-bit registry hive. \n"
+    "kz7build install copy at C:\\KZ9 added successfully\n";
+
+TEST_F(Version9, MigratesAVersion8Registry) {
+    const std::string product = "SOFTWARE\\NVQ\\KZ7";
+    machine.set(product, "KZ7 Path Name", "C:\\KZ8");
+    machine.set(product + "\\Components", "BASE_CLIENT", "");
+    machine.set(product + "\\GLOBAL_PROFILE", "KZ7PATH", "C:\\KZ8");
+    machine.set(product + "\\GLOBAL_PROFILE", "KZ7SYSTEM", "host");
+    machine.set(product + "\\PROFILES", "", "default of the profiles");
+    machine.set(product + "\\PROFILES\\INST1", "KZ7COMM", "TCPIP");
+    machine.set(product + "\\DAS_PROFILES\\DAS00", "KZ7COMM", "TCPIP");
+    machine.set(product + "\\InstalledCopies\\OLD", "KZ7 Path Name", "C:\\old");
+    const std::string before = machine.dump(product);
+
+    EXPECT_EQ(migrate(), 77U);
+
+    EXPECT_EQ(told(), "Backing up V8 Registry\nGLOBAL_PROFILE successfully copied from prior version\n" + kLevelLines +
+                          "Instances successfully copied from prior version\n"
+                          "DAS Profiles successfully copied from prior version\n"
+                          "Version 9 registry is configured successfully\n");
+    EXPECT_EQ(registeredFor, "C:\\KZ9");
+    EXPECT_EQ(console().error, "");
+    std::string backup = before;
+    for (std::size_t at = 0; (at = backup.find(product, at)) != std::string::npos; at += product.size()) {
+        backup.insert(at + product.size(), "BackupV8");
+    }
+    EXPECT_EQ(machine.dump(product + "BackupV8"), backup);
+    EXPECT_FALSE(machine.has(product + "\\PROFILES"));
+    EXPECT_TRUE(machine.has(product + "\\InstalledCopies\\OLD"));
+    const std::string copy = product + "\\InstalledCopies\\kz7build";
+    EXPECT_EQ(machine.dump(copy + "\\GLOBAL_PROFILE"), copy + "\\GLOBAL_PROFILE : KZ7PATH = 1:C:\\KZ9\\x00\n" + copy +
+                                                           "\\GLOBAL_PROFILE : KZ7SYSTEM = 1:host\\x00\n")
+        << "carried over first, so the add sets its own path";
+    EXPECT_EQ(machine.dump(copy + "\\PROFILES"), copy + "\\PROFILES :  = 1:\\x00\n[" + copy + "\\PROFILES\\INST1] \n" +
+                                                     copy + "\\PROFILES\\INST1 : KZ7COMM = 1:TCPIP\\x00\n")
+        << "carried over afterwards, so the add's default stays";
+    EXPECT_TRUE(machine.has(copy + "\\DAS_PROFILES\\DAS00"));
+    const auto* service = machine.services_.find("KZ7MGMTSVC_kz7build");
+    ASSERT_NE(service, nullptr);
+    EXPECT_EQ(service->state, ServiceState::stopped) << "it exists by then, so the start is not reached";
+    const std::string copies = product + "\\InstalledCopies : ";
+    const std::string named = machine.dump(product + "\\InstalledCopies");
+    for (const char* name :
+         {"", "9.1.0.0", "9.1.0", "9.1", "9", "9.1.0.DEF.2", "defaultClientInterfaceCopy", "8.1.11"}) {
+        EXPECT_NE(named.find(copies + name + " = 1:kz7build\\x00\n"), std::string::npos) << name;
+    }
+    EXPECT_EQ(machine.registry_.commits(), 0U) << "the provider registration makes the migration visible";
+}
+
+TEST_F(Version9, TheMarkerMakesItARefresh) {
+    machine.set("SOFTWARE\\NVQ\\KZ7\\Components", "MULTI_VERSION_SUPPORT", "");
+    machine.set("SOFTWARE\\NVQ\\KZ7\\PROFILES\\I", "v", "");
+    EXPECT_EQ(migrate(), 77U);
+    EXPECT_EQ(told(), "Version 9 Registry exists - no backup needed\n" + kLevelLines +
+                          "Version 9 registry is configured successfully\n");
+    EXPECT_FALSE(machine.has("SOFTWARE\\NVQ\\KZ7BackupV8"));
+    EXPECT_TRUE(machine.has("SOFTWARE\\NVQ\\KZ7\\PROFILES\\I"));
+}
+
+TEST_F(Version9, WithoutARegistryOnlyTheProvidersAreRegistered) {
+    EXPECT_EQ(migrate(), 77U);
+    EXPECT_EQ(told(), "Backing up V8 Registry\n" + kPrefix +
+                          "421: Failed to copy copy SOFTWARE\\NVQ\\KZ7 to SOFTWARE\\NVQ\\KZ7BackupV8\n" + kPrefix +
+                          "1345: Error occurred while backing up old registry\n");
+    EXPECT_EQ(registeredFor, "C:\\KZ9");
+    EXPECT_EQ(machine.dump(), "");
+}
+
+TEST_F(Version9, MissingProfilesAndALevelWithoutADot) {
+    machine.make("SOFTWARE\\NVQ\\KZ7");
+    EXPECT_EQ(migrate("9"), 77U);
+    EXPECT_EQ(told(),
+              "Backing up V8 Registry\n" + kPrefix +
+                  "1360: Failed to copy GLOBAL_PROFILE.  You may need to update some Global Profile Registry "
+                  "variables.\n"
+                  "Creating full version 9 registry\n"
+                  "Full Version registry key set to 9\n"
+                  "Full Version registry key set to 9 in the 32-bit registry hive. \n"
+                  "kz7build install copy at C:\\KZ9 added successfully\n" +
+                  kPrefix +
+                  "1388: Failed to copy prior instances.  You may need to run kz7icrt to create any instances that you "
+                  "need.\n" +
+                  kPrefix +
+                  "1406: Failed to DAS Profiles from Version 8.  You may need to run dascrt for the KZ7 Administration "
+                  "Server to work.\n"
+                  "Version 9 registry is configured successfully\n");
+    const std::string named = machine.dump("SOFTWARE\\NVQ\\KZ7\\InstalledCopies");
+    EXPECT_EQ(named.find("DEF"), std::string::npos);
+    EXPECT_EQ(named.find("defaultClientInterfaceCopy"), std::string::npos);
+}
+
+TEST_F(Version9, ThereAndBackAgainLosesNothing) {
+    const std::string product = "SOFTWARE\\NVQ\\KZ7";
+    std::string deep = product;
+    for (int depth = 0; depth < 200; ++depth) {
+        deep += "\\d";
+    }
+    machine.make(deep, "a class");
+    machine.set(deep, "at the bottom", "v");
+    for (const char* path : {"\\InstalledCopies\\InstalledCopies", "\\PROFILES\\InstalledCopies\\x",
+                             "\\$CurrentInstallationName$", "\\PROFILES\\$CurrentInstallationName$"}) {
+        machine.set(product + path, "", "default");
+    }
+    for (int value = 0; value < 10000; ++value) {
+        machine.set(product + "\\Many", "v" + std::to_string(value), "x");
+    }
+    // Just under the limit of a path in the backup, whose key is eight characters longer.
+    const std::size_t room = 1023 - (product + "BackupV8\\Long\\").size();
+    std::string longest = product + "\\Long\\" + std::string(200, 'l');
+    for (std::size_t used = 200; used + 201 <= room; used += 201) {
+        longest += "\\" + std::string(200, 'l');
+    }
+    machine.set(longest, "v", "");
+    const std::string before = machine.dump(product);
+
+    migrate();
+    EXPECT_EQ(machine.run({"-v8", "C:\\KZ8"}), kSuccess);
+
+    // What was in the copies key stayed there all the time; the rest came back out of the backup. The
+    // defaults and the migrated copy were added.
+    const std::string after = machine.dump(product);
+    std::string_view rest = before;
+    while (!rest.empty()) {
+        const std::string line(rest.substr(0, rest.find('\n') + 1));
+        rest.remove_prefix(line.size());
+        EXPECT_NE(after.find(line), std::string::npos) << line;
+    }
+    EXPECT_FALSE(machine.has(product + "BackupV8"));
+    EXPECT_EQ(machine.registry_.openHandles(), 0U);
+}
+
+TEST_F(Version9, APathOverTheLimitFailsTheBackupAndLosesNothing) {
+    const std::string product = "SOFTWARE\\NVQ\\KZ7";
+    std::string path = product;
+    while (path.size() + 201 < 1020) {
+        path += "\\" + std::string(200, 'k');
+    }
+    path += "\\" + std::string(1020 - path.size() - 1, 'k');
+    machine.make(path);
+    machine.set(path.substr(0, path.size() - 8), "sibling that the cut path would name", "");
+    const std::string before = machine.dump(product);
+    migrate();
+    EXPECT_NE(console().error.find("1345: "), std::string::npos);
+    EXPECT_EQ(machine.dump(product), before);
+}
+
+}  // namespace
+}  // namespace kz7::test
