@@ -17,6 +17,10 @@ if(KZ7_SANITIZERS)
   target_link_options(kz7_options INTERFACE -fsanitize=${KZ7_SANITIZERS})
 endif()
 
+if(KZ7_FUZZ)
+  target_compile_options(kz7_options INTERFACE -fsanitize=fuzzer-no-link)
+endif()
+
 if(WIN32)
   # The programs need nothing installed beside them.
   target_compile_definitions(kz7_options INTERFACE NOMINMAX WIN32_LEAN_AND_MEAN _WIN32_WINNT=0x0601)

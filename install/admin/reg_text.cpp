@@ -15,7 +15,7 @@ constexpr std::string_view kOldHeader = "REGEDIT4";
 constexpr std::string_view kUtf8Mark = "\xEF\xBB\xBF";
 constexpr std::string_view kClassComment = ";class=\"";
 constexpr std::string_view kBlanks = " \t";
-constexpr std::size_t kBytesOfLine = 25;
+constexpr std::size_t kBytesOfLine = 24;
 constexpr char32_t kEscaped = 0xDC00;
 
 bool isTextType(ValueType type) {

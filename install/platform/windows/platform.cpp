@@ -1,6 +1,8 @@
 // This machine's ports on Windows.
 #include "install/platform/platform.h"
 
+#include <windows.h>
+
 #include "install/platform/standard_console.h"
 #include "install/platform/windows/assembly_cache.h"
 #include "install/platform/windows/debug_output.h"
@@ -47,6 +49,8 @@ private:
 }  // namespace
 
 std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions&) {
+    // Libraries that the system loads for itself are not taken from the current folder either.
+    SetDllDirectoryA("");
     return std::make_unique<WindowsPlatform>();
 }
 

@@ -1,0 +1,168 @@
+// kz7admin as people run it: what it shows, what it answers, and that a store stays as it was where it fails.
+#include <gtest/gtest.h>
+
+#include <sys/resource.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <fstream>
+
+#include "tests/support/state_directory.h"
+
+namespace kz7::test {
+namespace {
+
+using namespace std::literals;
+
+constexpr const char* kHead = "Windows Registry Editor Version 5.00\n";
+
+class AdminProgram : public testing::Test {
+protected:
+    ProgramResult admin(std::vector<std::string> arguments, ProgramOptions options = {}) const {
+        return store_.run("kz7admin", std::move(arguments), std::move(options));
+    }
+
+    std::string file(const std::string& content) const {
+        const std::string path = files_.path() + "/file.reg";
+        std::ofstream(path, std::ios::binary) << content;
+        return path;
+    }
+
+    std::string told(const std::string& line) const { return "kz7admin: " + line + "\n"; }
+    std::string storeTold() const { return told("store " + store_.file("registry.db")); }
+
+    StateDirectory store_;
+    TemporaryDirectory files_;
+};
+
+TEST_F(AdminProgram, MovesWhatTheToolWroteToAnotherStore) {
+    ASSERT_EQ(store_.tool({"-addKZ7Copy", "Copy\xE9", "C:\\KZ7\\\x1B[31m"}).exitCode, 0);
+    const ProgramResult exported = admin({"export"});
+    EXPECT_EQ(exported.exitCode, 0);
+    EXPECT_EQ(exported.error, storeTold());
+    for (const char* const form : {"", "--utf16"}) {
+        const StateDirectory other;
+        const std::string command = programPath("kz7admin") + " export " + form + " | " + programPath("kz7admin") +
+                                    " --store '" + other.path() + "' import -";
+        const ProgramResult moved = runProgram({"/bin/sh", "-c", command}, {{"KZ7_STATE_DIR=" + store_.path()}, {}});
+        EXPECT_EQ(moved.exitCode, 0) << moved.error;
+        EXPECT_EQ(moved.output,
+                  "imported standard input into store " + other.file("registry.db") + ": 27 keys, 28 values\n");
+        EXPECT_EQ(admin({"export", "--store", other.path()}).output, exported.output);
+    }
+    const ProgramResult key = admin({"export", "software\\nvq\\kz7\\installedcopies\\copy\xE9\\global_profile\\"});
+    EXPECT_EQ(key.output,
+              std::string(kHead) +
+                  "\n[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies\\Copy\xED\xB3\xA9\\GLOBAL_PROFILE]\n"
+                  "\"KZ7PATH\"=hex(1):43,00,3a,00,5c,00,4b,00,5a,00,37,00,5c,00,1b,00,5b,00,33,00,31,00,6d,00,\\\n"
+                  "  00,00\n");
+}
+
+TEST_F(AdminProgram, ShowsForReadingAndForPrograms) {
+    const std::string path =
+        file(std::string(kHead) +
+             "[HKLM\\K]\n;class=\"c\xED\xB0\x9B\"\n@=\"a\\\\b\"\n"
+             "\"\xED\xB0\x8A\"=hex(1):1b,00,e9,dc,2e,20,e9,00\n"
+             "\"d\"=dword:ff\n\"m\"=hex(7):61,00,00,00,62,00,00,00,00,00\n\"q\"=hex(b):00,00,00,00,01,00,00,00\n"
+             "\"z\"=hex(63):01,ff\n[HKLM\\K\\Sub]\n");
+    ASSERT_EQ(admin({"import", path}).exitCode, 0);
+    const ProgramResult tree = admin({"tree"});
+    EXPECT_EQ(tree.exitCode, 0);
+    EXPECT_EQ(tree.error, "");
+    EXPECT_EQ(tree.output, "store " + store_.file("registry.db") +
+                               "\nHKEY_LOCAL_MACHINE\n"
+                               "  K (class \"c\\x1b\")\n"
+                               "    @ REG_SZ \"a\\b\"\n"
+                               "    \"\\x0a\" REG_SZ \"\\x1b\\xe9\\u202e\xC3\xA9\" (without its end)\n"
+                               "    \"d\" REG_DWORD 255 (0xff)\n"
+                               "    \"m\" REG_MULTI_SZ \"a\" \"b\" \"\"\n"
+                               "    \"q\" REG_QWORD 4294967296 (0x100000000)\n"
+                               "    \"z\" type 99 01 ff\n"
+                               "    Sub\n");
+    const ProgramResult json = admin({"export", "--json", "HKLM\\K"});
+    EXPECT_EQ(json.error, storeTold());
+    EXPECT_EQ(json.output, "{\"store\":\"" + store_.file("registry.db") +
+                               "\",\"keys\":[\n"
+                               R"({"key":"HKEY_LOCAL_MACHINE\\K","class":"c\u001b","values":[)"
+                               "\n"
+                               R"(  {"name":"","type":1,"bytes":"615c6200","text":"a\\b"},)"
+                               "\n"
+                               R"(  {"name":"\u000a","type":1,"bytes":"1be9e280aec3a9","text":"\u001b\udce9)"
+                               "\xE2\x80\xAE\xC3\xA9\"},\n"
+                               R"(  {"name":"d","type":4,"bytes":"ff000000","number":255},)"
+                               "\n"
+                               R"(  {"name":"m","type":7,"bytes":"6100620000"},)"
+                               "\n"
+                               R"(  {"name":"q","type":11,"bytes":"0000000001000000","number":4294967296},)"
+                               "\n"
+                               R"(  {"name":"z","type":99,"bytes":"01ff"}]},)"
+                               "\n"
+                               R"({"key":"HKEY_LOCAL_MACHINE\\K\\Sub","class":"","values":[]}]})"
+                               "\n");
+}
+
+TEST_F(AdminProgram, AnswersNoAndTellsFaults) {
+    const std::string missing = store_.file("registry.db");
+    const std::string bad = file(std::string(kHead) + "[HKLM\\a]\n\"x\"=\"y\"\n[HKLM\\b]\nrubbish\n");
+    const struct {
+        std::vector<std::string> arguments;
+        int exitCode;
+        std::string output;
+        std::string error;
+    } rows[] = {
+        {{"tree"}, 1, "store " + missing + "\n", told(missing + ": there is nothing to show")},
+        {{"export"}, 1, kHead, storeTold() + told(missing + ": there is nothing to show")},
+        {{"export", "HKU\\x\n"}, 1, "", storeTold() + told("HKEY_USERS\\x\\x0a: there is no such key")},
+        {{"tree", "HKCU"}, 1, "", told("HKEY_CURRENT_USER: there is no such key")},
+        {{"tree", "HKU\\\\x"}, 2, "", told("HKEY_USERS\\\\x: no key can be named so")},
+        {{"import", bad}, 2, "", told(bad + ":5: the line is no key, no value and no comment")},
+        {{"import", store_.path()}, 2, "", told(store_.path() + ": Is a directory")},
+        {{"import", "/none/such"}, 2, "", told("/none/such: No such file or directory")},
+        {{}, 2, "", told("no command is given (see --help)")},
+        {{"rubbish"}, 2, "", told("The following argument was not expected: rubbish (see --help)")},
+        {{"export", "--json", "--utf16"}, 2, "", told("--utf16 excludes --json (see --help)")},
+        {{"import"}, 2, "", told("FILE is required (see --help)")},
+    };
+    for (const auto& row : rows) {
+        const ProgramResult result = admin(row.arguments);
+        EXPECT_EQ(result.exitCode, row.exitCode) << row.error;
+        EXPECT_EQ(result.output, row.output) << row.error;
+        EXPECT_EQ(result.error, row.error);
+    }
+    EXPECT_NE(access(missing.c_str(), F_OK), 0) << "nothing of all this makes a store";
+}
+
+TEST_F(AdminProgram, KeepsAStoreThatItCannotChange) {
+    ASSERT_EQ(store_.tool({"-addKZ7Copy", "COPY1", "C:\\KZ7"}).exitCode, 0);
+    const std::string before = store_.dump();
+    std::string big = kHead;
+    for (int key = 0; key < 2000; ++key) {
+        big += "[HKLM\\" + std::to_string(key) + "]\n\"x\"=\"" + std::string(1000, 'x') + "\"\n";
+    }
+    ProgramOptions small;
+    small.inChild = [] {
+        const rlimit limit{1 << 20, 1 << 20};
+        setrlimit(RLIMIT_FSIZE, &limit);
+    };
+    const ProgramResult full = admin({"import", file(big)}, small);
+    EXPECT_EQ(full.exitCode, 2);
+    EXPECT_EQ(full.error.rfind("kz7admin: " + store_.file("registry.db") + ": ", 0), 0U) << full.error;
+    EXPECT_EQ(std::count(full.error.begin(), full.error.end(), '\n'), 1) << full.error;
+    EXPECT_EQ(store_.dump(), before);
+
+    const ProgramResult noRoom = runProgram({"/bin/sh", "-c", programPath("kz7admin") + " tree >/dev/full"},
+                                            {{"KZ7_STATE_DIR=" + store_.path()}, {}});
+    EXPECT_EQ(noRoom.exitCode, 2);
+    EXPECT_EQ(noRoom.error, told("standard output takes no more"));
+
+    std::ofstream(store_.file("registry.db"), std::ios::binary) << "rubbish";
+    for (const char* const command : {"tree", "import"}) {
+        const ProgramResult damaged = admin({command, "import"s == command ? file(kHead + "[HKLM\\a]\n"s) : "HKLM"s});
+        EXPECT_EQ(damaged.exitCode, 2);
+        EXPECT_EQ(damaged.error, told(store_.file("registry.db") + ": file is not a database"));
+        EXPECT_EQ(damaged.output, "");
+    }
+}
+
+}  // namespace
+}  // namespace kz7::test

@@ -1,0 +1,288 @@
+// Registry-editor text: what is written is read back exactly, and what is bad is named before anything is done.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <sstream>
+
+#include "install/admin/reg_text.h"
+#include "install/platform/memory/registry.h"
+#include "tests/support/reg_text_store.h"
+#include "tests/support/registry_dump.h"
+
+namespace kz7 {
+namespace {
+
+using namespace std::literals;
+using test::exportAll;
+using test::importText;
+
+constexpr std::string_view kHead = "Windows Registry Editor Version 5.00\n";
+
+std::string headed(std::string_view lines) {
+    return std::string(kHead) + std::string(lines);
+}
+
+void set(IRegistryStore& registry, std::string_view path, std::string_view name, ValueType type, std::string_view data,
+         std::string_view keyClass = {}, KeyHandle root = KeyHandle::localMachine) {
+    OwnedKey key(registry);
+    ASSERT_EQ(registry.createKey(root, path, keyClass, kKeyFull, key.receive()), kSuccess);
+    ASSERT_EQ(registry.setValue(key.get(), name, type, data), kSuccess);
+}
+
+// Both roots, in an order that does not hang on when a value was set.
+std::vector<std::string> contents(IRegistryStore& registry) {
+    std::istringstream dump(test::dumpRegistry(registry) + test::dumpRegistry(registry, KeyHandle::users));
+    std::vector<std::string> lines;
+    for (std::string line; std::getline(dump, line);) {
+        lines.push_back(line);
+    }
+    std::sort(lines.begin(), lines.end());
+    return lines;
+}
+
+TEST(RegText, RoundTripIsExactInEveryByte) {
+    std::string bytes;
+    for (int byte = 0; byte < 256; ++byte) {
+        bytes += static_cast<char>(byte);
+    }
+    const std::vector<std::string> datas = {
+        "",
+        "\0"s,
+        "\0\0"s,
+        "one\0"s,
+        "no end",
+        "two\0ends\0"s,
+        "a\0\0"s,
+        bytes,
+        bytes + bytes,
+        "line\nend\0"s,
+        "line\rend\0"s,
+        "tab\tand \x7f\0"s,
+        "\"quoted\\\0"s,
+        "ends in \\\0"s,
+        "\xC3\xA9 \xF0\x9F\x98\x80\0"s,
+        "no UTF-8: \xE9 \xC3\0"s,
+        "a surrogate: \xED\xB2\x80 \xED\xA0\x80\0"s,
+        "too long: \xC0\x80 \xF4\x90\x80\x80\0"s,
+        "C1: \xC2\x85\0"s,
+        "\xEF\xBB\xBF\0"s,
+        "; [x] ,=\0"s,
+        std::string(20000, 'x') + '\0',
+        "odd"s,
+        "12345678"s,
+    };
+    MemoryRegistry registry;
+    int number = 0;
+    for (const std::uint32_t type : {0U, 1U, 2U, 3U, 4U, 5U, 6U, 7U, 8U, 11U, 0x1234ABCDU, 0xFFFFFFFFU}) {
+        for (const std::string& data : datas) {
+            set(registry, "SOFTWARE\\values", std::to_string(number++), static_cast<ValueType>(type), data);
+        }
+    }
+    std::string everyByte = bytes.substr(1);
+    set(registry, "SOFTWARE\\names", {}, ValueType::sz, "\0"sv);
+    set(registry, "SOFTWARE\\names", everyByte, ValueType::sz, "all\0"sv);
+    set(registry, "SOFTWARE\\names", "\xED\xB2\x80", ValueType::sz, "three bytes\0"sv);
+    set(registry, "SOFTWARE\\names", "\x80", ValueType::sz, "one byte\0"sv);
+    set(registry, "SOFTWARE\\names", std::string(kMaxValueName, '"'), ValueType::dword, "\1\2\3\4"sv);
+    everyByte.erase(everyByte.find('\\'), 1);
+    set(registry, "SOFTWARE\\" + everyByte.substr(0, 127) + "\\" + everyByte.substr(127), "n", ValueType::sz, "\0"sv);
+    set(registry, std::string(kMaxKeyName, ']') + "\\[-HKLM]\\;class=\"x\"\\ blanks ", "n", ValueType::sz, "\0"sv);
+    set(registry, "classes\\plain", "n", ValueType::none, {}, "Some \"class\"\n\\ \xE9");
+    set(registry, {}, "in a root", ValueType::none, {}, {}, KeyHandle::users);
+    set(registry, "S-1-5-18\\Software", {}, ValueType::binary, "\xFF"sv, {}, KeyHandle::users);
+    std::string deep = "deep";
+    for (int level = 0; level < 600; ++level) {
+        deep += "\\k";
+    }
+    set(registry, deep, "at the bottom", ValueType::sz, "\0"sv);
+
+    const std::string text = exportAll(registry);
+    std::string carriageReturns;
+    for (const char c : text) {
+        carriageReturns.append(c == '\n' ? "\r" : "").append(1, c);
+    }
+    const struct {
+        std::string file;
+        const char* why;
+    } forms[] = {
+        {text, "UTF-8"},
+        {"\xEF\xBB\xBF" + text, "UTF-8 with a mark"},
+        {carriageReturns, "lines end in CR LF"},
+        {std::string(kUtf16Mark) + utf16FileText(text), "UTF-16"},
+    };
+    for (const auto& form : forms) {
+        MemoryRegistry again;
+        EXPECT_EQ(importText(again, form.file), "") << form.why;
+        EXPECT_EQ(contents(again), contents(registry)) << form.why;
+        EXPECT_TRUE(exportAll(again) == text) << form.why;
+    }
+    // Nothing in it steers a terminal or breaks a line.
+    EXPECT_TRUE(
+        std::none_of(text.begin(), text.end(), [](char c) { return (c >= 0 && c < ' ' && c != '\n') || c == 0x7F; }));
+}
+
+TEST(RegText, WritesWhatOtherEditorsRead) {
+    // clang-format off
+    const struct {
+        ValueType type; std::string data; const char* line; const char* why;
+    } rows[] = {
+        {ValueType::sz,       "C:\\a \"b\"\0"s,     R"("n"="C:\\a \"b\"")",                         "a text of one line"},
+        {ValueType::sz,       "\0"s,                R"("n"="")",                                    "an empty text"},
+        {ValueType::sz,       "\xC3\xA9\0"s,        "\"n\"=\"\xC3\xA9\"",                           "a letter beyond ASCII"},
+        {ValueType::sz,       ""s,                  R"("n"=hex(1):)",                               "a text without a byte"},
+        {ValueType::sz,       "ab"s,                R"("n"=hex(1):61,00,62,00)",                    "a text without its end"},
+        {ValueType::sz,       "a\n\0"s,             R"("n"=hex(1):61,00,0a,00,00,00)",              "a line end"},
+        {ValueType::sz,       "\xE9\0"s,            R"("n"=hex(1):e9,dc,00,00)",                    "a byte that is no character"},
+        {ValueType::expandSz, "\xF0\x9F\x98\x80"s,  R"("n"=hex(2):3d,d8,00,de)",                    "a character of two units"},
+        {ValueType::multiSz,  "a\0\0"s,             R"("n"=hex(7):61,00,00,00,00,00)",              "several texts"},
+        {ValueType::dword,    "\x2A\0\0\xFE"s,      R"("n"=dword:fe00002a)",                        "a number"},
+        {ValueType::dword,    "\x2A\0"s,            R"("n"=hex(4):2a,00)",                          "a number cut short"},
+        {ValueType::binary,   "\0\xFF"s,            R"("n"=hex:00,ff)",                             "bytes"},
+        {ValueType::none,     ""s,                  R"("n"=hex(0):)",                               "no type"},
+        {ValueType::qword,    "12345678"s,          R"("n"=hex(b):31,32,33,34,35,36,37,38)",        "a long number"},
+    };
+    // clang-format on
+    for (const auto& row : rows) {
+        std::string text;
+        appendRegText({"HKEY_USERS\\k", 0, {}, false, {{"n", row.type, row.data}}}, text);
+        EXPECT_EQ(text, "\n[HKEY_USERS\\k]\n" + std::string(row.line) + "\n") << row.why;
+    }
+    std::string text;
+    appendRegText({"HKEY_USERS\\k", 0, "c", false, {{"", ValueType::binary, std::string(25, 'A')}}}, text);
+    std::string line = "@=hex:41";
+    for (int i = 1; i < 24; ++i) {
+        line += ",41";
+    }
+    EXPECT_EQ(text, "\n[HKEY_USERS\\k]\n;class=\"c\"\n" + line + ",\\\n  41\n") << "a class, and a list over two lines";
+    EXPECT_EQ(utf16FileText("a\xED\xB2\x80\n"), "a\0\x80\xDC\r\0\n\0"s);
+}
+
+TEST(RegText, SortsAsTheStoreDoesNot) {
+    MemoryRegistry registry;
+    for (const std::string_view name : {"b", "_", "", "C", "a"}) {
+        set(registry, "k\\" + std::string(name), name, ValueType::binary, {});
+        set(registry, "k", name, ValueType::binary, {});
+    }
+    EXPECT_EQ(exportAll(registry),
+              headed("\n[HKEY_LOCAL_MACHINE\\k]\n@=hex:\n\"a\"=hex:\n\"b\"=hex:\n\"C\"=hex:\n\"_\"=hex:\n"
+                     "\n[HKEY_LOCAL_MACHINE\\k\\a]\n\"a\"=hex:\n\n[HKEY_LOCAL_MACHINE\\k\\b]\n\"b\"=hex:\n"
+                     "\n[HKEY_LOCAL_MACHINE\\k\\C]\n\"C\"=hex:\n\n[HKEY_LOCAL_MACHINE\\k\\_]\n\"_\"=hex:\n"));
+}
+
+TEST(RegText, ReadsWhatPeopleWrite) {
+    const struct {
+        std::string lines;
+        const char* left;
+        const char* why;
+    } rows[] = {
+        {"[HKLM\\a]\n[hkey_users\\b]\n[HKU\\c]", "\n[HKEY_LOCAL_MACHINE\\a]\n\n[HKEY_USERS\\b]\n\n[HKEY_USERS\\c]\n",
+         "short and long roots in any case, no line end at the end"},
+        {"  [HKU\\a] \t\n ; comment\n\n  \"n\" = \"x\" ; comment\n@=dword:A\n",
+         "\n[HKEY_USERS\\a]\n@=dword:0000000a\n\"n\"=\"x\"\n", "blanks and comments"},
+        {"[HKU\\a]\n\"n\"=hex:1, 2 ,\\  \n\n", nullptr, "a list that goes on with nothing"},
+        {"[HKU\\a]\n\"n\"=hex: 1, 2 ,\\ ; comment\r\n\t3,\\\n  FF\n", "\n[HKEY_USERS\\a]\n\"n\"=hex:01,02,03,ff\n",
+         "lists over several lines"},
+        {"[HKU\\a\\b\\c]\n[HKU\\a\\d]\n[-HKU\\a\\b]\n[-HKU\\none\\of\\it]\n",
+         "\n[HKEY_USERS\\a]\n\n[HKEY_USERS\\a\\d]\n", "a tree is deleted, one that is not there too"},
+        {"[HKU\\a]\n\"x\"=\"1\"\n\"y\"=\"2\"\n\"X\"=-\n\"z\"=-\n@=-\n", "\n[HKEY_USERS\\a]\n\"y\"=\"2\"\n",
+         "values are deleted, those that are not there too"},
+        {"[-HKU\\a]\n[HKU\\a]\n;class=\"c\"\n[HKU\\b]\n\"x\"=\"\"\n;class=\"no\"\n",
+         "\n[HKEY_USERS\\a]\n;class=\"c\"\n\n[HKEY_USERS\\b]\n\"x\"=\"\"\n", "a class only behind its key"},
+        {"[HKU\\a]\n;class of my own\n", "\n[HKEY_USERS\\a]\n", "a comment that only looks like a class"},
+    };
+    for (const auto& row : rows) {
+        MemoryRegistry registry;
+        const std::string fault = importText(registry, headed(row.lines));
+        EXPECT_EQ(fault.empty(), row.left != nullptr) << row.why << ": " << fault;
+        EXPECT_EQ(exportAll(registry), headed(row.left == nullptr ? "" : row.left)) << row.why;
+        EXPECT_EQ(registry.openHandles(), 0U) << row.why;
+    }
+    MemoryRegistry old;
+    EXPECT_EQ(importText(old, "REGEDIT4\r\n\r\n[HKEY_USERS\\a]\r\n\"\xC3\xA9\"=\"\xE9\"\r\n\"t\"=hex(2):41,00\r\n"),
+              "");
+    EXPECT_EQ(exportAll(old), headed("\n[HKEY_USERS\\a]\n\"t\"=hex(2):41,00,00,00\n\"\xC3\xA9\"=hex(1):e9,dc,00,00\n"));
+}
+
+TEST(RegText, NamesTheBadLine) {
+    const std::string key = headed("[HKLM\\a]\n");
+    // clang-format off
+    const struct {
+        std::string file; const char* fault;
+    } rows[] = {
+        {"",                                              "1: the file does not begin with \"Windows Registry Editor Version 5.00\""},
+        {"Windows Registry Editor Version 6.00\n",        "1: the file does not begin with \"Windows Registry Editor Version 5.00\""},
+        {"\n" + key,                                      "1: the file does not begin with \"Windows Registry Editor Version 5.00\""},
+        {"\xFF\xFEW"s,                                    "1: the file ends within a character"},
+        {key + "\"x\"=\"\xE9\"\n",                        "3: this is no UTF-8"},
+        {key + "\n;\0\n"s,                                "4: there is a NUL character"},
+        {headed("\"x\"=\"y\"\n"),                         "2: the value belongs to no key"},
+        {headed("[-HKLM\\a]\n\"x\"=\"y\"\n"),             "3: the value belongs to no key"},
+        {headed("[HKLM\\a\n"),                            "2: a key is not closed by a bracket at the end of its line"},
+        {headed("[HKLM\\a] x\n"),                         "2: a key is not closed by a bracket at the end of its line"},
+        {headed("[SOFTWARE\\a]\n"),                       "2: the key is in none of HKEY_LOCAL_MACHINE, HKEY_USERS and HKEY_CURRENT_USER"},
+        {headed("[]\n"),                                  "2: the key is in none of HKEY_LOCAL_MACHINE, HKEY_USERS and HKEY_CURRENT_USER"},
+        {headed("[HKLM\\]\n"),                            "2: the key has a part without a name"},
+        {headed("[HKLM\\\\a]\n"),                         "2: the key has a part without a name"},
+        {headed("[HKLM\\a\\\\b]\n"),                      "2: the key has a part without a name"},
+        {headed("[HKLM\\" + std::string(256, 'x') + "]"), "2: the key has a part that no key can be named"},
+        {headed("[HKLM\\\xED\xB0\x80]\n"),                "2: the key has a part that no key can be named"},
+        {headed("[HKLM\\\xED\xA0\x80]\n"),                "2: there is a character that this machine's encoding lacks"},
+        {headed("[-HKLM]\n"),                             "2: a root cannot be deleted"},
+        {headed("[HKLM\\a]\n;class=\"x\n"),               "3: a text is not closed by a quotation mark on its line"},
+        {key + "x=\"y\"\n",                               "3: the line is no key, no value and no comment"},
+        {key + "\"x\n",                                   "3: a text is not closed by a quotation mark on its line"},
+        {key + "\"x\\\"\n",                               "3: a text is not closed by a quotation mark on its line"},
+        {key + "\"x\"=\"C:\\new\"\n",                     "3: a backslash in a text is not followed by a backslash or a quotation mark"},
+        {key + "\"x\"=\"\\\n",                            "3: a backslash in a text is not followed by a backslash or a quotation mark"},
+        {key + "\"" + std::string(16384, 'x') + "\"=-\n", "3: no value can be named so"},
+        {key + "\"x\"\n",                                 "3: there is no equals sign after the name"},
+        {key + "\"x\"=\n",                                "3: the data is no text, no dword and no hex list"},
+        {key + "\"x\"=5\n",                               "3: the data is no text, no dword and no hex list"},
+        {key + "\"x\"=\"y\"z\n",                          "3: there is more on the line than its value"},
+        {key + "\"x\"=-1\n",                              "3: there is more on the line than its value"},
+        {key + "\"x\"=dword:123456789\n",                 "3: there is more on the line than its value"},
+        {key + "\"x\"=dword:-1\n",                        "3: a dword is 1 to 8 hexadecimal digits"},
+        {key + "\"x\"=hex(z):\n",                         "3: a type in brackets is 1 to 8 hexadecimal digits and a colon follows"},
+        {key + "\"x\"=hex(1)00\n",                        "3: a type in brackets is 1 to 8 hexadecimal digits and a colon follows"},
+        {key + "\"x\"=hex:0g\n",                          "3: a list of bytes is pairs of hexadecimal digits with commas between them"},
+        {key + "\"x\"=hex:00 11\n",                       "3: a list of bytes is pairs of hexadecimal digits with commas between them"},
+        {key + "\"x\"=hex:,00\n",                         "3: a list of bytes is pairs of hexadecimal digits with commas between them"},
+        {key + "\"x\"=hex:00,\\\n 11,\n",                 "4: the list ends in a comma"},
+        {key + "\"x\"=hex:00,\\",                         "3: the file ends within a value"},
+        {key + "\"x\"=hex:00,\\ 11\n",                    "3: there is more on the line than its value"},
+        {key + "\"x\"=hex(1):41,00,42\n",                 "3: a text is pairs of bytes"},
+        {key + "\"x\"=hex(2):00,d8\n",                    "3: there is a character that this machine's encoding lacks"},
+    };
+    // clang-format on
+    for (const auto& row : rows) {
+        MemoryRegistry registry;
+        EXPECT_EQ(importText(registry, row.file), row.fault) << row.file.substr(0, 80);
+        EXPECT_EQ(exportAll(registry), kHead) << row.fault;
+    }
+}
+
+TEST(KeyWalk, ShowsTheProductInAMachinesRegistry) {
+    MemoryRegistry registry;
+    for (const std::string_view path :
+         {"SOFTWARE\\NVQ\\KZ7\\InstalledCopies", "SOFTWARE\\NVQ\\KZ7Other", "SOFTWARE\\Other",
+          "SOFTWARE\\Wow6432Node\\nvq\\kz7", "SYSTEM\\CurrentControlSet\\Services\\kz7mgmtsvc_Copy1",
+          "SYSTEM\\CurrentControlSet\\Services\\KZ7MGMTSVC", "SYSTEM\\CurrentControlSet\\Services\\KZ7",
+          "SYSTEM\\CurrentControlSet\\Services\\EventLog\\Application\\KZ7 Management Service"}) {
+        set(registry, path, {}, ValueType::none, {});
+    }
+    std::vector<KeyStart> starts;
+    ASSERT_EQ(findEverything(registry, false, starts), kSuccess);
+    std::string found;
+    for (const KeyStart& start : starts) {
+        found += start.name.path + '\n';
+    }
+    EXPECT_EQ(found,
+              "SOFTWARE\\NVQ\\KZ7\n"
+              "SOFTWARE\\Wow6432Node\\NVQ\\kz7\n"
+              "SYSTEM\\CurrentControlSet\\Services\\EventLog\\Application\\KZ7 Management Service\n"
+              "SYSTEM\\CurrentControlSet\\Services\\KZ7MGMTSVC\n"
+              "SYSTEM\\CurrentControlSet\\Services\\kz7mgmtsvc_Copy1\n");
+}
+
+}  // namespace
+}  // namespace kz7
