@@ -1,4 +1,5 @@
-// Key paths and names as every store of our own understands them. On Windows the system does this itself.
+// Key paths and names as every store understands them. The registry of Windows judges most of this itself, its
+// versions differently; what is checked here is answered alike everywhere.
 #pragma once
 
 #include <string>

@@ -1,22 +1,23 @@
 #include "install/platform/windows/file_system.h"
 
-#include <windows.h>
+#include <io.h>
 
+#include <cerrno>
 #include <string>
+
+#include "install/platform/windows/paths.h"
 
 namespace kz7 {
 
 Status WindowsFileSystem::probe(std::string_view path) {
-    // Only a path from a root names something: nothing is taken relative to the current folder.
-    const bool fromRoot = path.substr(0, 1) == "\\" || path.substr(0, 1) == "/" || path.substr(1, 1) == ":";
-    if (!fromRoot) {
+    // Nothing is taken relative to the current folder.
+    if (!isAbsolutePath(path) || path.find('\0') != std::string_view::npos) {
         return kFileNotFound;
     }
-    if (GetFileAttributesA(std::string(path).c_str()) != INVALID_FILE_ATTRIBUTES) {
+    if (_access(std::string(path).c_str(), 0) == 0) {
         return kSuccess;
     }
-    const Status status = GetLastError();
-    return status == ERROR_ACCESS_DENIED ? kAccessDenied : kFileNotFound;
+    return errno == EACCES ? kAccessDenied : kFileNotFound;
 }
 
 }  // namespace kz7

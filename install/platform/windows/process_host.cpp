@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "install/platform/command_line.h"
+#include "install/platform/windows/paths.h"
 
 namespace kz7 {
 namespace {
@@ -59,8 +60,7 @@ private:
 
 // A program with a folder in its path that hangs on the current folder or drive.
 bool hangsOnCurrentFolder(std::string_view program) {
-    const bool hasDrive = program.size() > 2 && program[1] == ':' && (program[2] == '\\' || program[2] == '/');
-    return !isBareName(program) && !hasDrive && !program.starts_with('\\') && !program.starts_with('/');
+    return !isBareName(program) && !isAbsolutePath(program);
 }
 
 }  // namespace

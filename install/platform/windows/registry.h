@@ -1,6 +1,8 @@
 // The registry port on the Windows registry, narrow calls.
 #pragma once
 
+#include <array>
+
 #include "install/platform/registry_store.h"
 
 namespace kz7 {
@@ -20,6 +22,16 @@ public:
 
     // Every call is seen by others at once.
     Status commit() override { return kSuccess; }
+
+private:
+    // Follows the first names of a path that is too long for one call, so that the rest below `parent` is not.
+    // `base` owns the key where it then starts.
+    Status shorten(KeyHandle& parent, std::string_view& path, AccessMask view, bool create, OwnedKey& base);
+
+    // The calls count the room for a name in 16 bits, doubled.
+    static constexpr std::uint32_t kNameRoom = 32767;
+    std::array<char, kNameRoom> name_;
+    std::array<char, kNameRoom> class_;
 };
 
 }  // namespace kz7
