@@ -4,11 +4,15 @@
 #include <memory>
 #include <string>
 
+#include "install/platform/assembly_cache.h"
 #include "install/platform/console.h"
 #include "install/platform/debug_output.h"
 #include "install/platform/file_system.h"
+#include "install/platform/library_loader.h"
+#include "install/platform/process_host.h"
 #include "install/platform/registry_store.h"
 #include "install/platform/service_manager.h"
+#include "install/platform/threads.h"
 
 namespace kz7 {
 
@@ -29,6 +33,10 @@ public:
     virtual IConsole& console() = 0;
     virtual IDebugOutput& debugOutput() = 0;
     virtual IFileSystem& files() = 0;
+    virtual IProcessHost& processes() = 0;
+    virtual IThreads& threads() = 0;
+    virtual ILibraryLoader& libraries() = 0;
+    virtual IAssemblyCache& assemblies() = 0;
 
     // The store's name for people: the file it is kept in, or the machine's registry.
     virtual std::string storeName() = 0;

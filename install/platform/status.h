@@ -23,6 +23,8 @@ inline constexpr Status kBrokenPipe              = 109;   // every write end of 
 inline constexpr Status kDiskFull                = 112;
 inline constexpr Status kCallNotImplemented      = 120;
 inline constexpr Status kInvalidName             = 123;   // a service name that no service can have
+inline constexpr Status kModuleNotFound          = 126;   // no library of that path, or one that cannot be loaded
+inline constexpr Status kProcedureNotFound       = 127;   // the library has no such entry point
 inline constexpr Status kBadPathname             = 161;
 inline constexpr Status kTooManyThreads          = 164;   // the host starts no further thread
 inline constexpr Status kBusy                    = 170;   // the store stayed locked by another writer
@@ -53,6 +55,7 @@ inline constexpr Status kMissingItem             = 5021;  // the installer runti
 inline constexpr Status kNotExecuted             = 5030;  // a run that was waited for before it was executed
 inline constexpr Status kExitCodeUnavailable     = 5082;  // also: the program could not be started
 inline constexpr Status kThreadStartFailed       = 5111;
+inline constexpr Status kFailed                  = 0xFFFFFFFF;  // -1: the alias rewrite says no more
 // clang-format on
 
 constexpr bool succeeded(Status status) {

@@ -18,14 +18,17 @@ bool equalsIgnoreCase(std::string_view left, std::string_view right) {
 
 std::string compose(std::string_view pattern, std::initializer_list<Insert> inserts) {
     std::string text;
+    text.reserve(pattern.size() + 32 * inserts.size());
     const auto* next = inserts.begin();
-    for (std::size_t at = 0; at < pattern.size(); ++at) {
-        const char kind = pattern[at] == '%' && at + 1 < pattern.size() ? pattern[at + 1] : '\0';
-        if (kind != '%' && kind != 's' && kind != 'd' && kind != 'u') {
-            text += pattern[at];
+    for (std::size_t at = 0; at < pattern.size();) {
+        const std::size_t percent = std::min(pattern.find('%', at), pattern.size());
+        const char kind = percent + 1 < pattern.size() ? pattern[percent + 1] : '\0';
+        const bool isPlaceholder = kind == '%' || kind == 's' || kind == 'd' || kind == 'u';
+        text += pattern.substr(at, percent - at + (isPlaceholder ? 0 : 1));
+        at = percent + (isPlaceholder ? 2 : 1);
+        if (!isPlaceholder) {
             continue;
         }
-        ++at;
         if (kind == '%') {
             text += '%';
             continue;

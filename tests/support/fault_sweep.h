@@ -6,9 +6,11 @@
 #include <functional>
 #include <string>
 
+#include "install/platform/faulty/assembly_cache.h"
 #include "install/platform/faulty/console.h"
 #include "install/platform/faulty/fault_counter.h"
 #include "install/platform/faulty/file_system.h"
+#include "install/platform/faulty/library_loader.h"
 #include "install/platform/faulty/registry.h"
 #include "install/platform/faulty/services.h"
 #include "tests/support/machine.h"
@@ -24,6 +26,8 @@ public:
     IServiceManager& services() override { return faultyServices_; }
     IConsole& console() override { return faultyConsole_; }
     IFileSystem& files() override { return faultyFiles_; }
+    ILibraryLoader& libraries() override { return faultyLibraries_; }
+    IAssemblyCache& assemblies() override { return faultyAssemblies_; }
 
     FaultCounter faults_;
 
@@ -32,6 +36,8 @@ private:
     FaultyServiceManager faultyServices_{services_, faults_};
     FaultyConsole faultyConsole_{console_, faults_};
     FaultyFileSystem faultyFiles_{files_, faults_};
+    FaultyLibraryLoader faultyLibraries_{libraries_, faults_};
+    FaultyAssemblyCache faultyAssemblies_{assemblies_, faults_};
 };
 
 inline constexpr Status kFault = 4321;  // no platform's number, so that it is recognised wherever it goes

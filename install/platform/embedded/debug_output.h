@@ -11,6 +11,7 @@ public:
     explicit EmbeddedDebugOutput(IConsole& console);
 
     void write(std::string_view text) override;
+    bool isHeard() const override { return shown_; }
 
 private:
     IConsole& console_;

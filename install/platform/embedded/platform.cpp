@@ -7,12 +7,15 @@
 #include <csignal>
 #include <cstdlib>
 
-#include "install/platform/standard_console.h"
+#include "install/platform/embedded/assembly_cache.h"
 #include "install/platform/embedded/debug_output.h"
 #include "install/platform/embedded/file_system.h"
+#include "install/platform/embedded/library_loader.h"
 #include "install/platform/embedded/process_host.h"
 #include "install/platform/embedded/registry.h"
 #include "install/platform/embedded/services.h"
+#include "install/platform/embedded/threads.h"
+#include "install/platform/standard_console.h"
 
 namespace kz7 {
 namespace {
@@ -30,13 +33,20 @@ public:
                         faultTold_ = true;
                         console_.writeError(program_ + ": " + fault.file + ": " + fault.reason + "\n");
                     }),
-          services_(registry_, files_) {}
+          services_(registry_, files_),
+          processes_(directory_),
+          libraries_(directory_),
+          assemblies_(registry_, directory_) {}
 
     IRegistryStore& registry() override { return registry_; }
     IServiceManager& services() override { return services_; }
     IConsole& console() override { return console_; }
     IDebugOutput& debugOutput() override { return debugOutput_; }
     IFileSystem& files() override { return files_; }
+    IProcessHost& processes() override { return processes_; }
+    IThreads& threads() override { return threads_; }
+    ILibraryLoader& libraries() override { return libraries_; }
+    IAssemblyCache& assemblies() override { return assemblies_; }
     std::string storeName() override { return registry_.path(); }
     bool storeIsOwn() override { return true; }
     bool storeFaultTold() override { return faultTold_; }
@@ -57,6 +67,10 @@ private:
     EmbeddedFileSystem files_;
     EmbeddedRegistry registry_;
     EmbeddedServiceManager services_;
+    EmbeddedProcessHost processes_;
+    EmbeddedThreads threads_;
+    EmbeddedLibraryLoader libraries_;
+    EmbeddedAssemblyCache assemblies_;
 };
 
 }  // namespace

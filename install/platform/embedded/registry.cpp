@@ -2,6 +2,8 @@
 
 #include <unistd.h>
 
+#include <algorithm>
+
 #include "install/platform/registry_path.h"
 #include "install/platform/text.h"
 
@@ -28,8 +30,10 @@ constexpr std::array kSql = {
     "SELECT coalesce(max(place), 0) FROM value WHERE key = ?",
     "INSERT INTO value (key, fold, name, type, data, place) VALUES (?, ?, ?, ?, ?, ?)"
         " ON CONFLICT (key, fold) DO UPDATE SET type = excluded.type, data = excluded.data",
+    "DELETE FROM value WHERE key = ? AND fold = ?",
     "DELETE FROM value WHERE key = ? AND fold = ? RETURNING place",
     "SELECT place, name, type, data FROM value WHERE key = ? AND place >= ? ORDER BY place LIMIT 1 OFFSET ?",
+    "SELECT place, name, type FROM value WHERE key = ? AND place >= ? ORDER BY place LIMIT 64 OFFSET ?",
 };
 // clang-format on
 
@@ -48,7 +52,9 @@ enum class EmbeddedRegistry::Sql : std::size_t {
     highestPlace,
     setValue,
     deleteValue,
+    deletePlacedValue,
     nextValue,
+    nextValueNames,
 };
 
 EmbeddedRegistry::EmbeddedRegistry(const std::string& directory, bool readOnly, FaultListener listener)
@@ -112,7 +118,7 @@ Status EmbeddedRegistry::begin() {
     inTransaction_ = true;
     ++transaction_;
     childless_ = 0;
-    placedKey_ = 0;
+    placed_ = {};
     return kSuccess;
 }
 
@@ -275,8 +281,7 @@ Status EmbeddedRegistry::addChild(KeyId parent, std::string_view name, std::stri
     remember(parent, fold, id);
     subkeyAdded(parent, fold);
     // A new key has no values yet.
-    placedKey_ = id;
-    highestPlace_ = 0;
+    placed_ = {Placed{id, 0}, placed_[0]};
     return kSuccess;
 }
 
@@ -298,6 +303,9 @@ void EmbeddedRegistry::subkeyAdded(KeyId parent, std::string_view fold) {
 
 void EmbeddedRegistry::subkeyDeleted(const Found& gone) {
     knownSlot(gone.parent, gone.fold).transaction = 0;
+    for (KnownPath& known : knownPaths_) {
+        known.transaction = known.id == gone.id ? 0 : known.transaction;
+    }
     for (OpenKey& open : open_) {
         open.deleted = open.deleted || open.id == gone.id;
         if (!open.used || open.id != gone.parent) {
@@ -343,12 +351,29 @@ Status EmbeddedRegistry::find(KeyHandle parent, std::string_view path, AccessMas
 }
 
 Status EmbeddedRegistry::openKey(KeyHandle parent, std::string_view path, AccessMask access, KeyHandle& key) {
+    OpenKey* base = nullptr;
+    if (const Status status = keyOf(parent, 0, base); status != kSuccess) {
+        return status;
+    }
+    const KeyId below = base->id;
+    if ((access & kKeyView32) == 0) {
+        for (const KnownPath& known : knownPaths_) {
+            if (known.transaction == transaction_ && known.parent == below && known.path == path) {
+                key = giveOut(known.id, access);
+                return kSuccess;
+            }
+        }
+    }
     Found found;
     const Status status = find(parent, path, access, false, {}, found);
-    if (status == kSuccess) {
-        key = giveOut(found.id, access);
+    if (status != kSuccess) {
+        return status;
     }
-    return status;
+    if ((access & kKeyView32) == 0) {
+        knownPaths_[nextKnownPath_++ % knownPaths_.size()] = {transaction_, below, found.id, std::string(path)};
+    }
+    key = giveOut(found.id, access);
+    return kSuccess;
 }
 
 Status EmbeddedRegistry::createKey(KeyHandle parent, std::string_view path, std::string_view keyClass,
@@ -384,16 +409,18 @@ Status EmbeddedRegistry::queryValue(KeyHandle key, std::string_view name, ValueT
 }
 
 Status EmbeddedRegistry::nextPlace(KeyId key, std::int64_t& place) {
-    if (placedKey_ != key) {
+    if (placed_[0].key != key) {
+        std::swap(placed_[0], placed_[1]);
+    }
+    if (placed_[0].key != key) {
         Query highest = query(Sql::highestPlace);
         if (const int result = highest.bind(key).step(); result != SQLITE_ROW) {
             return fail(result);
         }
-        highestPlace_ = highest.number(0);
-        placedKey_ = key;
+        placed_[0] = {key, highest.number(0)};
     }
     // A value that is there already keeps its own place; the number it was offered is left out.
-    place = ++highestPlace_;
+    place = ++placed_[0].highest;
     return kSuccess;
 }
 
@@ -419,6 +446,11 @@ Status EmbeddedRegistry::setValue(KeyHandle key, std::string_view name, ValueTyp
                            .bindBytes(data)
                            .bind(place)
                            .step();
+    for (OpenKey& other : open_) {
+        if (other.used && other.id == open->id) {
+            other.values.ahead.clear();
+        }
+    }
     return result == SQLITE_DONE ? kSuccess : fail(result);
 }
 
@@ -432,15 +464,30 @@ Status EmbeddedRegistry::deleteValue(KeyHandle key, std::string_view name) {
         return status;
     }
     const std::string fold = foldUpper(name);
-    Query remove = query(Sql::deleteValue);
+    const auto isEnumerated = [open](const OpenKey& other) {
+        return other.used && other.id == open->id && other.values.place != 0;
+    };
+    if (std::none_of(open_.begin(), open_.end(), isEnumerated)) {
+        const int result = query(Sql::deleteValue).bind(open->id).bind(fold).step();
+        if (result != SQLITE_DONE) {
+            return fail(result);
+        }
+        return sqlite3_changes(connection_.get()) != 0 ? kSuccess : kFileNotFound;
+    }
+    Query remove = query(Sql::deletePlacedValue);
     const int result = remove.bind(open->id).bind(fold).step();
     if (result != SQLITE_ROW) {
         return result == SQLITE_DONE ? kFileNotFound : fail(result);
     }
     const std::int64_t place = remove.number(0);
     for (OpenKey& other : open_) {
-        if (other.used && other.id == open->id && place < other.values.place) {
+        if (!isEnumerated(other)) {
+            continue;
+        }
+        if (place < other.values.place) {
             --other.values.index;
+        } else {
+            other.values.ahead.clear();
         }
     }
     return kSuccess;
@@ -452,6 +499,15 @@ Status EmbeddedRegistry::readAhead(const OpenKey& open, std::uint32_t skip, std:
     for (; result == SQLITE_ROW; result = next.step()) {
         rows.push_back(
             {next.number(0), std::string(next.bytes(1)), std::string(next.bytes(2)), std::string(next.bytes(3))});
+    }
+    return result == SQLITE_DONE ? kSuccess : fail(result);
+}
+
+Status EmbeddedRegistry::readAhead(const OpenKey& open, std::uint32_t skip, std::vector<ValueName>& rows) {
+    Query next = query(Sql::nextValueNames);
+    int result = next.bind(open.id).bind(open.values.place).bind(skip).step();
+    for (; result == SQLITE_ROW; result = next.step()) {
+        rows.push_back({next.number(0), std::string(next.bytes(1)), static_cast<ValueType>(next.number(2))});
     }
     return result == SQLITE_DONE ? kSuccess : fail(result);
 }
@@ -495,17 +551,39 @@ Status EmbeddedRegistry::enumerateValue(KeyHandle key, std::uint32_t index, Buff
     if (const Status status = keyOf(key, kKeyQueryValue, open); status != kSuccess) {
         return status;
     }
-    if (index < open->values.index) {
-        open->values = {};
+    ValuePlace& values = open->values;
+    if (index < values.index) {
+        values = {};
+    }
+    const std::uint32_t skip = index - values.index;
+    if (data == nullptr) {
+        if (values.next + skip < values.ahead.size()) {
+            values.next += skip;
+        } else {
+            std::vector<ValueName> rows;
+            if (const Status status = readAhead(*open, skip, rows); status != kSuccess || rows.empty()) {
+                return status != kSuccess ? status : kNoMoreItems;
+            }
+            values.ahead = std::move(rows);
+            values.next = 0;
+        }
+        const ValueName& found = values.ahead[values.next];
+        values.index = index;
+        values.place = found.place;
+        const Status named = giveName(found.name, name);
+        if (named == kSuccess && type != nullptr) {
+            *type = found.type;
+        }
+        return named;
     }
     Query next = query(Sql::nextValue);
-    const int result = next.bind(open->id).bind(open->values.place).bind(index - open->values.index).step();
+    const int result = next.bind(open->id).bind(values.place).bind(skip).step();
     if (result != SQLITE_ROW) {
         return result == SQLITE_DONE ? kNoMoreItems : fail(result);
     }
-    open->values = {index, next.number(0)};
+    values = {index, next.number(0), {}, 0};
     const Status named = giveName(next.bytes(1), name);
-    const Status given = data == nullptr ? kSuccess : giveBytes(next.bytes(3), *data);
+    const Status given = giveBytes(next.bytes(3), *data);
     if (named == kSuccess && given == kSuccess && type != nullptr) {
         *type = static_cast<ValueType>(next.number(2));
     }

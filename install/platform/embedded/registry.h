@@ -59,9 +59,16 @@ private:
         std::vector<Subkey> ahead;  // read already; the one at `next` is the first behind the mark
         std::size_t next = 0;
     };
+    struct ValueName {
+        std::int64_t place = 0;
+        std::string name;
+        ValueType type = ValueType::none;
+    };
     struct ValuePlace {
         std::uint32_t index = 0;
         std::int64_t place = 0;
+        std::vector<ValueName> ahead;  // read already where no data are asked for; the one at `next` is the mark's
+        std::size_t next = 0;
     };
     struct OpenKey {
         bool used = false;
@@ -79,6 +86,18 @@ private:
         KeyId parent = 0;
         KeyId id = 0;
         std::string fold;
+    };
+    // A path that was opened in this transaction; the copies of both views are opened in turn.
+    struct KnownPath {
+        std::uint64_t transaction = 0;
+        KeyId parent = 0;
+        KeyId id = 0;
+        std::string path;
+    };
+    // A key that got a new value, and the highest place in it.
+    struct Placed {
+        KeyId key = 0;
+        std::int64_t highest = 0;
     };
     // Where a path led.
     struct Found {
@@ -106,6 +125,7 @@ private:
     KnownSubkey& knownSlot(KeyId parent, std::string_view fold);
     void remember(KeyId parent, std::string_view fold, KeyId id);
     Status readAhead(const OpenKey& open, std::uint32_t skip, std::vector<Subkey>& rows);
+    Status readAhead(const OpenKey& open, std::uint32_t skip, std::vector<ValueName>& rows);
     void subkeyAdded(KeyId parent, std::string_view fold);
     void subkeyDeleted(const Found& gone);
 
@@ -114,7 +134,7 @@ private:
     FaultListener listener_;
     // Before the statements: they must be gone when the connection closes.
     Connection connection_;
-    std::array<Statement, 13> statements_;
+    std::array<Statement, 15> statements_;
     Status fault_ = kSuccess;  // met in this transaction; every operation answers it until the next mark
     bool inTransaction_ = false;
     std::uint64_t transaction_ = 0;
@@ -123,9 +143,9 @@ private:
     std::vector<std::uint32_t> free_;
     std::array<KnownSubkey, 256> known_;
     KeyId childless_ = 0;  // the key that was last seen to have no subkey
-    // The key that got the last new value, and the highest place in it.
-    KeyId placedKey_ = 0;
-    std::int64_t highestPlace_ = 0;
+    std::array<KnownPath, 4> knownPaths_;
+    std::size_t nextKnownPath_ = 0;
+    std::array<Placed, 2> placed_;  // the last one first
 };
 
 }  // namespace kz7

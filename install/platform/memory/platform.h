@@ -1,11 +1,15 @@
 // A whole machine in memory. Its ports are plain members, so that a test sets them up and reads them.
 #pragma once
 
+#include "install/platform/memory/assembly_cache.h"
 #include "install/platform/memory/console.h"
 #include "install/platform/memory/debug_output.h"
 #include "install/platform/memory/file_system.h"
+#include "install/platform/memory/library_loader.h"
+#include "install/platform/memory/process_host.h"
 #include "install/platform/memory/registry.h"
 #include "install/platform/memory/services.h"
+#include "install/platform/memory/threads.h"
 #include "install/platform/platform.h"
 
 namespace kz7 {
@@ -17,6 +21,10 @@ public:
     IConsole& console() override { return console_; }
     IDebugOutput& debugOutput() override { return debugOutput_; }
     IFileSystem& files() override { return files_; }
+    IProcessHost& processes() override { return processes_; }
+    IThreads& threads() override { return threads_; }
+    ILibraryLoader& libraries() override { return libraries_; }
+    IAssemblyCache& assemblies() override { return assemblies_; }
     std::string storeName() override { return "memory"; }
     std::string storeNote() override { return {}; }
     bool storeIsOwn() override { return true; }
@@ -27,6 +35,10 @@ public:
     MemoryServiceManager services_{files_};
     MemoryConsole console_;
     MemoryDebugOutput debugOutput_;
+    MemoryProcessHost processes_;
+    MemoryThreads threads_;
+    MemoryLibraryLoader libraries_;
+    MemoryAssemblyCache assemblies_{registry_};
 };
 
 }  // namespace kz7

@@ -11,7 +11,7 @@ namespace kz7 {
 
 Status WindowsFileSystem::probe(std::string_view path) {
     // Nothing is taken relative to the current folder.
-    if (!isFromRoot(path) || path.find('\0') != std::string_view::npos) {
+    if (!isAbsolutePath(path) || path.find('\0') != std::string_view::npos) {
         return kFileNotFound;
     }
     if (_access(std::string(path).c_str(), 0) == 0) {

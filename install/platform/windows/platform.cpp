@@ -4,10 +4,14 @@
 #include <windows.h>
 
 #include "install/platform/standard_console.h"
+#include "install/platform/windows/assembly_cache.h"
 #include "install/platform/windows/debug_output.h"
 #include "install/platform/windows/file_system.h"
+#include "install/platform/windows/library_loader.h"
+#include "install/platform/windows/process_host.h"
 #include "install/platform/windows/registry.h"
 #include "install/platform/windows/services.h"
+#include "install/platform/windows/threads.h"
 
 namespace kz7 {
 namespace {
@@ -21,6 +25,10 @@ public:
     IConsole& console() override { return console_; }
     IDebugOutput& debugOutput() override { return debugOutput_; }
     IFileSystem& files() override { return files_; }
+    IProcessHost& processes() override { return processes_; }
+    IThreads& threads() override { return threads_; }
+    ILibraryLoader& libraries() override { return libraries_; }
+    IAssemblyCache& assemblies() override { return assemblies_; }
     std::string storeName() override { return "the registry of this machine"; }
     std::string storeNote() override { return {}; }
     bool storeIsOwn() override { return false; }
@@ -32,6 +40,10 @@ private:
     WindowsFileSystem files_;
     WindowsRegistry registry_;
     WindowsServiceManager services_;
+    WindowsProcessHost processes_;
+    WindowsThreads threads_;
+    WindowsLibraryLoader libraries_;
+    WindowsAssemblyCache assemblies_;
 };
 
 }  // namespace

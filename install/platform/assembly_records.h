@@ -1,0 +1,25 @@
+// The assembly cache of a host without the framework: records in the registry store, one value per provider
+// file, level and generation, written in the store's own transaction.
+#pragma once
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "install/platform/assembly_cache.h"
+#include "install/platform/registry_store.h"
+
+namespace kz7 {
+
+// Whether a file of a bin folder is a data provider.
+bool isProviderFile(std::string_view file);
+
+// Records every file for every generation asked for; the data is the file's path. Without files nothing is
+// made, not even the key.
+Status recordProviders(IRegistryStore& registry, std::string_view location, std::string_view level,
+                       FrameworkGenerations generations, const std::vector<std::string>& files);
+
+// Deletes the records of that level; none, and the empty level, are success.
+Status dropProviders(IRegistryStore& registry, std::string_view level);
+
+}  // namespace kz7

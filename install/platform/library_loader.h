@@ -1,0 +1,41 @@
+// The library port: loads a product library by its path and finds its entry points.
+#pragma once
+
+#include <cstdint>
+#include <string_view>
+
+#include "install/platform/owned_handle.h"
+#include "install/platform/status.h"
+
+namespace kz7 {
+
+enum class LibraryHandle : std::uint64_t { none = 0 };
+
+// An entry point of whatever signature; the caller casts it to the one it knows.
+using LibraryFunction = void (*)();
+
+// Outputs are written on success only. One thread.
+class ILibraryLoader {
+public:
+    virtual ~ILibraryLoader() = default;
+
+    // Loads the library and, from its own folder first, what it needs. Only an absolute path names one: the
+    // tool runs with every right, and nothing is taken from the folder it happens to be run in.
+    // kModuleNotFound: there is none, or the host cannot load it. The caller frees `library`.
+    virtual Status load(std::string_view path, LibraryHandle& library) = 0;
+
+    // kProcedureNotFound: the library has no such entry point. `function` is good until the library is freed.
+    virtual Status resolve(LibraryHandle library, std::string_view name, LibraryFunction& function) = 0;
+
+    virtual Status free(LibraryHandle library) = 0;
+};
+
+struct LibraryTraits {
+    using Port = ILibraryLoader;
+    using Handle = LibraryHandle;
+    static constexpr Handle kNone = LibraryHandle::none;
+    static void close(Port& port, Handle library) { port.free(library); }
+};
+using OwnedLibrary = OwnedHandle<LibraryTraits>;
+
+}  // namespace kz7

@@ -1,0 +1,231 @@
+#include "install/platform/windows/assembly_cache.h"
+
+#include <windows.h>
+
+#include <fusion.h>
+
+#include <bit>
+#include <cwchar>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "install/platform/windows/paths.h"
+
+namespace kz7 {
+namespace {
+
+struct Generation {
+    FrameworkGenerations bit;
+    const char* folder;
+};
+constexpr Generation kGenerations[] = {{kFramework2, "v2.0.50727"}, {kFramework4, "v4.0.30319"}};
+
+constexpr wchar_t kProviderPrefix[] = L"kz7nmp";
+constexpr DWORD kFullName = 0x1 | 0x2 | 0x4 | 0x20;  // version, culture, public key token, processor
+
+struct Release {
+    void operator()(IUnknown* object) const { object->Release(); }
+};
+template <typename Interface>
+using ComPointer = std::unique_ptr<Interface, Release>;
+
+Status statusOf(HRESULT result) {
+    if (SUCCEEDED(result)) {
+        return kSuccess;
+    }
+    return static_cast<Status>(HRESULT_FACILITY(result) == FACILITY_WIN32 ? HRESULT_CODE(result) : result);
+}
+
+class Apartment {
+public:
+    Apartment() : entered_(SUCCEEDED(CoInitializeEx(nullptr, COINIT_APARTMENTTHREADED))) {}
+    Apartment(const Apartment&) = delete;
+    Apartment& operator=(const Apartment&) = delete;
+    ~Apartment() {
+        if (entered_) {
+            CoUninitialize();
+        }
+    }
+
+private:
+    bool entered_;
+};
+
+// The cache interface of one generation.
+class Fusion {
+public:
+    explicit Fusion(const Generation& generation) {
+        char windows[MAX_PATH] = {};
+        const UINT length = GetSystemWindowsDirectoryA(windows, MAX_PATH);
+        if (length == 0 || length >= MAX_PATH) {
+            return;
+        }
+        const std::string path =
+            std::string(windows) + "\\Microsoft.NET\\Framework64\\" + generation.folder + "\\fusion.dll";
+        library_ = LoadLibraryExA(path.c_str(), nullptr, LOAD_WITH_ALTERED_SEARCH_PATH);
+    }
+    Fusion(const Fusion&) = delete;
+    Fusion& operator=(const Fusion&) = delete;
+    ~Fusion() {
+        if (library_ != nullptr) {
+            FreeLibrary(library_);
+        }
+    }
+
+    explicit operator bool() const { return library_ != nullptr; }
+
+    Status openCache(ComPointer<::IAssemblyCache>& cache) const {
+        using Create = HRESULT(STDMETHODCALLTYPE*)(::IAssemblyCache**, DWORD);
+        ::IAssemblyCache* made = nullptr;
+        const Status status = call<Create>("CreateAssemblyCache", &made, DWORD{0});
+        cache.reset(made);
+        return status;
+    }
+
+    Status openList(ComPointer<IAssemblyEnum>& list) const {
+        using Create = HRESULT(STDMETHODCALLTYPE*)(IAssemblyEnum**, IUnknown*, IAssemblyName*, DWORD, LPVOID);
+        IAssemblyEnum* made = nullptr;
+        const Status status =
+            call<Create>("CreateAssemblyEnum", &made, nullptr, nullptr, DWORD{ASM_CACHE_GAC}, nullptr);
+        list.reset(made);
+        return status;
+    }
+
+private:
+    template <typename Function, typename... Arguments>
+    Status call(const char* name, Arguments... arguments) const {
+        const FARPROC entry = GetProcAddress(library_, name);
+        return entry == nullptr ? kProcedureNotFound : statusOf(std::bit_cast<Function>(entry)(arguments...));
+    }
+
+    HMODULE library_ = nullptr;
+};
+
+std::wstring wide(std::string_view text) {
+    const int size = static_cast<int>(text.size());
+    std::wstring result(text.size(), L'\0');
+    result.resize(static_cast<std::size_t>(
+        MultiByteToWideChar(CP_ACP, 0, text.data(), size, result.data(), static_cast<int>(result.size()))));
+    return result;
+}
+
+// Whether a cached assembly is a provider of that level: version 9.1.0.x is of the level 9.1.0.
+bool isProvider(IAssemblyName& assembly, const std::wstring& level) {
+    wchar_t name[MAX_PATH] = {};
+    DWORD size = MAX_PATH;
+    DWORD high = 0;
+    DWORD low = 0;
+    if (FAILED(assembly.GetName(&size, name)) || FAILED(assembly.GetVersion(&high, &low)) ||
+        _wcsnicmp(name, kProviderPrefix, std::wcslen(kProviderPrefix)) != 0) {
+        return false;
+    }
+    const std::wstring version = std::to_wstring(HIWORD(high)) + L'.' + std::to_wstring(LOWORD(high)) + L'.' +
+                                 std::to_wstring(HIWORD(low)) + L'.' + std::to_wstring(LOWORD(low)) + L'.';
+    return version.starts_with(level + L'.');
+}
+
+// The full names of the cached providers of that level.
+Status listProviders(const Fusion& fusion, const std::wstring& level, std::vector<std::wstring>& names) {
+    ComPointer<IAssemblyEnum> list;
+    if (const Status status = fusion.openList(list); !succeeded(status)) {
+        return status;
+    }
+    IAssemblyName* next = nullptr;
+    while (list->GetNextAssembly(nullptr, &next, 0) == S_OK) {
+        const ComPointer<IAssemblyName> assembly(next);
+        wchar_t name[1024] = {};
+        DWORD size = 1024;
+        if (isProvider(*assembly, level) && SUCCEEDED(assembly->GetDisplayName(name, &size, kFullName))) {
+            names.emplace_back(name);
+        }
+    }
+    return kSuccess;
+}
+
+Status uninstall(::IAssemblyCache& cache, const std::wstring& name) {
+    ULONG disposition = 0;
+    const HRESULT result = cache.UninstallAssembly(0, name.c_str(), nullptr, &disposition);
+    const bool stays = disposition == IASSEMBLYCACHE_UNINSTALL_DISPOSITION_STILL_IN_USE ||
+                       disposition == IASSEMBLYCACHE_UNINSTALL_DISPOSITION_HAS_INSTALL_REFERENCES;
+    return result == S_FALSE && stays ? kBusy : statusOf(result);
+}
+
+// Nothing for a location that depends on where the process stands.
+std::vector<std::wstring> providerFiles(std::string_view location) {
+    const std::string folder = std::string(location) + (location.ends_with('\\') ? "bin\\" : "\\bin\\");
+    std::vector<std::wstring> files;
+    if (!isFromRoot(folder)) {
+        return files;
+    }
+    WIN32_FIND_DATAA found;
+    const HANDLE search = FindFirstFileA((folder + "kz7nmp*.dll").c_str(), &found);
+    if (search == INVALID_HANDLE_VALUE) {
+        return files;
+    }
+    do {
+        if ((found.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) == 0) {
+            files.push_back(wide(folder + found.cFileName));
+        }
+    } while (FindNextFileA(search, &found) != 0);
+    FindClose(search);
+    return files;
+}
+
+// The first failure of several steps that do not stop one another.
+void keepFirst(Status& first, Status status) {
+    if (succeeded(first)) {
+        first = status;
+    }
+}
+
+}  // namespace
+
+Status WindowsAssemblyCache::deregisterProviders(std::string_view level) {
+    if (level.empty()) {
+        return kSuccess;
+    }
+    const Apartment apartment;
+    Status result = kSuccess;
+    for (const Generation& generation : kGenerations) {
+        const Fusion fusion(generation);
+        if (!fusion) {
+            continue;
+        }
+        ComPointer<::IAssemblyCache> cache;
+        std::vector<std::wstring> names;
+        keepFirst(result, fusion.openCache(cache));
+        keepFirst(result, listProviders(fusion, wide(level), names));
+        for (const std::wstring& name : names) {
+            keepFirst(result, cache == nullptr ? kSuccess : uninstall(*cache, name));
+        }
+    }
+    return result;
+}
+
+Status WindowsAssemblyCache::registerProviders(std::string_view location, std::string_view,
+                                               FrameworkGenerations generations) {
+    const std::vector<std::wstring> files = providerFiles(location);
+    if (files.empty()) {
+        return kSuccess;
+    }
+    const Apartment apartment;
+    Status result = kSuccess;
+    for (const Generation& generation : kGenerations) {
+        if ((generations & generation.bit) == 0) {
+            continue;
+        }
+        const Fusion fusion(generation);
+        ComPointer<::IAssemblyCache> cache;
+        if (const Status opened = fusion ? fusion.openCache(cache) : kModuleNotFound; !succeeded(opened)) {
+            keepFirst(result, opened);
+            continue;
+        }
+        for (const std::wstring& file : files) {
+            keepFirst(result, statusOf(cache->InstallAssembly(0, file.c_str(), nullptr)));
+        }
+    }
+    return result;
+}
+
+}  // namespace kz7

@@ -1,0 +1,51 @@
+#include "install/platform/windows/library_loader.h"
+
+#include <windows.h>
+
+#include <bit>
+#include <string>
+
+#include "install/platform/windows/paths.h"
+
+namespace kz7 {
+namespace {
+
+HMODULE moduleOf(LibraryHandle library) {
+    return std::bit_cast<HMODULE>(library);
+}
+
+// The loader leaves no error for a missing export on every system that runs this.
+Status lastErrorOr(Status fallback) {
+    const Status status = GetLastError();
+    return status == kSuccess ? fallback : status;
+}
+
+}  // namespace
+
+Status WindowsLibraryLoader::load(std::string_view path, LibraryHandle& library) {
+    if (!isFromRoot(path)) {
+        return kModuleNotFound;
+    }
+    const HMODULE module = LoadLibraryExA(std::string(path).c_str(), nullptr, LOAD_WITH_ALTERED_SEARCH_PATH);
+    if (module == nullptr) {
+        return lastErrorOr(kModuleNotFound);
+    }
+    library = std::bit_cast<LibraryHandle>(module);
+    return kSuccess;
+}
+
+Status WindowsLibraryLoader::resolve(LibraryHandle library, std::string_view name, LibraryFunction& function) {
+    SetLastError(kSuccess);
+    const FARPROC entry = GetProcAddress(moduleOf(library), std::string(name).c_str());
+    if (entry == nullptr) {
+        return lastErrorOr(kProcedureNotFound);
+    }
+    function = std::bit_cast<LibraryFunction>(entry);
+    return kSuccess;
+}
+
+Status WindowsLibraryLoader::free(LibraryHandle library) {
+    return FreeLibrary(moduleOf(library)) != 0 ? kSuccess : lastErrorOr(kInvalidHandle);
+}
+
+}  // namespace kz7

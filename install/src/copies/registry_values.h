@@ -1,0 +1,48 @@
+// Single text values of the machine's registry, as the copy records and the alias rewrite read, write and
+// delete them. Every operation opens its key, does one thing and closes it; what went wrong is composed for
+// the debugger output alone.
+#pragma once
+
+#include <initializer_list>
+#include <string>
+#include <string_view>
+
+#include "install/platform/debug_output.h"
+#include "install/platform/registry_store.h"
+#include "install/platform/text.h"
+
+namespace kz7 {
+
+// Key paths are plain paths below the machine's root. Statuses are kSuccess or kFailed.
+class RegistryValues {
+public:
+    RegistryValues(IRegistryStore& registry, IDebugOutput& debug) : registry_(registry), debug_(debug) {}
+
+    // The value's data up to the first NUL, whatever its type. Empty on any failure, and for 100 characters
+    // and more, so that a missing value and an empty one look alike. Both are one operation; they differ in
+    // what they tell the debugger.
+    std::string getValue(std::string_view path, std::string_view name);
+    std::string readValue(std::string_view path, std::string_view name);
+
+    // Stores a string value in a key that exists.
+    Status setValue(std::string_view path, std::string_view name, std::string_view data);
+    Status deleteValue(std::string_view path, std::string_view name);
+
+    // Composes a message for the debugger output, if anybody sees it.
+    void tell(std::string_view pattern, std::initializer_list<Insert> inserts = {}) {
+        if (debug_.isHeard()) {
+            debug_.write(compose(pattern, inserts));
+        }
+    }
+
+    IRegistryStore& registry() { return registry_; }
+
+private:
+    Status open(std::string_view path, AccessMask access, OwnedKey& key);
+    std::string query(std::string_view path, std::string_view name, std::string_view complaint);
+
+    IRegistryStore& registry_;
+    IDebugOutput& debug_;
+};
+
+}  // namespace kz7

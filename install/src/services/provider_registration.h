@@ -1,0 +1,41 @@
+// Registers the .NET data providers of an install location: older ones of its level out, its own into the
+// assembly cache, the product's configuration programs for both frameworks run, and last the version aliases
+// rewritten.
+#pragma once
+
+#include <string>
+#include <string_view>
+
+#include "install/platform/assembly_cache.h"
+#include "install/platform/console.h"
+#include "install/platform/debug_output.h"
+#include "install/platform/file_system.h"
+#include "install/platform/library_loader.h"
+#include "install/platform/process_host.h"
+#include "install/platform/registry_store.h"
+#include "install/platform/threads.h"
+#include "install/src/report.h"
+
+namespace kz7 {
+
+struct ProviderPorts {
+    IRegistryStore& registry;
+    ILibraryLoader& libraries;
+    IAssemblyCache& assemblies;
+    IFileSystem& files;
+    IProcessHost& processes;
+    IThreads& threads;
+    IConsole& console;
+    IDebugOutput& debug;
+};
+
+// Asks the product library of a location for its level, a dotted text such as "9.1.0.0", and tells it. On a
+// failure, which is reported, `level` stays as it was passed in.
+void queryLevel(ILibraryLoader& libraries, Report& report, std::string_view location, std::string& level);
+
+// The result is that of the alias rewrite; what comes before it is only reported. What was written is
+// committed before each program is started and at the end, and a commit that failed is the result where the
+// rewrite has none of its own.
+Status registerProviders(const ProviderPorts& ports, std::string_view location);
+
+}  // namespace kz7

@@ -1,0 +1,375 @@
+// The version aliases: what is read of the copies, which copy answers to which prefix, and the rewrite with all
+// its ways to fail.
+#include <gtest/gtest.h>
+
+#include <random>
+#include <set>
+
+#include "install/src/copies/install_copies_profile.h"
+#include "install/src/copy_layout.h"
+#include "tests/support/fault_sweep.h"
+
+namespace kz7::test {
+namespace {
+
+const std::string kNative(layout::kCopies);
+const std::string kWow(layout::kCopies32);
+
+struct Version {
+    std::string copy, version, release, modification, fixLevel;  // an empty field is not there
+};
+
+void addVersion(Machine& machine, const Version& row) {
+    const std::string key = kNative + "\\" + row.copy + "\\CurrentVersion";
+    machine.make(key);
+    for (const auto& [name, data] : {std::pair{"Version", row.version},
+                                     {"Release", row.release},
+                                     {"Modification", row.modification},
+                                     {"Fix Level", row.fixLevel}}) {
+        if (!data.empty()) {
+            machine.set(key, name, data);
+        }
+    }
+}
+
+void setRaw(Machine& machine, const std::string& path, const std::string& name, std::string_view data) {
+    OwnedKey key(machine.registry_);
+    ASSERT_EQ(machine.registry_.createKey(KeyHandle::localMachine, path, {}, kKeyFull, key.receive()), kSuccess);
+    ASSERT_EQ(machine.registry_.setValue(key.get(), name, ValueType::sz, data), kSuccess);
+}
+
+// The values directly under a key, "name=data" with a terminator shown as '!', sorted; "none" without the key.
+std::string valuesOf(Machine& machine, const std::string& path) {
+    OwnedKey key(machine.registry_);
+    if (machine.registry_.openKey(KeyHandle::localMachine, path, kKeyRead, key.receive()) != kSuccess) {
+        return "none";
+    }
+    std::set<std::string> values;
+    FixedBuffer<1024> name;
+    FixedBuffer<1024> data;
+    for (std::uint32_t i = 0; machine.registry_.enumerateValue(key.get(), i, name, nullptr, &data) == kSuccess; ++i) {
+        std::string shown(data.view());
+        std::replace(shown.begin(), shown.end(), '\0', '!');
+        values.insert(std::string(name.view()) + "=" + shown);
+    }
+    std::string text;
+    for (const std::string& value : values) {
+        text += (text.empty() ? "" : " ") + value;
+    }
+    return text;
+}
+
+Status rewrite(Machine& machine) {
+    return InstallCopiesProfile(machine.registry(), machine.debugOutput()).run();
+}
+
+TEST(RegistryValues, ReadUpToNinetyNineCharactersAndWriteNoTerminator) {
+    Machine machine;
+    RegistryValues values(machine.registry_, machine.debugOutput_);
+    using namespace std::string_literals;
+    const struct {
+        const char* why;
+        std::string stored;
+        std::string read;
+    } rows[] = {
+        {"99 characters and their terminator", std::string(99, 'x') + '\0', std::string(99, 'x')},
+        {"99 characters without one", std::string(99, 'x'), std::string(99, 'x')},
+        {"100 characters and their terminator", std::string(100, 'x') + '\0', ""},
+        {"100 characters without one, which fit the buffer", std::string(100, 'x'), ""},
+        {"what is behind the first terminator", "ab\0cd\0"s, "ab"},
+    };
+    for (const auto& row : rows) {
+        setRaw(machine, "K", "v", row.stored);
+        EXPECT_EQ(values.getValue("K", "v"), row.read) << row.why;
+        EXPECT_EQ(values.readValue("K", "v"), row.read) << row.why;
+    }
+    EXPECT_EQ(values.setValue("K", "abc", "ABC"), kSuccess);
+    EXPECT_EQ(machine.dump("K").find("K : abc = 1:ABC\n") != std::string::npos, true);
+    EXPECT_EQ(values.deleteValue("K", "ABC"), kSuccess) << "names compare without case";
+    machine.debugOutput_.messages.clear();
+    EXPECT_EQ(values.deleteValue("K", "abc"), kFailed);
+    EXPECT_EQ(values.setValue("Nowhere", "abc", "ABC"), kFailed);
+    EXPECT_EQ(values.deleteValue("Nowhere", "abc"), kFailed);
+    EXPECT_EQ(values.getValue("Nowhere", "abc"), "");
+    EXPECT_EQ(values.getValue("K", "abc"), "");
+    EXPECT_EQ(values.readValue("K", "abc"), "");
+    EXPECT_FALSE(machine.has("Nowhere")) << "nothing is created";
+    const std::vector<std::string> told = {"Failed to open the registry key:Nowhere",
+                                           "Failed to open the registry key:Nowhere",
+                                           "Failed to open the registry key:Nowhere",
+                                           "Failed to get the value of:K\\abc", "Failed to read the value of:K\\abc"};
+    EXPECT_EQ(machine.debugOutput_.messages, told);
+    EXPECT_EQ(machine.registry_.openHandles(), 0U);
+}
+
+TEST(InstallCopies, AreListedByNameAndTheValidOnesByVersion) {
+    Machine machine;
+    RegistryValues values(machine.registry_, machine.debugOutput_);
+    CopiesByName byName;
+    CopiesByVersion byVersion;
+    byVersion.emplace("stale", InstallCopyInfo());
+    EXPECT_EQ(readInstallCopies(values, byName, byVersion), kFailed);
+    EXPECT_TRUE(byVersion.empty());
+    for (const Version& row : {Version{"nofix", "9", "7", "0", ""},
+                               {"first", "9", "7", "1", "0"},
+                               {"second", "9", "7", "1", "0"},
+                               {"norelease", "9", "", "1", "0"},
+                               {"ten", "10", "1", "0", "0"}}) {
+        addVersion(machine, row);
+    }
+    machine.make(kNative + "\\bare");
+    EXPECT_EQ(readInstallCopies(values, byName, byVersion), kSuccess);
+    std::string shown;
+    for (const auto& [name, copy] : byName) {
+        shown += name + "=" + copy.getVersion() + (copy.isValid() ? "; " : " invalid; ");
+    }
+    EXPECT_EQ(shown,
+              "bare=...0 invalid; first=9.7.1.0; nofix=9.7.0.0; norelease=9..1.0 invalid; second=9.7.1.0; "
+              "ten=10.1.0.0; ");
+    shown.clear();
+    for (const auto& [text, copy] : byVersion) {
+        shown += text + "=" + copy.getName() + "; ";
+    }
+    EXPECT_EQ(shown, "10.1.0.0=ten; 9.7.0.0=nofix; 9.7.1.0=second; ") << "texts, not numbers; the later of two";
+}
+
+// The answer in its plainest form: from the greatest version text down, the first that matches.
+std::string literalHighest(const CopiesByVersion& copies, const std::string& prefix, bool exact) {
+    for (auto copy = copies.rbegin(); copy != copies.rend(); ++copy) {
+        const std::string& text = copy->first;
+        if (exact ? equalsIgnoreCase(text, prefix)
+                  : text.size() > prefix.size() && equalsIgnoreCase(text.substr(0, prefix.size() + 1), prefix + ".")) {
+            return copy->second.getName();
+        }
+    }
+    return {};
+}
+
+AliasMap literalProfile(const CopiesByVersion& copies) {
+    AliasMap profile;
+    for (const auto& [text, copy] : copies) {
+        std::size_t component = 0;
+        for (std::size_t end = 0; end != std::string::npos;) {
+            end = text.find('.', component == 0 ? 0 : end + 1);
+            ++component;
+            const std::string prefix = text.substr(0, end);
+            profile[prefix] = literalHighest(copies, prefix, component == 4);
+        }
+    }
+    return profile;
+}
+
+TEST(HighestVersion, IsWhatTheWalkFromTheGreatestTextFinds) {
+    // Prefixes of one another, both cases, characters on either side of the dot, bytes above 127, components that
+    // are empty or hold a dot of their own.
+    const std::vector<std::string> pieces = {"9",  "1",  "10", "0",    "fp1", "FP1", "Fp1", "a", "Z",    "_",
+                                             "-1", "9-", "/",  "\xE4", "0.1", ".",   ".5",  "",  "a.fp", "A.FP."};
+    std::mt19937 random(20090101);
+    const auto pick = [&] { return pieces[random() % pieces.size()]; };
+    std::size_t differentCases = 0;
+    for (int round = 0; round < 2000; ++round) {
+        Machine machine;
+        const std::size_t copies = 1 + random() % 12;
+        const bool few = random() % 2 == 0;  // few versions make many neighbours
+        for (std::size_t copy = 0; copy < copies; ++copy) {
+            addVersion(machine, {"C" + std::to_string(copy), few ? "9" : pick(), few ? "1" : pick(), pick(), pick()});
+        }
+        InstallCopiesProfile profile(machine.registry_, machine.debugOutput_);
+        ASSERT_EQ(profile.generateInstallCopiesList(), kSuccess);
+        ASSERT_EQ(profile.generateProfileInfo(), kSuccess);
+        const CopiesByVersion& byVersion = profile.copiesByVersion();
+        ASSERT_EQ(profile.profileInfo(), literalProfile(byVersion)) << "round " << round;
+        HighestVersions highest(byVersion);
+        for (int query = 0; query < 20; ++query) {
+            const std::string prefix = pick() + (random() % 2 == 0 ? "" : "." + pick());
+            const bool exact = random() % 2 == 0;
+            const InstallCopyInfo* found = highest.leadingBy(prefix, exact);
+            ASSERT_EQ(found == nullptr ? "" : found->getName(), literalHighest(byVersion, prefix, exact))
+                << "round " << round << ": " << prefix;
+        }
+        std::set<std::string> folded;
+        for (const auto& [prefix, copy] : profile.profileInfo()) {
+            folded.insert(foldUpper(prefix));
+        }
+        differentCases += profile.profileInfo().size() - folded.size();
+    }
+    EXPECT_GT(differentCases, 500U) << "the sets are meant to hold prefixes that differ in case only";
+}
+
+TEST(HighestVersion, IsTracedWithItsPrefix) {
+    Machine machine;
+    addVersion(machine, {"A", "9", "7", "0", "0.1"});
+    InstallCopiesProfile profile(machine.registry_, machine.debugOutput_);
+    profile.generateInstallCopiesList();
+    machine.debugOutput_.messages.clear();
+    profile.generateProfileInfo();
+    const std::vector<std::string> told = {
+        "The highest version leading by '9:9.7.0.0.1--A",        "The highest version leading by '9.7:9.7.0.0.1--A",
+        "The highest version leading by '9.7.0:9.7.0.0.1--A",    "The highest version leading by '9.7.0.0': ( none )",
+        "Did not find corrsponding install name for '9.7.0.0'",  "The highest version leading by '9.7.0.0.1': ( none )",
+        "Did not find corrsponding install name for '9.7.0.0.1'"};
+    EXPECT_EQ(machine.debugOutput_.messages, told);
+}
+
+TEST(AliasRewrite, LeavesExactlyTheAliasesOfTheCopiesThatAreThere) {
+    const std::string longName(100, '9');
+    const struct {
+        const char* why;
+        std::vector<Version> copies;
+        std::vector<std::pair<std::string, std::string>> values;  // in both views before
+        std::string after;                                        // in both views
+    } rows[] = {
+        {"each prefix names the highest",
+         {{"A", "9", "5", "0", "0"}, {"B", "9", "7", "0", "0"}, {"C", "9", "7", "0", "4"}},
+         {},
+         "9.5.0.0=A 9.5.0=A 9.5=A 9.7.0.0=B 9.7.0.4=C 9.7.0=C 9.7=C 9=C"},
+        {"texts are compared, not numbers, and a prefix ends at a dot",
+         {{"A", "9", "10", "0", "0"}, {"B", "9", "5", "0", "0"}, {"C", "10", "1", "0", "0"}},
+         {},
+         "10.1.0.0=C 10.1.0=C 10.1=C 10=C 9.10.0.0=A 9.10.0=A 9.10=A 9.5.0.0=B 9.5.0=B 9.5=B 9=B"},
+        {"aliases of copies that are gone go, others stay",
+         {{"A", "9", "7", "0", "0"}},
+         {{"9.7", "GONE"}, {"9.6", "GONE"}, {"9.7.8.DEF.2", "d"}, {"DEFAULT_COPY", "d"}, {"", "d"}, {"9def", "x"}},
+         "9.7.0.0=A 9.7.0=A 9.7.8.DEF.2=d! 9.7=A 9=A =d! DEFAULT_COPY=d!"},
+        {"no valid copy leaves none", {{"A", "9", "7", "", ""}}, {{"9", "A"}, {"keep", "A"}}, "keep=A!"},
+        {"the fourth prefix is looked up exactly, the fifth not at all",
+         {{"A", "9", "7", "0", "0.1"}},
+         {},
+         "9.7.0.0.1= 9.7.0.0= 9.7.0=A 9.7=A 9=A"},
+        {"names that differ in case only are one value, the first spelling stays",
+         {{"A", "9", "1", "0", "FP1"}, {"B", "9", "1", "0", "fp1"}},
+         {},
+         "9.1.0.FP1=B 9.1.0=B 9.1=B 9=B"},
+        {"an empty first component is the default value",
+         {{"A", ".9", "1", "0", "0"}},
+         {},
+         ".9.1.0.0= .9.1.0= .9.1=A .9=A =A"},
+        {"the walk ends at a name that does not fit",
+         {{"A", "9", "7", "0", "0"}},
+         {{"8", "old"}, {longName, "old"}, {"9.6", "old"}},
+         "9.6=old! 9.7.0.0=A 9.7.0=A 9.7=A " + longName + "=old! 9=A"},
+    };
+    for (const auto& row : rows) {
+        Machine machine;
+        machine.make(kNative);
+        machine.make(kWow);
+        for (const Version& copy : row.copies) {
+            addVersion(machine, copy);
+        }
+        for (const auto& [name, data] : row.values) {
+            machine.set(kNative, name, data);
+            machine.set(kWow, name, data);
+        }
+        EXPECT_EQ(rewrite(machine), kSuccess) << row.why;
+        EXPECT_EQ(valuesOf(machine, kNative), row.after) << row.why;
+        EXPECT_EQ(valuesOf(machine, kWow), row.after) << row.why << ", 32-bit view";
+        EXPECT_EQ(rewrite(machine), kSuccess) << row.why;
+        EXPECT_EQ(valuesOf(machine, kNative), row.after) << row.why << ", once more";
+    }
+}
+
+TEST(AliasRewrite, ChangesNothingWhereAViewIsMissing) {
+    for (const std::string& present : {kNative, kWow, std::string("Other")}) {
+        Machine machine;
+        machine.set(present, "9", "OLD");
+        machine.debugOutput_.messages.clear();
+        EXPECT_EQ(rewrite(machine), kFailed);
+        EXPECT_EQ(machine.dump(present), present + " : 9 = 1:OLD\\x00\n");
+        const std::vector<std::string> told = {
+            "Failed to open the registry key: " + (present == kNative ? kWow : kNative),
+            "Failed to backup the old profile info"};
+        EXPECT_EQ(machine.debugOutput_.messages, told);
+    }
+}
+
+const std::string kLongData(120, 'x');
+
+// One alias goes, one stays with another copy, three are new; one cannot be backed up whole.
+void staleAliases(FaultyMachine& machine) {
+    addVersion(machine, {"A", "9", "7", "0", "0"});
+    for (const std::string& view : {kNative, kWow}) {
+        setRaw(machine, view, "8", "GONE");
+        setRaw(machine, view, "9", "OLD");
+    }
+    setRaw(machine, kNative, "8.1", kLongData);
+}
+
+// What a rewrite of these aliases left, in words; as it stands where there are none for it.
+std::string stateOf(FaultyMachine& machine) {
+    const std::string native = valuesOf(machine, kNative);
+    const std::string wow = valuesOf(machine, kWow);
+    const std::string fresh = "9.7.0.0=A 9.7.0=A 9.7=A 9=A";
+    const auto lacksOne = [&](std::string view) {
+        for (const char* alias : {"9.7.0.0=A ", "9.7.0=A ", " 9.7=A", " 9=A"}) {
+            std::string rest = fresh;
+            if (view == rest.erase(rest.find(alias), std::string(alias).size())) {
+                return true;
+            }
+        }
+        return false;
+    };
+    if (native == fresh && wow == fresh) {
+        return "after";
+    }
+    if ((native == fresh && lacksOne(wow)) || (wow == fresh && lacksOne(native))) {
+        return "after, but for one alias of one view";
+    }
+    if (native.empty() && wow.empty()) {
+        return "no aliases";
+    }
+    if (wow == "8=GONE 9=OLD" && native == "8.1=" + kLongData + " 8=GONE 9=OLD") {
+        return "before";
+    }
+    if (wow == "8=GONE 9=OLD" && native == "8.1= 8=GONE 9=OLD") {
+        return "restored, data over 99 characters empty";
+    }
+    if (native.ends_with(fresh) && wow.ends_with(fresh)) {
+        return "after, beside old aliases that were not listed";
+    }
+    return native + " | " + wow;
+}
+
+TEST(AliasRewriteUnderFaults, LeavesWhatTheStepThatFailedStatesAndNothingElse) {
+    std::set<std::string> outcomes;
+    const std::uint64_t calls = sweepFaults(
+        false, staleAliases, [](FaultyMachine& machine) { return rewrite(machine); },
+        [&](FaultyMachine& machine, Status status, const std::string& row) {
+            EXPECT_EQ(machine.registry_.openHandles(), 0U) << row;
+            outcomes.insert(machine.faults_.failed() + ": " + (status == kSuccess ? "0 " : "-1 ") + stateOf(machine));
+        });
+    EXPECT_GT(calls, 60U);
+    const std::set<std::string> expected = {
+        ": 0 after",
+        "closeKey: 0 after",
+        // A view that cannot be opened, before anything is deleted and while it is.
+        "openKey: -1 before",
+        "openKey: -1 restored, data over 99 characters empty",
+        "deleteValue: -1 restored, data over 99 characters empty",
+        "openKey: -1 after, but for one alias of one view",
+        "setValue: -1 after, but for one alias of one view",
+        // A walk that breaks off is one that has ended.
+        "enumerateValue: 0 after",
+        "enumerateValue: 0 after, beside old aliases that were not listed",
+        "enumerateKey: 0 after",
+        // A copy that is not listed or cannot be read has no aliases; a missing fix level is 0.
+        "enumerateKey: 0 no aliases",
+        "openKey: 0 no aliases",
+        "openKey: 0 after",
+        "queryValue: 0 no aliases",
+        "queryValue: 0 after",
+    };
+    EXPECT_EQ(outcomes, expected);
+}
+
+TEST(AliasRewriteUnderFaults, EndsWhenNothingWorksAnyMore) {
+    sweepFaults(
+        true, staleAliases, [](FaultyMachine& machine) { return rewrite(machine); },
+        [](FaultyMachine& machine, Status status, const std::string& row) {
+            EXPECT_EQ(machine.registry_.openHandles(), 0U) << row;
+            const bool passed = machine.faults_.failed().empty() || machine.faults_.failed() == "closeKey";
+            EXPECT_TRUE(status == kFailed || passed) << row;
+        });
+}
+
+}  // namespace
+}  // namespace kz7::test
