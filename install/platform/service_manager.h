@@ -32,6 +32,13 @@ enum class ServiceState : std::uint32_t {
     running = 4,
 };
 
+inline constexpr std::size_t kMaxServiceName = 256;
+
+// What a store of our own takes for a service's name; on Windows the system judges it.
+constexpr bool isServiceName(std::string_view name) {
+    return !name.empty() && name.size() <= kMaxServiceName && name.find_first_of("/\\") == std::string_view::npos;
+}
+
 // A service that runs as LocalSystem in a process of its own, without load order group or dependencies.
 struct ServiceDefinition {
     std::string_view name;
