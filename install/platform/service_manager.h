@@ -12,6 +12,7 @@ namespace kz7 {
 // The manager or one service, open; they are closed alike.
 enum class ServiceHandle : std::uint64_t { none = 0 };
 
+inline constexpr std::uint32_t kServiceManagerConnect = 0x0001;
 inline constexpr std::uint32_t kServiceManagerAllAccess = 0xF003F;
 inline constexpr std::uint32_t kServiceAllAccess = 0xF01FF;
 inline constexpr std::uint32_t kServiceChangeConfig = 0x0002;
