@@ -60,7 +60,8 @@ public:
     virtual Status openManager(std::uint32_t access, ServiceHandle& manager) = 0;
 
     // kServiceExists: there is one of that name. kInvalidName: an empty name, one over 256 characters or with
-    // a slash of either kind. kDuplicateServiceName: its display name is taken, on a host that judges it.
+    // a slash of either kind. kServiceMarkedForDelete: one of that name was deleted, a handle of it is still
+    // open. kDuplicateServiceName: its display name is taken, on a host that judges it.
     virtual Status createService(ServiceHandle manager, const ServiceDefinition& definition,
                                  ServiceHandle& service) = 0;
 

@@ -1,6 +1,9 @@
 #include "install/platform/embedded/services.h"
 
+#include <algorithm>
 #include <array>
+
+#include "install/platform/text.h"
 
 namespace kz7 {
 namespace {
@@ -59,6 +62,9 @@ Status EmbeddedServiceManager::recordOf(ServiceHandle handle, std::uint32_t need
     if ((open->access & needed) != needed) {
         return kAccessDenied;
     }
+    if (open->deleted) {
+        return kServiceMarkedForDelete;
+    }
     const Status status =
         registry_.openKey(KeyHandle::localMachine, open->recordPath, kKeyQueryValue | kKeySetValue, record.receive());
     return isNotFound(status) ? kServiceMarkedForDelete : status;
@@ -78,6 +84,12 @@ Status EmbeddedServiceManager::createService(ServiceHandle manager, const Servic
         return kInvalidName;
     }
     const std::string path = std::string(kServices) + std::string(definition.name);
+    const bool stillOpen = std::any_of(open_.begin(), open_.end(), [&](const Open& open) {
+        return open.deleted && equalsIgnoreCase(open.recordPath, path);
+    });
+    if (stillOpen) {
+        return kServiceMarkedForDelete;
+    }
     OwnedKey record(registry_);
     Status status = registry_.openKey(KeyHandle::localMachine, path, kKeyQueryValue, record.receive());
     if (status == kSuccess) {
@@ -211,8 +223,18 @@ Status EmbeddedServiceManager::deleteRecord(const std::string& path) {
 
 Status EmbeddedServiceManager::deleteService(ServiceHandle service) {
     OwnedKey record(registry_);
-    const Status status = recordOf(service, kServiceDelete, record);
-    return status != kSuccess ? status : deleteRecord(slotOf(service)->recordPath);
+    Status status = recordOf(service, kServiceDelete, record);
+    if (status != kSuccess) {
+        return status;
+    }
+    const std::string path = slotOf(service)->recordPath;
+    status = deleteRecord(path);
+    if (status == kSuccess) {
+        for (Open& open : open_) {
+            open.deleted = open.deleted || equalsIgnoreCase(open.recordPath, path);
+        }
+    }
+    return status;
 }
 
 Status EmbeddedServiceManager::closeHandle(ServiceHandle handle) {

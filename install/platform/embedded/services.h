@@ -33,6 +33,7 @@ private:
         bool used = false;
         std::string recordPath;  // empty: the manager
         std::uint32_t access = 0;
+        bool deleted = false;
     };
 
     ServiceHandle giveOut(std::string recordPath, std::uint32_t access);

@@ -1,5 +1,7 @@
 #include "install/platform/memory/services.h"
 
+#include <algorithm>
+
 #include "install/platform/text.h"
 
 namespace kz7 {
@@ -44,6 +46,13 @@ Status MemoryServiceManager::createService(ServiceHandle manager, const ServiceD
     }
     if (!isServiceName(definition.name)) {
         return kInvalidName;
+    }
+    const bool stillOpen = std::any_of(open_.begin(), open_.end(), [&](const auto& open) {
+        const Service* held = open.second.service.get();
+        return held != nullptr && held->deleted && equalsIgnoreCase(held->name, definition.name);
+    });
+    if (stillOpen) {
+        return kServiceMarkedForDelete;
     }
     std::shared_ptr<Service>& slot = services_[foldUpper(definition.name)];
     if (slot != nullptr) {
