@@ -1,6 +1,8 @@
 // What every process host and every kind of threads must do alike: this machine's and the ones in memory.
 #include <gtest/gtest.h>
 
+#include <filesystem>
+#include <random>
 #include <set>
 
 #include "install/platform/memory/process_host.h"
@@ -131,6 +133,22 @@ TEST_P(ProcessHostContract, ProgramsThatAreNotThereDoNotStart) {
     ProcessInformation child;
     const ProcessStart blank{"  ", {}, StreamHandle::none, StreamHandle::none};
     EXPECT_NE(host_->startProcess(blank, child), kSuccess);
+}
+
+TEST_P(ProcessHostContract, BareNamesAreNotTakenFromTheCurrentFolder) {
+    namespace fs = std::filesystem;
+    const fs::path before = fs::current_path();
+    const fs::path folder = fs::temp_directory_path() / ("kz7-stray-" + std::to_string(std::random_device()()));
+    fs::create_directory(folder);
+    fs::copy_file(childProgram(), folder / "kz7_stray.exe");
+    fs::current_path(folder);
+    for (const char* commandLine : {"kz7_stray.exe", "kz7_stray", "\"kz7_stray.exe\" input"}) {
+        ProcessInformation child;
+        EXPECT_EQ(host_->startProcess({commandLine, {}, StreamHandle::none, StreamHandle::none}, child), kFileNotFound)
+            << commandLine;
+    }
+    fs::current_path(before);
+    fs::remove_all(folder);
 }
 
 INSTANTIATE_TEST_SUITE_P(Hosts, ProcessHostContract, testing::Values("host", "memory"));

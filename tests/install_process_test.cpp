@@ -6,6 +6,8 @@
 
 #include <algorithm>
 
+#include "install/platform/faulty/process_host.h"
+#include "install/platform/faulty/threads.h"
 #include "install/platform/memory/process_host.h"
 #include "install/platform/memory/threads.h"
 #include "tests/support/gate.h"
@@ -225,6 +227,65 @@ TEST_F(ScriptedProcess, ThreadsNeedAFunctionAndARecord) {
               kNullArgument);
     const std::string line = "trace 67108865 ureCreateThread 10 5003 ";
     EXPECT_EQ(sink_.lines, (std::vector<std::string>{line, line}));
+}
+
+// What comes of a run when one call of it fails, once or for good. A failed close closes, and nothing that fails
+// after the program's end changes how it ended.
+TEST_F(ScriptedProcess, AFailedCallOfARunGivesItsCodeAndLeavesNothingOpen) {
+    host_.addProgram("C:\\k\\t.cmd", {.output = "said", .error = "cried", .exitCode = 7});
+    // clang-format off
+    const struct { std::string_view call; Status execute; Status wait; const char* why; } rows[] = {
+        {"",             kSuccess,           kSuccess,             "a run that passes untouched"},
+        {"shortPath",    kSuccess,           kSuccess,             "the path stays as it is"},
+        {"getSlot",      kSuccess,           kSuccess,             "nothing to go back to"},
+        {"createPipe",   kSuccess,           kNotExecuted,         "not reported by the execution itself"},
+        {"setSlot",      kSuccess,           kNotExecuted,         "before the program; after it, nothing is lost"},
+        {"duplicate",    kSuccess,           kNotExecuted,         "the same"},
+        {"startThread",  kThreadStartFailed, kSuccess,             "the second reader's; the first one's is not told"},
+        {"startProcess", kSuccess,           kExitCodeUnavailable, "nothing ran"},
+        {"waitProcess",  kSuccess,           kSuccess,             "taken for a timeout"},
+        {"exitCode",     kSuccess,           kExitCodeUnavailable, "the system does not tell"},
+        {"read",         kSuccess,           kSuccess,             "the reader ends"},
+        {"write",        kSuccess,           kSuccess,             "the readers wake when the pipe is closed"},
+        {"waitThread",   kSuccess,           kSuccess,             "what it collected is not touched"},
+        {"closeStream",  kSuccess,           kSuccess,             "closed all the same"},
+        {"closeThread",  kSuccess,           kSuccess,             "closed all the same"},
+        {"closeProcess", kSuccess,           kSuccess,             "closed all the same"},
+    };
+    // clang-format on
+    for (const bool forGood : {false, true}) {
+        bool untouched = false;
+        for (std::uint64_t call = 1; !untouched; ++call) {
+            FaultCounter faults(call, forGood, kGeneralFailure);
+            FaultyProcessHost host(host_, faults);
+            FaultyThreads threads(threads_, faults);
+            const std::size_t startedBefore = host_.started.size();
+            Status executed = kSuccess;
+            Status waited = kSuccess;
+            std::uint32_t code = 0;
+            {
+                InstallProcess process(host, threads, sink_, "C:\\k\\t.cmd x");
+                executed = process.execute(true, false);
+                waited = process.waitForCompletion(code, kInfiniteWait);
+                process.postOutput("swept", 0);
+            }
+            untouched = faults.failed().empty();
+            const std::string where =
+                faults.failed() + " at call " + std::to_string(call) + (forGood ? " for good" : "");
+            ASSERT_EQ(host_.openHandles(), 0U) << where;
+            ASSERT_EQ(threads_.openHandles(), 0U) << where;
+            EXPECT_EQ(waited == kNotExecuted, host_.started.size() == startedBefore && waited != kExitCodeUnavailable)
+                << where;
+            EXPECT_EQ(code, waited == kSuccess ? 7U : waited) << where;
+            const auto* row = std::find_if(std::begin(rows), std::end(rows),
+                                           [&](const auto& one) { return one.call == faults.failed(); });
+            ASSERT_NE(row, std::end(rows)) << where;
+            if (!forGood) {
+                EXPECT_TRUE(executed == kSuccess || executed == row->execute) << where << ": " << row->why;
+                EXPECT_TRUE(waited == kSuccess || waited == row->wait) << where << ": " << row->why;
+            }
+        }
+    }
 }
 
 // Real programs of this machine, and what they leave in the two slots.

@@ -28,5 +28,6 @@ void waitAtGate(const char* name);
 void closeStandardStreams();
 bool startInheriting(const char* program, const char* mode, const char* argument);
 void endBySignal(int signal);
+std::string inheritedState();  // descriptors, blocked and ignored signals
 
 }  // namespace kz7::test

@@ -45,4 +45,8 @@ bool startInheriting(const char* program, const char* mode, const char* argument
 
 void endBySignal(int) {}
 
+std::string inheritedState() {
+    return {};
+}
+
 }  // namespace kz7::test
