@@ -18,7 +18,7 @@ struct ThreadRecord {
 };
 
 // Starts a thread that calls `function` with `argument`. kNullArgument: no function or no record;
-// kNoMemoryForThread; kThreadStartFailed: the system refused. Each is traced, with the system's error where
+// kNoMemory; kThreadStartFailed: the system refused. Each is traced, with the system's error where
 // there is one.
 Status ureCreateThread(IThreads& threads, IReportSink& sink, void (*function)(void*), void* argument,
                        ThreadRecord* record);
