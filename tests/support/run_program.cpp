@@ -6,10 +6,8 @@
 
 #include <cstdio>
 #include <cstdlib>
-#include <filesystem>
 #include <fstream>
 #include <iterator>
-#include <system_error>
 
 namespace kz7::test {
 namespace {
@@ -69,19 +67,6 @@ ProgramResult runProgram(const std::vector<std::string>& command, const ProgramO
 
 pid_t startProgram(const std::vector<std::string>& command, const ProgramOptions& options) {
     return start(command, options, -1, -1);
-}
-
-TemporaryDirectory::TemporaryDirectory() {
-    std::string pattern = std::filesystem::temp_directory_path() / "kz7test.XXXXXX";
-    if (mkdtemp(pattern.data()) == nullptr) {
-        throw std::system_error(errno, std::generic_category(), pattern);
-    }
-    path_ = pattern;
-}
-
-TemporaryDirectory::~TemporaryDirectory() {
-    std::error_code ignored;
-    std::filesystem::remove_all(path_, ignored);
 }
 
 }  // namespace kz7::test

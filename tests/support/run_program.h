@@ -7,6 +7,8 @@
 #include <string>
 #include <vector>
 
+#include "tests/support/temporary_directory.h"
+
 namespace kz7::test {
 
 struct ProgramResult {
@@ -29,19 +31,5 @@ ProgramResult runProgram(const std::vector<std::string>& command, const ProgramO
 
 // Starts without waiting; output and errors are dropped.
 pid_t startProgram(const std::vector<std::string>& command, const ProgramOptions& options = {});
-
-// A folder of its own that goes when the object does.
-class TemporaryDirectory {
-public:
-    TemporaryDirectory();
-    ~TemporaryDirectory();
-    TemporaryDirectory(const TemporaryDirectory&) = delete;
-    TemporaryDirectory& operator=(const TemporaryDirectory&) = delete;
-
-    const std::string& path() const { return path_; }
-
-private:
-    std::string path_;
-};
 
 }  // namespace kz7::test

@@ -18,7 +18,7 @@ HANDLE native(FileHandle file) {
 }
 
 bool namesNothing(std::string_view path) {
-    return !isFromRoot(path) || path.find('\0') != std::string_view::npos;
+    return !isAbsolutePath(path) || path.find('\0') != std::string_view::npos;
 }
 
 }  // namespace

@@ -1,16 +1,16 @@
-// Which of the product's paths name something here.
+// Which paths name one place on Windows, wherever the process stands.
 #pragma once
 
 #include <string_view>
 
 namespace kz7 {
 
-// From the root of a drive or from a leading separator: one that hangs on no current folder.
-constexpr bool isFromRoot(std::string_view path) {
-    if (path.size() > 1 && path[1] == ':') {
-        path.remove_prefix(2);
-    }
-    return path.starts_with('\\') || path.starts_with('/');
+constexpr bool isPathSeparator(char c) { return c == '\\' || c == '/'; }
+
+// A drive with its root, or a share. `\x` and `C:x` depend on the directory the process was started in.
+constexpr bool isAbsolutePath(std::string_view path) {
+    return path.size() >= 3 &&
+           ((path[1] == ':' && isPathSeparator(path[2])) || (isPathSeparator(path[0]) && isPathSeparator(path[1])));
 }
 
 }  // namespace kz7

@@ -60,7 +60,7 @@ private:
 
 // A program with a folder in its path that hangs on the current folder or drive.
 bool hangsOnCurrentFolder(std::string_view program) {
-    return !isBareName(program) && !isFromRoot(program);
+    return !isBareName(program) && !isAbsolutePath(program);
 }
 
 }  // namespace

@@ -1,0 +1,45 @@
+// The implementations of the ports that every contract suite runs over: the one in memory, and this machine's.
+// Each is fresh, or open on a place of its own that goes with it.
+#pragma once
+
+#include <functional>
+#include <memory>
+#include <string>
+#include <string_view>
+
+#include "install/platform/platform.h"
+
+namespace kz7::test {
+
+// What an implementation is known to do differently. Everything else it must do like the others.
+struct Differences {
+    bool ordersValuesByName = false;     // instead of by when they were first set
+    bool ordersKeysByLowerCase = false;  // "_" before the letters
+    bool foldsBeyondAscii = false;       // names that differ in the case of other letters are one
+    bool endsTexts = false;              // adds a NUL to a text that was stored without one
+};
+
+class Backend {
+public:
+    virtual ~Backend() = default;
+
+    virtual IPlatform& platform() = 0;
+    virtual Differences differences() const { return {}; }
+
+    // The product's path of a folder that is there, and of a program in it that can run as a service.
+    virtual std::string folder() = 0;
+    virtual std::string program() = 0;
+
+    // What `writing` brings out on standard output, or on both streams in the order in which it arrives.
+    virtual std::string written(bool both, const std::function<void(IConsole&)>& writing) = 0;
+};
+
+std::unique_ptr<Backend> memoryBackend();
+std::unique_ptr<Backend> hostBackend();
+
+// The name is one of kBackends.
+std::unique_ptr<Backend> backendNamed(std::string_view name);
+
+inline constexpr const char* kBackends[] = {"memory", "host"};
+
+}  // namespace kz7::test

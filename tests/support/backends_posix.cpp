@@ -1,0 +1,38 @@
+#include <filesystem>
+#include <fstream>
+
+#include "tests/support/backends.h"
+#include "tests/support/captured_streams.h"
+#include "tests/support/temporary_directory.h"
+
+namespace kz7::test {
+namespace {
+
+class EmbeddedBackend final : public Backend {
+public:
+    EmbeddedBackend() : platform_(hostPlatform({.program = "test", .stateDirectory = directory_.path()})) {
+        std::filesystem::create_directories(directory_.path() + "/drive_c/contract");
+        std::ofstream(directory_.path() + "/drive_c/contract/Program.exe") << "program";
+    }
+
+    IPlatform& platform() override { return *platform_; }
+    std::string folder() override { return "C:\\contract"; }
+    std::string program() override { return folder() + "\\Program.exe"; }
+    std::string written(bool both, const std::function<void(IConsole&)>& writing) override {
+        CapturedStreams streams(both);
+        writing(platform_->console());
+        return streams.end();
+    }
+
+private:
+    TemporaryDirectory directory_;
+    std::unique_ptr<IPlatform> platform_;
+};
+
+}  // namespace
+
+std::unique_ptr<Backend> hostBackend() {
+    return std::make_unique<EmbeddedBackend>();
+}
+
+}  // namespace kz7::test
