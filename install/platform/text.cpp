@@ -21,7 +21,7 @@ std::size_t walkPattern(std::string_view pattern, std::span<const Insert> insert
             append(mark.substr(0, 1));
             at = percent + std::min<std::size_t>(mark.size(), 1);
         } else if (placeholders++ >= inserts.size()) {
-            append(mark);
+            continue;
         } else if (const auto* shown = std::get_if<std::string_view>(&inserts[placeholders - 1])) {
             append(*shown);
         } else {

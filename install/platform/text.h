@@ -62,7 +62,7 @@ using Insert = std::variant<std::string_view, std::uint32_t>;
 std::string compose(std::string_view pattern, std::initializer_list<Insert> inserts);
 
 // The same into room of the caller's, cut to it, without a terminator; the result is the length of the whole.
-// A placeholder without an insert stays as it stands, an insert without a placeholder is left out.
+// A placeholder without an insert comes out empty, an insert without a placeholder is left out.
 std::size_t composeInto(char* room, std::size_t size, std::string_view pattern, std::span<const Insert> inserts);
 
 }  // namespace kz7

@@ -8,8 +8,6 @@
 
 namespace kz7 {
 
-inline constexpr std::uint32_t kTraceError = 0x4000001;  // the flag of every trace about threads and programs
-
 // A thread to start and, once started, its handle, which the starter closes.
 struct ThreadRecord {
     std::uint32_t id = 0;
