@@ -24,7 +24,7 @@ public:
         return unlessFailing(faults_, "write", [&] { return real_.write(file, data, written); });
     }
     Status closeFile(FileHandle file) override {
-        return unlessFailing(faults_, "closeFile", [&] { return real_.closeFile(file); });
+        return closingAnyway(faults_, "closeFile", [&] { return real_.closeFile(file); });
     }
     Status findFile(std::string_view pattern, std::string& name) override {
         return unlessFailing(faults_, "findFile", [&] { return real_.findFile(pattern, name); });

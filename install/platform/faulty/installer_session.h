@@ -22,7 +22,9 @@ public:
     Status processMessage(std::uint32_t kind, SessionHandle record, std::int32_t& answer) override {
         return unlessFailing(faults_, "processMessage", [&] { return real_.processMessage(kind, record, answer); });
     }
-    Status closeHandle(SessionHandle handle) override { return real_.closeHandle(handle); }
+    Status closeHandle(SessionHandle handle) override {
+        return closingAnyway(faults_, "closeHandle", [&] { return real_.closeHandle(handle); });
+    }
 
 private:
     IInstallerSession& real_;
