@@ -27,16 +27,33 @@ protected:
     Status open(std::string_view name, OwnedService& service, std::uint32_t access = kServiceAllAccess) {
         return services_.openService(manager_.get(), name, access, service.receive());
     }
-    // The state it comes to, once it is not on its way any more.
-    ServiceState settled(const OwnedService& service) {
-        const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(30);
-        ServiceState state{};
-        do {
-            EXPECT_EQ(services_.queryState(service.get(), state), kSuccess);
+    // Calls again while the answer says so; a manager that never comes to an end shows in the answer.
+    template <typename Call, typename Again>
+    auto settled(Call call, Again again) {
+        const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(60);
+        auto answer = call();
+        while (again(answer) && std::chrono::steady_clock::now() < end) {
             std::this_thread::yield();
-        } while ((state == ServiceState::startPending || state == ServiceState::stopPending) &&
-                 std::chrono::steady_clock::now() < end);
-        return state;
+            answer = call();
+        }
+        return answer;
+    }
+    Status start(const OwnedService& service) {
+        // A machine that is still starting its own services starts no other.
+        constexpr Status kDatabaseLocked = 1055;
+        return settled([&] { return services_.startService(service.get()); },
+                       [](Status status) { return status == kDatabaseLocked; });
+    }
+    ServiceState stateOf(const OwnedService& service) {
+        return settled(
+            [&] {
+                ServiceState state{};
+                EXPECT_EQ(services_.queryState(service.get(), state), kSuccess);
+                return state;
+            },
+            [](ServiceState state) {
+                return state == ServiceState::startPending || state == ServiceState::stopPending;
+            });
     }
 
     static constexpr auto kName = "KZ7ContractTest";
@@ -51,32 +68,35 @@ TEST_P(ServicesContract, AServiceIsMadeFoundRunAndDeleted) {
     OwnedService service(services_);
     EXPECT_EQ(open(kName, service), kServiceDoesNotExist);
     ASSERT_EQ(create(service, kName, backend_->program()), kSuccess);
-    EXPECT_EQ(settled(service), ServiceState::stopped);
+    EXPECT_EQ(stateOf(service), ServiceState::stopped);
     OwnedService second(services_);
     EXPECT_EQ(create(second, "kz7CONTRACTtest", backend_->program()), kServiceExists) << "names compare without case";
     EXPECT_FALSE(second);
     EXPECT_EQ(open("kz7CONTRACTtest", second), kSuccess);
 
     EXPECT_EQ(services_.stopService(service.get()), kServiceNotActive);
-    EXPECT_EQ(services_.startService(service.get()), kSuccess);
-    EXPECT_EQ(settled(second), ServiceState::running);
-    EXPECT_EQ(services_.startService(second.get()), kServiceAlreadyRunning);
+    EXPECT_EQ(start(service), kSuccess);
+    EXPECT_EQ(stateOf(second), ServiceState::running);
+    EXPECT_EQ(start(second), kServiceAlreadyRunning);
     EXPECT_EQ(services_.changeStartType(service.get(), ServiceStart::disabled), kSuccess);
-    EXPECT_EQ(settled(service), ServiceState::running) << "a new start type leaves the rest";
+    EXPECT_EQ(stateOf(service), ServiceState::running) << "a new start type leaves the rest";
     EXPECT_EQ(services_.stopService(service.get()), kSuccess);
-    EXPECT_EQ(settled(service), ServiceState::stopped);
+    EXPECT_EQ(stateOf(service), ServiceState::stopped);
     EXPECT_EQ(services_.stopService(second.get()), kServiceNotActive);
     EXPECT_EQ(services_.changeStartType(service.get(), ServiceStart::automatic), kSuccess);
-    EXPECT_EQ(services_.startService(service.get()), kSuccess) << "and its program";
-    EXPECT_EQ(settled(service), ServiceState::running);
+    EXPECT_EQ(start(service), kSuccess) << "and its program";
+    EXPECT_EQ(stateOf(service), ServiceState::running);
     EXPECT_EQ(services_.stopService(service.get()), kSuccess);
-    EXPECT_EQ(settled(service), ServiceState::stopped);
+    EXPECT_EQ(stateOf(service), ServiceState::stopped);
 
     EXPECT_EQ(services_.deleteService(service.get()), kSuccess);
     EXPECT_EQ(services_.deleteService(second.get()), kServiceMarkedForDelete);
     EXPECT_EQ(services_.changeStartType(second.get(), ServiceStart::demand), kServiceMarkedForDelete);
-    EXPECT_EQ(services_.startService(second.get()), kServiceMarkedForDelete);
+    if (!backend_->differences().startsDeletedServices) {
+        EXPECT_EQ(start(second), kServiceMarkedForDelete);
+    }
     service.reset();
+    EXPECT_EQ(create(service, kName, backend_->program()), kServiceMarkedForDelete) << "while it is open elsewhere";
     second.reset();
     EXPECT_EQ(open(kName, service), kServiceDoesNotExist);
     EXPECT_EQ(create(service, kName, backend_->program()), kSuccess) << "its name is free again";
@@ -85,24 +105,16 @@ TEST_P(ServicesContract, AServiceIsMadeFoundRunAndDeleted) {
 TEST_P(ServicesContract, AStartWithoutItsProgramFindsNoFile) {
     OwnedService service(services_);
     ASSERT_EQ(create(service, kName, backend_->folder() + "\\absent.exe"), kSuccess);
-    EXPECT_EQ(services_.startService(service.get()), kFileNotFound);
-    EXPECT_EQ(settled(service), ServiceState::stopped);
+    EXPECT_EQ(start(service), kFileNotFound);
+    EXPECT_EQ(stateOf(service), ServiceState::stopped);
 }
 
 TEST_P(ServicesContract, NamesThatNoServiceCanHave) {
-    // clang-format off
-    const struct { const char* why; std::string name; Status created; Status opened; } rows[] = {
-        {"empty",            "",                    kInvalidName, kInvalidName},
-        {"a slash",          "a/b",                 kInvalidName, kInvalidName},
-        {"a backslash",      "a\\b",                kInvalidName, kInvalidName},
-        {"257 characters",   std::string(257, 's'), kInvalidName, kInvalidName},
-    };
-    // clang-format on
-    for (const auto& row : rows) {
+    for (const std::string& name : {std::string(), std::string("a/b"), std::string("a\\b"), std::string(257, 's')}) {
         OwnedService service(services_);
-        EXPECT_EQ(create(service, row.name, backend_->program()), row.created) << row.why;
-        EXPECT_EQ(open(row.name, service), row.opened) << row.why;
-        EXPECT_FALSE(service) << row.why;
+        EXPECT_EQ(create(service, name, backend_->program()), kInvalidName) << name;
+        EXPECT_EQ(open(name, service), kInvalidName) << name;
+        EXPECT_FALSE(service) << name;
     }
 }
 

@@ -1,5 +1,6 @@
 #include "install/admin/key_name.h"
 
+#include "install/platform/registry_path.h"
 #include "install/platform/text.h"
 
 namespace kz7 {
@@ -34,14 +35,15 @@ bool parseKeyName(std::string_view text, KeyName& name) {
 }
 
 KeyName typedKeyName(std::string_view text) {
-    while (!text.empty() && text.back() == '\\') {
-        text.remove_suffix(1);
+    std::string names;
+    for (std::string_view name; takeName(text, name);) {
+        names.append(names.empty() ? "" : "\\").append(name);
     }
-    KeyName name;
-    if (!parseKeyName(text, name)) {
-        name = {KeyHandle::localMachine, std::string(text)};
+    KeyName typed;
+    if (!parseKeyName(names, typed)) {
+        typed = {KeyHandle::localMachine, std::move(names)};
     }
-    return name;
+    return typed;
 }
 
 std::string fullKeyName(const KeyName& name) {

@@ -20,8 +20,8 @@ struct KeyName {
 // not matter. False when the text begins with no root.
 bool parseKeyName(std::string_view text, KeyName& name);
 
-// The same for what a person types: without a root it lies below HKEY_LOCAL_MACHINE, and separators at its
-// end do not count.
+// The same for what a person types: without a root it lies below HKEY_LOCAL_MACHINE, and only separators
+// between names count, a run of them as one.
 KeyName typedKeyName(std::string_view text);
 
 // With the root's full name.

@@ -78,15 +78,15 @@ private:
     std::string data_ = std::string(4096, '\0');
 };
 
-// The keys that one of kProductKeys stands for; kFileNotFound where not even their parent is there.
-Status addMatches(IRegistryStore& registry, std::string_view pattern, std::vector<KeyStart>& starts) {
-    const std::size_t cut = pattern.find_last_of('\\');
-    const std::string parent(pattern.substr(0, cut + 1));
-    std::string last = foldUpper(pattern.substr(cut + 1));
-    const bool prefix = last.ends_with('*');
-    last.resize(last.size() - (prefix ? 1 : 0));
+// The keys that a path stands for, the last name in the store's spelling; kFileNotFound where not even their
+// parent is there.
+Status addMatches(IRegistryStore& registry, KeyHandle root, std::string_view path, bool prefix,
+                  std::vector<KeyStart>& starts) {
+    const std::size_t cut = path.find_last_of('\\') + 1;
+    const std::string parent(path.substr(0, cut));
+    const std::string last = foldUpper(path.substr(cut));
     OwnedKey key(registry);
-    Status status = registry.openKey(KeyHandle::localMachine, parent.substr(0, cut), kKeyWalk, key.receive());
+    Status status = registry.openKey(root, path.substr(0, cut == 0 ? 0 : cut - 1), kKeyWalk, key.receive());
     std::vector<Subkey> subkeys;
     if (status == kSuccess) {
         status = Reader(registry).subkeys(key.get(), subkeys);
@@ -94,7 +94,7 @@ Status addMatches(IRegistryStore& registry, std::string_view pattern, std::vecto
     for (Subkey& subkey : subkeys) {
         const std::string fold = foldUpper(subkey.name);
         if (prefix ? fold.starts_with(last) : fold == last) {
-            starts.push_back({{KeyHandle::localMachine, parent + subkey.name}, std::move(subkey.keyClass)});
+            starts.push_back({{root, parent + subkey.name}, std::move(subkey.keyClass)});
         }
     }
     return status;
@@ -113,35 +113,16 @@ bool isBareRoot(const KeyRecord& record) {
     return record.values.empty() && record.name.find('\\') == std::string::npos;
 }
 
-// Follows the path name by name, so that it comes out in the store's own spelling with the last one's class.
 Status findKey(IRegistryStore& registry, const KeyName& name, KeyStart& start) {
-    Reader reader(registry);
-    KeyStart found{{name.root, {}}, {}};
     OwnedKey key(registry);
-    Status status = registry.openKey(name.root, {}, kKeyWalk, key.receive());
-    std::string_view rest = name.path;
-    for (std::string_view part; status == kSuccess && takeName(rest, part);) {
-        std::vector<Subkey> siblings;
-        status = reader.subkeys(key.get(), siblings);
-        OwnedKey below(registry);
-        if (status == kSuccess) {
-            status = registry.openKey(key.get(), part, kKeyWalk, below.receive());
-        }
-        if (status == kSuccess) {
-            // A host that folds more letters than ours may know the key by another spelling.
-            Subkey spelled{std::string(part), {}};
-            const auto same = std::find_if(siblings.begin(), siblings.end(),
-                                           [&](const Subkey& subkey) { return equalsIgnoreCase(subkey.name, part); });
-            if (same != siblings.end()) {
-                spelled = *same;
-            }
-            found.name.path.append(found.name.path.empty() ? "" : "\\").append(spelled.name);
-            found.keyClass = std::move(spelled.keyClass);
-            key = std::move(below);
-        }
+    Status status = registry.openKey(name.root, name.path, kKeyWalk, key.receive());
+    std::vector<KeyStart> found;
+    if (status == kSuccess && !name.path.empty()) {
+        status = addMatches(registry, name.root, name.path, false, found);
     }
     if (status == kSuccess) {
-        start = std::move(found);
+        // None where the host folds more letters than we do.
+        start = found.empty() ? KeyStart{name, {}} : std::move(found.front());
     }
     return status;
 }
@@ -152,8 +133,11 @@ Status findEverything(IRegistryStore& registry, bool storeIsOwn, std::vector<Key
         return kSuccess;
     }
     std::vector<KeyStart> found;
-    for (const std::string_view path : kProductKeys) {
-        if (const Status status = addMatches(registry, path, found); status != kSuccess && !isNotFound(status)) {
+    for (std::string_view path : kProductKeys) {
+        const bool prefix = path.ends_with('*');
+        path.remove_suffix(prefix ? 1 : 0);
+        const Status status = addMatches(registry, KeyHandle::localMachine, path, prefix, found);
+        if (status != kSuccess && !isNotFound(status)) {
             return status;
         }
     }

@@ -30,7 +30,8 @@ bool isBareRoot(const KeyRecord& record);
 // Anything but kSuccess ends the walk with that status.
 using KeyVisitor = std::function<Status(const KeyRecord&)>;
 
-// Where a walk begins: one key, spelled as the store spells it, and its class.
+// Where a walk begins: one key, its own name spelled as the store spells it and its parents' as they were
+// asked for, and its class.
 struct KeyStart {
     KeyName name;
     std::string keyClass;

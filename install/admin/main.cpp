@@ -3,6 +3,8 @@
 #include <exception>
 #include <new>
 
+#include "install/admin/aliases_command.h"
+#include "install/admin/copies_command.h"
 #include "install/admin/export_command.h"
 #include "install/admin/import_command.h"
 #include "install/admin/tree_command.h"
@@ -16,6 +18,8 @@ int run(int argc, char** argv) {
     program.add_option("--store", admin.storeDirectory, "The state directory to use instead of the usual one");
     program.require_subcommand(0, 1);
     program.fallthrough();
+    addAliasesCommand(program, admin);
+    addCopiesCommand(program, admin);
     addExportCommand(program, admin);
     addImportCommand(program, admin);
     addTreeCommand(program, admin);

@@ -12,6 +12,7 @@ namespace kz7 {
 // The manager or one service, open; they are closed alike.
 enum class ServiceHandle : std::uint64_t { none = 0 };
 
+inline constexpr std::uint32_t kServiceManagerConnect = 0x0001;
 inline constexpr std::uint32_t kServiceManagerAllAccess = 0xF003F;
 inline constexpr std::uint32_t kServiceAllAccess = 0xF01FF;
 inline constexpr std::uint32_t kServiceChangeConfig = 0x0002;
@@ -31,6 +32,13 @@ enum class ServiceState : std::uint32_t {
     stopPending = 3,
     running = 4,
 };
+
+inline constexpr std::size_t kMaxServiceName = 256;
+
+// What a store of our own takes for a service's name; on Windows the system judges it.
+constexpr bool isServiceName(std::string_view name) {
+    return !name.empty() && name.size() <= kMaxServiceName && name.find_first_of("/\\") == std::string_view::npos;
+}
 
 // A service that runs as LocalSystem in a process of its own, without load order group or dependencies.
 struct ServiceDefinition {
@@ -52,7 +60,8 @@ public:
     virtual Status openManager(std::uint32_t access, ServiceHandle& manager) = 0;
 
     // kServiceExists: there is one of that name. kInvalidName: an empty name, one over 256 characters or with
-    // a slash of either kind. kDuplicateServiceName: its display name is taken, on a host that judges it.
+    // a slash of either kind. kServiceMarkedForDelete: one of that name was deleted, a handle of it is still
+    // open. kDuplicateServiceName: its display name is taken, on a host that judges it.
     virtual Status createService(ServiceHandle manager, const ServiceDefinition& definition,
                                  ServiceHandle& service) = 0;
 

@@ -21,7 +21,9 @@ Status StandardConsole::writeOutput(std::string_view text) {
 
 Status StandardConsole::writeError(std::string_view text) {
     flush();
-    return write(stderr, text);
+    const Status status = write(stderr, text);
+    // Some hosts buffer this stream too, once it is led into a file.
+    return std::fflush(stderr) == 0 ? status : kWriteFault;
 }
 
 Status StandardConsole::flush() {

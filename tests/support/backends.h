@@ -16,7 +16,8 @@ struct Differences {
     bool ordersValuesByName = false;     // instead of by when they were first set
     bool ordersKeysByLowerCase = false;  // "_" before the letters
     bool foldsBeyondAscii = false;       // names that differ in the case of other letters are one
-    bool endsTexts = false;              // adds a NUL to a text that was stored without one
+    bool passesClassesOn = false;        // to new parents, and to the key when it is there already
+    bool startsDeletedServices = false;  // while they are still open
 };
 
 class Backend {

@@ -13,7 +13,11 @@ public:
     Differences differences() const override {
         const HMODULE system = GetModuleHandleA("ntdll.dll");
         const bool wine = system != nullptr && GetProcAddress(system, "wine_get_version") != nullptr;
-        return {.ordersValuesByName = wine, .ordersKeysByLowerCase = wine, .foldsBeyondAscii = true, .endsTexts = true};
+        return {.ordersValuesByName = wine,
+                .ordersKeysByLowerCase = wine,
+                .foldsBeyondAscii = true,
+                .passesClassesOn = wine,
+                .startsDeletedServices = wine};
     }
     std::string folder() override { return childProgram().substr(0, childProgram().rfind('\\')); }
     std::string program() override { return folder() + "\\kz7_test_service.exe"; }

@@ -1,12 +1,14 @@
 #include "install/platform/embedded/services.h"
 
+#include <algorithm>
 #include <array>
+
+#include "install/platform/text.h"
 
 namespace kz7 {
 namespace {
 
 constexpr std::string_view kServices = "SYSTEM\\CurrentControlSet\\Services\\";
-constexpr std::size_t kMaxServiceName = 256;
 
 constexpr std::string_view kStart = "Start";
 constexpr std::string_view kImagePath = "ImagePath";
@@ -30,7 +32,7 @@ std::string terminated(std::string_view text) {
 EmbeddedServiceManager::EmbeddedServiceManager(IRegistryStore& registry, IFileSystem& files)
     : registry_(registry), files_(files) {}
 
-ServiceHandle EmbeddedServiceManager::giveOut(std::string recordPath) {
+ServiceHandle EmbeddedServiceManager::giveOut(std::string recordPath, std::uint32_t access) {
     std::size_t slot = 0;
     while (slot < open_.size() && open_[slot].used) {
         ++slot;
@@ -38,7 +40,7 @@ ServiceHandle EmbeddedServiceManager::giveOut(std::string recordPath) {
     if (slot == open_.size()) {
         open_.emplace_back();
     }
-    open_[slot] = {true, std::move(recordPath)};
+    open_[slot] = {true, std::move(recordPath), access};
     return static_cast<ServiceHandle>(slot + 1);
 }
 
@@ -52,17 +54,24 @@ Status EmbeddedServiceManager::managerOf(ServiceHandle handle) {
     return open == nullptr || !open->recordPath.empty() ? kInvalidHandle : kSuccess;
 }
 
-Status EmbeddedServiceManager::recordOf(ServiceHandle handle, AccessMask access, OwnedKey& record) {
+Status EmbeddedServiceManager::recordOf(ServiceHandle handle, std::uint32_t needed, OwnedKey& record) {
     const Open* open = slotOf(handle);
     if (open == nullptr || open->recordPath.empty()) {
         return kInvalidHandle;
     }
-    const Status status = registry_.openKey(KeyHandle::localMachine, open->recordPath, access, record.receive());
+    if ((open->access & needed) != needed) {
+        return kAccessDenied;
+    }
+    if (open->deleted) {
+        return kServiceMarkedForDelete;
+    }
+    const Status status =
+        registry_.openKey(KeyHandle::localMachine, open->recordPath, kKeyQueryValue | kKeySetValue, record.receive());
     return isNotFound(status) ? kServiceMarkedForDelete : status;
 }
 
-Status EmbeddedServiceManager::openManager(std::uint32_t, ServiceHandle& manager) {
-    manager = giveOut({});
+Status EmbeddedServiceManager::openManager(std::uint32_t access, ServiceHandle& manager) {
+    manager = giveOut({}, access);
     return kSuccess;
 }
 
@@ -71,11 +80,16 @@ Status EmbeddedServiceManager::createService(ServiceHandle manager, const Servic
     if (const Status status = managerOf(manager); status != kSuccess) {
         return status;
     }
-    if (definition.name.empty() || definition.name.size() > kMaxServiceName ||
-        definition.name.find_first_of("/\\") != std::string_view::npos) {
+    if (!isServiceName(definition.name)) {
         return kInvalidName;
     }
     const std::string path = std::string(kServices) + std::string(definition.name);
+    const bool stillOpen = std::any_of(open_.begin(), open_.end(), [&](const Open& open) {
+        return open.deleted && equalsIgnoreCase(open.recordPath, path);
+    });
+    if (stillOpen) {
+        return kServiceMarkedForDelete;
+    }
     OwnedKey record(registry_);
     Status status = registry_.openKey(KeyHandle::localMachine, path, kKeyQueryValue, record.receive());
     if (status == kSuccess) {
@@ -103,17 +117,17 @@ Status EmbeddedServiceManager::createService(ServiceHandle manager, const Servic
         }
     }
     if (status == kSuccess) {
-        service = giveOut(path);
+        service = giveOut(path, kServiceAllAccess);
     }
     return status;
 }
 
-Status EmbeddedServiceManager::openService(ServiceHandle manager, std::string_view name, std::uint32_t,
+Status EmbeddedServiceManager::openService(ServiceHandle manager, std::string_view name, std::uint32_t access,
                                            ServiceHandle& service) {
     if (const Status status = managerOf(manager); status != kSuccess) {
         return status;
     }
-    if (name.empty() || name.find_first_of("/\\") != std::string_view::npos) {
+    if (!isServiceName(name)) {
         return kInvalidName;
     }
     const std::string path = std::string(kServices) + std::string(name);
@@ -122,13 +136,13 @@ Status EmbeddedServiceManager::openService(ServiceHandle manager, std::string_vi
     if (status != kSuccess) {
         return isNotFound(status) ? kServiceDoesNotExist : status;
     }
-    service = giveOut(path);
+    service = giveOut(path, access);
     return kSuccess;
 }
 
 Status EmbeddedServiceManager::changeStartType(ServiceHandle service, ServiceStart start) {
     OwnedKey record(registry_);
-    const Status status = recordOf(service, kKeySetValue, record);
+    const Status status = recordOf(service, kServiceChangeConfig, record);
     return status != kSuccess
                ? status
                : registry_.setValue(record.get(), kStart, ValueType::dword, bytesOf(static_cast<std::uint32_t>(start)));
@@ -149,7 +163,7 @@ Status EmbeddedServiceManager::state(KeyHandle record, ServiceState& state) {
 Status EmbeddedServiceManager::startService(ServiceHandle service) {
     OwnedKey record(registry_);
     ServiceState now{};
-    Status status = recordOf(service, kKeyQueryValue | kKeySetValue, record);
+    Status status = recordOf(service, kServiceStartRight, record);
     if (status == kSuccess) {
         status = state(record.get(), now);
     }
@@ -172,7 +186,7 @@ Status EmbeddedServiceManager::startService(ServiceHandle service) {
 Status EmbeddedServiceManager::stopService(ServiceHandle service) {
     OwnedKey record(registry_);
     ServiceState now{};
-    Status status = recordOf(service, kKeyQueryValue | kKeySetValue, record);
+    Status status = recordOf(service, kServiceStop, record);
     if (status == kSuccess) {
         status = state(record.get(), now);
     }
@@ -184,7 +198,7 @@ Status EmbeddedServiceManager::stopService(ServiceHandle service) {
 
 Status EmbeddedServiceManager::queryState(ServiceHandle service, ServiceState& state) {
     OwnedKey record(registry_);
-    const Status status = recordOf(service, kKeyQueryValue, record);
+    const Status status = recordOf(service, kServiceQueryStatus, record);
     return status != kSuccess ? status : this->state(record.get(), state);
 }
 
@@ -209,8 +223,18 @@ Status EmbeddedServiceManager::deleteRecord(const std::string& path) {
 
 Status EmbeddedServiceManager::deleteService(ServiceHandle service) {
     OwnedKey record(registry_);
-    const Status status = recordOf(service, kKeyQueryValue, record);
-    return status != kSuccess ? status : deleteRecord(slotOf(service)->recordPath);
+    Status status = recordOf(service, kServiceDelete, record);
+    if (status != kSuccess) {
+        return status;
+    }
+    const std::string path = slotOf(service)->recordPath;
+    status = deleteRecord(path);
+    if (status == kSuccess) {
+        for (Open& open : open_) {
+            open.deleted = open.deleted || equalsIgnoreCase(open.recordPath, path);
+        }
+    }
+    return status;
 }
 
 Status EmbeddedServiceManager::closeHandle(ServiceHandle handle) {

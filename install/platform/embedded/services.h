@@ -32,12 +32,15 @@ private:
     struct Open {
         bool used = false;
         std::string recordPath;  // empty: the manager
+        std::uint32_t access = 0;
+        bool deleted = false;
     };
 
-    ServiceHandle giveOut(std::string recordPath);
+    ServiceHandle giveOut(std::string recordPath, std::uint32_t access);
     Open* slotOf(ServiceHandle handle);
     Status managerOf(ServiceHandle handle);
-    Status recordOf(ServiceHandle handle, AccessMask access, OwnedKey& record);
+    // The record behind a handle that has the right needed.
+    Status recordOf(ServiceHandle handle, std::uint32_t needed, OwnedKey& record);
     Status state(KeyHandle record, ServiceState& state);
     Status deleteRecord(const std::string& path);
 

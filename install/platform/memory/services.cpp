@@ -1,18 +1,10 @@
 #include "install/platform/memory/services.h"
 
+#include <algorithm>
+
 #include "install/platform/text.h"
 
 namespace kz7 {
-namespace {
-
-constexpr std::size_t kMaxServiceName = 256;
-
-bool isServiceName(std::string_view name) {
-    return !name.empty() && name.size() <= kMaxServiceName && name.find_first_of("/\\") == std::string_view::npos;
-}
-
-}  // namespace
-
 MemoryServiceManager::MemoryServiceManager(IFileSystem& files) : files_(files) {}
 
 ServiceHandle MemoryServiceManager::giveOut(std::shared_ptr<Service> service, std::uint32_t access) {
@@ -21,7 +13,7 @@ ServiceHandle MemoryServiceManager::giveOut(std::shared_ptr<Service> service, st
     return handle;
 }
 
-Status MemoryServiceManager::managerOf(ServiceHandle handle, std::uint32_t) const {
+Status MemoryServiceManager::managerOf(ServiceHandle handle) const {
     const auto open = open_.find(handle);
     return open == open_.end() || open->second.service != nullptr ? kInvalidHandle : kSuccess;
 }
@@ -49,11 +41,18 @@ Status MemoryServiceManager::openManager(std::uint32_t access, ServiceHandle& ma
 
 Status MemoryServiceManager::createService(ServiceHandle manager, const ServiceDefinition& definition,
                                            ServiceHandle& service) {
-    if (const Status status = managerOf(manager, 0); status != kSuccess) {
+    if (const Status status = managerOf(manager); status != kSuccess) {
         return status;
     }
     if (!isServiceName(definition.name)) {
         return kInvalidName;
+    }
+    const bool stillOpen = std::any_of(open_.begin(), open_.end(), [&](const auto& open) {
+        const Service* held = open.second.service.get();
+        return held != nullptr && held->deleted && equalsIgnoreCase(held->name, definition.name);
+    });
+    if (stillOpen) {
+        return kServiceMarkedForDelete;
     }
     std::shared_ptr<Service>& slot = services_[foldUpper(definition.name)];
     if (slot != nullptr) {
@@ -72,7 +71,7 @@ Status MemoryServiceManager::createService(ServiceHandle manager, const ServiceD
 
 Status MemoryServiceManager::openService(ServiceHandle manager, std::string_view name, std::uint32_t access,
                                          ServiceHandle& service) {
-    if (const Status status = managerOf(manager, 0); status != kSuccess) {
+    if (const Status status = managerOf(manager); status != kSuccess) {
         return status;
     }
     if (!isServiceName(name)) {

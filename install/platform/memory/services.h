@@ -51,7 +51,7 @@ private:
     };
 
     ServiceHandle giveOut(std::shared_ptr<Service> service, std::uint32_t access);
-    Status managerOf(ServiceHandle handle, std::uint32_t needed) const;
+    Status managerOf(ServiceHandle handle) const;
     Status serviceOf(ServiceHandle handle, std::uint32_t needed, std::shared_ptr<Service>& service) const;
 
     IFileSystem& files_;

@@ -155,7 +155,7 @@ Status uninstall(::IAssemblyCache& cache, const std::wstring& name) {
 std::vector<std::wstring> providerFiles(std::string_view location) {
     const std::string folder = std::string(location) + (location.ends_with('\\') ? "bin\\" : "\\bin\\");
     std::vector<std::wstring> files;
-    if (!isFromRoot(folder)) {
+    if (!isAbsolutePath(folder)) {
         return files;
     }
     WIN32_FIND_DATAA found;

@@ -23,7 +23,7 @@ Status lastErrorOr(Status fallback) {
 }  // namespace
 
 Status WindowsLibraryLoader::load(std::string_view path, LibraryHandle& library) {
-    if (!isFromRoot(path)) {
+    if (!isAbsolutePath(path)) {
         return kModuleNotFound;
     }
     const HMODULE module = LoadLibraryExA(std::string(path).c_str(), nullptr, LOAD_WITH_ALTERED_SEARCH_PATH);

@@ -5,7 +5,9 @@
 
 namespace kz7 {
 
-constexpr bool isPathSeparator(char c) { return c == '\\' || c == '/'; }
+constexpr bool isPathSeparator(char c) {
+    return c == '\\' || c == '/';
+}
 
 // A drive with its root, or a share. `\x` and `C:x` depend on the directory the process was started in.
 constexpr bool isAbsolutePath(std::string_view path) {

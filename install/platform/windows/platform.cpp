@@ -1,7 +1,11 @@
 // This machine's ports on Windows.
 #include "install/platform/platform.h"
 
+#include <fcntl.h>
+#include <io.h>
 #include <windows.h>
+
+#include <cstdio>
 
 #include "install/platform/standard_console.h"
 #include "install/platform/windows/assembly_cache.h"
@@ -60,9 +64,13 @@ private:
 
 }  // namespace
 
-std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions&) {
+std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options) {
     // Libraries that the system loads for itself are not taken from the current folder either.
     SetDllDirectoryA("");
+    if (options.plainStreams) {
+        _setmode(_fileno(stdin), _O_BINARY);
+        _setmode(_fileno(stdout), _O_BINARY);
+    }
     return std::make_unique<WindowsPlatform>();
 }
 

@@ -32,6 +32,9 @@ Status WindowsServiceManager::openManager(std::uint32_t access, ServiceHandle& m
 
 Status WindowsServiceManager::createService(ServiceHandle manager, const ServiceDefinition& definition,
                                             ServiceHandle& service) {
+    if (!isServiceName(definition.name)) {
+        return kInvalidName;
+    }
     return opened(
         CreateServiceA(native(manager), std::string(definition.name).c_str(),
                        std::string(definition.displayName).c_str(), kServiceAllAccess, definition.type,
@@ -42,6 +45,9 @@ Status WindowsServiceManager::createService(ServiceHandle manager, const Service
 
 Status WindowsServiceManager::openService(ServiceHandle manager, std::string_view name, std::uint32_t access,
                                           ServiceHandle& service) {
+    if (!isServiceName(name)) {
+        return kInvalidName;
+    }
     return opened(OpenServiceA(native(manager), std::string(name).c_str(), access), service);
 }
 

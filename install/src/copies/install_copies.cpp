@@ -35,7 +35,7 @@ Status readInstallCopies(RegistryValues& values, CopiesByName& byName, CopiesByV
     byVersion.clear();
     IRegistryStore& registry = values.registry();
     OwnedKey key(registry);
-    if (!succeeded(registry.openKey(KeyHandle::localMachine, layout::kCopies, kKeyReadSet, key.receive()))) {
+    if (!succeeded(registry.openKey(KeyHandle::localMachine, layout::kCopies, values.readAccess(), key.receive()))) {
         values.tell("Failed to open the registry key:%s", {layout::kCopies});
         return kFailed;
     }

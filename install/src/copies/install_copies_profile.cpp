@@ -6,12 +6,16 @@ namespace kz7 {
 namespace {
 
 constexpr std::uint32_t kAliasNameRoom = 100;  // bytes, the terminator included
-constexpr std::size_t kExactComponent = 4;     // a whole version text; shorter prefixes must go on behind a dot
+constexpr std::ptrdiff_t kWholeVersion = 4;    // components; any other prefix must go on behind a dot
 
 }  // namespace
 
 bool isAliasName(std::string_view name) {
     return !name.empty() && name.front() >= '0' && name.front() <= '9' && name.find("DEF") == std::string_view::npos;
+}
+
+bool isWholeVersion(std::string_view prefix) {
+    return std::count(prefix.begin(), prefix.end(), '.') + 1 == kWholeVersion;
 }
 
 std::vector<std::string> listAliases(IRegistryStore& registry, KeyHandle key) {
@@ -92,7 +96,7 @@ Status InstallCopiesProfile::generateProfileInfo() {
     for (const auto& copy : copiesByVersion_) {
         const std::string_view text = copy.first;
         const std::size_t shared = commonLength(text, lesser);
-        std::size_t component = 0;
+        std::ptrdiff_t component = 0;
         for (std::size_t end = 0; end <= text.size(); ++end) {
             end = std::min(text.find('.', end), text.size());
             ++component;
@@ -100,7 +104,7 @@ Status InstallCopiesProfile::generateProfileInfo() {
                 continue;  // the text before has this prefix too, and it answers alike
             }
             const std::string_view prefix = text.substr(0, end);
-            const bool exact = component == kExactComponent;
+            const bool exact = component == kWholeVersion;
             profileInfo_.insert_or_assign(
                 profileInfo_.end(), std::string(prefix),
                 nameFor(prefix,

@@ -17,6 +17,9 @@ using AliasMap = std::map<std::string, std::string>;  // version prefix or value
 // Whether a value of that name is an alias: it begins with a digit and "DEF" is nowhere in it.
 bool isAliasName(std::string_view name);
 
+// Whether a prefix stands for one whole version, so that only a copy of exactly that version answers to it.
+bool isWholeVersion(std::string_view prefix);
+
 // Names of the aliases that an open key holds, in its order. Deliberate: the walk ends at the first value name
 // that has 100 bytes or more; aliases listed behind it are left alone.
 std::vector<std::string> listAliases(IRegistryStore& registry, KeyHandle key);
@@ -24,7 +27,8 @@ std::vector<std::string> listAliases(IRegistryStore& registry, KeyHandle key);
 // Statuses are kSuccess or kFailed; what failed goes to the debugger output. An object may be run again.
 class InstallCopiesProfile {
 public:
-    InstallCopiesProfile(IRegistryStore& registry, IDebugOutput& debug) : values_(registry, debug) {}
+    InstallCopiesProfile(IRegistryStore& registry, IDebugOutput& debug, AccessMask readAccess = kKeyReadSet)
+        : values_(registry, debug, readAccess) {}
 
     // The whole rewrite. A failure before the first deletion changes nothing, one while deleting puts the
     // old aliases back, one while writing leaves what could be written.

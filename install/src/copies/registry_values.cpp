@@ -19,7 +19,7 @@ Status RegistryValues::open(std::string_view path, AccessMask access, OwnedKey& 
 
 std::string RegistryValues::query(std::string_view path, std::string_view name, std::string_view complaint) {
     OwnedKey key(registry_);
-    if (!succeeded(open(path, kKeyReadSet, key))) {
+    if (!succeeded(open(path, readAccess_, key))) {
         return {};
     }
     FixedBuffer<kValueRoom> data;

@@ -16,7 +16,9 @@ namespace kz7 {
 // Key paths are plain paths below the machine's root. Statuses are kSuccess or kFailed.
 class RegistryValues {
 public:
-    RegistryValues(IRegistryStore& registry, IDebugOutput& debug) : registry_(registry), debug_(debug) {}
+    // `readAccess` is what keys are opened with to be read; who only looks needs less than the flows ask for.
+    RegistryValues(IRegistryStore& registry, IDebugOutput& debug, AccessMask readAccess = kKeyReadSet)
+        : registry_(registry), debug_(debug), readAccess_(readAccess) {}
 
     // The value's data up to the first NUL, whatever its type. Empty on any failure, and for 100 characters
     // and more, so that a missing value and an empty one look alike. Both are one operation; they differ in
@@ -36,6 +38,7 @@ public:
     }
 
     IRegistryStore& registry() { return registry_; }
+    AccessMask readAccess() const { return readAccess_; }
 
 private:
     Status open(std::string_view path, AccessMask access, OwnedKey& key);
@@ -43,6 +46,7 @@ private:
 
     IRegistryStore& registry_;
     IDebugOutput& debug_;
+    AccessMask readAccess_;
 };
 
 }  // namespace kz7

@@ -1,0 +1,127 @@
+#include "install/admin/aliases_command.h"
+
+#include <CLI/CLI.hpp>
+#include <array>
+#include <map>
+#include <optional>
+
+#include "install/admin/text_table.h"
+#include "install/platform/text.h"
+#include "install/src/copies/install_copies_profile.h"
+#include "install/src/copy_layout.h"
+
+namespace kz7 {
+namespace {
+
+struct AliasRow {
+    std::string prefix;                               // as it is or would be spelled
+    std::array<std::optional<std::string>, 2> names;  // the copy that each view names
+    std::optional<std::string> should;                // none: the next rewrite deletes it
+    std::string version;                              // of the copy it should name
+    bool exact = false;
+};
+
+// The names compare as the registry compares them, ordered as the rewrite orders them.
+struct ByPrefix {
+    bool operator()(const std::string& left, const std::string& right) const {
+        return foldUpper(left) < foldUpper(right);
+    }
+};
+using AliasRows = std::map<std::string, AliasRow, ByPrefix>;
+
+AliasRow& rowOf(AliasRows& rows, std::string_view prefix) {
+    AliasRow& row = rows[std::string(prefix)];
+    row.prefix = row.prefix.empty() ? prefix : row.prefix;
+    return row;
+}
+
+// The aliases of one view, also those that the rewrite's own walk does not get to.
+Status readAliases(IRegistryStore& registry, std::string_view path, std::size_t view, AliasRows& rows) {
+    OwnedKey key(registry);
+    Status status = registry.openKey(KeyHandle::localMachine, path, kKeyRead, key.receive());
+    FixedBuffer<kMaxValueName + 1> name;
+    std::string room(1 << 20, '\0');
+    Buffer data(room.data(), static_cast<std::uint32_t>(room.size()));
+    for (std::uint32_t index = 0;
+         succeeded(status) && succeeded(status = registry.enumerateValue(key.get(), index, name, nullptr, &data));
+         ++index) {
+        if (isAliasName(name.text())) {
+            rowOf(rows, name.text()).names[view] = data.text();
+        }
+    }
+    return isNotFound(status) || isEndOfItems(status) ? kSuccess : status;
+}
+
+// What the rewrite would write; without the copies' key there is nothing.
+void computeAliases(Admin& admin, AliasRows& rows) {
+    InstallCopiesProfile profile(admin.registry(), admin.platform().debugOutput(), kKeyRead);
+    if (profile.generateInstallCopiesList() != kSuccess || profile.generateProfileInfo() != kSuccess) {
+        return;
+    }
+    for (const auto& [prefix, name] : profile.profileInfo()) {
+        AliasRow& row = rowOf(rows, prefix);
+        row.should = name;
+        row.exact = isWholeVersion(prefix);
+        const auto copy = profile.copiesByName().find(name);
+        row.version = copy == profile.copiesByName().end() ? std::string{} : copy->second.getVersion();
+    }
+}
+
+std::string why(const AliasRow& row) {
+    if (!row.should) {
+        return "no copy has such a version; the next rewrite deletes it";
+    }
+    if (row.version.empty()) {
+        return row.exact ? "no copy has exactly this version; written empty"
+                         : "no version goes on behind it; written empty";
+    }
+    return shownText(row.version) + (row.exact ? " is this version" : " is the highest that begins with it");
+}
+
+bool isAskedFor(std::string_view prefix, std::string_view asked) {
+    return asked.empty() || equalsIgnoreCase(prefix, asked) ||
+           (prefix.size() > asked.size() && prefix[asked.size()] == '.' &&
+            equalsIgnoreCase(prefix.substr(0, asked.size()), asked));
+}
+
+std::string shownName(const std::optional<std::string>& name) {
+    return !name ? "-" : name->empty() ? "(empty)" : shownText(*name);
+}
+
+Answer showAliases(Admin& admin, const std::string& asked) {
+    if (!admin.open(true)) {
+        return kAnswerFault;
+    }
+    AliasRows rows;
+    for (const auto& [path, view] : {std::pair{layout::kCopies, 0U}, {layout::kCopies32, 1U}}) {
+        if (const Status status = readAliases(admin.registry(), path, view, rows); !succeeded(status)) {
+            return admin.storeFault("the aliases cannot be read", status);
+        }
+    }
+    computeAliases(admin, rows);
+    if (admin.platform().storeFaultTold()) {
+        return kAnswerFault;
+    }
+    std::vector<TableRow> table = {{"PREFIX", "NATIVE", "32-BIT", "SHOULD BE", "WHY"}};
+    for (const auto& [key, row] : rows) {
+        if (isAskedFor(row.prefix, asked)) {
+            table.push_back({row.prefix.empty() ? "(default)" : shownText(row.prefix), shownName(row.names[0]),
+                             shownName(row.names[1]), shownName(row.should), why(row)});
+        }
+    }
+    if (table.size() == 1) {
+        return admin.no(shownText(admin.platform().storeName()) + ": there is no such alias and none is due");
+    }
+    return admin.write(admin.storeLine() + '\n' + tableText(table));
+}
+
+}  // namespace
+
+void addAliasesCommand(CLI::App& program, Admin& admin) {
+    auto* command = program.add_subcommand("aliases", "Show which copy each version prefix names and should name");
+    auto prefix = std::make_shared<std::string>();
+    command->add_option("PREFIX", *prefix, "Only this prefix and those that go on from it behind a dot");
+    command->callback([&admin, prefix] { admin.answer = [&admin, prefix] { return showAliases(admin, *prefix); }; });
+}
+
+}  // namespace kz7

@@ -1,0 +1,183 @@
+#include "install/admin/copies_command.h"
+
+#include <CLI/CLI.hpp>
+#include <array>
+#include <map>
+#include <optional>
+
+#include "install/admin/json_text.h"
+#include "install/admin/text_table.h"
+#include "install/platform/text.h"
+#include "install/src/copies/install_copies.h"
+#include "install/src/copy_layout.h"
+#include "install/src/registry_access.h"
+#include "install/src/services/management_service.h"
+
+namespace kz7 {
+namespace {
+
+struct View {
+    const char* name;
+    std::string_view copies;
+};
+constexpr std::array kViews = {View{"native", layout::kCopies}, View{"32-bit", layout::kCopies32}};
+
+struct CopyInView {
+    std::string location;
+    InstallCopyInfo info;
+};
+
+struct CopyRow {
+    std::string name;
+    std::array<std::optional<CopyInView>, kViews.size()> views;
+    std::string service;
+    std::string state;  // of the service, in words; empty: there is no such service
+};
+
+using CopyRows = std::map<std::string, CopyRow>;  // by upper-cased name
+
+std::string locationOf(IRegistryStore& registry, const std::string& path) {
+    OwnedKey key(registry);
+    FixedBuffer<10000> location;
+    const bool read = registry.openKey(KeyHandle::localMachine, path, kKeyRead, key.receive()) == kSuccess &&
+                      queryText(registry, key.get(), layout::kPathName, location) == kSuccess;
+    return read ? std::string(location.text()) : std::string{};
+}
+
+// A view without its key has no copies.
+Status readView(Admin& admin, std::size_t view, CopyRows& rows) {
+    IRegistryStore& registry = admin.registry();
+    const std::string_view copies = kViews[view].copies;
+    RegistryValues values(registry, admin.platform().debugOutput(), kKeyRead);
+    OwnedKey key(registry);
+    Status status = registry.openKey(KeyHandle::localMachine, copies, kKeyRead, key.receive());
+    FixedBuffer<kMaxKeyName + 1> name;
+    for (std::uint32_t index = 0;
+         succeeded(status) && succeeded(status = registry.enumerateKey(key.get(), index, name, nullptr)); ++index) {
+        CopyRow& row = rows[foldUpper(name.text())];
+        row.name = row.name.empty() ? std::string(name.text()) : row.name;
+        row.views[view] = {locationOf(registry, compose("%s\\%s", {copies, name.text()})),
+                           InstallCopyInfo(values, name.text(), copies)};
+    }
+    return isNotFound(status) || isEndOfItems(status) ? kSuccess : status;
+}
+
+std::string stateText(ServiceState state) {
+    switch (state) {
+        case ServiceState::stopped:
+            return "stopped";
+        case ServiceState::startPending:
+            return "starting";
+        case ServiceState::stopPending:
+            return "stopping";
+        case ServiceState::running:
+            return "running";
+    }
+    return "state " + std::to_string(static_cast<std::uint32_t>(state));
+}
+
+std::string stateOf(IServiceManager& services, ServiceHandle manager, const std::string& name) {
+    OwnedService service(services);
+    ServiceState state{};
+    Status status = services.openService(manager, name, kServiceQueryStatus, service.receive());
+    if (succeeded(status)) {
+        status = services.queryState(service.get(), state);
+    }
+    if (status == kServiceDoesNotExist || status == kInvalidName) {
+        return {};
+    }
+    return succeeded(status) ? stateText(state) : compose("unknown, error %u", {status});
+}
+
+Answer readCopies(Admin& admin, CopyRows& rows) {
+    for (std::size_t view = 0; view < kViews.size(); ++view) {
+        if (const Status status = readView(admin, view, rows); !succeeded(status)) {
+            return admin.storeFault("the copies cannot be read", status);
+        }
+    }
+    IServiceManager& services = admin.platform().services();
+    OwnedService manager(services);
+    const Status opened = services.openManager(kServiceManagerConnect, manager.receive());
+    for (auto& [fold, row] : rows) {
+        row.service = managementServiceName(row.name).view();
+        row.state =
+            succeeded(opened) ? stateOf(services, manager.get(), row.service) : compose("unknown, error %u", {opened});
+    }
+    return admin.platform().storeFaultTold() ? kAnswerFault : kAnswerYes;
+}
+
+std::string copiesText(const CopyRows& copies) {
+    std::vector<TableRow> table = {{"NAME", "VIEW", "VERSION", "VALID", "LOCATION", "SERVICE"}};
+    for (const auto& [fold, row] : copies) {
+        for (std::size_t view = 0; view < kViews.size(); ++view) {
+            if (const auto& copy = row.views[view]) {
+                table.push_back({shownText(row.name), kViews[view].name, shownText(copy->info.getVersion()),
+                                 copy->info.isValid() ? "yes" : "no",
+                                 copy->location.empty() ? "none" : shownText(copy->location),
+                                 row.state.empty() ? "none" : shownText(row.service) + " " + row.state});
+            }
+        }
+    }
+    return tableText(table);
+}
+
+void appendMember(const char* name, std::string_view narrow, std::string& json) {
+    json += ",\"";
+    json += name;
+    json += "\":";
+    appendJsonText(narrow, json);
+}
+
+std::string copiesJson(const CopyRows& copies, const std::string& store) {
+    std::string json = "{\"store\":";
+    appendJsonText(store, json);
+    json += ",\"copies\":[";
+    std::string_view separator = "\n";
+    for (const auto& [fold, row] : copies) {
+        for (std::size_t view = 0; view < kViews.size(); ++view) {
+            const auto& copy = row.views[view];
+            if (!copy) {
+                continue;
+            }
+            json += separator;
+            json += "{\"name\":";
+            appendJsonText(row.name, json);
+            appendMember("view", kViews[view].name, json);
+            appendMember("version", copy->info.getVersion(), json);
+            json += copy->info.isValid() ? ",\"valid\":true" : ",\"valid\":false";
+            appendMember("location", copy->location, json);
+            appendMember("service", row.state.empty() ? "" : row.service, json);
+            appendMember("state", row.state, json);
+            json += '}';
+            separator = ",\n";
+        }
+    }
+    return json + "]}\n";
+}
+
+Answer showCopies(Admin& admin, bool json) {
+    CopyRows copies;
+    if (!admin.open(true)) {
+        return kAnswerFault;
+    }
+    if (const Answer read = readCopies(admin, copies); read != kAnswerYes) {
+        return read;
+    }
+    const std::string store = admin.platform().storeName();
+    const Answer written = admin.write(json             ? copiesJson(copies, store)
+                                       : copies.empty() ? std::string{}
+                                                        : admin.storeLine() + '\n' + copiesText(copies));
+    return written != kAnswerYes || !copies.empty() ? written
+                                                    : admin.no(shownText(store) + ": there is no installed copy");
+}
+
+}  // namespace
+
+void addCopiesCommand(CLI::App& program, Admin& admin) {
+    auto* command = program.add_subcommand("copies", "Show the installed copies and their services");
+    auto json = std::make_shared<bool>(false);
+    command->add_flag("--json", *json, "Write JSON for programs");
+    command->callback([&admin, json] { admin.answer = [&admin, json] { return showCopies(admin, *json); }; });
+}
+
+}  // namespace kz7

@@ -1,0 +1,111 @@
+// The provider registration and what kz7admin tells of its result, with a real library and real programs.
+#include <gtest/gtest.h>
+
+#include <unistd.h>
+
+#include <filesystem>
+#include <fstream>
+
+#include "tests/support/state_directory.h"
+
+namespace kz7::test {
+namespace {
+
+class ProviderProgram : public testing::Test {
+protected:
+    ProviderProgram() {
+        std::filesystem::create_directories(store_.file("drive_c/KZ7"));
+        std::filesystem::copy(KZ7_SAMPLE_BIN, store_.file("drive_c/KZ7/bin"), std::filesystem::copy_options::recursive);
+        std::ofstream(store_.file("drive_c/KZ7/bin/KZ7NMPdata.DLL"));
+        std::ofstream(store_.file("drive_c/KZ7/bin/kz7nmpdata.txt"));
+    }
+
+    StateDirectory store_;
+};
+
+const std::string kPrefix = "install\\src\\uselvlkz7reg.cpp:";
+
+TEST_F(ProviderProgram, RegistersWhileItsProgramsUseTheStore) {
+    ASSERT_EQ(store_.tool({"-addKZ7Copy", "COPY1", "C:\\KZ7"}).exitCode, 0);
+    // Each program adds a copy of its own: it could not while its parent holds the store.
+    const std::string hook = programPath("kz7InstallReg") + " -addKZ7Copy CHILD 'C:\\child' && " +
+                             programPath("kz7admin") + " tree 'SOFTWARE\\Classes' | grep -q KZ7NMPdata";
+    const ProgramResult result = store_.tool({"-dotnet", "C:\\KZ7\\"}, {{"KZ7_SAMPLE_HOOK=" + hook}, {}});
+    EXPECT_EQ(result.exitCode, 0);
+    EXPECT_EQ(result.output,
+              "Level Returned: 9.1.0.0\n"
+              "C:\\KZ7\\bin\\kz7nmpcfg.exe -register -level 9.1.0 -kz7path C:\\KZ7\\\n"
+              "C:\\KZ7\\bin\\kz7nmpcfg_32.exe -register -level 9.1.0 -kz7path C:\\KZ7\\\n -migratev8 ");
+    EXPECT_EQ(result.error, "");
+    const std::string records =
+        "SOFTWARE\\Classes\\Installer\\Assemblies\\Global : KZ7NMPdata.DLL,level=\"9.1.0\","
+        "generation=\"";
+    const std::string dump = store_.dump();
+    for (const char* record : {"1", "2"}) {
+        EXPECT_NE(dump.find(records + record + "\" = 1:C:\\KZ7\\bin\\KZ7NMPdata.DLL\\x00\n"), std::string::npos)
+            << dump;
+    }
+    EXPECT_EQ(dump.find("kz7nmpdata.txt"), std::string::npos);
+}
+
+TEST_F(ProviderProgram, ProgramsThatRefuseAreToldAndNothingElse) {
+    const ProgramResult result = store_.tool({"-dotnet", "C:\\KZ7"}, {{"KZ7_SAMPLE_EXIT=5"}, {}});
+    EXPECT_EQ(result.exitCode, 255) << "no copies, no aliases";
+    EXPECT_EQ(result.error, kPrefix + "1677: kz7nmpcfg.exe returned an error. rc = 5\n" + kPrefix +
+                                "1697: kz7nmpcfg_32.exe returned an error. rc = 5\n");
+}
+
+TEST_F(ProviderProgram, NothingIsTakenFromTheCurrentFolder) {
+    const std::string parent = store_.file("drive_c");
+    const ProgramResult result = store_.tool({"-addv9", "KZ7", "C:\\KZ7"},
+                                             {{}, [&] { [[maybe_unused]] const int moved = chdir(parent.c_str()); }});
+    EXPECT_EQ(result.exitCode, 0);
+    EXPECT_EQ(result.error, kPrefix + "601: Unable to load KZ7\\bin\\kz7install64.dll\n" + kPrefix +
+                                "607: Unable to retrieve the version of the sqllib\n" + kPrefix +
+                                "1668: Failed to execute kz7nmpcfg.exe command.  rc = 5082\n" + kPrefix +
+                                "1689: Failed to execute kz7nmpcfg_32.exe command.  rc = 5082\n");
+    EXPECT_EQ(store_.dump().find("KZ7NMPdata"), std::string::npos);
+}
+
+TEST_F(ProviderProgram, CopiesAreShownWithTheirServicesAndAliasesWithWhatIsWrong) {
+    const std::string storeLine = store_.file("registry.db");
+    const ProgramResult none = store_.run("kz7admin", {"copies"});
+    EXPECT_EQ(none.exitCode, 1);
+    EXPECT_EQ(none.error, "kz7admin: " + storeLine + ": there is no installed copy\n");
+    EXPECT_EQ(store_.run("kz7admin", {"aliases"}).exitCode, 1);
+
+    store_.tool({"-addKZ7Copy", "COPY1", "C:\\KZ7"});
+    const std::string text =
+        "Windows Registry Editor Version 5.00\n"
+        "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies]\n\"8.2\"=\"GONE\"\n\"9.8.0\"=\"COPY1\"\n"
+        "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies\\five\\CurrentVersion]\n"
+        "\"Version\"=\"9\"\n\"Release\"=\"8\"\n\"Modification\"=\"0\"\n\"Fix Level\"=\"0.1\"\n"
+        "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies\\half]\n\"KZ7 Path Name\"=\"C:\\\\h\"\n";
+    std::ofstream(store_.file("more.reg")) << text;
+    ASSERT_EQ(store_.run("kz7admin", {"import", store_.file("more.reg")}).exitCode, 0);
+
+    EXPECT_EQ(store_.run("kz7admin", {"copies"}).output,
+              "store " + storeLine +
+                  "\n"
+                  "NAME   VIEW    VERSION    VALID  LOCATION  SERVICE\n"
+                  "COPY1  native  9.7.800.0  yes    C:\\KZ7    KZ7MGMTSVC_COPY1 stopped\n"
+                  "COPY1  32-bit  9.7.800.0  yes    C:\\KZ7    KZ7MGMTSVC_COPY1 stopped\n"
+                  "five   native  9.8.0.0.1  yes    none      none\n"
+                  "half   native  ...0       no     C:\\h      none\n");
+    const std::string json = store_.run("kz7admin", {"copies", "--json"}).output;
+    EXPECT_EQ(json.substr(0, json.find(",\n")),
+              "{\"store\":\"" + storeLine +
+                  "\",\"copies\":[\n{\"name\":\"COPY1\",\"view\":\"native\",\"version\":\"9.7.800.0\",\"valid\":true,"
+                  "\"location\":\"C:\\\\KZ7\",\"service\":\"KZ7MGMTSVC_COPY1\",\"state\":\"stopped\"}");
+    EXPECT_EQ(store_.run("kz7admin", {"aliases", "9.8"}).output,
+              "store " + storeLine +
+                  "\n"
+                  "PREFIX     NATIVE  32-BIT  SHOULD BE  WHY\n"
+                  "9.8        -       -       five       9.8.0.0.1 is the highest that begins with it\n"
+                  "9.8.0      COPY1   -       five       9.8.0.0.1 is the highest that begins with it\n"
+                  "9.8.0.0    -       -       (empty)    no copy has exactly this version; written empty\n"
+                  "9.8.0.0.1  -       -       (empty)    no version goes on behind it; written empty\n");
+}
+
+}  // namespace
+}  // namespace kz7::test
