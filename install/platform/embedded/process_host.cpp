@@ -365,10 +365,10 @@ Status EmbeddedProcessHost::spawn(const std::string& file, std::string_view prog
     argv.push_back(nullptr);
 
     SpawnPlan plan;
-    plan.openNull(STDIN_FILENO, O_RDONLY);
-    for (const auto& [stream, target] : {std::pair{start.output, STDOUT_FILENO}, {start.error, STDERR_FILENO}}) {
+    for (const auto& [stream, target] :
+         {std::pair{start.input, STDIN_FILENO}, {start.output, STDOUT_FILENO}, {start.error, STDERR_FILENO}}) {
         if (stream == StreamHandle::none) {
-            plan.openNull(target, O_WRONLY);
+            plan.openNull(target, target == STDIN_FILENO ? O_RDONLY : O_WRONLY);
         } else {
             plan.give(descriptorOf(stream), target);
         }
