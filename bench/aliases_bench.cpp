@@ -14,7 +14,9 @@
 #include <string>
 #include <utility>
 
+#include "install/platform/embedded/debug_output.h"
 #include "install/platform/embedded/registry.h"
+#include "install/platform/standard_console.h"
 #include "install/src/copies/install_copies_profile.h"
 
 namespace kz7 {
@@ -22,9 +24,10 @@ namespace {
 
 using SortedCopies = std::map<std::string, std::string>;  // version text -> name
 
-class SilentDebugOutput final : public IDebugOutput {
-public:
-    void write(std::string_view) override {}
+// The debugger output of this machine, which nobody listens to.
+struct Debug {
+    StandardConsole console;
+    EmbeddedDebugOutput output{console};
 };
 
 void require(bool condition, const char* what) {
@@ -46,7 +49,7 @@ public:
         }
         OwnedKey key(*registry);
         registry->createKey(KeyHandle::localMachine, layout::kCopies32, {}, kKeyFull, key.receive());
-        require(InstallCopiesProfile(*registry, debug_).run() == kSuccess && registry->commit() == kSuccess,
+        require(InstallCopiesProfile(*registry, debug_.output).run() == kSuccess && registry->commit() == kSuccess,
                 "the store cannot be laid out");
     }
     StoreWithCopies(const StoreWithCopies&) = delete;
@@ -74,7 +77,7 @@ private:
     }
 
     std::string directory_;
-    SilentDebugOutput debug_;
+    Debug debug_;
 };
 
 // Every prefix is given to the greatest text that has it: what no program can do without. Case is not looked
@@ -95,8 +98,8 @@ void onePass(const SortedCopies& copies, AliasMap& aliases) {
 void onePassOverSortedTexts(benchmark::State& state) {
     const StoreWithCopies store(state.range(0));
     const auto registry = store.open();
-    SilentDebugOutput debug;
-    InstallCopiesProfile profile(*registry, debug);
+    Debug debug;
+    InstallCopiesProfile profile(*registry, debug.output);
     require(profile.generateInstallCopiesList() == kSuccess, "no copies");
     SortedCopies copies;
     for (const auto& [text, copy] : profile.copiesByVersion()) {
@@ -116,8 +119,8 @@ void onePassOverSortedTexts(benchmark::State& state) {
 void aliasesComputed(benchmark::State& state) {
     const StoreWithCopies store(state.range(0));
     const auto registry = store.open();
-    SilentDebugOutput debug;
-    InstallCopiesProfile profile(*registry, debug);
+    Debug debug;
+    InstallCopiesProfile profile(*registry, debug.output);
     require(profile.generateInstallCopiesList() == kSuccess, "no copies");
     for (auto _ : state) {
         profile.generateProfileInfo();
@@ -128,10 +131,10 @@ void aliasesComputed(benchmark::State& state) {
 
 void aliasRewrite(benchmark::State& state) {
     const StoreWithCopies store(state.range(0));
-    SilentDebugOutput debug;
+    Debug debug;
     for (auto _ : state) {
         const auto registry = store.open();
-        require(InstallCopiesProfile(*registry, debug).run() == kSuccess && registry->commit() == kSuccess,
+        require(InstallCopiesProfile(*registry, debug.output).run() == kSuccess && registry->commit() == kSuccess,
                 "the rewrite failed");
     }
     state.SetComplexityN(state.range(0));

@@ -361,15 +361,5 @@ TEST(AliasRewriteUnderFaults, LeavesWhatTheStepThatFailedStatesAndNothingElse) {
     EXPECT_EQ(outcomes, expected);
 }
 
-TEST(AliasRewriteUnderFaults, EndsWhenNothingWorksAnyMore) {
-    sweepFaults(
-        true, staleAliases, [](FaultyMachine& machine) { return rewrite(machine); },
-        [](FaultyMachine& machine, Status status, const std::string& row) {
-            EXPECT_EQ(machine.registry_.openHandles(), 0U) << row;
-            const bool passed = machine.faults_.failed().empty() || machine.faults_.failed() == "closeKey";
-            EXPECT_TRUE(status == kFailed || passed) << row;
-        });
-}
-
 }  // namespace
 }  // namespace kz7::test

@@ -32,6 +32,9 @@ const SweptFlow kSwept[] = {
     {"removeOne", {"-removeKZ7Copy", "FIRST"}, 0},
     {"removeUnknown", {"-removeKZ7Copy", "NONE"}, 0},
     {"version8", {"-v8", "C:\\KZ8"}, 2},
+    {"version9", {"-v9", "C:\\KZ9"}, 0},
+    {"dotnet", {"-dotnet", "C:\\KZ9"}, 0},
+    {"addv9", {"-addv9", "THIRD", "C:\\third"}, 0},
 };
 
 TEST_P(FaultSweep, EndsSaysSoAndTouchesNothingElse) {

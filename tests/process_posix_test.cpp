@@ -52,6 +52,9 @@ struct Outcome {
     std::string output;
 
     bool operator==(const Outcome&) const = default;
+    friend std::ostream& operator<<(std::ostream& out, const Outcome& shown) {
+        return out << shown.status << ", exit code " << shown.code << ", " << shown.output;
+    }
 };
 
 Outcome outcomeOf(IProcessHost& host, const std::string& command, const char* directory = nullptr) {

@@ -5,13 +5,17 @@
 #include <string>
 
 #include "install/platform/assembly_cache.h"
+#include "install/platform/clock.h"
 #include "install/platform/console.h"
 #include "install/platform/debug_output.h"
 #include "install/platform/file_system.h"
+#include "install/platform/host_identity.h"
 #include "install/platform/library_loader.h"
+#include "install/platform/line_channel.h"
 #include "install/platform/process_host.h"
 #include "install/platform/registry_store.h"
 #include "install/platform/service_manager.h"
+#include "install/platform/terminal.h"
 #include "install/platform/threads.h"
 
 namespace kz7 {
@@ -37,6 +41,10 @@ public:
     virtual IThreads& threads() = 0;
     virtual ILibraryLoader& libraries() = 0;
     virtual IAssemblyCache& assemblies() = 0;
+    virtual ILineChannel& lines() = 0;
+    virtual IClock& clock() = 0;
+    virtual ITerminal& terminal() = 0;
+    virtual IHostIdentity& identity() = 0;
 
     // The store's name for people: the file it is kept in, or the machine's registry.
     virtual std::string storeName() = 0;

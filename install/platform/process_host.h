@@ -29,6 +29,7 @@ struct ProcessStart {
     std::string_view workingDirectory;  // empty: this process's own
     StreamHandle output;
     StreamHandle error;
+    StreamHandle input = StreamHandle::none;  // none: an empty standard input
 };
 
 // The caller closes both handles; a host without a handle for a main thread gives none.
@@ -65,7 +66,7 @@ public:
 
     virtual Status closeStream(StreamHandle stream) = 0;
 
-    // Starts a program, hidden, with this process's environment, the two streams and an empty standard input.
+    // Starts a program, hidden, with this process's environment and the streams.
     // A program path with blanks and no quotes is looked for piece by piece. kFileNotFound: no such program;
     // also, where the host has no drives, one it cannot execute. kBadDirectory: no such working directory.
     virtual Status startProcess(const ProcessStart& start, ProcessInformation& started) = 0;

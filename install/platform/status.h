@@ -15,9 +15,11 @@ inline constexpr Status kPathNotFound            = 3;     // a folder of a path 
 inline constexpr Status kTooManyOpenFiles        = 4;
 inline constexpr Status kAccessDenied            = 5;     // also: a key that still has subkeys, a right the handle lacks
 inline constexpr Status kInvalidHandle           = 6;
+inline constexpr Status kInvalidData             = 13;    // a file that holds something else than it should
 inline constexpr Status kOutOfMemory             = 14;
 inline constexpr Status kWriteFault              = 29;    // a stream does not take what is written
 inline constexpr Status kGeneralFailure          = 31;    // a device or resource failed in a way that has no number
+inline constexpr Status kEndOfFile               = 38;    // nothing is left to read
 inline constexpr Status kInvalidParameter        = 87;
 inline constexpr Status kBrokenPipe              = 109;   // every write end of a pipe that is read is closed
 inline constexpr Status kDiskFull                = 112;
@@ -47,15 +49,16 @@ inline constexpr Status kServiceMarkedForDelete  = 1072;
 inline constexpr Status kServiceExists           = 1073;
 inline constexpr Status kDuplicateServiceName    = 1078;
 inline constexpr Status kRevisionMismatch        = 1306;  // the store was written by a newer program
-inline constexpr Status kNoMemoryForThread       = 5002;
+inline constexpr Status kNoMemory                = 5002;  // the installer runtime has no memory for a thing of its own
 inline constexpr Status kNullArgument            = 5003;
 inline constexpr Status kNoProgramType           = 5005;  // a command that names no file of a known program type
 inline constexpr Status kBufferTooSmall          = 5006;
+inline constexpr Status kNoInstallerSession      = 5011;  // also: no message of that number
 inline constexpr Status kMissingItem             = 5021;  // the installer runtime's "not there"
 inline constexpr Status kNotExecuted             = 5030;  // a run that was waited for before it was executed
 inline constexpr Status kExitCodeUnavailable     = 5082;  // also: the program could not be started
 inline constexpr Status kThreadStartFailed       = 5111;
-inline constexpr Status kFailed                  = 0xFFFFFFFF;  // -1: the alias rewrite says no more
+inline constexpr Status kFailed                  = 0xFFFFFFFF;  // -1: observers and the alias rewrite say no more
 // clang-format on
 
 constexpr bool succeeded(Status status) {

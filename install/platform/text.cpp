@@ -4,6 +4,35 @@
 #include <cassert>
 
 namespace kz7 {
+namespace {
+
+// Hands out the pieces of the composed text in order; returns the number of placeholders.
+template <typename Append>
+std::size_t walkPattern(std::string_view pattern, std::span<const Insert> inserts, const Append& append) {
+    std::size_t placeholders = 0;
+    for (std::size_t at = 0; at < pattern.size();) {
+        const std::size_t percent = std::min(pattern.find('%', at), pattern.size());
+        const std::string_view mark = pattern.substr(percent, 2);
+        append(pattern.substr(at, percent - at));
+        at = percent + mark.size();
+        if (mark == "%%") {
+            append("%");
+        } else if (mark != "%s" && mark != "%d" && mark != "%u") {
+            append(mark.substr(0, 1));
+            at = percent + std::min<std::size_t>(mark.size(), 1);
+        } else if (placeholders++ >= inserts.size()) {
+            continue;
+        } else if (const auto* shown = std::get_if<std::string_view>(&inserts[placeholders - 1])) {
+            append(*shown);
+        } else {
+            const auto number = std::get<std::uint32_t>(inserts[placeholders - 1]);
+            append(mark == "%d" ? std::to_string(static_cast<std::int32_t>(number)) : std::to_string(number));
+        }
+    }
+    return placeholders;
+}
+
+}  // namespace
 
 std::string foldUpper(std::string_view text) {
     std::string folded(text);
@@ -19,32 +48,22 @@ bool equalsIgnoreCase(std::string_view left, std::string_view right) {
 std::string compose(std::string_view pattern, std::initializer_list<Insert> inserts) {
     std::string text;
     text.reserve(pattern.size() + 32 * inserts.size());
-    const auto* next = inserts.begin();
-    for (std::size_t at = 0; at < pattern.size();) {
-        const std::size_t percent = std::min(pattern.find('%', at), pattern.size());
-        const char kind = percent + 1 < pattern.size() ? pattern[percent + 1] : '\0';
-        const bool isPlaceholder = kind == '%' || kind == 's' || kind == 'd' || kind == 'u';
-        text += pattern.substr(at, percent - at + (isPlaceholder ? 0 : 1));
-        at = percent + (isPlaceholder ? 2 : 1);
-        if (!isPlaceholder) {
-            continue;
-        }
-        if (kind == '%') {
-            text += '%';
-            continue;
-        }
-        assert(next != inserts.end());
-        const Insert& insert = *next++;
-        if (const auto* shown = std::get_if<std::string_view>(&insert)) {
-            text += *shown;
-        } else if (kind == 'd') {
-            text += std::to_string(static_cast<std::int32_t>(std::get<std::uint32_t>(insert)));
-        } else {
-            text += std::to_string(std::get<std::uint32_t>(insert));
-        }
-    }
-    assert(next == inserts.end());
+    const std::size_t placeholders =
+        walkPattern(pattern, {inserts.begin(), inserts.size()}, [&text](std::string_view piece) { text += piece; });
+    assert(placeholders == inserts.size());
+    static_cast<void>(placeholders);
     return text;
+}
+
+std::size_t composeInto(char* room, std::size_t size, std::string_view pattern, std::span<const Insert> inserts) {
+    std::size_t length = 0;
+    walkPattern(pattern, inserts, [&](std::string_view piece) {
+        if (length < size) {
+            piece.copy(room + length, size - length);
+        }
+        length += piece.size();
+    });
+    return length;
 }
 
 }  // namespace kz7

@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <cstring>
 #include <initializer_list>
+#include <span>
 #include <string>
 #include <string_view>
 #include <variant>
@@ -59,5 +60,9 @@ using Insert = std::variant<std::string_view, std::uint32_t>;
 // The pattern with its placeholders replaced in order. Patterns are message texts of this system, never
 // foreign text; inserts are taken as they are. "%%" is a percent sign.
 std::string compose(std::string_view pattern, std::initializer_list<Insert> inserts);
+
+// The same into room of the caller's, cut to it, without a terminator; the result is the length of the whole.
+// A placeholder without an insert comes out empty, an insert without a placeholder is left out.
+std::size_t composeInto(char* room, std::size_t size, std::string_view pattern, std::span<const Insert> inserts);
 
 }  // namespace kz7

@@ -15,7 +15,7 @@ Status ureCreateThread(IThreads& threads, IReportSink& sink, void (*function)(vo
     }
     std::unique_ptr<ThreadStart> start(new (std::nothrow) ThreadStart{function, argument});
     if (start == nullptr) {
-        return failed(kNoMemoryForThread, 20, kOutOfMemory);
+        return failed(kNoMemory, 20, kOutOfMemory);
     }
     const Status status = threads.start(start, record->stackSize, record->id, record->handle);
     if (status != kSuccess) {

@@ -8,8 +8,6 @@
 
 namespace kz7 {
 
-inline constexpr std::uint32_t kTraceError = 0x4000001;  // the flag of every trace about threads and programs
-
 // A thread to start and, once started, its handle, which the starter closes.
 struct ThreadRecord {
     std::uint32_t id = 0;
@@ -18,7 +16,7 @@ struct ThreadRecord {
 };
 
 // Starts a thread that calls `function` with `argument`. kNullArgument: no function or no record;
-// kNoMemoryForThread; kThreadStartFailed: the system refused. Each is traced, with the system's error where
+// kNoMemory; kThreadStartFailed: the system refused. Each is traced, with the system's error where
 // there is one.
 Status ureCreateThread(IThreads& threads, IReportSink& sink, void (*function)(void*), void* argument,
                        ThreadRecord* record);

@@ -259,7 +259,7 @@ Status InstallProcess::startReader(OwnedStream& readEnd, Collected& text, Thread
     auto reader = std::make_unique<Reader>(Reader{host_, std::move(readEnd), text, stop_});
     const Status status = ureCreateThread(threads_, sink_, Reader::run, reader.get(), &record);
     if (status == kSuccess) {
-        reader.release();
+        static_cast<void>(reader.release());
     } else {
         text.reset();
     }

@@ -9,6 +9,8 @@
 
 namespace kz7 {
 
+inline constexpr std::uint32_t kTraceError = 0x4000001;  // the code of every trace
+
 // `function` is the qualified name of the reporting function ("InstallProcess::execute"), `probe` the step
 // in it (10, 20, ...). No operation fails; texts are the callee's only for the call. One thread.
 class IReportSink {

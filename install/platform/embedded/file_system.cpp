@@ -1,12 +1,53 @@
 #include "install/platform/embedded/file_system.h"
 
+#include <dirent.h>
+#include <fcntl.h>
 #include <unistd.h>
 
 #include <cerrno>
+#include <memory>
 
 #include "install/platform/embedded/paths.h"
 
 namespace kz7 {
+namespace {
+
+constexpr mode_t kLogFileMode = 0644;
+constexpr std::size_t kReadPiece = 64 * 1024;
+
+Status statusOf(int error) {
+    switch (error) {
+        case EACCES:
+        case EPERM:
+        case EROFS:
+        case EISDIR:
+        case ELOOP:
+            return kAccessDenied;
+        case ENOENT:
+        case ENOTDIR:
+            return kFileNotFound;
+        case EMFILE:
+        case ENFILE:
+            return kTooManyOpenFiles;
+        case EBADF:
+            return kInvalidHandle;
+        case ENOSPC:
+        case EDQUOT:
+        case EFBIG:
+            return kDiskFull;
+        case ENAMETOOLONG:
+            return kFilenameExceedsRange;
+        default:
+            return kGeneralFailure;
+    }
+}
+
+// No handle is 0.
+int descriptorOf(FileHandle file) {
+    return static_cast<int>(file) - 1;
+}
+
+}  // namespace
 
 EmbeddedFileSystem::EmbeddedFileSystem(std::string stateDirectory) : stateDirectory_(std::move(stateDirectory)) {}
 
@@ -19,6 +60,87 @@ Status EmbeddedFileSystem::probe(std::string_view path) {
         return kSuccess;
     }
     return errno == EACCES ? kAccessDenied : kFileNotFound;
+}
+
+Status EmbeddedFileSystem::readFile(std::string_view path, std::string& content) {
+    const std::string host = hostPath(path, stateDirectory_);
+    const int descriptor = host.empty() ? -1 : open(host.c_str(), O_RDONLY | O_CLOEXEC);
+    if (descriptor == -1) {
+        return host.empty() ? kFileNotFound : statusOf(errno);
+    }
+    std::string read;
+    ssize_t count = 0;
+    do {
+        const std::size_t length = read.size();
+        read.resize(length + kReadPiece);
+        count = ::read(descriptor, read.data() + length, kReadPiece);
+        read.resize(length + (count > 0 ? static_cast<std::size_t>(count) : 0));
+    } while (count > 0 || (count == -1 && errno == EINTR));
+    const Status status = count == -1 ? statusOf(errno) : kSuccess;
+    close(descriptor);
+    if (status == kSuccess) {
+        content = std::move(read);
+    }
+    return status;
+}
+
+Status EmbeddedFileSystem::openForAppend(std::string_view path, FileHandle& file) {
+    const std::string host = hostPath(path, stateDirectory_);
+    if (host.empty()) {
+        return kFileNotFound;
+    }
+    // A link that somebody left in a folder open to all is not followed.
+    const int descriptor = open(host.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC | O_NOFOLLOW, kLogFileMode);
+    if (descriptor == -1) {
+        return errno == ENOENT || errno == ENOTDIR ? kPathNotFound : statusOf(errno);
+    }
+    file = FileHandle{static_cast<std::uint64_t>(descriptor) + 1};
+    return kSuccess;
+}
+
+Status EmbeddedFileSystem::write(FileHandle file, std::string_view data, std::uint32_t& written) {
+    written = 0;
+    while (written < data.size()) {
+        const ssize_t count = ::write(descriptorOf(file), data.data() + written, data.size() - written);
+        if (count == -1 && errno != EINTR) {
+            return statusOf(errno);
+        }
+        written += count == -1 ? 0 : static_cast<std::uint32_t>(count);
+    }
+    return kSuccess;
+}
+
+Status EmbeddedFileSystem::closeFile(FileHandle file) {
+    return close(descriptorOf(file)) == 0 ? kSuccess : statusOf(errno);
+}
+
+Status EmbeddedFileSystem::findFile(std::string_view pattern, std::string& name) {
+    const std::string host = hostPath(pattern, stateDirectory_);
+    const std::size_t folder = host.find_last_of('/');
+    if (folder == std::string::npos) {
+        return kFileNotFound;
+    }
+    const std::unique_ptr<DIR, int (*)(DIR*)> entries(opendir(host.substr(0, folder + 1).c_str()), closedir);
+    if (entries == nullptr) {
+        return statusOf(errno);
+    }
+    std::string first;
+    while (const dirent* entry = readdir(entries.get())) {
+        if (fitsPattern(entry->d_name, std::string_view(host).substr(folder + 1)) &&
+            (first.empty() || entry->d_name < first)) {
+            first = entry->d_name;
+        }
+    }
+    if (first.empty()) {
+        return kFileNotFound;
+    }
+    name = std::move(first);
+    return kSuccess;
+}
+
+std::string EmbeddedFileSystem::shownPath(std::string_view path) {
+    const std::string host = hostPath(path, stateDirectory_);
+    return host.empty() ? std::string(path) : host;
 }
 
 }  // namespace kz7

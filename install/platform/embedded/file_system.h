@@ -12,6 +12,12 @@ public:
     explicit EmbeddedFileSystem(std::string stateDirectory);
 
     Status probe(std::string_view path) override;
+    Status readFile(std::string_view path, std::string& content) override;
+    Status openForAppend(std::string_view path, FileHandle& file) override;
+    Status write(FileHandle file, std::string_view data, std::uint32_t& written) override;
+    Status closeFile(FileHandle file) override;
+    Status findFile(std::string_view pattern, std::string& name) override;
+    std::string shownPath(std::string_view path) override;
 
 private:
     std::string stateDirectory_;

@@ -8,12 +8,16 @@
 #include <cstdlib>
 
 #include "install/platform/embedded/assembly_cache.h"
+#include "install/platform/embedded/clock.h"
 #include "install/platform/embedded/debug_output.h"
 #include "install/platform/embedded/file_system.h"
+#include "install/platform/embedded/host_identity.h"
 #include "install/platform/embedded/library_loader.h"
+#include "install/platform/embedded/line_channel.h"
 #include "install/platform/embedded/process_host.h"
 #include "install/platform/embedded/registry.h"
 #include "install/platform/embedded/services.h"
+#include "install/platform/embedded/terminal.h"
 #include "install/platform/embedded/threads.h"
 #include "install/platform/standard_console.h"
 
@@ -47,6 +51,10 @@ public:
     IThreads& threads() override { return threads_; }
     ILibraryLoader& libraries() override { return libraries_; }
     IAssemblyCache& assemblies() override { return assemblies_; }
+    ILineChannel& lines() override { return lines_; }
+    IClock& clock() override { return clock_; }
+    ITerminal& terminal() override { return terminal_; }
+    IHostIdentity& identity() override { return identity_; }
     std::string storeName() override { return registry_.path(); }
     bool storeIsOwn() override { return true; }
     bool storeFaultTold() override { return faultTold_; }
@@ -71,6 +79,10 @@ private:
     EmbeddedThreads threads_;
     EmbeddedLibraryLoader libraries_;
     EmbeddedAssemblyCache assemblies_;
+    EmbeddedLineChannel lines_;
+    EmbeddedClock clock_;
+    EmbeddedTerminal terminal_;
+    EmbeddedHostIdentity identity_;
 };
 
 }  // namespace

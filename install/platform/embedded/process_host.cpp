@@ -15,6 +15,7 @@
 #include <climits>
 #include <csignal>
 #include <cstdlib>
+#include <memory>
 #include <utility>
 #include <vector>
 
@@ -196,7 +197,8 @@ void waitWithin(pid_t id, std::uint32_t milliseconds) {
 // its own waits for one that runs on; it holds nothing of ours and ends with the child or with this process.
 void leaveToItself(pid_t id) {
     const auto take = [](void* given) -> void* {
-        waitForChild(static_cast<pid_t>(reinterpret_cast<std::intptr_t>(given)), nullptr, 0);
+        const std::unique_ptr<pid_t> child(static_cast<pid_t*>(given));
+        waitForChild(*child, nullptr, 0);
         return nullptr;
     };
     pthread_attr_t attributes;
@@ -204,25 +206,27 @@ void leaveToItself(pid_t id) {
         return;
     }
     pthread_attr_setdetachstate(&attributes, PTHREAD_CREATE_DETACHED);
+    auto child = std::make_unique<pid_t>(id);
     pthread_t thread{};
-    pthread_create(&thread, &attributes, take, reinterpret_cast<void*>(static_cast<std::intptr_t>(id)));
+    if (pthread_create(&thread, &attributes, take, child.get()) == 0) {
+        static_cast<void>(child.release());
+    }
     pthread_attr_destroy(&attributes);
 }
 
 }  // namespace
 
 void settleInheritedState() {
-    for (int descriptor = 0; descriptor < kFirstOwnDescriptor; ++descriptor) {
-        if (fcntl(descriptor, F_GETFD) == -1 && errno == EBADF) {
-            // The lowest free number is the one that is missing.
-            const int opened = open("/dev/null", O_RDWR);
-            if (opened == -1) {
-                return;
-            }
-        }
-    }
     // Where it is ignored, children vanish with their exit codes.
     std::signal(SIGCHLD, SIG_DFL);
+    // The lowest free number is the one that is missing.
+    int opened = 0;
+    do {
+        opened = open("/dev/null", O_RDWR);
+    } while (opened != -1 && opened < STDERR_FILENO);
+    if (opened > STDERR_FILENO) {
+        close(opened);
+    }
 }
 
 EmbeddedProcessHost::EmbeddedProcessHost(std::string stateDirectory)
@@ -354,16 +358,17 @@ Status EmbeddedProcessHost::spawn(const std::string& file, std::string_view prog
     std::vector<std::string> words = splitArguments(arguments);
     words.insert(words.begin(), std::string(program));
     std::vector<char*> argv;
+    argv.reserve(words.size() + 1);
     for (std::string& word : words) {
         argv.push_back(word.data());
     }
     argv.push_back(nullptr);
 
     SpawnPlan plan;
-    plan.openNull(STDIN_FILENO, O_RDONLY);
-    for (const auto& [stream, target] : {std::pair{start.output, STDOUT_FILENO}, {start.error, STDERR_FILENO}}) {
+    for (const auto& [stream, target] :
+         {std::pair{start.input, STDIN_FILENO}, {start.output, STDOUT_FILENO}, {start.error, STDERR_FILENO}}) {
         if (stream == StreamHandle::none) {
-            plan.openNull(target, O_WRONLY);
+            plan.openNull(target, target == STDIN_FILENO ? O_RDONLY : O_WRONLY);
         } else {
             plan.give(descriptorOf(stream), target);
         }

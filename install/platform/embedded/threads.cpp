@@ -53,7 +53,7 @@ Status EmbeddedThreads::start(std::unique_ptr<ThreadStart>& record, std::uint32_
         threads_.erase(handle);
         return kTooManyThreads;
     }
-    record.release();
+    static_cast<void>(record.release());
     id = ++lastId_;
     thread = handle;
     return kSuccess;

@@ -27,12 +27,70 @@ std::string keyOf(std::string_view path) {
 }  // namespace
 
 Status MemoryFileSystem::probe(std::string_view path) {
-    return paths_.contains(keyOf(path)) ? kSuccess : kFileNotFound;
+    return files_.contains(keyOf(path)) ? kSuccess : kFileNotFound;
 }
 
-void MemoryFileSystem::add(std::string_view path) {
+Status MemoryFileSystem::readFile(std::string_view path, std::string& content) {
+    const auto found = files_.find(keyOf(path));
+    if (found == files_.end()) {
+        return kFileNotFound;
+    }
+    content = found->second->content;
+    return kSuccess;
+}
+
+Status MemoryFileSystem::openForAppend(std::string_view path, FileHandle& file) {
+    const std::string key = keyOf(path);
+    if (key.empty()) {
+        return kFileNotFound;
+    }
+    const std::size_t name = key.find_last_of('\\');
+    if (name != 0 && name != std::string::npos && !files_.contains(key.substr(0, name))) {
+        return kPathNotFound;
+    }
+    add(path);
+    file = FileHandle{++lastHandle_};
+    open_.emplace(file, files_.at(key));
+    return kSuccess;
+}
+
+Status MemoryFileSystem::write(FileHandle file, std::string_view data, std::uint32_t& written) {
+    written = 0;
+    const auto found = open_.find(file);
+    if (found == open_.end()) {
+        return kInvalidHandle;
+    }
+    const std::string_view taken = data.substr(0, room);
+    found->second->content += taken;
+    room -= taken.size();
+    written = static_cast<std::uint32_t>(taken.size());
+    return taken.size() == data.size() ? kSuccess : kDiskFull;
+}
+
+Status MemoryFileSystem::closeFile(FileHandle file) {
+    return open_.erase(file) != 0 ? kSuccess : kInvalidHandle;
+}
+
+Status MemoryFileSystem::findFile(std::string_view pattern, std::string& name) {
+    const std::string key = keyOf(pattern);
+    for (const auto& [path, file] : files_) {
+        if (fitsPattern(path, key) && path.find_last_of('\\') == key.find_last_of('\\')) {
+            name = file->name;
+            return kSuccess;
+        }
+    }
+    return kFileNotFound;
+}
+
+void MemoryFileSystem::add(std::string_view path, std::string_view content) {
     for (std::string key = keyOf(path); !key.empty(); key.resize(key.find_last_of('\\'))) {
-        paths_.insert(key);
+        auto& file = files_[key];
+        if (file == nullptr) {
+            file = std::make_shared<File>(File{std::string(path.substr(path.find_last_of("\\/") + 1)), {}});
+        }
+        file->content += content;
+        content = {};
+        path = path.substr(0, path.find_last_of("\\/"));
         if (key.find('\\') == std::string::npos) {
             break;
         }
@@ -40,7 +98,13 @@ void MemoryFileSystem::add(std::string_view path) {
 }
 
 void MemoryFileSystem::remove(std::string_view path) {
-    paths_.erase(keyOf(path));
+    files_.erase(keyOf(path));
+}
+
+std::string MemoryFileSystem::content(std::string_view path) {
+    std::string text;
+    readFile(path, text);
+    return text;
 }
 
 }  // namespace kz7

@@ -2,13 +2,17 @@
 #pragma once
 
 #include "install/platform/memory/assembly_cache.h"
+#include "install/platform/memory/clock.h"
 #include "install/platform/memory/console.h"
 #include "install/platform/memory/debug_output.h"
 #include "install/platform/memory/file_system.h"
+#include "install/platform/memory/host_identity.h"
 #include "install/platform/memory/library_loader.h"
+#include "install/platform/memory/line_channel.h"
 #include "install/platform/memory/process_host.h"
 #include "install/platform/memory/registry.h"
 #include "install/platform/memory/services.h"
+#include "install/platform/memory/terminal.h"
 #include "install/platform/memory/threads.h"
 #include "install/platform/platform.h"
 
@@ -25,6 +29,10 @@ public:
     IThreads& threads() override { return threads_; }
     ILibraryLoader& libraries() override { return libraries_; }
     IAssemblyCache& assemblies() override { return assemblies_; }
+    ILineChannel& lines() override { return lines_; }
+    IClock& clock() override { return clock_; }
+    ITerminal& terminal() override { return terminal_; }
+    IHostIdentity& identity() override { return identity_; }
     std::string storeName() override { return "memory"; }
     std::string storeNote() override { return {}; }
     bool storeIsOwn() override { return true; }
@@ -39,6 +47,10 @@ public:
     MemoryThreads threads_;
     MemoryLibraryLoader libraries_;
     MemoryAssemblyCache assemblies_{registry_};
+    MemoryLineChannel lines_;
+    MemoryClock clock_;
+    MemoryTerminal terminal_;
+    MemoryHostIdentity identity_;
 };
 
 }  // namespace kz7

@@ -1,6 +1,7 @@
 #include "install/platform/windows/file_system.h"
 
 #include <io.h>
+#include <windows.h>
 
 #include <cerrno>
 #include <string>
@@ -8,16 +9,113 @@
 #include "install/platform/windows/paths.h"
 
 namespace kz7 {
+namespace {
+
+constexpr std::size_t kReadPiece = 64 * 1024;
+
+HANDLE native(FileHandle file) {
+    return reinterpret_cast<HANDLE>(static_cast<std::uintptr_t>(file));
+}
+
+bool namesNothing(std::string_view path) {
+    return !isAbsolutePath(path) || path.find('\0') != std::string_view::npos;
+}
+
+}  // namespace
 
 Status WindowsFileSystem::probe(std::string_view path) {
     // Nothing is taken relative to the current folder.
-    if (!isAbsolutePath(path) || path.find('\0') != std::string_view::npos) {
+    if (namesNothing(path)) {
         return kFileNotFound;
     }
     if (_access(std::string(path).c_str(), 0) == 0) {
         return kSuccess;
     }
     return errno == EACCES ? kAccessDenied : kFileNotFound;
+}
+
+Status WindowsFileSystem::readFile(std::string_view path, std::string& content) {
+    if (namesNothing(path)) {
+        return kFileNotFound;
+    }
+    const HANDLE file = CreateFileA(std::string(path).c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_WRITE,
+                                    nullptr, OPEN_EXISTING, FILE_ATTRIBUTE_NORMAL, nullptr);
+    if (file == INVALID_HANDLE_VALUE) {
+        return GetLastError() == ERROR_PATH_NOT_FOUND ? kFileNotFound : GetLastError();
+    }
+    std::string read;
+    DWORD count = 0;
+    Status status = kSuccess;
+    do {
+        const std::size_t length = read.size();
+        read.resize(length + kReadPiece);
+        if (ReadFile(file, read.data() + length, kReadPiece, &count, nullptr) == FALSE) {
+            status = GetLastError();
+            count = 0;
+        }
+        read.resize(length + count);
+    } while (count != 0);
+    CloseHandle(file);
+    if (status == kSuccess) {
+        content = std::move(read);
+    }
+    return status;
+}
+
+Status WindowsFileSystem::openForAppend(std::string_view path, FileHandle& file) {
+    if (namesNothing(path)) {
+        return kFileNotFound;
+    }
+    const HANDLE opened =
+        CreateFileA(std::string(path).c_str(), FILE_APPEND_DATA, FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr,
+                    OPEN_ALWAYS, FILE_ATTRIBUTE_NORMAL | FILE_FLAG_OPEN_REPARSE_POINT, nullptr);
+    if (opened == INVALID_HANDLE_VALUE) {
+        return GetLastError();
+    }
+    BY_HANDLE_FILE_INFORMATION information{};
+    if (GetFileInformationByHandle(opened, &information) != FALSE &&
+        (information.dwFileAttributes & FILE_ATTRIBUTE_REPARSE_POINT) != 0) {
+        CloseHandle(opened);
+        return kAccessDenied;
+    }
+    file = FileHandle{reinterpret_cast<std::uintptr_t>(opened)};
+    return kSuccess;
+}
+
+Status WindowsFileSystem::write(FileHandle file, std::string_view data, std::uint32_t& written) {
+    DWORD count = 0;
+    const BOOL taken = WriteFile(native(file), data.data(), static_cast<DWORD>(data.size()), &count, nullptr);
+    written = count;
+    return taken != FALSE ? kSuccess : GetLastError();
+}
+
+Status WindowsFileSystem::closeFile(FileHandle file) {
+    return CloseHandle(native(file)) != FALSE ? kSuccess : GetLastError();
+}
+
+Status WindowsFileSystem::findFile(std::string_view pattern, std::string& name) {
+    if (namesNothing(pattern)) {
+        return kFileNotFound;
+    }
+    const std::string_view names = pattern.substr(pattern.find_last_of("\\/:") + 1);
+    WIN32_FIND_DATAA found{};
+    const HANDLE search = FindFirstFileA(std::string(pattern).c_str(), &found);
+    if (search == INVALID_HANDLE_VALUE) {
+        return GetLastError() == ERROR_PATH_NOT_FOUND ? kFileNotFound : GetLastError();
+    }
+    // The system's '?' also stands for no character at all.
+    std::string first;
+    do {
+        if (fitsPattern(found.cFileName, names) && (first.empty() || found.cFileName < first)) {
+            first = found.cFileName;
+        }
+    } while (FindNextFileA(search, &found) != FALSE);
+    FindClose(search);
+    if (first.empty()) {
+        return kFileNotFound;
+    }
+    name = std::move(first);
+    return kSuccess;
 }
 
 }  // namespace kz7

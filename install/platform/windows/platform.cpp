@@ -9,12 +9,16 @@
 
 #include "install/platform/standard_console.h"
 #include "install/platform/windows/assembly_cache.h"
+#include "install/platform/windows/clock.h"
 #include "install/platform/windows/debug_output.h"
 #include "install/platform/windows/file_system.h"
+#include "install/platform/windows/host_identity.h"
 #include "install/platform/windows/library_loader.h"
+#include "install/platform/windows/line_channel.h"
 #include "install/platform/windows/process_host.h"
 #include "install/platform/windows/registry.h"
 #include "install/platform/windows/services.h"
+#include "install/platform/windows/terminal.h"
 #include "install/platform/windows/threads.h"
 
 namespace kz7 {
@@ -33,6 +37,10 @@ public:
     IThreads& threads() override { return threads_; }
     ILibraryLoader& libraries() override { return libraries_; }
     IAssemblyCache& assemblies() override { return assemblies_; }
+    ILineChannel& lines() override { return lines_; }
+    IClock& clock() override { return clock_; }
+    ITerminal& terminal() override { return terminal_; }
+    IHostIdentity& identity() override { return identity_; }
     std::string storeName() override { return "the registry of this machine"; }
     std::string storeNote() override { return {}; }
     bool storeIsOwn() override { return false; }
@@ -48,6 +56,10 @@ private:
     WindowsThreads threads_;
     WindowsLibraryLoader libraries_;
     WindowsAssemblyCache assemblies_;
+    WindowsLineChannel lines_;
+    WindowsClock clock_;
+    WindowsTerminal terminal_;
+    WindowsHostIdentity identity_;
 };
 
 }  // namespace

@@ -127,6 +127,7 @@ Status WindowsProcessHost::startProcess(const ProcessStart& start, ProcessInform
     startup.cb = sizeof startup;
     startup.dwFlags = STARTF_USESTDHANDLES | STARTF_USESHOWWINDOW;
     startup.wShowWindow = SW_HIDE;
+    startup.hStdInput = native(start.input);
     startup.hStdOutput = native(start.output);
     startup.hStdError = native(start.error);
     std::string commandLine(start.commandLine);  // the call writes into it

@@ -24,7 +24,7 @@ Status WindowsThreads::start(std::unique_ptr<ThreadStart>& record, std::uint32_t
     if (handle == 0) {
         return _doserrno != 0 ? static_cast<Status>(_doserrno) : kTooManyThreads;
     }
-    record.release();
+    static_cast<void>(record.release());
     id = number;
     thread = ThreadHandle{handle};
     return kSuccess;

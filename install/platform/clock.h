@@ -1,0 +1,25 @@
+// The clock port: the local time, as text.
+#pragma once
+
+#include <string_view>
+
+#include "install/platform/buffer.h"
+#include "install/platform/status.h"
+
+namespace kz7 {
+
+// The texts of a time that are asked for.
+enum class TimeText {
+    dateAndZone,  // "%c %Z" of the C library's strftime()
+    timeOfDay,    // "%H:%M:%S"
+};
+
+class IClock {
+public:
+    virtual ~IClock() = default;
+
+    // The time now, without a NUL. kMoreData: it does not fit with one.
+    virtual Status localTime(TimeText form, Buffer& text) = 0;
+};
+
+}  // namespace kz7

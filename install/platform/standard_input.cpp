@@ -1,0 +1,34 @@
+#include "install/platform/standard_input.h"
+
+#include <cstdio>
+
+namespace kz7 {
+
+Status readStandardLine(Buffer& line) {
+    std::uint32_t length = 0;  // of what fits
+    bool any = false;
+    bool carriageReturn = false;  // read and not yet known to be part of the line
+    const auto keep = [&](char c) {
+        if (length < line.capacity) {
+            line.data[length++] = c;
+        }
+    };
+    int c = std::getc(stdin);
+    for (; c != EOF && c != '\n'; c = std::getc(stdin)) {
+        if (carriageReturn) {
+            keep('\r');
+        }
+        carriageReturn = c == '\r';
+        if (!carriageReturn) {
+            keep(static_cast<char>(c));
+        }
+        any = true;
+    }
+    if (c == EOF && !any) {
+        return kEndOfFile;
+    }
+    line.size = length;
+    return kSuccess;
+}
+
+}  // namespace kz7

@@ -1,0 +1,23 @@
+// The installer session that a custom action was called with.
+#pragma once
+
+#include "install/platform/installer_session.h"
+
+namespace kz7 {
+
+class WindowsInstallerSession final : public IInstallerSession {
+public:
+    // `installation` is the handle that the installer gave; it stays the installer's.
+    explicit WindowsInstallerSession(std::uint32_t installation) : installation_(installation) {}
+
+    Status getProperty(std::string_view name, Buffer& value) override;
+    Status createRecord(std::uint32_t fields, SessionHandle& record) override;
+    Status setRecordString(SessionHandle record, std::uint32_t field, std::string_view text) override;
+    Status processMessage(std::uint32_t kind, SessionHandle record, std::int32_t& answer) override;
+    Status closeHandle(SessionHandle handle) override;
+
+private:
+    std::uint32_t installation_;
+};
+
+}  // namespace kz7

@@ -1,0 +1,14 @@
+// The line-channel port on the C library's streams.
+#pragma once
+
+#include "install/platform/line_channel.h"
+
+namespace kz7 {
+
+class WindowsLineChannel final : public ILineChannel {
+public:
+    Status readLine(Buffer& line) override;
+    void keepLineFeeds(bool on) override;
+};
+
+}  // namespace kz7

@@ -1,0 +1,59 @@
+// The texts of the installer runtime by number: English ones of its own, and those of a file for another
+// language over them.
+#pragma once
+
+#include <cstdint>
+#include <map>
+#include <span>
+#include <string>
+#include <string_view>
+
+#include "install/platform/status.h"
+#include "install/platform/text.h"
+#include "install/runtime/response_file.h"
+
+namespace kz7 {
+
+// clang-format off
+inline constexpr std::uint32_t kHeaderTitles          = 2000;  // the trailer's is 1 more; 100 more for each kind of run
+inline constexpr std::uint32_t kWarningPrefix         = 2002;
+inline constexpr std::uint32_t kNotePrefix            = 2003;
+inline constexpr std::uint32_t kErrorPrefix           = 2004;
+inline constexpr std::uint32_t kMissingTextMessage    = 2006;
+inline constexpr std::uint32_t kReportMessage         = 2010;  // function, probe
+inline constexpr std::uint32_t kReportTextMessage     = 2011;  // function, probe, text
+inline constexpr std::uint32_t kReportValueMessage    = 2012;  // function, probe, value
+inline constexpr std::uint32_t kReportBothMessage     = 2013;  // function, probe, value, text
+inline constexpr std::uint32_t kTaskListMessage       = 2007;  // the list
+inline constexpr std::uint32_t kGenericDialogTitle    = 2020;  // the name GENERIC_DLG_TITLE stands for this number
+inline constexpr std::uint32_t kTaskStartMessage      = 2030;  // description
+inline constexpr std::uint32_t kTaskEndMessage        = 2031;  // description
+inline constexpr std::uint32_t kUndoStartMessage      = 2032;
+inline constexpr std::uint32_t kUndoEndMessage        = 2033;
+inline constexpr std::uint32_t kErrorMessage          = 2034;  // text
+inline constexpr std::uint32_t kQuestionMessage       = 2035;  // text, default value
+inline constexpr std::uint32_t kTextMessage           = 2036;  // text
+inline constexpr std::uint32_t kMediumNeededMessage   = 2037;
+// clang-format on
+
+class MessageCatalogue {
+public:
+    // Takes over the texts of a catalogue file: the lines of a response file, a number or GENERIC_DLG_TITLE
+    // as the name. A text has the placeholders of the one it replaces, in their order. On kInvalidData nothing
+    // is taken over and `fault` says why.
+    Status load(std::string_view file, ResponseFault& fault);
+
+    // The text with its inserts, as UREInfo::copyText() gives it.
+    Status copyText(std::uint32_t number, std::span<const Insert> inserts, char* room, std::size_t size,
+                    std::size_t& length) const;
+
+    bool has(std::uint32_t number) const { return pattern(number).data() != nullptr; }
+
+    // As it stands, for texts without placeholders; empty for a missing one.
+    std::string_view pattern(std::uint32_t number) const;
+
+private:
+    std::map<std::uint32_t, std::string> loaded_;
+};
+
+}  // namespace kz7

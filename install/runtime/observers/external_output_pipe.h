@@ -1,0 +1,41 @@
+// The output of a stream: the process's standard output, with a queue before it, and its standard input.
+#pragma once
+
+#include <memory>
+
+#include "install/platform/console.h"
+#include "install/platform/line_channel.h"
+#include "install/runtime/observers/kz7iobs.h"
+#include "install/runtime/report_sink.h"
+
+namespace kz7 {
+
+inline constexpr std::size_t kQueuedCharacters = 1024;  // of a queued message
+
+// The queue grows and never shrinks. A reader that is gone takes nothing and stops nothing.
+class UREExternalOutputPipe final : public UREExternalOutput {
+public:
+    // Without memory for the queue, which is reported, everything that is queued is lost.
+    UREExternalOutputPipe(IConsole& console, ILineChannel& lines, IReportSink& sink);
+
+    void writeMessage(const char* text) override;
+    Status readResponse(char* buffer, std::uint32_t size) override;
+    Status addQueueMessage(const char* text) override;
+    Status flushQueue() override;
+    std::int32_t getQueueCount() const override { return count_; }
+
+private:
+    using Message = std::unique_ptr<char[]>;
+    using Messages = std::unique_ptr<Message[]>;
+
+    bool makeRoom(std::int32_t capacity, std::string_view function);
+
+    IConsole& console_;
+    ILineChannel& lines_;
+    IReportSink& sink_;
+    Messages queue_;
+    std::int32_t count_ = 0;
+    std::int32_t capacity_ = 0;
+};
+
+}  // namespace kz7

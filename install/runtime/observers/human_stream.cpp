@@ -1,0 +1,131 @@
+#include "install/runtime/observers/human_stream.h"
+
+#include <algorithm>
+#include <array>
+#include <new>
+
+#include "install/runtime/observers/external_output_pipe.h"
+
+namespace kz7 {
+namespace {
+
+constexpr std::uint32_t kTaskListNumber = 4;
+constexpr std::string_view kAbort = "ABORT";
+
+UREExternalObserverHumanStream* theStream = nullptr;
+
+constexpr bool beginsCharacter(char c) {
+    return (static_cast<unsigned char>(c) & 0xC0) != 0x80;
+}
+
+}  // namespace
+
+std::string_view takeWrappedLine(std::string_view& text, std::uint32_t columns) {
+    std::size_t end = 0;
+    std::size_t blank = std::string_view::npos;
+    std::uint32_t shown = 0;
+    while (end < text.size() && text[end] != '\n') {
+        shown += beginsCharacter(text[end]) ? 1 : 0;
+        if (columns != 0 && shown > columns && text[end] != ' ') {
+            end = blank != std::string_view::npos ? blank : end;
+            break;
+        }
+        if (text[end] == ' ') {
+            blank = end;
+        }
+        ++end;
+    }
+    const std::string_view line = text.substr(0, end);
+    text.remove_prefix(end);
+    text.remove_prefix(!text.empty() && (text.front() == '\n' || text.front() == ' ') ? 1 : 0);
+    return line;
+}
+
+UREExternalObserverHumanStream* UREExternalObserverHumanStream::getInstance(URE& ure) {
+    if (theStream == nullptr) {
+        std::unique_ptr<UREExternalOutput> output(new (std::nothrow)
+                                                      UREExternalOutputPipe(ure.ports.console, ure.ports.lines, ure));
+        if (output != nullptr) {
+            theStream = new (std::nothrow) UREExternalObserverHumanStream(ure, std::move(output));
+        }
+    }
+    return theStream;
+}
+
+void UREExternalObserverHumanStream::release() {
+    delete theStream;
+}
+
+UREExternalObserverHumanStream::UREExternalObserverHumanStream(URE& ure, std::unique_ptr<UREExternalOutput> output)
+    : UREExternalObserverStream(std::move(output)), ure_(ure) {}
+
+UREExternalObserverHumanStream::~UREExternalObserverHumanStream() {
+    theStream = nullptr;
+}
+
+Status UREExternalObserverHumanStream::queueText(std::uint32_t textNumber, std::string_view text,
+                                                 std::string_view second, bool endsLine) {
+    const std::array<Insert, 2> inserts = {text, second};
+    char room[2 * kMessageSize];
+    std::size_t length = 0;
+    ure_.messages.copyText(textNumber, inserts, room, sizeof room, length);
+    std::string_view rest(room, std::min(length, sizeof room));
+    const std::uint32_t columns = ure_.ports.terminal.look(TerminalStream::output).columns;
+    Status status = kSuccess;
+    while (!rest.empty()) {
+        FixedText<kMessageSize> line(takeWrappedLine(rest, columns));
+        if (endsLine || !rest.empty()) {
+            line = FixedText<kMessageSize>(line.view().substr(0, kMessageSize - 2));
+            line.append("\n");
+        }
+        if (output().addQueueMessage(line.c_str()) != kSuccess) {
+            status = kFailed;
+        }
+    }
+    return status;
+}
+
+Status UREExternalObserverHumanStream::handleProgress(UREProgressInfo& info) {
+    FixedText<kMessageSize> description;
+    info.copyDescription(description);
+    const bool undo = info.task() == kUndoTask;
+    switch (info.kind()) {
+        case ProgressKind::start:
+            return queueText(undo ? kUndoStartMessage : kTaskStartMessage, description.view(), {}, true);
+        case ProgressKind::end:
+            return queueText(undo ? kUndoEndMessage : kTaskEndMessage, description.view(), {}, true);
+    }
+    return kFailed;
+}
+
+Status UREExternalObserverHumanStream::handleMessage(UREInfo& info) {
+    const std::uint32_t kind = info.messageClass();
+    if (kind == kClassInformation && info.number() == kTaskListNumber) {
+        return kFailed;
+    }
+    FixedText<kMessageSize> text;
+    info.copyText(text);
+    if (info.isQuestion()) {
+        return queueText(kQuestionMessage, text.view(), info.defaultValue(), false);
+    }
+    if (kind == kClassError || kind == kClassOtherError) {
+        return queueText(kErrorMessage, text.view(), {}, true);
+    }
+    return kind == kClassInformation ? queueText(kTextMessage, text.view(), {}, true) : kFailed;
+}
+
+void UREExternalObserverHumanStream::handleQuery(UREInfo& info) {
+    char line[kMessageSize];
+    if (output().readResponse(line, sizeof line) != kSuccess) {
+        return;
+    }
+    if (line == kAbort) {
+        info.setResponse(nullptr);
+    } else if (line[0] == '\0') {
+        info.setResponse(FixedText<kMessageSize>(info.defaultValue()).c_str());
+    } else {
+        info.setResponse(line);
+    }
+}
+
+}  // namespace kz7

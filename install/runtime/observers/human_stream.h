@@ -1,0 +1,35 @@
+// The stream for a person: readable texts of the catalogue on standard output, as wide as the terminal.
+#pragma once
+
+#include "install/runtime/observers/kz7iobs.h"
+#include "install/runtime/ure.h"
+
+namespace kz7 {
+
+// At most one per process, like the machine stream; a run has the one or the other.
+class UREExternalObserverHumanStream final : public UREExternalObserverStream {
+public:
+    // Makes it on the first request. Null: no memory.
+    static UREExternalObserverHumanStream* getInstance(URE& ure);
+    static void release();
+
+    Status handleProgress(UREProgressInfo& info) override;
+    Status handleMessage(UREInfo& info) override;
+
+    // An empty line is the answer that is proposed, ABORT aborts, anything else is the answer.
+    void handleQuery(UREInfo& info) override;
+
+private:
+    UREExternalObserverHumanStream(URE& ure, std::unique_ptr<UREExternalOutput> output);
+    ~UREExternalObserverHumanStream() override;
+
+    Status queueText(std::uint32_t textNumber, std::string_view text, std::string_view second, bool endsLine);
+
+    URE& ure_;
+};
+
+// Takes the next line of at most `columns` characters off a text, broken at a blank where there is one; 0
+// columns break nothing. Continuation bytes of UTF-8 count for nothing.
+std::string_view takeWrappedLine(std::string_view& text, std::uint32_t columns);
+
+}  // namespace kz7

@@ -1,0 +1,271 @@
+#include "install/runtime/observers/log_observer.h"
+
+#include <algorithm>
+#include <array>
+#include <new>
+
+#include "install/runtime/install_process.h"
+#include "install/runtime/session_text.h"
+
+namespace kz7 {
+namespace {
+
+constexpr std::size_t kMaxTitle = 44;         // characters
+constexpr std::size_t kMaxDate = 42;          // characters
+constexpr std::size_t kMaxSystemText = 79;    // characters
+constexpr std::size_t kTextStep = 256;        // bytes that the room for a text grows by
+constexpr std::size_t kKeptRoom = 64 * 1024;  // bytes of room that outlive a line
+constexpr std::uint32_t kPrefixMask = 0x4000103;
+
+constexpr std::string_view kSeparator = "============================================================";
+static_assert(kSeparator.size() == 60);
+
+// The kinds of run in the order in which they are looked for; each has its titles 100 numbers on.
+constexpr std::array kRuns = {kModeInstall, kModeUpdate, kModeRemove, kModeConfigure};
+
+URELogObserver* theLog = nullptr;
+FixedText<kPathSize> sharedLogPath;
+
+std::string_view withoutQuotes(std::string_view text) {
+    return text.size() >= 2 && text.front() == '"' && text.back() == '"' ? text.substr(1, text.size() - 2) : text;
+}
+
+std::string_view withoutLineEnd(std::string_view text) {
+    return text.substr(0, text.find_last_not_of("\r\n") + 1);
+}
+
+}  // namespace
+
+URELogObserver* URELogObserver::getInstance(URE& ure) {
+    if (theLog == nullptr) {
+        theLog = new (std::nothrow) URELogObserver(ure);
+    }
+    return theLog;
+}
+
+void URELogObserver::release() {
+    delete theLog;
+}
+
+URELogObserver::~URELogObserver() {
+    theLog = nullptr;
+}
+
+const char* URELogObserver::componentLogPath(char* buffer) const {
+    if (buffer == nullptr) {
+        sharedLogPath = componentLogPath_;
+        return sharedLogPath.c_str();
+    }
+    const std::string_view path = componentLogPath_.view();
+    buffer[path.copy(buffer, kPathSize - 1)] = '\0';
+    return buffer;
+}
+
+void URELogObserver::setLogFile(std::string_view path) {
+    const std::string_view folder = path.substr(0, path.find_last_of('\\') + 1);
+    FixedBuffer<kPathSize> shortened;
+    file_.reset();
+    shortPathFailed_ = shortFolder(folder, shortened) != kSuccess;
+    if (shortPathFailed_) {
+        // Deliberate: nothing is reported and only plain notes are written from here on; installers depend on
+        // a log that cannot be kept not standing in their way.
+        return;
+    }
+    componentLogPath_.assign(shortened.view());
+    componentLogPath_.append(kLogFileName);
+    const bool whole = logFilePath_.assign(path);
+    const Status opened =
+        whole ? ure_.ports.files.openForAppend(logFilePath_.view(), file_.receive()) : kFilenameExceedsRange;
+    if (opened != kSuccess) {
+        ure_.error(kCodeError, "URELogObserver::setLogFile", 10, opened);
+    }
+    writeHeader(false);
+    try {
+        describeSystem();
+        lookForClusterLog(folder);
+    } catch (const std::bad_alloc&) {
+        ure_.error(kCodeError, "URELogObserver::setLogFile", 20, kNoMemory);
+    }
+}
+
+Status URELogObserver::shortFolder(std::string_view folder, Buffer& shortened) {
+    const Status status = ure_.ports.processes.shortPath(folder, shortened);
+    if (status != kCallNotImplemented) {
+        return status;
+    }
+    // A host without short paths leaves a folder that is there as it is.
+    if (folder.empty() || folder.size() >= shortened.capacity) {
+        return kBadPathname;
+    }
+    shortened.size = static_cast<std::uint32_t>(folder.copy(shortened.data, shortened.capacity));
+    return ure_.ports.files.probe(folder);
+}
+
+Status URELogObserver::writeHeader(bool isEnd) {
+    writeLine({});
+    FixedText<kMaxTitle + kMaxDate + 1> title;
+    const auto* run =
+        std::find_if(kRuns.begin(), kRuns.end(), [&](std::uint32_t bit) { return (ure_.mode & bit) != 0; });
+    if (run != kRuns.end()) {
+        char room[kMaxTitle];
+        std::size_t length = 0;
+        const auto number = kHeaderTitles + static_cast<std::uint32_t>(100 * (run - kRuns.begin())) + (isEnd ? 1 : 0);
+        const Status status = ure_.messages.copyText(number, {}, room, sizeof room, length);
+        if (status != kSuccess && status != kBufferTooSmall) {
+            return status;
+        }
+        title.assign(withoutQuotes({room, std::min(length, sizeof room)}));
+    }
+    FixedBuffer<256> date;
+    if (ure_.ports.clock.localTime(TimeText::dateAndZone, date) == kSuccess) {
+        title.append(date.view().substr(0, kMaxDate));
+    }
+    writeLine(title.view());
+    return writeLine(kSeparator);
+}
+
+void URELogObserver::describeSystem() {
+    const std::string name = systemText("uname");
+    const std::string version = systemText("uname -v");
+    const std::string release = systemText("uname -r");
+    std::string system = name;
+    if (name.empty() && version.empty() && release.empty()) {
+        std::string ownVersion;
+        ure_.ports.identity.operatingSystem(system, ownVersion);
+        systemVersion_.assign(ownVersion);
+    } else {
+        systemVersion_.assign(version + '.' + release);
+    }
+    systemName_.assign(system);
+    writeLine(compose("%s %s", {systemName_.view(), systemVersion_.view()}));
+}
+
+// Empty where the program does not run, or fails.
+std::string URELogObserver::systemText(const char* command) {
+    InstallProcess process(ure_.ports.processes, ure_.ports.threads, ure_, command);
+    process.execute(true, false);
+    std::uint32_t exitCode = 0;
+    if (process.waitForCompletion(exitCode, kInfiniteWait) != kSuccess || exitCode != 0) {
+        return {};
+    }
+    char text[kMaxSystemText + 1];
+    process.copyStandardOutput(text, sizeof text);
+    return std::string(withoutQuotes(withoutLineEnd(text)));
+}
+
+void URELogObserver::lookForClusterLog(std::string_view folder) {
+    std::string pattern(folder.substr(0, folder.size() - 1));
+    pattern += (ure_.mode & kModeRemove) != 0 ? "\\uninstallSAM.????.log" : "\\installSAM.????.log";
+    std::string name;
+    ure_.ports.files.findFile(pattern, name);
+}
+
+void URELogObserver::writeFunction(std::string_view text) {
+    stampsTime_ = true;
+    ure_.report(kCodeReport, "writeFunction", 10, kSuccess, text);
+    stampsTime_ = false;
+}
+
+Status URELogObserver::writeLine(std::string_view text) {
+    try {
+        line_.assign(text);
+        return writeKeptLine();
+    } catch (const std::bad_alloc&) {
+        return kNoMemory;
+    }
+}
+
+Status URELogObserver::writeKeptLine() {
+    if (!file_) {
+        return writeToSession(line_);
+    }
+    // A write goes out whole or is told short: there is nothing to flush.
+    line_ += '\n';
+    std::uint32_t written = 0;
+    ure_.ports.files.write(file_.get(), line_, written);
+    const bool whole = written == line_.size();
+    if (line_.capacity() > kKeptRoom) {
+        std::string().swap(line_);
+    }
+    return whole ? kSuccess : written != 0 ? written : kFailed;
+}
+
+Status URELogObserver::writeToSession(std::string_view text) {
+    IInstallerSession* session = ure_.ports.session;
+    if (session == nullptr) {
+        return kNoInstallerSession;
+    }
+    // What the session answers changes nothing: there is nowhere else to write it.
+    OwnedSessionHandle record(*session);
+    if (session->createRecord(1, record.receive()) == kSuccess) {
+        std::int32_t answer = 0;
+        session->setRecordString(record.get(), 1, escapedForSession(text));
+        session->processMessage(kSessionInfo, record.get(), answer);
+    }
+    return kSuccess;
+}
+
+Status URELogObserver::update(UREBaseInfo& info) {
+    try {
+        if (info.getInfoType() == InfoType::message) {
+            return writeInfo(static_cast<const UREInfo&>(info));
+        }
+        FixedText<kMessageSize> description;
+        static_cast<const UREProgressInfo&>(info).copyDescription(description);
+        return description.empty() || shortPathFailed_ ? kSuccess : writeLine(description.view());
+    } catch (const std::bad_alloc&) {
+        return kNoMemory;
+    }
+}
+
+std::string_view URELogObserver::prefixOf(const UREInfo& info, Buffer& time) {
+    switch (info.code() & kPrefixMask) {
+        case kTraceError:
+            return ure_.messages.pattern(kNotePrefix);
+        case kCodeError:
+            return ure_.messages.pattern(kErrorPrefix);
+        case kCodeWarning:
+            return ure_.messages.pattern(kWarningPrefix);
+        case kCodeReport:
+            if (stampsTime_ && ure_.ports.clock.localTime(TimeText::timeOfDay, time) == kSuccess) {
+                return time.view();
+            }
+            return {};
+        default:
+            return {};
+    }
+}
+
+Status URELogObserver::writeInfo(const UREInfo& info) {
+    if (shortPathFailed_ && info.code() != kTraceError) {
+        return kSuccess;
+    }
+    FixedBuffer<16> time;
+    line_.assign(shortPathFailed_ ? std::string_view{} : prefixOf(info, time));
+    const std::size_t prefix = line_.size();
+    std::size_t length = 0;
+    Status status = kBufferTooSmall;
+    for (std::size_t room = kTextStep; status == kBufferTooSmall;) {
+        line_.resize(prefix + room);
+        status = info.copyText(line_.data() + prefix, room, length);
+        // The lookup tells what is missing: the steps up to there are taken at once.
+        room += std::max<std::size_t>(1, (std::max(length, room) - room + kTextStep - 1) / kTextStep) * kTextStep;
+    }
+    if (status == kNoInstallerSession) {
+        FixedText<kMessageSize> missing;
+        info.copyMissingText(missing);
+        line_.replace(prefix, std::string::npos, missing.view());
+    } else if (status != kSuccess) {
+        return status;
+    } else {
+        line_.resize(prefix + length);
+        const std::string_view text = withoutQuotes(std::string_view(line_).substr(prefix));
+        if (text.size() != length) {
+            line_.pop_back();
+            line_.erase(prefix, 1);
+        }
+    }
+    return writeKeptLine();
+}
+
+}  // namespace kz7

@@ -1,0 +1,112 @@
+// The runtime engine: what a run of the installer is about, the texts it speaks in, and the observers that it
+// hands every info to, in turn.
+#pragma once
+
+#include <cstdint>
+#include <span>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "install/platform/clock.h"
+#include "install/platform/console.h"
+#include "install/platform/file_system.h"
+#include "install/platform/host_identity.h"
+#include "install/platform/installer_session.h"
+#include "install/platform/line_channel.h"
+#include "install/platform/process_host.h"
+#include "install/platform/terminal.h"
+#include "install/platform/threads.h"
+#include "install/runtime/infos.h"
+#include "install/runtime/message_catalogue.h"
+#include "install/runtime/observers/kz7iobs.h"
+#include "install/runtime/report_sink.h"
+#include "install/runtime/response_file.h"
+
+namespace kz7 {
+
+// What the run does. The first of these bits that is set, in this order, names it in the log.
+// clang-format off
+inline constexpr std::uint32_t kModeInstall   = 0x01;
+inline constexpr std::uint32_t kModeUpdate    = 0x02;
+inline constexpr std::uint32_t kModeRemove    = 0x04;
+inline constexpr std::uint32_t kModeConfigure = 0x10;
+// clang-format on
+
+// They outlive the engine.
+struct RuntimePorts {
+    IFileSystem& files;
+    IProcessHost& processes;
+    IThreads& threads;
+    IConsole& console;
+    ILineChannel& lines;
+    ITerminal& terminal;
+    IClock& clock;
+    IHostIdentity& identity;
+    IInstallerSession* session = nullptr;  // null: there is none
+};
+
+// What an observer takes. Traces go to the log alone: a success is never told to a front end as an error.
+enum class Takes { everything, allButTraces };
+
+// One thread.
+class URE final : public IObservable, public IReportSink {
+public:
+    explicit URE(const RuntimePorts& runtimePorts) : ports(runtimePorts) {}
+
+    const RuntimePorts ports;
+    MessageCatalogue messages;
+    std::uint32_t mode = 0;
+    std::string productAbbreviation;
+    std::string installationPath;
+    std::vector<ResponseKeyword> responses;  // of the response file, in its order; empty without one
+
+    // Each is called while it is registered; the caller unregisters it before it goes. What an observer causes
+    // while it is being called does not reach it: it never reports into itself.
+    void registerObserver(IObserver& observer, Takes takes = Takes::allButTraces);
+    void unregisterObserver(IObserver& observer);
+
+    // Null: none. It gets the progress of tasks besides the observers.
+    void setProgressObserver(IProgressObserver* observer) { progressObserver_ = observer; }
+
+    void startTask(std::uint64_t startValue, std::int32_t task, bool installation, std::string_view description);
+    void endTask(std::int32_t task, bool installation, std::string_view description);
+
+    // Entries of identifier and time: "10,30;11,45".
+    void announceTasks(std::string_view taskList);
+
+    // Text `textNumber` of the catalogue.
+    void message(std::uint32_t code, std::uint32_t textNumber, std::span<const Insert> inserts);
+    void traceMessage(std::uint32_t textNumber, std::span<const Insert> inserts);
+
+    // Asks question `number`; `answer` is what the user answered, and unchanged for any other response. The
+    // caller decides what an unanswered question means.
+    UREInfo::Response ask(std::uint32_t number, std::uint32_t textNumber, std::span<const Insert> inserts,
+                          std::string_view defaultValue, std::string& answer);
+
+    // An error report with a text of its own.
+    void report(std::uint32_t code, std::string_view function, std::uint32_t probe, Status value,
+                std::string_view text);
+
+    void trace(std::uint32_t code, std::string_view function, std::uint32_t probe, Status value,
+               std::string_view text) override;
+    void error(std::uint32_t code, std::string_view function, std::uint32_t probe, Status value) override;
+    void post(std::uint32_t number, std::uint32_t flags, std::string_view source, std::string_view insert) override;
+
+private:
+    struct Registered {
+        IObserver* observer;
+        Takes takes;
+        bool isCalled = false;
+    };
+
+    void handOut(UREBaseInfo& info, bool isTrace);
+    void raiseProgress(UREProgressInfo info);
+    void raiseReport(std::uint32_t code, std::string_view function, std::uint32_t probe, Status value,
+                     std::string_view text, bool isTrace);
+
+    std::vector<Registered> observers_;
+    IProgressObserver* progressObserver_ = nullptr;
+};
+
+}  // namespace kz7
