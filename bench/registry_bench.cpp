@@ -7,9 +7,9 @@
 #include <string>
 #include <vector>
 
-#include "install/platform/standard_console.h"
 #include "install/platform/embedded/debug_output.h"
 #include "install/platform/embedded/registry.h"
+#include "install/platform/standard_console.h"
 #include "install/src/copies/install_copy_list.h"
 #include "install/src/registry_access.h"
 
