@@ -124,6 +124,12 @@ void FrontProgress::beginPhase() {
     shown_ = -1;
 }
 
+void FrontProgress::completePhase() {
+    if (!weights_.empty()) {
+        shown_ = 100;
+    }
+}
+
 void FrontProgress::endTask(std::int32_t task) {
     ended_.insert(task);
 }
@@ -150,6 +156,9 @@ int FrontProgress::percent() {
 
 void FrontView::enter(Phase phase) {
     if (phase != phase_) {
+        if (phase != Phase::undoing) {
+            completeBar();
+        }
         screen_.leaveBar();
         progress_.beginPhase();
         phase_ = phase;
@@ -159,6 +168,14 @@ void FrontView::enter(Phase phase) {
 void FrontView::showBar(std::string_view text) {
     static constexpr std::string_view kNames[] = {"", "Installing", "Configuring", "Undoing"};
     screen_.showBar({kNames[static_cast<int>(phase_)], phase_ == Phase::undoing ? -1 : progress_.percent(), text});
+}
+
+// A phase that is over is whole, whatever share of the tasks it turned out to have.
+void FrontView::completeBar() {
+    if (phase_ == Phase::installing || phase_ == Phase::configuring) {
+        progress_.completePhase();
+        showBar("done");
+    }
 }
 
 void FrontView::takeLine(std::string_view line, const Answerer& answer) {
@@ -222,6 +239,9 @@ void FrontView::ask(std::string_view text, std::string_view proposal, const Answ
 }
 
 void FrontView::end(std::string_view program, std::uint32_t exitCode) {
+    if (exitCode == 0) {
+        completeBar();
+    }
     screen_.leaveBar();
     if (!logFile_.empty()) {
         screen_.showLine("The log is " + ports_.files.shownPath(logFile_));
@@ -262,7 +282,8 @@ Status runFront(const FrontPorts& ports, const std::vector<std::string>& command
     if (status == kSuccess) {
         ports.processes.waitProcess(program.information.process, kInfiniteWait);
         if (view.isAsking()) {
-            screen.showErrorLine("\nThe program has ended; press Enter.");
+            screen.showAnswer("");
+            screen.showErrorLine("The program has ended; press Enter.");
         }
         output.finish();
         error.finish();

@@ -28,6 +28,7 @@ public:
     // What is done so far belongs to earlier phases.
     void beginPhase();
     void endTask(std::int32_t task);
+    void completePhase();
 
     // Of the phase, which is taken to be all that is left; it never goes back in a phase. Below 0: no task was
     // announced.
@@ -70,6 +71,7 @@ private:
 
     void enter(Phase phase);
     void showBar(std::string_view text);
+    void completeBar();
     void ask(std::string_view text, std::string_view proposal, const Answerer& answer);
 
     const FrontPorts& ports_;

@@ -3,6 +3,7 @@
 #include <algorithm>
 
 #include "install/admin/shown_text.h"
+#include "install/platform/text.h"
 
 namespace kz7 {
 namespace {
@@ -11,17 +12,19 @@ constexpr std::uint32_t kPhaseColumns = 13;
 constexpr std::uint32_t kPercentColumns = 6;  // " 100% "
 constexpr std::uint32_t kMinBar = 10;
 constexpr std::uint32_t kMaxBar = 40;
-constexpr std::uint32_t kMinText = 20;
+constexpr std::uint32_t kMinText = 30;
 
 constexpr std::string_view kRed = "\x1b[31m";
 constexpr std::string_view kPlain = "\x1b[0m";
 constexpr std::string_view kWipeLine = "\r\x1b[K";
 
-// Columns that a character takes whose first byte this is, 0 for its other bytes. Characters from the far end of the
-// alphabet are wide on most terminals; taken too wide, a line is only cut early.
-std::uint32_t columnsOf(char c) {
-    const auto byte = static_cast<unsigned char>(c);
-    return (byte & 0xC0) == 0x80 ? 0 : byte >= 0xE1 ? 2 : 1;
+// For people, broken between words; on one line where nobody looks.
+std::string wrapped(std::string_view text, std::uint32_t columns) {
+    std::string lines;
+    do {
+        lines.append(takeWrappedLine(text, columns)).append("\n");
+    } while (!text.empty());
+    return lines;
 }
 
 std::string cutToColumns(std::string_view text, std::uint32_t columns) {
@@ -45,17 +48,20 @@ std::string plainLine(const FrontScreen::Bar& bar) {
 }  // namespace
 
 std::string barLine(const FrontScreen::Bar& bar, std::uint32_t columns) {
+    std::string line = cutToColumns(bar.phase, kPhaseColumns - 1);
+    line.resize(kPhaseColumns, ' ');
+    if (bar.percent < 0) {
+        return cutToColumns(line.append(bar.text), columns);
+    }
     if (columns < kPhaseColumns + kMinBar + 2 + kPercentColumns) {
         return cutToColumns(plainLine(bar), columns);
     }
     const std::uint32_t rest = columns - kPhaseColumns - 2 - kPercentColumns;
     const std::uint32_t width = std::clamp(rest > kMinText ? rest - kMinText : 0, kMinBar, kMaxBar);
-    const auto percent = static_cast<std::uint32_t>(std::max(bar.percent, 0));
+    const auto percent = static_cast<std::uint32_t>(bar.percent);
     const std::uint32_t filled = width * percent / 100;
-    std::string line = cutToColumns(bar.phase, kPhaseColumns - 1);
-    line.resize(kPhaseColumns, ' ');
     line += '[' + std::string(filled, '#') + std::string(width - filled, '.') + ']';
-    const std::string number = bar.percent < 0 ? "" : std::to_string(percent) + '%';
+    const std::string number = std::to_string(percent) + '%';
     line += std::string(kPercentColumns - 1 - number.size(), ' ') + number + ' ';
     line += cutToColumns(bar.text, rest - width);
     return line;
@@ -102,11 +108,11 @@ void FrontScreen::leaveBar() {
 void FrontScreen::above(std::string_view text, bool isError, std::string_view colour) {
     const std::lock_guard<std::mutex> held(lock_);
     wipe();
-    std::string line = shownText(text);
-    if (!colour.empty() && terminal_.look(isError ? TerminalStream::error : TerminalStream::output).colours) {
+    const TerminalView view = terminal_.look(isError ? TerminalStream::error : TerminalStream::output);
+    std::string line = wrapped(shownText(text), view.columns);
+    if (!colour.empty() && view.colours) {
         line = std::string(colour) + line + std::string(kPlain);
     }
-    line += '\n';
     if (isError) {
         console_.writeError(line);
     } else {
@@ -134,7 +140,8 @@ void FrontScreen::showQuestion(std::string_view text, std::string_view prompt) {
     const std::lock_guard<std::mutex> held(lock_);
     wipe();
     hasBar_ = false;
-    console_.writeOutput(shownText(text) + '\n' + shownText(prompt));
+    const std::uint32_t columns = terminal_.look(TerminalStream::output).columns;
+    console_.writeOutput(wrapped(shownText(text), columns) + shownText(prompt));
     console_.flush();
 }
 
