@@ -29,23 +29,6 @@ TEST(TreeCopyTest, CopiesNamesClassesTypesAndBytes) {
     EXPECT_EQ(machine.dump("From"), source);
 }
 
-TEST(TreeCopyTest, OverwriteDecidesAboutValuesThatAreThere) {
-    for (const bool overwrite : {false, true}) {
-        Machine machine;
-        machine.set("From", "both", "new");
-        machine.set("From\\Sub", "both", "new");
-        machine.set("From", "only source", "new");
-        machine.set("To", "both", "old");
-        machine.set("To\\Sub", "both", "old");
-        machine.set("To", "only target", "old");
-        EXPECT_EQ(TreeCopy(machine.registry_).copy(kMachine, "From", kMachine, "To", overwrite), 1);
-        const std::string kept = overwrite ? "new" : "old";
-        EXPECT_EQ(machine.dump("To"), "To : both = 1:" + kept + "\\x00\nTo : only target = 1:old\\x00\n" +
-                                          "To : only source = 1:new\\x00\n[To\\Sub] \nTo\\Sub : both = 1:" + kept +
-                                          "\\x00\n");
-    }
-}
-
 TEST(TreeCopyTest, EndsWithZero) {
     const struct {
         const char* why;
@@ -93,7 +76,11 @@ TEST(DeleteTreeTest, StatusAndWhatIsLeft) {
         {"a placeholder without a name is literal", "$CurrentInstallationName$", "", "", kFileNotFound, "everything"},
         {"a path over its 1,024 bytes", "$CurrentInstallationName$", std::string(1024, 'T'), "", kFilenameExceedsRange,
          "everything"},
+        {"the spared name is compared with its case", "T", "", "sPARED", kSuccess, "[Beside] \n"},
         // The key with the spared one below it cannot go, and that failure ends the walk there.
+        {"a spared subkey keeps all below it", "T", "", "Spared", kAccessDenied,
+         "[Beside] \n[T] \n[T\\Spared] \n[T\\Spared\\x] \n[T\\Spared\\y] \n[T\\z] \n[T\\z\\Spared] \n"
+         "[T\\z\\Spared\\w] \n"},
         {"a spared name deeper down ends the walk at the key above it", "T", "", "w", kAccessDenied,
          "[Beside] \n[T] \n[T\\z] \n[T\\z\\Spared] \n[T\\z\\Spared\\w] \n"},
     };
@@ -108,18 +95,6 @@ TEST(DeleteTreeTest, StatusAndWhatIsLeft) {
         EXPECT_EQ(machine.dump(), row.left == "everything" ? before : row.left) << row.why;
         EXPECT_EQ(machine.registry_.openHandles(), 0U) << row.why;
     }
-}
-
-TEST(DeleteTreeTest, SparesASubkeyWithAllBelowItAndTheValuesAbove) {
-    Machine machine;
-    machine.set("T", "kept value", "v");
-    machine.make("T\\After");
-    machine.make("T\\InstalledCopies\\A");
-    machine.make("T\\Before");
-    EXPECT_EQ(deleteTree(machine.registry_, kMachine, "T", 0, {}, "InstalledCopies"), kAccessDenied);
-    EXPECT_EQ(machine.dump(), "[T] \nT : kept value = 1:v\\x00\n[T\\InstalledCopies] \n[T\\InstalledCopies\\A] \n");
-    EXPECT_EQ(deleteTree(machine.registry_, kMachine, "T", 0, {}, "installedcopies"), kSuccess)
-        << "the name is compared with its case";
 }
 
 TEST(Values, OnlyNotFoundMeansAbsent) {

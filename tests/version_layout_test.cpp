@@ -275,20 +275,5 @@ TEST_F(Version9, ThereAndBackAgainLosesNothing) {
     EXPECT_EQ(machine.registry_.openHandles(), 0U);
 }
 
-TEST_F(Version9, APathOverTheLimitFailsTheBackupAndLosesNothing) {
-    const std::string product = "SOFTWARE\\NVQ\\KZ7";
-    std::string path = product;
-    while (path.size() + 201 < 1020) {
-        path += "\\" + std::string(200, 'k');
-    }
-    path += "\\" + std::string(1020 - path.size() - 1, 'k');
-    machine.make(path);
-    machine.set(path.substr(0, path.size() - 8), "sibling that the cut path would name", "");
-    const std::string before = machine.dump(product);
-    migrate();
-    EXPECT_NE(console().error.find("1345: "), std::string::npos);
-    EXPECT_EQ(machine.dump(product), before);
-}
-
 }  // namespace
 }  // namespace kz7::test
