@@ -187,20 +187,6 @@ TEST(AliasRewrite, LeavesExactlyTheAliasesOfTheCopiesThatAreThere) {
     }
 }
 
-TEST(AliasRewrite, ChangesNothingWhereAViewIsMissing) {
-    for (const std::string& present : {kNative, kWow, std::string("Other")}) {
-        Machine machine;
-        machine.set(present, "9", "OLD");
-        machine.debugOutput_.messages.clear();
-        EXPECT_EQ(rewrite(machine), kFailed);
-        EXPECT_EQ(machine.dump(present), present + " : 9 = 1:OLD\\x00\n");
-        const std::vector<std::string> told = {
-            "Failed to open the registry key: " + (present == kNative ? kWow : kNative),
-            "Failed to backup the old profile info"};
-        EXPECT_EQ(machine.debugOutput_.messages, told);
-    }
-}
-
 const std::string kLongData(120, 'x');
 
 // One alias goes, one stays with another copy, three are new; one cannot be backed up whole.

@@ -233,12 +233,10 @@ TEST_P(RegistryContract, PathsAreReadAlike) {
         {"a separator at the begin",  "\\A\\B",                 kBadPathname},
         {"nothing but a separator",   "\\",                     kBadPathname},
         {"a missing key",             "A\\X",                   kFileNotFound},
-        {"a missing parent",          "X\\B",                   kFileNotFound},
         {"the longest name, missing", longest,                  kFileNotFound},
         {"a name too long",           tooLong,                  kInvalidParameter},
         {"deep down, too long",       "A\\" + tooLong + "\\C",  kInvalidParameter},
         {"a NUL",                     std::string("A\0B", 3),   kInvalidParameter},
-        {"another separator",         "A/B",                    kFileNotFound},
     };
     // clang-format on
     for (const auto& row : rows) {
@@ -303,8 +301,6 @@ TEST_P(RegistryContract, ValuesKeepEveryByte) {
     const struct { const char* why; ValueType type; std::string data; } rows[] = {
         {"every byte",             ValueType::binary,          allBytes},
         {"nothing",                ValueType::binary,          ""},
-        {"no text",                ValueType::sz,              ""},
-        {"10,000 bytes",           ValueType::binary,          std::string(10'000, 'b')},
         {"100,000 bytes",          ValueType::binary,          std::string(100'000, '\xFF')},
         {"a text",                 ValueType::sz,              std::string("text\0", 5)},
         {"a text of a path",       ValueType::expandSz,        std::string("%PATH%\\\xE9\0", 9)},
@@ -312,7 +308,6 @@ TEST_P(RegistryContract, ValuesKeepEveryByte) {
         {"texts",                  ValueType::multiSz,         std::string("one\0two\0\0", 9)},
         {"a number",               ValueType::dword,           std::string("\1\0\0\x80", 4)},
         {"a long number",          ValueType::qword,           std::string("\1\0\0\0\0\0\0\x80", 8)},
-        {"bytes of no type",       ValueType::none,            allBytes},
         {"an unknown type",        static_cast<ValueType>(77), "bytes"},
     };
     // clang-format on

@@ -69,6 +69,8 @@ const BadStore kBadStores[] = {
      kCannotOpen, "registry.db: "},
 };
 
+class BadStores : public testing::TestWithParam<BadStore> {};
+
 TEST_P(BadStores, EndWithTheirStatusAndOneLineThatNamesTheFile) {
     const BadStore& row = GetParam();
     const StateDirectory state;
