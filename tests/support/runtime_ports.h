@@ -7,8 +7,9 @@
 namespace kz7::test {
 
 inline RuntimePorts portsOf(IPlatform& platform, IInstallerSession* session = nullptr) {
-    return {platform.files(),    platform.processes(), platform.threads(),  platform.console(), platform.lines(),
-            platform.terminal(), platform.clock(),     platform.identity(), session};
+    return {platform.files(),   platform.processes(), platform.threads(),
+            platform.console(), platform.lines(),     platform.terminal(),
+            platform.clock(),   platform.identity(),  session};
 }
 
 }  // namespace kz7::test
