@@ -10,15 +10,34 @@
 #include "install/runtime/observers/display_observer.h"
 #include "install/runtime/observers/external_output_pipe.h"
 #include "install/runtime/observers/protocol_lines.h"
+#include "tests/support/backends.h"
 #include "tests/support/runtime_machine.h"
 
 namespace kz7::test {
 namespace {
 
 int allocationsUntilFailure = -1;  // of those that answer null; below 0 none fails
+std::uint64_t allocations = 0;
 
 }  // namespace
 }  // namespace kz7::test
+
+void* operator new(std::size_t size) {
+    ++kz7::test::allocations;
+    void* const memory = std::malloc(size == 0 ? 1 : size);
+    if (memory == nullptr) {
+        throw std::bad_alloc();
+    }
+    return memory;
+}
+
+void operator delete(void* memory) noexcept {
+    std::free(memory);
+}
+
+void operator delete(void* memory, std::size_t) noexcept {
+    std::free(memory);
+}
 
 void* operator new[](std::size_t size, const std::nothrow_t&) noexcept {
     if (kz7::test::allocationsUntilFailure >= 0 && kz7::test::allocationsUntilFailure-- == 0) {
@@ -321,6 +340,37 @@ TEST(MachineStream, AllocationFailuresAreReportedOnceAndLoseOneLine) {
             << "allocation " << failing;
         EXPECT_EQ(machine.logText().substr(before), log) << "allocation " << failing;
     }
+}
+
+TEST(Observers, TakeInfosWithoutAnAllocation) {
+    const std::unique_ptr<Backend> backend = backendNamed("host");
+    URE engine(portsOf(backend->platform()));
+    URELogObserver& log = *URELogObserver::getInstance(engine);
+    log.setLogFile(backend->folder() + "\\kz7msi.log");
+    std::uint64_t made = 0;
+    backend->written(false, [&](IConsole&) {
+        auto* machine = UREExternalObserverMachineStream::getInstance(engine);
+        auto* human = UREExternalObserverHumanStream::getInstance(engine);
+        engine.registerObserver(log, Takes::everything);
+        engine.registerObserver(*machine);
+        engine.registerObserver(*human);
+        for (int round = 0; round < 2; ++round) {
+            made = allocations;
+            for (int i = 0; i < 100; ++i) {
+                engine.startTask(1, i, true, "Copying a file with a name of a usual length");
+                engine.error(kCodeError, "Copier::copy", 10, kNotExecuted);
+                log.writeFunction("an error in words");
+                engine.endTask(i, true, "Copying a file with a name of a usual length");
+            }
+            made = allocations - made;
+        }
+        engine.unregisterObserver(*human);
+        engine.unregisterObserver(*machine);
+        UREExternalObserverHumanStream::release();
+        UREExternalObserverMachineStream::release();
+    });
+    URELogObserver::release();
+    EXPECT_EQ(made, 0U);
 }
 
 TEST(HumanStream, IsReadableAndAsWideAsTheTerminal) {

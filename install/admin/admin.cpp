@@ -1,6 +1,5 @@
 #include "install/admin/admin.h"
 
-#include "install/platform/encoding.h"
 #include "install/platform/registry_path.h"
 #include "install/platform/text.h"
 
@@ -10,35 +9,7 @@ namespace {
 constexpr std::string_view kProgram = "kz7admin";
 constexpr std::size_t kPiece = 1 << 16;  // bytes written out at once
 
-bool steersTerminal(char32_t character) {
-    return character < 0x20 || (character >= 0x7F && character < 0xA0) || isSurrogate(character) ||
-           character == 0x200E || character == 0x200F || (character >= 0x2028 && character <= 0x202E) ||
-           (character >= 0x2066 && character <= 0x2069) || character == 0xFEFF;
-}
-
 }  // namespace
-
-std::string shownText(std::string_view narrow) {
-    static constexpr char kDigits[] = "0123456789abcdef";
-    const std::u16string utf16 = utf16FromNarrow(narrow);
-    std::u16string shown;
-    for (std::u16string_view rest = utf16; !rest.empty();) {
-        const char32_t character = takeUtf16(rest);
-        if (!steersTerminal(character)) {
-            appendUtf16(shown, character);
-            continue;
-        }
-        // A byte that is no character shows as the byte it is.
-        const bool isByte = character < 0x80 || isSurrogate(character);
-        shown += isByte ? u"\\x" : u"\\u";
-        for (int shift = isByte ? 4 : 12; shift >= 0; shift -= 4) {
-            shown += static_cast<char16_t>(kDigits[character >> shift & 15]);
-        }
-    }
-    std::string text;
-    narrowFromUtf16(shown, text);
-    return text;
-}
 
 bool Admin::open(bool readOnly) {
     platform_ = hostPlatform({.program = std::string(kProgram),

@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "install/admin/key_walk.h"
+#include "install/admin/shown_text.h"
 #include "install/platform/platform.h"
 
 namespace kz7 {
@@ -57,8 +58,5 @@ private:
 
     std::unique_ptr<IPlatform> platform_;
 };
-
-// Foreign text for a line of ours: control characters, and what turns the direction of writing, are escaped.
-std::string shownText(std::string_view narrow);
 
 }  // namespace kz7

@@ -6,6 +6,7 @@
 #include "install/admin/aliases_command.h"
 #include "install/admin/copies_command.h"
 #include "install/admin/export_command.h"
+#include "install/admin/front_command.h"
 #include "install/admin/import_command.h"
 #include "install/admin/tree_command.h"
 
@@ -21,6 +22,7 @@ int run(int argc, char** argv) {
     addAliasesCommand(program, admin);
     addCopiesCommand(program, admin);
     addExportCommand(program, admin);
+    addFrontCommand(program, admin);
     addImportCommand(program, admin);
     addTreeCommand(program, admin);
     try {

@@ -78,6 +78,29 @@ std::vector<std::string> splitArguments(std::string_view arguments) {
     }
 }
 
+std::string joinArguments(const std::vector<std::string>& words) {
+    std::string line;
+    for (const std::string& word : words) {
+        // The program's own word ends at its closing quote, whatever stands before that.
+        if (line.empty()) {
+            line += '"' + word + '"';
+            continue;
+        }
+        line += " \"";
+        std::size_t backslashes = 0;
+        for (const char c : word) {
+            if (c == '"') {
+                line.append(backslashes + 1, '\\');
+            }
+            backslashes = c == '\\' ? backslashes + 1 : 0;
+            line += c;
+        }
+        line.append(backslashes, '\\');
+        line += '"';
+    }
+    return line;
+}
+
 bool isBareName(std::string_view program) {
     return program.find_first_of("/\\:") == std::string_view::npos;
 }

@@ -22,6 +22,9 @@ std::vector<CommandReading> commandReadings(std::string_view commandLine);
 // groups, one more backslash makes the quote a literal one; two quotes inside quotes are a literal one.
 std::vector<std::string> splitArguments(std::string_view arguments);
 
+// The command line that splits into these words, the program first.
+std::string joinArguments(const std::vector<std::string>& words);
+
 // A name without folder or drive, to be searched for.
 bool isBareName(std::string_view program);
 

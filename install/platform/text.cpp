@@ -55,6 +55,27 @@ std::string compose(std::string_view pattern, std::initializer_list<Insert> inse
     return text;
 }
 
+std::string_view takeWrappedLine(std::string_view& text, std::uint32_t columns) {
+    std::size_t end = 0;
+    std::size_t blank = std::string_view::npos;
+    std::uint32_t shown = 0;
+    while (end < text.size() && text[end] != '\n') {
+        shown += columnsOf(text[end]);
+        if (columns != 0 && shown > columns && text[end] != ' ') {
+            end = blank != std::string_view::npos ? blank : end;
+            break;
+        }
+        if (text[end] == ' ') {
+            blank = end;
+        }
+        ++end;
+    }
+    const std::string_view line = text.substr(0, end);
+    text.remove_prefix(end);
+    text.remove_prefix(!text.empty() && (text.front() == '\n' || text.front() == ' ') ? 1 : 0);
+    return line;
+}
+
 std::size_t composeInto(char* room, std::size_t size, std::string_view pattern, std::span<const Insert> inserts) {
     std::size_t length = 0;
     walkPattern(pattern, inserts, [&](std::string_view piece) {

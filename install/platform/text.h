@@ -53,6 +53,17 @@ private:
     std::size_t length_ = 0;
 };
 
+// Columns that a character takes on a terminal whose first byte in UTF-8 this is, 0 for its other bytes.
+// Characters from the far end of the alphabet are mostly wide; taken too wide, a line just ends early.
+constexpr std::uint32_t columnsOf(char c) {
+    const auto byte = static_cast<unsigned char>(c);
+    return (byte & 0xC0) == 0x80 ? 0 : byte >= 0xE1 ? 2 : 1;
+}
+
+// Takes the next line of at most `columns` columns off a text, broken at a blank where there is one; 0 columns
+// break nothing.
+std::string_view takeWrappedLine(std::string_view& text, std::uint32_t columns);
+
 // What stands in for a placeholder: %s takes a text, %d and %u a number (%d shows it signed, as the
 // messages always did with a status).
 using Insert = std::variant<std::string_view, std::uint32_t>;

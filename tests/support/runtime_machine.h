@@ -9,15 +9,9 @@
 #include "install/runtime/observers/log_observer.h"
 #include "install/runtime/observers/machine_stream.h"
 #include "install/runtime/ure.h"
+#include "tests/support/runtime_ports.h"
 
 namespace kz7::test {
-
-// The engine of a machine's ports.
-inline RuntimePorts portsOf(IPlatform& platform, IInstallerSession* session = nullptr) {
-    return {platform.files(),   platform.processes(), platform.threads(),
-            platform.console(), platform.lines(),     platform.terminal(),
-            platform.clock(),   platform.identity(),  session};
-}
 
 // The process-wide observers of a test go with it.
 class RuntimeMachine : public MemoryPlatform {

@@ -35,6 +35,9 @@ Status MemoryFileSystem::readFile(std::string_view path, std::string& content) {
     if (found == files_.end()) {
         return kFileNotFound;
     }
+    if (found->second->isFolder) {
+        return kAccessDenied;
+    }
     content = found->second->content;
     return kSuccess;
 }
@@ -49,6 +52,9 @@ Status MemoryFileSystem::openForAppend(std::string_view path, FileHandle& file) 
         return kPathNotFound;
     }
     add(path);
+    if (files_.at(key)->isFolder) {
+        return kAccessDenied;
+    }
     file = FileHandle{++lastHandle_};
     open_.emplace(file, files_.at(key));
     return kSuccess;
@@ -83,17 +89,17 @@ Status MemoryFileSystem::findFile(std::string_view pattern, std::string& name) {
 }
 
 void MemoryFileSystem::add(std::string_view path, std::string_view content) {
-    for (std::string key = keyOf(path); !key.empty(); key.resize(key.find_last_of('\\'))) {
+    bool isFolder = false;
+    for (std::string key = keyOf(path); !key.empty(); isFolder = true) {
         auto& file = files_[key];
         if (file == nullptr) {
-            file = std::make_shared<File>(File{std::string(path.substr(path.find_last_of("\\/") + 1)), {}});
+            file = std::make_shared<File>(File{std::string(path.substr(path.find_last_of("\\/") + 1)), {}, isFolder});
         }
         file->content += content;
         content = {};
         path = path.substr(0, path.find_last_of("\\/"));
-        if (key.find('\\') == std::string::npos) {
-            break;
-        }
+        const std::size_t above = key.find_last_of('\\');
+        key.resize(above == std::string::npos ? 0 : above);
     }
 }
 

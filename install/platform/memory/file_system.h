@@ -37,6 +37,7 @@ private:
     struct File {
         std::string name;  // as it was first spelled
         std::string content;
+        bool isFolder = false;
     };
 
     std::map<std::string, std::shared_ptr<File>> files_;  // and folders, by folded path

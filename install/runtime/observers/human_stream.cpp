@@ -14,32 +14,7 @@ constexpr std::string_view kAbort = "ABORT";
 
 UREExternalObserverHumanStream* theStream = nullptr;
 
-constexpr bool beginsCharacter(char c) {
-    return (static_cast<unsigned char>(c) & 0xC0) != 0x80;
-}
-
 }  // namespace
-
-std::string_view takeWrappedLine(std::string_view& text, std::uint32_t columns) {
-    std::size_t end = 0;
-    std::size_t blank = std::string_view::npos;
-    std::uint32_t shown = 0;
-    while (end < text.size() && text[end] != '\n') {
-        shown += beginsCharacter(text[end]) ? 1 : 0;
-        if (columns != 0 && shown > columns && text[end] != ' ') {
-            end = blank != std::string_view::npos ? blank : end;
-            break;
-        }
-        if (text[end] == ' ') {
-            blank = end;
-        }
-        ++end;
-    }
-    const std::string_view line = text.substr(0, end);
-    text.remove_prefix(end);
-    text.remove_prefix(!text.empty() && (text.front() == '\n' || text.front() == ' ') ? 1 : 0);
-    return line;
-}
 
 UREExternalObserverHumanStream* UREExternalObserverHumanStream::getInstance(URE& ure) {
     if (theStream == nullptr) {

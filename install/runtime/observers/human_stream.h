@@ -28,8 +28,4 @@ private:
     URE& ure_;
 };
 
-// Takes the next line of at most `columns` characters off a text, broken at a blank where there is one; 0
-// columns break nothing. Continuation bytes of UTF-8 count for nothing.
-std::string_view takeWrappedLine(std::string_view& text, std::uint32_t columns);
-
 }  // namespace kz7

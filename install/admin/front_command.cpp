@@ -1,0 +1,48 @@
+#include "install/admin/front_command.h"
+
+#include <CLI/CLI.hpp>
+#include <memory>
+
+#include "install/admin/front.h"
+#include "install/platform/command_line.h"
+#include "install/platform/text.h"
+
+namespace kz7 {
+namespace {
+
+constexpr int kNotStarted = 127;  // as shells have it; all other codes are the program's
+
+Answer runProgram(Admin& admin, const std::vector<std::string>& command) {
+    if (!admin.open(true)) {
+        return kAnswerFault;
+    }
+    IPlatform& platform = admin.platform();
+    const FrontPorts ports{platform.processes(), platform.threads(),  platform.files(),
+                           platform.lines(),     platform.terminal(), platform.console()};
+    std::uint32_t exitCode = 0;
+    const Status status = runFront(ports, command, exitCode);
+    if (status == kSuccess) {
+        return static_cast<Answer>(exitCode);
+    }
+    const std::string program = shownText(command.front());
+    if (isNotFound(status)) {
+        admin.tell(program + (isBareName(command.front())
+                                  ? ": there is no such program"
+                                  : ": there is no such program; its path must be a whole one, from the root"));
+    } else {
+        admin.tell(compose("%s: cannot be run: error %u", {program, status}));
+    }
+    return static_cast<Answer>(kNotStarted);
+}
+
+}  // namespace
+
+void addFrontCommand(CLI::App& program, Admin& admin) {
+    auto* command = program.add_subcommand("front", "Run an installer program and show its progress");
+    auto words = std::make_shared<std::vector<std::string>>();
+    command->add_option("PROGRAM", *words, "The program and its arguments, best after --")->required();
+    command->positionals_at_end();
+    command->callback([&admin, words] { admin.answer = [&admin, words] { return runProgram(admin, *words); }; });
+}
+
+}  // namespace kz7

@@ -1,0 +1,60 @@
+// What a person sees of an installer program: on a terminal one bar for each phase, drawn again and again on
+// its line, with all other lines above it; elsewhere plain lines.
+#pragma once
+
+#include <mutex>
+#include <string>
+#include <string_view>
+
+#include "install/platform/console.h"
+#include "install/platform/terminal.h"
+
+namespace kz7 {
+
+// Texts are shown with control characters escaped. May be called from several threads.
+class FrontScreen {
+public:
+    FrontScreen(IConsole& console, ITerminal& terminal) : console_(console), terminal_(terminal) {}
+
+    struct Bar {
+        std::string_view phase;
+        int percent = -1;  // below 0: nobody knows
+        std::string_view text;
+    };
+
+    // Begins a bar, or draws the one on the screen again. Without a terminal it is a line.
+    void showBar(const Bar& bar);
+
+    // Leaves the bar where it stands: the next one begins below.
+    void leaveBar();
+
+    void showLine(std::string_view text);       // on standard output
+    void showErrorLine(std::string_view text);  // on standard error
+    void showFailure(std::string_view text);    // the same, so that it is seen
+
+    // A question, and where the answer is typed, at the end of a line that is left open.
+    void showQuestion(std::string_view text, std::string_view prompt);
+
+    // What stands in for an answer that nobody saw being typed.
+    void showAnswer(std::string_view text);
+
+private:
+    bool draws() const { return terminal_.look(TerminalStream::output).redraws; }
+    void above(std::string_view text, bool isError, std::string_view colour);
+    void draw();
+    void wipe();
+
+    IConsole& console_;
+    ITerminal& terminal_;
+    std::mutex lock_;
+    std::string bar_;  // on the screen now, as a line of its full width
+    std::string phase_;
+    std::string barText_;
+    int percent_ = -1;
+    bool hasBar_ = false;
+};
+
+// The line of a bar in that many columns, and no more.
+std::string barLine(const FrontScreen::Bar& bar, std::uint32_t columns);
+
+}  // namespace kz7

@@ -1,0 +1,38 @@
+#include "install/admin/shown_text.h"
+
+#include "install/platform/encoding.h"
+
+namespace kz7 {
+namespace {
+
+bool steersTerminal(char32_t character) {
+    return character < 0x20 || (character >= 0x7F && character < 0xA0) || isSurrogate(character) ||
+           character == 0x200E || character == 0x200F || (character >= 0x2028 && character <= 0x202E) ||
+           (character >= 0x2066 && character <= 0x2069) || character == 0xFEFF;
+}
+
+}  // namespace
+
+std::string shownText(std::string_view narrow) {
+    static constexpr char kDigits[] = "0123456789abcdef";
+    const std::u16string utf16 = utf16FromNarrow(narrow);
+    std::u16string shown;
+    for (std::u16string_view rest = utf16; !rest.empty();) {
+        const char32_t character = takeUtf16(rest);
+        if (!steersTerminal(character)) {
+            appendUtf16(shown, character);
+            continue;
+        }
+        // A byte that is no character shows as the byte it is.
+        const bool isByte = character < 0x80 || isSurrogate(character);
+        shown += isByte ? u"\\x" : u"\\u";
+        for (int shift = isByte ? 4 : 12; shift >= 0; shift -= 4) {
+            shown += static_cast<char16_t>(kDigits[character >> shift & 15]);
+        }
+    }
+    std::string text;
+    narrowFromUtf16(shown, text);
+    return text;
+}
+
+}  // namespace kz7

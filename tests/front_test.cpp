@@ -1,0 +1,212 @@
+// kz7admin front in one process: how it reads lines, counts tasks, draws bars, and a whole run on a machine in
+// memory.
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+#include "install/admin/front.h"
+#include "install/platform/command_line.h"
+#include "install/platform/memory/platform.h"
+
+namespace kz7::test {
+namespace {
+
+std::string shown(const ProtocolEvent& event) {
+    static constexpr const char* kNames[] = {"installStart", "installEnd", "undoStart", "undoEnd",   "taskStart",
+                                             "taskEnd",      "taskCount",  "taskIds",   "taskTimes", "error",
+                                             "query",        "other",      "nothing"};
+    std::string text = kNames[static_cast<int>(event.kind)];
+    if (event.kind == EventKind::taskStart || event.kind == EventKind::taskEnd) {
+        text += event.isInstallation ? " i" : " c";
+        text += ' ' + std::to_string(event.startValue) + ' ' + std::to_string(event.task);
+    }
+    for (const std::string_view field : event.fields) {
+        text += " <" + std::string(field) + '>';
+    }
+    if (event.kind == EventKind::query) {
+        text += " <" + std::string(event.proposal) + '>';
+    }
+    return text + '|' + std::string(event.text);
+}
+
+TEST(ProtocolReader, TakesAnyLine) {
+    // clang-format off
+    const struct { const char* line; const char* event; } rows[] = {
+        {"MESSAGE INFO INSTALLSTART",                               "installStart|"},
+        {"MESSAGE INFO INSTALLSTART\r",                             "installStart|"},
+        {"MESSAGE INFO INSTALLSTARTED",                             "other|MESSAGE INFO INSTALLSTARTED"},
+        {"MESSAGE INFO INSTALLEND :: \\var\\a :: b.log",            "installEnd|\\var\\a :: b.log"},
+        {"MESSAGE INFO INSTALLEND :: ",                             "installEnd|"},
+        {"MESSAGE INFO UNDOSTART",                                  "undoStart|"},
+        {"MESSAGE INFO UNDOEND",                                    "undoEnd|"},
+        {"PROGRESS TASK START :: INSTALLATION :: 40 :: 10 :: a :: b", "taskStart i 40 10|a :: b"},
+        {"PROGRESS TASK START :: CONFIGURATION :: 4294967295 :: -1 :: ", "taskStart c 4294967295 -1|"},
+        {"PROGRESS TASK END :: CONFIGURATION :: 10 :: x",           "taskEnd c 0 10|x"},
+        {"PROGRESS TASK START :: INSTALLATION :: 40 :: 10",         "taskStart i 40 10|"},
+        {"PROGRESS TASK START :: INSTALLATION :: 40",               "other|PROGRESS TASK START :: INSTALLATION :: 40"},
+        {"PROGRESS TASK START :: INSTALLATION :: 4294967296 :: 1 :: x", "other|PROGRESS TASK START :: INSTALLATION :: 4294967296 :: 1 :: x"},
+        {"PROGRESS TASK END :: ELSEWHERE :: 10 :: x",               "other|PROGRESS TASK END :: ELSEWHERE :: 10 :: x"},
+        {"PROGRESS INFO TASKCOUNT :: 2",                            "taskCount|"},
+        {"PROGRESS INFO TASKCOUNT :: two",                          "other|PROGRESS INFO TASKCOUNT :: two"},
+        {"PROGRESS INFO TASKIDS :: 10 :: 11",                       "taskIds <10> <11>|"},
+        {"PROGRESS INFO TASKIDS",                                   "taskIds|"},
+        {"PROGRESS INFO TASKTIMES ::  :: 45",                       "taskTimes <> <45>|"},
+        {"MESSAGE ERROR GENERAL :: a :: b",                         "error|a :: b"},
+        {"MESSAGE ERROR CDNOTFOUND :: Install CD not found",        "error|Install CD not found"},
+        {"MESSAGE ERROR LATER :: of a newer program",               "error|of a newer program"},
+        {"MESSAGE QUERY CDPATH :: Where :: is it? :: D:\\",         "query <D:\\>|Where :: is it?"},
+        {"MESSAGE QUERY CDPATH :: Where? :: ",                      "query <>|Where?"},
+        {"MESSAGE QUERY CDPATH :: Where? ::",                       "query <>|Where?"},
+        {"MESSAGE QUERY CDPATH :: Where?",                          "query <>|Where?"},
+        {"MESSAGE QUERY OTHER :: Where? :: x",                      "other|MESSAGE QUERY OTHER :: Where? :: x"},
+        {"some words",                                              "other|some words"},
+        {"",                                                        "nothing|"},
+    };
+    // clang-format on
+    for (const auto& row : rows) {
+        EXPECT_EQ(shown(readProtocolLine(row.line)), row.event) << row.line;
+    }
+}
+
+TEST(LineCutter, CutsPiecesIntoLines) {
+    const std::string large(LineCutter::kMaxLine + 10, 'x');
+    const std::string input = "a\n\nbc\r\n" + large + "\nd\n" + std::string("\0", 1) + "\nhalf";
+    const std::vector<std::string> expected = {"a", "", "bc\r", large.substr(10), "d", std::string("\0", 1), "half"};
+    for (const std::size_t piece : {1U, 2U, 7U, 4096U, 1U << 20}) {
+        LineCutter cutter;
+        std::vector<std::string> lines;
+        const auto take = [&](std::string_view line) { lines.emplace_back(line); };
+        for (std::size_t at = 0; at < input.size(); at += piece) {
+            cutter.add(std::string_view(input).substr(at, piece), take);
+        }
+        cutter.end(take);
+        cutter.end(take);
+        EXPECT_EQ(lines, expected) << piece;
+    }
+}
+
+TEST(FrontProgress, NeverGoesBackInAPhase) {
+    FrontProgress progress;
+    EXPECT_EQ(progress.percent(), -1) << "nothing is announced";
+    progress.takeIds({"10", "11", "12", "x"});
+    progress.takeTimes({"30", "50"});
+    progress.beginPhase();
+    EXPECT_EQ(progress.percent(), 0);
+    progress.endTask(10);
+    EXPECT_EQ(progress.percent(), 36) << "30 of 30 + 50 + 1 + 1";
+    progress.endTask(10);
+    progress.endTask(99);
+    EXPECT_EQ(progress.percent(), 36) << "once, and announced tasks only";
+    progress.takeIds({"10", "11", "12", "13", "14"});
+    EXPECT_EQ(progress.percent(), 36) << "more to do";
+    progress.endTask(11);
+    EXPECT_EQ(progress.percent(), 40);
+    progress.beginPhase();
+    EXPECT_EQ(progress.percent(), 0) << "of the three that are left";
+    progress.endTask(13);
+    EXPECT_EQ(progress.percent(), 33);
+    progress.completePhase();
+    EXPECT_EQ(progress.percent(), 100);
+    progress.takeTimes({"999999999999999999999", "-5", "4000000000"});
+    EXPECT_EQ(progress.percent(), 100);
+}
+
+TEST(FrontScreen, BarsFitTheirColumns) {
+    // clang-format off
+    const struct { FrontScreen::Bar bar; std::uint32_t columns; const char* line; } rows[] = {
+        {{"Installing", 50, "Copying files"}, 79,  "Installing   [##############..............]  50% Copying files"},
+        {{"Installing", 100, "done"},         200, "Installing   [########################################] 100% done"},
+        {{"Installing", 30, "Copying files"}, 40,  "Installing   [###.......]  30% Copying f"},
+        {{"Installing", 30, "Copying files"}, 31,  "Installing   [###.......]  30% "},
+        {{"Installing", 30, "Copying files"}, 30,  "Installing 30%: Copying files"},
+        {{"Installing", 30, "Copying files"}, 12,  "Installing 3"},
+        {{"Undoing", -1, "taken back"},       40,  "Undoing      taken back"},
+        {{"Undoing", -1, "taken back"},       1,   "U"},
+        {{"Installing", 0, "\xE6\x97\xA5\xE6\x9C\xAC\xC3\xA4"}, 36, "Installing   [..........]   0% \xE6\x97\xA5\xE6\x9C\xAC\xC3\xA4"},
+        {{"Installing", 0, "\xE6\x97\xA5\xE6\x9C\xAC\xC3\xA4"}, 34, "Installing   [..........]   0% \xE6\x97\xA5"},
+    };
+    // clang-format on
+    for (const auto& row : rows) {
+        EXPECT_EQ(barLine(row.bar, row.columns), row.line) << row.columns;
+    }
+}
+
+TEST(CommandLine, JoinsWhatItSplits) {
+    const std::vector<std::string> words = {"C:\\a b\\p.exe", "",     "a b",          "\"",   "\\",
+                                            "a\\\\",          "\\\"", "x\\\"y\\\\\"", "'$*?", "\t"};
+    const std::string line = joinArguments(words);
+    const CommandReading reading = commandReadings(line).at(0);
+    EXPECT_EQ(reading.program, words[0]);
+    EXPECT_EQ(splitArguments(reading.arguments), std::vector<std::string>(words.begin() + 1, words.end()));
+}
+
+constexpr const char* kProgramLines =
+    "MESSAGE INFO INSTALLSTART\n"
+    "PROGRESS INFO TASKCOUNT :: 2\nPROGRESS INFO TASKIDS :: 1 :: 2\nPROGRESS INFO TASKTIMES :: 3 :: 1\n"
+    "PROGRESS TASK START :: INSTALLATION :: 0 :: 1 :: Files\n"
+    "MESSAGE QUERY CDPATH :: Where? :: D:\\\n\n"
+    "PROGRESS TASK END :: INSTALLATION :: 1 :: Files\n"
+    "garbage \x1b[2J\n"
+    "MESSAGE ERROR GENERAL :: it failed\n"
+    "MESSAGE INFO UNDOSTART\nMESSAGE INFO UNDOEND\n"
+    "MESSAGE INFO INSTALLEND :: C:\\x.log\n"
+    "half";
+
+std::uint32_t front(MemoryPlatform& machine, ScriptedProgram program) {
+    machine.processes_.addProgram("setup.exe", std::move(program));
+    std::uint32_t exitCode = 4711;
+    EXPECT_EQ(runFront({machine.processes_, machine.threads_, machine.files_, machine.lines_, machine.terminal_,
+                        machine.console_},
+                       {"setup.exe", "a b"}, exitCode),
+              kSuccess);
+    EXPECT_EQ(machine.processes_.started, std::vector<std::string>{"\"setup.exe\" \"a b\""});
+    EXPECT_EQ(machine.processes_.openHandles(), 0U);
+    EXPECT_EQ(machine.threads_.openHandles(), 0U);
+    EXPECT_FALSE(machine.terminal_.leavesInterrupts);
+    return exitCode;
+}
+
+TEST(Front, ShowsPlainLinesWhereNobodyLooks) {
+    MemoryPlatform machine;
+    machine.lines_.input = "/media\n";
+    EXPECT_EQ(front(machine, {.output = kProgramLines, .error = "complaint\n", .exitCode = 7}), 7U);
+    EXPECT_EQ(machine.console_.output,
+              "Installing 0%: Files\n"
+              "Where?\n"
+              "Answer, or ABORT [D:\\]: /media\n"
+              "Installing 75%: Files, done\n"
+              "garbage \\x1b[2J\n"
+              "Undoing: what was done is taken back\n"
+              "Undoing: done\n"
+              "half\n"
+              "The log is C:\\x.log\n");
+    EXPECT_EQ(machine.console_.error, "error: it failed\ncomplaint\nsetup.exe ended with exit code 7.\n");
+}
+
+TEST(Front, DrawsOneBarForEachPhaseOnATerminal) {
+    MemoryPlatform machine;
+    machine.terminal_.view = {.terminal = true, .redraws = true, .colours = true, .columns = 40};
+    EXPECT_EQ(front(machine, {.output = kProgramLines, .exitCode = 0}), 0U);
+    const std::string wipe = "\r\x1b[K";
+    const std::string bar = wipe + "Installing   [#######...]  75% Files, d";
+    EXPECT_EQ(machine.console_.both,
+              wipe + "Installing   [..........]   0% Files" + wipe + "Where?\nAnswer, or ABORT [D:\\]: ABORT\n" + bar +
+                  wipe + "garbage \\x1b[2J\n" + bar + wipe + "\x1b[31merror: it failed\n\x1b[0m" + bar + "\n" + wipe +
+                  "Undoing      what was done is taken bac" + wipe + "Undoing      done" + wipe + "half\n" + wipe +
+                  "Undoing      done\n" + "The log is C:\\x.log\nDone.\n");
+}
+
+TEST(Front, TellsThatAProgramIsNotThere) {
+    MemoryPlatform machine;
+    std::uint32_t exitCode = 0;
+    EXPECT_EQ(runFront({machine.processes_, machine.threads_, machine.files_, machine.lines_, machine.terminal_,
+                        machine.console_},
+                       {"absent.exe"}, exitCode),
+              kFileNotFound);
+    EXPECT_EQ(machine.processes_.openHandles(), 0U);
+    EXPECT_EQ(machine.console_.both, "");
+}
+
+}  // namespace
+}  // namespace kz7::test

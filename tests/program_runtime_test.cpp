@@ -1,0 +1,200 @@
+// The runtime and the front end as people run them: an installer program alone, misused by its front end, and
+// under kz7admin front.
+#include <gtest/gtest.h>
+
+#include <fcntl.h>
+#include <sys/resource.h>
+#include <unistd.h>
+
+#include <csignal>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+
+#include "tests/support/state_directory.h"
+
+namespace kz7::test {
+namespace {
+
+using namespace std::literals;
+
+class RuntimeProgram : public testing::Test {
+protected:
+    std::string path(const std::string& name) const { return files_.path() + "/" + name; }
+
+    std::string content(const std::string& name) const {
+        std::ifstream file(path(name), std::ios::binary);
+        return {std::istreambuf_iterator<char>(file), {}};
+    }
+
+    // The product's path of the log.
+    std::string logPath() const {
+        std::string product = path("setup.log");
+        for (char& c : product) {
+            c = c == '/' ? '\\' : c;
+        }
+        return product;
+    }
+
+    ProgramOptions withInput(const std::string& input) const {
+        const std::string file = path("input");
+        std::ofstream(file, std::ios::binary) << input;
+        return {.environment = {}, .inChild = [file] { dup2(open(file.c_str(), O_RDONLY), 0); }};
+    }
+
+    std::string script(const std::string& lines) const {
+        std::ofstream(path("script")) << "#!/bin/sh\n" << lines;
+        std::filesystem::permissions(path("script"), std::filesystem::perms::owner_all);
+        return path("script");
+    }
+
+    ProgramResult install(const std::string& kind, const ProgramOptions& options,
+                          const std::string& exitCode = "0") const {
+        return store_.run("kz7_installer", {logPath(), kind, exitCode}, options);
+    }
+    ProgramResult front(std::vector<std::string> command, const std::string& input = {}) const {
+        command.insert(command.begin(), {"front", "--"});
+        return store_.run("kz7admin", std::move(command), withInput(input));
+    }
+
+    StateDirectory store_;
+    TemporaryDirectory files_;
+};
+
+// The log of a run that was not aborted, from its tasks on.
+constexpr const char* kLoggedRun =
+    "\nTasks: 10,30;11,50;20,20\nCopying files\nNote: Installer::copy, step 10: 42 files\nCopying files\n"
+    "Note: The installation medium was not found. Where is it?\n"
+    "Registering the copy\nRegistering the copy\nCreating the instance\nCreating the instance\n\nInstallation ended: ";
+
+TEST_F(RuntimeProgram, FinishesItsWorkWhateverTheFrontEndDoes) {
+    // clang-format off
+    const struct { const char* why; std::string input; bool aborted; } rows[] = {
+        {"an answer",         "RESPONSE :: x\n",                       false},
+        {"nothing",           "",                                      false},
+        {"1 MiB on a line",   std::string(1 << 20, 'A') + "\nABORT\n", false},
+        {"NUL bytes",         std::string("\0\0ABORT\0\n", 9),         false},
+        {"no line end",       "ABORT",                                 true},
+        {"CR LF",             "ABORT\r\n",                             true},
+    };
+    // clang-format on
+    for (const auto& row : rows) {
+        std::filesystem::remove(path("setup.log"));
+        const ProgramResult result = install("machine", withInput(row.input));
+        EXPECT_EQ(result.exitCode, row.aborted ? 1 : 0) << row.why;
+        EXPECT_EQ(result.error, "") << row.why;
+        EXPECT_TRUE(result.output.starts_with("MESSAGE INFO INSTALLSTART\n")) << row.why;
+        EXPECT_TRUE(result.output.ends_with("MESSAGE INFO INSTALLEND :: " + logPath() + "\n")) << row.why;
+        EXPECT_EQ(result.output.find("MESSAGE INFO UNDOEND\n") != std::string::npos, row.aborted) << row.why;
+        EXPECT_EQ(content("setup.log").find(kLoggedRun) != std::string::npos, !row.aborted) << row.why;
+    }
+}
+
+TEST_F(RuntimeProgram, KeepsItsLogWithoutAReaderAndItsReaderWithoutALog) {
+    const auto closed = [](int descriptor) {
+        return ProgramOptions{.environment = {}, .inChild = [descriptor] {
+                                  int ends[2];
+                                  if (pipe(ends) == 0) {
+                                      dup2(ends[1], descriptor);
+                                      close(ends[0]);
+                                      close(ends[1]);
+                                  }
+                              }};
+    };
+    EXPECT_EQ(install("machine", closed(1)).exitCode, 0);
+    EXPECT_NE(content("setup.log").find(kLoggedRun), std::string::npos);
+
+    // More than the lines on standard output, which meet the same limit.
+    std::ofstream(path("setup.log"), std::ios::app) << std::string(10'000, 'x') << '\n';
+    const std::string before = content("setup.log");
+    ProgramOptions limited = withInput("");
+    const auto input = limited.inChild;
+    limited.inChild = [input, size = before.size() + 50] {
+        input();
+        const rlimit room{size, size};
+        setrlimit(RLIMIT_FSIZE, &room);
+    };
+    const ProgramResult full = install("machine", limited);
+    EXPECT_EQ(full.exitCode, 0);
+    EXPECT_EQ(full.signal, 0);
+    EXPECT_TRUE(full.output.ends_with("MESSAGE INFO INSTALLEND :: " + logPath() + "\n"));
+    EXPECT_TRUE(content("setup.log").starts_with(before)) << "the log of the earlier run stays";
+
+    // A log behind a link is not written: somebody else may have laid it.
+    std::filesystem::remove(path("setup.log"));
+    std::ofstream(path("precious")) << "precious";
+    std::filesystem::create_symlink(path("precious"), path("setup.log"));
+    const ProgramResult linked = install("machine", withInput(""));
+    EXPECT_EQ(linked.exitCode, 0);
+    EXPECT_EQ(content("precious"), "precious");
+}
+
+TEST_F(RuntimeProgram, FrontShowsARunAndAnswersIt) {
+    const std::string installer = programPath("kz7_installer");
+    const ProgramResult run = front({installer, logPath(), "machine", "5"}, "/media\n");
+    EXPECT_EQ(run.exitCode, 5);
+    EXPECT_EQ(run.output,
+              "Installing 0%: Copying files\n"
+              "Installing 30%: Copying files, done\n"
+              "The installation medium was not found. Where is it?\n"
+              "Answer, or ABORT [D:\\]: /media\n"
+              "Installing 30%: Registering the copy\n"
+              "Installing 80%: Registering the copy, done\n"
+              "Installing 100%: done\n"
+              "Configuring 0%: Creating the instance\n"
+              "Configuring 100%: Creating the instance, done\n"
+              "The log is " +
+                  path("setup.log") + "\n");
+    EXPECT_EQ(run.error,
+              "error: Install CD not found\n"
+              "error: Installer::configure, step 20: error 5030: The program was not run, or it failed.\n" +
+                  installer + " ended with exit code 5.\n");
+    const ProgramResult aborted = front({installer, logPath(), "machine", "0"});
+    EXPECT_EQ(aborted.exitCode, 1) << "no more answers abort";
+    EXPECT_NE(aborted.output.find("Answer, or ABORT [D:\\]: ABORT\n"), std::string::npos);
+    EXPECT_NE(aborted.output.find("Undoing: done\n"), std::string::npos);
+}
+
+TEST_F(RuntimeProgram, FrontTakesWhateverAProgramDoes) {
+    // clang-format off
+    const struct { const char* why; std::string lines; int exitCode; std::string output; std::string error; } rows[] = {
+        {"garbage and half a line", R"(printf 'a\001b\n\n\377\nPROGRESS TASK\nhalf'; exit 3)", 3,
+                                    "a\\x01b\n\\xff\nPROGRESS TASK\nhalf\n", ""},
+        {"it dies",                 "echo x; kill -9 $$",                         137, "x\n", ""},
+        {"it leaves a child that holds its output", "sleep 600 & echo $! > \"$1\"; echo x", 0, "x\nDone.\n", ""},
+        {"its own complaints",      "echo x >&2; exit 300",                       44,  "", "x\n"},
+        {"it closes all and goes on", "exec <&- >&- 2>&-; sleep 0.1; exit 9",     9,   "", ""},
+        {"nothing",                 "exit 0",                                     0,   "Done.\n", ""},
+        {"it floods both streams",  "i=0; while [ $i -lt 3000 ]; do echo 'PROGRESS TASK START :: INSTALLATION :: 1 :: 1 :: x'; echo y >&2; i=$((i+1)); done; exit 1", 1, "-", "-"},
+        {"it echoes its answer",    "echo 'MESSAGE QUERY CDPATH :: x :: '; read a; echo \"$a\"", 0,
+                                    "x\nAnswer, or ABORT: ABORT\nABORT\nDone.\n", ""},
+    };
+    // clang-format on
+    for (const auto& row : rows) {
+        const std::string program = script(row.lines + "\n");
+        const ProgramResult result = front({program, path("child")});
+        EXPECT_EQ(result.exitCode, row.exitCode) << row.why;
+        if (row.output == "-") {
+            EXPECT_EQ(std::count(result.output.begin(), result.output.end(), '\n'), 3000) << row.why;
+            continue;
+        }
+        EXPECT_EQ(result.output, row.output) << row.why;
+        EXPECT_EQ(result.error, row.error + (row.exitCode == 0 ? ""
+                                                               : program + " ended with exit code " +
+                                                                     std::to_string(row.exitCode) + ".\n"))
+            << row.why;
+    }
+    if (std::ifstream child(path("child")); child) {
+        pid_t id = 0;
+        child >> id;
+        kill(id, SIGKILL);
+    }
+    const ProgramResult relative = front({"./script"});
+    EXPECT_EQ(relative.exitCode, 127) << "nothing is started from the current folder";
+    EXPECT_EQ(relative.error,
+              "kz7admin: ./script: there is no such program; its path must be a whole one, from the root\n");
+    EXPECT_EQ(front({"kz7 no such program"}).error, "kz7admin: kz7 no such program: there is no such program\n");
+}
+
+}  // namespace
+}  // namespace kz7::test

@@ -1,0 +1,15 @@
+// The installer runtime's ports of a machine.
+#pragma once
+
+#include "install/platform/platform.h"
+#include "install/runtime/ure.h"
+
+namespace kz7::test {
+
+inline RuntimePorts portsOf(IPlatform& platform, IInstallerSession* session = nullptr) {
+    return {platform.files(),   platform.processes(), platform.threads(),
+            platform.console(), platform.lines(),     platform.terminal(),
+            platform.clock(),   platform.identity(),  session};
+}
+
+}  // namespace kz7::test
