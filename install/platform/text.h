@@ -25,8 +25,13 @@ bool equalsIgnoreCase(std::string_view left, std::string_view right);
 template <std::size_t Size>
 class FixedText {
 public:
-    FixedText() = default;
+    FixedText() { room_[0] = '\0'; }
     explicit FixedText(std::string_view text) { assign(text); }
+    FixedText(const FixedText& other) { assign(other.view()); }
+    FixedText& operator=(const FixedText& other) {
+        assign(other.view());
+        return *this;
+    }
 
     // False when the text was cut.
     bool assign(std::string_view text) {
@@ -49,7 +54,7 @@ public:
     bool empty() const { return length_ == 0; }
 
 private:
-    char room_[Size] = {};
+    char room_[Size];  // written up to the terminator; lines are made of these
     std::size_t length_ = 0;
 };
 

@@ -7,7 +7,7 @@
 namespace kz7 {
 namespace {
 
-constexpr std::int32_t kFirstCapacity = 4;
+constexpr std::size_t kFirstCapacity = 4;
 
 }  // namespace
 
@@ -39,12 +39,12 @@ Status UREExternalOutputPipe::readResponse(char* buffer, std::uint32_t size) {
     return status == kSuccess ? kSuccess : kFailed;
 }
 
-bool UREExternalOutputPipe::makeRoom(std::int32_t capacity, std::string_view function) {
+bool UREExternalOutputPipe::makeRoom(std::size_t capacity, std::string_view function) {
     std::uint32_t probe = 10;
-    Messages grown(capacity <= capacity_ ? nullptr : new (std::nothrow) Message[static_cast<std::size_t>(capacity)]);
+    Messages grown(capacity <= capacity_ ? nullptr : new (std::nothrow) Message[capacity]);
     if (grown != nullptr) {
         probe = 20;
-        std::int32_t made = capacity_;
+        std::size_t made = capacity_;
         while (made < capacity && (grown[made] = Message(new (std::nothrow) char[kQueuedCharacters + 1])) != nullptr) {
             ++made;
         }
@@ -74,7 +74,7 @@ Status UREExternalOutputPipe::addQueueMessage(const char* text) {
 }
 
 Status UREExternalOutputPipe::flushQueue() {
-    for (std::int32_t i = 0; i < count_; ++i) {
+    for (std::size_t i = 0; i < count_; ++i) {
         writeMessage(queue_[i].get());
     }
     count_ = 0;

@@ -22,20 +22,20 @@ public:
     Status readResponse(char* buffer, std::uint32_t size) override;
     Status addQueueMessage(const char* text) override;
     Status flushQueue() override;
-    std::int32_t getQueueCount() const override { return count_; }
+    std::int32_t getQueueCount() const override { return static_cast<std::int32_t>(count_); }
 
 private:
     using Message = std::unique_ptr<char[]>;
     using Messages = std::unique_ptr<Message[]>;
 
-    bool makeRoom(std::int32_t capacity, std::string_view function);
+    bool makeRoom(std::size_t capacity, std::string_view function);
 
     IConsole& console_;
     ILineChannel& lines_;
     IReportSink& sink_;
     Messages queue_;
-    std::int32_t count_ = 0;
-    std::int32_t capacity_ = 0;
+    std::size_t count_ = 0;
+    std::size_t capacity_ = 0;
 };
 
 }  // namespace kz7

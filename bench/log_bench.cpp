@@ -1,0 +1,156 @@
+// Flushed lines of the runtime against spdlog's with a flush per line: a log line with its time, an info in the
+// log, a protocol line. Standard output goes to a file meanwhile.
+#include <benchmark/benchmark.h>
+#include <fcntl.h>
+#include <spdlog/logger.h>
+#include <spdlog/sinks/basic_file_sink.h>
+#include <spdlog/sinks/stdout_sinks.h>
+#include <unistd.h>
+
+#include <cstdlib>
+#include <filesystem>
+#include <string>
+
+#include "install/platform/platform.h"
+#include "install/runtime/observers/log_observer.h"
+#include "install/runtime/observers/machine_stream.h"
+#include "install/runtime/ure.h"
+
+namespace kz7 {
+namespace {
+
+class Scratch {
+public:
+    Scratch() {
+        std::string pattern = std::filesystem::temp_directory_path() / "kz7bench.XXXXXX";
+        if (mkdtemp(pattern.data()) == nullptr) {
+            std::abort();
+        }
+        path_ = pattern;
+    }
+    ~Scratch() { std::filesystem::remove_all(path_); }
+    Scratch(const Scratch&) = delete;
+    Scratch& operator=(const Scratch&) = delete;
+
+    std::string file(const std::string& name) const { return path_ + '/' + name; }
+
+    std::string productPath(const std::string& name) const {
+        std::string path = file(name);
+        for (char& c : path) {
+            c = c == '/' ? '\\' : c;
+        }
+        return path;
+    }
+
+private:
+    std::string path_;
+};
+
+class OutputToFile {
+public:
+    explicit OutputToFile(const std::string& file) : kept_(dup(1)) {
+        std::fflush(stdout);
+        const int descriptor = open(file.c_str(), O_WRONLY | O_CREAT | O_APPEND, 0600);
+        dup2(descriptor, 1);
+        close(descriptor);
+    }
+    ~OutputToFile() {
+        std::fflush(stdout);
+        dup2(kept_, 1);
+        close(kept_);
+    }
+    OutputToFile(const OutputToFile&) = delete;
+    OutputToFile& operator=(const OutputToFile&) = delete;
+
+private:
+    int kept_;
+};
+
+constexpr const char* kText = "Copying a file with a name of a usual length";
+
+// The engine with its log open.
+class Run {
+public:
+    explicit Run(const Scratch& scratch)
+        : platform_(hostPlatform({.program = "bench", .stateDirectory = scratch.file("state")})),
+          engine({platform_->files(), platform_->processes(), platform_->threads(), platform_->console(),
+                  platform_->lines(), platform_->terminal(), platform_->clock(), platform_->identity()}),
+          log(*URELogObserver::getInstance(engine)) {
+        log.setLogFile(scratch.productPath("kz7msi.log"));
+        engine.registerObserver(log, Takes::everything);
+    }
+    ~Run() { URELogObserver::release(); }
+    Run(const Run&) = delete;
+    Run& operator=(const Run&) = delete;
+
+private:
+    std::unique_ptr<IPlatform> platform_;
+
+public:
+    URE engine;
+    URELogObserver& log;
+};
+
+void logLineWithTime(benchmark::State& state) {
+    const Scratch scratch;
+    Run run(scratch);
+    for ([[maybe_unused]] auto each : state) {
+        run.log.writeFunction(kText);
+    }
+    state.SetItemsProcessed(state.iterations());
+}
+BENCHMARK(logLineWithTime);
+
+void logInfo(benchmark::State& state) {
+    const Scratch scratch;
+    Run run(scratch);
+    for ([[maybe_unused]] auto each : state) {
+        run.engine.trace(kTraceError, "Copier::copy", 10, kSuccess, kText);
+    }
+    state.SetItemsProcessed(state.iterations());
+}
+BENCHMARK(logInfo);
+
+void spdlogLineWithTime(benchmark::State& state) {
+    const Scratch scratch;
+    spdlog::logger logger("log", std::make_shared<spdlog::sinks::basic_file_sink_st>(scratch.file("spdlog.log")));
+    logger.set_pattern("%H:%M:%S%v");
+    logger.flush_on(spdlog::level::info);
+    for ([[maybe_unused]] auto each : state) {
+        logger.info("{}, step {}: {}", "writeFunction", 10, kText);
+    }
+    state.SetItemsProcessed(state.iterations());
+}
+BENCHMARK(spdlogLineWithTime);
+
+void protocolLine(benchmark::State& state) {
+    const Scratch scratch;
+    Run run(scratch);
+    run.engine.unregisterObserver(run.log);
+    const OutputToFile output(scratch.file("output"));
+    auto* stream = UREExternalObserverMachineStream::getInstance(run.engine);
+    run.engine.registerObserver(*stream);
+    for ([[maybe_unused]] auto each : state) {
+        run.engine.startTask(40, 10, true, kText);
+    }
+    state.SetItemsProcessed(state.iterations());
+    run.engine.unregisterObserver(*stream);
+    UREExternalObserverMachineStream::release();
+}
+BENCHMARK(protocolLine);
+
+void spdlogStandardOutput(benchmark::State& state) {
+    const Scratch scratch;
+    const OutputToFile output(scratch.file("output"));
+    spdlog::logger logger("output", std::make_shared<spdlog::sinks::stdout_sink_st>());
+    logger.set_pattern("%v");
+    logger.flush_on(spdlog::level::info);
+    for ([[maybe_unused]] auto each : state) {
+        logger.info("PROGRESS TASK START :: INSTALLATION :: {} :: {} :: {}", 40, 10, kText);
+    }
+    state.SetItemsProcessed(state.iterations());
+}
+BENCHMARK(spdlogStandardOutput);
+
+}  // namespace
+}  // namespace kz7
