@@ -7,11 +7,16 @@
 #include <string>
 #include <vector>
 
-#include "install/platform/standard_console.h"
 #include "install/platform/embedded/debug_output.h"
+#include "install/platform/embedded/file_system.h"
 #include "install/platform/embedded/registry.h"
+#include "install/platform/embedded/services.h"
+#include "install/platform/standard_console.h"
 #include "install/src/copies/install_copy_list.h"
+#include "install/src/held_console.h"
 #include "install/src/registry_access.h"
+#include "install/src/version8.h"
+#include "install/src/version9.h"
 
 namespace kz7 {
 namespace {
@@ -206,6 +211,29 @@ void treeDeleteBare(benchmark::State& state) {
     state.SetItemsProcessed(state.range(1));
 }
 BENCHMARK(treeDeleteBare)->Apply(arguments);
+
+// A version-8 registry with such a tree below PROFILES, to version 9 and back, providers left out.
+void migrationThereAndBack(benchmark::State& state) {
+    const Scratch scratch;
+    fill(scratch, static_cast<Shape>(state.range(0)), state.range(1));
+    EmbeddedRegistry registry = openStore(scratch);
+    require(TreeCopy(registry).copy(KeyHandle::localMachine, "SOURCE", KeyHandle::localMachine,
+                                    "SOFTWARE\\NVQ\\KZ7\\PROFILES", true) == 1 &&
+            deleteTree(registry, KeyHandle::localMachine, "SOURCE", 0, {}, {}) == kSuccess &&
+            registry.commit() == kSuccess);
+    EmbeddedFileSystem files(scratch.path());
+    EmbeddedServiceManager services(registry, files);
+    HeldConsole console;
+    Report report(console);
+    for (auto step : state) {
+        migrateToVersion9(
+            registry, services, report, [](std::string_view) { return std::string("9.1.0.0"); },
+            [&](std::string_view) { return registry.commit(); }, "C:\\KZ9");
+        require(restoreVersion8(registry, services, console, "C:\\KZ8") == kSuccess);
+    }
+    state.SetItemsProcessed(state.range(1));
+}
+BENCHMARK(migrationThereAndBack)->Apply(arguments);
 
 // One step of an enumeration that stands at the index asked for.
 void enumerateAt(benchmark::State& state) {

@@ -6,30 +6,34 @@
 namespace kz7::test {
 namespace {
 
-class FileSystemContract : public testing::TestWithParam<const char*> {};
+class FileSystemContract : public testing::TestWithParam<const char*> {
+protected:
+    std::unique_ptr<Backend> backend_ = backendNamed(GetParam());
+    IFileSystem& files_ = backend_->platform().files();
+    std::string folder_ = backend_->folder() + "\\";
+};
 
 INSTANTIATE_TEST_SUITE_P(FileSystems, FileSystemContract, testing::ValuesIn(kBackends));
 
 TEST_P(FileSystemContract, TellsWhatIsThere) {
-    const std::unique_ptr<Backend> backend = backendNamed(GetParam());
-    std::string slashes = backend->program();
+    std::string slashes = backend_->program();
     for (char& c : slashes) {
         c = c == '\\' ? '/' : c;
     }
-    std::string doubled = backend->program();
+    std::string doubled = backend_->program();
     doubled.insert(doubled.rfind('\\'), "\\");
     // clang-format off
     const struct { const char* why; std::string path; Status status; } rows[] = {
-        {"a file",                       backend->program(),                 kSuccess},
-        {"a folder",                     backend->folder(),                  kSuccess},
-        {"a folder with a separator",    backend->folder() + "\\",           kSuccess},
+        {"a file",                       backend_->program(),                 kSuccess},
+        {"a folder",                     backend_->folder(),                  kSuccess},
+        {"a folder with a separator",    backend_->folder() + "\\",           kSuccess},
         {"the other separators",         slashes,                            kSuccess},
         {"a doubled separator",          doubled,                            kSuccess},
-        {"a missing file",               backend->folder() + "\\absent.exe", kFileNotFound},
+        {"a missing file",               backend_->folder() + "\\absent.exe", kFileNotFound},
         {"a missing folder",             "C:\\absent folder\\program.exe",   kFileNotFound},
         {"a drive that is not there",    "Q:\\program.exe",                  kFileNotFound},
         {"nothing",                      "",                                 kFileNotFound},
-        {"a NUL",                        backend->folder() + '\0',           kFileNotFound},
+        {"a NUL",                        backend_->folder() + '\0',           kFileNotFound},
         {"relative",                     "tests",                            kFileNotFound},
         {"relative with a folder",       "tests\\support",                   kFileNotFound},
         {"relative to a drive",          "C:windows",                        kFileNotFound},
@@ -37,7 +41,80 @@ TEST_P(FileSystemContract, TellsWhatIsThere) {
     };
     // clang-format on
     for (const auto& row : rows) {
-        EXPECT_EQ(backend->platform().files().probe(row.path), row.status) << row.why << ": " << row.path;
+        EXPECT_EQ(files_.probe(row.path), row.status) << row.why << ": " << row.path;
+    }
+}
+
+TEST_P(FileSystemContract, FilesAreWrittenAtTheirEndAndReadWhole) {
+    const std::string path = folder_ + "run.log";
+    const std::string bytes("one\r\n\0\xFF\n", 8);
+    const std::string many(200'000, 'x');
+    std::string content = "untouched";
+    EXPECT_EQ(files_.readFile(path, content), kFileNotFound);
+    EXPECT_EQ(content, "untouched");
+    OwnedFile file(files_);
+    OwnedFile second(files_);
+    std::uint32_t written = 77;
+    ASSERT_EQ(files_.openForAppend(path, file.receive()), kSuccess);
+    EXPECT_EQ(files_.probe(path), kSuccess) << "made by the opening";
+    EXPECT_EQ(files_.write(file.get(), bytes, written), kSuccess);
+    EXPECT_EQ(written, bytes.size());
+    ASSERT_EQ(files_.openForAppend(path, second.receive()), kSuccess);
+    EXPECT_EQ(files_.write(second.get(), many, written), kSuccess);
+    EXPECT_EQ(written, many.size());
+    EXPECT_EQ(files_.write(file.get(), "end", written), kSuccess) << "behind what the other one wrote";
+    EXPECT_EQ(files_.write(file.get(), "", written), kSuccess);
+    EXPECT_EQ(written, 0U);
+    EXPECT_EQ(files_.readFile(path, content), kSuccess) << "while it is open";
+    EXPECT_EQ(content == bytes + many + "end", true) << content.size() << " bytes";
+
+    const FileHandle closed = second.get();
+    second.reset();
+    written = 77;
+    EXPECT_EQ(files_.write(closed, "lost", written), kInvalidHandle);
+    EXPECT_EQ(written, 0U);
+    EXPECT_EQ(files_.closeFile(closed), kInvalidHandle);
+    EXPECT_EQ(files_.closeFile(FileHandle::none), kInvalidHandle);
+}
+
+TEST_P(FileSystemContract, PathsThatAreNoFile) {
+    // clang-format off
+    const struct { const char* why; std::string path; Status opened; Status read; } rows[] = {
+        {"a folder",         backend_->folder(),      kAccessDenied, kAccessDenied},
+        {"a missing folder", folder_ + "absent\\log", kPathNotFound, kFileNotFound},
+        {"nothing",          "",                      kFileNotFound, kFileNotFound},
+        {"relative",         "contract.log",          kFileNotFound, kFileNotFound},
+    };
+    // clang-format on
+    for (const auto& row : rows) {
+        OwnedFile file(files_);
+        std::string content;
+        EXPECT_EQ(files_.openForAppend(row.path, file.receive()), row.opened) << row.why;
+        EXPECT_FALSE(file) << row.why;
+        EXPECT_EQ(files_.readFile(row.path, content), row.read) << row.why;
+    }
+}
+
+TEST_P(FileSystemContract, TheFirstFileThatFitsAPatternIsFound) {
+    for (const char* name : {"text_b.cat", "text_A.cat", "text.cat", "text_aa.cat"}) {
+        OwnedFile file(files_);
+        ASSERT_EQ(files_.openForAppend(folder_ + name, file.receive()), kSuccess);
+    }
+    // clang-format off
+    const struct { const char* why; std::string pattern; Status status; const char* name; } rows[] = {
+        {"any one character", folder_ + "text_?.cat",        kSuccess,      "text_A.cat"},
+        {"and two of them",   folder_ + "text_??.cat",       kSuccess,      "text_aa.cat"},
+        {"case",              folder_ + "TEXT_B.CAT",        kSuccess,      "text_b.cat"},
+        {"no character less", folder_ + "text.cat?",         kFileNotFound, "none"},
+        {"none that fits",    folder_ + "text_?.dog",        kFileNotFound, "none"},
+        {"no such folder",    folder_ + "absent\\text?.cat", kFileNotFound, "none"},
+        {"relative",          "CMakeLists.tx?",              kFileNotFound, "none"},
+    };
+    // clang-format on
+    for (const auto& row : rows) {
+        std::string name = "none";
+        EXPECT_EQ(files_.findFile(row.pattern, name), row.status) << row.why;
+        EXPECT_EQ(name, row.name) << row.why;
     }
 }
 

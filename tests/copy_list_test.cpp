@@ -4,7 +4,6 @@
 
 #include "install/src/copies/ilist.h"
 #include "install/src/copies/install_copy_list.h"
-#include "install/src/copies/product_lists.h"
 #include "tests/support/machine.h"
 
 namespace kz7::test {
@@ -50,16 +49,6 @@ TEST(IntrusiveList, TheEndOfAListFreesEveryElement) {
         EXPECT_EQ(alive, 2);
     }
     EXPECT_EQ(alive, 0);
-}
-
-TEST(IntrusiveList, ACopiedNodeSharesItsElement) {
-    int alive = 0;
-    auto* element = new Element(alive);
-    INODE<Element> first(element);
-    INODE<Element> second(nullptr);
-    second = first;
-    EXPECT_EQ(second.data, element);
-    first.data = nullptr;
 }
 
 std::string names(InstallCopyList& copies) {
@@ -164,15 +153,6 @@ TEST(InstalledCopies, NoKeyIsAnEmptyListAndThe32BitViewHasItsOwn) {
     machine.make("SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies\\V\\Components");
     InstallCopyList list(machine.registry_, machine.debugOutput_, true, false);
     EXPECT_EQ(names(list), "V=C:\\v;") << "without components in its view a copy is left out";
-}
-
-TEST(OtherLists, HoldNamedElements) {
-    InstalledProdList products;
-    products.append(new InstalledProd("p"));
-    EXPECT_EQ(products.first()->name(), "p");
-    IKZ7INSTANCELIST instances;
-    instances.append(new IKZ7INSTANCE("i"));
-    EXPECT_EQ(instances.first()->name(), "i");
 }
 
 }  // namespace

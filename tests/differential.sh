@@ -113,6 +113,9 @@ same 'a location of 300 characters'          -addKZ7Copy LONG "C:\\$(long 300)"
 same 'an empty location'                     -addKZ7Copy NOWHERE ''
 same 'an empty name'                         -addKZ7Copy '' 'C:\KZ7\empty'
 same 'removal of an empty name'              -removeKZ7Copy ''
+same 'version 9 without its programs'        -V9 'C:\KZ7\v9'
+same 'a copy of version 9'                   -addv9 COPY9 'C:\KZ7\copy9'
+same 'providers of a copy'                   -DotNet 'C:\KZ7\v9\'
 same 'version 8 over copies'                 -v8 'C:\KZ7\v8'
 same 'a copy after that'                     -addKZ7Copy COPY1 'C:\KZ7\copy1'
 same 'removal of the last copy'              -removeKZ7Copy COPY1

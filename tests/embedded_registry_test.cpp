@@ -26,18 +26,6 @@ protected:
     std::vector<std::string> faults_;
 };
 
-TEST_F(EmbeddedStore, OnlyWhatWasCommittedStays) {
-    {
-        EmbeddedRegistry registry = open();
-        EXPECT_EQ(setText(registry, "Kept", "v", "1"), kSuccess);
-        EXPECT_EQ(registry.commit(), kSuccess);
-        EXPECT_EQ(registry.commit(), kSuccess) << "nothing to commit";
-        EXPECT_EQ(setText(registry, "Dropped", "v", "1"), kSuccess);
-    }
-    EmbeddedRegistry again = open();
-    EXPECT_EQ(dumpRegistry(again), "[Kept] \nKept : v = 1:1\\x00\n");
-}
-
 TEST_F(EmbeddedStore, AHandleOutlivesAMarkAndSeesWhatOthersDid) {
     EmbeddedRegistry mine = open();
     for (const char* path : {"K\\a", "K\\b", "Gone"}) {

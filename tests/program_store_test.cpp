@@ -44,8 +44,6 @@ struct BadStore {
     const char* said;
 };
 
-class BadStores : public testing::TestWithParam<BadStore> {};
-
 const BadStore kBadStores[] = {
     {"noise over the header",
      [](const StateDirectory& state) { overwrite(state.file("registry.db"), std::string(8192, 'x')); },
@@ -70,6 +68,8 @@ const BadStore kBadStores[] = {
      },
      kCannotOpen, "registry.db: "},
 };
+
+class BadStores : public testing::TestWithParam<BadStore> {};
 
 TEST_P(BadStores, EndWithTheirStatusAndOneLineThatNamesTheFile) {
     const BadStore& row = GetParam();
@@ -120,15 +120,6 @@ TEST(StoreFaults, AStateDirectoryThatCannotBeMadeIsNamed) {
     EXPECT_NE(result.error.find("kz7InstallReg: " + scratch.path() + "/file/below: Not a directory\n"),
               std::string::npos)
         << result.error;
-}
-
-TEST(StoreFaults, UsageCreatesNothing) {
-    const TemporaryDirectory scratch;
-    ProgramOptions options;
-    options.environment = {"KZ7_STATE_DIR=" + scratch.path() + "/state"};
-    const ProgramResult result = runProgram({programPath("kz7InstallReg")}, options);
-    EXPECT_EQ(result.exitCode, static_cast<int>(kInvalidParameter));
-    EXPECT_FALSE(std::filesystem::exists(scratch.path() + "/state"));
 }
 
 // What the run left must be the state before or the one after, and a success must be the one after.

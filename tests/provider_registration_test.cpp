@@ -111,9 +111,6 @@ TEST(DotNet, TellsWhatFailsAndGoesOn) {
         {"a text that is no level", [](Machine&) { levelText = "KZ8 v9.7.800.123"; }, "", 3, noLevel},
         {"no cache tool", [](Machine& machine) { machine.files_.remove("C:\\KZ7\\bin\\kz7nmpgac32.exe"); }, "9.7.8", 2,
          ""},
-        {"a cache tool that fails in its own way",
-         [](Machine& machine) { machine.processes_.addProgram("C:\\KZ7\\bin\\kz7nmpgac32.exe", {.exitCode = 9}); },
-         "9.7.8", 3, ""},
         {"configuration programs that refuse",
          [](Machine& machine) {
              machine.processes_.addProgram("C:\\KZ7\\bin\\kz7nmpcfg.exe", {.output = "why", .exitCode = 5});
@@ -209,11 +206,8 @@ TEST(LevelQuery, ShortensAndJoinsTheComponents) {
         std::string text;
         std::string level;
     } rows[] = {
-        {"four components", "KZ7 v9.1.0.0", "9.1.0.0"},
         {"the third and the fourth lose two characters where they have three", "KZ7 v100.100.800.123", "100.100.8.1"},
-        {"two characters stay", "KZ7 v9.7.80.12", "9.7.80.12"},
         {"fewer components have no dot at the end", "KZ7 v9.7", "9.7"},
-        {"one", "KZ7 v9", "9"},
         {"none", "KZ7 v", ""},
         {"empty ones are kept", "KZ7 v9..0.1", "9..0.1"},
         {"but not at the end", "KZ7 v9.1.0.", "9.1.0"},

@@ -22,7 +22,8 @@ std::uint64_t allocations = 0;
 }  // namespace
 }  // namespace kz7::test
 
-void* operator new(std::size_t size) {
+// Not inlined: gcc would take the pair below for a mismatch.
+[[gnu::noinline]] void* operator new(std::size_t size) {
     ++kz7::test::allocations;
     void* const memory = std::malloc(size == 0 ? 1 : size);
     if (memory == nullptr) {
@@ -31,11 +32,11 @@ void* operator new(std::size_t size) {
     return memory;
 }
 
-void operator delete(void* memory) noexcept {
+[[gnu::noinline]] void operator delete(void* memory) noexcept {
     std::free(memory);
 }
 
-void operator delete(void* memory, std::size_t) noexcept {
+[[gnu::noinline]] void operator delete(void* memory, std::size_t) noexcept {
     std::free(memory);
 }
 

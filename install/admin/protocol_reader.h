@@ -44,7 +44,7 @@ ProtocolEvent readProtocolLine(std::string_view line);
 // Cuts what comes in pieces into lines. A line of more than kMaxLine bytes loses its end.
 class LineCutter {
 public:
-    static constexpr std::size_t kMaxLine = 64 * 1024;
+    static constexpr std::size_t kMaxLine = std::size_t{64} * 1024;
 
     using Taker = std::function<void(std::string_view line)>;
     void add(std::string_view piece, const Taker& take);

@@ -1,5 +1,7 @@
 #include <windows.h>
 
+#include <filesystem>
+
 #include "tests/support/backends.h"
 #include "tests/support/captured_streams.h"
 #include "tests/support/host_processes.h"
@@ -9,6 +11,18 @@ namespace {
 
 class WindowsBackend final : public Backend {
 public:
+    WindowsBackend() {
+        const std::string programs = childProgram().substr(0, childProgram().rfind('\\') + 1);
+        std::filesystem::remove_all(folder());
+        std::filesystem::create_directories(folder());
+        std::filesystem::copy_file(programs + "kz7_test_service.exe", program());
+    }
+    ~WindowsBackend() override {
+        // A program that is just ending keeps its file; the next backend finds a folder of another name.
+        std::error_code ignored;
+        std::filesystem::remove_all(folder(), ignored);
+    }
+
     IPlatform& platform() override { return *platform_; }
     Differences differences() const override {
         const HMODULE system = GetModuleHandleA("ntdll.dll");
@@ -19,8 +33,8 @@ public:
                 .passesClassesOn = wine,
                 .startsDeletedServices = wine};
     }
-    std::string folder() override { return childProgram().substr(0, childProgram().rfind('\\')); }
-    std::string program() override { return folder() + "\\kz7_test_service.exe"; }
+    std::string folder() override { return folder_; }
+    std::string program() override { return folder() + "\\Program.exe"; }
     std::string written(bool both, const std::function<void(IConsole&)>& writing) override {
         CapturedStreams streams(both);
         writing(platform_->console());
@@ -28,6 +42,13 @@ public:
     }
 
 private:
+    static std::string freshFolder() {
+        static int count = 0;
+        return std::filesystem::temp_directory_path().string() + "kz7contract" + std::to_string(GetCurrentProcessId()) +
+               "_" + std::to_string(++count);
+    }
+
+    std::string folder_ = freshFolder();
     std::unique_ptr<IPlatform> platform_ = hostPlatform({.program = "test"});
 };
 

@@ -13,7 +13,7 @@ namespace kz7 {
 namespace {
 
 constexpr mode_t kLogFileMode = 0644;
-constexpr std::size_t kReadPiece = 64 * 1024;
+constexpr std::size_t kReadPiece = std::size_t{64} * 1024;
 
 Status statusOf(int error) {
     switch (error) {

@@ -90,18 +90,16 @@ Status MemoryFileSystem::findFile(std::string_view pattern, std::string& name) {
 
 void MemoryFileSystem::add(std::string_view path, std::string_view content) {
     bool isFolder = false;
-    for (std::string key = keyOf(path); !key.empty(); key.resize(key.find_last_of('\\'))) {
+    for (std::string key = keyOf(path); !key.empty(); isFolder = true) {
         auto& file = files_[key];
         if (file == nullptr) {
             file = std::make_shared<File>(File{std::string(path.substr(path.find_last_of("\\/") + 1)), {}, isFolder});
         }
         file->content += content;
         content = {};
-        isFolder = true;
         path = path.substr(0, path.find_last_of("\\/"));
-        if (key.find('\\') == std::string::npos) {
-            break;
-        }
+        const std::size_t above = key.find_last_of('\\');
+        key.resize(above == std::string::npos ? 0 : above);
     }
 }
 

@@ -8,10 +8,12 @@ namespace {
 
 constexpr std::uint32_t kCopyNameRoom = 256;  // bytes, the terminator included
 
-std::size_t firstLetter(std::string_view text) {
-    const auto* letter =
-        std::find_if(text.begin(), text.end(), [](char c) { return foldUpper(c) >= 'A' && foldUpper(c) <= 'Z'; });
-    return letter == text.end() ? std::string_view::npos : static_cast<std::size_t>(letter - text.begin());
+char foldLower(char c) {
+    return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
+}
+
+bool hasLetter(std::string_view text) {
+    return std::any_of(text.begin(), text.end(), [](char c) { return foldUpper(c) != foldLower(c); });
 }
 
 }  // namespace
@@ -57,43 +59,67 @@ std::size_t commonLength(std::string_view left, std::string_view right) {
     return static_cast<std::size_t>(end - left.begin());
 }
 
-void HighestVersions::fillTables() {
-    // From the greatest text down, the first that has a prefix is the one to keep.
-    for (auto copy = copies_.rbegin(); copy != copies_.rend(); ++copy) {
-        const std::string_view text = copy->first;
-        const std::size_t letter = firstLetter(text);
-        if (letter == std::string_view::npos) {
-            continue;
-        }
-        exact_.try_emplace(text, &copy->second);
-        for (std::size_t dot = text.find('.', letter); dot != std::string_view::npos; dot = text.find('.', dot + 1)) {
-            leading_.try_emplace(text.substr(0, dot), &copy->second);
-        }
-    }
-}
-
 const InstallCopyInfo* HighestVersions::leadingBy(std::string_view prefix, bool exact) {
-    if (firstLetter(prefix) != std::string_view::npos) {
-        if (exact_.empty()) {
-            fillTables();
-        }
+    if (!hasLetter(prefix)) {
+        return inMap(std::string(prefix), exact);
+    }
+    if (bothCases()) {
         const Table& table = exact ? exact_ : leading_;
         const auto found = table.find(prefix);
         return found == table.end() ? nullptr : found->second;
     }
-    if (exact) {
-        const auto copy = copies_.find(std::string(prefix));
-        return copy == copies_.end() ? nullptr : &copy->second;
-    }
-    // The texts that go on behind a dot lie together; the character behind the dot bounds them.
-    const std::string begin = std::string(prefix) + '.';
-    const auto behind = copies_.lower_bound(std::string(prefix) + static_cast<char>('.' + 1));
-    const auto last = behind == copies_.begin() ? copies_.end() : std::prev(behind);
-    return last != copies_.end() && last->first.starts_with(begin) ? &last->second : nullptr;
+    std::string written(prefix);
+    std::transform(written.begin(), written.end(), written.begin(),
+                   [this](char c) { return hasLower_ ? foldLower(c) : foldUpper(c); });
+    return inMap(written, exact);
 }
 
 const InstallCopyInfo* HighestVersions::leadingByWhole(const CopiesByVersion::value_type& copy) {
-    return firstLetter(copy.first) == std::string::npos ? &copy.second : leadingBy(copy.first, true);
+    return hasLetter(copy.first) && bothCases() ? leadingBy(copy.first, true) : &copy.second;
+}
+
+const InstallCopyInfo* HighestVersions::inMap(const std::string& prefix, bool exact) const {
+    if (exact) {
+        const auto copy = copies_.find(prefix);
+        return copy == copies_.end() ? nullptr : &copy->second;
+    }
+    // The texts that go on behind a dot lie together; the character behind the dot bounds them.
+    const auto behind = copies_.lower_bound(prefix + static_cast<char>('.' + 1));
+    const auto last = behind == copies_.begin() ? copies_.end() : std::prev(behind);
+    return last != copies_.end() && last->first.starts_with(prefix + '.') ? &last->second : nullptr;
+}
+
+bool HighestVersions::bothCases() {
+    if (!surveyed_) {
+        surveyed_ = true;
+        for (const auto& [text, copy] : copies_) {
+            for (const char c : text) {
+                hasUpper_ = hasUpper_ || c != foldLower(c);
+                hasLower_ = hasLower_ || c != foldUpper(c);
+            }
+        }
+        if (hasUpper_ && hasLower_) {
+            fillTables();
+        }
+    }
+    return hasUpper_ && hasLower_;
+}
+
+void HighestVersions::fillTables() {
+    exact_.reserve(copies_.size());
+    leading_.reserve(copies_.size());
+    // From the greatest text down, the first that has a prefix is the one to keep.
+    std::string_view greater;
+    for (auto copy = copies_.rbegin(); copy != copies_.rend(); ++copy) {
+        const std::string_view text = copy->first;
+        exact_.try_emplace(text, &copy->second);
+        // A dot within what both texts share ends a prefix that the greater one has answered.
+        std::size_t dot = text.find('.', commonLength(text, greater));
+        for (; dot != std::string_view::npos; dot = text.find('.', dot + 1)) {
+            leading_.try_emplace(text.substr(0, dot), &copy->second);
+        }
+        greater = text;
+    }
 }
 
 std::size_t HighestVersions::Hash::operator()(std::string_view text) const {

@@ -58,9 +58,9 @@ public:
     const InstallCopyInfo* leadingByWhole(const CopiesByVersion::value_type& copy);
 
 private:
-    // The texts that share a prefix lie together in the map, unless there are letters in it: those that are
-    // equal but for case lie apart (every lower-case letter is above every upper-case one) and meet in tables,
-    // which are made when the first such prefix is asked for.
+    // The texts that share a prefix lie together in the map. Only where letters are written in both cases do
+    // those that are equal but for case lie apart (every lower-case letter is above every upper-case one); there
+    // they meet in tables, which are made when the first prefix with a letter is asked for.
     struct Hash {
         std::size_t operator()(std::string_view text) const;
     };
@@ -69,9 +69,14 @@ private:
     };
     using Table = std::unordered_map<std::string_view, const InstallCopyInfo*, Hash, Equal>;
 
+    const InstallCopyInfo* inMap(const std::string& prefix, bool exact) const;
+    bool bothCases();
     void fillTables();
 
     const CopiesByVersion& copies_;
+    bool surveyed_ = false;
+    bool hasUpper_ = false;
+    bool hasLower_ = false;
     Table leading_;
     Table exact_;
 };
