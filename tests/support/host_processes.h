@@ -15,4 +15,7 @@ std::unique_ptr<IThreads> hostThreads();
 // The path of the test's child program, in the host's form.
 std::string childProgram();
 
+// How much a child writes on each stream in a flood: a pipe is slow where the host is emulated.
+extern const std::size_t kFloodMebibytes;
+
 }  // namespace kz7::test

@@ -6,6 +6,8 @@
 
 namespace kz7::test {
 
+const std::size_t kFloodMebibytes = 100;
+
 std::unique_ptr<IProcessHost> hostProcesses() {
     return std::make_unique<EmbeddedProcessHost>("/nonexistent");
 }

@@ -6,6 +6,8 @@
 
 namespace kz7::test {
 
+const std::size_t kFloodMebibytes = 10;
+
 std::unique_ptr<IProcessHost> hostProcesses() {
     return std::make_unique<WindowsProcessHost>();
 }
