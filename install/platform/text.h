@@ -29,7 +29,9 @@ public:
     explicit FixedText(std::string_view text) { assign(text); }
     FixedText(const FixedText& other) { assign(other.view()); }
     FixedText& operator=(const FixedText& other) {
-        assign(other.view());
+        if (this != &other) {
+            assign(other.view());
+        }
         return *this;
     }
 

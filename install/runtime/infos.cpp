@@ -39,7 +39,7 @@ void UREInfo::copyMissingText(FixedText<kMessageSize>& text) const {
 
 std::string_view UREInfo::taskList() const {
     const bool given = code_ == kCodeTaskList && insertCount_ != 0;
-    const auto* text = given ? std::get_if<std::string_view>(&inserts_[0]) : nullptr;
+    const auto* text = given ? std::get_if<std::string_view>(inserts_.data()) : nullptr;
     return text != nullptr ? *text : std::string_view{};
 }
 

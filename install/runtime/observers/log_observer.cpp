@@ -10,11 +10,11 @@
 namespace kz7 {
 namespace {
 
-constexpr std::size_t kMaxTitle = 44;         // characters
-constexpr std::size_t kMaxDate = 42;          // characters
-constexpr std::size_t kMaxSystemText = 79;    // characters
-constexpr std::size_t kTextStep = 256;        // bytes that the room for a text grows by
-constexpr std::size_t kKeptRoom = 64 * 1024;  // bytes of room that outlive a line
+constexpr std::size_t kMaxTitle = 44;       // characters
+constexpr std::size_t kMaxDate = 42;        // characters
+constexpr std::size_t kMaxSystemText = 79;  // characters
+constexpr std::size_t kTextStep = 256;      // bytes that the room for a text grows by
+constexpr std::size_t kKeptRoom = 1 << 16;  // bytes of room that outlive a line
 constexpr std::uint32_t kPrefixMask = 0x4000103;
 
 constexpr std::string_view kSeparator = "============================================================";
