@@ -70,62 +70,56 @@ TEST_F(AdminProgram, ShowsForReadingAndForPrograms) {
     EXPECT_EQ(tree.exitCode, 0);
     EXPECT_EQ(tree.error, "");
     EXPECT_EQ(tree.output, "store " + store_.file("registry.db") +
-                               "\nHKEY_LOCAL_MACHINE\n"
-                               "  K (class \"c\\x1b\")\n"
-                               "    @ REG_SZ \"a\\b\"\n"
-                               "    \"\\x0a\" REG_SZ \"\\x1b\\xe9\\u202e\xC3\xA9\" (without its end)\n"
-                               "    \"d\" REG_DWORD 255 (0xff)\n"
-                               "    \"m\" REG_MULTI_SZ \"a\" \"b\" \"\"\n"
-                               "    \"q\" REG_QWORD 4294967296 (0x100000000)\n"
-                               "    \"z\" type 99 01 ff\n"
-                               "    Sub\n");
+                               R"(
+HKEY_LOCAL_MACHINE
+  K (class "c\x1b")
+    @ REG_SZ "a\b"
+    "\x0a" REG_SZ "\x1b\xe9\u202e)"
+                               "\xC3\xA9"
+                               R"(" (without its end)
+    "d" REG_DWORD 255 (0xff)
+    "m" REG_MULTI_SZ "a" "b" ""
+    "q" REG_QWORD 4294967296 (0x100000000)
+    "z" type 99 01 ff
+    Sub
+)");
     const ProgramResult json = admin({"export", "--json", "HKLM\\K"});
     EXPECT_EQ(json.error, storeTold());
     EXPECT_EQ(json.output, "{\"store\":\"" + store_.file("registry.db") +
-                               "\",\"keys\":[\n"
-                               R"({"key":"HKEY_LOCAL_MACHINE\\K","class":"c\u001b","values":[)"
-                               "\n"
-                               R"(  {"name":"","type":1,"bytes":"615c6200","text":"a\\b"},)"
-                               "\n"
-                               R"(  {"name":"\u000a","type":1,"bytes":"1be9e280aec3a9","text":"\u001b\udce9)"
-                               "\xE2\x80\xAE\xC3\xA9\"},\n"
-                               R"(  {"name":"d","type":4,"bytes":"ff000000","number":255},)"
-                               "\n"
-                               R"(  {"name":"m","type":7,"bytes":"6100620000"},)"
-                               "\n"
-                               R"(  {"name":"q","type":11,"bytes":"0000000001000000","number":4294967296},)"
-                               "\n"
-                               R"(  {"name":"z","type":99,"bytes":"01ff"}]},)"
-                               "\n"
-                               R"({"key":"HKEY_LOCAL_MACHINE\\K\\Sub","class":"","values":[]}]})"
-                               "\n");
+                               R"(","keys":[
+{"key":"HKEY_LOCAL_MACHINE\\K","class":"c\u001b","values":[
+  {"name":"","type":1,"bytes":"615c6200","text":"a\\b"},
+  {"name":"\u000a","type":1,"bytes":"1be9e280aec3a9","text":"\u001b\udce9)"
+                               "\xE2\x80\xAE\xC3\xA9"
+                               R"("},
+  {"name":"d","type":4,"bytes":"ff000000","number":255},
+  {"name":"m","type":7,"bytes":"6100620000"},
+  {"name":"q","type":11,"bytes":"0000000001000000","number":4294967296},
+  {"name":"z","type":99,"bytes":"01ff"}]},
+{"key":"HKEY_LOCAL_MACHINE\\K\\Sub","class":"","values":[]}]}
+)");
 }
 
 TEST_F(AdminProgram, AnswersNoAndTellsFaults) {
     const std::string missing = store_.file("registry.db");
     const std::string bad = file(std::string(kHead) + "[HKLM\\a]\n\"x\"=\"y\"\n[HKLM\\b]\nrubbish\n");
-    const struct {
-        std::vector<std::string> arguments;
-        int exitCode;
-        std::string output;
-        std::string error;
-    } rows[] = {
-        {{"tree"}, 1, "store " + missing + "\n", told(missing + ": there is nothing to show")},
-        {{"export"}, 1, kHead, storeTold() + told(missing + ": there is nothing to show")},
-        {{"export", "HKU\\x\n"}, 1, "", storeTold() + told("HKEY_USERS\\x\\x0a: there is no such key")},
-        {{"tree", "HKCU"}, 1, "", told("HKEY_CURRENT_USER: there is no such key")},
-        {{"tree", "HKU\\" + std::string(256, 'x')},
-         2,
-         "",
-         told("HKEY_USERS\\" + std::string(256, 'x') + ": no key can be named so")},
-        {{"import", bad}, 2, "", told(bad + ":5: the line is no key, no value and no comment")},
+    const std::string unnamable = "HKU\\" + std::string(256, 'x');
+    // clang-format off
+    const struct { std::vector<std::string> arguments; int exitCode; std::string output; std::string error; } rows[] = {
+        {{"tree"},                1, "store " + missing + "\n", told(missing + ": there is nothing to show")},
+        {{"export"},              1, kHead, storeTold() + told(missing + ": there is nothing to show")},
+        {{"export", "HKU\\x\n"},  1, "", storeTold() + told("HKEY_USERS\\x\\x0a: there is no such key")},
+        {{"tree", "HKCU"},        1, "", told("HKEY_CURRENT_USER: there is no such key")},
+        {{"tree", unnamable},     2, "", told("HKEY_USERS" + unnamable.substr(3) + ": no key can be named so")},
+        {{"import", bad},         2, "", told(bad + ":5: the line is no key, no value and no comment")},
         {{"import", store_.path()}, 2, "", told(store_.path() + ": Is a directory")},
-        {{"import", "/none/such"}, 2, "", told("/none/such: No such file or directory")},
-        {{}, 2, "", told("no command is given (see --help)")},
-        {{"rubbish"}, 2, "", told("The following argument was not expected: rubbish (see --help)")},
+        {{"import", "/none/such"},  2, "", told("/none/such: No such file or directory")},
+        {{},                      2, "", told("no command is given (see --help)")},
+        {{"rubbish"},             2, "", told("The following argument was not expected: rubbish (see --help)")},
         {{"export", "--json", "--utf16"}, 2, "", told("--utf16 excludes --json (see --help)")},
-        {{"import"}, 2, "", told("FILE is required (see --help)")},
+        {{"import"},              2, "", told("FILE is required (see --help)")},
     };
+    // clang-format on
     for (const auto& row : rows) {
         const ProgramResult result = admin(row.arguments);
         EXPECT_EQ(result.exitCode, row.exitCode) << row.error;

@@ -167,40 +167,6 @@ TEST_F(ScriptedProcess, TellsWhatWasNotExecutedAndWhatCouldNotBe) {
     EXPECT_EQ(outputOf(process), "now");
 }
 
-TEST_F(ScriptedProcess, StopsItsReadersAfterTheTimeoutAndForgetsNothingElse) {
-    host_.addProgram("t.exe", {.output = "dropped", .exitCode = 4, .runsOn = true});
-    InstallProcess process(host_, threads_, sink_, "t.exe");
-    process.execute(false, false);
-    std::uint32_t code = 0;
-    EXPECT_EQ(process.waitForCompletion(code, 100), kSuccess);
-    EXPECT_EQ(code, kExitCodeRunning);
-    EXPECT_EQ(outputOf(process), "") << "what is read beside the stop flag is dropped, waking bytes and all";
-    EXPECT_EQ(process.waitForCompletion(code, kInfiniteWait), kSuccess);
-    EXPECT_EQ(code, 4U) << "it was not killed";
-
-    process.execute(false, false);
-    process.execute(true, false);
-    EXPECT_EQ(host_.started.size(), 3U);
-    EXPECT_EQ(outputOf(process), "dropped") << "the timeout of the last wait stays: none";
-}
-
-TEST_F(ScriptedProcess, AMessageTextStandsForTheExitCode) {
-    struct Reporting : InstallProcess {
-        using InstallProcess::InstallProcess;
-        using InstallProcess::messageText_;
-        using InstallProcess::resultCode_;
-    };
-    host_.addProgram("t.exe", {.exitCode = 3});
-    Reporting process(host_, threads_, sink_, "t.exe");
-    process.execute(true, false);
-    process.messageText_.assign("refused");
-    process.resultCode_ = -2;
-    std::uint32_t code = 0;
-    EXPECT_EQ(process.waitForCompletion(code, kInfiniteWait), kSuccess);
-    EXPECT_EQ(code, 0xFFFFFFFEU);
-    EXPECT_EQ(InstallProcess::lastMessage(), "refused");
-}
-
 // What comes of a run when one call of it fails, once or for good. A failed close closes, and nothing that fails
 // after the program's end changes how it ended.
 TEST_F(ScriptedProcess, AFailedCallOfARunGivesItsCodeAndLeavesNothingOpen) {
@@ -360,10 +326,6 @@ TEST_F(RealProcess, AnObjectMayGoWhileItsProgramRuns) {
     {
         InstallProcess process = make("gate " + gate.name() + " 0");
         process.execute(false, false);
-        InstallProcess flood = make("flood 0 0");
-        flood.execute(false, false);
-        flood.setCommand("other.exe");
-        EXPECT_EQ(flood.waitForCompletion(code_, 0), kNotExecuted);
     }
     gate.open();
 }

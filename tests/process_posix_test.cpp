@@ -10,6 +10,8 @@
 #include <filesystem>
 #include <fstream>
 #include <functional>
+#include <optional>
+#include <tuple>
 
 #include "install/platform/embedded/process_host.h"
 #include "install/platform/embedded/threads.h"
@@ -46,28 +48,19 @@ int inFork(const std::function<bool()>& body) {
     return ending;
 }
 
-struct Outcome {
-    Status status = kSuccess;  // of the wait
-    std::uint32_t code = 0;
-    std::string output;
-
-    bool operator==(const Outcome&) const = default;
-    friend std::ostream& operator<<(std::ostream& out, const Outcome& shown) {
-        return out << shown.status << ", exit code " << shown.code << ", " << shown.output;
-    }
-};
+using Outcome = std::tuple<Status, std::uint32_t, std::string>;  // of the wait, the exit code and the output
 
 Outcome outcomeOf(IProcessHost& host, const std::string& command, const char* directory = nullptr) {
     EmbeddedThreads threads;
     QuietSink sink;
     InstallProcess process(host, threads, sink, command.c_str(), directory);
     process.execute(true, false);
-    Outcome outcome;
-    outcome.status = process.waitForCompletion(outcome.code, kInfiniteWait);
-    outcome.output.resize(process.standardOutputLength() + 1);
-    process.copyStandardOutput(outcome.output.data(), outcome.output.size());
-    outcome.output.pop_back();
-    return outcome;
+    std::uint32_t code = 0;
+    const Status status = process.waitForCompletion(code, kInfiniteWait);
+    std::string output(process.standardOutputLength() + 1, '\0');
+    process.copyStandardOutput(output.data(), output.size());
+    output.pop_back();
+    return {status, code, output};
 }
 
 Outcome childOutcome(const std::string& arguments) {
@@ -136,8 +129,9 @@ TEST(PosixProcess, FindsProgramsWhereTheProductAndTheHostKeepThem) {
     EXPECT_EQ(outcomeOf(host, R"(C:\Program Files\x\run.cmd here)"), (Outcome{kSuccess, 0, "[here]"}));
     EXPECT_EQ(outcomeOf(host, "/bin/pwd", "C:\\Program Files"),
               (Outcome{kSuccess, 0, root + "/drive_c/Program Files\n"}));
-    EXPECT_EQ(outcomeOf(host, "/bin/pwd", "C:\\nowhere").status, kExitCodeUnavailable);
-    EXPECT_EQ(outcomeOf(host, "/bin/pwd", "drive_c").status, kExitCodeUnavailable) << "a relative folder is none";
+    const Outcome none{kExitCodeUnavailable, kExitCodeUnavailable, ""};
+    EXPECT_EQ(outcomeOf(host, "/bin/pwd", "C:\\nowhere"), none);
+    EXPECT_EQ(outcomeOf(host, "/bin/pwd", "drive_c"), none) << "a relative folder is none";
 }
 
 TEST(PosixProcess, AChildBeginsCleanWhateverItsParentHas) {
@@ -186,33 +180,6 @@ TEST(PosixProcess, RunsWithStandardDescriptorsClosedOrChildrenIgnored) {
     }
 }
 
-TEST(PosixProcess, TheProgramsOwnOutputStaysWhereItWent) {
-    const TemporaryDirectory folder;
-    const std::string output = folder.path() + "/output";
-    const std::string error = folder.path() + "/error";
-    EXPECT_EQ(inFork([&] {
-                  const bool redirected =
-                      std::freopen(output.c_str(), "w", stdout) != nullptr && std::freopen(error.c_str(), "w", stderr);
-                  EmbeddedProcessHost host("/nonexistent");
-                  for (int run = 0; run < 4; ++run) {
-                      std::printf("before %d\n", run);
-                      std::fprintf(stderr, "error %d\n", run);
-                      outcomeOf(host, childProgram() + (run == 2 ? "-missing.exe" : " print said cried 0"));
-                      // What is opened now may have a number that a slot still holds in another form.
-                      open(error.c_str(), O_RDONLY | O_CLOEXEC);
-                  }
-                  std::fflush(nullptr);
-                  return redirected;
-              }),
-              0);
-    const auto contents = [](const std::string& path) {
-        std::ifstream file(path);
-        return std::string(std::istreambuf_iterator<char>(file), {});
-    };
-    EXPECT_EQ(contents(output), "before 0\nbefore 1\nbefore 2\nbefore 3\n");
-    EXPECT_EQ(contents(error), "error 0\nerror 1\nerror 2\nerror 3\n");
-}
-
 // A thread that was joined, and a child that just ended, leave the tables of the kernel a moment later.
 bool eventually(const std::function<bool()>& holds) {
     for (int i = 0; i < 10'000'000 && !holds(); ++i) {
@@ -238,66 +205,36 @@ TEST(PosixProcess, LeavesNoDescriptorThreadOrZombie) {
     Gate left;
     Gate later;
     // clang-format off
-    const struct { std::string command; std::uint32_t timeout; bool wait; Gate* gate; } rows[] = {
-        {childProgram() + " print a b 0",                kInfiniteWait, true,  nullptr},
-        {childProgram() + " print a b 0",                kInfiniteWait, false, nullptr},
-        {childProgram() + "-missing.exe",                kInfiniteWait, true,  nullptr},
-        {childProgram() + " flood 1 0",                  kInfiniteWait, true,  nullptr},
-        {childProgram() + " flood 0 0",                  1,             false, nullptr},
-        {childProgram() + " leave " + left.name(),       kInfiniteWait, true,  &left},
-        {childProgram() + " gate " + gate.name() + " 0", 0,             false, &gate},
+    const struct {
+        std::string arguments; std::optional<std::uint32_t> timeout; Gate* before; Gate* after; const char* why;
+    } rows[] = {
+        {" print a b 0",                kInfiniteWait, nullptr, nullptr, "a whole run"},
+        {"-missing.exe",                kInfiniteWait, nullptr, nullptr, "it never starts"},
+        {" flood 1 0",                  kInfiniteWait, nullptr, nullptr, "a flood"},
+        {" flood 0 0",                  1,             nullptr, nullptr, "a timeout while it floods"},
+        {" leave " + left.name(),       kInfiniteWait, &left,   nullptr, "another holds its pipes"},
+        {" gate " + gate.name() + " 0", 0,             nullptr, &gate,   "it ends after the object"},
+        {" gate " + later.name() + " 0", std::nullopt, nullptr, &later,  "the same, never waited for"},
     };
     // clang-format on
     for (const auto& row : rows) {
         {
-            InstallProcess process(host, readers, sink, row.command.c_str());
-            process.execute(row.wait, false);
-            if (row.gate != nullptr && row.wait) {
-                row.gate->open();
+            InstallProcess process(host, readers, sink, (childProgram() + row.arguments).c_str());
+            process.execute(false, false);
+            if (row.before != nullptr) {
+                row.before->open();
             }
-            process.waitForCompletion(code, row.timeout);
+            if (row.timeout) {
+                process.waitForCompletion(code, *row.timeout);
+            }
         }
-        EXPECT_EQ(entries("/proc/self/fd"), descriptors) << row.command;
-        if (row.gate != nullptr && !row.wait) {
-            row.gate->open();
+        EXPECT_EQ(entries("/proc/self/fd"), descriptors) << row.why;
+        if (row.after != nullptr) {
+            row.after->open();
         }
-        EXPECT_TRUE(eventually(noChildren)) << row.command;
-        EXPECT_TRUE(eventually([&] { return entries("/proc/self/task") == threads; })) << row.command;
+        EXPECT_TRUE(eventually(noChildren)) << row.why;
+        EXPECT_TRUE(eventually([&] { return entries("/proc/self/task") == threads; })) << row.why;
     }
-    {
-        InstallProcess process(host, readers, sink, (childProgram() + " gate " + later.name() + " 0").c_str());
-        process.execute(false, false);
-    }
-    later.open();
-    EXPECT_TRUE(eventually(noChildren)) << "never waited for";
-    EXPECT_TRUE(eventually([&] { return entries("/proc/self/task") == threads; }));
-    EXPECT_EQ(entries("/proc/self/fd"), descriptors);
-}
-
-TEST(PosixProcess, RunsOutOfDescriptorsWithoutRunningAnything) {
-    EXPECT_EQ(inFork([] {
-                  EmbeddedProcessHost host("/nonexistent");
-                  EmbeddedThreads threads;
-                  QuietSink sink;
-                  InstallProcess process(host, threads, sink, (childProgram() + " print said cried 5").c_str());
-                  std::vector<int> taken;
-                  for (int taking = dup(0); taking != -1; taking = dup(0)) {
-                      taken.push_back(taking);
-                  }
-                  bool held = true;
-                  std::uint32_t code = 0;
-                  // One more free descriptor each time: the first run that is whole has all it needs.
-                  for (int free = 0; code != 5 && held; ++free) {
-                      held = process.execute(true, false) == kSuccess && free < 20;
-                      const Status status = process.waitForCompletion(code, kInfiniteWait);
-                      held =
-                          held && (status == (code == 5 ? kSuccess : kNotExecuted) || status == kExitCodeUnavailable);
-                      close(taken.back());
-                      taken.pop_back();
-                  }
-                  return held && code == 5;
-              }),
-              0);
 }
 
 }  // namespace
