@@ -32,6 +32,10 @@ std::uint64_t allocations = 0;
     return memory;
 }
 
+[[gnu::noinline]] void* operator new(std::size_t size, const std::nothrow_t&) noexcept {
+    return std::malloc(size == 0 ? 1 : size);
+}
+
 [[gnu::noinline]] void operator delete(void* memory) noexcept {
     std::free(memory);
 }
