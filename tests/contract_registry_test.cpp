@@ -201,6 +201,7 @@ TEST_P(RegistryContract, OperationsAnswerByTheStateOfTheirHandle) {
     const KeyHandle shut = closed.get();
     closed.reset();
     for (const auto& row : rows) {
+        below.reset();  // a host may have given it the number of the key that was shut
         EXPECT_EQ(row.operation(shut), kInvalidHandle) << row.why;
         EXPECT_EQ(row.operation(KeyHandle::none), kInvalidHandle) << row.why;
         EXPECT_EQ(row.operation(gone.get()), kKeyDeleted) << row.why;
@@ -209,6 +210,7 @@ TEST_P(RegistryContract, OperationsAnswerByTheStateOfTheirHandle) {
         EXPECT_EQ(row.operation(setting.get()), row.set) << row.why;
         EXPECT_EQ(row.operation(listing.get()), row.list) << row.why;
     }
+    below.reset();
     EXPECT_EQ(registry_.closeKey(shut), kInvalidHandle);
     EXPECT_EQ(registry_.closeKey(KeyHandle::none), kInvalidHandle);
     const KeyHandle deleted = gone.get();
