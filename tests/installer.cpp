@@ -11,7 +11,7 @@
 #include "install/runtime/observers/human_stream.h"
 #include "install/runtime/observers/log_observer.h"
 #include "install/runtime/observers/machine_stream.h"
-#include "tests/support/runtime_ports.h"
+#include "install/runtime/runtime_ports.h"
 
 namespace kz7::test {
 namespace {
@@ -56,7 +56,7 @@ int main(int argc, char** argv) {
         return 2;
     }
     const auto platform = hostPlatform({.program = "kz7_installer"});
-    URE engine(test::portsOf(*platform));
+    URE engine(portsOf(*platform));
     engine.mode = kModeInstall;
     URELogObserver* log = URELogObserver::getInstance(engine);
     log->setLogFile(argv[1]);

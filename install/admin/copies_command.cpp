@@ -5,12 +5,12 @@
 #include <map>
 #include <optional>
 
+#include "install/admin/copy_location.h"
 #include "install/admin/json_text.h"
 #include "install/admin/text_table.h"
 #include "install/platform/text.h"
 #include "install/src/copies/install_copies.h"
 #include "install/src/copy_layout.h"
-#include "install/src/registry_access.h"
 #include "install/src/services/management_service.h"
 
 namespace kz7 {
@@ -35,14 +35,6 @@ struct CopyRow {
 };
 
 using CopyRows = std::map<std::string, CopyRow>;  // by upper-cased name
-
-std::string locationOf(IRegistryStore& registry, const std::string& path) {
-    OwnedKey key(registry);
-    FixedBuffer<10000> location;
-    const bool read = registry.openKey(KeyHandle::localMachine, path, kKeyRead, key.receive()) == kSuccess &&
-                      queryText(registry, key.get(), layout::kPathName, location) == kSuccess;
-    return read ? std::string(location.text()) : std::string{};
-}
 
 // A view without its key has no copies.
 Status readView(Admin& admin, std::size_t view, CopyRows& rows) {

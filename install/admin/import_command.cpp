@@ -1,33 +1,14 @@
 #include "install/admin/import_command.h"
 
 #include <CLI/CLI.hpp>
-#include <cerrno>
-#include <cstdio>
 #include <cstring>
 
+#include "install/admin/input_file.h"
 #include "install/admin/reg_text.h"
 #include "install/platform/text.h"
 
 namespace kz7 {
 namespace {
-
-// The whole of a file, or of standard input for "-"; 0 or the error of the call that failed.
-int readFile(const std::string& path, std::string& bytes) {
-    std::FILE* file = path == "-" ? stdin : std::fopen(path.c_str(), "rb");
-    if (file == nullptr) {
-        return errno;
-    }
-    char piece[1 << 14];
-    errno = 0;
-    for (std::size_t size = 0; (size = std::fread(piece, 1, sizeof piece, file)) != 0;) {
-        bytes.append(piece, size);
-    }
-    const int error = std::ferror(file) == 0 ? 0 : errno;
-    if (file != stdin) {
-        std::fclose(file);
-    }
-    return error;
-}
 
 Answer importFile(Admin& admin, const std::string& path) {
     if (!admin.open(false)) {
@@ -35,7 +16,7 @@ Answer importFile(Admin& admin, const std::string& path) {
     }
     const std::string shown = path == "-" ? "standard input" : shownText(path);
     std::string file;
-    if (const int error = readFile(path, file); error != 0) {
+    if (const int error = readInput(path, file); error != 0) {
         return admin.fault(shown + ": " + std::strerror(error));
     }
     std::vector<KeyChange> changes;

@@ -4,6 +4,7 @@
 #include <new>
 
 #include "install/admin/aliases_command.h"
+#include "install/admin/commit_command.h"
 #include "install/admin/copies_command.h"
 #include "install/admin/export_command.h"
 #include "install/admin/front_command.h"
@@ -20,6 +21,7 @@ int run(int argc, char** argv) {
     program.require_subcommand(0, 1);
     program.fallthrough();
     addAliasesCommand(program, admin);
+    addCommitCommand(program, admin);
     addCopiesCommand(program, admin);
     addExportCommand(program, admin);
     addFrontCommand(program, admin);

@@ -41,6 +41,10 @@ public:
     // name '?' stands for any one character. kFileNotFound: none.
     virtual Status findFile(std::string_view pattern, std::string& name) = 0;
 
+    // The product's path for what people here call one; a relative one begins in the folder the process was
+    // started in. kInvalidName: the product has none.
+    virtual Status productPath(std::string_view hostPath, std::string& path) = 0;
+
     // What people here call a path.
     virtual std::string shownPath(std::string_view path) = 0;
 };

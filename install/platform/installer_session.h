@@ -2,7 +2,9 @@
 // call of the installer's interface that is made. It comes with a custom action's handle, not with the machine.
 #pragma once
 
+#include <array>
 #include <cstdint>
+#include <memory>
 #include <string_view>
 
 #include "install/platform/buffer.h"
@@ -11,7 +13,7 @@
 
 namespace kz7 {
 
-// A record of the session; whatever else of it is opened is closed alike.
+// A record, a view or the database of the session; all are closed alike.
 enum class SessionHandle : std::uint64_t { none = 0 };
 
 // The kind of a message; the numbers are the installer's. Errors and user messages may carry the bits of a
@@ -33,14 +35,51 @@ inline constexpr std::uint32_t kBoxRightToLeft     = 0x100000;
 inline constexpr std::int32_t kBoxAnswerOk = 1;  // what processMessage() answers for a button
 inline constexpr std::int32_t kBoxAnswerCancel = 2;
 
+// What a custom action runs as; the numbers are the installer's. One that runs as neither is immediate.
+enum class RunMode : std::uint32_t { scheduled = 16, rollback = 17 };
+
+// How a feature is, or is to be, installed; the numbers are the installer's.
+enum class FeatureState : std::int32_t { unknown = -1, advertised = 1, absent = 2, local = 3, source = 4 };
+
 // Outputs are written on success only, but for Buffer::size. kInvalidHandle: not an open handle. One thread.
+//
+// A scheduled action, a rollback too, reads the properties that kReadableWhenScheduled names and writes messages;
+// any other property is empty to it, and all else fails.
+inline constexpr std::array<std::string_view, 3> kReadableWhenScheduled = {"CustomActionData", "UserSID",
+                                                                           "ProductCode"};
+
 class IInstallerSession {
 public:
     virtual ~IInstallerSession() = default;
 
-    // An unknown property is empty. kMoreData: `value` is too small; its size then is a hint, which may be
-    // larger than what is needed.
+    virtual Status runMode(RunMode mode, bool& isOn) = 0;
+
+    // An unknown property is empty. The size is the value's without a NUL, which must fit too. kMoreData: the
+    // size then is a hint, which may be larger than the value's.
     virtual Status getProperty(std::string_view name, Buffer& value) = 0;
+
+    // An empty value unsets it.
+    virtual Status setProperty(std::string_view name, std::string_view value) = 0;
+
+    // kUnknownFeature: the installation has none of that name.
+    virtual Status featureState(std::string_view feature, FeatureState& installed, FeatureState& requested) = 0;
+
+    // Runs an action of the installation by name.
+    virtual Status doAction(std::string_view name) = 0;
+
+    // The database of the installation. kInvalidHandle: there is none. The caller closes it.
+    virtual Status activeDatabase(SessionHandle& database) = 0;
+
+    // A view of the rows that a query gives, once it is executed. The caller closes it.
+    virtual Status openView(SessionHandle database, std::string_view query, SessionHandle& view) = 0;
+    virtual Status executeView(SessionHandle view) = 0;
+
+    // The next row. kNoMoreItems past the last. The caller closes it.
+    virtual Status fetchRecord(SessionHandle view, SessionHandle& record) = 0;
+
+    // A field, counted from 1; its size is without a NUL, which must fit too, and after kMoreData that of the
+    // whole.
+    virtual Status recordString(SessionHandle record, std::uint32_t field, Buffer& text) = 0;
 
     // A record with that many fields, counted from 1; field 0 is its template. The caller closes it.
     virtual Status createRecord(std::uint32_t fields, SessionHandle& record) = 0;
@@ -53,6 +92,10 @@ public:
 
     virtual Status closeHandle(SessionHandle handle) = 0;
 };
+
+// The session of the installation handle that a custom action was called with; it stays the installer's. Only where
+// there is an installer.
+std::unique_ptr<IInstallerSession> hostInstallerSession(std::uint32_t installation);
 
 struct SessionTraits {
     using Port = IInstallerSession;

@@ -25,6 +25,7 @@ struct PlatformOptions {
     std::string stateDirectory = {};  // where an embedded store lives; empty: this user's usual place
     bool readOnly = false;            // reads what is there, takes no writer's lock, creates nothing
     bool plainStreams = false;        // standard input and output carry bytes, their line ends stay as they are
+    bool ownProcess = true;           // false: a library in somebody else's, which leaves the process as it is
 };
 
 // The references stay valid as long as the platform. One thread.
@@ -45,6 +46,9 @@ public:
     virtual IClock& clock() = 0;
     virtual ITerminal& terminal() = 0;
     virtual IHostIdentity& identity() = 0;
+
+    // The folder of what the programs keep for themselves, one of the product's paths; made where it is missing.
+    virtual Status ownFolder(std::string& path) = 0;
 
     // The store's name for people: the file it is kept in, or the machine's registry.
     virtual std::string storeName() = 0;

@@ -49,8 +49,12 @@ const char* iSubstituteCopyName(const char* text, const char* copyName, std::uin
     if (same) {
         return text;
     }
-    sharedOutput = result;
+    overwriteSharedOutput(result.view());
     return sharedOutput.c_str();
+}
+
+void overwriteSharedOutput(std::string_view text) {
+    sharedOutput.assign(text);
 }
 
 }  // namespace kz7

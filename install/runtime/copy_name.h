@@ -21,4 +21,7 @@ std::string substituteCopyName(std::string_view text, std::string_view copyName)
 // `text` with its terminator is longer than `outputSize`, which is checked before substituting only.
 const char* iSubstituteCopyName(const char* text, const char* copyName, std::uint32_t outputSize, char* output);
 
+// Puts a text, cut to kSubstitutedSize, into the process-wide buffer of iSubstituteCopyName().
+void overwriteSharedOutput(std::string_view text);
+
 }  // namespace kz7

@@ -12,6 +12,15 @@ constexpr Status kLastOwnStatus = 6100;
 
 }  // namespace
 
+void URE::takeResponses(std::vector<ResponseKeyword> keywords) {
+    responses = std::move(keywords);
+    for (const ResponseKeyword& keyword : responses) {
+        if (equalsIgnoreCase(keyword.name, kProductKeyword)) {
+            productAbbreviation = keyword.value;
+        }
+    }
+}
+
 void URE::registerObserver(IObserver& observer, Takes takes) {
     observers_.push_back({&observer, takes});
 }

@@ -33,6 +33,8 @@ inline constexpr std::uint32_t kModeRemove    = 0x04;
 inline constexpr std::uint32_t kModeConfigure = 0x10;
 // clang-format on
 
+inline constexpr std::string_view kProductKeyword = "PROD";  // of a response file
+
 // They outlive the engine.
 struct RuntimePorts {
     IFileSystem& files;
@@ -60,6 +62,9 @@ public:
     std::string productAbbreviation;
     std::string installationPath;
     std::vector<ResponseKeyword> responses;  // of the response file, in its order; empty without one
+
+    // Keeps what a response file says, its kProductKeyword as the product's abbreviation too.
+    void takeResponses(std::vector<ResponseKeyword> keywords);
 
     // Each is called while it is registered; the caller unregisters it before it goes. What an observer causes
     // while it is being called does not reach it: it never reports into itself.

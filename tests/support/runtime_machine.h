@@ -9,7 +9,7 @@
 #include "install/runtime/observers/log_observer.h"
 #include "install/runtime/observers/machine_stream.h"
 #include "install/runtime/ure.h"
-#include "tests/support/runtime_ports.h"
+#include "install/runtime/runtime_ports.h"
 
 namespace kz7::test {
 

@@ -4,7 +4,9 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
+#include <filesystem>
 #include <memory>
 
 #include "install/platform/embedded/paths.h"
@@ -135,6 +137,18 @@ Status EmbeddedFileSystem::findFile(std::string_view pattern, std::string& name)
         return kFileNotFound;
     }
     name = std::move(first);
+    return kSuccess;
+}
+
+Status EmbeddedFileSystem::productPath(std::string_view hostPath, std::string& path) {
+    std::error_code error;
+    std::string whole = std::filesystem::absolute(hostPath, error).string();
+    // A backslash separates in the product's paths.
+    if (error || whole.find('\\') != std::string::npos || whole.find('\0') != std::string::npos) {
+        return kInvalidName;
+    }
+    std::replace(whole.begin(), whole.end(), '/', '\\');
+    path = std::move(whole);
     return kSuccess;
 }
 

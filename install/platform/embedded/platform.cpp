@@ -6,6 +6,7 @@
 #include <cerrno>
 #include <csignal>
 #include <cstdlib>
+#include <filesystem>
 
 #include "install/platform/embedded/assembly_cache.h"
 #include "install/platform/embedded/clock.h"
@@ -55,6 +56,11 @@ public:
     IClock& clock() override { return clock_; }
     ITerminal& terminal() override { return terminal_; }
     IHostIdentity& identity() override { return identity_; }
+    Status ownFolder(std::string& path) override {
+        std::error_code error;
+        std::filesystem::create_directories(directory_, error);
+        return error ? kPathNotFound : files_.productPath(directory_, path);
+    }
     std::string storeName() override { return registry_.path(); }
     bool storeIsOwn() override { return true; }
     bool storeFaultTold() override { return faultTold_; }
@@ -88,10 +94,12 @@ private:
 }  // namespace
 
 std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options) {
-    settleInheritedState();
-    // A reader that went away or a file at its limit is a status of the write, never the end of a half-done run.
-    std::signal(SIGPIPE, SIG_IGN);
-    std::signal(SIGXFSZ, SIG_IGN);
+    if (options.ownProcess) {
+        settleInheritedState();
+        // A reader that went away or a file at its limit is a status of the write, never the end of a half-done run.
+        std::signal(SIGPIPE, SIG_IGN);
+        std::signal(SIGXFSZ, SIG_IGN);
+    }
     return std::make_unique<EmbeddedPlatform>(options);
 }
 

@@ -29,6 +29,9 @@ public:
     Status findFile(std::string_view pattern, std::string& name) override {
         return unlessFailing(faults_, "findFile", [&] { return real_.findFile(pattern, name); });
     }
+    Status productPath(std::string_view hostPath, std::string& path) override {
+        return unlessFailing(faults_, "productPath", [&] { return real_.productPath(hostPath, path); });
+    }
     std::string shownPath(std::string_view path) override { return real_.shownPath(path); }
 
 private:

@@ -42,6 +42,11 @@ Status MemoryFileSystem::readFile(std::string_view path, std::string& content) {
     return kSuccess;
 }
 
+Status MemoryFileSystem::productPath(std::string_view hostPath, std::string& path) {
+    path = hostPath;
+    return kSuccess;
+}
+
 Status MemoryFileSystem::openForAppend(std::string_view path, FileHandle& file) {
     const std::string key = keyOf(path);
     if (key.empty()) {

@@ -2,17 +2,125 @@
 
 #include <algorithm>
 
-#include "install/platform/registry_path.h"
-
 namespace kz7 {
+
+namespace {
+
+constexpr std::string_view kPropertyQuery = "SELECT `Property` FROM `Property` ORDER BY `Property`";
+constexpr std::size_t kBeforeExecution = static_cast<std::size_t>(-1);
+
+// A text with its NUL where it fits; else its size times a factor.
+Status giveText(std::string_view text, Buffer& room, std::uint32_t hintFactor) {
+    const auto length = static_cast<std::uint32_t>(text.size());
+    if (length >= room.capacity) {
+        room.size = length * hintFactor;
+        return kMoreData;
+    }
+    room.data[text.copy(room.data, length)] = '\0';
+    room.size = length;
+    return kSuccess;
+}
+
+}  // namespace
+
+Status MemoryInstallerSession::runMode(RunMode mode, bool& isOn) {
+    isOn = mode == RunMode::rollback ? isRollback : isScheduled;
+    return kSuccess;
+}
 
 Status MemoryInstallerSession::getProperty(std::string_view name, Buffer& value) {
     const auto found = properties.find(name);
-    return giveName(found == properties.end() ? std::string_view{} : found->second, value);
+    const bool readable = mayReach() || std::find(kReadableWhenScheduled.begin(), kReadableWhenScheduled.end(), name) !=
+                                            kReadableWhenScheduled.end();
+    // The installer counts the room that was missing twice.
+    return giveText(found == properties.end() || !readable ? std::string_view{} : found->second, value, 2);
+}
+
+Status MemoryInstallerSession::setProperty(std::string_view name, std::string_view value) {
+    if (!mayReach()) {
+        return kFunctionFailed;
+    }
+    if (value.empty()) {
+        properties.erase(std::string(name));
+    } else {
+        properties.insert_or_assign(std::string(name), std::string(value));
+    }
+    return kSuccess;
+}
+
+Status MemoryInstallerSession::featureState(std::string_view feature, FeatureState& installed,
+                                            FeatureState& requested) {
+    const auto found = features.find(feature);
+    if (!mayReach() || found == features.end()) {
+        return mayReach() ? kUnknownFeature : kInvalidHandle;
+    }
+    installed = found->second.installed;
+    requested = found->second.requested;
+    return kSuccess;
+}
+
+Status MemoryInstallerSession::doAction(std::string_view name) {
+    const auto found = actions.find(name);
+    if (!mayReach() || found == actions.end()) {
+        return mayReach() ? kActionNotCalled : kInvalidHandle;
+    }
+    found->second();
+    return kSuccess;
+}
+
+Status MemoryInstallerSession::activeDatabase(SessionHandle& database) {
+    if (!mayReach() || !hasDatabase) {
+        return kInvalidHandle;
+    }
+    database = *databases_.insert(nextHandle()).first;
+    return kSuccess;
+}
+
+Status MemoryInstallerSession::openView(SessionHandle database, std::string_view query, SessionHandle& view) {
+    if (databases_.count(database) == 0) {
+        return kInvalidHandle;
+    }
+    if (query != kPropertyQuery) {
+        return kBadQuery;
+    }
+    view = nextHandle();
+    views_.emplace(view, kBeforeExecution);
+    return kSuccess;
+}
+
+Status MemoryInstallerSession::executeView(SessionHandle view) {
+    const auto found = views_.find(view);
+    if (found == views_.end()) {
+        return kInvalidHandle;
+    }
+    found->second = 0;
+    return kSuccess;
+}
+
+Status MemoryInstallerSession::fetchRecord(SessionHandle view, SessionHandle& record) {
+    const auto found = views_.find(view);
+    if (found == views_.end()) {
+        return kInvalidHandle;
+    }
+    if (found->second >= tableRows.size()) {
+        return found->second == kBeforeExecution ? kFunctionFailed : kNoMoreItems;
+    }
+    record = nextHandle();
+    records_.emplace(record, std::vector<std::string>{std::string{}, tableRows[found->second++]});
+    return kSuccess;
+}
+
+Status MemoryInstallerSession::recordString(SessionHandle record, std::uint32_t field, Buffer& text) {
+    const auto found = records_.find(record);
+    if (found == records_.end()) {
+        return kInvalidHandle;
+    }
+    return giveText(field < found->second.size() ? std::string_view(found->second[field]) : std::string_view{}, text,
+                    1);
 }
 
 Status MemoryInstallerSession::createRecord(std::uint32_t fields, SessionHandle& record) {
-    record = SessionHandle{++lastHandle_};
+    record = nextHandle();
     records_.emplace(record, std::vector<std::string>(fields + 1));
     return kSuccess;
 }
@@ -43,7 +151,7 @@ Status MemoryInstallerSession::processMessage(std::uint32_t kind, SessionHandle 
 }
 
 Status MemoryInstallerSession::closeHandle(SessionHandle handle) {
-    return records_.erase(handle) != 0 ? kSuccess : kInvalidHandle;
+    return records_.erase(handle) + views_.erase(handle) + databases_.erase(handle) != 0 ? kSuccess : kInvalidHandle;
 }
 
 // "[Name]" is the property's value, "[\\x]" the character x, "[1]" a field and left for a reader as it is.

@@ -33,6 +33,10 @@ public:
     IClock& clock() override { return clock_; }
     ITerminal& terminal() override { return terminal_; }
     IHostIdentity& identity() override { return identity_; }
+    Status ownFolder(std::string& path) override {
+        path = "C:\\KZ7State";
+        return kSuccess;
+    }
     std::string storeName() override { return "memory"; }
     std::string storeNote() override { return {}; }
     bool storeIsOwn() override { return true; }

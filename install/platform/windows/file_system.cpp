@@ -118,4 +118,16 @@ Status WindowsFileSystem::findFile(std::string_view pattern, std::string& name) 
     return kSuccess;
 }
 
+Status WindowsFileSystem::productPath(std::string_view hostPath, std::string& path) {
+    const std::string given(hostPath);
+    std::string whole(GetFullPathNameA(given.c_str(), 0, nullptr, nullptr), '\0');
+    const DWORD length = GetFullPathNameA(given.c_str(), static_cast<DWORD>(whole.size()), whole.data(), nullptr);
+    whole.resize(length < whole.size() ? length : 0);
+    if (namesNothing(whole)) {
+        return kInvalidName;
+    }
+    path = std::move(whole);
+    return kSuccess;
+}
+
 }  // namespace kz7

@@ -41,6 +41,17 @@ public:
     IClock& clock() override { return clock_; }
     ITerminal& terminal() override { return terminal_; }
     IHostIdentity& identity() override { return identity_; }
+    // The caller's own, so that nobody else can have put something in its place.
+    Status ownFolder(std::string& path) override {
+        char folder[MAX_PATH];
+        const DWORD length = GetEnvironmentVariableA("LOCALAPPDATA", folder, sizeof folder);
+        const std::string own = std::string(folder, length < sizeof folder ? length : 0) + "\\KZ7";
+        if (length == 0 ||
+            (CreateDirectoryA(own.c_str(), nullptr) == FALSE && GetLastError() != ERROR_ALREADY_EXISTS)) {
+            return kPathNotFound;
+        }
+        return files_.productPath(own, path);
+    }
     std::string storeName() override { return "the registry of this machine"; }
     std::string storeNote() override { return {}; }
     bool storeIsOwn() override { return false; }
@@ -65,8 +76,10 @@ private:
 }  // namespace
 
 std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options) {
-    // Libraries that the system loads for itself are not taken from the current folder either.
-    SetDllDirectoryA("");
+    if (options.ownProcess) {
+        // Libraries that the system loads for itself are not taken from the current folder either.
+        SetDllDirectoryA("");
+    }
     if (options.plainStreams) {
         _setmode(_fileno(stdin), _O_BINARY);
         _setmode(_fileno(stdout), _O_BINARY);

@@ -4,7 +4,7 @@
 #include "install/platform/platform.h"
 #include "install/runtime/ure.h"
 
-namespace kz7::test {
+namespace kz7 {
 
 inline RuntimePorts portsOf(IPlatform& platform, IInstallerSession* session = nullptr) {
     return {platform.files(),   platform.processes(), platform.threads(),
@@ -12,4 +12,4 @@ inline RuntimePorts portsOf(IPlatform& platform, IInstallerSession* session = nu
             platform.clock(),   platform.identity(),  session};
 }
 
-}  // namespace kz7::test
+}  // namespace kz7

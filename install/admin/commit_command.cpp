@@ -1,0 +1,133 @@
+#include "install/admin/commit_command.h"
+
+#include <CLI/CLI.hpp>
+#include <algorithm>
+#include <cstring>
+
+#include "install/admin/configuration_run.h"
+#include "install/admin/copy_location.h"
+#include "install/admin/input_file.h"
+#include "install/platform/text.h"
+#include "install/runtime/config_handler.h"
+#include "install/runtime/copy_name.h"
+#include "install/runtime/observers/log_observer.h"
+#include "install/src/copy_layout.h"
+
+namespace kz7 {
+namespace {
+
+struct Words {
+    std::string copy;
+    std::string instance;
+    std::string responseFile;
+    std::string logFile;
+    bool machine = false;
+};
+
+// Whether a name is one part of a path, of the registry's and of the host's.
+bool isOneName(const std::string& name) {
+    return name != "." && name != ".." &&
+           std::none_of(name.begin(), name.end(), [](char c) { return c == '\\' || c == '/' || (c >= 0 && c < ' '); });
+}
+
+Answer readResponses(Admin& admin, const Words& words, ConfigurationRequest& request) {
+    const std::string shown = words.responseFile == "-" ? "standard input" : shownText(words.responseFile);
+    std::string file;
+    if (const int error = readInput(words.responseFile, file); error != 0) {
+        return admin.fault(shown + ": " + std::strerror(error));
+    }
+    ResponseFault bad;
+    if (parseResponseFile(file, request.responses, bad) != kSuccess) {
+        return admin.fault(compose("%s:%u: %s", {shown, bad.line, bad.reason}));
+    }
+    return kAnswerYes;
+}
+
+Answer findCopy(Admin& admin, const Words& words, ConfigurationRequest& request) {
+    const std::string shown = shownText(words.copy);
+    const std::string path = substituteCopyName(layout::kCopy, words.copy);
+    OwnedKey key(admin.registry());
+    const Status status = words.copy.empty() || !isOneName(words.copy)
+                              ? kFileNotFound
+                              : admin.registry().openKey(KeyHandle::localMachine, path, kKeyRead, key.receive());
+    if (isNotFound(status)) {
+        return admin.fault(shown + ": there is no such copy (see kz7admin copies)");
+    }
+    if (status != kSuccess) {
+        return admin.storeFault(shown + ": cannot be read", status);
+    }
+    request.copy = words.copy;
+    request.location = locationOf(admin.registry(), path);
+    return request.location.empty() ? admin.fault(shown + ": the copy has no location") : kAnswerYes;
+}
+
+// The log must open before anything is done.
+Answer findLog(Admin& admin, const Words& words, ConfigurationRequest& request) {
+    IFileSystem& files = admin.platform().files();
+    Status status = kSuccess;
+    if (words.logFile.empty()) {
+        status = admin.platform().ownFolder(request.logFile);
+        request.logFile.append("\\").append(kLogFileName);
+    } else {
+        status = files.productPath(words.logFile, request.logFile);
+    }
+    if (status == kSuccess && request.logFile.size() >= kPathSize) {
+        status = kFilenameExceedsRange;
+    }
+    OwnedFile log(files);
+    if (status == kSuccess) {
+        status = files.openForAppend(request.logFile, log.receive());
+    }
+    const std::string shown = words.logFile.empty() ? files.shownPath(request.logFile) : words.logFile;
+    return status == kSuccess
+               ? kAnswerYes
+               : admin.fault(compose("%s: the log cannot be written: error %u", {shownText(shown), status}));
+}
+
+Answer commit(Admin& admin, const Words& words) {
+    if (words.instance.size() > kMaxInstanceName || !isOneName(words.instance)) {
+        return admin.open(true) ? admin.fault(compose("%s: an instance name has at most %u characters and no separator",
+                                                      {shownText(words.instance), std::uint32_t{kMaxInstanceName}}))
+                                : kAnswerFault;
+    }
+    if (!admin.open(false)) {
+        return kAnswerFault;
+    }
+    ConfigurationRequest request;
+    request.instance = words.instance;
+    request.machine = words.machine;
+    for (const auto step : {readResponses, findCopy, findLog}) {
+        if (const Answer answer = step(admin, words, request); answer != kAnswerYes) {
+            return answer;
+        }
+    }
+    const std::string log = admin.platform().files().shownPath(request.logFile);
+    const ConfigurationOutcome outcome = runConfiguration(admin.platform(), std::move(request));
+    if (outcome.kept != kSuccess) {
+        return admin.storeFault(shownText(words.copy) + ": what was set cannot be kept", outcome.kept);
+    }
+    if (!words.machine) {
+        const Answer told = admin.write(compose("%s: %u set, %u not set; the log is %s\n",
+                                                {shownText(words.copy), outcome.set, outcome.notSet, shownText(log)}));
+        if (told != kAnswerYes) {
+            return told;
+        }
+    }
+    return outcome.notSet == 0 ? kAnswerYes : kAnswerNo;
+}
+
+}  // namespace
+
+void addCommitCommand(CLI::App& program, Admin& admin) {
+    auto* command = program.add_subcommand("commit", "Set what a response file says for a copy");
+    auto words = std::make_shared<Words>();
+    command->add_option("--copy", words->copy, "The copy's name")->required();
+    command->add_option("--response-file", words->responseFile, "Lines NAME = value; \"-\" is standard input")
+        ->required();
+    command->add_option("--instance", words->instance, "The instance that it is set for; without: all of the copy");
+    command->add_option("--log", words->logFile, "The log; without: kz7msi.log in the state directory");
+    command->add_flag("--machine", words->machine, "Speak the progress protocol, for a front end");
+    command->callback([&admin, words] { admin.answer = [&admin, words] { return commit(admin, *words); }; });
+}
+
+}  // namespace kz7

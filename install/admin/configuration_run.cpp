@@ -1,0 +1,109 @@
+#include "install/admin/configuration_run.h"
+
+#include "install/runtime/config_handler.h"
+#include "install/runtime/observers/human_stream.h"
+#include "install/runtime/observers/log_observer.h"
+#include "install/runtime/observers/machine_stream.h"
+#include "install/runtime/runtime_ports.h"
+
+namespace kz7 {
+namespace {
+
+constexpr std::int32_t kVariablesTask = 1;
+constexpr std::int32_t kParametersTask = 2;
+constexpr std::string_view kTasks = "1,10;2,90";  // with the share of the time that each takes
+constexpr std::uint64_t kParametersStart = 10;
+
+// The log and the stream of one run, which both end with it.
+class Observers {
+public:
+    Observers(URE& engine, const std::string& logFile, bool machine) : engine_(engine) {
+        log_ = URELogObserver::getInstance(engine);
+        if (machine) {
+            stream_ = UREExternalObserverMachineStream::getInstance(engine);
+        } else {
+            stream_ = UREExternalObserverHumanStream::getInstance(engine);
+        }
+        if (stream_ != nullptr) {
+            engine.registerObserver(*stream_);
+        }
+        if (log_ != nullptr) {
+            log_->setLogFile(logFile);
+            engine.registerObserver(*log_, Takes::everything);
+        }
+    }
+    Observers(const Observers&) = delete;
+    Observers& operator=(const Observers&) = delete;
+    ~Observers() {
+        if (log_ != nullptr) {
+            log_->writeHeader(true);
+            engine_.unregisterObserver(*log_);
+        }
+        if (stream_ != nullptr) {
+            engine_.unregisterObserver(*stream_);
+        }
+        // The last line of a front end names the log.
+        UREExternalObserverMachineStream::release();
+        UREExternalObserverHumanStream::release();
+        URELogObserver::release();
+    }
+
+private:
+    URE& engine_;
+    URELogObserver* log_ = nullptr;
+    UREExternalObserverStream* stream_ = nullptr;
+};
+
+// How many of the names nothing has; each is reported.
+std::uint32_t record(URE& engine, KZ7CfgHandler& handler) {
+    std::uint32_t unknown = 0;
+    for (const ResponseKeyword& keyword : engine.responses) {
+        if (!equalsIgnoreCase(keyword.name, kProductKeyword) &&
+            handler.recordVariable(keyword.name, keyword.value) != kSuccess &&
+            handler.recordParameter(keyword.name, keyword.value) != kSuccess) {
+            const std::array<Insert, 2> inserts = {keyword.name, keyword.line};
+            engine.message(kCodeError, kUnknownNameMessage, inserts);
+            ++unknown;
+        }
+    }
+    return unknown;
+}
+
+}  // namespace
+
+ConfigurationOutcome runConfiguration(IPlatform& platform, ConfigurationRequest request) {
+    IRegistryStore& registry = platform.registry();
+    URE engine(portsOf(platform));
+    engine.mode = kModeConfigure;
+    engine.installationPath = std::move(request.location);
+    engine.takeResponses(std::move(request.responses));
+    const Observers observers(engine, request.logFile, request.machine);
+
+    ProfileRegistry profile(registry, request.copy);
+    ConfigurationTarget target;
+    target.instance.assign(request.instance);
+    target.profile.assign(request.instance);
+    KZ7CfgHandler handler(engine, profile, target);
+
+    ConfigurationOutcome outcome;
+    engine.announceTasks(kTasks);
+    const std::uint32_t unknown = record(engine, handler);
+    engine.startTask(0, kVariablesTask, false, "Setting registry variables");
+    handler.commitProfileReg();
+    // The command processor reads the variables.
+    outcome.kept = registry.commit();
+    if (outcome.kept != kSuccess) {
+        engine.error(kCodeError, "KZ7CfgHandler::commitProfileReg", 10, outcome.kept);
+    }
+    engine.endTask(kVariablesTask, false, "Setting registry variables");
+    if (outcome.kept == kSuccess) {
+        engine.startTask(kParametersStart, kParametersTask, false, "Setting database-manager parameters");
+        handler.commitDBMCfg(request.instance);
+        engine.endTask(kParametersTask, false, "Setting database-manager parameters");
+    }
+    outcome.set = handler.successes();
+    outcome.notSet = handler.failures() + unknown;
+    return outcome;
+}
+
+}  // namespace kz7

@@ -1,0 +1,31 @@
+// A run of the installer runtime that sets what a response file says for a copy: progress and errors for a person or a
+// front end, everything in a log.
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "install/platform/platform.h"
+#include "install/runtime/response_file.h"
+
+namespace kz7 {
+
+struct ConfigurationRequest {
+    std::string copy;
+    std::string location;  // of the copy, one of the product's paths
+    std::string instance;  // at most 8 characters; empty: all of the copy
+    std::vector<ResponseKeyword> responses;
+    std::string logFile;   // one of the product's paths
+    bool machine = false;  // speaks the progress protocol
+};
+
+struct ConfigurationOutcome {
+    std::uint32_t set = 0;
+    std::uint32_t notSet = 0;  // names that nothing has among them
+    Status kept = kSuccess;    // what keeping the copy's variables came to
+};
+
+ConfigurationOutcome runConfiguration(IPlatform& platform, ConfigurationRequest request);
+
+}  // namespace kz7

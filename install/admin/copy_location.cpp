@@ -1,0 +1,16 @@
+#include "install/admin/copy_location.h"
+
+#include "install/src/copy_layout.h"
+#include "install/src/registry_access.h"
+
+namespace kz7 {
+
+std::string locationOf(IRegistryStore& registry, const std::string& copyPath) {
+    OwnedKey key(registry);
+    FixedBuffer<10000> location;
+    const bool read = registry.openKey(KeyHandle::localMachine, copyPath, kKeyRead, key.receive()) == kSuccess &&
+                      queryText(registry, key.get(), layout::kPathName, location) == kSuccess;
+    return read ? std::string(location.text()) : std::string{};
+}
+
+}  // namespace kz7

@@ -1,0 +1,85 @@
+// Applies the configuration that an installer collected to an installed copy: variables of its profile registry, and
+// parameters of an instance's database manager, which the copy's command processor sets. Values are recorded first
+// and committed together; what becomes of each is reported, and no failure stops the others.
+#pragma once
+
+#include <array>
+#include <cstdint>
+#include <functional>
+#include <optional>
+#include <string>
+#include <string_view>
+
+#include "install/platform/text.h"
+#include "install/runtime/configuration_tables.h"
+#include "install/runtime/profile_registry.h"
+#include "install/runtime/ure.h"
+
+namespace kz7 {
+
+inline constexpr std::size_t kMaxInstanceName = 8;  // characters; what is longer is cut
+
+// Whose configuration it is. Both names are given, or it is that of all of a copy.
+struct ConfigurationTarget {
+    FixedText<kMaxInstanceName + 1> instance;
+    FixedText<kMaxInstanceName + 1> profile;  // the instance's in the profile registry
+
+    bool isInstance() const { return !instance.empty() && !profile.empty(); }
+};
+
+class KZ7CfgHandler {
+public:
+    // The engine, which knows where the copy lies, and the profile registry outlive it.
+    KZ7CfgHandler(URE& ure, ProfileRegistry& profile, const ConfigurationTarget& target)
+        : ure_(ure), profile_(profile), target_(target) {}
+
+    // Records a value, in place of an earlier one; an empty one removes the variable. Names compare without case.
+    // kUnknownVariable, kMissingItem: there is no variable, no parameter of that name.
+    Status recordVariable(std::string_view name, std::string_view value);
+    Status recordParameter(std::string_view name, std::string_view value);
+
+    // Called after each program run of commitDBMCfg().
+    void setFollowUp(std::function<void()> followUp) { followUp_ = std::move(followUp); }
+
+    // Sets what was recorded of variables. The last failure's code, or success.
+    Status commitProfileReg();
+
+    // Sets what was recorded of parameters, for an instance; always success. The profile registry's changes must be
+    // where other programs see them.
+    Status commitDBMCfg(std::string_view instance);
+
+    // Sets one parameter at once; null for the instance is the global profile. A run that fails is traced and
+    // success. kNoSystemFile: the instance has no profile folder or no system file, or nothing has that identifier;
+    // kParameterNotSet: a value that no command can hold.
+    Status set_dbm_parameter(const char* instance, std::uint32_t identifier, std::string_view value);
+
+    // A variable of the target as it was first read. kUnknownVariable, or the profile registry's status.
+    Status getVariable(std::string_view name, std::string& value);
+
+    // How many variables and parameters could not be set so far.
+    std::uint32_t failures() const { return failures_; }
+    std::uint32_t successes() const { return successes_; }
+
+private:
+    using Pending = std::optional<std::string>;
+
+    std::string_view profileName() const { return target_.isInstance() ? target_.profile.view() : kGlobalProfile; }
+    Status setVariable(const RegistryVariable& variable, const std::string& value);
+    Status readVariable(std::string_view name, std::string_view profile, std::string& value);
+    Status setParameter(std::string_view instance, std::uint32_t identifier, std::string_view value,
+                        const std::string& folder, bool& ran);
+    Status runProcessor(const std::string& folder, std::string_view parameter, std::string_view value, bool& ran);
+    void tell(Status message, std::uint32_t code, std::initializer_list<Insert> inserts);
+
+    URE& ure_;
+    ProfileRegistry& profile_;
+    ConfigurationTarget target_;
+    std::array<Pending, kRegistryVariables.size()> variables_;
+    std::array<Pending, kDatabaseManagerParameters.size()> parameters_;
+    std::array<Pending, kRegistryVariables.size()> read_;  // variables that were read before
+    std::function<void()> followUp_;
+    std::uint32_t failures_ = 0;
+    std::uint32_t successes_ = 0;
+};
+
+}  // namespace kz7

@@ -1,0 +1,261 @@
+#include "install/runtime/installer_properties.h"
+
+#include <array>
+#include <string>
+
+#include "install/runtime/copy_name.h"
+#include "install/runtime/saved_property_names.h"
+#include "install/src/registry_access.h"
+
+namespace kz7 {
+namespace {
+
+constexpr std::string_view kSavedProperties = "SOFTWARE\\NVQ\\KZ7\\TEMP\\PROPERTIES95";  // below a user's root
+constexpr std::string_view kTableQuery = "SELECT `Property` FROM `Property` ORDER BY `Property`";
+constexpr char kUserSid[] = "UserSID";
+constexpr char kSourceFolder[] = "SOURCEDIR";
+constexpr char kBaseClientSelected[] = "BASE_CLIENT_BIN_SELECTED";
+constexpr std::string_view kBaseClient = "BASE_CLIENT.bin";
+constexpr std::string_view kDocumentationProduct = "PROD_DOCE";
+
+constexpr std::array<std::string_view, 5> kFeaturesWithState = {
+    "ADMIN_SERVER.bin", "LDAP.bin", "VS_DOT_NET.bin", kBaseClient, "ODBC_SUPPORT",
+};
+
+bool isDeferred(IInstallerSession& session) {
+    bool isOn = false;
+    return (session.runMode(RunMode::scheduled, isOn) == kSuccess && isOn) ||
+           (session.runMode(RunMode::rollback, isOn) == kSuccess && isOn);
+}
+
+Status readFromInstaller(IInstallerSession& session, const char* name, char* buffer, std::uint32_t* size) {
+    if (size == nullptr) {
+        return kInvalidParameter;
+    }
+    Buffer value(buffer, *size);
+    const Status status = session.getProperty(name, value);
+    if (status == kSuccess || status == kMoreData) {
+        *size = value.size;
+    }
+    return status;
+}
+
+// The root of the user who installs. One that is not known or does not open is, without a word, the caller.
+class UserRoot {
+public:
+    UserRoot(IRegistryStore& registry, std::string_view sid) : opened_(registry) {
+        if (!sid.empty()) {
+            registry.openKey(KeyHandle::users, sid, kKeyFull, opened_.receive());
+        }
+    }
+
+    KeyHandle key() const { return opened_ ? opened_.get() : KeyHandle::currentUser; }
+
+private:
+    OwnedKey opened_;
+};
+
+// A property's value as iMsiGetProperty() reads it.
+class PropertyValue {
+public:
+    PropertyValue(const Installation& at, const char* name) {
+        std::uint32_t size = kPropertySize;
+        status = iMsiGetProperty(at, name, room_.data(), &size);
+    }
+
+    std::string_view text() const { return status == kSuccess ? room_.data() : std::string_view{}; }
+
+    Status status;
+
+private:
+    std::array<char, kPropertySize> room_{};
+};
+
+UserRoot rootOfUser(const Installation& at) {
+    const PropertyValue sid(at, kUserSid);
+    traceProperty(at, "iMsiGetProperty", kUserSid, sid.status);
+    return {at.registry, sid.text()};
+}
+
+// What an installation does with a feature; one that it does not know has neither.
+struct FeatureRequest {
+    FeatureRequest(IInstallerSession& session, std::string_view feature) {
+        FeatureState installed = FeatureState::unknown;
+        FeatureState requested = FeatureState::unknown;
+        if (session.featureState(feature, installed, requested) == kSuccess) {
+            isRemoved = requested == FeatureState::absent && isThere(installed);
+            isSelected = requested == FeatureState::local || requested == FeatureState::source;
+        }
+    }
+
+    bool isRemoved = false;
+    bool isSelected = false;
+
+private:
+    static bool isThere(FeatureState state) { return state != FeatureState::absent && state != FeatureState::unknown; }
+};
+
+// The key that properties are saved in.
+class SavedProperties {
+public:
+    explicit SavedProperties(const Installation& at) : at_(at), key_(at.registry) {
+        const UserRoot root = rootOfUser(at);
+        const Status status = at.registry.createKey(root.key(), kSavedProperties, {}, kKeyFull, key_.receive());
+        if (status != kSuccess) {
+            at.ure.trace(kTraceError, "iSavePropertiesForDeferred", 20, status, kSavedProperties);
+        }
+    }
+
+    // The rows of an executed view; what ended them but their end.
+    Status saveTable(SessionHandle view) {
+        for (;;) {
+            OwnedSessionHandle record(at_.session);
+            const Status status = at_.session.fetchRecord(view, record.receive());
+            if (status != kSuccess) {
+                return isEndOfItems(status) ? kSuccess : status;
+            }
+            if (const std::string name = nameIn(record.get()); !name.empty()) {
+                saveProperty(name.c_str());
+            }
+        }
+    }
+
+    void saveListed() {
+        for (const char* name : kSavedPropertyNames) {
+            saveProperty(name);
+        }
+    }
+
+    void saveFeatureStates() {
+        for (const std::string_view feature : kFeaturesWithState) {
+            const FeatureRequest request(at_.session, feature);
+            if (request.isRemoved || request.isSelected) {
+                write(compose("%s_SELECT_STATE", {feature}), request.isRemoved ? "DESELECTED" : "SELECTED");
+            }
+        }
+    }
+
+    void saveResponses() {
+        for (const ResponseKeyword& keyword : at_.ure.responses) {
+            if (!keyword.name.empty() && !keyword.value.empty() && !equalsIgnoreCase(keyword.name, kProductKeyword)) {
+                write(compose("PROP_RSP_%s", {keyword.name}), keyword.value);
+            }
+        }
+    }
+
+private:
+    // The name in a row of the table; empty when it cannot be read.
+    std::string nameIn(SessionHandle record) {
+        Buffer none(nullptr, 0);
+        if (at_.session.recordString(record, 1, none) != kMoreData) {
+            return {};
+        }
+        std::string name(none.size + std::size_t{1}, '\0');
+        Buffer room(name.data(), static_cast<std::uint32_t>(name.size()));
+        return at_.session.recordString(record, 1, room) == kSuccess ? std::string(room.text()) : std::string{};
+    }
+
+    void saveProperty(const char* name) {
+        const PropertyValue value(at_, name);
+        if (name == std::string_view(kSourceFolder) && value.status == kSuccess && value.text().empty() &&
+            at_.ure.productAbbreviation == kDocumentationProduct) {
+            at_.session.doAction("ResolveSource");
+            saveValue(name, PropertyValue(at_, name));
+        } else {
+            saveValue(name, value);
+        }
+    }
+
+    void saveValue(const char* name, const PropertyValue& value) {
+        if (value.status == kSuccess) {
+            write(name, value.text());
+        } else {
+            traceProperty(at_, "iMsiGetProperty", name, value.status);
+        }
+    }
+
+    void write(std::string_view name, std::string_view value) {
+        if (!key_) {
+            return;
+        }
+        const Status status = value.size() < kPropertySize
+                                  ? at_.registry.setValue(key_.get(), name, ValueType::sz, std::string(value) + '\0')
+                                  : kMoreData;
+        if (status != kSuccess) {
+            traceProperty(at_, "iSavePropertiesForDeferred", name, status);
+        }
+    }
+
+    const Installation& at_;
+    OwnedKey key_;
+};
+
+}  // namespace
+
+Status iMsiGetProperty(const Installation& at, const char* name, char* buffer, std::uint32_t* size) {
+    if (!isDeferred(at.session)) {
+        return name == nullptr || buffer == nullptr ? kMissingItem : readFromInstaller(at.session, name, buffer, size);
+    }
+    if (name == nullptr || buffer == nullptr || size == nullptr) {
+        return kInvalidParameter;
+    }
+    FixedBuffer<kPropertySize> sid;
+    const bool known = at.session.getProperty(kUserSid, sid) == kSuccess;
+    const UserRoot root(at.registry, known ? sid.text() : std::string_view{});
+    // Deliberate: the path of the key passes through the process-wide buffer of the copy-name substitution; whoever
+    // still reads an earlier result there finds this path.
+    overwriteSharedOutput(kSavedProperties);
+    OwnedKey key(at.registry);
+    Buffer saved(buffer, *size);
+    if (at.registry.openKey(root.key(), kSavedProperties, kKeyFull, key.receive()) == kSuccess &&
+        queryText(at.registry, key.get(), name, saved) == kSuccess) {
+        // Deliberate: here the size counts the terminator, as the registry does; the installer's does not.
+        *size = saved.size;
+        if (saved.size < saved.capacity) {
+            buffer[saved.size] = '\0';
+        }
+        return kSuccess;
+    }
+    return readFromInstaller(at.session, name, buffer, size);
+}
+
+Status iMsiSetProperty(const Installation& at, const char* name, const char* value) {
+    return name == nullptr ? kInvalidParameter : at.session.setProperty(name, value != nullptr ? value : "");
+}
+
+Status iSavePropertiesForDeferred(const Installation& at) {
+    OwnedSessionHandle database(at.session);
+    if (at.session.activeDatabase(database.receive()) != kSuccess) {
+        at.ure.trace(kTraceError, "iSavePropertiesForDeferred", 10, kNoInstallationDatabase, {});
+        return kNoInstallationDatabase;
+    }
+    OwnedSessionHandle view(at.session);
+    Status status = at.session.openView(database.get(), kTableQuery, view.receive());
+    if (status == kSuccess) {
+        status = at.session.executeView(view.get());
+    }
+    if (status != kSuccess) {
+        return status;
+    }
+    SavedProperties saved(at);
+    const char* selected = FeatureRequest(at.session, kBaseClient).isSelected ? "Y" : "N";
+    traceProperty(at, "iMsiSetProperty", kBaseClientSelected, iMsiSetProperty(at, kBaseClientSelected, selected));
+    status = saved.saveTable(view.get());
+    saved.saveListed();
+    saved.saveFeatureStates();
+    saved.saveResponses();
+    return status;
+}
+
+Status iDeleteSavedProperties(const Installation& at) {
+    const UserRoot root = rootOfUser(at);
+    const Status status = deleteTree(at.registry, root.key(), kSavedProperties, 0, {}, {});
+    return isNotFound(status) ? kSuccess : status;
+}
+
+void traceProperty(const Installation& at, std::string_view operation, std::string_view name, Status status) {
+    const std::array<Insert, 3> inserts = {operation, name, status};
+    at.ure.traceMessage(kPropertyMessage, inserts);
+}
+
+}  // namespace kz7

@@ -1,0 +1,43 @@
+// Installer properties for immediate and deferred custom actions alike. The installer keeps almost all of them from
+// deferred actions, so an immediate one saves what they will need in the registry of the installing user, where
+// reading looks first; what was saved is deleted when the work is done.
+#pragma once
+
+#include <cstdint>
+
+#include "install/platform/installer_session.h"
+#include "install/platform/registry_store.h"
+#include "install/runtime/ure.h"
+
+namespace kz7 {
+
+inline constexpr std::size_t kPropertySize = 1024;  // bytes of a property's value with its NUL, wherever it is kept
+
+// The running installation, its user's registry, and the engine that its traces go to.
+struct Installation {
+    IInstallerSession& session;
+    IRegistryStore& registry;
+    URE& ure;
+};
+
+// Reads a property into `size` bytes. On success the value is terminated and `size` is what it took: without the
+// NUL where the installer answered, with it where a deferred action read what was saved. kMissingItem: an immediate
+// action gave no name or no buffer; kInvalidParameter: a deferred one gave no name, buffer or size; else the
+// installer's status, kMoreData with its hint in `size`.
+Status iMsiGetProperty(const Installation& at, const char* name, char* buffer, std::uint32_t* size);
+
+// The installer's status. Null for a value unsets the property.
+Status iMsiSetProperty(const Installation& at, const char* name, const char* value);
+
+// Saves the properties of the installation's table, those of kSavedPropertyNames, the states of some features and
+// what the response file says; what cannot be read or has kPropertySize bytes and more is left out.
+// kNoInstallationDatabase, or the first failure of the installer in giving the table.
+Status iSavePropertiesForDeferred(const Installation& at);
+
+// Deletes what was saved; nothing saved is success.
+Status iDeleteSavedProperties(const Installation& at);
+
+// Follows a read or write of a property for a purpose of its own: the log names operation, property and status.
+void traceProperty(const Installation& at, std::string_view operation, std::string_view name, Status status);
+
+}  // namespace kz7

@@ -1,0 +1,32 @@
+// The profile registry of a copy: the variables that its programs read, for one instance or for all of the copy.
+#pragma once
+
+#include <string>
+#include <string_view>
+
+#include "install/platform/registry_store.h"
+
+namespace kz7 {
+
+inline constexpr std::string_view kGlobalProfile = "KZ7GLOBALPF";  // the instance name that stands for all of a copy
+
+// It outlives no port. Changes wait for the store's mark.
+class ProfileRegistry {
+public:
+    ProfileRegistry(IRegistryStore& registry, std::string_view copyName) : registry_(registry), copyName_(copyName) {}
+
+    // Sets a variable; the empty value removes it. kVariableNotThere: there is none to remove.
+    Status set(std::string_view instance, std::string_view variable, std::string_view value);
+
+    // kVariableNotThere: it is not set; kMoreData: it is longer than any variable can be.
+    Status get(std::string_view instance, std::string_view variable, std::string& value);
+
+private:
+    Status remove(const std::string& key, std::string_view variable);
+    std::string keyOf(std::string_view instance) const;
+
+    IRegistryStore& registry_;
+    std::string copyName_;
+};
+
+}  // namespace kz7
