@@ -40,7 +40,7 @@ public:
         return status != kSuccess ? status : kept;
     }
 
-    // What is read stays as it is; a response file that cannot be read is reported.
+    // A response file that cannot be read is reported, and none is in use then.
     void readResponses() {
         FixedBuffer<kPropertySize> path;
         if (session_->getProperty(kResponseFile, path) != kSuccess || path.text().empty()) {

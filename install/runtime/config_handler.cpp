@@ -202,7 +202,7 @@ Status KZ7CfgHandler::runProcessor(const std::string& folder, std::string_view p
         return kParameterNotSet;
     }
     if (exitCode != 0) {
-        ure_.trace(kTraceError, kFunction, 30, kNotExecuted, compose("%d", {exitCode}));
+        ure_.trace(kTraceError, kFunction, 30, kNotExecuted, compose("exit code %u", {exitCode}));
         process.postOutput(kFunction, 1);
         return kParameterNotSet;
     }

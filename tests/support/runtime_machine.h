@@ -8,8 +8,8 @@
 #include "install/runtime/observers/human_stream.h"
 #include "install/runtime/observers/log_observer.h"
 #include "install/runtime/observers/machine_stream.h"
-#include "install/runtime/ure.h"
 #include "install/runtime/runtime_ports.h"
+#include "install/runtime/ure.h"
 
 namespace kz7::test {
 
