@@ -129,10 +129,15 @@ TEST_F(InstallerProperties, ReadingTakesTheSharedBufferOfTheSubstitution) {
 
 TEST_F(InstallerProperties, EverythingThatDeferredActionsNeedIsSaved) {
     const std::string longest(1023, 'l');
-    machine.session.properties = {
-        {"UserSID", kUser},          {"Z_LAST", "z"},   {"A_FIRST", "a"},      {"LONGEST", longest},
-        {"TOO_LONG", longest + "m"}, {"REMOVE", "ALL"}, {"DLFM_PWD", "secret"}};
-    machine.session.tableRows = {"Z_LAST", "A_FIRST", "", "LONGEST", "TOO_LONG", "UNSET"};
+    machine.session.properties = {{"UserSID", kUser},
+                                  {"Z_LAST", "z"},
+                                  {"A_FIRST", "a"},
+                                  {"LONGEST", longest},
+                                  {"TOO_LONG", longest + "m"},
+                                  {"HUGE", std::string(100000, 'h')},
+                                  {"REMOVE", "ALL"},
+                                  {"DLFM_PWD", "secret"}};
+    machine.session.tableRows = {"Z_LAST", "A_FIRST", "", "LONGEST", "TOO_LONG", "HUGE", "UNSET"};
     machine.session.features = {{"ADMIN_SERVER.bin", {FeatureState::local, FeatureState::absent}},
                                 {"LDAP.bin", {FeatureState::absent, FeatureState::local}},
                                 {"VS_DOT_NET.bin", {FeatureState::absent, FeatureState::absent}},

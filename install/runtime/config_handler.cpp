@@ -19,6 +19,17 @@ std::size_t rowOf(const Table& table, std::string_view name) {
         table.begin());
 }
 
+// Whether the table has the name.
+template <typename Table, typename Values>
+bool record(const Table& table, Values& values, std::string_view name, std::string_view value) {
+    const std::size_t row = rowOf(table, name);
+    if (row == table.size()) {
+        return false;
+    }
+    values[row] = value;
+    return true;
+}
+
 // A value stands in quotation marks at the end of a command line: it must not be able to leave them.
 bool staysQuoted(std::string_view value) {
     return !value.ends_with('\\') && std::none_of(value.begin(), value.end(),
@@ -35,21 +46,11 @@ std::string withoutBackslash(std::string folder) {
 }  // namespace
 
 Status KZ7CfgHandler::recordVariable(std::string_view name, std::string_view value) {
-    const std::size_t row = rowOf(kRegistryVariables, name);
-    if (row == kRegistryVariables.size()) {
-        return kUnknownVariable;
-    }
-    variables_[row] = value;
-    return kSuccess;
+    return record(kRegistryVariables, variables_, name, value) ? kSuccess : kUnknownVariable;
 }
 
 Status KZ7CfgHandler::recordParameter(std::string_view name, std::string_view value) {
-    const std::size_t row = rowOf(kDatabaseManagerParameters, name);
-    if (row == kDatabaseManagerParameters.size()) {
-        return kMissingItem;
-    }
-    parameters_[row] = value;
-    return kSuccess;
+    return record(kDatabaseManagerParameters, parameters_, name, value) ? kSuccess : kMissingItem;
 }
 
 void KZ7CfgHandler::tell(Status message, std::uint32_t code, std::initializer_list<Insert> inserts) {
