@@ -16,6 +16,14 @@ namespace {
 
 constexpr char kResponseFile[] = "RSP_FILE_PATH";
 
+// The log is the process's; it ends before the engine that it observes.
+struct LogEnd {
+    LogEnd() = default;
+    LogEnd(const LogEnd&) = delete;
+    LogEnd& operator=(const LogEnd&) = delete;
+    ~LogEnd() { URELogObserver::release(); }
+};
+
 // One call: this machine, the installation, and an engine whose log is the installer's.
 class ActionCall {
 public:
@@ -28,9 +36,6 @@ public:
             engine_.registerObserver(*log, Takes::everything);
         }
     }
-    ActionCall(const ActionCall&) = delete;
-    ActionCall& operator=(const ActionCall&) = delete;
-    ~ActionCall() { URELogObserver::release(); }
 
     const Installation& at() const { return at_; }
 
@@ -60,6 +65,7 @@ private:
     std::unique_ptr<IPlatform> platform_;
     std::unique_ptr<IInstallerSession> session_;
     URE engine_;
+    LogEnd logEnd_;
     Installation at_;
 };
 
@@ -71,6 +77,8 @@ std::uint32_t call(std::uint32_t installation, Work work) {
         return work(action);
     } catch (const std::bad_alloc&) {
         return kOutOfMemory;
+    } catch (...) {
+        return kGeneralFailure;
     }
 }
 
@@ -111,8 +119,8 @@ std::uint32_t iMsiSetProperty(std::uint32_t installation, const char* name, cons
 
 const char* iSubstituteCopyName(const char* text, const char* copyName, std::uint32_t outputSize, char* output) {
     try {
-        return kz7::iSubstituteCopyName(text, copyName, outputSize, output);
-    } catch (const std::bad_alloc&) {
+        return text != nullptr ? kz7::iSubstituteCopyName(text, copyName, outputSize, output) : nullptr;
+    } catch (...) {
         return nullptr;
     }
 }

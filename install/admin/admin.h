@@ -9,8 +9,8 @@
 #include <vector>
 
 #include "install/admin/key_walk.h"
-#include "install/admin/shown_text.h"
 #include "install/platform/platform.h"
+#include "install/platform/shown_text.h"
 
 namespace kz7 {
 

@@ -14,7 +14,20 @@ constexpr std::int32_t kParametersTask = 2;
 constexpr std::string_view kTasks = "1,10;2,90";  // with the share of the time that each takes
 constexpr std::uint64_t kParametersStart = 10;
 
-// The log and the stream of one run, which both end with it.
+// The process's observers, which end with a run.
+struct ObserversEnd {
+    ObserversEnd() = default;
+    ObserversEnd(const ObserversEnd&) = delete;
+    ObserversEnd& operator=(const ObserversEnd&) = delete;
+    ~ObserversEnd() {
+        // The last line of a front end names the log.
+        UREExternalObserverMachineStream::release();
+        UREExternalObserverHumanStream::release();
+        URELogObserver::release();
+    }
+};
+
+// The log and the stream of one run.
 class Observers {
 public:
     Observers(URE& engine, const std::string& logFile, bool machine) : engine_(engine) {
@@ -42,13 +55,10 @@ public:
         if (stream_ != nullptr) {
             engine_.unregisterObserver(*stream_);
         }
-        // The last line of a front end names the log.
-        UREExternalObserverMachineStream::release();
-        UREExternalObserverHumanStream::release();
-        URELogObserver::release();
     }
 
 private:
+    ObserversEnd end_;
     URE& engine_;
     URELogObserver* log_ = nullptr;
     UREExternalObserverStream* stream_ = nullptr;
@@ -72,14 +82,15 @@ std::uint32_t record(URE& engine, KZ7CfgHandler& handler) {
 }  // namespace
 
 ConfigurationOutcome runConfiguration(IPlatform& platform, ConfigurationRequest request) {
-    IRegistryStore& registry = platform.registry();
+    ProfileRegistry profile(platform.registry(), request.copy);
+    // What was looked up so far keeps nobody waiting while the log begins.
+    profile.settle();
     URE engine(portsOf(platform));
     engine.mode = kModeConfigure;
     engine.installationPath = std::move(request.location);
     engine.takeResponses(std::move(request.responses));
     const Observers observers(engine, request.logFile, request.machine);
 
-    ProfileRegistry profile(registry, request.copy);
     ConfigurationTarget target;
     target.instance.assign(request.instance);
     target.profile.assign(request.instance);
@@ -91,7 +102,7 @@ ConfigurationOutcome runConfiguration(IPlatform& platform, ConfigurationRequest 
     engine.startTask(0, kVariablesTask, false, "Setting registry variables");
     handler.commitProfileReg();
     // The command processor reads the variables.
-    outcome.kept = registry.commit();
+    outcome.kept = profile.settle();
     if (outcome.kept != kSuccess) {
         engine.error(kCodeError, "KZ7CfgHandler::commitProfileReg", 10, outcome.kept);
     }

@@ -2,7 +2,7 @@
 
 #include <algorithm>
 
-#include "install/admin/shown_text.h"
+#include "install/platform/shown_text.h"
 #include "install/platform/text.h"
 
 namespace kz7 {

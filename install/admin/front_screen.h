@@ -47,7 +47,6 @@ private:
     IConsole& console_;
     ITerminal& terminal_;
     std::mutex lock_;
-    std::string bar_;  // on the screen now, as a line of its full width
     std::string phase_;
     std::string barText_;
     int percent_ = -1;

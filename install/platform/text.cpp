@@ -62,8 +62,11 @@ std::string_view takeWrappedLine(std::string_view& text, std::uint32_t columns) 
     while (end < text.size() && text[end] != '\n') {
         shown += columnsOf(text[end]);
         if (columns != 0 && shown > columns && text[end] != ' ') {
-            end = blank != std::string_view::npos ? blank : end;
-            break;
+            if (blank != std::string_view::npos || end != 0) {
+                end = std::min(blank, end);
+                break;
+            }
+            // A character wider than the terminal stands alone.
         }
         if (text[end] == ' ') {
             blank = end;

@@ -163,7 +163,10 @@ Status KZ7CfgHandler::commitDBMCfg(std::string_view instance) {
 Status KZ7CfgHandler::setParameter(std::string_view instance, std::uint32_t identifier, std::string_view value,
                                    const std::string& folder, bool& ran) {
     std::string profiles;
-    if (readVariable(kProfileFolderVariable, instance.empty() ? kGlobalProfile : instance, profiles) != kSuccess) {
+    const Status read = readVariable(kProfileFolderVariable, instance.empty() ? kGlobalProfile : instance, profiles);
+    // The command processor may write to the store.
+    const Status settled = profile_.settle();
+    if (read != kSuccess || settled != kSuccess) {
         return kNoSystemFile;
     }
     if (ure_.ports.files.probe(compose("%s\\%s\\%s", {profiles, instance, kSystemFile})) != kSuccess) {

@@ -44,8 +44,7 @@ public:
     // Sets what was recorded of variables. The last failure's code, or success.
     Status commitProfileReg();
 
-    // Sets what was recorded of parameters, for an instance; always success. The profile registry's changes must be
-    // where other programs see them.
+    // Sets what was recorded of parameters, for an instance; always success.
     Status commitDBMCfg(std::string_view instance);
 
     // Sets one parameter at once; null for the instance is the global profile. A run that fails is traced and

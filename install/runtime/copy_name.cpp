@@ -39,9 +39,9 @@ const char* iSubstituteCopyName(const char* text, const char* copyName, std::uin
     if (outputSize != 0 && given.size() + 1 > outputSize) {
         return nullptr;
     }
-    const FixedText<kSubstitutedSize> result(
-        substituteCopyName(given, copyName == nullptr ? std::string_view{} : copyName));
-    const bool same = result.view() == given;
+    const std::string substituted = substituteCopyName(given, copyName == nullptr ? std::string_view{} : copyName);
+    const bool same = substituted == given;
+    const FixedText<kSubstitutedSize> result(substituted);
     if (outputSize != 0) {
         copyOut(same ? given : result.view(), outputSize, output);
         return same ? text : output;

@@ -79,6 +79,29 @@ private:
     std::size_t length_ = 0;
 };
 
+// Puts the standard handles back, however a run ends.
+class SlotsRestored {
+public:
+    explicit SlotsRestored(IProcessHost& host) : host_(host) {
+        host_.getSlot(StandardSlot::output, output_);
+        host_.getSlot(StandardSlot::error, error_);
+    }
+    SlotsRestored(const SlotsRestored&) = delete;
+    SlotsRestored& operator=(const SlotsRestored&) = delete;
+    ~SlotsRestored() {
+        // Deliberate: both go back through the output slot, so that it ends with the old standard error and the
+        // error slot still names a closed pipe; what inspects the slots afterwards knows them so. Nothing may
+        // write through a slot, close it or test it.
+        host_.setSlot(StandardSlot::output, output_);
+        host_.setSlot(StandardSlot::output, error_);
+    }
+
+private:
+    IProcessHost& host_;
+    StreamHandle output_ = StreamHandle::none;
+    StreamHandle error_ = StreamHandle::none;
+};
+
 // A reader thread's argument, which it frees. The reader ends by closing its read end, so that neither a
 // waking byte nor the program can wait for a reader that is gone.
 struct InstallProcess::Reader {
@@ -188,17 +211,8 @@ Status InstallProcess::execute(bool wait, bool trace) {
     if (trace) {
         sink_.trace(kTraceError, "InstallProcess::execute", 10, kSuccess, commandLine_.view());
     }
-    StreamHandle output = StreamHandle::none;
-    StreamHandle error = StreamHandle::none;
-    host_.getSlot(StandardSlot::output, output);
-    host_.getSlot(StandardSlot::error, error);
-    const Status status = run(wait);
-    // Deliberate: both go back through the output slot, so that it ends with the old standard error and the
-    // error slot still names a closed pipe; what inspects the slots afterwards knows them so. Nothing may
-    // write through a slot, close it or test it.
-    host_.setSlot(StandardSlot::output, output);
-    host_.setSlot(StandardSlot::output, error);
-    return status;
+    const SlotsRestored restored(host_);
+    return run(wait);
 }
 
 Status InstallProcess::run(bool wait) {

@@ -10,13 +10,17 @@ namespace kz7 {
 
 inline constexpr std::string_view kGlobalProfile = "KZ7GLOBALPF";  // the instance name that stands for all of a copy
 
-// It outlives no port. Changes wait for the store's mark.
+// The store outlives it. Changes wait for settle().
 class ProfileRegistry {
 public:
     ProfileRegistry(IRegistryStore& registry, std::string_view copyName) : registry_(registry), copyName_(copyName) {}
 
     // Sets a variable; the empty value removes it. kVariableNotThere: there is none to remove.
     Status set(std::string_view instance, std::string_view variable, std::string_view value);
+
+    // Ends what the store holds for this writer alone: others, a program that is started too, see what was set and
+    // may write.
+    Status settle() { return registry_.commit(); }
 
     // kVariableNotThere: it is not set; kMoreData: it is longer than any variable can be.
     Status get(std::string_view instance, std::string_view variable, std::string& value);

@@ -21,10 +21,15 @@ public:
     }
     Status flush() override { return kSuccess; }
 
-    // Writes what was kept, each text to its stream, in order.
-    void release(IConsole& console) {
+    // Writes what was kept, each text to its stream, in order; drops what would have gone to standard output
+    // where it did not become true.
+    void release(IConsole& console, bool becameTrue) {
         for (const auto& [isError, text] : lines_) {
-            isError ? console.writeError(text) : console.writeOutput(text);
+            if (isError) {
+                console.writeError(text);
+            } else if (becameTrue) {
+                console.writeOutput(text);
+            }
         }
         lines_.clear();
     }

@@ -21,6 +21,10 @@ Status removeCopy(IRegistryStore& registry, IServiceManager& services, IDebugOut
                   const char* copyName) {
     InstallCopyList copies(registry, debug, false, false);
     if (copies.findByName(copyName) == nullptr) {
+        // A store that cannot be read is no answer to whether the copy is there.
+        if (const Status readable = registry.commit(); readable != kSuccess) {
+            return readable;
+        }
         report.line(kNotFound, {std::string_view(copyName)});
         return kMissingItem;
     }
@@ -28,7 +32,10 @@ Status removeCopy(IRegistryStore& registry, IServiceManager& services, IDebugOut
     // The copy's 32-bit key and the values that name it stay.
     if (copies.status() == 0 && copies.count() > 1) {
         deleteTree(registry, KeyHandle::localMachine, layout::kCopy, 0, copyName, {});
-        registry.deleteKey(KeyHandle::localMachine, substituteCopyName(layout::kCopy, copyName), 0);
+        const std::string copy = substituteCopyName(layout::kCopy, copyName);
+        if (checkPathLength(copy) == kSuccess) {
+            registry.deleteKey(KeyHandle::localMachine, copy, 0);
+        }
     } else {
         deleteTree(registry, KeyHandle::localMachine, layout::kProduct, 0, {}, {});
     }

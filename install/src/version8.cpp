@@ -79,11 +79,9 @@ Status restoreVersion8(IRegistryStore& registry, IServiceManager& services, ICon
         closing.error(kLocationFailed);
     }
     switchOffService(services, closing, kService);
-    if (const Status kept = registry.commit(); kept != kSuccess) {
-        return kept;
-    }
-    held.release(console);
-    return status;
+    const Status kept = registry.commit();
+    held.release(console, kept == kSuccess);
+    return kept == kSuccess ? status : kept;
 }
 
 }  // namespace kz7

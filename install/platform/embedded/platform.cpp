@@ -25,18 +25,27 @@
 namespace kz7 {
 namespace {
 
+// Programs are started in folders of their own.
+std::string absolute(const std::string& directory) {
+    std::error_code error;
+    const std::string whole = directory.empty() ? directory : std::filesystem::absolute(directory, error).string();
+    return error ? directory : whole;
+}
+
 class EmbeddedPlatform final : public IPlatform {
 public:
     explicit EmbeddedPlatform(const PlatformOptions& options)
         : program_(options.program),
           byDefault_(options.stateDirectory.empty() && std::getenv("KZ7_STATE_DIR") == nullptr),
-          directory_(options.stateDirectory.empty() ? usualStateDirectory() : options.stateDirectory),
+          directory_(absolute(options.stateDirectory.empty() ? usualStateDirectory() : options.stateDirectory)),
           debugOutput_(console_),
           files_(directory_),
           registry_(directory_, options.readOnly,
                     [this](const StoreFault& fault) {
+                        if (!faultTold_) {
+                            console_.writeError(program_ + ": " + fault.file + ": " + fault.reason + "\n");
+                        }
                         faultTold_ = true;
-                        console_.writeError(program_ + ": " + fault.file + ": " + fault.reason + "\n");
                     }),
           services_(registry_, files_),
           processes_(directory_),
@@ -94,13 +103,18 @@ private:
 }  // namespace
 
 std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options) {
+    auto platform = std::make_unique<EmbeddedPlatform>(options);
     if (options.ownProcess) {
         settleInheritedState();
         // A reader that went away or a file at its limit is a status of the write, never the end of a half-done run.
         std::signal(SIGPIPE, SIG_IGN);
         std::signal(SIGXFSZ, SIG_IGN);
+        // Programs that are started work on the same store.
+        if (!options.stateDirectory.empty()) {
+            setenv("KZ7_STATE_DIR", absolute(options.stateDirectory).c_str(), 1);
+        }
     }
-    return std::make_unique<EmbeddedPlatform>(options);
+    return platform;
 }
 
 int hostExitCode(Status status) {

@@ -15,7 +15,11 @@ Status WindowsLineChannel::readLine(Buffer& line) {
 
 void WindowsLineChannel::keepLineFeeds(bool on) {
     std::fflush(stdout);
-    _setmode(_fileno(stdout), on ? _O_BINARY : _O_TEXT);
+    if (on) {
+        modeBefore_ = _setmode(_fileno(stdout), _O_BINARY);
+    } else if (modeBefore_ != -1) {
+        _setmode(_fileno(stdout), modeBefore_);
+    }
 }
 
 }  // namespace kz7

@@ -9,6 +9,9 @@ class WindowsLineChannel final : public ILineChannel {
 public:
     Status readLine(Buffer& line) override;
     void keepLineFeeds(bool on) override;
+
+private:
+    int modeBefore_ = -1;  // of standard output
 };
 
 }  // namespace kz7

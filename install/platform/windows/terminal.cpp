@@ -1,7 +1,9 @@
 #include "install/platform/windows/terminal.h"
 
+#include <io.h>
 #include <windows.h>
 
+#include <cstdio>
 #include <cstdlib>
 
 namespace kz7 {
@@ -14,9 +16,11 @@ BOOL WINAPI leaveIt(DWORD event) {
 }  // namespace
 
 TerminalView WindowsTerminal::look(TerminalStream stream) {
-    const HANDLE handle = GetStdHandle(stream == TerminalStream::input    ? STD_INPUT_HANDLE
-                                       : stream == TerminalStream::output ? STD_OUTPUT_HANDLE
-                                                                          : STD_ERROR_HANDLE);
+    // The streams' own handles: a standard-handle slot may name something else by now.
+    std::FILE* const file = stream == TerminalStream::input    ? stdin
+                            : stream == TerminalStream::output ? stdout
+                                                               : stderr;
+    const auto handle = reinterpret_cast<HANDLE>(_get_osfhandle(_fileno(file)));
     TerminalView view;
     DWORD mode = 0;
     view.terminal = GetConsoleMode(handle, &mode) != FALSE;

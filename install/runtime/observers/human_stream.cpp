@@ -4,6 +4,7 @@
 #include <array>
 #include <new>
 
+#include "install/platform/shown_text.h"
 #include "install/runtime/observers/external_output_pipe.h"
 
 namespace kz7 {
@@ -13,6 +14,26 @@ constexpr std::uint32_t kTaskListNumber = 4;
 constexpr std::string_view kAbort = "ABORT";
 
 UREExternalObserverHumanStream* theStream = nullptr;
+
+// Most texts: nothing in them needs a look.
+bool isPlain(std::string_view text) {
+    return std::all_of(text.begin(), text.end(), [](char c) { return (c >= ' ' && c <= '~') || c == '\n'; });
+}
+
+// A text for people: what it holds does not steer the terminal, but its line ends stay.
+std::string shownLines(std::string_view text) {
+    std::string shown;
+    for (;;) {
+        const std::size_t end = std::min(text.find('\n'), text.size());
+        const std::string_view line = text.substr(0, end);
+        shown += shownText(line.substr(0, line.size() - (line.ends_with('\r') ? 1 : 0)));
+        if (end == text.size()) {
+            return shown;
+        }
+        shown += '\n';
+        text.remove_prefix(end + 1);
+    }
+}
 
 }  // namespace
 
@@ -45,6 +66,11 @@ Status UREExternalObserverHumanStream::queueText(std::uint32_t textNumber, std::
     std::size_t length = 0;
     ure_.messages.copyText(textNumber, inserts, room, sizeof room, length);
     std::string_view rest(room, std::min(length, sizeof room));
+    std::string shown;
+    if (!isPlain(rest)) {
+        shown = shownLines(rest);
+        rest = shown;
+    }
     const std::uint32_t columns = ure_.ports.terminal.look(TerminalStream::output).columns;
     Status status = kSuccess;
     while (!rest.empty()) {

@@ -183,4 +183,8 @@ void InstallCopiesProfile::cleanup() {
     oldProfileWow_.clear();
 }
 
+Status rewriteInstallCopiesProfile(IRegistryStore& registry, IDebugOutput& debug) {
+    return InstallCopiesProfile(registry, debug).run();
+}
+
 }  // namespace kz7

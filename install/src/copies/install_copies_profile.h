@@ -64,4 +64,7 @@ private:
     AliasMap oldProfileWow_;
 };
 
+// The rewrite by itself.
+Status rewriteInstallCopiesProfile(IRegistryStore& registry, IDebugOutput& debug);
+
 }  // namespace kz7

@@ -1,11 +1,13 @@
-// The framework's other lists over ILIST: installed products and instances, each an element with its name.
+// The rest of the framework's class tree, kept thin: lists of installed products and of instances, and key objects.
 #pragma once
 
 #include <string>
 #include <utility>
 
 #include "install/platform/registry_store.h"
+#include "install/runtime/copy_name.h"
 #include "install/src/copies/ilist.h"
+#include "install/src/copies/install_copy_list.h"
 
 namespace kz7 {
 
@@ -35,6 +37,12 @@ private:
 
 class IKZ7INSTANCELIST : public ILIST<IKZ7INSTANCE> {};
 
+// One list for whoever shares it.
+class InstallCopyListSingleton : public InstallCopyList {
+public:
+    using InstallCopyList::InstallCopyList;
+};
+
 // A registry key opened or created with the full access rights.
 class KZ7iRegistry {
 public:
@@ -49,6 +57,13 @@ public:
 private:
     OwnedKey key_;
     Status status_;
+};
+
+// The same for a path with the placeholder of a copy's name.
+class KZ7iCopyNameRegistry : public KZ7iRegistry {
+public:
+    KZ7iCopyNameRegistry(IRegistryStore& registry, KeyHandle root, std::string_view path, std::string_view copyName)
+        : KZ7iRegistry(registry, root, substituteCopyName(path, copyName)) {}
 };
 
 }  // namespace kz7

@@ -127,9 +127,9 @@ public:
         for (const ConfigurationProgram& program : kConfigurationPrograms) {
             configure(program, level);
         }
-        const Status rewritten = InstallCopiesProfile(ports_.registry, ports_.debug).run();
+        const Status rewritten = rewriteInstallCopiesProfile(ports_.registry, ports_.debug);
         commit();
-        return succeeded(rewritten) ? committed_ : rewritten;
+        return succeeded(committed_) ? rewritten : committed_;
     }
 
 private:

@@ -34,8 +34,7 @@ struct ProviderPorts {
 void queryLevel(ILibraryLoader& libraries, Report& report, std::string_view location, std::string& level);
 
 // The result is that of the alias rewrite; what comes before it is only reported. What was written is
-// committed before each program is started and at the end, and a commit that failed is the result where the
-// rewrite has none of its own.
+// committed before each program is started and at the end, and the first commit that failed is the result instead.
 Status registerProviders(const ProviderPorts& ports, std::string_view location);
 
 }  // namespace kz7

@@ -1,4 +1,4 @@
-#include "install/admin/shown_text.h"
+#include "install/platform/shown_text.h"
 
 #include "install/platform/encoding.h"
 
