@@ -27,7 +27,8 @@ std::string ownProperty(MSIHANDLE installation, const char* name) {
     return value;
 }
 
-// What the action is told: the path of the library and names of properties, between semicolons.
+// What the action is told: the path of the library and names of properties, between semicolons. An immediate action
+// has no data of its own.
 std::vector<std::string> told(MSIHANDLE installation) {
     const std::string given = ownProperty(installation, "CustomActionData");
     const std::string data = given.empty() ? ownProperty(installation, "PROBE_DATA") : given;
@@ -83,14 +84,6 @@ public:
 
     void changeProperty(const std::string& name) const {
         tell("setting %s: status %u", name.c_str(), setProperty_(installation_, name.c_str(), "new"));
-    }
-
-    void tellMissing(const std::string& name) const {
-        char value[8];
-        std::uint32_t size = sizeof value;
-        tell("without a name: status %u", getProperty_(installation_, nullptr, value, &size));
-        tell("without a buffer: status %u", getProperty_(installation_, name.c_str(), nullptr, &size));
-        tell("without a size: status %u", getProperty_(installation_, name.c_str(), value, nullptr));
     }
 
     void tellSubstitution() const {
@@ -174,10 +167,9 @@ __declspec(dllexport) UINT probeChange(MSIHANDLE installation) {
     });
 }
 
-// Missing arguments, too little room, and what needs no installation.
-__declspec(dllexport) UINT probeArguments(MSIHANDLE installation) {
+// Reads a property into too little room, and calls what needs no installation.
+__declspec(dllexport) UINT probeRoom(MSIHANDLE installation) {
     return probe(installation, [](const Probe& probe) {
-        probe.tellMissing(probe.names().front());
         probe.tellProperty(probe.names().front(), 4);
         probe.tellSubstitution();
     });
