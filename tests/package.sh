@@ -1,0 +1,204 @@
+#!/usr/bin/env bash
+# Builds a package of somebody who installs with our custom actions, and has the installer of Windows (Wine) fail in it,
+# install it and remove it. Each time its exit code, the files and keys that are there afterwards and every line that
+# the actions wrote to its log, in order, must be what is told here.
+#
+#   tests/package.sh WINDOWS_PROGRAMS      (a folder)
+set -euo pipefail
+
+[ $# -eq 1 ] || { echo "usage: package.sh WINDOWS_PROGRAMS" >&2; exit 2; }
+if [ -z "${KZ7_WINE_PREFIX:-}" ]; then
+    exec "$(dirname "$0")/with_wine" "$0" "$@"
+fi
+programs=$(realpath "$1")
+source=$(realpath "$(dirname "$0")")/package/package.wxs
+folder=$(mktemp -d)
+trap 'rm -rf "$folder"' EXIT
+cd "$folder"
+
+windows_path() { printf 'Z:%s' "${1//\//\\}"; }
+long() { printf '%*s' "$1" '' | tr ' ' n; }
+
+# wixl finds files by relative paths only, and has one type for all that does not run at once.
+retype() {
+    local type=$1 action
+    shift
+    for action in "$@"; do
+        msibuild package.msi -q "UPDATE CustomAction SET Type=$type WHERE Action='$action'"
+    done
+}
+cp "$programs/kz7actions64.dll" "$programs/kz7_probe.dll" .
+echo installed >file.txt
+wixl -a x64 -D FILE=file.txt -D ACTIONS=kz7actions64.dll -D PROBE=kz7_probe.dll -o package.msi "$source"
+retype 1 Save ProbeImmediate ProbeChange                    # at once
+retype 51 SetDebugProp TellImmediate TellProbe{RolledBack,Rollback,Deferred,Room,Commit,Committed}
+retype 3073 ProbeDeferred ProbeRoom Fail                    # deferred
+retype 3329 ProbeRollback DeleteAtRollback ProbeRolledBack  # in a rollback
+retype 3585 ProbeCommit DeleteAtCommit ProbeCommitted       # at the end
+
+# What a run of the installer comes to. The user's number is Wine's affair.
+run() {
+    : >log
+    wine "$programs/full_exit_code.exe" msiexec /qn "$@" '/l*v' "$(windows_path "$folder/log")" \
+        ACTIONS_PATH="$(windows_path "$programs/kz7actions64.dll")" KZ7_COPY_NAME=COPY1 \
+        MIGRATION_FILES_PATH="$(long 1023)" INI_FILES_PATH="$(long 1024)" 2>/dev/null |
+        tr -d '\r' | grep '^exit code' || echo 'no exit code'
+    echo 'installed:'
+    (cd "$WINEPREFIX/drive_c/Program Files" && find . -path '*/KZ7 package*' -type f | sort)
+    echo 'keys:'
+    local root
+    for root in HKEY_CURRENT_USER $(wine reg query HKEY_USERS | tr -d '\r' | grep '^HKEY_'); do
+        wine reg query "$root\\SOFTWARE\\NVQ" /s 2>/dev/null || true
+    done | tr -d '\r' | sed '/^$/d; /^reg: /d; s/S-1-5[-0-9]*/USER/'
+    echo 'log:'
+    tr -d '\r' <log | sed -n -E 's/^1: ((probe|Note|WARNING|ERROR).*[^ ]) *$/\1/p'
+}
+
+# The lines of the log that are expected of an action of a kind. A saved value's size counts its terminator, that of a
+# value which the installer gave does not. Wine keeps no property from deferred actions: what was not saved is there
+# as it was last set.
+note() { printf 'Note: %s: %s, status %u\n' "$@"; }
+probe() { printf "probe %s: $2\n" "$1" "${@:3}"; }
+saved() { note iMsiGetProperty "$2" 0 && probe "$1" "%s in 1024: size %u, '%s'" "$2" $((${#3} + 1)) "$3"; }
+given() { note iMsiGetProperty "$2" 0 && probe "$1" "%s in %u: size %u, '%s'" "$2" "${4:-1024}" ${#3} "$3"; }
+changed() {
+    given immediate "$1" "$2" 4096
+    note iMsiSetProperty "$1" 0
+    probe immediate 'setting %s: status 0' "$1"
+    given immediate "$1" new 4096
+}
+substituted() {
+    probe "$1" 'substituted: InstalledCopies\\COPY1'
+    probe "$1" 'substituted without a buffer: InstalledCopies\\COPY2'
+    probe "$1" 'without room: null'
+    probe "$1" 'without a copy: the text itself'
+}
+
+immediate_actions() { # the feature BASE_CLIENT.bin selected: Y or N
+    note iMsiGetProperty UserSID 0
+    note iMsiSetProperty BASE_CLIENT_BIN_SELECTED 0
+    note iMsiGetProperty INI_FILES_PATH 234 # too long to be saved
+    note iMsiGetProperty DEBUG_PROP 234
+    probe immediate 'DEBUG_PROP in 4: status 234, a larger size'
+    substituted immediate
+    changed DEBUG_PROP 'of the immediate phase'
+    changed TABLE_PUBLIC 'of the table'
+    changed TablePrivate '100% of the table'
+    changed KZ7_COPY_NAME COPY1
+    changed MIGRATION_FILES_PATH "$(long 1023)"
+    changed INI_FILES_PATH "$(long 1024)"
+    changed NOT_INSTALL_DOTNET ''
+    changed NotSaved ''
+    changed BASE_CLIENT_BIN_SELECTED "$1"
+}
+
+read_back() { # kind of action, installation or removal
+    probe "$1" 'opening the key: status 0'
+    saved "$1" DEBUG_PROP 'of the immediate phase'
+    saved "$1" TABLE_PUBLIC 'of the table'
+    saved "$1" TablePrivate '100% of the table'
+    saved "$1" KZ7_COPY_NAME COPY1
+    saved "$1" MIGRATION_FILES_PATH "$(long 1023)"
+    given "$1" INI_FILES_PATH new
+    saved "$1" NOT_INSTALL_DOTNET ''
+    given "$1" NotSaved new
+    if [ "$2" = installation ]; then
+        saved "$1" BASE_CLIENT_BIN_SELECTED Y
+        saved "$1" REMOVE ''
+        saved "$1" BASE_CLIENT.bin_SELECT_STATE SELECTED
+        saved "$1" ODBC_SUPPORT_SELECT_STATE SELECTED
+        given "$1" LDAP.bin_SELECT_STATE ''
+        saved "$1" PROP_RSP_KZ7.PASSWORD 'two  words '
+        saved "$1" PROP_RSP_LEVEL 7
+    else
+        saved "$1" BASE_CLIENT_BIN_SELECTED N
+        saved "$1" REMOVE ALL
+        saved "$1" BASE_CLIENT.bin_SELECT_STATE DESELECTED
+        saved "$1" ODBC_SUPPORT_SELECT_STATE DESELECTED
+        given "$1" LDAP.bin_SELECT_STATE ''
+        saved "$1" PROP_RSP_KZ7.PASSWORD ''
+        given "$1" PROP_RSP_LEVEL ''
+    fi
+    given "$1" PROP_RSP_EMPTY ''
+    saved "$1" PROP_RSP_PROD ''
+}
+
+deferred_actions() { # installation or removal
+    read_back deferred "$1"
+    given deferred DEBUG_PROP new 4 # too little for what was saved
+    substituted deferred
+}
+
+deleted() { # kind of action
+    note iMsiGetProperty UserSID 0
+    probe "$1" 'opening the key: status 2'
+    given "$1" DEBUG_PROP new
+}
+
+committed() {
+    probe commit 'opening the key: status 0'
+    saved commit DEBUG_PROP 'of the immediate phase'
+    deleted commit
+}
+
+outcome() { # exit code, files
+    printf 'exit code %u\ninstalled:\n' "$1"
+    shift
+    [ $# -eq 0 ] || printf './KZ7 package of the tests/%s\n' "$@"
+    echo 'keys:'
+    printf '%s\\SOFTWARE\\NVQ\\KZ7%s\n' HKEY_CURRENT_USER '' HKEY_CURRENT_USER '\TEMP' \
+        'HKEY_USERS\USER' '' 'HKEY_USERS\USER' '\TEMP'
+    echo 'log:'
+}
+
+failed_installation() {
+    outcome 1603
+    immediate_actions Y
+    deferred_actions installation
+    read_back rollback installation
+    deleted rollback
+}
+
+installation() {
+    outcome 0 client.txt odbc.txt
+    immediate_actions Y
+    deferred_actions installation
+    committed
+}
+
+removal() {
+    outcome 0
+    echo "ERROR: ureReadRspFile, step 2: error 13: there is no '=' in it"
+    immediate_actions N
+    deferred_actions removal
+    committed
+}
+
+runs=0
+failed=0
+same() {
+    local why=$1 expected=$2
+    shift 2
+    runs=$((runs + 1))
+    "$expected" >expected
+    run "$@" >seen
+    if ! diff -u --label expected --label seen expected seen >difference; then
+        printf 'FAILED: %s: msiexec' "$why"
+        printf ' %q' "$@"
+        printf '\n'
+        cat difference
+        failed=$((failed + 1))
+    fi
+}
+
+printf '%s\r\n' '* of a user' 'PROD = PROD_ESE' 'KZ7.PASSWORD = "two  words "' 'LEVEL = 7' 'EMPTY =' >responses
+printf '%s\r\n' 'LEVEL = 8' 'no keyword' >bad_responses
+good=RSP_FILE_PATH=$(windows_path "$folder/responses")
+bad=RSP_FILE_PATH=$(windows_path "$folder/bad_responses")
+
+same 'a deferred action fails: it is rolled back'       failed_installation /i package.msi "$good" FAIL=1
+same 'an installation, after one that was rolled back'  installation        /i package.msi "$good"
+same 'its removal, with responses that cannot be read'  removal             /x package.msi "$bad"
+
+echo "package: $runs runs of the installer, $failed differ"
+[ "$failed" -eq 0 ]
