@@ -28,16 +28,13 @@ on_linux() {
     show "$code" "$("$linux/kz7admin" export 2>/dev/null | readable)"
 }
 
-# The exit code is whole here; on Linux it is the low 8 bits, or 1 where a failure has none.
+# Exit codes show in their low 8 bits.
 on_windows() {
-    wine "$windows/full_exit_code.exe" "$windows/kz7InstallReg.exe" "$@" >told 2>error_told
-    local code
-    code=$(tr -d '\r' <told | sed -n '$s/^exit code //p')
-    tr -d '\r' <told | head -c "-$((${#code} + 12))" | iconv -f CP1252 -t UTF-8 >output
+    local code=0
+    wine "$windows/kz7InstallReg.exe" "$@" >told 2>error_told || code=$?
+    tr -d '\r' <told | iconv -f CP1252 -t UTF-8 >output
     tr -d '\r' <error_told | iconv -f CP1252 -t UTF-8 >error
-    local seen=$((code & 255))
-    [ "$code" -eq 0 ] || [ $seen -ne 0 ] || seen=1
-    show "$seen" "$(wine "$windows/kz7admin.exe" export 2>/dev/null | tr -d '\r' | readable | sed "${wine_differences[@]}")"
+    show "$code" "$(wine "$windows/kz7admin.exe" export 2>/dev/null | tr -d '\r' | readable | sed "${wine_differences[@]}")"
 }
 
 # Expandable texts as text; only what the product writes, without the keys above it.
@@ -77,49 +74,33 @@ long() { printf '%*s' "$1" '' | tr ' ' "${2:-n}"; }
 
 # why                                        command
 same 'usage without an option'
-same 'usage for an unknown option'           -addKZ7
 same 'usage for a count too small'           -addKZ7Copy COPY1
-same 'usage for a count too great'           -removeKZ7Copy COPY1 'C:\KZ7'
 same 'usage for five arguments'              -addKZ7Copy COPY1 'C:\KZ7' more
-same 'removal with nothing there'            -removeKZ7Copy COPY1
 same 'the first copy'                        -addKZ7Copy COPY1 'C:\KZ7\copy1'
 same 'the same copy, elsewhere'              -addKZ7Copy COPY1 'D:\other place'
-same 'the same copy in other letters'        -addKZ7Copy copy1 'C:\KZ7\copy1'
 same 'a second copy, option in small'        -addkz7copy COPY2 'C:\KZ7\copy2'
 same 'a location that ends in a separator'   -ADDKZ7COPY COPY3 'C:\KZ7\copy3\'
 same 'removal of one that is not there'      -removeKZ7Copy COPY4
 same 'removal of one of several'             -REMOVEKZ7COPY COPY2
-same 'it comes back'                         -addKZ7Copy COPY2 'C:\KZ7\copy2'
 same 'a name with blanks'                    -addKZ7Copy ' two  words ' 'C:\Program Files\KZ7'
-same 'a name with dots'                      -addKZ7Copy '9.7.8' 'C:\KZ7\..\dots.'
 same 'a name like a pattern'                 -addKZ7Copy '%s%n %d%%' 'C:\%PATH%\%s'
-same 'a name with wildcards'                 -addKZ7Copy '*?' '*'
 same 'a name with quotation marks'           -addKZ7Copy 'say "hi" \"' 'C:\"quoted"\'
 same 'a name that is not ASCII'              -addKZ7Copy 'Zoë ÄÖ' 'C:\Straße'
 same 'its removal'                           -removeKZ7Copy 'Zoë ÄÖ'
 same 'a name with a separator'               -addKZ7Copy 'A\B' 'C:\KZ7\ab'
-same 'a name with the other separator'       -addKZ7Copy 'A/B' 'C:\KZ7\ab'
-same 'a name that begins with a separator'   -addKZ7Copy '\A' 'C:\KZ7\a'
-same 'a name that holds the token'           -addKZ7Copy 'X$CurrentInstallationName$Y' 'C:\KZ7\token'
 same 'a name that is the token'              -addKZ7Copy '$CurrentInstallationName$' 'C:\KZ7\token'
 same 'a location that holds the token'       -addKZ7Copy TOKEN 'C:\$CurrentInstallationName$'
-same 'a name of 64 characters'               -addKZ7Copy "$(long 64)" 'C:\KZ7\64'
 same 'a name of 65, alike in 64'             -addKZ7Copy "$(long 65)" 'C:\KZ7\65'
 same 'removal of it'                         -removeKZ7Copy "$(long 65)"
-same 'a name of 255 characters'              -addKZ7Copy "$(long 255 k)" 'C:\KZ7\255'
 same 'a name of 256 characters'              -addKZ7Copy "$(long 256 m)" 'C:\KZ7\256'
 same 'a path over 1,024 characters'          -addKZ7Copy "$(long 1000 p)" 'C:\KZ7\1000'
-same 'a location of 300 characters'          -addKZ7Copy LONG "C:\\$(long 300)"
 same 'an empty location'                     -addKZ7Copy NOWHERE ''
 same 'an empty name'                         -addKZ7Copy '' 'C:\KZ7\empty'
-same 'removal of an empty name'              -removeKZ7Copy ''
 same 'version 9 without its programs'        -V9 'C:\KZ7\v9'
 same 'a copy of version 9'                   -addv9 COPY9 'C:\KZ7\copy9'
 same 'providers of a copy'                   -DotNet 'C:\KZ7\v9\'
 same 'version 8 over copies'                 -v8 'C:\KZ7\v8'
-same 'a copy after that'                     -addKZ7Copy COPY1 'C:\KZ7\copy1'
 same 'removal of the last copy'              -removeKZ7Copy COPY1
-same 'nothing is left to remove'             -removeKZ7Copy COPY1
 
 echo "differential: $rows commands, $failed differ"
 [ "$failed" -eq 0 ]

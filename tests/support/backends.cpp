@@ -12,10 +12,6 @@ public:
     IPlatform& platform() override { return platform_; }
     std::string folder() override { return "C:\\contract"; }
     std::string program() override { return folder() + "\\Program.exe"; }
-    std::string written(bool both, const std::function<void(IConsole&)>& writing) override {
-        writing(platform_.console_);
-        return both ? platform_.console_.both : platform_.console_.output;
-    }
 
 private:
     MemoryPlatform platform_;
@@ -23,12 +19,8 @@ private:
 
 }  // namespace
 
-std::unique_ptr<Backend> memoryBackend() {
-    return std::make_unique<MemoryBackend>();
-}
-
 std::unique_ptr<Backend> backendNamed(std::string_view name) {
-    return name == "memory" ? memoryBackend() : hostBackend();
+    return name == "host" ? hostBackend() : std::make_unique<MemoryBackend>();
 }
 
 }  // namespace kz7::test

@@ -2,7 +2,6 @@
 // Each is fresh, or open on a place of its own that goes with it.
 #pragma once
 
-#include <functional>
 #include <memory>
 #include <string>
 #include <string_view>
@@ -30,12 +29,8 @@ public:
     // The product's path of a folder that is there, and of a program in it that can run as a service.
     virtual std::string folder() = 0;
     virtual std::string program() = 0;
-
-    // What `writing` brings out on standard output, or on both streams in the order in which it arrives.
-    virtual std::string written(bool both, const std::function<void(IConsole&)>& writing) = 0;
 };
 
-std::unique_ptr<Backend> memoryBackend();
 std::unique_ptr<Backend> hostBackend();
 
 // The name is one of kBackends.

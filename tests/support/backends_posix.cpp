@@ -2,7 +2,6 @@
 #include <fstream>
 
 #include "tests/support/backends.h"
-#include "tests/support/captured_streams.h"
 #include "tests/support/temporary_directory.h"
 
 namespace kz7::test {
@@ -18,11 +17,6 @@ public:
     IPlatform& platform() override { return *platform_; }
     std::string folder() override { return "C:\\contract"; }
     std::string program() override { return folder() + "\\Program.exe"; }
-    std::string written(bool both, const std::function<void(IConsole&)>& writing) override {
-        CapturedStreams streams(both);
-        writing(platform_->console());
-        return streams.end();
-    }
 
 private:
     TemporaryDirectory directory_;

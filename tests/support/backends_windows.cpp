@@ -3,7 +3,6 @@
 #include <filesystem>
 
 #include "tests/support/backends.h"
-#include "tests/support/captured_streams.h"
 #include "tests/support/host_processes.h"
 
 namespace kz7::test {
@@ -35,11 +34,6 @@ public:
     }
     std::string folder() override { return folder_; }
     std::string program() override { return folder() + "\\Program.exe"; }
-    std::string written(bool both, const std::function<void(IConsole&)>& writing) override {
-        CapturedStreams streams(both);
-        writing(platform_->console());
-        return streams.end();
-    }
 
 private:
     static std::string freshFolder() {
