@@ -4,25 +4,20 @@
 #include <filesystem>
 #include <random>
 
-#include "install/platform/memory/process_host.h"
-#include "install/platform/memory/threads.h"
-#include "tests/support/host_processes.h"
+#include "tests/support/backends.h"
 
 namespace kz7::test {
 namespace {
 
-std::unique_ptr<IProcessHost> memoryProcesses() {
-    return std::make_unique<MemoryProcessHost>();
-}
-
-class ProcessHostContract : public testing::TestWithParam<std::unique_ptr<IProcessHost> (*)()> {
+class ProcessHostContract : public testing::TestWithParam<const char*> {
 protected:
-    std::unique_ptr<IProcessHost> host_ = GetParam()();
+    std::unique_ptr<Backend> backend_ = backendNamed(GetParam());
+    IProcessHost* host_ = &backend_->platform().processes();
     StreamHandle copy_ = StreamHandle::none;
     FixedBuffer<3> piece_;
 };
 
-INSTANTIATE_TEST_SUITE_P(Hosts, ProcessHostContract, testing::Values(hostProcesses, memoryProcesses));
+INSTANTIATE_TEST_SUITE_P(Hosts, ProcessHostContract, testing::ValuesIn(kBackends));
 
 TEST_P(ProcessHostContract, PipesCarryBytesToTheirEndAndTellWhenTheOtherSideIsGone) {
     OwnedStream reading(*host_);
@@ -87,24 +82,20 @@ TEST_P(ProcessHostContract, ProgramsThatAreNotThereDoNotStart) {
     fs::remove_all(folder);
 }
 
-TEST(ThreadsContract, ThreadsCallTheirFunctionAndAreWaitedForAnyNumberOfTimes) {
-    MemoryThreads memory;
-    const std::unique_ptr<IThreads> host = hostThreads();
-    for (IThreads* const threads : {static_cast<IThreads*>(&memory), host.get()}) {
-        int called = 0;
-        const auto count = [](void* value) { ++*static_cast<int*>(value); };
-        auto record = std::make_unique<ThreadStart>(ThreadStart{count, &called});
-        std::uint32_t id = 0;
-        ThreadHandle thread = ThreadHandle::none;
-        ASSERT_EQ(threads->start(record, 256 * 1024 + 1, id, thread), kSuccess);
-        EXPECT_EQ(record, nullptr);
-        EXPECT_EQ(threads->wait(thread), kSuccess);
-        EXPECT_EQ(threads->wait(thread), kSuccess);
-        EXPECT_EQ(called, 1);
-        EXPECT_EQ(threads->close(thread), kSuccess);
-        EXPECT_EQ(threads->wait(ThreadHandle::none), kInvalidHandle);
-        EXPECT_EQ(threads->close(ThreadHandle::none), kInvalidHandle);
-    }
+TEST_P(ProcessHostContract, ThreadsCallTheirFunctionAndAreWaitedForAnyNumberOfTimes) {
+    IThreads& threads = backend_->platform().threads();
+    int called = 0;
+    auto record = std::make_unique<ThreadStart>(ThreadStart{[](void* value) { ++*static_cast<int*>(value); }, &called});
+    std::uint32_t id = 0;
+    ThreadHandle thread = ThreadHandle::none;
+    ASSERT_EQ(threads.start(record, 256 * 1024 + 1, id, thread), kSuccess);
+    EXPECT_EQ(record, nullptr);
+    EXPECT_EQ(threads.wait(thread), kSuccess);
+    EXPECT_EQ(threads.wait(thread), kSuccess);
+    EXPECT_EQ(called, 1);
+    EXPECT_EQ(threads.close(thread), kSuccess);
+    EXPECT_EQ(threads.wait(ThreadHandle::none), kInvalidHandle);
+    EXPECT_EQ(threads.close(ThreadHandle::none), kInvalidHandle);
 }
 
 }  // namespace

@@ -194,13 +194,12 @@ TEST_P(RegistryContract, OperationsAnswerByTheStateOfTheirHandle) {
     closed.reset();
     for (const auto& row : rows) {
         below.reset();  // a host may have given it the number of the key that was shut
-        EXPECT_EQ(row.operation(shut), kInvalidHandle) << row.why;
-        EXPECT_EQ(row.operation(KeyHandle::none), kInvalidHandle) << row.why;
-        EXPECT_EQ(row.operation(gone.get()), kKeyDeleted) << row.why;
-        EXPECT_EQ(row.operation(key_.get()), row.full) << row.why;
-        EXPECT_EQ(row.operation(query.get()), row.query) << row.why;
-        EXPECT_EQ(row.operation(setting.get()), row.set) << row.why;
-        EXPECT_EQ(row.operation(listing.get()), row.list) << row.why;
+        const Status expected[] = {kInvalidHandle, kInvalidHandle, kKeyDeleted, row.full, row.query, row.set, row.list};
+        const KeyHandle handles[] = {shut,        KeyHandle::none, gone.get(),   key_.get(),
+                                     query.get(), setting.get(),   listing.get()};
+        for (std::size_t i = 0; i < std::size(handles); ++i) {
+            EXPECT_EQ(row.operation(handles[i]), expected[i]) << row.why << i;
+        }
     }
     below.reset();
     EXPECT_EQ(registry_.closeKey(shut), kInvalidHandle);
@@ -314,20 +313,19 @@ TEST_P(RegistryContract, WhatDoesNotFitIsToldWithItsSize) {
 }
 
 TEST_P(RegistryContract, NamesHoldAnythingButASeparatorAndANul) {
-    for (const std::string& name :
-         {std::string("with blanks"), std::string(" leading"), std::string("trailing "), std::string(".."),
-          std::string("100%d%s%%"), std::string("quote\"s'"), std::string("a/b"), std::string("?*<>|:"),
-          std::string("\xE9\xF1"), std::string("[x]=y;z"), std::string("tab\tfeed\n"), std::string("back\\slash"),
-          std::string(kMaxValueName, 'v')}) {
-        if (name.size() < kMaxKeyName && name.find('\\') == std::string::npos) {
-            EXPECT_EQ(make(name), kSuccess) << name;
-            EXPECT_EQ(keys(), name);
-            EXPECT_EQ(remove(name), kSuccess) << name;
-        }
-        EXPECT_EQ(set(name, "x"), kSuccess) << name.size();
-        EXPECT_EQ(get(name), "x") << name.size();
-        EXPECT_EQ(values() == name, true) << name.size();
-        EXPECT_EQ(registry_.deleteValue(key_.get(), name), kSuccess) << name.size();
+    for (const char* name : {"with blanks", " leading", "trailing ", "..", "100%d%s%%", "quote\"s'", "a/b",
+                             "?*<>|:", "\xE9\xF1", "[x]=y;z", "tab\tfeed\n"}) {
+        EXPECT_EQ(make(name), kSuccess) << name;
+        EXPECT_EQ(keys(), name);
+        EXPECT_EQ(remove(name), kSuccess) << name;
+    }
+    const std::string longest(kMaxValueName, 'v');
+    for (const char* name :
+         {" leading", "trailing ", "100%d%s%%", "\xE9\xF1", "tab\tfeed\n", "back\\slash", longest.c_str()}) {
+        EXPECT_EQ(set(name, "x"), kSuccess) << name;
+        EXPECT_EQ(get(name), "x") << name;
+        EXPECT_EQ(values() == name, true) << name;
+        EXPECT_EQ(registry_.deleteValue(key_.get(), name), kSuccess) << name;
     }
     for (const std::string& name : {std::string(kMaxValueName + 1, 'v'), std::string("a\0b", 3)}) {
         EXPECT_EQ(set(name, "x"), kInvalidParameter) << name.size();

@@ -11,25 +11,6 @@ namespace {
 
 const std::string kCopies = "SOFTWARE\\NVQ\\KZ7\\InstalledCopies";
 
-// A sweep would pass unseen over calls that never fail.
-TEST(FaultCounterTest, CountsOverAllPortsAndFailsTheChosenCall) {
-    for (const bool forGood : {false, true}) {
-        FaultyMachine machine(FaultCounter(2, forGood, kDiskFull));
-        const Status later = forGood ? kDiskFull : kSuccess;
-        KeyHandle key = KeyHandle::none;
-        EXPECT_EQ(machine.registry().createKey(KeyHandle::localMachine, "K", {}, kKeyFull, key), kSuccess);
-        EXPECT_EQ(machine.faults_.failed(), "");
-        EXPECT_EQ(machine.console().writeOutput("lost"), kDiskFull);
-        EXPECT_EQ(machine.registry().setValue(key, "v", ValueType::binary, "x"), later);
-        EXPECT_EQ(machine.registry().closeKey(key), later) << "a close that fails closes all the same";
-        EXPECT_EQ(machine.registry().commit(), later);
-        EXPECT_EQ(machine.registry_.commits(), forGood ? 0U : 1U);
-        EXPECT_EQ(machine.console_.output, "") << "a call that fails is not made";
-        EXPECT_EQ(machine.faults_.failed(), "writeOutput") << "the first one";
-        EXPECT_EQ(machine.faults_.calls(), 5U);
-    }
-}
-
 void twoCopies(FaultyMachine& machine) {
     machine.run({"-addKZ7Copy", "FIRST", "C:\\first"});
     machine.run({"-addKZ7Copy", "SECOND", "C:\\second"});

@@ -143,16 +143,13 @@ constexpr const char* kProgramLines =
     "MESSAGE INFO INSTALLEND :: C:\\x.log\n"
     "half";
 
-Status run(MemoryPlatform& machine, std::uint32_t& exitCode) {
-    return runFront(
-        {machine.processes_, machine.threads_, machine.files_, machine.lines_, machine.terminal_, machine.console_},
-        {"setup.exe", "a b"}, exitCode);
-}
-
 std::uint32_t front(MemoryPlatform& machine, ScriptedProgram program) {
     machine.processes_.addProgram("setup.exe", std::move(program));
     std::uint32_t exitCode = 4711;
-    EXPECT_EQ(run(machine, exitCode), kSuccess);
+    EXPECT_EQ(runFront({machine.processes_, machine.threads_, machine.files_, machine.lines_, machine.terminal_,
+                        machine.console_},
+                       {"setup.exe", "a b"}, exitCode),
+              kSuccess);
     EXPECT_EQ(machine.processes_.started, std::vector<std::string>{"\"setup.exe\" \"a b\""});
     EXPECT_EQ(machine.processes_.openHandles() + machine.threads_.openHandles(), 0U);
     EXPECT_FALSE(machine.terminal_.leavesInterrupts);
@@ -187,14 +184,6 @@ TEST(Front, DrawsOneBarForEachPhaseOnATerminal) {
                   wipe + "garbage \\x1b[2J\n" + bar + wipe + "\x1b[31merror: it failed\n\x1b[0m" + bar + "\n" + wipe +
                   "Undoing      what was done is taken bac" + wipe + "Undoing      done" + wipe + "half\n" + wipe +
                   "Undoing      done\n" + "The log is C:\\x.log\nDone.\n");
-}
-
-TEST(Front, TellsThatAProgramIsNotThere) {
-    MemoryPlatform machine;
-    std::uint32_t exitCode = 0;
-    EXPECT_EQ(run(machine, exitCode), kFileNotFound);
-    EXPECT_EQ(machine.processes_.openHandles(), 0U);
-    EXPECT_EQ(machine.console_.both, "");
 }
 
 }  // namespace

@@ -48,25 +48,18 @@ TEST(Version8, RestoresTheBackupAndWritesTheDefaults) {
                                                     "Version 8 default registry keys created successfully\n||0")
         << "a stop that fails says nothing";
     EXPECT_EQ(machine.dump("SOFTWARE\\NVQ"),
-              "[SOFTWARE\\NVQ\\KZ7] \n"
-              "SOFTWARE\\NVQ\\KZ7 : KZ7 Path Name = 1:C:\\KZ8\\x00\n"
-              "SOFTWARE\\NVQ\\KZ7 : stays = 1:now\\x00\n"
-              "SOFTWARE\\NVQ\\KZ7 : top = 1:backup\\x00\n"
+              "[SOFTWARE\\NVQ\\KZ7] \nSOFTWARE\\NVQ\\KZ7 : KZ7 Path Name = 1:C:\\KZ8\\x00\n"
+              "SOFTWARE\\NVQ\\KZ7 : stays = 1:now\\x00\nSOFTWARE\\NVQ\\KZ7 : top = 1:backup\\x00\n"
               "[SOFTWARE\\NVQ\\KZ7\\CurrentVersion] \n"
               "SOFTWARE\\NVQ\\KZ7\\CurrentVersion : Modification = 1:3\\x00\n"
               "SOFTWARE\\NVQ\\KZ7\\CurrentVersion : Release = 1:2\\x00\n"
               "SOFTWARE\\NVQ\\KZ7\\CurrentVersion : Version = 1:8\\x00\n"
               "SOFTWARE\\NVQ\\KZ7\\CurrentVersion : Service Level = 1:BUILD\\x00\n"
-              "[SOFTWARE\\NVQ\\KZ7\\DAS_PROFILES] \n"
-              "SOFTWARE\\NVQ\\KZ7\\DAS_PROFILES :  = 1:\\x00\n"
-              "[SOFTWARE\\NVQ\\KZ7\\GLOBAL_PROFILE] \n"
-              "SOFTWARE\\NVQ\\KZ7\\GLOBAL_PROFILE : KZ7PATH = 1:C:\\KZ8\\x00\n"
-              "[SOFTWARE\\NVQ\\KZ7\\InstalledCopies] \n"
-              "SOFTWARE\\NVQ\\KZ7\\InstalledCopies :  = 1:KZ7V8\\x00\n"
-              "[SOFTWARE\\NVQ\\KZ7\\PROFILES] \n"
-              "SOFTWARE\\NVQ\\KZ7\\PROFILES :  = 1:\\x00\n"
-              "[SOFTWARE\\NVQ\\KZ7\\PROFILES\\I] \n"
-              "SOFTWARE\\NVQ\\KZ7\\PROFILES\\I :  = 1:instance\\x00\n")
+              "[SOFTWARE\\NVQ\\KZ7\\DAS_PROFILES] \nSOFTWARE\\NVQ\\KZ7\\DAS_PROFILES :  = 1:\\x00\n"
+              "[SOFTWARE\\NVQ\\KZ7\\GLOBAL_PROFILE] \nSOFTWARE\\NVQ\\KZ7\\GLOBAL_PROFILE : KZ7PATH = 1:C:\\KZ8\\x00\n"
+              "[SOFTWARE\\NVQ\\KZ7\\InstalledCopies] \nSOFTWARE\\NVQ\\KZ7\\InstalledCopies :  = 1:KZ7V8\\x00\n"
+              "[SOFTWARE\\NVQ\\KZ7\\PROFILES] \nSOFTWARE\\NVQ\\KZ7\\PROFILES :  = 1:\\x00\n"
+              "[SOFTWARE\\NVQ\\KZ7\\PROFILES\\I] \nSOFTWARE\\NVQ\\KZ7\\PROFILES\\I :  = 1:instance\\x00\n")
         << "the components that were just written are gone, and so is the backup";
     EXPECT_EQ(machine.services_.find("KZ7MGMTSVC")->start, ServiceStart::demand);
     EXPECT_EQ(machine.services_.openHandles(), 2U);
@@ -225,13 +218,12 @@ TEST_F(Version9, ThereAndBackAgainLosesNothing) {
                              "\\$CurrentInstallationName$", "\\PROFILES\\$CurrentInstallationName$"}) {
         machine.set(product + path, "", "default");
     }
-    for (int value = 0; value < 10000; ++value) {
+    for (int value = 0; value < 1000; ++value) {
         machine.set(product + "\\Many", "v" + std::to_string(value), "x");
     }
     // Just under the limit of a path in the backup, whose key is eight characters longer.
-    const std::size_t room = 1023 - (product + "BackupV8\\Long\\").size();
-    std::string longest = product + "\\Long\\" + std::string(200, 'l');
-    for (std::size_t used = 200; used + 201 <= room; used += 201) {
+    std::string longest = product + "\\Long";
+    while (longest.size() + 201 <= 1023 - 8) {
         longest += "\\" + std::string(200, 'l');
     }
     machine.set(longest, "v", "");

@@ -33,6 +33,11 @@ public:
 
 std::unique_ptr<Backend> hostBackend();
 
+// The path of the program that the tests start, in the host's form, and how much it writes on each stream in a flood:
+// a pipe is slow where the host is emulated.
+std::string childProgram();
+extern const std::size_t kFloodMebibytes;
+
 // The name is one of kBackends.
 std::unique_ptr<Backend> backendNamed(std::string_view name);
 
