@@ -147,6 +147,22 @@ TEST(AliasRewrite, LeavesExactlyTheAliasesOfTheCopiesThatAreThere) {
     }
 }
 
+TEST(AliasRewrite, TracesWhatItFinds) {
+    Machine machine;
+    addVersion(machine, {"A", "9", "7", "0", "0.1"});
+    machine.make(kWow);
+    rewrite(machine);
+    const std::vector<std::string> expected = {"Valid version info of Install Copy 'A'",
+                                               "The highest version leading by '9:9.7.0.0.1--A",
+                                               "The highest version leading by '9.7:9.7.0.0.1--A",
+                                               "The highest version leading by '9.7.0:9.7.0.0.1--A",
+                                               "The highest version leading by '9.7.0.0': ( none )",
+                                               "Did not find corrsponding install name for '9.7.0.0'",
+                                               "The highest version leading by '9.7.0.0.1': ( none )",
+                                               "Did not find corrsponding install name for '9.7.0.0.1'"};
+    EXPECT_EQ(machine.debugOutput_.messages, expected);
+}
+
 const std::string kLongData(120, 'x');
 
 // One alias goes, one stays with another copy, three are new; one cannot be backed up whole.

@@ -143,40 +143,19 @@ constexpr const char* kProgramLines =
     "MESSAGE INFO INSTALLEND :: C:\\x.log\n"
     "half";
 
-std::uint32_t front(MemoryPlatform& machine, ScriptedProgram program) {
-    machine.processes_.addProgram("setup.exe", std::move(program));
+TEST(Front, DrawsOneBarForEachPhaseOnATerminal) {
+    MemoryPlatform machine;
+    machine.terminal_.view = {.terminal = true, .redraws = true, .colours = true, .columns = 40};
+    machine.processes_.addProgram("setup.exe", {.output = kProgramLines});
     std::uint32_t exitCode = 4711;
     EXPECT_EQ(runFront({machine.processes_, machine.threads_, machine.files_, machine.lines_, machine.terminal_,
                         machine.console_},
                        {"setup.exe", "a b"}, exitCode),
               kSuccess);
+    EXPECT_EQ(exitCode, 0U);
     EXPECT_EQ(machine.processes_.started, std::vector<std::string>{"\"setup.exe\" \"a b\""});
     EXPECT_EQ(machine.processes_.openHandles() + machine.threads_.openHandles(), 0U);
     EXPECT_FALSE(machine.terminal_.leavesInterrupts);
-    return exitCode;
-}
-
-TEST(Front, ShowsPlainLinesWhereNobodyLooks) {
-    MemoryPlatform machine;
-    machine.lines_.input = "/media\n";
-    EXPECT_EQ(front(machine, {.output = kProgramLines, .error = "complaint\n", .exitCode = 7}), 7U);
-    EXPECT_EQ(machine.console_.output,
-              "Installing 0%: Files\n"
-              "Where?\n"
-              "Answer, or ABORT [D:\\]: /media\n"
-              "Installing 75%: Files, done\n"
-              "garbage \\x1b[2J\n"
-              "Undoing: what was done is taken back\n"
-              "Undoing: done\n"
-              "half\n"
-              "The log is C:\\x.log\n");
-    EXPECT_EQ(machine.console_.error, "error: it failed\ncomplaint\nsetup.exe ended with exit code 7.\n");
-}
-
-TEST(Front, DrawsOneBarForEachPhaseOnATerminal) {
-    MemoryPlatform machine;
-    machine.terminal_.view = {.terminal = true, .redraws = true, .colours = true, .columns = 40};
-    EXPECT_EQ(front(machine, {.output = kProgramLines, .exitCode = 0}), 0U);
     const std::string wipe = "\r\x1b[K";
     const std::string bar = wipe + "Installing   [#######...]  75% Files, d";
     EXPECT_EQ(machine.console_.both,

@@ -29,36 +29,16 @@ void* operator new[](std::size_t size, const std::nothrow_t&) noexcept {
 namespace kz7::test {
 namespace {
 
+using namespace std::literals;
 using Response = UREInfo::Response;
 
-TEST(ProtocolLines, TellTasks) {
-    constexpr auto kStart = ProgressKind::start;
-    constexpr auto kEnd = ProgressKind::end;
-    // clang-format off
-    const struct { const char* why; ProgressKind kind; std::uint64_t start; std::int32_t task; bool installation;
-                   std::string text; std::string line; } rows[] = {
-        {"installation",           kStart, 40, 10, true,  "Files", "PROGRESS TASK START :: INSTALLATION :: 40 :: 10 :: Files\n"},
-        {"configuration",          kStart, 0, -1,  false, "",      "PROGRESS TASK START :: CONFIGURATION :: 0 :: -1 :: \n"},
-        {"low 32 bits, unsigned",  kStart, 0x1FFFFFFFF, 1, true, "x", "PROGRESS TASK START :: INSTALLATION :: 4294967295 :: 1 :: x\n"},
-        {"an end, no start value", kEnd, 7, 10, true,     "Files", "PROGRESS TASK END :: INSTALLATION :: 10 :: Files\n"},
-        {"undo",                   kStart, 1, 3577, true, "x",     "MESSAGE INFO UNDOSTART\n"},
-        {"undo ends",              kEnd, 1, 3577, false,  "x",     "MESSAGE INFO UNDOEND\n"},
-        {"another event",          ProgressKind{0x300}, 1, 1, true, "x", ""},
-        {"line ends in a text",    kEnd, 0, 1, true,      "a\r\n :: b", "PROGRESS TASK END :: INSTALLATION :: 1 :: a   :: b\n"},
-        {"a NUL in a text",        kEnd, 0, 1, true,      std::string("a\0b", 3), "PROGRESS TASK END :: INSTALLATION :: 1 :: a\n"},
-        {"placeholders in a text", kEnd, 0, 1, true,      "%s%n%%", "PROGRESS TASK END :: INSTALLATION :: 1 :: %s%n%%\n"},
-    };
-    // clang-format on
+TEST(ProtocolLines, KeepTheirLineFeedAndTellNoOtherEvent) {
     ProtocolLine line;
-    for (const auto& row : rows) {
-        EXPECT_EQ(progressLine({row.kind, row.start, row.task, row.installation, row.text}, line), !row.line.empty())
-            << row.why;
-        EXPECT_EQ(row.line.empty() ? "" : line.view(), row.line) << row.why;
-    }
-    progressLine({kEnd, 0, 1, true, std::string(5000, 'x')}, line);
+    EXPECT_TRUE(progressLine({ProgressKind::end, 0, 1, true, std::string(5000, 'x')}, line));
     EXPECT_EQ(line.view().size(), 1023U);
-    EXPECT_EQ(line.view().substr(1020), "xx\n") << "a line that is too long keeps its line feed";
+    EXPECT_EQ(line.view().substr(1020), "xx\n");
     EXPECT_EQ(queryLine(std::string(3000, 'a'), "b").view().substr(1020), "aa\n");
+    EXPECT_FALSE(progressLine({ProgressKind{0x300}, 1, 1, true, "x"}, line));
 }
 
 TEST(ProtocolLines, TellTaskLists) {
@@ -152,7 +132,9 @@ void runInstallation(URE& engine, std::vector<UREInfo::Response>& responses) {
     engine.message(0x24000005, kTextMessage, std::array<Insert, 1>{"other"});
     engine.message(0x01000005, kTextMessage, std::array<Insert, 1>{"not for front ends"});
     engine.startTask(0, kUndoTask, true, "undo");
-    engine.endTask(kUndoTask, true, "undo");
+    engine.endTask(kUndoTask, false, "undo");
+    engine.startTask(0x1FFFFFFFF, -1, true, "a\r\n :: %s%n%%");
+    engine.endTask(5, false, std::string_view("a\0b", 3));
     responses.push_back(engine.ask(2, 1, {}, "", answer));
     EXPECT_EQ(answer, "");
 }
@@ -169,16 +151,18 @@ constexpr const char* kMachineRun =
     "MESSAGE ERROR GENERAL :: Copier::configure, step 20: error 5030: The program was not run, or it failed.\n"
     "MESSAGE ERROR GENERAL :: The program wrote: SQL0000\nMESSAGE ERROR GENERAL :: other\n"
     "MESSAGE INFO UNDOSTART\nMESSAGE INFO UNDOEND\n"
+    "PROGRESS TASK START :: INSTALLATION :: 4294967295 :: -1 :: a   :: %s%n%\nPROGRESS TASK END :: CONFIGURATION :: 5 "
+    ":: a\n"
     "MESSAGE QUERY CDPATH :: The text of message 0x44000002 is missing. :: \n\n"
     "MESSAGE INFO INSTALLEND :: C:\\Setup Logs\\setup.log\n";
 
-constexpr const char* kRunInLog =
+const std::string kRunInLog =
     "Tasks: 10,30;11,45;\nCopying files\nNote: Copier::copy, step 10: 42 files\n"
     "Note: The installation medium was not found. Where is it?\nCopying files\n"
     "100%% of the\nconfiguration\nGo on?\n"
     "ERROR: Copier::configure, step 20: error 5030: The program was not run, or it failed.\n"
-    "Note: The program wrote: SQL0000\nNote: other\nnot for front ends\nundo\nundo\n"
-    "WARNING: The text of message 0x44000002 is missing.\n";
+    "Note: The program wrote: SQL0000\nNote: other\nnot for front ends\nundo\nundo\na\r\n :: %s%n%%\na\0b\n"
+    "WARNING: The text of message 0x44000002 is missing.\n"s;
 
 TEST(MachineStream, TellsAWholeRunToTheByte) {
     RuntimeMachine machine;
@@ -197,43 +181,35 @@ TEST(MachineStream, TellsAWholeRunToTheByte) {
     EXPECT_EQ(log, kRunInLog);
 }
 
-TEST(MachineStream, AllocationFailuresAreReportedOnceAndLoseOneLine) {
-    const std::string constructor = "ERROR: UREExternalOutputPipe::UREExternalOutputPipe, step ";
-    const std::string add = "ERROR: UREExternalOutputPipe::addQueueMessage, step ";
-    const std::string reason = ": error 5002: There is not enough memory.\n";
+TEST(Pipe, AnAllocationThatFailsIsReportedAndLosesOneLine) {
     // The queue is made of an array and 4 buffers; the fifth line asks for an array and 4 buffers more.
     for (int failing = 0; failing < 11; ++failing) {
         RuntimeMachine machine;
         machine.openLog();
-        const std::string logged = machine.logged([&] {
+        const std::string step =
+            (failing % 5 == 0 ? "10" : "20") + std::string(": error 5002: There is not enough memory.\n");
+        const std::string log = machine.logged([&] {
             allocationsUntilFailure = failing;
-            const Shown<UREExternalObserverMachineStream> shown(machine.engine);
-            // 5 lines at once: count, identifiers, line feed, times, line feed.
-            machine.engine.announceTasks("1,2");
-            machine.engine.startTask(1, 1, true, "a");
+            UREExternalOutputPipe pipe(machine.console_, machine.lines_, machine.engine);
+            for (int line = 1; line <= 5; ++line) {
+                const bool kept = failing >= 5 && (line < 5 || failing >= 10);
+                EXPECT_EQ(pipe.addQueueMessage("x"), kept ? kSuccess : kFailed) << failing << line;
+            }
             allocationsUntilFailure = -1;
-            machine.engine.endTask(1, true, "a");
+            pipe.addQueueMessage("y");
+            pipe.flushQueue();
         });
-
-        const std::string list =
-            "PROGRESS INFO TASKCOUNT :: 1\nPROGRESS INFO TASKIDS :: 1\nPROGRESS INFO TASKTIMES :: 2";
-        const std::string tasks =
-            "PROGRESS TASK START :: INSTALLATION :: 1 :: 1 :: a\nPROGRESS TASK END :: INSTALLATION :: 1 :: a\n";
-        std::string lines = list + "\n" + tasks;
-        std::string log = "Tasks: 1,2\na\na\n";
-        if (failing < 5) {  // nothing of it is ever queued: each of the 7 lines is reported
-            const std::string lost = add + "10" + reason;
-            lines.clear();
-            log = constructor + (failing == 0 ? "10" : "20") + reason + "Tasks: 1,2\n" + lost + lost + lost + lost +
-                  lost + "a\n" + lost + "a\n" + lost;
-        } else if (failing < 10) {  // the list is not flushed: what of it was kept goes out later
-            lines = list + tasks;
-            log = "Tasks: 1,2\n" + add + (failing == 5 ? "10" : "20") + reason + "a\na\n";
+        std::string expected;
+        if (failing < 5) {  // nothing is ever queued
+            expected = "ERROR: UREExternalOutputPipe::UREExternalOutputPipe, step " + step;
+            for (int line = 0; line < 6; ++line) {
+                expected += "ERROR: UREExternalOutputPipe::addQueueMessage, step 10" + step.substr(2);
+            }
+        } else if (failing < 10) {
+            expected = "ERROR: UREExternalOutputPipe::addQueueMessage, step " + step;
         }
-        EXPECT_EQ(machine.console_.output,
-                  "MESSAGE INFO INSTALLSTART\n" + lines + "MESSAGE INFO INSTALLEND :: C:\\Setup Logs\\setup.log\n")
-            << "allocation " << failing;
-        EXPECT_EQ(logged, log) << "allocation " << failing;
+        EXPECT_EQ(log, expected) << failing;
+        EXPECT_EQ(machine.console_.output, failing < 5 ? "" : failing < 10 ? "xxxxy" : "xxxxxy") << failing;
     }
 }
 
