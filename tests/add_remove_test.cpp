@@ -8,189 +8,154 @@ namespace kz7::test {
 namespace {
 
 const std::string kCopies = "SOFTWARE\\NVQ\\KZ7\\InstalledCopies";
+const std::string kCopies32 = "SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies";
 const std::string kEventSource = "SYSTEM\\CurrentControlSet\\Services\\EventLog\\Application\\KZ7 Management Service";
 
-std::string creatingLines(const std::string& root, const std::string& location) {
-    const char* const rows[][3] = {
-        {"KZ7 Path Name", "", "<location>"},
-        {"BASE_CLIENT", "\\Components", ""},
-        {"MULTI_VERSION_SUPPORT", "\\Components", ""},
-        {"Modification", "\\CurrentVersion", "800"},
-        {"Release", "\\CurrentVersion", "7"},
-        {"Version", "\\CurrentVersion", "9"},
-        {"Service Level", "\\CurrentVersion", "BUILD"},
-        {"", "\\PROFILES", ""},
-        {"KZ7PATH", "\\GLOBAL_PROFILE", "<location>"},
-        {"", "\\Das_PROFILES", ""},
-    };
-    std::string lines;
-    for (const auto& row : rows) {
-        const std::string data = std::string(row[2]) == "<location>" ? location : row[2];
-        lines +=
-            "Creating registry key " + std::string(row[0]) + " under " + root + row[1] + " with value " + data + "\n";
+// In a text, '#' stands for the copy's key and '@' for its location.
+std::string filled(const std::string& text, const std::string& key, const std::string& location) {
+    std::string result;
+    for (const char c : text) {
+        result += c == '#' ? key : c == '@' ? location : std::string(1, c);
     }
-    return lines;
+    return result;
 }
 
 std::string addLines(const std::string& name, const std::string& location) {
-    return creatingLines(kCopies + "\\" + name, location) +
-           creatingLines("SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies\\" + name, location);
+    const std::string lines =
+        "Creating registry key KZ7 Path Name under # with value @\n"
+        "Creating registry key BASE_CLIENT under #\\Components with value \n"
+        "Creating registry key MULTI_VERSION_SUPPORT under #\\Components with value \n"
+        "Creating registry key Modification under #\\CurrentVersion with value 800\n"
+        "Creating registry key Release under #\\CurrentVersion with value 7\n"
+        "Creating registry key Version under #\\CurrentVersion with value 9\n"
+        "Creating registry key Service Level under #\\CurrentVersion with value BUILD\n"
+        "Creating registry key  under #\\PROFILES with value \n"
+        "Creating registry key KZ7PATH under #\\GLOBAL_PROFILE with value @\n"
+        "Creating registry key  under #\\Das_PROFILES with value \n";
+    return filled(lines, kCopies + "\\" + name, location) + filled(lines, kCopies32 + "\\" + name, location);
 }
 
-std::string copyDump(const std::string& root, const std::string& location) {
-    return root + " : KZ7 Path Name = 1:" + location + "\\x00\n[" +            //
-           root + "\\Components] \n" +                                         //
-           root + "\\Components : BASE_CLIENT = 1:\\x00\n" +                   //
-           root + "\\Components : MULTI_VERSION_SUPPORT = 1:\\x00\n[" +        //
-           root + "\\CurrentVersion] \n" +                                     //
-           root + "\\CurrentVersion : Modification = 1:800\\x00\n" +           //
-           root + "\\CurrentVersion : Release = 1:7\\x00\n" +                  //
-           root + "\\CurrentVersion : Version = 1:9\\x00\n" +                  //
-           root + "\\CurrentVersion : Service Level = 1:BUILD\\x00\n[" +       //
-           root + "\\Das_PROFILES] \n" +                                       //
-           root + "\\Das_PROFILES :  = 1:\\x00\n[" +                           //
-           root + "\\GLOBAL_PROFILE] \n" +                                     //
-           root + "\\GLOBAL_PROFILE : KZ7PATH = 1:" + location + "\\x00\n[" +  //
-           root + "\\PROFILES] \n" +                                           //
-           root + "\\PROFILES :  = 1:\\x00\n";
+std::string copyDump(const std::string& key, const std::string& location) {
+    return filled(
+        "# : KZ7 Path Name = 1:@\\x00\n"
+        "[#\\Components] \n#\\Components : BASE_CLIENT = 1:\\x00\n#\\Components : MULTI_VERSION_SUPPORT = 1:\\x00\n"
+        "[#\\CurrentVersion] \n#\\CurrentVersion : Modification = 1:800\\x00\n#\\CurrentVersion : Release = 1:7\\x00\n"
+        "#\\CurrentVersion : Version = 1:9\\x00\n#\\CurrentVersion : Service Level = 1:BUILD\\x00\n"
+        "[#\\Das_PROFILES] \n#\\Das_PROFILES :  = 1:\\x00\n"
+        "[#\\GLOBAL_PROFILE] \n#\\GLOBAL_PROFILE : KZ7PATH = 1:@\\x00\n"
+        "[#\\PROFILES] \n#\\PROFILES :  = 1:\\x00\n",
+        key, location);
 }
 
 TEST(AddCopy, WritesBothViewsTheServiceAndItsEventSource) {
     Machine machine;
-    EXPECT_EQ(machine.run({"-ADDkz7copy", "COPY1", "C:\\KZ7\\100%s"}), kSuccess);
-    EXPECT_EQ(machine.console_.output,
-              addLines("COPY1", "C:\\KZ7\\100%s") + "COPY1 install copy at C:\\KZ7\\100%s added successfully\n");
-    EXPECT_EQ(machine.console_.error, "");
-    EXPECT_EQ(machine.dump(kCopies + "\\COPY1"), copyDump(kCopies + "\\COPY1", "C:\\KZ7\\100%s"));
-    const std::string other = "SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies\\COPY1";
-    EXPECT_EQ(machine.dump(other), copyDump(other, "C:\\KZ7\\100%s"));
-    EXPECT_EQ(machine.dump(kCopies).find(kCopies + " : "), std::string::npos) << "no value beside the copies";
+    EXPECT_EQ(machine.told({"-ADDkz7copy", "COPY1", "C:\\old\\100%s"}),
+              addLines("COPY1", "C:\\old\\100%s") + "COPY1 install copy at C:\\old\\100%s added successfully\n||0");
+    for (const std::string& key : {kCopies + "\\COPY1", kCopies32 + "\\COPY1"}) {
+        EXPECT_EQ(machine.dump(key), copyDump(key, "C:\\old\\100%s"));
+    }
+    EXPECT_EQ(machine.values(kCopies), "") << "no value beside the copies";
     EXPECT_EQ(machine.dump(kEventSource), kEventSource +
-                                              " : EventMessageFile = 2:C:\\KZ7\\100%s\\bin\\kz7wint64.dll\\x00\n" +
+                                              " : EventMessageFile = 2:C:\\old\\100%s\\bin\\kz7wint64.dll\\x00\n" +
                                               kEventSource + " : TypesSupported = 4:\\x07\\x00\\x00\\x00\n");
     const auto* service = machine.services_.find("KZ7MGMTSVC_COPY1");
     ASSERT_NE(service, nullptr);
     EXPECT_EQ(service->displayName, "KZ7 Management Service (COPY1)");
-    EXPECT_EQ(service->programPath, "C:\\KZ7\\100%s\\bin\\kz7mgmtsvc.exe");
+    EXPECT_EQ(service->programPath, "C:\\old\\100%s\\bin\\kz7mgmtsvc.exe");
     EXPECT_EQ(service->start, ServiceStart::automatic);
     EXPECT_EQ(service->state, ServiceState::stopped);
-    EXPECT_EQ(machine.registry_.openHandles() + machine.services_.openHandles(), 0U);
     EXPECT_EQ(machine.registry_.commits(), 1U);
-}
 
-TEST(AddCopy, AgainTakesTheNewLocationButLeavesTheService) {
-    Machine machine;
-    machine.run({"-addKZ7Copy", "COPY1", "C:\\old"});
     EXPECT_EQ(machine.run({"-addKZ7Copy", "copy1", "C:\\new\\"}), kSuccess);
     EXPECT_EQ(machine.dump(kCopies), "[" + kCopies + "\\COPY1] \n" + copyDump(kCopies + "\\COPY1", "C:\\new\\"))
         << "the first spelling of the name stays";
-    EXPECT_EQ(machine.services_.find("KZ7MGMTSVC_COPY1")->programPath, "C:\\old\\bin\\kz7mgmtsvc.exe");
-    EXPECT_NE(machine.dump(kEventSource).find("C:\\old\\bin\\kz7wint64.dll"), std::string::npos);
+    EXPECT_EQ(service->programPath, "C:\\old\\100%s\\bin\\kz7mgmtsvc.exe") << "an existing service is left";
+    EXPECT_NE(machine.dump(kEventSource).find("C:\\old\\100%s\\bin"), std::string::npos) << "and its source";
     machine.run({"-addKZ7Copy", "COPY2", "C:\\two\\"});
     EXPECT_NE(machine.dump(kEventSource).find("C:\\two\\\\bin\\kz7wint64.dll"), std::string::npos)
         << "one source for all copies, the last one's file";
 }
 
 TEST(AddCopy, NamesAreTakenAsTheyStand) {
-    const struct {
-        const char* why;
-        std::string name;
-        std::string key;
-        Status status;
-    } rows[] = {
-        {"blanks, quotes, percent signs", " a \"%s%n\" ", " a \"%s%n\" ", kSuccess},
-        {"over 64 characters", std::string(80, 'n'), std::string(80, 'n'), kSuccess},
-        {"the empty name leaves the placeholder", "", "$CurrentInstallationName$", kSuccess},
-        {"a name that holds the placeholder", "$CurrentInstallationName$", "$CurrentInstallationName$", kSuccess},
-        {"a separator makes a key below, but no service can have it", "a\\b", "a\\b", kInvalidName},
-        {"over 255 characters is no key name", std::string(256, 'n'), "", kInvalidParameter},
-        {"over 1,023 characters of path", std::string(1000, 'n'), "", kFilenameExceedsRange},
+    const std::string token = "$CurrentInstallationName$";
+    // clang-format off
+    const struct { const char* why; std::string name; std::string key; Status status; } rows[] = {
+        {"blanks, quotes, percent signs",         " a \"%s%n\" ",         " a \"%s%n\" ",       kSuccess},
+        {"over 64 characters",                    std::string(80, 'n'),   std::string(80, 'n'), kSuccess},
+        {"the empty name leaves the placeholder", "",                     token,                kSuccess},
+        {"a name that holds the placeholder",     token,                  token,                kSuccess},
+        {"over 255 characters is no key name",    std::string(256, 'n'),  "",                   kInvalidParameter},
+        {"over 1,023 characters of path",         std::string(1000, 'n'), "",                   kFilenameExceedsRange},
     };
+    // clang-format on
     for (const auto& row : rows) {
         Machine machine;
         EXPECT_EQ(machine.run({"-addKZ7Copy", row.name, "C:\\KZ7"}), row.status) << row.why;
-        if (!row.key.empty()) {
-            EXPECT_TRUE(machine.has(kCopies + "\\" + row.key + "\\GLOBAL_PROFILE")) << row.why;
-        } else {
-            EXPECT_FALSE(machine.has("SOFTWARE")) << row.why;
-            EXPECT_EQ(machine.console_.error,
-                      compose("install\\src\\uselvlkz7reg.cpp:392: An error occurred while creating the registry key "
-                              "KZ7 Path Name under %s\\%s with value C:\\KZ7 : rc= %d\n"
-                              "install\\src\\uselvlkz7reg.cpp:392: An error occurred while creating the registry key "
-                              "KZ7 Path Name under SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies\\%s with value "
-                              "C:\\KZ7 : rc= %d\n"
-                              "install\\src\\uselvlkz7reg.cpp:941: Unable to add a new copy of KZ7 to this machine : "
-                              "rc = %d\n",
-                              {kCopies, row.name, row.status, row.name, row.status, row.status}))
-                << row.why;
+        EXPECT_EQ(machine.has(kCopies + "\\" + row.key + "\\GLOBAL_PROFILE"), row.status == kSuccess) << row.why;
+        EXPECT_EQ(machine.has("SOFTWARE"), row.status == kSuccess) << row.why;
+        std::string error;
+        for (const std::string& copies : {kCopies, kCopies32}) {
+            error += compose(
+                "%s392: An error occurred while creating the registry key KZ7 Path Name under %s\\%s "
+                "with value C:\\KZ7 : rc= %d\n",
+                {kPrefix, copies, row.name, row.status});
         }
+        error += compose("%s941: Unable to add a new copy of KZ7 to this machine : rc = %d\n", {kPrefix, row.status});
+        EXPECT_EQ(machine.console_.error, row.status == kSuccess ? "" : error) << row.why;
     }
-}
-
-TEST(AddCopy, AServiceThatCannotBeMadeIsTold) {
     Machine machine;
-    EXPECT_EQ(machine.run({"-addKZ7Copy", "a\\b", "C:\\KZ7"}), kInvalidName);
-    EXPECT_EQ(machine.console_.output, addLines("a\\b", "C:\\KZ7") +
-                                           "An error occurred while registering the KZ7 Management Service\n"
-                                           "The KZ7 Management service could not be started - some function not \n"
-                                           "yet ported to the new registry layout may not function properly\n");
-    EXPECT_EQ(machine.console_.error,
-              "install\\src\\uselvlkz7reg.cpp:1775: Failed to create service- error code 123\n"
-              "install\\src\\uselvlkz7reg.cpp:941: Unable to add a new copy of KZ7 to this machine : rc = 123\n");
+    EXPECT_EQ(machine.told({"-addKZ7Copy", "a\\b", "C:\\KZ7"}),
+              addLines("a\\b", "C:\\KZ7") +
+                  "An error occurred while registering the KZ7 Management Service\n"
+                  "The KZ7 Management service could not be started - some function not \n"
+                  "yet ported to the new registry layout may not function properly\n|" +
+                  kPrefix + "1775: Failed to create service- error code 123\n" + kPrefix +
+                  "941: Unable to add a new copy of KZ7 to this machine : rc = 123\n|123")
+        << "a separator makes a key below, but no service can have it";
 }
 
-TEST(RemoveCopy, OneOfTwoTakesItsNativeTreeAndService) {
-    Machine machine;
-    machine.run({"-addKZ7Copy", "COPY1", "C:\\one"});
-    machine.set(kCopies, "9", "COPY1");
-    machine.run({"-addKZ7Copy", "COPY2", "C:\\two"});
-    EXPECT_EQ(machine.run({"-removekz7copy", "copy1"}), kSuccess);
-    EXPECT_EQ(machine.console_.output, "The KZ7 Copy copy1 has been removed");
-    EXPECT_EQ(machine.console_.error, "");
-    EXPECT_EQ(machine.dump(kCopies),
-              kCopies + " : 9 = 1:COPY1\\x00\n[" + kCopies + "\\COPY2] \n" + copyDump(kCopies + "\\COPY2", "C:\\two"));
-    EXPECT_TRUE(machine.has("SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies\\COPY1\\Components"));
-    EXPECT_EQ(machine.services_.find("KZ7MGMTSVC_COPY1"), nullptr);
-    EXPECT_NE(machine.services_.find("KZ7MGMTSVC_COPY2"), nullptr);
-    EXPECT_EQ(machine.registry_.openHandles() + machine.services_.openHandles(), 0U);
-}
-
-TEST(RemoveCopy, TheLastOneTakesTheProductTree) {
-    Machine machine;
-    machine.run({"-addKZ7Copy", "COPY1", "C:\\one"});
-    machine.set("SOFTWARE\\NVQ\\KZ7\\Other", "v", "");
-    EXPECT_EQ(machine.run({"-removeKZ7Copy", "COPY1"}), kSuccess);
-    EXPECT_FALSE(machine.has("SOFTWARE\\NVQ\\KZ7"));
-    EXPECT_TRUE(machine.has("SOFTWARE\\NVQ"));
-    EXPECT_TRUE(machine.has("SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies\\COPY1"));
-    EXPECT_EQ(machine.run({"-removeKZ7Copy", "COPY1"}), kMissingItem);
-}
-
-TEST(RemoveCopy, AnUnknownNameChangesNothing) {
-    Machine machine;
-    machine.run({"-addKZ7Copy", "COPY1", "C:\\one"});
-    const std::string before = machine.dump();
-    EXPECT_EQ(machine.run({"-removeKZ7Copy", "%s"}), kMissingItem);
-    EXPECT_EQ(machine.console_.output, "The KZ7 Copy %s was not found\n");
-    EXPECT_EQ(machine.dump(), before);
-}
-
-TEST(RemoveCopy, ARunningServiceIsStoppedAndAMissingOneIsSilent) {
+TEST(RemoveCopy, TakesTheNativeTreeAndTheServiceAndTheLastOneTheProduct) {
     Machine machine;
     machine.files_.add("C:\\one\\bin\\kz7mgmtsvc.exe");
     machine.run({"-addKZ7Copy", "COPY1", "C:\\one"});
-    {
-        OwnedService manager(machine.services_);
-        OwnedService service(machine.services_);
-        machine.services_.openManager(kServiceManagerAllAccess, manager.receive());
-        machine.services_.openService(manager.get(), "KZ7MGMTSVC_COPY1", kServiceAllAccess, service.receive());
-        ASSERT_EQ(machine.services_.startService(service.get()), kSuccess);
-    }
-    EXPECT_EQ(machine.run({"-removeKZ7Copy", "COPY1"}), kSuccess);
-    EXPECT_EQ(machine.services_.count(), 0U);
+    machine.set(kCopies, "9", "COPY1");
+    machine.run({"-addKZ7Copy", "COPY2", "C:\\two"});
+    const std::string before = machine.dump();
+    EXPECT_EQ(machine.told({"-removeKZ7Copy", "%s"}), "The KZ7 Copy %s was not found\n||5021");
+    EXPECT_EQ(machine.dump(), before);
+
+    OwnedService manager(machine.services_);
+    OwnedService service(machine.services_);
+    machine.services_.openManager(kServiceManagerAllAccess, manager.receive());
+    machine.services_.openService(manager.get(), "KZ7MGMTSVC_COPY1", kServiceAllAccess, service.receive());
+    ASSERT_EQ(machine.services_.startService(service.get()), kSuccess);
+    service.reset();
+    EXPECT_EQ(machine.told({"-removekz7copy", "copy1"}), "The KZ7 Copy copy1 has been removed||0");
+    EXPECT_EQ(machine.dump(kCopies),
+              kCopies + " : 9 = 1:COPY1\\x00\n[" + kCopies + "\\COPY2] \n" + copyDump(kCopies + "\\COPY2", "C:\\two"));
+    EXPECT_TRUE(machine.has(kCopies32 + "\\COPY1\\Components"));
+    EXPECT_EQ(machine.services_.find("KZ7MGMTSVC_COPY1"), nullptr) << "a running one is stopped and deleted";
+    EXPECT_NE(machine.services_.find("KZ7MGMTSVC_COPY2"), nullptr);
+
     machine.set(kCopies + "\\NoService", "KZ7 Path Name", "C:\\x");
-    EXPECT_EQ(machine.run({"-removeKZ7Copy", "NoService"}), kSuccess);
-    EXPECT_EQ(machine.console_.error, "");
+    EXPECT_EQ(machine.told({"-removeKZ7Copy", "NoService"}), "The KZ7 Copy NoService has been removed||0");
+    machine.set("SOFTWARE\\NVQ\\KZ7\\Other", "v", "");
+    EXPECT_EQ(machine.told({"-removeKZ7Copy", "COPY2"}), "The KZ7 Copy COPY2 has been removed||0");
+    EXPECT_FALSE(machine.has("SOFTWARE\\NVQ\\KZ7"));
+    EXPECT_TRUE(machine.has("SOFTWARE\\NVQ"));
+    EXPECT_TRUE(machine.has(kCopies32 + "\\COPY2"));
+    EXPECT_EQ(machine.services_.count(), 0U);
+    EXPECT_EQ(machine.run({"-removeKZ7Copy", "COPY2"}), kMissingItem);
+}
+
+// The low 8 bits where the system keeps no more, but never 0 for a failure.
+TEST(CommandLine, ExitCodesAreStatusesAsFarAsTheHostKeepsThem) {
+    const std::pair<Status, int> rows[] = {
+        {kSuccess, 0}, {kInvalidParameter, 87}, {kMissingItem, 157}, {512, 1}, {kFailed, 255}};
+    for (const auto& [status, code] : rows) {
+        const bool whole = hostExitCode(kMissingItem) == static_cast<int>(kMissingItem);
+        EXPECT_EQ(hostExitCode(status), whole ? static_cast<int>(status) : code);
+    }
 }
 
 TEST(CommandLine, AnythingElsePrintsTheUsage) {
@@ -200,14 +165,13 @@ TEST(CommandLine, AnythingElsePrintsTheUsage) {
         {"-addKZ7Copy", "name"},
         {"-v9", "a", "b"},
         {"-removeKZ7Copy", "a", "b"},
-        {"-addKZ7Copy", "a", "b", "c"},
         {"addKZ7Copy", "a", "b"},
         {"", ""},
+        {"-addKZ7Copy", "a", "b", "c"},
     };
     for (const auto& row : rows) {
         Machine machine;
-        EXPECT_EQ(machine.run(row), kInvalidParameter);
-        EXPECT_EQ(machine.console_.output,
+        EXPECT_EQ(machine.told(row),
                   "Supported Command Line Options\n\n\n -addKZ7Copy [installName] [installLocation] - this will set up "
                   "a computer to for \n very basic KZ7 functionality. This option depends on a valid directory "
                   "existing \n with all of the files needed for KZ7 to operate properly that is specified with \n the "
@@ -216,8 +180,7 @@ TEST(CommandLine, AnythingElsePrintsTheUsage) {
                   "server will be setup \n installName without any instances and this copy can be used like a \n "
                   "multiple copy version.  This option will also not set up any shortcuts \n or system environment "
                   "variables.\n\n\n -removeKZ7Copy [installName] - this can remove a copy that has been created using "
-                  "\n -addKZ7Copy.  This cannot be used to remove a copy installed with the KZ7 Setup Wizard\n \n");
-        EXPECT_EQ(machine.console_.error, "");
+                  "\n -addKZ7Copy.  This cannot be used to remove a copy installed with the KZ7 Setup Wizard\n \n||87");
         EXPECT_EQ(machine.dump(), "");
     }
 }

@@ -5,7 +5,6 @@
 #include <unistd.h>
 
 #include <algorithm>
-#include <fstream>
 
 #include "tests/support/state_directory.h"
 
@@ -23,9 +22,8 @@ protected:
     }
 
     std::string file(const std::string& content) const {
-        const std::string path = files_.path() + "/file.reg";
-        std::ofstream(path, std::ios::binary) << content;
-        return path;
+        overwrite(files_.path() + "/file.reg", content);
+        return files_.path() + "/file.reg";
     }
 
     std::string told(const std::string& line) const { return "kz7admin: " + line + "\n"; }
@@ -152,7 +150,7 @@ TEST_F(AdminProgram, KeepsAStoreThatItCannotChange) {
     EXPECT_EQ(noRoom.exitCode, 2);
     EXPECT_EQ(noRoom.error, told("standard output takes no more"));
 
-    std::ofstream(store_.file("registry.db"), std::ios::binary) << "rubbish";
+    overwrite(store_.file("registry.db"), "rubbish");
     for (const char* const command : {"tree", "import"}) {
         const ProgramResult damaged = admin({command, "import"s == command ? file(kHead + "[HKLM\\a]\n"s) : "HKLM"s});
         EXPECT_EQ(damaged.exitCode, 2);

@@ -32,33 +32,6 @@ void addVersion(Machine& machine, const Version& row) {
     }
 }
 
-void setRaw(Machine& machine, const std::string& path, const std::string& name, std::string_view data) {
-    OwnedKey key(machine.registry_);
-    ASSERT_EQ(machine.registry_.createKey(KeyHandle::localMachine, path, {}, kKeyFull, key.receive()), kSuccess);
-    ASSERT_EQ(machine.registry_.setValue(key.get(), name, ValueType::sz, data), kSuccess);
-}
-
-// The values directly under a key, "name=data" with a terminator shown as '!', sorted; "none" without the key.
-std::string valuesOf(Machine& machine, const std::string& path) {
-    OwnedKey key(machine.registry_);
-    if (machine.registry_.openKey(KeyHandle::localMachine, path, kKeyRead, key.receive()) != kSuccess) {
-        return "none";
-    }
-    std::set<std::string> values;
-    FixedBuffer<1024> name;
-    FixedBuffer<1024> data;
-    for (std::uint32_t i = 0; machine.registry_.enumerateValue(key.get(), i, name, nullptr, &data) == kSuccess; ++i) {
-        std::string shown(data.view());
-        std::replace(shown.begin(), shown.end(), '\0', '!');
-        values.insert(std::string(name.view()) + "=" + shown);
-    }
-    std::string text;
-    for (const std::string& value : values) {
-        text += (text.empty() ? "" : " ") + value;
-    }
-    return text;
-}
-
 Status rewrite(Machine& machine) {
     return InstallCopiesProfile(machine.registry(), machine.debugOutput()).run();
 }
@@ -128,63 +101,66 @@ TEST(HighestVersion, IsWhatTheWalkFromTheGreatestTextFinds) {
 
 TEST(AliasRewrite, LeavesExactlyTheAliasesOfTheCopiesThatAreThere) {
     const std::string longName(100, '9');
+    using Values = std::vector<std::pair<std::string, std::string>>;
+    // clang-format off
     const struct {
-        const char* why;
-        std::vector<Version> copies;
-        std::vector<std::pair<std::string, std::string>> values;  // in both views before
-        std::string after;                                        // in both views
+        const char* why; std::vector<Version> copies; Values values; std::string after;  // values in both views
     } rows[] = {
-        {"each prefix names the highest",
-         {{"A", "9", "5", "0", "0"}, {"B", "9", "7", "0", "0"}, {"C", "9", "7", "0", "4"}},
-         {},
+        {"each prefix names the highest", {{"A", "9", "5", "0", "0"}, {"B", "9", "7", "0", "0"}, {"C", "9", "7", "0", "4"}}, {},
          "9.5.0.0=A 9.5.0=A 9.5=A 9.7.0.0=B 9.7.0.4=C 9.7.0=C 9.7=C 9=C"},
         {"texts are compared, not numbers, and a prefix ends at a dot",
-         {{"A", "9", "10", "0", "0"}, {"B", "9", "5", "0", "0"}, {"C", "10", "1", "0", "0"}},
-         {},
+         {{"A", "9", "10", "0", "0"}, {"B", "9", "5", "0", "0"}, {"C", "10", "1", "0", "0"}}, {},
          "10.1.0.0=C 10.1.0=C 10.1=C 10=C 9.10.0.0=A 9.10.0=A 9.10=A 9.5.0.0=B 9.5.0=B 9.5=B 9=B"},
-        {"aliases of copies that are gone go, others stay",
-         {{"A", "9", "7", "0", "0"}},
+        {"aliases of copies that are gone go, others stay", {{"A", "9", "7", "0", "0"}},
          {{"9.7", "GONE"}, {"9.6", "GONE"}, {"9.7.8.DEF.2", "d"}, {"DEFAULT_COPY", "d"}, {"", "d"}, {"9def", "x"}},
          "9.7.0.0=A 9.7.0=A 9.7.8.DEF.2=d! 9.7=A 9=A =d! DEFAULT_COPY=d!"},
         {"the later of two equal versions, and a missing fix level is 0",
-         {{"first", "9", "7", "1", "0"}, {"second", "9", "7", "1", ""}},
-         {},
+         {{"first", "9", "7", "1", "0"}, {"second", "9", "7", "1", ""}}, {},
          "9.7.1.0=second 9.7.1=second 9.7=second 9=second"},
         {"no valid copy leaves none", {{"A", "9", "7", "", ""}}, {{"9", "A"}, {"keep", "A"}}, "keep=A!"},
-        {"the fourth prefix is looked up exactly, the fifth not at all",
-         {{"A", "9", "7", "0", "0.1"}},
-         {},
+        {"the fourth prefix is looked up exactly, the fifth not at all", {{"A", "9", "7", "0", "0.1"}}, {},
          "9.7.0.0.1= 9.7.0.0= 9.7.0=A 9.7=A 9=A"},
         {"names that differ in case only are one value, the first spelling stays",
-         {{"A", "9", "1", "0", "FP1"}, {"B", "9", "1", "0", "fp1"}},
-         {},
-         "9.1.0.FP1=B 9.1.0=B 9.1=B 9=B"},
-        {"an empty first component is the default value",
-         {{"A", ".9", "1", "0", "0"}},
-         {},
+         {{"A", "9", "1", "0", "FP1"}, {"B", "9", "1", "0", "fp1"}}, {}, "9.1.0.FP1=B 9.1.0=B 9.1=B 9=B"},
+        {"an empty first component is the default value", {{"A", ".9", "1", "0", "0"}}, {},
          ".9.1.0.0= .9.1.0= .9.1=A .9=A =A"},
-        {"the walk ends at a name that does not fit",
-         {{"A", "9", "7", "0", "0"}},
-         {{"8", "old"}, {longName, "old"}, {"9.6", "old"}},
-         "9.6=old! 9.7.0.0=A 9.7.0=A 9.7=A " + longName + "=old! 9=A"},
+        {"the walk ends at a name that does not fit", {{"A", "9", "7", "0", "0"}},
+         {{"8", "old"}, {longName, "old"}, {"9.6", "old"}}, "9.6=old! 9.7.0.0=A 9.7.0=A 9.7=A " + longName + "=old! 9=A"},
     };
+    // clang-format on
     for (const auto& row : rows) {
         Machine machine;
-        machine.make(kNative);
-        machine.make(kWow);
         for (const Version& copy : row.copies) {
             addVersion(machine, copy);
         }
-        for (const auto& [name, data] : row.values) {
-            machine.set(kNative, name, data);
-            machine.set(kWow, name, data);
+        for (const std::string& view : {kNative, kWow}) {
+            machine.make(view);
+            for (const auto& [name, data] : row.values) {
+                machine.set(view, name, data);
+            }
         }
-        EXPECT_EQ(rewrite(machine), kSuccess) << row.why;
-        EXPECT_EQ(valuesOf(machine, kNative), row.after) << row.why;
-        EXPECT_EQ(valuesOf(machine, kWow), row.after) << row.why << ", 32-bit view";
-        EXPECT_EQ(rewrite(machine), kSuccess) << row.why;
-        EXPECT_EQ(valuesOf(machine, kNative), row.after) << row.why << ", once more";
+        for (int run = 0; run < 2; ++run) {
+            EXPECT_EQ(rewrite(machine), kSuccess) << row.why;
+            EXPECT_EQ(machine.values(kNative), row.after) << row.why << run;
+            EXPECT_EQ(machine.values(kWow), row.after) << row.why << run;
+        }
     }
+}
+
+TEST(AliasRewrite, TracesWhatItFinds) {
+    Machine machine;
+    addVersion(machine, {"A", "9", "7", "0", "0.1"});
+    machine.make(kWow);
+    rewrite(machine);
+    const std::vector<std::string> expected = {"Valid version info of Install Copy 'A'",
+                                               "The highest version leading by '9:9.7.0.0.1--A",
+                                               "The highest version leading by '9.7:9.7.0.0.1--A",
+                                               "The highest version leading by '9.7.0:9.7.0.0.1--A",
+                                               "The highest version leading by '9.7.0.0': ( none )",
+                                               "Did not find corrsponding install name for '9.7.0.0'",
+                                               "The highest version leading by '9.7.0.0.1': ( none )",
+                                               "Did not find corrsponding install name for '9.7.0.0.1'"};
+    EXPECT_EQ(machine.debugOutput_.messages, expected);
 }
 
 const std::string kLongData(120, 'x');
@@ -193,22 +169,22 @@ const std::string kLongData(120, 'x');
 void staleAliases(FaultyMachine& machine) {
     addVersion(machine, {"A", "9", "7", "0", "0"});
     for (const std::string& view : {kNative, kWow}) {
-        setRaw(machine, view, "8", "GONE");
-        setRaw(machine, view, "9", "OLD");
+        machine.setRaw(view, "8", "GONE");
+        machine.setRaw(view, "9", "OLD");
     }
-    setRaw(machine, kNative, "8.1", kLongData);
+    machine.setRaw(kNative, "8.1", kLongData);
 }
 
 // What a rewrite of these aliases left, in words; as it stands where there are none for it.
 std::string stateOf(FaultyMachine& machine) {
-    const std::string native = valuesOf(machine, kNative);
-    const std::string wow = valuesOf(machine, kWow);
+    const std::string native = machine.values(kNative);
+    const std::string wow = machine.values(kWow);
     const std::string fresh = "9.7.0.0=A 9.7.0=A 9.7=A 9=A";
-    const std::set<std::string> lackingOne = {"9.7.0=A 9.7=A 9=A", "9.7.0.0=A 9.7=A 9=A", "9.7.0.0=A 9.7.0=A 9=A",
-                                              "9.7.0.0=A 9.7.0=A 9.7=A"};
     if (native == fresh && wow == fresh) {
         return "after";
     }
+    const std::set<std::string> lackingOne = {"9.7.0=A 9.7=A 9=A", "9.7.0.0=A 9.7=A 9=A", "9.7.0.0=A 9.7.0=A 9=A",
+                                              "9.7.0.0=A 9.7.0=A 9.7=A"};
     if ((native == fresh && lackingOne.contains(wow)) || (wow == fresh && lackingOne.contains(native))) {
         return "after, but for one alias of one view";
     }
@@ -229,12 +205,10 @@ std::string stateOf(FaultyMachine& machine) {
 
 TEST(AliasRewriteUnderFaults, LeavesWhatTheStepThatFailedStatesAndNothingElse) {
     std::set<std::string> outcomes;
-    const std::uint64_t calls = sweepFaults(
-        false, staleAliases, [](FaultyMachine& machine) { return rewrite(machine); },
-        [&](FaultyMachine& machine, Status status, const std::string& row) {
-            EXPECT_EQ(machine.registry_.openHandles(), 0U) << row;
-            outcomes.insert(machine.faults_.failed() + ": " + (status == kSuccess ? "0 " : "-1 ") + stateOf(machine));
-        });
+    const auto flow = [](FaultyMachine& machine) { return rewrite(machine); };
+    const std::uint64_t calls = sweepFaults(false, staleAliases, flow, [&](FaultyMachine& machine, Status status) {
+        outcomes.insert(machine.faults_.failed() + ": " + (status == kSuccess ? "0 " : "-1 ") + stateOf(machine));
+    });
     EXPECT_GT(calls, 60U);
     const std::set<std::string> expected = {
         ": 0 after",

@@ -69,12 +69,5 @@ int main(int argc, char** argv) {
         std::fflush(stdout);
         return startInheriting(argv[0], "gate", first) ? 3 : 1;
     }
-    if (mode == "inherited") {
-        std::fputs(inheritedState().c_str(), stdout);
-        return 0;
-    }
-    if (mode == "die") {  // SIGNAL
-        endBySignal(number(first));
-    }
     return 99;
 }

@@ -4,30 +4,20 @@
 #include <filesystem>
 #include <random>
 
-#include "install/platform/memory/process_host.h"
-#include "install/platform/memory/threads.h"
-#include "tests/support/host_processes.h"
+#include "tests/support/backends.h"
 
 namespace kz7::test {
 namespace {
 
-std::string readAll(IProcessHost& host, StreamHandle stream, Status& ending) {
-    std::string all;
-    FixedBuffer<3> piece;
-    for (ending = host.read(stream, piece); ending == kSuccess; ending = host.read(stream, piece)) {
-        all += piece.view();
-    }
-    return all;
-}
-
-std::unique_ptr<IProcessHost> memoryProcesses() {
-    return std::make_unique<MemoryProcessHost>();
-}
-
-class ProcessHostContract : public testing::TestWithParam<std::unique_ptr<IProcessHost> (*)()> {
+class ProcessHostContract : public testing::TestWithParam<const char*> {
 protected:
-    std::unique_ptr<IProcessHost> host_ = GetParam()();
+    std::unique_ptr<Backend> backend_ = backendNamed(GetParam());
+    IProcessHost* host_ = &backend_->platform().processes();
+    StreamHandle copy_ = StreamHandle::none;
+    FixedBuffer<3> piece_;
 };
+
+INSTANTIATE_TEST_SUITE_P(Hosts, ProcessHostContract, testing::ValuesIn(kBackends));
 
 TEST_P(ProcessHostContract, PipesCarryBytesToTheirEndAndTellWhenTheOtherSideIsGone) {
     OwnedStream reading(*host_);
@@ -36,12 +26,15 @@ TEST_P(ProcessHostContract, PipesCarryBytesToTheirEndAndTellWhenTheOtherSideIsGo
     OwnedStream copy(*host_);
     ASSERT_EQ(host_->duplicate(reading.get(), copy.receive()), kSuccess);
     reading.reset();
-
     const std::string bytes("one\0two", 7);
     EXPECT_EQ(host_->write(writing.get(), bytes), kSuccess);
     writing.reset();
-    Status ending = kSuccess;
-    EXPECT_EQ(readAll(*host_, copy.get(), ending), bytes);
+    std::string all;
+    Status ending = host_->read(copy.get(), piece_);
+    for (; ending == kSuccess; ending = host_->read(copy.get(), piece_)) {
+        all += piece_.view();
+    }
+    EXPECT_EQ(all, bytes);
     EXPECT_EQ(ending, kBrokenPipe);
 
     ASSERT_EQ(host_->createPipe(reading.receive(), writing.receive()), kSuccess);
@@ -50,12 +43,10 @@ TEST_P(ProcessHostContract, PipesCarryBytesToTheirEndAndTellWhenTheOtherSideIsGo
 }
 
 TEST_P(ProcessHostContract, HandlesThatAreNotOpenAreRefused) {
-    FixedBuffer<8> piece;
-    StreamHandle copy = StreamHandle::none;
     std::uint32_t code = 77;
-    EXPECT_EQ(host_->read(StreamHandle::none, piece), kInvalidHandle);
+    EXPECT_EQ(host_->read(StreamHandle::none, piece_), kInvalidHandle);
     EXPECT_EQ(host_->write(StreamHandle::none, "x"), kInvalidHandle);
-    EXPECT_EQ(host_->duplicate(StreamHandle::none, copy), kInvalidHandle);
+    EXPECT_EQ(host_->duplicate(StreamHandle::none, copy_), kInvalidHandle);
     EXPECT_EQ(host_->closeStream(StreamHandle::none), kInvalidHandle);
     EXPECT_EQ(host_->waitProcess(ProcessHandle::none, kInfiniteWait), kInvalidHandle);
     EXPECT_EQ(host_->exitCode(ProcessHandle::none, code), kInvalidHandle);
@@ -67,18 +58,17 @@ TEST_P(ProcessHostContract, ProgramsThatAreNotThereDoNotStart) {
     namespace fs = std::filesystem;
     const fs::path before = fs::current_path();
     const fs::path folder = fs::temp_directory_path() / ("kz7-stray-" + std::to_string(std::random_device()()));
-    fs::create_directories(folder / "folder");
+    fs::create_directories(folder);
     fs::copy_file(childProgram(), folder / "kz7_stray.exe");
-    fs::copy_file(childProgram(), folder / "folder" / "program.exe");
     fs::current_path(folder);
     // clang-format off
-    const struct { const char* commandLine; bool pathMayBeNamed; const char* why; } rows[] = {
-        {"\"/no such/program.exe\" x", true,  "no such file"},
-        {"folder\\program.exe x",      true,  "nothing is started from the current folder"},
-        {"kz7-no-such-program",        true,  "nowhere on the search path"},
-        {"kz7_stray.exe",              false, "a bare name in the current folder"},
-        {"kz7_stray",                  false, "the same without its ending"},
-        {"\"kz7_stray.exe\" input",    false, "the same in quotes"},
+    const struct { std::string commandLine; bool pathMayBeNamed; const char* why; } rows[] = {
+        {"\"/no such/program.exe\" x",                                   true,  "no such file"},
+        {"..\\" + folder.filename().string() + "\\kz7_stray.exe x",      true,  "nothing is started from the current folder"},
+        {"kz7-no-such-program",                                          true,  "nowhere on the search path"},
+        {"kz7_stray.exe",                                                false, "a bare name in the current folder"},
+        {"kz7_stray",                                                    false, "the same without its ending"},
+        {"\"kz7_stray.exe\" input",                                      false, "the same in quotes"},
     };
     // clang-format on
     for (const auto& row : rows) {
@@ -92,26 +82,20 @@ TEST_P(ProcessHostContract, ProgramsThatAreNotThereDoNotStart) {
     fs::remove_all(folder);
 }
 
-INSTANTIATE_TEST_SUITE_P(Hosts, ProcessHostContract, testing::Values(hostProcesses, memoryProcesses));
-
-TEST(ThreadsContract, ThreadsCallTheirFunctionAndAreWaitedForAnyNumberOfTimes) {
-    MemoryThreads memory;
-    const std::unique_ptr<IThreads> host = hostThreads();
-    for (IThreads* const threads : {static_cast<IThreads*>(&memory), host.get()}) {
-        int called = 0;
-        const auto count = [](void* value) { ++*static_cast<int*>(value); };
-        auto record = std::make_unique<ThreadStart>(ThreadStart{count, &called});
-        std::uint32_t id = 0;
-        ThreadHandle thread = ThreadHandle::none;
-        ASSERT_EQ(threads->start(record, 256 * 1024 + 1, id, thread), kSuccess);
-        EXPECT_EQ(record, nullptr);
-        EXPECT_EQ(threads->wait(thread), kSuccess);
-        EXPECT_EQ(threads->wait(thread), kSuccess);
-        EXPECT_EQ(called, 1);
-        EXPECT_EQ(threads->close(thread), kSuccess);
-        EXPECT_EQ(threads->wait(ThreadHandle::none), kInvalidHandle);
-        EXPECT_EQ(threads->close(ThreadHandle::none), kInvalidHandle);
-    }
+TEST_P(ProcessHostContract, ThreadsCallTheirFunctionAndAreWaitedForAnyNumberOfTimes) {
+    IThreads& threads = backend_->platform().threads();
+    int called = 0;
+    auto record = std::make_unique<ThreadStart>(ThreadStart{[](void* value) { ++*static_cast<int*>(value); }, &called});
+    std::uint32_t id = 0;
+    ThreadHandle thread = ThreadHandle::none;
+    ASSERT_EQ(threads.start(record, 256 * 1024 + 1, id, thread), kSuccess);
+    EXPECT_EQ(record, nullptr);
+    EXPECT_EQ(threads.wait(thread), kSuccess);
+    EXPECT_EQ(threads.wait(thread), kSuccess);
+    EXPECT_EQ(called, 1);
+    EXPECT_EQ(threads.close(thread), kSuccess);
+    EXPECT_EQ(threads.wait(ThreadHandle::none), kInvalidHandle);
+    EXPECT_EQ(threads.close(ThreadHandle::none), kInvalidHandle);
 }
 
 }  // namespace

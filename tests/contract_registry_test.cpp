@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <functional>
+#include <sstream>
 #include <vector>
 
 #include "install/src/registry_access.h"
@@ -10,8 +11,6 @@
 
 namespace kz7::test {
 namespace {
-
-using Names = std::vector<std::string>;
 
 class RegistryContract : public testing::TestWithParam<const char*> {
 protected:
@@ -45,25 +44,67 @@ protected:
         const Status status = registry_.queryValue(key_.get(), name, nullptr, data);
         return status == kSuccess ? std::string(data.view()) : "<" + std::to_string(status) + ">";
     }
-    // The index-th name, or its status in brackets.
-    std::string keyAt(std::uint32_t index) {
-        const Status status = registry_.enumerateKey(key_.get(), index, name_, nullptr);
-        return status == kSuccess ? std::string(name_.view()) : "<" + std::to_string(status) + ">";
-    }
+    // The index-th name of a key or value, or its status in brackets; or all of them.
+    std::string keyAt(std::uint32_t index) { return nameOr(registry_.enumerateKey(key_.get(), index, name_, nullptr)); }
     std::string valueAt(std::uint32_t index) {
-        const Status status = registry_.enumerateValue(key_.get(), index, name_, nullptr, nullptr);
+        return nameOr(registry_.enumerateValue(key_.get(), index, name_, nullptr, nullptr));
+    }
+    std::string nameOr(Status status) {
         return status == kSuccess ? std::string(name_.view()) : "<" + std::to_string(status) + ">";
     }
-    Names all(std::string (RegistryContract::*at)(std::uint32_t)) {
-        Names found;
-        while (found.empty() || found.back() != "<259>") {
-            found.push_back((this->*at)(static_cast<std::uint32_t>(found.size())));
+    std::string all(std::string (RegistryContract::*at)(std::uint32_t), bool sorted) {
+        std::vector<std::string> names;
+        for (std::string name = (this->*at)(0); name != "<259>";) {
+            names.push_back(name);
+            name = (this->*at)(static_cast<std::uint32_t>(names.size()));
         }
-        found.pop_back();
-        return found;
+        if (sorted) {
+            std::sort(names.begin(), names.end());
+        }
+        std::string text;
+        for (const std::string& name : names) {
+            text += (text.empty() ? "" : ",") + name;
+        }
+        return text;
     }
-    Names keys() { return all(&RegistryContract::keyAt); }
-    Names values() { return all(&RegistryContract::valueAt); }
+    std::string keys() { return all(&RegistryContract::keyAt, false); }
+    std::string values() { return all(&RegistryContract::valueAt, differences_.ordersValuesByName); }
+    std::string classBelow(const std::string& path) {
+        OwnedKey key(registry_);
+        FixedBuffer<16> keyClass;
+        registry_.openKey(key_.get(), path, kKeyRead, key.receive());
+        registry_.enumerateKey(key.get(), 0, name_, &keyClass);
+        return '"' + std::string(keyClass.data) + '"';
+    }
+
+    // What the steps of a script answer, with blanks between them; "@" is the empty name.
+    std::string answers(const std::string& script) {
+        std::istringstream steps(script);
+        std::string told;
+        for (std::string step; std::getline(steps, step, ';');) {
+            std::string verb;
+            std::string name;
+            std::string more;
+            std::istringstream(step) >> verb >> name >> more;
+            told += (told.empty() ? "" : " ") + answer(verb, name == "@" ? "" : name, more);
+        }
+        return told;
+    }
+    std::string answer(const std::string& verb, const std::string& name, const std::string& more) {
+        if (verb == "key" || verb == "value") {
+            const auto index = static_cast<std::uint32_t>(std::stoul(name));
+            return verb == "key" ? keyAt(index) : valueAt(index);
+        }
+        if (verb == "keys" || verb == "values" || verb == "get" || verb == "class") {
+            return verb == "keys" ? keys() : verb == "values" ? values() : verb == "get" ? get(name) : classBelow(name);
+        }
+        return std::to_string(verb == "make"     ? make(name, more)
+                              : verb == "open"   ? open(name)
+                              : verb == "remove" ? remove(name)
+                              : verb == "set"    ? set(name, more)
+                              : verb == "unset"  ? registry_.deleteValue(key_.get(), name)
+                                                 : registry_.commit());
+    }
 
     static constexpr auto kScratch = "SOFTWARE\\KZ7ContractTest";
     static constexpr auto kScratch32 = "SOFTWARE\\Wow6432Node\\KZ7ContractTest";
@@ -76,95 +117,40 @@ protected:
 
 INSTANTIATE_TEST_SUITE_P(Stores, RegistryContract, testing::ValuesIn(kBackends));
 
-TEST_P(RegistryContract, NamesCompareWithoutCaseAndKeepTheirFirstSpelling) {
-    ASSERT_EQ(make("Alpha\\Beta", "c"), kSuccess);
-    EXPECT_EQ(make("aLPHA"), kSuccess);
-    EXPECT_EQ(open("ALPHA\\bETA"), kSuccess);
-    EXPECT_EQ(keys(), Names{"Alpha"});
-    ASSERT_EQ(set("Name", "first"), kSuccess);
-    ASSERT_EQ(set("NAME", "second"), kSuccess);
-    ASSERT_EQ(set("", "default"), kSuccess);
-    EXPECT_EQ(get("nAme"), "second");
-    EXPECT_EQ(get(""), "default");
-    Names names = values();
-    std::sort(names.begin(), names.end());
-    EXPECT_EQ(names, (Names{"", "Name"}));
-    EXPECT_EQ(registry_.deleteValue(key_.get(), "name"), kSuccess);
-    EXPECT_EQ(values(), Names{""});
-    EXPECT_EQ(remove("ALPHA\\BETA"), kSuccess);
-    EXPECT_EQ(open("Alpha\\Beta"), kFileNotFound);
-
-    ASSERT_EQ(make("\xC4\xD6"), kSuccess);
-    EXPECT_EQ(open("\xE4\xF6"), differences_.foldsBeyondAscii ? kSuccess : kFileNotFound);
-}
-
-TEST_P(RegistryContract, SubkeysEnumerateByNameAndValuesByAge) {
-    for (const char* name : {"b", "_x", "A", "z0", "Z1", "aa", "1", "a b", "~"}) {
-        ASSERT_EQ(make(name), kSuccess) << name;
-        ASSERT_EQ(set(name, "x"), kSuccess) << name;
-    }
-    const Names byUpperCase = {"1", "A", "a b", "aa", "b", "z0", "Z1", "_x", "~"};
-    const Names byLowerCase = {"1", "_x", "A", "a b", "aa", "b", "z0", "Z1", "~"};
-    EXPECT_EQ(keys(), differences_.ordersKeysByLowerCase ? byLowerCase : byUpperCase);
-
-    ASSERT_EQ(set("A", "again"), kSuccess);
-    ASSERT_EQ(registry_.deleteValue(key_.get(), "z0"), kSuccess);
-    ASSERT_EQ(set("Z0", "anew"), kSuccess);
-    const Names byAge = {"b", "_x", "A", "Z1", "aa", "1", "a b", "~", "Z0"};
-    Names found = values();
-    if (differences_.ordersValuesByName) {
-        Names sorted = byAge;
-        std::sort(sorted.begin(), sorted.end());
-        std::sort(found.begin(), found.end());
-        EXPECT_EQ(found, sorted);
-    } else {
-        EXPECT_EQ(found, byAge);
-    }
-}
-
-TEST_P(RegistryContract, AnEnumerationSeesWhatChangesUnderIt) {
-    enum Change { none, add, drop };
+TEST_P(RegistryContract, StepsAnswerAlike) {
+    const bool passesOn = differences_.passesClassesOn;
     // clang-format off
-    const struct { Change change; const char* name; std::uint32_t index; const char* expected; const char* why; } rows[] = {
-        {none, "",  0, "b",     "the first"},
-        {drop, "b", 0, "c",     "after a delete the same index has the next"},
-        {none, "",  1, "d",     "and on"},
-        {add,  "e", 2, "e",     "one behind the place"},
-        {add,  "f", 3, "f",     "one at the very end"},
-        {none, "",  4, "<259>", "the end"},
-        {none, "",  1, "d",     "back"},
-        {drop, "c", 1, "e",     "one before the place"},
-        {none, "",  2, "f",     "and on"},
-        {none, "",  0, "d",     "back to the begin"},
-        {drop, "f", 2, "<259>", "the last"},
-        {none, "",  1, "e",     "back from the end"},
+    const struct { const char* why; const char* script; const char* answers; } rows[] = {
+        {"names of keys compare without case, the first spelling stays",
+         "make Alpha\\Beta; make aLPHA; open ALPHA\\bETA; keys; remove ALPHA\\BETA; open Alpha\\Beta", "0 0 0 Alpha 0 2"},
+        {"and so do those of values",
+         "set Name 1; set NAME 2; get nAme; values; set @ 3; get @; unset name; values; get Name", "0 0 2 Name 0 3 0  <2>"},
+        {"other letters", "make \xC4; open \xE4; remove \xC4", differences_.foldsBeyondAscii ? "0 0 0" : "0 2 0"},
+        {"an enumeration of keys sees what is done before, at and behind its place, and a mark loses none",
+         "make b; make c; make d; key 0; remove b; key 0; key 1; make e; key 2; make f; key 3; key 4; key 1; remove c; key 1;"
+         "key 2; key 0; remove f; key 2; key 1; make a; key 1; key 2; commit; key 2; key 3",
+         "0 0 0 b 0 c d 0 e 0 f <259> d 0 e f d 0 <259> e 0 d e 0 e <259>"},
+        {"and so does one of values",
+         "set b; set c; set d; value 0; unset b; value 0; value 1; set e; value 2; set f; value 3; value 4; value 1; unset c;"
+         "value 1; value 2; value 0; unset f; value 2; value 1; commit; value 1",
+         "0 0 0 b 0 c d 0 e 0 f <259> d 0 e f d 0 <259> e 0 e"},
+        {"subkeys enumerate by name",
+         "make b; make _x; make A; make z0; make Z1; make aa; make 1; make ~; keys",
+         differences_.ordersKeysByLowerCase ? "0 0 0 0 0 0 0 0 1,_x,A,aa,b,z0,Z1,~" : "0 0 0 0 0 0 0 0 1,A,aa,b,z0,Z1,_x,~"},
+        {"values by age", "set b; set _x; set A; set z0; set a again; unset Z0; set Z0; values",
+         differences_.ordersValuesByName ? "0 0 0 0 0 0 0 A,Z0,_x,b" : "0 0 0 0 0 0 0 b,_x,A,Z0"},
+        {"parents are made, and a class stays with its key",
+         "make One\\Two\\Three its; make One\\Two late; make One\\Two\\Three also; class @; class One; class One\\Two",
+         passesOn ? "0 0 0 \"its\" \"late\" \"also\"" : "0 0 0 \"\" \"\" \"its\""},
+        {"keys with subkeys stay, the empty path is the key itself",
+         "make One\\Two; remove One; open One\\Two; remove One\\Absent; remove One\\Two; remove One\\Two; remove One;"
+         "open One; remove @; key 0", "0 5 0 2 0 2 0 2 0 <1018>"},
     };
     // clang-format on
-    for (const char* name : {"b", "c", "d"}) {
-        ASSERT_EQ(make(name), kSuccess);
-        ASSERT_EQ(set(name, "x"), kSuccess);
-    }
     for (const auto& row : rows) {
-        if (row.change == add) {
-            ASSERT_EQ(make(row.name), kSuccess);
-            ASSERT_EQ(set(row.name, "x"), kSuccess);
-        } else if (row.change == drop) {
-            ASSERT_EQ(remove(row.name), kSuccess);
-            ASSERT_EQ(registry_.deleteValue(key_.get(), row.name), kSuccess);
-        }
-        EXPECT_EQ(keyAt(row.index), row.expected) << row.why;
-        EXPECT_EQ(valueAt(row.index), row.expected) << row.why;
+        enter(std::string(kScratch) + "\\" + std::to_string(&row - rows));
+        EXPECT_EQ(answers(row.script), row.answers) << row.why;
     }
-    // A name before the place moves what follows up by one.
-    EXPECT_EQ(keyAt(1), "e");
-    ASSERT_EQ(make("a"), kSuccess);
-    EXPECT_EQ(keyAt(1), "d");
-    EXPECT_EQ(keyAt(2), "e");
-    // A mark in between loses neither handle nor place.
-    ASSERT_EQ(registry_.commit(), kSuccess);
-    EXPECT_EQ(keyAt(2), "e");
-    EXPECT_EQ(keyAt(3), "<259>");
-    EXPECT_EQ(valueAt(1), "e");
 }
 
 TEST_P(RegistryContract, OperationsAnswerByTheStateOfTheirHandle) {
@@ -202,13 +188,12 @@ TEST_P(RegistryContract, OperationsAnswerByTheStateOfTheirHandle) {
     closed.reset();
     for (const auto& row : rows) {
         below.reset();  // a host may have given it the number of the key that was shut
-        EXPECT_EQ(row.operation(shut), kInvalidHandle) << row.why;
-        EXPECT_EQ(row.operation(KeyHandle::none), kInvalidHandle) << row.why;
-        EXPECT_EQ(row.operation(gone.get()), kKeyDeleted) << row.why;
-        EXPECT_EQ(row.operation(key_.get()), row.full) << row.why;
-        EXPECT_EQ(row.operation(query.get()), row.query) << row.why;
-        EXPECT_EQ(row.operation(setting.get()), row.set) << row.why;
-        EXPECT_EQ(row.operation(listing.get()), row.list) << row.why;
+        const Status expected[] = {kInvalidHandle, kInvalidHandle, kKeyDeleted, row.full, row.query, row.set, row.list};
+        const KeyHandle handles[] = {shut,        KeyHandle::none, gone.get(),   key_.get(),
+                                     query.get(), setting.get(),   listing.get()};
+        for (std::size_t i = 0; i < std::size(handles); ++i) {
+            EXPECT_EQ(row.operation(handles[i]), expected[i]) << row.why << i;
+        }
     }
     below.reset();
     EXPECT_EQ(registry_.closeKey(shut), kInvalidHandle);
@@ -225,73 +210,34 @@ TEST_P(RegistryContract, OperationsAnswerByTheStateOfTheirHandle) {
 TEST_P(RegistryContract, PathsAreReadAlike) {
     ASSERT_EQ(make("A\\B\\C"), kSuccess);
     const std::string longest(kMaxKeyName, 'k');
-    const std::string tooLong(kMaxKeyName + 1, 'k');
     // clang-format off
     const struct { const char* why; std::string path; Status status; } rows[] = {
-        {"the key itself",            "",                       kSuccess},
-        {"a path",                    "a\\b\\c",                kSuccess},
-        {"doubled separators",        "A\\\\B\\\\\\C",          kSuccess},
-        {"a separator at the end",    "A\\B\\",                 kSuccess},
-        {"a separator at the begin",  "\\A\\B",                 kBadPathname},
-        {"nothing but a separator",   "\\",                     kBadPathname},
-        {"a missing key",             "A\\X",                   kFileNotFound},
-        {"the longest name, missing", longest,                  kFileNotFound},
-        {"a name too long",           tooLong,                  kInvalidParameter},
-        {"deep down, too long",       "A\\" + tooLong + "\\C",  kInvalidParameter},
-        {"a NUL",                     std::string("A\0B", 3),   kInvalidParameter},
+        {"the key itself",            "",                           kSuccess},
+        {"a path",                    "a\\b\\c",                    kSuccess},
+        {"doubled separators",        "A\\\\B\\\\\\C",              kSuccess},
+        {"a separator at the end",    "A\\B\\",                     kSuccess},
+        {"a separator at the begin",  "\\A\\B",                     kBadPathname},
+        {"nothing but a separator",   "\\",                         kBadPathname},
+        {"a missing key",             "A\\X",                       kFileNotFound},
+        {"the longest name, missing", longest,                      kFileNotFound},
+        {"a name too long",           longest + "k",                kInvalidParameter},
+        {"deep down, too long",       "A\\" + longest + "k" + "\\C", kInvalidParameter},
+        {"a NUL",                     std::string("A\0B", 3),       kInvalidParameter},
     };
     // clang-format on
     for (const auto& row : rows) {
         EXPECT_EQ(open(row.path), row.status) << row.why;
-        if (row.status != kFileNotFound) {
-            EXPECT_EQ(make(row.path), row.status) << row.why;
-        }
         if (row.status != kSuccess) {
             EXPECT_EQ(remove(row.path), row.status) << row.why;
         }
+        if (row.status != kFileNotFound) {
+            EXPECT_EQ(make(row.path), row.status) << row.why;
+        }
     }
-    EXPECT_EQ(keys(), Names{"A"}) << "a refused path leaves nothing of itself";
-
+    EXPECT_EQ(keys(), "A") << "a refused path leaves nothing of itself";
     ASSERT_EQ(make(longest + "\\" + longest + "\\" + longest), kSuccess);
     EXPECT_EQ(open(longest + "\\" + longest + "\\" + longest), kSuccess);
-    EXPECT_EQ(keys(), (Names{"A", longest}));
-}
-
-TEST_P(RegistryContract, ParentsAreMadeAndClassesStayWithTheirKey) {
-    ASSERT_EQ(make("One\\Two\\Three", "its class"), kSuccess);
-    ASSERT_EQ(make("One\\Two", "too late"), kSuccess);
-    ASSERT_EQ(make("One\\Two\\Three", "also"), kSuccess);
-    // clang-format off
-    const struct { const char* path; std::string_view subkeysClass; std::string_view whenPassedOn; } rows[] = {
-        {"",         "",          "its class"},
-        {"One",      "",          "too late"},
-        {"One\\Two", "its class", "also"},
-    };
-    // clang-format on
-    FixedBuffer<16> name;
-    FixedBuffer<10> keyClass;
-    for (const auto& row : rows) {
-        OwnedKey key(registry_);
-        ASSERT_EQ(registry_.openKey(key_.get(), row.path, kKeyRead, key.receive()), kSuccess);
-        EXPECT_EQ(registry_.enumerateKey(key.get(), 0, name, &keyClass), kSuccess) << row.path;
-        EXPECT_EQ(keyClass.view(), differences_.passesClassesOn ? row.whenPassedOn : row.subkeysClass) << row.path;
-        EXPECT_EQ(keyClass.data[keyClass.size], '\0') << row.path;
-    }
-}
-
-TEST_P(RegistryContract, KeysWithSubkeysStay) {
-    ASSERT_EQ(make("One\\Two"), kSuccess);
-    OwnedKey one(registry_);
-    ASSERT_EQ(registry_.openKey(key_.get(), "One", kKeyRead, one.receive()), kSuccess);
-    EXPECT_EQ(remove("One"), kAccessDenied);
-    EXPECT_EQ(open("One\\Two"), kSuccess);
-    EXPECT_EQ(remove("One\\Absent"), kFileNotFound);
-    EXPECT_EQ(remove("One\\Two"), kSuccess);
-    EXPECT_EQ(remove("One\\Two"), kFileNotFound);
-    EXPECT_EQ(registry_.deleteKey(one.get(), "", 0), kSuccess) << "the empty path is the key itself";
-    EXPECT_EQ(open("One"), kFileNotFound);
-    EXPECT_EQ(remove(""), kSuccess);
-    EXPECT_EQ(keyAt(0), "<1018>");
+    EXPECT_EQ(keys(), "A," + longest);
 }
 
 TEST_P(RegistryContract, ValuesKeepEveryByte) {
@@ -304,11 +250,9 @@ TEST_P(RegistryContract, ValuesKeepEveryByte) {
         {"every byte",             ValueType::binary,          allBytes},
         {"nothing",                ValueType::binary,          ""},
         {"100,000 bytes",          ValueType::binary,          std::string(100'000, '\xFF')},
-        {"a text",                 ValueType::sz,              std::string("text\0", 5)},
         {"a text of a path",       ValueType::expandSz,        std::string("%PATH%\\\xE9\0", 9)},
         {"a text without its end", ValueType::sz,              "text"},
         {"texts",                  ValueType::multiSz,         std::string("one\0two\0\0", 9)},
-        {"a number",               ValueType::dword,           std::string("\1\0\0\x80", 4)},
         {"a long number",          ValueType::qword,           std::string("\1\0\0\0\0\0\0\x80", 8)},
         {"an unknown type",        static_cast<ValueType>(77), "bytes"},
     };
@@ -316,16 +260,16 @@ TEST_P(RegistryContract, ValuesKeepEveryByte) {
     std::string room(200'000, '\0');
     for (const auto& row : rows) {
         ASSERT_EQ(set("v", row.data, row.type), kSuccess) << row.why;
-        Buffer data(room.data(), static_cast<std::uint32_t>(room.size()));
-        ValueType type{};
-        EXPECT_EQ(registry_.queryValue(key_.get(), "v", &type, data), kSuccess) << row.why;
-        EXPECT_EQ(type, row.type) << row.why;
-        EXPECT_EQ(data.view() == row.data, true) << row.why << ": " << data.size << " bytes";
-        Buffer listed(room.data(), static_cast<std::uint32_t>(room.size()));
-        type = {};
-        EXPECT_EQ(registry_.enumerateValue(key_.get(), 0, name_, &type, &listed), kSuccess) << row.why;
-        EXPECT_EQ(type, row.type) << row.why;
-        EXPECT_EQ(listed.view() == row.data, true) << row.why << ": " << listed.size << " bytes";
+        for (const bool listed : {false, true}) {
+            Buffer data(room.data(), static_cast<std::uint32_t>(room.size()));
+            ValueType type{};
+            EXPECT_EQ(listed ? registry_.enumerateValue(key_.get(), 0, name_, &type, &data)
+                             : registry_.queryValue(key_.get(), "v", &type, data),
+                      kSuccess)
+                << row.why;
+            EXPECT_EQ(type, row.type) << row.why;
+            EXPECT_EQ(data.view() == row.data, true) << row.why << ": " << data.size << " bytes";
+        }
     }
 }
 
@@ -363,28 +307,26 @@ TEST_P(RegistryContract, WhatDoesNotFitIsToldWithItsSize) {
 }
 
 TEST_P(RegistryContract, NamesHoldAnythingButASeparatorAndANul) {
-    for (const std::string name : {"with blanks", " leading", "trailing ", "dots.and..more", ".", "..", "100%d%s%%",
-                                   "%PATH%", "quote\"s'", "a/b", "?*<>|:", "@", "\xE9\xF1", "[x]=y;z", "tab\tfeed\n"}) {
+    for (const char* name : {"with blanks", " leading", "trailing ", "..", "100%d%s%%", "quote\"s'", "a/b",
+                             "?*<>|:", "\xE9\xF1", "[x]=y;z", "tab\tfeed\n"}) {
         EXPECT_EQ(make(name), kSuccess) << name;
-        EXPECT_EQ(keys(), Names{name});
+        EXPECT_EQ(keys(), name);
         EXPECT_EQ(remove(name), kSuccess) << name;
-        EXPECT_EQ(set(name, name), kSuccess) << name;
-        EXPECT_EQ(get(name), name);
-        EXPECT_EQ(values(), Names{name});
-        EXPECT_EQ(registry_.deleteValue(key_.get(), name), kSuccess) << name;
     }
-    for (const std::string& name : {std::string("back\\slash"), std::string(kMaxValueName, 'v')}) {
-        EXPECT_EQ(set(name, "x"), kSuccess) << name.size();
-        EXPECT_EQ(get(name), "x") << name.size();
-        EXPECT_EQ(values() == Names{name}, true) << name.size();
-        EXPECT_EQ(registry_.deleteValue(key_.get(), name), kSuccess) << name.size();
+    const std::string longest(kMaxValueName, 'v');
+    for (const char* name :
+         {" leading", "trailing ", "100%d%s%%", "\xE9\xF1", "tab\tfeed\n", "back\\slash", longest.c_str()}) {
+        EXPECT_EQ(set(name, "x"), kSuccess) << name;
+        EXPECT_EQ(get(name), "x") << name;
+        EXPECT_EQ(values() == name, true) << name;
+        EXPECT_EQ(registry_.deleteValue(key_.get(), name), kSuccess) << name;
     }
     for (const std::string& name : {std::string(kMaxValueName + 1, 'v'), std::string("a\0b", 3)}) {
         EXPECT_EQ(set(name, "x"), kInvalidParameter) << name.size();
         EXPECT_EQ(get(name), "<87>") << name.size();
         EXPECT_EQ(registry_.deleteValue(key_.get(), name), kInvalidParameter) << name.size();
     }
-    EXPECT_EQ(values(), Names{});
+    EXPECT_EQ(values(), "");
 }
 
 TEST_P(RegistryContract, TheViewBitLeadsToTheOtherTree) {

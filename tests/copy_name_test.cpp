@@ -6,22 +6,16 @@ namespace kz7 {
 namespace {
 
 TEST(CopyName, Substitution) {
-    const struct {
-        const char* why;
-        const char* text;
-        const char* name;
-        const char* result;
-    } rows[] = {
-        {"the token at the end", "A\\$CurrentInstallationName$", "X", "A\\X"},
-        {"every occurrence", "$CurrentInstallationName$-$CurrentInstallationName$", "X", "X-X"},
-        {"the other token where the first is missing", "$DefaultInstallationName$", "X", "X"},
-        {"only one of the two", "$DefaultInstallationName$$CurrentInstallationName$", "X",
-         "$DefaultInstallationName$X"},
-        {"what is inserted is not searched", "$CurrentInstallationName$", "a$CurrentInstallationName$b",
-         "a$CurrentInstallationName$b"},
-        {"an empty name leaves the text", "A\\$CurrentInstallationName$", "", "A\\$CurrentInstallationName$"},
-        {"case counts", "$currentinstallationname$", "X", "$currentinstallationname$"},
+    // clang-format off
+    const struct { const char* why; const char* text; const char* name; const char* result; } rows[] = {
+        {"every occurrence",                 "A\\$CurrentInstallationName$-$CurrentInstallationName$", "X", "A\\X-X"},
+        {"the other token where the first is missing", "$DefaultInstallationName$",                    "X", "X"},
+        {"only one of the two",              "$DefaultInstallationName$$CurrentInstallationName$", "X", "$DefaultInstallationName$X"},
+        {"what is inserted is not searched", "$CurrentInstallationName$", "a$CurrentInstallationName$b", "a$CurrentInstallationName$b"},
+        {"an empty name leaves the text",    "A\\$CurrentInstallationName$", "", "A\\$CurrentInstallationName$"},
+        {"case counts",                      "$currentinstallationname$",   "X", "$currentinstallationname$"},
     };
+    // clang-format on
     for (const auto& row : rows) {
         EXPECT_EQ(substituteCopyName(row.text, row.name), row.result) << row.why;
     }

@@ -34,30 +34,24 @@ TEST(ProtocolReader, TakesAnyLine) {
     // clang-format off
     const struct { const char* line; const char* event; } rows[] = {
         {"MESSAGE INFO INSTALLSTART",                               "installStart|"},
-        {"MESSAGE INFO INSTALLSTART\r",                             "installStart|"},
         {"MESSAGE INFO INSTALLSTARTED",                             "other|MESSAGE INFO INSTALLSTARTED"},
         {"MESSAGE INFO INSTALLEND :: \\var\\a :: b.log",            "installEnd|\\var\\a :: b.log"},
-        {"MESSAGE INFO INSTALLEND :: ",                             "installEnd|"},
         {"MESSAGE INFO UNDOSTART",                                  "undoStart|"},
         {"MESSAGE INFO UNDOEND",                                    "undoEnd|"},
         {"PROGRESS TASK START :: INSTALLATION :: 40 :: 10 :: a :: b", "taskStart i 40 10|a :: b"},
         {"PROGRESS TASK START :: CONFIGURATION :: 4294967295 :: -1 :: ", "taskStart c 4294967295 -1|"},
         {"PROGRESS TASK END :: CONFIGURATION :: 10 :: x",           "taskEnd c 0 10|x"},
-        {"PROGRESS TASK START :: INSTALLATION :: 40 :: 10",         "taskStart i 40 10|"},
         {"PROGRESS TASK START :: INSTALLATION :: 40",               "other|PROGRESS TASK START :: INSTALLATION :: 40"},
         {"PROGRESS TASK START :: INSTALLATION :: 4294967296 :: 1 :: x", "other|PROGRESS TASK START :: INSTALLATION :: 4294967296 :: 1 :: x"},
         {"PROGRESS TASK END :: ELSEWHERE :: 10 :: x",               "other|PROGRESS TASK END :: ELSEWHERE :: 10 :: x"},
         {"PROGRESS INFO TASKCOUNT :: 2",                            "taskCount|"},
         {"PROGRESS INFO TASKCOUNT :: two",                          "other|PROGRESS INFO TASKCOUNT :: two"},
         {"PROGRESS INFO TASKIDS :: 10 :: 11",                       "taskIds <10> <11>|"},
-        {"PROGRESS INFO TASKIDS",                                   "taskIds|"},
         {"PROGRESS INFO TASKTIMES ::  :: 45",                       "taskTimes <> <45>|"},
         {"MESSAGE ERROR GENERAL :: a :: b",                         "error|a :: b"},
-        {"MESSAGE ERROR CDNOTFOUND :: Install CD not found",        "error|Install CD not found"},
         {"MESSAGE ERROR LATER :: of a newer program",               "error|of a newer program"},
         {"MESSAGE QUERY CDPATH :: Where :: is it? :: D:\\",         "query <D:\\>|Where :: is it?"},
         {"MESSAGE QUERY CDPATH :: Where? :: ",                      "query <>|Where?"},
-        {"MESSAGE QUERY CDPATH :: Where? ::",                       "query <>|Where?"},
         {"MESSAGE QUERY CDPATH :: Where?",                          "query <>|Where?"},
         {"MESSAGE QUERY OTHER :: Where? :: x",                      "other|MESSAGE QUERY OTHER :: Where? :: x"},
         {"some words",                                              "other|some words"},
@@ -72,17 +66,16 @@ TEST(ProtocolReader, TakesAnyLine) {
 TEST(LineCutter, CutsPiecesIntoLines) {
     const std::string large(LineCutter::kMaxLine + 10, 'x');
     const std::string input = "a\n\nbc\r\n" + large + "\nd\n" + std::string("\0", 1) + "\nhalf";
-    const std::vector<std::string> expected = {"a", "", "bc\r", large.substr(10), "d", std::string("\0", 1), "half"};
-    for (const std::size_t piece : {1U, 2U, 7U, 4096U, 1U << 20}) {
+    for (const std::size_t piece : {1U, 7U, 4096U, 1U << 20}) {
         LineCutter cutter;
-        std::vector<std::string> lines;
-        const auto take = [&](std::string_view line) { lines.emplace_back(line); };
+        std::string lines;
+        const auto take = [&](std::string_view line) { lines.append(line).append("\n"); };
         for (std::size_t at = 0; at < input.size(); at += piece) {
             cutter.add(std::string_view(input).substr(at, piece), take);
         }
         cutter.end(take);
         cutter.end(take);
-        EXPECT_EQ(lines, expected) << piece;
+        EXPECT_TRUE(lines == std::string(input).erase(input.find('x'), 10) + "\n") << piece;
     }
 }
 
@@ -93,21 +86,18 @@ TEST(FrontProgress, NeverGoesBackInAPhase) {
     progress.takeTimes({"30", "50"});
     progress.beginPhase();
     EXPECT_EQ(progress.percent(), 0);
-    progress.endTask(10);
-    EXPECT_EQ(progress.percent(), 36) << "30 of 30 + 50 + 1 + 1";
-    progress.endTask(10);
-    progress.endTask(99);
-    EXPECT_EQ(progress.percent(), 36) << "once, and announced tasks only";
+    for (const std::int32_t task : {10, 10, 99}) {
+        progress.endTask(task);
+        EXPECT_EQ(progress.percent(), 36) << "30 of 30 + 50 + 1 + 1; once, and announced tasks only";
+    }
     progress.takeIds({"10", "11", "12", "13", "14"});
     EXPECT_EQ(progress.percent(), 36) << "more to do";
     progress.endTask(11);
     EXPECT_EQ(progress.percent(), 40);
     progress.beginPhase();
-    EXPECT_EQ(progress.percent(), 0) << "of the three that are left";
     progress.endTask(13);
-    EXPECT_EQ(progress.percent(), 33);
+    EXPECT_EQ(progress.percent(), 33) << "of the three that are left";
     progress.completePhase();
-    EXPECT_EQ(progress.percent(), 100);
     progress.takeTimes({"999999999999999999999", "-5", "4000000000"});
     EXPECT_EQ(progress.percent(), 100);
 }
@@ -153,41 +143,19 @@ constexpr const char* kProgramLines =
     "MESSAGE INFO INSTALLEND :: C:\\x.log\n"
     "half";
 
-std::uint32_t front(MemoryPlatform& machine, ScriptedProgram program) {
-    machine.processes_.addProgram("setup.exe", std::move(program));
+TEST(Front, DrawsOneBarForEachPhaseOnATerminal) {
+    MemoryPlatform machine;
+    machine.terminal_.view = {.terminal = true, .redraws = true, .colours = true, .columns = 40};
+    machine.processes_.addProgram("setup.exe", {.output = kProgramLines});
     std::uint32_t exitCode = 4711;
     EXPECT_EQ(runFront({machine.processes_, machine.threads_, machine.files_, machine.lines_, machine.terminal_,
                         machine.console_},
                        {"setup.exe", "a b"}, exitCode),
               kSuccess);
+    EXPECT_EQ(exitCode, 0U);
     EXPECT_EQ(machine.processes_.started, std::vector<std::string>{"\"setup.exe\" \"a b\""});
-    EXPECT_EQ(machine.processes_.openHandles(), 0U);
-    EXPECT_EQ(machine.threads_.openHandles(), 0U);
+    EXPECT_EQ(machine.processes_.openHandles() + machine.threads_.openHandles(), 0U);
     EXPECT_FALSE(machine.terminal_.leavesInterrupts);
-    return exitCode;
-}
-
-TEST(Front, ShowsPlainLinesWhereNobodyLooks) {
-    MemoryPlatform machine;
-    machine.lines_.input = "/media\n";
-    EXPECT_EQ(front(machine, {.output = kProgramLines, .error = "complaint\n", .exitCode = 7}), 7U);
-    EXPECT_EQ(machine.console_.output,
-              "Installing 0%: Files\n"
-              "Where?\n"
-              "Answer, or ABORT [D:\\]: /media\n"
-              "Installing 75%: Files, done\n"
-              "garbage \\x1b[2J\n"
-              "Undoing: what was done is taken back\n"
-              "Undoing: done\n"
-              "half\n"
-              "The log is C:\\x.log\n");
-    EXPECT_EQ(machine.console_.error, "error: it failed\ncomplaint\nsetup.exe ended with exit code 7.\n");
-}
-
-TEST(Front, DrawsOneBarForEachPhaseOnATerminal) {
-    MemoryPlatform machine;
-    machine.terminal_.view = {.terminal = true, .redraws = true, .colours = true, .columns = 40};
-    EXPECT_EQ(front(machine, {.output = kProgramLines, .exitCode = 0}), 0U);
     const std::string wipe = "\r\x1b[K";
     const std::string bar = wipe + "Installing   [#######...]  75% Files, d";
     EXPECT_EQ(machine.console_.both,
@@ -195,17 +163,6 @@ TEST(Front, DrawsOneBarForEachPhaseOnATerminal) {
                   wipe + "garbage \\x1b[2J\n" + bar + wipe + "\x1b[31merror: it failed\n\x1b[0m" + bar + "\n" + wipe +
                   "Undoing      what was done is taken bac" + wipe + "Undoing      done" + wipe + "half\n" + wipe +
                   "Undoing      done\n" + "The log is C:\\x.log\nDone.\n");
-}
-
-TEST(Front, TellsThatAProgramIsNotThere) {
-    MemoryPlatform machine;
-    std::uint32_t exitCode = 0;
-    EXPECT_EQ(runFront({machine.processes_, machine.threads_, machine.files_, machine.lines_, machine.terminal_,
-                        machine.console_},
-                       {"absent.exe"}, exitCode),
-              kFileNotFound);
-    EXPECT_EQ(machine.processes_.openHandles(), 0U);
-    EXPECT_EQ(machine.console_.both, "");
 }
 
 }  // namespace

@@ -4,7 +4,6 @@
 #include <unistd.h>
 
 #include <filesystem>
-#include <fstream>
 
 #include "tests/support/state_directory.h"
 
@@ -16,8 +15,8 @@ protected:
     ProviderProgram() {
         std::filesystem::create_directories(store_.file("drive_c/KZ7"));
         std::filesystem::copy(KZ7_SAMPLE_BIN, store_.file("drive_c/KZ7/bin"), std::filesystem::copy_options::recursive);
-        std::ofstream(store_.file("drive_c/KZ7/bin/KZ7NMPdata.DLL"));
-        std::ofstream(store_.file("drive_c/KZ7/bin/kz7nmpdata.txt"));
+        overwrite(store_.file("drive_c/KZ7/bin/KZ7NMPdata.DLL"), "");
+        overwrite(store_.file("drive_c/KZ7/bin/kz7nmpdata.txt"), "");
     }
 
     StateDirectory store_;
@@ -48,11 +47,18 @@ TEST_F(ProviderProgram, RegistersWhileItsProgramsUseTheStore) {
     EXPECT_EQ(dump.find("kz7nmpdata.txt"), std::string::npos);
 }
 
-TEST_F(ProviderProgram, ProgramsThatRefuseAreToldAndNothingElse) {
-    const ProgramResult result = store_.tool({"-dotnet", "C:\\KZ7"}, {{"KZ7_SAMPLE_EXIT=5"}, {}});
+TEST_F(ProviderProgram, ProgramsThatRefuseAreToldInTheOrderOfTheLines) {
+    const std::string tool = programPath("kz7InstallReg") + " -dotnet 'C:\\KZ7' 2>&1";
+    const ProgramResult result =
+        runProgram({"/bin/sh", "-c", tool}, {{"KZ7_STATE_DIR=" + store_.path(), "KZ7_SAMPLE_EXIT=5"}, {}});
     EXPECT_EQ(result.exitCode, 255) << "no copies, no aliases";
-    EXPECT_EQ(result.error, kPrefix + "1677: kz7nmpcfg.exe returned an error. rc = 5\n" + kPrefix +
-                                "1697: kz7nmpcfg_32.exe returned an error. rc = 5\n");
+    EXPECT_EQ(result.output,
+              "Level Returned: 9.1.0.0\n"
+              "C:\\KZ7\\bin\\kz7nmpcfg.exe -register -level 9.1.0 -kz7path C:\\KZ7" +
+                  kPrefix +
+                  "1677: kz7nmpcfg.exe returned an error. rc = 5\n"
+                  "C:\\KZ7\\bin\\kz7nmpcfg_32.exe -register -level 9.1.0 -kz7path C:\\KZ7 -migratev8 " +
+                  kPrefix + "1697: kz7nmpcfg_32.exe returned an error. rc = 5\n");
 }
 
 TEST_F(ProviderProgram, NothingIsTakenFromTheCurrentFolder) {
@@ -81,7 +87,7 @@ TEST_F(ProviderProgram, CopiesAreShownWithTheirServicesAndAliasesWithWhatIsWrong
         "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies\\five\\CurrentVersion]\n"
         "\"Version\"=\"9\"\n\"Release\"=\"8\"\n\"Modification\"=\"0\"\n\"Fix Level\"=\"0.1\"\n"
         "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies\\half]\n\"KZ7 Path Name\"=\"C:\\\\h\"\n";
-    std::ofstream(store_.file("more.reg")) << text;
+    overwrite(store_.file("more.reg"), text);
     ASSERT_EQ(store_.run("kz7admin", {"import", store_.file("more.reg")}).exitCode, 0);
 
     EXPECT_EQ(store_.run("kz7admin", {"copies"}).output,

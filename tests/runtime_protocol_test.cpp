@@ -2,47 +2,18 @@
 #include <gtest/gtest.h>
 
 #include <array>
-#include <cstdlib>
 #include <new>
-#include <string>
 
-#include "install/platform/faulty/console.h"
 #include "install/runtime/observers/display_observer.h"
 #include "install/runtime/observers/external_output_pipe.h"
 #include "install/runtime/observers/protocol_lines.h"
-#include "tests/support/backends.h"
 #include "tests/support/runtime_machine.h"
 
 namespace kz7::test {
-namespace {
 
-int allocationsUntilFailure = -1;  // of those that answer null; below 0 none fails
-std::uint64_t allocations = 0;
+static int allocationsUntilFailure = -1;  // of those that answer null; below 0 none fails
 
-}  // namespace
 }  // namespace kz7::test
-
-// Not inlined: gcc would take the pair below for a mismatch.
-[[gnu::noinline]] void* operator new(std::size_t size) {
-    ++kz7::test::allocations;
-    void* const memory = std::malloc(size == 0 ? 1 : size);
-    if (memory == nullptr) {
-        throw std::bad_alloc();
-    }
-    return memory;
-}
-
-[[gnu::noinline]] void* operator new(std::size_t size, const std::nothrow_t&) noexcept {
-    return std::malloc(size == 0 ? 1 : size);
-}
-
-[[gnu::noinline]] void operator delete(void* memory) noexcept {
-    std::free(memory);
-}
-
-[[gnu::noinline]] void operator delete(void* memory, std::size_t) noexcept {
-    std::free(memory);
-}
 
 void* operator new[](std::size_t size, const std::nothrow_t&) noexcept {
     if (kz7::test::allocationsUntilFailure >= 0 && kz7::test::allocationsUntilFailure-- == 0) {
@@ -58,39 +29,16 @@ void* operator new[](std::size_t size, const std::nothrow_t&) noexcept {
 namespace kz7::test {
 namespace {
 
-TEST(ProtocolLines, TellTasks) {
-    constexpr auto kStart = ProgressKind::start;
-    constexpr auto kEnd = ProgressKind::end;
-    // clang-format off
-    const struct { const char* why; ProgressKind kind; std::uint64_t start; std::int32_t task; bool installation;
-                   std::string text; std::string line; } rows[] = {
-        {"installation",           kStart, 40, 10, true,  "Files", "PROGRESS TASK START :: INSTALLATION :: 40 :: 10 :: Files\n"},
-        {"configuration",          kStart, 0, -1,  false, "",      "PROGRESS TASK START :: CONFIGURATION :: 0 :: -1 :: \n"},
-        {"low 32 bits, unsigned",  kStart, 0x1FFFFFFFF, 1, true, "x", "PROGRESS TASK START :: INSTALLATION :: 4294967295 :: 1 :: x\n"},
-        {"an end, no start value", kEnd, 7, 10, true,     "Files", "PROGRESS TASK END :: INSTALLATION :: 10 :: Files\n"},
-        {"an end, configuration",  kEnd, 7, 11, false,    "x",     "PROGRESS TASK END :: CONFIGURATION :: 11 :: x\n"},
-        {"undo",                   kStart, 1, 3577, true, "x",     "MESSAGE INFO UNDOSTART\n"},
-        {"undo, the other flag",   kStart, 1, 3577, false, "x",    "MESSAGE INFO UNDOSTART\n"},
-        {"undo ends",              kEnd, 1, 3577, false,  "x",     "MESSAGE INFO UNDOEND\n"},
-        {"another event",          ProgressKind{0x300}, 1, 1, true, "x", ""},
-        {"a separator in a text",  kEnd, 0, 1, true,      "a :: b", "PROGRESS TASK END :: INSTALLATION :: 1 :: a :: b\n"},
-        {"line ends in a text",    kEnd, 0, 1, true,      "a\r\nMESSAGE", "PROGRESS TASK END :: INSTALLATION :: 1 :: a  MESSAGE\n"},
-        {"a NUL in a text",        kEnd, 0, 1, true,      std::string("a\0b", 3), "PROGRESS TASK END :: INSTALLATION :: 1 :: a\n"},
-        {"placeholders in a text", kEnd, 0, 1, true,      "%s%n%%", "PROGRESS TASK END :: INSTALLATION :: 1 :: %s%n%%\n"},
-    };
-    // clang-format on
-    for (const auto& row : rows) {
-        ProtocolLine line;
-        EXPECT_EQ(progressLine({row.kind, row.start, row.task, row.installation, row.text}, line), !row.line.empty())
-            << row.why;
-        EXPECT_EQ(line.view(), row.line) << row.why;
-    }
+using namespace std::literals;
+using Response = UREInfo::Response;
+
+TEST(ProtocolLines, KeepTheirLineFeedAndTellNoOtherEvent) {
     ProtocolLine line;
-    progressLine({kEnd, 0, 1, true, std::string(5000, 'x')}, line);
+    EXPECT_TRUE(progressLine({ProgressKind::end, 0, 1, true, std::string(5000, 'x')}, line));
     EXPECT_EQ(line.view().size(), 1023U);
-    EXPECT_EQ(line.view().substr(1020), "xx\n") << "a line that is too long keeps its line feed";
+    EXPECT_EQ(line.view().substr(1020), "xx\n");
     EXPECT_EQ(queryLine(std::string(3000, 'a'), "b").view().substr(1020), "aa\n");
-    EXPECT_EQ(installEndLine("\\var\\log\\x.log").view(), "MESSAGE INFO INSTALLEND :: \\var\\log\\x.log\n");
+    EXPECT_FALSE(progressLine({ProgressKind{0x300}, 1, 1, true, "x"}, line));
 }
 
 TEST(ProtocolLines, TellTaskLists) {
@@ -99,11 +47,8 @@ TEST(ProtocolLines, TellTaskLists) {
     const struct { const char* why; std::string list; int count; std::string identifiers; std::string times; } rows[] = {
         {"two",                          "10,30;11,45",     2, " :: 10 :: 11",     " :: 30 :: 45"},
         {"an end mark adds none",        "10,30;11,45;",    2, " :: 10 :: 11",     " :: 30 :: 45"},
-        {"nothing",                      "",                0, "",                 ""},
         {"a missing time",               "10;11,5",         2, " :: 10 :: 11",     " ::  :: 5"},
-        {"a missing identifier",         ",30",             1, " :: ",             " :: 30"},
         {"an empty entry",               "1,2;;3,4",        3, " :: 1 ::  :: 3",   " :: 2 ::  :: 4"},
-        {"more commas",                  "1,2,3",           1, " :: 1",            " :: 2,3"},
         {"an entry is cut as a whole",   "1," + twenty,     1, " :: 1",            " :: 12345678901234567"},
         {"an identifier of 20",          twenty + ",5",     1, " :: 1234567890123456789", " :: "},
         {"line ends",                    "1,2\n;3,4",       2, " :: 1 :: 3",       " :: 2  :: 4"},
@@ -121,21 +66,16 @@ TEST(ProtocolLines, TellTaskLists) {
 }
 
 TEST(ProtocolLines, TakeAnswers) {
-    constexpr auto kIgnored = AnswerLine::ignored;
-    constexpr auto kAbort = AnswerLine::abort;
-    constexpr auto kResponse = AnswerLine::response;
-    // clang-format off
-    const struct { const char* line; AnswerLine answer; } rows[] = {
-        {"ABORT", kAbort},           {"ABORTED", kAbort},         {"ABOR", kIgnored},         {"abort", kIgnored},
-        {" ABORT", kIgnored},        {"", kIgnored},              {"RESPONSE", kIgnored},     {"RESPONSE:", kIgnored},
-        {"RESPONSE:::", kIgnored},   {"RESPONSEX", kIgnored},     {"RESPONSE 5", kIgnored},   {"response :: E", kIgnored},
-        {"RESPONSE :: E", kResponse},{"RESPONSE::E", kResponse},  {"RESPONSE: ", kResponse},  {"RESPONSEX:E", kResponse},
-        {"RESPONS:E", kIgnored},     {":RESPONSE:E", kIgnored},
+    const auto all = [](std::initializer_list<const char*> lines, AnswerLine answer) {
+        for (const char* line : lines) {
+            EXPECT_EQ(parseAnswer(line), answer) << line;
+        }
     };
-    // clang-format on
-    for (const auto& row : rows) {
-        EXPECT_EQ(parseAnswer(row.line), row.answer) << row.line;
-    }
+    all({"ABORT", "ABORTED"}, AnswerLine::abort);
+    all({"RESPONSE :: E", "RESPONSE::E", "RESPONSE: ", "RESPONSEX:E"}, AnswerLine::response);
+    all({"ABOR", "abort", " ABORT", "", "RESPONSE", "RESPONSE:", "RESPONSE:::", "RESPONSEX", "RESPONSE 5",
+         "response :: E", "RESPONS:E", ":RESPONSE:E"},
+        AnswerLine::ignored);
 }
 
 TEST(Pipe, QueuesAndWrites) {
@@ -156,45 +96,25 @@ TEST(Pipe, QueuesAndWrites) {
     EXPECT_EQ(pipe.getQueueCount(), 0);
     EXPECT_EQ(machine.console_.output, expected);
     EXPECT_EQ(machine.console_.flushed, expected.size());
-
-    // clang-format off
-    const struct { const char* text; const char* written; } formats[] = {
-        {"100%%", "100%"}, {"%%%", "%%"}, {"%%%%", "%%"}, {"%", "%"}, {"a%s%n%5d%%b", "a%s%n%5d%b"}, {"", ""},
-    };
-    // clang-format on
-    for (const auto& row : formats) {
-        machine.console_.output.clear();
-        pipe.writeMessage(row.text);
-        EXPECT_EQ(machine.console_.output, row.written) << row.text;
+    machine.console_.output.clear();
+    for (const char* text : {"100%%|", "%%%|", "%%%%|", "%|", "a%s%n%5d%%b|", ""}) {
+        pipe.writeMessage(text);
     }
     pipe.writeMessage(nullptr);
+    EXPECT_EQ(machine.console_.output, "100%|%%|%%|%|a%s%n%5d%b|");
 }
 
 TEST(Pipe, ReadsAnswerLines) {
-    const std::string large(1 << 20, 'x');
-    // clang-format off
-    const struct { const char* why; std::string input; std::vector<std::string> lines; } rows[] = {
-        {"lines",                           "one\ntwo\n",                {"one", "two"}},
-        {"no line end",                     "one",                       {"one"}},
-        {"carriage returns",                "one\r\ntwo\rx\r\n",         {"one", "two\rx"}},
-        {"nothing",                         "",                          {}},
-        {"an empty line",                   "\n",                        {""}},
-        {"the rest of a long line is lost", "123456789\nnext\n",         {"1234567", "next"}},
-        {"a line of 1 MiB",                 large + "\nABORT\n",         {"xxxxxxx", "ABORT"}},
-        {"a NUL ends the text",             std::string("a\0b\nc\n", 6), {"a", "c"}},
-    };
-    // clang-format on
-    for (const auto& row : rows) {
-        RuntimeMachine machine;
-        machine.lines_.input = row.input;
-        UREExternalOutputPipe pipe(machine.console_, machine.lines_, machine.engine);
-        std::vector<std::string> lines;
-        char buffer[8];
-        while (pipe.readResponse(buffer, sizeof buffer) == kSuccess) {
-            lines.emplace_back(buffer);
-        }
-        EXPECT_EQ(lines, row.lines) << row.why;
+    RuntimeMachine machine;
+    machine.lines_.input =
+        "one\r\ntwo\rx\n\n123456789\nnext\n" + std::string(1 << 20, 'x') + "\nABORT\n" + std::string("a\0b\nc", 5);
+    UREExternalOutputPipe pipe(machine.console_, machine.lines_, machine.engine);
+    std::string lines;
+    for (char buffer[8]; pipe.readResponse(buffer, sizeof buffer) == kSuccess;) {
+        lines.append(buffer).append("|");
     }
+    EXPECT_EQ(lines, "one|two\rx||1234567|next|xxxxxxx|ABORT|a|c|")
+        << "the rest of a long line is lost, a NUL ends a text, the last line needs no end";
 }
 
 // A run as an installer makes it: tasks, errors, questions, a roll-back.
@@ -212,180 +132,93 @@ void runInstallation(URE& engine, std::vector<UREInfo::Response>& responses) {
     engine.message(0x24000005, kTextMessage, std::array<Insert, 1>{"other"});
     engine.message(0x01000005, kTextMessage, std::array<Insert, 1>{"not for front ends"});
     engine.startTask(0, kUndoTask, true, "undo");
-    engine.endTask(kUndoTask, true, "undo");
+    engine.endTask(kUndoTask, false, "undo");
+    engine.startTask(0x1FFFFFFFF, -1, true, "a\r\n :: %s%n%%");
+    engine.endTask(5, false, std::string_view("a\0b", 3));
     responses.push_back(engine.ask(2, 1, {}, "", answer));
     EXPECT_EQ(answer, "");
 }
 
 constexpr const char* kMachineRun =
     "MESSAGE INFO INSTALLSTART\n"
-    "PROGRESS INFO TASKCOUNT :: 2\n"
-    "PROGRESS INFO TASKIDS :: 10 :: 11\n"
-    "PROGRESS INFO TASKTIMES :: 30 :: 45\n"
+    "PROGRESS INFO TASKCOUNT :: 2\nPROGRESS INFO TASKIDS :: 10 :: 11\nPROGRESS INFO TASKTIMES :: 30 :: 45\n"
     "PROGRESS TASK START :: INSTALLATION :: 40 :: 10 :: Copying files\n"
     "MESSAGE ERROR CDNOTFOUND :: Install CD not found\n"
-    "MESSAGE QUERY CDPATH :: The installation medium was not found. Where is it? :: D:\\\n"
-    "\n"
+    "MESSAGE QUERY CDPATH :: The installation medium was not found. Where is it? :: D:\\\n\n"
     "PROGRESS TASK END :: INSTALLATION :: 10 :: Copying files\n"
     "PROGRESS TASK START :: CONFIGURATION :: 5 :: 11 :: 100% of the configuration\n"
-    "MESSAGE QUERY CDPATH :: Go on? :: yes\n"
-    "\n"
+    "MESSAGE QUERY CDPATH :: Go on? :: yes\n\n"
     "MESSAGE ERROR GENERAL :: Copier::configure, step 20: error 5030: The program was not run, or it failed.\n"
-    "MESSAGE ERROR GENERAL :: The program wrote: SQL0000\n"
-    "MESSAGE ERROR GENERAL :: other\n"
-    "MESSAGE INFO UNDOSTART\n"
-    "MESSAGE INFO UNDOEND\n"
-    "MESSAGE QUERY CDPATH :: The text of message 0x44000002 is missing. :: \n"
-    "\n"
+    "MESSAGE ERROR GENERAL :: The program wrote: SQL0000\nMESSAGE ERROR GENERAL :: other\n"
+    "MESSAGE INFO UNDOSTART\nMESSAGE INFO UNDOEND\n"
+    "PROGRESS TASK START :: INSTALLATION :: 4294967295 :: -1 :: a   :: %s%n%\nPROGRESS TASK END :: CONFIGURATION :: 5 "
+    ":: a\n"
+    "MESSAGE QUERY CDPATH :: The text of message 0x44000002 is missing. :: \n\n"
     "MESSAGE INFO INSTALLEND :: C:\\Setup Logs\\setup.log\n";
 
-constexpr const char* kRunInLog =
-    "Tasks: 10,30;11,45;\n"
-    "Copying files\n"
-    "Note: Copier::copy, step 10: 42 files\n"
-    "Note: The installation medium was not found. Where is it?\n"
-    "Copying files\n"
-    "100%% of the\nconfiguration\n"
-    "Go on?\n"
+const std::string kRunInLog =
+    "Tasks: 10,30;11,45;\nCopying files\nNote: Copier::copy, step 10: 42 files\n"
+    "Note: The installation medium was not found. Where is it?\nCopying files\n"
+    "100%% of the\nconfiguration\nGo on?\n"
     "ERROR: Copier::configure, step 20: error 5030: The program was not run, or it failed.\n"
-    "Note: The program wrote: SQL0000\n"
-    "Note: other\n"
-    "not for front ends\n"
-    "undo\n"
-    "undo\n"
-    "WARNING: The text of message 0x44000002 is missing.\n";
+    "Note: The program wrote: SQL0000\nNote: other\nnot for front ends\nundo\nundo\na\r\n :: %s%n%%\na\0b\n"
+    "WARNING: The text of message 0x44000002 is missing.\n"s;
 
 TEST(MachineStream, TellsAWholeRunToTheByte) {
-    using Response = UREInfo::Response;
     RuntimeMachine machine;
     machine.lines_.input = "RESPONSE :: E\r\nsomething else\nABORT\n";
     machine.openLog();
-    const std::size_t before = machine.logText().size();
-    auto* stream = UREExternalObserverMachineStream::getInstance(machine.engine);
-    EXPECT_EQ(UREExternalObserverMachineStream::getInstance(machine.engine), stream);
-    EXPECT_TRUE(machine.lines_.keepsLineFeeds);
-    machine.engine.registerObserver(*stream);
     std::vector<Response> responses;
-    runInstallation(machine.engine, responses);
-    machine.engine.unregisterObserver(*stream);
-    UREExternalObserverMachineStream::release();
+    const std::string log = machine.logged([&] {
+        const Shown<UREExternalObserverMachineStream> shown(machine.engine);
+        EXPECT_TRUE(machine.lines_.keepsLineFeeds);
+        runInstallation(machine.engine, responses);
+    });
     EXPECT_FALSE(machine.lines_.keepsLineFeeds);
     EXPECT_EQ(responses, (std::vector{Response::answered, Response::none, Response::aborted}));
     EXPECT_EQ(machine.console_.output, kMachineRun);
     EXPECT_EQ(machine.console_.flushed, machine.console_.output.size());
-    EXPECT_EQ(machine.logText().substr(before), kRunInLog);
+    EXPECT_EQ(log, kRunInLog);
 }
 
-// An engine whose console goes through a fault.
-TEST(MachineStream, AFrontEndThatIsGoneStopsNothing) {
-    RuntimeMachine machine;
-    FaultCounter faults(5, true, kWriteFault);
-    FaultyConsole console(machine.console_, faults);
-    RuntimePorts ports{machine.files_,    machine.processes_, machine.threads_,  console, machine.lines_,
-                       machine.terminal_, machine.clock_,     machine.identity_, nullptr};
-    URE engine(ports);
-    URELogObserver& log = *URELogObserver::getInstance(engine);
-    log.setLogFile(RuntimeMachine::kLogFile);
-    engine.registerObserver(log, Takes::everything);
-    const std::size_t before = machine.logText().size();
-    auto* stream = UREExternalObserverMachineStream::getInstance(engine);
-    engine.registerObserver(*stream);
-    std::vector<UREInfo::Response> responses;
-    std::string answer = "unchanged";
-    engine.startTask(1, 1, true, "a");
-    engine.startTask(1, 2, true, "b");
-    EXPECT_EQ(engine.ask(1, kMediumNeededMessage, {}, "", answer), UREInfo::Response::none);
-    engine.endTask(2, true, "b");
-    engine.unregisterObserver(*stream);
-    UREExternalObserverMachineStream::release();
-    URELogObserver::release();
-    EXPECT_EQ(machine.logText().substr(before), "a\nb\nNote: The installation medium was not found. Where is it?\nb\n");
-}
-
-TEST(MachineStream, AllocationFailuresAreReportedOnceAndLoseOneLine) {
-    const std::string constructor = "ERROR: UREExternalOutputPipe::UREExternalOutputPipe, step ";
-    const std::string add = "ERROR: UREExternalOutputPipe::addQueueMessage, step ";
-    const std::string reason = ": error 5002: There is not enough memory.\n";
+TEST(Pipe, AnAllocationThatFailsIsReportedAndLosesOneLine) {
     // The queue is made of an array and 4 buffers; the fifth line asks for an array and 4 buffers more.
     for (int failing = 0; failing < 11; ++failing) {
         RuntimeMachine machine;
         machine.openLog();
-        const std::size_t before = machine.logText().size();
-        allocationsUntilFailure = failing;
-        auto* stream = UREExternalObserverMachineStream::getInstance(machine.engine);
-        machine.engine.registerObserver(*stream);
-        // 5 lines at once: count, identifiers, line feed, times, line feed.
-        machine.engine.announceTasks("1,2");
-        machine.engine.startTask(1, 1, true, "a");
-        allocationsUntilFailure = -1;
-        machine.engine.endTask(1, true, "a");
-        machine.engine.unregisterObserver(*stream);
-        UREExternalObserverMachineStream::release();
-
-        const std::string list =
-            "PROGRESS INFO TASKCOUNT :: 1\nPROGRESS INFO TASKIDS :: 1\nPROGRESS INFO TASKTIMES :: 2";
-        const std::string tasks =
-            "PROGRESS TASK START :: INSTALLATION :: 1 :: 1 :: a\nPROGRESS TASK END :: INSTALLATION :: 1 :: a\n";
-        std::string lines = list + "\n" + tasks;
-        std::string log = "Tasks: 1,2\na\na\n";
-        if (failing < 5) {
-            lines.clear();
-            log = constructor + (failing == 0 ? "10" : "20") + reason;
-            // Nothing of it is ever queued: each of the 7 lines is reported.
-            const std::string lost = add + "10" + reason;
-            log += "Tasks: 1,2\n" + lost + lost + lost + lost + lost + "a\n" + lost + "a\n" + lost;
-        } else if (failing < 10) {
-            // The list is not flushed: what of it was kept goes out later.
-            lines = list;
-            log = "Tasks: 1,2\n" + add + (failing == 5 ? "10" : "20") + reason + "a\na\n";
-            lines += tasks;
-        }
-        EXPECT_EQ(machine.console_.output,
-                  "MESSAGE INFO INSTALLSTART\n" + lines + "MESSAGE INFO INSTALLEND :: C:\\Setup Logs\\setup.log\n")
-            << "allocation " << failing;
-        EXPECT_EQ(machine.logText().substr(before), log) << "allocation " << failing;
-    }
-}
-
-TEST(Observers, TakeInfosWithoutAnAllocation) {
-    const std::unique_ptr<Backend> backend = backendNamed("host");
-    URE engine(portsOf(backend->platform()));
-    URELogObserver& log = *URELogObserver::getInstance(engine);
-    log.setLogFile(backend->folder() + "\\kz7msi.log");
-    std::uint64_t made = 0;
-    backend->written(false, [&](IConsole&) {
-        auto* machine = UREExternalObserverMachineStream::getInstance(engine);
-        auto* human = UREExternalObserverHumanStream::getInstance(engine);
-        engine.registerObserver(log, Takes::everything);
-        engine.registerObserver(*machine);
-        engine.registerObserver(*human);
-        for (int round = 0; round < 2; ++round) {
-            made = allocations;
-            for (int i = 0; i < 100; ++i) {
-                engine.startTask(1, i, true, "Copying a file with a name of a usual length");
-                engine.error(kCodeError, "Copier::copy", 10, kNotExecuted);
-                log.writeFunction("an error in words");
-                engine.endTask(i, true, "Copying a file with a name of a usual length");
+        const std::string step =
+            (failing % 5 == 0 ? "10" : "20") + std::string(": error 5002: There is not enough memory.\n");
+        const std::string log = machine.logged([&] {
+            allocationsUntilFailure = failing;
+            UREExternalOutputPipe pipe(machine.console_, machine.lines_, machine.engine);
+            for (int line = 1; line <= 5; ++line) {
+                const bool kept = failing >= 5 && (line < 5 || failing >= 10);
+                EXPECT_EQ(pipe.addQueueMessage("x"), kept ? kSuccess : kFailed) << failing << line;
             }
-            made = allocations - made;
+            allocationsUntilFailure = -1;
+            pipe.addQueueMessage("y");
+            pipe.flushQueue();
+        });
+        std::string expected;
+        if (failing < 5) {  // nothing is ever queued
+            expected = "ERROR: UREExternalOutputPipe::UREExternalOutputPipe, step " + step;
+            for (int line = 0; line < 6; ++line) {
+                expected += "ERROR: UREExternalOutputPipe::addQueueMessage, step 10" + step.substr(2);
+            }
+        } else if (failing < 10) {
+            expected = "ERROR: UREExternalOutputPipe::addQueueMessage, step " + step;
         }
-        engine.unregisterObserver(*human);
-        engine.unregisterObserver(*machine);
-        UREExternalObserverHumanStream::release();
-        UREExternalObserverMachineStream::release();
-    });
-    URELogObserver::release();
-    EXPECT_EQ(made, 0U);
+        EXPECT_EQ(log, expected) << failing;
+        EXPECT_EQ(machine.console_.output, failing < 5 ? "" : failing < 10 ? "xxxxy" : "xxxxxy") << failing;
+    }
 }
 
 TEST(HumanStream, IsReadableAndAsWideAsTheTerminal) {
     RuntimeMachine machine;
     machine.terminal_.view = {.terminal = true, .redraws = true, .colours = true, .columns = 30};
     machine.lines_.input = "/media/disc\n\nABORT\n";
-    auto* stream = UREExternalObserverHumanStream::getInstance(machine.engine);
-    machine.engine.registerObserver(*stream);
+    const Shown<UREExternalObserverHumanStream> shown(machine.engine);
     std::string answer = "unchanged";
-    using Response = UREInfo::Response;
     machine.engine.startTask(1, 10, true, "Copying files");
     machine.engine.announceTasks("1,2");
     machine.engine.error(kCodeError, "Copier::copy", 10, kDiskFull);
@@ -400,7 +233,6 @@ TEST(HumanStream, IsReadableAndAsWideAsTheTerminal) {
     machine.engine.endTask(10, true, "Copying files");
     machine.engine.startTask(1, kUndoTask, true, "");
     EXPECT_EQ(machine.engine.ask(2, kTextMessage, std::array<Insert, 1>{"Sure?"}, "", answer), Response::none);
-    machine.engine.unregisterObserver(*stream);
     const std::string asked = "The installation medium was\nnot found. Where is it? [D:\\]\n(ABORT to stop): \n";
     EXPECT_EQ(machine.console_.output,
               "Copying files ...\n"
@@ -414,22 +246,20 @@ TEST(HumanStream, IsReadableAndAsWideAsTheTerminal) {
 
 TEST(HumanStream, BreaksLinesWhereTheyFit) {
     // clang-format off
-    const struct { const char* why; std::string text; std::uint32_t columns; std::vector<std::string> lines; } rows[] = {
-        {"fits",                     "abc def",        7, {"abc def"}},
-        {"breaks at a blank",        "abc def",        6, {"abc", "def"}},
-        {"a blank at the edge",      "abcdef ghi",     6, {"abcdef", "ghi"}},
-        {"a long word",              "abcdefgh",       3, {"abc", "def", "gh"}},
-        {"line feeds",               "a\n\nb",         5, {"a", "", "b"}},
-        {"no width",                 "abc def",        0, {"abc def"}},
-        {"one column",               "ab c",           1, {"a", "b", "c"}},
-        {"characters, not bytes",    "\xC3\xA4\xC3\xB6\xC3\xBC x", 3, {"\xC3\xA4\xC3\xB6\xC3\xBC", "x"}},
+    const struct { const char* why; std::string_view text; std::uint32_t columns; const char* lines; } rows[] = {
+        {"fits",                     "abc def",        7, "abc def|"},
+        {"breaks at a blank",        "abc def",        6, "abc|def|"},
+        {"a blank at the edge",      "abcdef ghi",     6, "abcdef|ghi|"},
+        {"a long word",              "abcdefgh",       3, "abc|def|gh|"},
+        {"line feeds",               "a\n\nb",         5, "a||b|"},
+        {"no width",                 "abc def",        0, "abc def|"},
+        {"characters, not bytes",    "\xC3\xA4\xC3\xB6\xC3\xBC x", 3, "\xC3\xA4\xC3\xB6\xC3\xBC|x|"},
     };
     // clang-format on
-    for (const auto& row : rows) {
-        std::string_view rest = row.text;
-        std::vector<std::string> lines;
-        while (!rest.empty()) {
-            lines.emplace_back(takeWrappedLine(rest, row.columns));
+    for (auto row : rows) {
+        std::string lines;
+        while (!row.text.empty()) {
+            lines.append(takeWrappedLine(row.text, row.columns)).append("|");
         }
         EXPECT_EQ(lines, row.lines) << row.why;
     }
@@ -474,7 +304,6 @@ TEST(DisplayObserver, ShowsInfosInTheInstaller) {
               "03000021|[1]\n\n[2]|KZ7 Setup|Go on?\n"
               "03180021|[1]\n\n[2]|KZ7 Setup|Go on?\n"
               "01180010|[1]\n\n[2]|KZ7 Setup|it failed\n");
-    EXPECT_EQ(machine.session.openHandles(), 0U);
 }
 
 }  // namespace

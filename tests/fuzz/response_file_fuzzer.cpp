@@ -1,31 +1,18 @@
 // Whatever a file holds, it is refused with a line and a reason, or its keywords written out again read the
 // same; and as a catalogue it never breaks a text.
 #include <algorithm>
-#include <cstdint>
-#include <cstdlib>
-#include <string>
 
 #include "install/runtime/message_catalogue.h"
 #include "install/runtime/response_file.h"
+#include "tests/fuzz/fuzzer.h"
 
-namespace {
-
-void check(bool holds) {
-    if (!holds) {
-        std::abort();
-    }
-}
-
-}  // namespace
-
-extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
-    const std::string_view file(reinterpret_cast<const char*>(data), size);
-    const auto lines = static_cast<std::uint32_t>(std::count(file.begin(), file.end(), '\n')) + 1;
+void tryInput(std::string_view input) {
+    const auto lines = static_cast<std::uint32_t>(std::count(input.begin(), input.end(), '\n')) + 1;
     std::vector<kz7::ResponseKeyword> keywords;
     kz7::ResponseFault fault;
-    if (kz7::parseResponseFile(file, keywords, fault) != kz7::kSuccess) {
+    if (kz7::parseResponseFile(input, keywords, fault) != kz7::kSuccess) {
         check(keywords.empty() && fault.line >= 1 && fault.line <= lines && !fault.reason.empty());
-        return 0;
+        return;
     }
     std::string again;
     for (const kz7::ResponseKeyword& keyword : keywords) {
@@ -40,7 +27,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     check(std::equal(keywords.begin(), keywords.end(), second.begin(), second.end(),
                      [](const auto& a, const auto& b) { return a.name == b.name && a.value == b.value; }));
     kz7::MessageCatalogue catalogue;
-    catalogue.load(file, fault);
+    catalogue.load(input, fault);
     const kz7::Insert inserts[] = {"%s", 1U, 2U, "%n"};
     for (const std::uint32_t number : {997U, 2013U, 2035U, 5057U}) {
         char room[64];
@@ -48,5 +35,4 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
         const kz7::Status status = catalogue.copyText(number, inserts, room, sizeof room, length);
         check(status == (length > sizeof room ? kz7::kBufferTooSmall : kz7::kSuccess));
     }
-    return 0;
 }

@@ -23,12 +23,8 @@ private:
 
 }  // namespace
 
-std::unique_ptr<Backend> memoryBackend() {
-    return std::make_unique<MemoryBackend>();
-}
-
 std::unique_ptr<Backend> backendNamed(std::string_view name) {
-    return name == "memory" ? memoryBackend() : hostBackend();
+    return name == "host" ? hostBackend() : std::make_unique<MemoryBackend>();
 }
 
 }  // namespace kz7::test

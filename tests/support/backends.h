@@ -35,8 +35,12 @@ public:
     virtual std::string written(bool both, const std::function<void(IConsole&)>& writing) = 0;
 };
 
-std::unique_ptr<Backend> memoryBackend();
 std::unique_ptr<Backend> hostBackend();
+
+// The path of the program that the tests start, in the host's form, and how much it writes on each stream in a flood:
+// a pipe is slow where the host is emulated.
+std::string childProgram();
+extern const std::size_t kFloodMebibytes;
 
 // The name is one of kBackends.
 std::unique_ptr<Backend> backendNamed(std::string_view name);

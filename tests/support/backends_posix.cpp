@@ -31,6 +31,12 @@ private:
 
 }  // namespace
 
+const std::size_t kFloodMebibytes = 100;
+
+std::string childProgram() {
+    return std::filesystem::read_symlink("/proc/self/exe").parent_path() / "kz7_child.exe";
+}
+
 std::unique_ptr<Backend> hostBackend() {
     return std::make_unique<EmbeddedBackend>();
 }

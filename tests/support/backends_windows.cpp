@@ -4,7 +4,6 @@
 
 #include "tests/support/backends.h"
 #include "tests/support/captured_streams.h"
-#include "tests/support/host_processes.h"
 
 namespace kz7::test {
 namespace {
@@ -53,6 +52,15 @@ private:
 };
 
 }  // namespace
+
+const std::size_t kFloodMebibytes = 10;
+
+std::string childProgram() {
+    char path[MAX_PATH] = {};
+    GetModuleFileNameA(nullptr, path, MAX_PATH);
+    const std::string own(path);
+    return own.substr(0, own.rfind('\\') + 1) + "kz7_child.exe";
+}
 
 std::unique_ptr<Backend> hostBackend() {
     return std::make_unique<WindowsBackend>();

@@ -27,7 +27,5 @@ private:
 void waitAtGate(const char* name);
 void closeStandardStreams();
 bool startInheriting(const char* program, const char* mode, const char* argument);
-void endBySignal(int signal);
-std::string inheritedState();  // descriptors, blocked and ignored signals
 
 }  // namespace kz7::test

@@ -3,7 +3,6 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include <csignal>
 #include <cstdlib>
 #include <filesystem>
 
@@ -47,33 +46,6 @@ bool startInheriting(const char* program, const char* mode, const char* argument
     char* const argv[] = {const_cast<char*>(program), const_cast<char*>(mode), const_cast<char*>(argument), nullptr};
     pid_t id = 0;
     return posix_spawn(&id, "/proc/self/exe", nullptr, nullptr, argv, environ) == 0;
-}
-
-void endBySignal(int signal) {
-    raise(signal);
-}
-
-std::string inheritedState() {
-    std::string state;
-    for (int descriptor = 0; descriptor < 1024; ++descriptor) {
-        std::error_code error;
-        const auto target = std::filesystem::read_symlink("/proc/self/fd/" + std::to_string(descriptor), error);
-        if (!error) {
-            state += std::to_string(descriptor) + " " + target.string().substr(0, target.string().find(':')) + "\n";
-        }
-    }
-    sigset_t blocked;
-    sigprocmask(SIG_BLOCK, nullptr, &blocked);
-    for (int signal = 1; signal <= SIGRTMAX; ++signal) {
-        struct sigaction action {};
-        if (sigaction(signal, nullptr, &action) == 0 && action.sa_handler != SIG_DFL) {
-            state += "signal " + std::to_string(signal) + " is not at its default\n";
-        }
-        if (sigismember(&blocked, signal) == 1) {
-            state += "signal " + std::to_string(signal) + " is blocked\n";
-        }
-    }
-    return state;
 }
 
 }  // namespace kz7::test

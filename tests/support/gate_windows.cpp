@@ -43,10 +43,4 @@ bool startInheriting(const char* program, const char* mode, const char* argument
                           &started) != FALSE;
 }
 
-void endBySignal(int) {}
-
-std::string inheritedState() {
-    return {};
-}
-
 }  // namespace kz7::test

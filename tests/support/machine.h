@@ -1,6 +1,10 @@
 // A whole machine in memory, and a command of the tool run on it.
 #pragma once
 
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -11,17 +15,34 @@
 
 namespace kz7::test {
 
+// What an error line begins with, up to its line number.
+inline const std::string kPrefix = "install\\src\\uselvlkz7reg.cpp:";
+
+// Whatever was done with it, nothing of it may be open in the end.
 class Machine : public MemoryPlatform {
 public:
+    ~Machine() override {
+        EXPECT_EQ(registry_.openHandles(), 0U);
+        EXPECT_EQ(processes_.openHandles() + threads_.openHandles(), 0U);
+        EXPECT_TRUE(libraries_.loaded.empty());
+        EXPECT_LE(services_.openHandles(), servicesLeftOpen);
+    }
+
     // Runs a command with fresh console texts; the arguments without the program's name.
     Status run(const std::vector<std::string>& arguments) {
         console_.output.clear();
         console_.error.clear();
+        console_.both.clear();
         std::vector<const char*> all = {"kz7InstallReg"};
         for (const std::string& argument : arguments) {
             all.push_back(argument.c_str());
         }
         return runTool(*this, all);
+    }
+    // The same, as "output|errors|status".
+    std::string told(const std::vector<std::string>& arguments) {
+        const Status status = run(arguments);
+        return console_.output + "|" + console_.error + "|" + std::to_string(status);
     }
 
     void set(const std::string& path, const std::string& name, const std::string& data) {
@@ -31,11 +52,41 @@ public:
         OwnedKey key(registry_);
         registry_.createKey(KeyHandle::localMachine, path, keyClass, kKeyFull, key.receive());
     }
+    // Bytes as they are.
+    void setRaw(const std::string& path, const std::string& name, std::string_view data,
+                ValueType type = ValueType::sz) {
+        OwnedKey key(registry_);
+        registry_.createKey(KeyHandle::localMachine, path, {}, kKeyFull, key.receive());
+        registry_.setValue(key.get(), name, type, data);
+    }
     bool has(const std::string& path) {
         OwnedKey key(registry_);
         return registry_.openKey(KeyHandle::localMachine, path, kKeyRead, key.receive()) == kSuccess;
     }
     std::string dump(const std::string& path = {}) { return dumpRegistry(registry_, KeyHandle::localMachine, path); }
+
+    // The values directly under a key, sorted: "name=data name=data", a NUL shown as '!'; "none" without the key.
+    std::string values(const std::string& path) {
+        OwnedKey key(registry_);
+        if (registry_.openKey(KeyHandle::localMachine, path, kKeyRead, key.receive()) != kSuccess) {
+            return "none";
+        }
+        std::set<std::string> sorted;
+        FixedBuffer<1024> name;
+        FixedBuffer<1024> data;
+        for (std::uint32_t i = 0; registry_.enumerateValue(key.get(), i, name, nullptr, &data) == kSuccess; ++i) {
+            std::string shown(data.view());
+            std::replace(shown.begin(), shown.end(), '\0', '!');
+            sorted.insert(std::string(name.view()) + "=" + shown);
+        }
+        std::string text;
+        for (const std::string& value : sorted) {
+            text += (text.empty() ? "" : " ") + value;
+        }
+        return text;
+    }
+
+    std::size_t servicesLeftOpen = 0;  // on purpose, at most
 };
 
 }  // namespace kz7::test

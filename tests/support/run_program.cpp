@@ -38,12 +38,16 @@ pid_t start(const std::vector<std::string>& command, const ProgramOptions& optio
     return child;
 }
 
+}  // namespace
+
 std::string contents(const std::string& path) {
     std::ifstream file(path, std::ios::binary);
     return {std::istreambuf_iterator<char>(file), {}};
 }
 
-}  // namespace
+void overwrite(const std::string& path, const std::string& bytes) {
+    std::ofstream(path, std::ios::binary | std::ios::trunc) << bytes;
+}
 
 std::string programPath(const std::string& name) {
     return std::string(KZ7_PROGRAMS) + "/" + name;

@@ -23,6 +23,11 @@ struct ProgramOptions {
     std::function<void()> inChild;         // after the fork, for limits
 };
 
+// A file's bytes; empty where there is none.
+std::string contents(const std::string& path);
+// Makes a file, or gives it other bytes.
+void overwrite(const std::string& path, const std::string& bytes);
+
 // The path of one of the project's programs.
 std::string programPath(const std::string& name);
 

@@ -1,6 +1,8 @@
 // The installer runtime on a machine in memory, with or without an installer session.
 #pragma once
 
+#include <gtest/gtest.h>
+
 #include <string>
 
 #include "install/platform/memory/installer_session.h"
@@ -13,7 +15,23 @@
 
 namespace kz7::test {
 
-// The process-wide observers of a test go with it.
+// A stream that shows what the engine does for as long as the object is there.
+template <typename Stream>
+class Shown {
+public:
+    explicit Shown(URE& engine) : engine_(engine) { engine.registerObserver(*Stream::getInstance(engine)); }
+    ~Shown() {
+        engine_.unregisterObserver(*Stream::getInstance(engine_));
+        Stream::release();
+    }
+    Shown(const Shown&) = delete;
+    Shown& operator=(const Shown&) = delete;
+
+private:
+    URE& engine_;
+};
+
+// The process-wide observers of a test go with it, and nothing may then be open.
 class RuntimeMachine : public MemoryPlatform {
 public:
     explicit RuntimeMachine(bool withSession = false) : engine(portsOf(*this, withSession ? &session : nullptr)) {
@@ -24,6 +42,7 @@ public:
         UREExternalObserverMachineStream::release();
         UREExternalObserverHumanStream::release();
         URELogObserver::release();
+        EXPECT_EQ(files_.openFiles() + processes_.openHandles() + session.openHandles(), 0U);
     }
     RuntimeMachine(const RuntimeMachine&) = delete;
     RuntimeMachine& operator=(const RuntimeMachine&) = delete;
@@ -36,6 +55,14 @@ public:
         engine.registerObserver(log(), Takes::everything);
     }
     std::string logText() { return files_.content(kLogFile); }
+
+    // What an action adds to the log.
+    template <typename Action>
+    std::string logged(Action action) {
+        const std::size_t before = logText().size();
+        action();
+        return logText().substr(before);
+    }
 
     static constexpr const char* kFolder = "C:\\Setup Logs\\";
     static constexpr const char* kLogFile = "C:\\Setup Logs\\setup.log";

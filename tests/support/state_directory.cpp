@@ -20,6 +20,11 @@ ProgramResult StateDirectory::tool(std::vector<std::string> arguments, ProgramOp
     return run("kz7InstallReg", std::move(arguments), std::move(options));
 }
 
+pid_t StateDirectory::start(std::vector<std::string> arguments) const {
+    arguments.insert(arguments.begin(), programPath("kz7InstallReg"));
+    return startProgram(arguments, {{"KZ7_STATE_DIR=" + path()}, {}});
+}
+
 std::string StateDirectory::dump() const {
     std::string faults;
     EmbeddedRegistry registry(path(), true,

@@ -17,6 +17,8 @@ public:
     ProgramResult run(const std::string& program, std::vector<std::string> arguments,
                       ProgramOptions options = {}) const;
     ProgramResult tool(std::vector<std::string> arguments, ProgramOptions options = {}) const;
+    // Starts the tool without waiting; output and errors are dropped.
+    pid_t start(std::vector<std::string> arguments) const;
 
     // Everything in the store; a store that is not there reads as empty. A fault of the store is told in the text.
     std::string dump() const;
