@@ -54,7 +54,7 @@ private:
     Status backup(std::string_view path, AliasMap& profile);
     Status deleteAliases(std::string_view path, bool& allDeleted);
     Status writeProfile();
-    std::string nameFor(std::string_view prefix, const InstallCopyInfo* highest);
+    void tellProfile();
 
     RegistryValues values_;
     CopiesByName copiesByName_;
