@@ -9,8 +9,7 @@
 namespace kz7 {
 namespace {
 
-constexpr std::uint32_t kAliasNameRoom = 100;  // bytes, the terminator included
-constexpr std::size_t kWholeVersion = 4;       // components; any other prefix must go on behind a dot
+constexpr std::size_t kWholeVersion = 4;  // components; any other prefix must go on behind a dot
 
 bool isLetter(char c) {
     return foldUpper(c) >= 'A' && foldUpper(c) <= 'Z';
