@@ -74,6 +74,10 @@ TEST_P(FileSystemContract, FilesAreWrittenAtTheirEndAndReadWhole) {
     EXPECT_EQ(files_.write(closed, "lost", written), kInvalidHandle);
     EXPECT_EQ(written, 0U);
     EXPECT_EQ(files_.closeFile(closed), kInvalidHandle);
+    ASSERT_EQ(files_.openForAppend(path, second.receive()), kSuccess);
+    if (!backend_->differences().usesHandlesAgain) {
+        EXPECT_EQ(files_.write(closed, "lost", written), kInvalidHandle) << "after another opening";
+    }
     EXPECT_EQ(files_.closeFile(FileHandle::none), kInvalidHandle);
 }
 

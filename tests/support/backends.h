@@ -18,6 +18,7 @@ struct Differences {
     bool foldsBeyondAscii = false;       // names that differ in the case of other letters are one
     bool passesClassesOn = false;        // to new parents, and to the key when it is there already
     bool startsDeletedServices = false;  // while they are still open
+    bool usesHandlesAgain = false;       // a closed handle may be that of another file
 };
 
 class Backend {

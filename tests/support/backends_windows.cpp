@@ -31,7 +31,8 @@ public:
                 .ordersKeysByLowerCase = wine,
                 .foldsBeyondAscii = true,
                 .passesClassesOn = wine,
-                .startsDeletedServices = wine};
+                .startsDeletedServices = wine,
+                .usesHandlesAgain = true};
     }
     std::string folder() override { return folder_; }
     std::string program() override { return folder() + "\\Program.exe"; }
