@@ -79,6 +79,7 @@ Status restoreVersion8(IRegistryStore& registry, IServiceManager& services, ICon
         closing.error(kLocationFailed);
     }
     switchOffService(services, closing, kService);
+    // Deliberate: a failed commit is the exit code and nothing else; the store has told it on standard error.
     if (const Status kept = registry.commit(); kept != kSuccess) {
         return kept;
     }

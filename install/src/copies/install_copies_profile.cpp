@@ -140,6 +140,8 @@ Status InstallCopiesProfile::generateProfileInfo() {
             const auto alias = profileInfo_.try_emplace(place, std::string(text.substr(0, end)));
             open.push_back(alias);
             const bool hasLetter = end > letter;
+            // Deliberate: the fourth prefix is answered by exactly that version, so that one of five components gets
+            // two empty aliases; what finds nothing is written all the same.
             if ((open.size() == kWholeVersion) == (end == text.size())) {
                 const Alias* first = hasLetter ? *answered.insert(&*alias).first : &*alias;
                 alias->second = first == &*alias ? version->second.getName() : first->second;
@@ -167,7 +169,8 @@ void InstallCopiesProfile::tellProfile() {
             values_.tell("The highest version leading by '%s': ( none )", {prefix});
             values_.tell("Did not find corrsponding install name for '%s'", {prefix});
         } else {
-            // Deliberate: the quotation mark is never closed; whoever searches traces knows the text so.
+            // Deliberate: the quotation mark is never closed (and "corrsponding" stays); whoever searches traces knows
+            // the texts so.
             values_.tell("The highest version leading by '%s:%s--%s",
                          {prefix, copiesByName_.at(name).getVersion(), name});
         }
