@@ -18,6 +18,7 @@ struct Differences {
     bool foldsBeyondAscii = false;       // names that differ in the case of other letters are one
     bool passesClassesOn = false;        // to new parents, and to the key when it is there already
     bool startsDeletedServices = false;  // while they are still open
+    bool needsFramework = false;         // to keep data providers
     bool usesHandlesAgain = false;       // a closed handle may be that of another file
 };
 
@@ -31,6 +32,15 @@ public:
     // The product's path of a folder that is there, and of a program in it that can run as a service.
     virtual std::string folder() = 0;
     virtual std::string program() = 0;
+
+    // The sample copy's level library in that folder.
+    std::string library() { return folder() + "\\kz7install64.dll"; }
+
+    // Puts a data provider, which is none that a framework would take, into the bin folder below that folder.
+    virtual void addProvider() = 0;
+
+    // Does it while standard input is that text.
+    virtual void reading(const std::string& input, const std::function<void()>& body) = 0;
 
     // What `writing` brings out on standard output, or on both streams in the order in which it arrives.
     virtual std::string written(bool both, const std::function<void(IConsole&)>& writing) = 0;
