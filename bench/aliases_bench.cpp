@@ -1,6 +1,6 @@
 // The version aliases for 10 to 100,000 copies: computing them beside one bare pass over the sorted version
-// texts, and the whole rewrite on the embedded store beside a bare SQLite program that reads and writes the
-// same rows of the same file.
+// texts, for versions of several shapes, and beside one over the records of the copies, and the whole rewrite on the
+// embedded store beside a bare SQLite program that reads and writes the same rows of the same file.
 #include <benchmark/benchmark.h>
 #include <sqlite3.h>
 #include <stdlib.h>
@@ -36,16 +36,51 @@ void require(bool condition, const char* what) {
     }
 }
 
-// A state directory with that many copies in it, 100 fix levels to a modification, and their aliases.
+using Version = std::array<std::string, 4>;  // its four fields
+
+// 100 fix levels to a modification.
+Version balanced(std::int64_t copy) {
+    return {"9", std::to_string(copy / 10000), std::to_string(copy / 100 % 100), std::to_string(copy % 100)};
+}
+
+// Ten texts of which each begins with the one before.
+Version prefixesOfOneAnother(std::int64_t copy) {
+    std::string fixLevel = "0";
+    for (std::int64_t more = 0; more < copy % 10; ++more) {
+        fixLevel += ".1";
+    }
+    return {"9", std::to_string(copy / 1000), std::to_string(copy / 10 % 100), fixLevel};
+}
+
+// As balanced, each fix level a word in which any letter may be written in either case.
+Version bothCases(std::int64_t copy) {
+    std::string word = "fixpack";
+    const std::uint64_t spelling = static_cast<std::uint64_t>(copy) * 0x9E3779B97F4A7C15U >> 32U;
+    for (std::size_t letter = 0; letter < word.size(); ++letter) {
+        word[letter] = (spelling >> letter & 1U) != 0 ? foldUpper(word[letter]) : word[letter];
+    }
+    Version version = balanced(copy);
+    version[3] = word + std::to_string(copy % 25);
+    return version;
+}
+
+// The same word, all of them in one modification.
+Version bothCasesTogether(std::int64_t copy) {
+    return {"9", "7", "0", bothCases(copy)[3] + std::to_string(copy / 4)};
+}
+
+using Shape = Version (*)(std::int64_t copy);
+
+// A state directory with that many copies in it and their aliases.
 class StoreWithCopies {
 public:
-    explicit StoreWithCopies(std::int64_t copies) {
+    StoreWithCopies(std::int64_t copies, Shape shape) {
         std::string name = (std::filesystem::temp_directory_path() / "kz7-bench-XXXXXX").string();
         require(mkdtemp(name.data()) != nullptr, "no temporary directory");
         directory_ = name;
         const auto registry = open();
         for (std::int64_t copy = 0; copy < copies; ++copy) {
-            addCopy(*registry, copy);
+            addCopy(*registry, copy, shape(copy));
         }
         OwnedKey key(*registry);
         registry->createKey(KeyHandle::localMachine, layout::kCopies32, {}, kKeyFull, key.receive());
@@ -62,17 +97,14 @@ public:
     std::string file() const { return directory_ + "/registry.db"; }
 
 private:
-    static void addCopy(IRegistryStore& registry, std::int64_t copy) {
-        const std::array<std::pair<const char*, std::string>, 4> values = {
-            {{"Version", "9"},
-             {"Release", std::to_string(copy / 10000)},
-             {"Modification", std::to_string(copy / 100 % 100)},
-             {"Fix Level", std::to_string(copy % 100)}}};
+    static void addCopy(IRegistryStore& registry, std::int64_t copy, const Version& version) {
+        constexpr std::array<const char*, 4> kNames = {"Version", "Release", "Modification", "Fix Level"};
         const std::string path = std::string(layout::kCopies) + "\\COPY" + std::to_string(copy) + "\\CurrentVersion";
         OwnedKey key(registry);
         registry.createKey(KeyHandle::localMachine, path, {}, kKeyFull, key.receive());
-        for (const auto& [name, text] : values) {
-            registry.setValue(key.get(), name, ValueType::sz, std::string_view(text.c_str(), text.size() + 1));
+        for (std::size_t field = 0; field < kNames.size(); ++field) {
+            const std::string& text = version[field];
+            registry.setValue(key.get(), kNames[field], ValueType::sz, {text.c_str(), text.size() + 1});
         }
     }
 
@@ -80,24 +112,43 @@ private:
     Debug debug_;
 };
 
+// The store that was asked for last is kept: a benchmark is called anew for every estimate of its length.
+const StoreWithCopies& storeWith(std::int64_t copies, Shape shape) {
+    static std::unique_ptr<StoreWithCopies> kept;
+    static std::pair<std::int64_t, Shape> what;
+    if (kept == nullptr || what != std::pair(copies, shape)) {
+        kept.reset();
+        kept = std::make_unique<StoreWithCopies>(copies, shape);
+        what = {copies, shape};
+    }
+    return *kept;
+}
+
+const std::string& nameOf(const std::string& name) {
+    return name;
+}
+const std::string& nameOf(const InstallCopyInfo& copy) {
+    return copy.getName();
+}
+
 // Every prefix is given to the greatest text that has it: what no program can do without. Case is not looked
 // at, and the prefixes that a text shares with its neighbour are passed over.
-void onePass(const SortedCopies& copies, AliasMap& aliases) {
+template <class Copies>
+void onePass(const Copies& copies, AliasMap& aliases) {
     std::string_view greater;
     for (auto copy = copies.rbegin(); copy != copies.rend(); ++copy) {
         const std::string_view text = copy->first;
         for (std::size_t dot = text.find('.', commonLength(text, greater)); dot != std::string_view::npos;
              dot = text.find('.', dot + 1)) {
-            aliases.emplace(text.substr(0, dot), copy->second);
+            aliases.emplace(text.substr(0, dot), nameOf(copy->second));
         }
-        aliases.emplace(text, copy->second);
+        aliases.emplace(text, nameOf(copy->second));
         greater = text;
     }
 }
 
-void onePassOverSortedTexts(benchmark::State& state) {
-    const StoreWithCopies store(state.range(0));
-    const auto registry = store.open();
+void passOver(benchmark::State& state, Shape shape, bool records) {
+    const auto registry = storeWith(state.range(0), shape).open();
     Debug debug;
     InstallCopiesProfile profile(*registry, debug.output);
     require(profile.generateInstallCopiesList() == kSuccess, "no copies");
@@ -108,17 +159,28 @@ void onePassOverSortedTexts(benchmark::State& state) {
     AliasMap aliases;
     for (auto _ : state) {
         aliases.clear();
-        onePass(copies, aliases);
+        records ? onePass(profile.copiesByVersion(), aliases) : onePass(copies, aliases);
         benchmark::DoNotOptimize(aliases);
     }
     profile.generateProfileInfo();
-    require(aliases == profile.profileInfo(), "both compute the same");
+    // Which copy answers is another matter where case or whole versions count.
+    require(shape == balanced ? aliases == profile.profileInfo() : aliases.size() == profile.profileInfo().size(),
+            "both compute the same");
     state.SetComplexityN(state.range(0));
 }
 
-void aliasesComputed(benchmark::State& state) {
-    const StoreWithCopies store(state.range(0));
-    const auto registry = store.open();
+// The texts and names alone, laid out in memory in that order.
+void onePassOverSortedTexts(benchmark::State& state, Shape shape) {
+    passOver(state, shape, false);
+}
+
+// The records as they were read, in the order of their texts.
+void onePassOverTheRecords(benchmark::State& state, Shape shape) {
+    passOver(state, shape, true);
+}
+
+void aliasesComputed(benchmark::State& state, Shape shape) {
+    const auto registry = storeWith(state.range(0), shape).open();
     Debug debug;
     InstallCopiesProfile profile(*registry, debug.output);
     require(profile.generateInstallCopiesList() == kSuccess, "no copies");
@@ -130,7 +192,7 @@ void aliasesComputed(benchmark::State& state) {
 }
 
 void aliasRewrite(benchmark::State& state) {
-    const StoreWithCopies store(state.range(0));
+    const StoreWithCopies& store = storeWith(state.range(0), balanced);
     Debug debug;
     for (auto _ : state) {
         const auto registry = store.open();
@@ -265,7 +327,7 @@ private:
 };
 
 void bareSqliteRewrite(benchmark::State& state) {
-    const StoreWithCopies store(state.range(0));
+    const StoreWithCopies& store = storeWith(state.range(0), balanced);
     for (auto _ : state) {
         BareProgram(store.file()).rewrite();
     }
@@ -276,8 +338,19 @@ void sizes(benchmark::internal::Benchmark* benchmark) {
     benchmark->RangeMultiplier(10)->Range(10, 100000)->Complexity()->UseRealTime()->Unit(benchmark::kMicrosecond);
 }
 
-BENCHMARK(onePassOverSortedTexts)->Apply(sizes);
-BENCHMARK(aliasesComputed)->Apply(sizes);
+void addShape(const std::string& name, Shape shape) {
+    sizes(benchmark::RegisterBenchmark(("onePassOverSortedTexts/" + name).c_str(), onePassOverSortedTexts, shape));
+    sizes(benchmark::RegisterBenchmark(("onePassOverTheRecords/" + name).c_str(), onePassOverTheRecords, shape));
+    sizes(benchmark::RegisterBenchmark(("aliasesComputed/" + name).c_str(), aliasesComputed, shape));
+}
+
+const bool kShapesAdded = [] {
+    addShape("balanced", balanced);
+    addShape("prefixesOfOneAnother", prefixesOfOneAnother);
+    addShape("bothCases", bothCases);
+    addShape("bothCasesTogether", bothCasesTogether);
+    return true;
+}();
 BENCHMARK(bareSqliteRewrite)->Apply(sizes);
 BENCHMARK(aliasRewrite)->Apply(sizes);
 

@@ -82,11 +82,10 @@ TEST(HighestVersion, IsWhatTheWalkFromTheGreatestTextFinds) {
         ASSERT_EQ(profile.generateProfileInfo(), kSuccess);
         const CopiesByVersion& byVersion = profile.copiesByVersion();
         ASSERT_EQ(profile.profileInfo(), literalProfile(byVersion)) << "round " << round;
-        HighestVersions highest(byVersion);
         for (int query = 0; query < 20; ++query) {
             const std::string prefix = pick() + (random() % 2 == 0 ? "" : "." + pick());
             const bool exact = random() % 2 == 0;
-            const InstallCopyInfo* found = highest.leadingBy(prefix, exact);
+            const InstallCopyInfo* found = highestVersionLeadingBy(byVersion, prefix, exact);
             ASSERT_EQ(found == nullptr ? "" : found->getName(), literalHighest(byVersion, prefix, exact))
                 << "round " << round << ": " << prefix;
         }

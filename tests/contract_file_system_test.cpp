@@ -80,6 +80,10 @@ TEST_P(FileSystemContract, FilesAreWrittenAtTheirEndAndReadWhole) {
     second.reset();
     EXPECT_EQ(files_.write(closed, "lost", written), kInvalidHandle);
     EXPECT_EQ(files_.closeFile(closed), kInvalidHandle);
+    ASSERT_EQ(files_.openForAppend(path, second.receive()), kSuccess);
+    if (!backend_->differences().usesHandlesAgain) {
+        EXPECT_EQ(files_.write(closed, "lost", written), kInvalidHandle) << "after another opening";
+    }
     EXPECT_EQ(files_.closeFile(FileHandle::none), kInvalidHandle);
 }
 

@@ -83,7 +83,10 @@ TEST_F(ProviderProgram, CopiesAreShownWithTheirServicesAndAliasesWithWhatIsWrong
     store_.tool({"-addKZ7Copy", "COPY1", "C:\\KZ7"});
     const std::string text =
         "Windows Registry Editor Version 5.00\n"
-        "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies]\n\"8.2\"=\"GONE\"\n\"9.8.0\"=\"COPY1\"\n"
+        "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies]\n\"8.2\"=\"GONE\"\n\"9.8.0\"=\"COPY1\"\n\"" +
+        std::string(100, 'x') +
+        "\"=\"\"\n\"8.1\"=\"GONE\"\n\"8.3\"=\"GONE\"\n"
+        "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies]\n\"8.3\"=\"GONE\"\n"
         "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies\\five\\CurrentVersion]\n"
         "\"Version\"=\"9\"\n\"Release\"=\"8\"\n\"Modification\"=\"0\"\n\"Fix Level\"=\"0.1\"\n"
         "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies\\half]\n\"KZ7 Path Name\"=\"C:\\\\h\"\n";
@@ -111,6 +114,13 @@ TEST_F(ProviderProgram, CopiesAreShownWithTheirServicesAndAliasesWithWhatIsWrong
                   "9.8.0      COPY1   -       five       9.8.0.0.1 is the highest that begins with it\n"
                   "9.8.0.0    -       -       (empty)    no copy has exactly this version; written empty\n"
                   "9.8.0.0.1  -       -       (empty)    no version goes on behind it; written empty\n");
+    const std::string gone = "no copy has such a version; the next rewrite ";
+    const std::string ended = ": a value name of 100 bytes or more ends its walk\n";
+    EXPECT_EQ(store_.run("kz7admin", {"aliases", "8"}).output,
+              "store " + storeLine + "\nPREFIX  NATIVE  32-BIT  SHOULD BE  WHY\n" +     //
+                  "8.1     GONE    -       -          " + gone + "leaves it" + ended +  //
+                  "8.2     GONE    -       -          " + gone + "deletes it\n" +       //
+                  "8.3     GONE    GONE    -          " + gone + "deletes it from the 32-bit view only" + ended);
 }
 
 }  // namespace

@@ -16,7 +16,8 @@ namespace {
 struct AliasRow {
     std::string prefix;                               // as it is or would be spelled
     std::array<std::optional<std::string>, 2> names;  // the copy that each view names
-    std::optional<std::string> should;                // none: the next rewrite deletes it
+    std::array<bool, 2> deletable = {};               // in each view; the rewrite's own walk gets to it
+    std::optional<std::string> should;                // none: the next rewrite deletes it where it gets to it
     std::string version;                              // of the copy it should name
     bool exact = false;
 };
@@ -42,11 +43,15 @@ Status readAliases(IRegistryStore& registry, std::string_view path, std::size_t 
     FixedBuffer<kMaxValueName + 1> name;
     std::string room(1 << 20, '\0');
     Buffer data(room.data(), static_cast<std::uint32_t>(room.size()));
+    bool walked = true;
     for (std::uint32_t index = 0;
          succeeded(status) && succeeded(status = registry.enumerateValue(key.get(), index, name, nullptr, &data));
          ++index) {
+        walked = walked && name.text().size() < kAliasNameRoom;
         if (isAliasName(name.text())) {
-            rowOf(rows, name.text()).names[view] = data.text();
+            AliasRow& row = rowOf(rows, name.text());
+            row.names[view] = data.text();
+            row.deletable[view] = walked;
         }
     }
     return isNotFound(status) || isEndOfItems(status) ? kSuccess : status;
@@ -69,7 +74,15 @@ void computeAliases(Admin& admin, AliasRows& rows) {
 
 std::string why(const AliasRow& row) {
     if (!row.should) {
-        return "no copy has such a version; the next rewrite deletes it";
+        std::string reason = "no copy has such a version; the next rewrite ";
+        const auto stays = [&](std::size_t view) { return row.names[view] && !row.deletable[view]; };
+        if (!stays(0) && !stays(1)) {
+            return reason + "deletes it";
+        }
+        reason += row.deletable[0]   ? "deletes it from the native view only"
+                  : row.deletable[1] ? "deletes it from the 32-bit view only"
+                                     : "leaves it";
+        return reason + ": a value name of 100 bytes or more ends its walk";
     }
     if (row.version.empty()) {
         return row.exact ? "no copy has exactly this version; written empty"

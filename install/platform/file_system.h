@@ -14,9 +14,10 @@ namespace kz7 {
 // A file that is open for writing.
 enum class FileHandle : std::uint64_t { none = 0 };
 
-// Paths are the product's: a drive letter or a leading separator makes one absolute. Where the host has
-// no drives, `X:\a\b` lies in the state directory, and a relative path with a folder in it names nothing:
-// nothing is ever taken from the directory that the tool happens to be run in.
+// Paths are the product's: `X:\a\b` names one place, in the state directory where the host has no drives. So do
+// `\\host\share` on Windows and, elsewhere, the host's own path, which begins with a separator. Any other names
+// nothing, on Windows `\a` too: nothing is ever taken from the directory or the drive that the tool happens to be
+// run in.
 class IFileSystem {
 public:
     virtual ~IFileSystem() = default;

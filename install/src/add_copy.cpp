@@ -99,6 +99,8 @@ Status addCopy(IRegistryStore& registry, IServiceManager& services, Report& repo
         }
     }
     // As part of a migration the copy becomes visible with the rest of it.
+    // Deliberate: a failed commit counts as a failed write of the add; nothing of it is on disk, so it must not end
+    // as success.
     if (const Status kept = request.isV9 ? kSuccess : registry.commit(); status == kSuccess) {
         status = kept;
     }

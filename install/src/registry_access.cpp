@@ -61,6 +61,7 @@ private:
 
 }  // namespace
 
+// Deliberate: a path that does not fit fails the operation; cut, it would name another key.
 Status checkPathLength(std::string_view path) {
     return path.size() < kSubstitutedSize ? kSuccess : kFilenameExceedsRange;
 }

@@ -40,6 +40,7 @@ Status removeCopy(IRegistryStore& registry, IServiceManager& services, IDebugOut
         deleteTree(registry, KeyHandle::localMachine, layout::kProduct, 0, {}, {});
     }
     deleteServiceByName(services, managementServiceName(copyName).view());
+    // Deliberate: a failed commit is the exit code and nothing else; the store has told it on standard error.
     if (const Status kept = registry.commit(); kept != kSuccess) {
         return kept;
     }

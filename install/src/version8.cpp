@@ -79,6 +79,7 @@ Status restoreVersion8(IRegistryStore& registry, IServiceManager& services, ICon
         closing.error(kLocationFailed);
     }
     switchOffService(services, closing, kService);
+    // Deliberate: a failed commit is the exit code, and the closing line is not told; the store has said why.
     const Status kept = registry.commit();
     held.release(console, kept == kSuccess);
     return kept == kSuccess ? status : kept;

@@ -2,6 +2,7 @@
 // Each is fresh, or open on a place of its own that goes with it.
 #pragma once
 
+#include <filesystem>
 #include <functional>
 #include <memory>
 #include <string>
@@ -18,6 +19,8 @@ struct Differences {
     bool foldsBeyondAscii = false;       // names that differ in the case of other letters are one
     bool passesClassesOn = false;        // to new parents, and to the key when it is there already
     bool startsDeletedServices = false;  // while they are still open
+    bool needsFramework = false;         // to keep data providers
+    bool usesHandlesAgain = false;       // a closed handle may be that of another file
 };
 
 class Backend {
@@ -31,6 +34,15 @@ public:
     virtual std::string folder() = 0;
     virtual std::string program() = 0;
 
+    // The sample copy's level library in that folder.
+    std::string library() { return folder() + "\\kz7install64.dll"; }
+
+    // Puts a data provider, which is none that a framework would take, into the bin folder below that folder.
+    virtual void addProvider() = 0;
+
+    // Does it while standard input is that text.
+    virtual void reading(const std::string& input, const std::function<void()>& body) = 0;
+
     // What `writing` brings out on standard output, or on both streams in the order in which it arrives.
     virtual std::string written(bool both, const std::function<void(IConsole&)>& writing) = 0;
 };
@@ -41,6 +53,11 @@ std::unique_ptr<Backend> hostBackend();
 // a pipe is slow where the host is emulated.
 std::string childProgram();
 extern const std::size_t kFloodMebibytes;
+
+// The level library of the sample copy, which is built beside the programs.
+inline std::filesystem::path sampleLibrary() {
+    return std::filesystem::path(childProgram()).parent_path().parent_path() / "examples/copy/bin/kz7install64.dll";
+}
 
 // The name is one of kBackends.
 std::unique_ptr<Backend> backendNamed(std::string_view name);

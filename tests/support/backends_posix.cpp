@@ -11,13 +11,22 @@ namespace {
 class EmbeddedBackend final : public Backend {
 public:
     EmbeddedBackend() : platform_(hostPlatform({.program = "test", .stateDirectory = directory_.path()})) {
-        std::filesystem::create_directories(directory_.path() + "/drive_c/contract");
-        std::ofstream(directory_.path() + "/drive_c/contract/Program.exe") << "program";
+        std::filesystem::create_directories(hostFolder_);
+        std::ofstream(hostFolder_ + "/Program.exe") << "program";
+        std::filesystem::copy_file(sampleLibrary(), hostFolder_ + "/kz7install64.dll");
     }
 
     IPlatform& platform() override { return *platform_; }
     std::string folder() override { return "C:\\contract"; }
     std::string program() override { return folder() + "\\Program.exe"; }
+    void addProvider() override {
+        std::filesystem::create_directory(hostFolder_ + "/bin");
+        std::ofstream(hostFolder_ + "/bin/kz7nmpdata.dll") << "provider";
+    }
+    void reading(const std::string& input, const std::function<void()>& body) override {
+        const FedInput fed(input);
+        body();
+    }
     std::string written(bool both, const std::function<void(IConsole&)>& writing) override {
         CapturedStreams streams(both);
         writing(platform_->console());
@@ -26,6 +35,7 @@ public:
 
 private:
     TemporaryDirectory directory_;
+    std::string hostFolder_ = directory_.path() + "/drive_c/contract";
     std::unique_ptr<IPlatform> platform_;
 };
 

@@ -1,6 +1,7 @@
 #include <windows.h>
 
 #include <filesystem>
+#include <fstream>
 
 #include "tests/support/backends.h"
 #include "tests/support/captured_streams.h"
@@ -15,6 +16,7 @@ public:
         std::filesystem::remove_all(folder());
         std::filesystem::create_directories(folder());
         std::filesystem::copy_file(programs + "kz7_test_service.exe", program());
+        std::filesystem::copy_file(sampleLibrary(), library());
     }
     ~WindowsBackend() override {
         // A program that is just ending keeps its file; the next backend finds a folder of another name.
@@ -30,10 +32,20 @@ public:
                 .ordersKeysByLowerCase = wine,
                 .foldsBeyondAscii = true,
                 .passesClassesOn = wine,
-                .startsDeletedServices = wine};
+                .startsDeletedServices = wine,
+                .needsFramework = true,
+                .usesHandlesAgain = true};
     }
     std::string folder() override { return folder_; }
     std::string program() override { return folder() + "\\Program.exe"; }
+    void addProvider() override {
+        std::filesystem::create_directory(folder() + "/bin");
+        std::ofstream(folder() + "/bin/kz7nmpdata.dll") << "provider";
+    }
+    void reading(const std::string& input, const std::function<void()>& body) override {
+        const FedInput fed(input);
+        body();
+    }
     std::string written(bool both, const std::function<void(IConsole&)>& writing) override {
         CapturedStreams streams(both);
         writing(platform_->console());

@@ -1,4 +1,4 @@
-// Leads the C library's streams of this process into a file for a while.
+// Leads the C library's streams of this process into a file, or out of one, for a while.
 #pragma once
 
 #include <unistd.h>
@@ -42,6 +42,29 @@ public:
 private:
     int output_;
     int error_;
+    std::FILE* file_;
+};
+
+// Standard input is that text.
+class FedInput {
+public:
+    explicit FedInput(const std::string& text) : input_(dup(0)), file_(std::tmpfile()) {
+        std::fwrite(text.data(), 1, text.size(), file_);
+        std::rewind(file_);
+        dup2(fileno(file_), 0);
+        std::clearerr(stdin);
+    }
+    ~FedInput() {
+        dup2(input_, 0);
+        std::clearerr(stdin);
+        close(input_);
+        std::fclose(file_);
+    }
+    FedInput(const FedInput&) = delete;
+    FedInput& operator=(const FedInput&) = delete;
+
+private:
+    int input_;
     std::FILE* file_;
 };
 

@@ -44,11 +44,6 @@ Status statusOf(int error) {
     }
 }
 
-// No handle is 0.
-int descriptorOf(FileHandle file) {
-    return static_cast<int>(file) - 1;
-}
-
 }  // namespace
 
 EmbeddedFileSystem::EmbeddedFileSystem(std::string stateDirectory) : stateDirectory_(std::move(stateDirectory)) {}
@@ -96,14 +91,15 @@ Status EmbeddedFileSystem::openForAppend(std::string_view path, FileHandle& file
     if (descriptor == -1) {
         return errno == ENOENT || errno == ENOTDIR ? kPathNotFound : statusOf(errno);
     }
-    file = FileHandle{static_cast<std::uint64_t>(descriptor) + 1};
+    file = files_.give(descriptor);
     return kSuccess;
 }
 
 Status EmbeddedFileSystem::write(FileHandle file, std::string_view data, std::uint32_t& written) {
+    const int descriptor = files_.find(file);
     written = 0;
     while (written < data.size()) {
-        const ssize_t count = ::write(descriptorOf(file), data.data() + written, data.size() - written);
+        const ssize_t count = ::write(descriptor, data.data() + written, data.size() - written);
         if (count == -1 && errno != EINTR) {
             return statusOf(errno);
         }
@@ -113,7 +109,7 @@ Status EmbeddedFileSystem::write(FileHandle file, std::string_view data, std::ui
 }
 
 Status EmbeddedFileSystem::closeFile(FileHandle file) {
-    return close(descriptorOf(file)) == 0 ? kSuccess : statusOf(errno);
+    return close(files_.take(file)) == 0 ? kSuccess : statusOf(errno);
 }
 
 Status EmbeddedFileSystem::findFile(std::string_view pattern, std::string& name) {

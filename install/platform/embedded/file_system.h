@@ -3,6 +3,7 @@
 
 #include <string>
 
+#include "install/platform/embedded/descriptor_table.h"
 #include "install/platform/file_system.h"
 
 namespace kz7 {
@@ -22,6 +23,7 @@ public:
 
 private:
     std::string stateDirectory_;
+    DescriptorTable<FileHandle> files_;
 };
 
 }  // namespace kz7

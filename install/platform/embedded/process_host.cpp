@@ -230,13 +230,7 @@ void settleInheritedState() {
 }
 
 EmbeddedProcessHost::EmbeddedProcessHost(std::string stateDirectory)
-    : stateDirectory_(std::move(stateDirectory)), slots_{StreamHandle{1}, StreamHandle{2}}, lastToken_(2) {}
-
-EmbeddedProcessHost::~EmbeddedProcessHost() {
-    for (const auto& [stream, descriptor] : streams_) {
-        close(descriptor);
-    }
-}
+    : stateDirectory_(std::move(stateDirectory)), slots_{StreamHandle{1}, StreamHandle{2}}, streams_(2) {}
 
 Status EmbeddedProcessHost::getSlot(StandardSlot slot, StreamHandle& stream) {
     stream = slots_[static_cast<std::size_t>(slot)];
@@ -246,19 +240,6 @@ Status EmbeddedProcessHost::getSlot(StandardSlot slot, StreamHandle& stream) {
 Status EmbeddedProcessHost::setSlot(StandardSlot slot, StreamHandle stream) {
     slots_[static_cast<std::size_t>(slot)] = stream;
     return kSuccess;
-}
-
-StreamHandle EmbeddedProcessHost::giveOut(int descriptor) {
-    const std::lock_guard<std::mutex> held(streamsLock_);
-    const StreamHandle stream{++lastToken_};
-    streams_.emplace(stream, descriptor);
-    return stream;
-}
-
-int EmbeddedProcessHost::descriptorOf(StreamHandle stream) {
-    const std::lock_guard<std::mutex> held(streamsLock_);
-    const auto found = streams_.find(stream);
-    return found != streams_.end() ? found->second : -1;
 }
 
 Status EmbeddedProcessHost::createPipe(StreamHandle& readEnd, StreamHandle& writeEnd) {
@@ -275,22 +256,22 @@ Status EmbeddedProcessHost::createPipe(StreamHandle& readEnd, StreamHandle& writ
         close(writing);
         return status;
     }
-    readEnd = giveOut(reading);
-    writeEnd = giveOut(writing);
+    readEnd = streams_.give(reading);
+    writeEnd = streams_.give(writing);
     return kSuccess;
 }
 
 Status EmbeddedProcessHost::duplicate(StreamHandle stream, StreamHandle& copy) {
-    const int descriptor = fcntl(descriptorOf(stream), F_DUPFD_CLOEXEC, kFirstOwnDescriptor);
+    const int descriptor = fcntl(streams_.find(stream), F_DUPFD_CLOEXEC, kFirstOwnDescriptor);
     if (descriptor == -1) {
         return statusOf(errno);
     }
-    copy = giveOut(descriptor);
+    copy = streams_.give(descriptor);
     return kSuccess;
 }
 
 Status EmbeddedProcessHost::read(StreamHandle stream, Buffer& data) {
-    const int descriptor = descriptorOf(stream);
+    const int descriptor = streams_.find(stream);
     ssize_t count = -1;
     do {
         count = ::read(descriptor, data.data, data.capacity);
@@ -303,7 +284,7 @@ Status EmbeddedProcessHost::read(StreamHandle stream, Buffer& data) {
 }
 
 Status EmbeddedProcessHost::write(StreamHandle stream, std::string_view data) {
-    const int descriptor = descriptorOf(stream);
+    const int descriptor = streams_.find(stream);
     const WithoutPipeSignal guard;
     while (!data.empty()) {
         const ssize_t count = ::write(descriptor, data.data(), data.size());
@@ -316,15 +297,9 @@ Status EmbeddedProcessHost::write(StreamHandle stream, std::string_view data) {
 }
 
 Status EmbeddedProcessHost::closeStream(StreamHandle stream) {
-    int descriptor = -1;
-    {
-        const std::lock_guard<std::mutex> held(streamsLock_);
-        const auto found = streams_.find(stream);
-        if (found == streams_.end()) {
-            return kInvalidHandle;
-        }
-        descriptor = found->second;
-        streams_.erase(found);
+    const int descriptor = streams_.take(stream);
+    if (descriptor == -1) {
+        return kInvalidHandle;
     }
     close(descriptor);
     return kSuccess;
@@ -370,7 +345,7 @@ Status EmbeddedProcessHost::spawn(const std::string& file, std::string_view prog
         if (stream == StreamHandle::none) {
             plan.openNull(target, target == STDIN_FILENO ? O_RDONLY : O_WRONLY);
         } else {
-            plan.give(descriptorOf(stream), target);
+            plan.give(streams_.find(stream), target);
         }
     }
     pid_t id = 0;
@@ -378,7 +353,7 @@ Status EmbeddedProcessHost::spawn(const std::string& file, std::string_view prog
     if (error != 0) {
         return isNoProgram(error) ? kFileNotFound : statusOf(error);
     }
-    const ProcessHandle process{++lastToken_};
+    const ProcessHandle process{++lastProcess_};
     children_.emplace(process, Child{.id = id});
     started = {process, ProcessHandle::none, static_cast<std::uint32_t>(id), static_cast<std::uint32_t>(id)};
     return kSuccess;

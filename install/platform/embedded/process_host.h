@@ -1,14 +1,14 @@
 // The process port on POSIX. Handles and what the standard-handle slots hold are tokens of this object,
-// never descriptors: a number that is used again could be anything, the database too.
+// never descriptors.
 #pragma once
 
 #include <sys/types.h>
 
 #include <array>
 #include <map>
-#include <mutex>
 #include <string>
 
+#include "install/platform/embedded/descriptor_table.h"
 #include "install/platform/process_host.h"
 
 namespace kz7 {
@@ -21,9 +21,6 @@ void settleInheritedState();
 class EmbeddedProcessHost final : public IProcessHost {
 public:
     explicit EmbeddedProcessHost(std::string stateDirectory);
-    ~EmbeddedProcessHost() override;
-    EmbeddedProcessHost(const EmbeddedProcessHost&) = delete;
-    EmbeddedProcessHost& operator=(const EmbeddedProcessHost&) = delete;
 
     Status getSlot(StandardSlot slot, StreamHandle& stream) override;
     Status setSlot(StandardSlot slot, StreamHandle stream) override;
@@ -45,8 +42,6 @@ private:
         std::uint32_t exitCode = kExitCodeRunning;
     };
 
-    StreamHandle giveOut(int descriptor);
-    int descriptorOf(StreamHandle stream);
     Child* childOf(ProcessHandle process);
     Status takeEnding(Child& child, int options);
     Status spawn(const std::string& file, std::string_view program, std::string_view arguments,
@@ -54,10 +49,9 @@ private:
 
     std::string stateDirectory_;
     std::array<StreamHandle, 2> slots_;
-    std::mutex streamsLock_;
-    std::map<StreamHandle, int> streams_;
+    DescriptorTable<StreamHandle> streams_;
     std::map<ProcessHandle, Child> children_;
-    std::uint64_t lastToken_ = 0;
+    std::uint64_t lastProcess_ = 0;
 };
 
 }  // namespace kz7

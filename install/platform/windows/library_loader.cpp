@@ -28,7 +28,7 @@ Status WindowsLibraryLoader::load(std::string_view path, LibraryHandle& library)
     }
     const HMODULE module = LoadLibraryExA(std::string(path).c_str(), nullptr, LOAD_WITH_ALTERED_SEARCH_PATH);
     if (module == nullptr) {
-        return lastErrorOr(kModuleNotFound);
+        return kModuleNotFound;
     }
     library = std::bit_cast<LibraryHandle>(module);
     return kSuccess;

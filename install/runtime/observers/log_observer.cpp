@@ -187,6 +187,8 @@ Status URELogObserver::writeKeptLine() {
     if (line_.capacity() > kKeptRoom) {
         std::string().swap(line_);
     }
+    // Deliberate: what was taken of a line that did not go out whole is returned as a count; callers tell it from a
+    // status by where it comes from.
     return whole ? kSuccess : written != 0 ? written : kFailed;
 }
 
@@ -228,6 +230,8 @@ std::string_view URELogObserver::prefixOf(const UREInfo& info, Buffer& time) {
             return ure_.messages.pattern(kWarningPrefix);
         case kCodeReport:
             if (stampsTime_ && ure_.ports.clock.localTime(TimeText::timeOfDay, time) == kSuccess) {
+                // Deliberate: no blank follows, before an error in words either; prefixes bring their own
+                // separator, the time has none.
                 return time.view();
             }
             return {};

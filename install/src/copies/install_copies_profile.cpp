@@ -1,12 +1,40 @@
 #include "install/src/copies/install_copies_profile.h"
 
 #include <algorithm>
+#include <cstring>
+#include <iterator>
+#include <memory_resource>
+#include <unordered_set>
 
 namespace kz7 {
 namespace {
 
-constexpr std::uint32_t kAliasNameRoom = 100;  // bytes, the terminator included
-constexpr std::ptrdiff_t kWholeVersion = 4;    // components; any other prefix must go on behind a dot
+constexpr std::size_t kWholeVersion = 4;  // components; any other prefix must go on behind a dot
+
+bool isLetter(char c) {
+    return foldUpper(c) >= 'A' && foldUpper(c) <= 'Z';
+}
+
+// Aliases that are one but for the case of their letters. They lie apart in the order of version texts: every
+// lower-case letter is above every upper-case one.
+using Alias = AliasMap::value_type;
+struct IgnoringCase {
+    std::size_t operator()(const Alias* alias) const {
+        std::uint64_t hash = 0;
+        for (std::string_view rest = alias->first; !rest.empty(); rest.remove_prefix(std::min(rest.size(), kPiece))) {
+            std::uint64_t piece = 0;
+            std::memcpy(&piece, rest.data(), std::min(rest.size(), kPiece));
+            hash = (hash ^ (piece | kCaseBits)) * 0x9E3779B97F4A7C15U;
+            hash ^= hash >> 32U;
+        }
+        return static_cast<std::size_t>(hash);
+    }
+    bool operator()(const Alias* left, const Alias* right) const { return equalsIgnoreCase(left->first, right->first); }
+
+    static constexpr std::size_t kPiece = sizeof(std::uint64_t);
+    static constexpr std::uint64_t kCaseBits = 0x2020202020202020U;  // what tells "A" from "a"
+};
+using AliasesIgnoringCase = std::pmr::unordered_set<const Alias*, IgnoringCase, IgnoringCase>;
 
 }  // namespace
 
@@ -15,7 +43,7 @@ bool isAliasName(std::string_view name) {
 }
 
 bool isWholeVersion(std::string_view prefix) {
-    return std::count(prefix.begin(), prefix.end(), '.') + 1 == kWholeVersion;
+    return static_cast<std::size_t>(std::count(prefix.begin(), prefix.end(), '.')) + 1 == kWholeVersion;
 }
 
 std::vector<std::string> listAliases(IRegistryStore& registry, KeyHandle key) {
@@ -91,39 +119,62 @@ Status InstallCopiesProfile::generateInstallCopiesList() {
 
 Status InstallCopiesProfile::generateProfileInfo() {
     profileInfo_.clear();
-    HighestVersions highest(copiesByVersion_);
-    std::string_view lesser;
-    for (const auto& copy : copiesByVersion_) {
-        const std::string_view text = copy.first;
-        const std::size_t shared = commonLength(text, lesser);
-        std::ptrdiff_t component = 0;
-        for (std::size_t end = 0; end <= text.size(); ++end) {
-            end = std::min(text.find('.', end), text.size());
-            ++component;
-            if (end < shared) {
-                continue;  // the text before has this prefix too, and it answers alike
-            }
-            const std::string_view prefix = text.substr(0, end);
-            const bool exact = component == kWholeVersion;
-            profileInfo_.insert_or_assign(
-                profileInfo_.end(), std::string(prefix),
-                nameFor(prefix,
-                        exact && end == text.size() ? highest.leadingByWhole(copy) : highest.leadingBy(prefix, exact)));
+    std::pmr::monotonic_buffer_resource room;
+    AliasesIgnoringCase answered(&room);  // those with letters, in the spelling that was answered first
+    answered.reserve(copiesByVersion_.size());
+    std::vector<AliasMap::iterator> unanswered;  // that a copy spelled in other letters may answer
+    std::vector<AliasMap::iterator> open;        // the prefixes of one text
+    std::string_view greater;
+    // From the greatest text down: the first copy that answers to a prefix is the highest.
+    for (auto version = copiesByVersion_.rbegin(); version != copiesByVersion_.rend(); ++version) {
+        const std::string_view text = version->first;
+        const auto letter = static_cast<std::size_t>(std::find_if(text.begin(), text.end(), isLetter) - text.begin());
+        // What lies behind a prefix and a dot lies together: the greater text has answered to what both have.
+        const std::size_t shared = commonLength(text, greater);
+        while (!open.empty() && open.back()->first.size() >= shared) {
+            open.pop_back();
         }
-        lesser = text;
+        for (std::size_t end = open.empty() ? 0 : open.back()->first.size() + 1; end <= text.size(); ++end) {
+            end = std::min(text.find('.', end), text.size());
+            const auto place = open.empty() ? profileInfo_.begin() : std::next(open.back());
+            const auto alias = profileInfo_.try_emplace(place, std::string(text.substr(0, end)));
+            open.push_back(alias);
+            const bool hasLetter = end > letter;
+            // Deliberate: the fourth prefix is answered by exactly that version, so that one of five components gets
+            // two empty aliases; what finds nothing is written all the same.
+            if ((open.size() == kWholeVersion) == (end == text.size())) {
+                const Alias* first = hasLetter ? *answered.insert(&*alias).first : &*alias;
+                alias->second = first == &*alias ? version->second.getName() : first->second;
+            } else if (hasLetter) {
+                unanswered.push_back(alias);
+            }
+        }
+        greater = text;
     }
+    for (const auto& alias : unanswered) {
+        if (const auto first = answered.find(&*alias); first != answered.end()) {
+            alias->second = (*first)->second;
+        }
+    }
+    tellProfile();
     return kSuccess;
 }
 
-std::string InstallCopiesProfile::nameFor(std::string_view prefix, const InstallCopyInfo* highest) {
-    if (highest == nullptr) {
-        values_.tell("The highest version leading by '%s': ( none )", {prefix});
-        values_.tell("Did not find corrsponding install name for '%s'", {prefix});
-        return {};
+void InstallCopiesProfile::tellProfile() {
+    if (!values_.isHeard()) {
+        return;
     }
-    // Deliberate: the quotation mark is never closed; whoever searches traces knows the text so.
-    values_.tell("The highest version leading by '%s:%s--%s", {prefix, highest->getVersion(), highest->getName()});
-    return highest->getName();
+    for (const auto& [prefix, name] : profileInfo_) {
+        if (name.empty()) {
+            values_.tell("The highest version leading by '%s': ( none )", {prefix});
+            values_.tell("Did not find corrsponding install name for '%s'", {prefix});
+        } else {
+            // Deliberate: the quotation mark is never closed (and "corrsponding" stays); whoever searches traces knows
+            // the texts so.
+            values_.tell("The highest version leading by '%s:%s--%s",
+                         {prefix, copiesByName_.at(name).getVersion(), name});
+        }
+    }
 }
 
 Status InstallCopiesProfile::deleteOldProfile() {

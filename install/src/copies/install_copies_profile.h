@@ -3,6 +3,7 @@
 // rewrite computes them from the copies that are installed now and replaces the old ones in both views.
 #pragma once
 
+#include <cstdint>
 #include <map>
 #include <string>
 #include <string_view>
@@ -19,6 +20,9 @@ bool isAliasName(std::string_view name);
 
 // Whether a prefix stands for one whole version, so that only a copy of exactly that version answers to it.
 bool isWholeVersion(std::string_view prefix);
+
+// A walk over aliases takes value names of fewer bytes.
+inline constexpr std::uint32_t kAliasNameRoom = 100;
 
 // Names of the aliases that an open key holds, in its order. Deliberate: the walk ends at the first value name
 // that has 100 bytes or more; aliases listed behind it are left alone.
@@ -54,7 +58,7 @@ private:
     Status backup(std::string_view path, AliasMap& profile);
     Status deleteAliases(std::string_view path, bool& allDeleted);
     Status writeProfile();
-    std::string nameFor(std::string_view prefix, const InstallCopyInfo* highest);
+    void tellProfile();
 
     RegistryValues values_;
     CopiesByName copiesByName_;

@@ -22,6 +22,7 @@ std::string RegistryValues::query(std::string_view path, std::string_view name, 
     if (!succeeded(open(path, readAccess_, key))) {
         return {};
     }
+    // Deliberate: what does not fit reads as empty, in a backup of an alias too; nothing longer is an alias of ours.
     FixedBuffer<kValueRoom> data;
     if (!succeeded(queryText(registry_, key.get(), name, data))) {
         tell(complaint, {path, name});

@@ -30,9 +30,11 @@ public:
     Status setValue(std::string_view path, std::string_view name, std::string_view data);
     Status deleteValue(std::string_view path, std::string_view name);
 
+    bool isHeard() { return debug_.isHeard(); }
+
     // Composes a message for the debugger output, if anybody sees it.
     void tell(std::string_view pattern, std::initializer_list<Insert> inserts = {}) {
-        if (debug_.isHeard()) {
+        if (isHeard()) {
             debug_.write(compose(pattern, inserts));
         }
     }
