@@ -3,17 +3,16 @@
 // embedded store beside a bare SQLite program that reads and writes the same rows of the same file.
 #include <benchmark/benchmark.h>
 #include <sqlite3.h>
-#include <stdlib.h>
 
 #include <algorithm>
 #include <array>
-#include <filesystem>
 #include <map>
 #include <memory>
 #include <stdexcept>
 #include <string>
 #include <utility>
 
+#include "bench/scratch.h"
 #include "install/platform/embedded/debug_output.h"
 #include "install/platform/embedded/registry.h"
 #include "install/platform/standard_console.h"
@@ -75,9 +74,6 @@ using Shape = Version (*)(std::int64_t copy);
 class StoreWithCopies {
 public:
     StoreWithCopies(std::int64_t copies, Shape shape) {
-        std::string name = (std::filesystem::temp_directory_path() / "kz7-bench-XXXXXX").string();
-        require(mkdtemp(name.data()) != nullptr, "no temporary directory");
-        directory_ = name;
         const auto registry = open();
         for (std::int64_t copy = 0; copy < copies; ++copy) {
             addCopy(*registry, copy, shape(copy));
@@ -87,14 +83,11 @@ public:
         require(InstallCopiesProfile(*registry, debug_.output).run() == kSuccess && registry->commit() == kSuccess,
                 "the store cannot be laid out");
     }
-    StoreWithCopies(const StoreWithCopies&) = delete;
-    StoreWithCopies& operator=(const StoreWithCopies&) = delete;
-    ~StoreWithCopies() { std::filesystem::remove_all(directory_); }
 
     std::unique_ptr<EmbeddedRegistry> open() const {
-        return std::make_unique<EmbeddedRegistry>(directory_, false, [](const StoreFault&) {});
+        return std::make_unique<EmbeddedRegistry>(scratch_.path(), false, [](const StoreFault&) {});
     }
-    std::string file() const { return directory_ + "/registry.db"; }
+    std::string file() const { return scratch_.file("registry.db"); }
 
 private:
     static void addCopy(IRegistryStore& registry, std::int64_t copy, const Version& version) {
@@ -108,7 +101,7 @@ private:
         }
     }
 
-    std::string directory_;
+    Scratch scratch_;
     Debug debug_;
 };
 

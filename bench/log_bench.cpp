@@ -7,10 +7,10 @@
 #include <spdlog/sinks/stdout_sinks.h>
 #include <unistd.h>
 
-#include <cstdlib>
-#include <filesystem>
+#include <algorithm>
 #include <string>
 
+#include "bench/scratch.h"
 #include "install/platform/platform.h"
 #include "install/runtime/observers/log_observer.h"
 #include "install/runtime/observers/machine_stream.h"
@@ -19,32 +19,12 @@
 namespace kz7 {
 namespace {
 
-class Scratch {
-public:
-    Scratch() {
-        std::string pattern = std::filesystem::temp_directory_path() / "kz7bench.XXXXXX";
-        if (mkdtemp(pattern.data()) == nullptr) {
-            std::abort();
-        }
-        path_ = pattern;
-    }
-    ~Scratch() { std::filesystem::remove_all(path_); }
-    Scratch(const Scratch&) = delete;
-    Scratch& operator=(const Scratch&) = delete;
-
-    std::string file(const std::string& name) const { return path_ + '/' + name; }
-
-    std::string productPath(const std::string& name) const {
-        std::string path = file(name);
-        for (char& c : path) {
-            c = c == '/' ? '\\' : c;
-        }
-        return path;
-    }
-
-private:
-    std::string path_;
-};
+// The product's spelling of a file in the folder.
+std::string productPath(const Scratch& scratch, const std::string& name) {
+    std::string path = scratch.file(name);
+    std::replace(path.begin(), path.end(), '/', '\\');
+    return path;
+}
 
 class OutputToFile {
 public:
@@ -76,7 +56,7 @@ public:
           engine({platform_->files(), platform_->processes(), platform_->threads(), platform_->console(),
                   platform_->lines(), platform_->terminal(), platform_->clock(), platform_->identity()}),
           log(*URELogObserver::getInstance(engine)) {
-        log.setLogFile(scratch.productPath("kz7msi.log"));
+        log.setLogFile(productPath(scratch, "kz7msi.log"));
         engine.registerObserver(log, Takes::everything);
     }
     ~Run() { URELogObserver::release(); }

@@ -3,10 +3,10 @@
 #include <benchmark/benchmark.h>
 
 #include <cstdlib>
-#include <filesystem>
 #include <string>
 #include <vector>
 
+#include "bench/scratch.h"
 #include "install/platform/embedded/debug_output.h"
 #include "install/platform/embedded/file_system.h"
 #include "install/platform/embedded/registry.h"
@@ -20,25 +20,6 @@
 
 namespace kz7 {
 namespace {
-
-class Scratch {
-public:
-    Scratch() {
-        std::string pattern = std::filesystem::temp_directory_path() / "kz7bench.XXXXXX";
-        if (mkdtemp(pattern.data()) == nullptr) {
-            std::abort();
-        }
-        path_ = pattern;
-    }
-    ~Scratch() { std::filesystem::remove_all(path_); }
-    Scratch(const Scratch&) = delete;
-    Scratch& operator=(const Scratch&) = delete;
-
-    const std::string& path() const { return path_; }
-
-private:
-    std::string path_;
-};
 
 void require(bool held) {
     if (!held) {

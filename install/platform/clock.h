@@ -1,7 +1,7 @@
 // The clock port: the local time, as text.
 #pragma once
 
-#include <string_view>
+#include <ctime>
 
 #include "install/platform/buffer.h"
 #include "install/platform/status.h"
@@ -21,5 +21,8 @@ public:
     // The time now, without a NUL. kMoreData: it does not fit with one.
     virtual Status localTime(TimeText form, Buffer& text) = 0;
 };
+
+// That time in that form, for the implementations. kMoreData as above.
+Status giveTime(const std::tm& time, TimeText form, Buffer& text);
 
 }  // namespace kz7

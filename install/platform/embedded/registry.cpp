@@ -386,12 +386,14 @@ Status EmbeddedRegistry::createKey(KeyHandle parent, std::string_view path, std:
     return status;
 }
 
+Status EmbeddedRegistry::keyForValue(KeyHandle key, AccessMask needed, std::string_view name, OpenKey*& open) {
+    const Status status = keyOf(key, needed, open);
+    return status == kSuccess ? checkValueName(name) : status;
+}
+
 Status EmbeddedRegistry::queryValue(KeyHandle key, std::string_view name, ValueType* type, Buffer& data) {
     OpenKey* open = nullptr;
-    Status status = keyOf(key, kKeyQueryValue, open);
-    if (status == kSuccess) {
-        status = checkValueName(name);
-    }
+    Status status = keyForValue(key, kKeyQueryValue, name, open);
     if (status != kSuccess) {
         return status;
     }
@@ -426,10 +428,7 @@ Status EmbeddedRegistry::nextPlace(KeyId key, std::int64_t& place) {
 
 Status EmbeddedRegistry::setValue(KeyHandle key, std::string_view name, ValueType type, std::string_view data) {
     OpenKey* open = nullptr;
-    Status status = keyOf(key, kKeySetValue, open);
-    if (status == kSuccess) {
-        status = checkValueName(name);
-    }
+    Status status = keyForValue(key, kKeySetValue, name, open);
     if (status != kSuccess) {
         return status;
     }
@@ -456,10 +455,7 @@ Status EmbeddedRegistry::setValue(KeyHandle key, std::string_view name, ValueTyp
 
 Status EmbeddedRegistry::deleteValue(KeyHandle key, std::string_view name) {
     OpenKey* open = nullptr;
-    Status status = keyOf(key, kKeySetValue, open);
-    if (status == kSuccess) {
-        status = checkValueName(name);
-    }
+    Status status = keyForValue(key, kKeySetValue, name, open);
     if (status != kSuccess) {
         return status;
     }

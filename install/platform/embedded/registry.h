@@ -116,6 +116,7 @@ private:
     KeyHandle giveOut(KeyId id, AccessMask access);
     // The key behind a handle that has the rights needed. The pointer is good until the next key is given out.
     Status keyOf(KeyHandle handle, AccessMask needed, OpenKey*& open);
+    Status keyForValue(KeyHandle key, AccessMask needed, std::string_view name, OpenKey*& open);
     Status currentUser(KeyId& id);
     Status child(KeyId parent, std::string_view fold, KeyId& id);
     Status nextPlace(KeyId key, std::int64_t& place);

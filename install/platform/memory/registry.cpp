@@ -121,20 +121,21 @@ Status MemoryRegistry::closeKey(KeyHandle key) {
     return isRoot || open_.erase(key) != 0 ? kSuccess : kInvalidHandle;
 }
 
+Status MemoryRegistry::nodeForValue(KeyHandle key, AccessMask needed, std::string_view name, NodePointer& node) {
+    const Status status = nodeOf(key, needed, node);
+    return status == kSuccess ? checkValueName(name) : status;
+}
+
 Status MemoryRegistry::queryValue(KeyHandle key, std::string_view name, ValueType* type, Buffer& data) {
     NodePointer node;
-    Status status = nodeOf(key, kKeyQueryValue, node);
-    if (status == kSuccess) {
-        status = checkValueName(name);
-    }
-    if (status != kSuccess) {
+    if (const Status status = nodeForValue(key, kKeyQueryValue, name, node); status != kSuccess) {
         return status;
     }
     const auto found = node->byName.find(foldUpper(name));
     if (found == node->byName.end()) {
         return kFileNotFound;
     }
-    status = giveBytes(found->second.data, data);
+    const Status status = giveBytes(found->second.data, data);
     if (status == kSuccess && type != nullptr) {
         *type = found->second.type;
     }
@@ -143,11 +144,7 @@ Status MemoryRegistry::queryValue(KeyHandle key, std::string_view name, ValueTyp
 
 Status MemoryRegistry::setValue(KeyHandle key, std::string_view name, ValueType type, std::string_view data) {
     NodePointer node;
-    Status status = nodeOf(key, kKeySetValue, node);
-    if (status == kSuccess) {
-        status = checkValueName(name);
-    }
-    if (status != kSuccess) {
+    if (const Status status = nodeForValue(key, kKeySetValue, name, node); status != kSuccess) {
         return status;
     }
     const auto [place, isNew] = node->byName.try_emplace(foldUpper(name));
@@ -164,11 +161,7 @@ Status MemoryRegistry::setValue(KeyHandle key, std::string_view name, ValueType 
 
 Status MemoryRegistry::deleteValue(KeyHandle key, std::string_view name) {
     NodePointer node;
-    Status status = nodeOf(key, kKeySetValue, node);
-    if (status == kSuccess) {
-        status = checkValueName(name);
-    }
-    if (status != kSuccess) {
+    if (const Status status = nodeForValue(key, kKeySetValue, name, node); status != kSuccess) {
         return status;
     }
     const auto found = node->byName.find(foldUpper(name));

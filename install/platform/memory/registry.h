@@ -59,6 +59,7 @@ private:
     static NodePointer child(Node& parent, std::string_view name, bool create);
     // The key behind a handle that has the rights needed.
     Status nodeOf(KeyHandle handle, AccessMask needed, NodePointer& node);
+    Status nodeForValue(KeyHandle key, AccessMask needed, std::string_view name, NodePointer& node);
     Status find(KeyHandle parent, std::string_view path, AccessMask access, NodePointer& node);
     KeyHandle giveOut(NodePointer node, AccessMask access);
 

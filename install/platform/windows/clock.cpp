@@ -10,13 +10,7 @@ Status WindowsClock::localTime(TimeText form, Buffer& text) {
     if (localtime_s(&parts, &now) != 0) {
         return kGeneralFailure;
     }
-    const std::size_t length = form == TimeText::timeOfDay ? std::strftime(text.data, text.capacity, "%H:%M:%S", &parts)
-                                                           : std::strftime(text.data, text.capacity, "%c %Z", &parts);
-    if (length == 0) {
-        return kMoreData;
-    }
-    text.size = static_cast<std::uint32_t>(length);
-    return kSuccess;
+    return giveTime(parts, form, text);
 }
 
 }  // namespace kz7
