@@ -83,7 +83,7 @@ TEST(FrontProgress, NeverGoesBackInAPhase) {
     FrontProgress progress;
     EXPECT_EQ(progress.percent(), -1) << "nothing is announced";
     progress.takeIds({"10", "11", "12", "x"});
-    progress.takeTimes({"30", "50"});
+    progress.takeTimes({"30", "50", "0"});
     progress.beginPhase();
     EXPECT_EQ(progress.percent(), 0);
     for (const std::int32_t task : {10, 10, 99}) {

@@ -202,6 +202,8 @@ TEST_F(ScriptedProcess, AFailedCallOfARunGivesItsCodeAndLeavesNothingOpen) {
         "startThread: 0 0",  // that of the first reader is not told
         "startProcess: 0 5082, not started", "exitCode: 0 5082"};
     EXPECT_EQ(outcomes, expected);
+    EXPECT_NE(sink_.lines.find("trace 67108865 ureCreateThread 30 31 \n"), std::string::npos);
+    EXPECT_EQ(ureCreateThread(threads_, sink_, nullptr, nullptr, nullptr), kNullArgument);
 }
 
 // Real programs of this machine, and what they leave in the two slots.

@@ -47,18 +47,21 @@ TEST_F(ProviderProgram, RegistersWhileItsProgramsUseTheStore) {
     EXPECT_EQ(dump.find("kz7nmpdata.txt"), std::string::npos);
 }
 
-TEST_F(ProviderProgram, ProgramsThatRefuseAreToldInTheOrderOfTheLines) {
-    const std::string tool = programPath("kz7InstallReg") + " -dotnet 'C:\\KZ7' 2>&1";
-    const ProgramResult result =
-        runProgram({"/bin/sh", "-c", tool}, {{"KZ7_STATE_DIR=" + store_.path(), "KZ7_SAMPLE_EXIT=5"}, {}});
-    EXPECT_EQ(result.exitCode, 255) << "no copies, no aliases";
-    EXPECT_EQ(result.output,
+TEST_F(ProviderProgram, ErrorsStandBetweenTheLinesThatTheyBelongTo) {
+    const auto both = [&](const std::string& arguments) {
+        return runProgram({"/bin/sh", "-c", programPath("kz7InstallReg") + arguments + " 2>&1"},
+                          {{"KZ7_STATE_DIR=" + store_.path(), "KZ7_SAMPLE_EXIT=5"}, {}});
+    };
+    const ProgramResult refused = both(" -dotnet 'C:\\KZ7'");
+    EXPECT_EQ(refused.exitCode, 255) << "no copies, no aliases";
+    EXPECT_EQ(refused.output,
               "Level Returned: 9.1.0.0\n"
               "C:\\KZ7\\bin\\kz7nmpcfg.exe -register -level 9.1.0 -kz7path C:\\KZ7" +
                   kPrefix +
                   "1677: kz7nmpcfg.exe returned an error. rc = 5\n"
                   "C:\\KZ7\\bin\\kz7nmpcfg_32.exe -register -level 9.1.0 -kz7path C:\\KZ7 -migratev8 " +
                   kPrefix + "1697: kz7nmpcfg_32.exe returned an error. rc = 5\n");
+    EXPECT_TRUE(both(" -v8 'C:\\KZ8'").output.starts_with("Creating version 8 registry\n" + kPrefix + "1466: "));
 }
 
 TEST_F(ProviderProgram, NothingIsTakenFromTheCurrentFolder) {
@@ -81,6 +84,14 @@ TEST_F(ProviderProgram, CopiesAreShownWithTheirServicesAndAliasesWithWhatIsWrong
     EXPECT_EQ(store_.run("kz7admin", {"aliases"}).exitCode, 1);
 
     store_.tool({"-addKZ7Copy", "COPY1", "C:\\KZ7"});
+    const std::string service = "SYSTEM\\CurrentControlSet\\Services\\KZ7MGMTSVC_COPY1 : ";
+    const std::string dump = store_.dump();
+    for (const char* value :
+         {"Type = 4:\\x10\\x00\\x00\\x00", "Start = 4:\\x02\\x00\\x00\\x00", "ErrorControl = 4:\\x01\\x00\\x00\\x00",
+          "ImagePath = 2:C:\\KZ7\\bin\\kz7mgmtsvc.exe\\x00", "DisplayName = 1:KZ7 Management Service (COPY1)\\x00",
+          "ObjectName = 1:LocalSystem\\x00"}) {
+        EXPECT_NE(dump.find(service + value + "\n"), std::string::npos) << dump;
+    }
     const std::string text =
         "Windows Registry Editor Version 5.00\n"
         "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies]\n\"8.2\"=\"GONE\"\n\"9.8.0\"=\"COPY1\"\n\"" +
