@@ -1,5 +1,5 @@
 // Flushed lines of the runtime against spdlog's with a flush per line: a log line with its time, an info in the
-// log, a protocol line. Standard output goes to a file meanwhile.
+// log, a protocol line, and what an info to all three observers allocates. Standard output goes to a file meanwhile.
 #include <benchmark/benchmark.h>
 #include <fcntl.h>
 #include <spdlog/logger.h>
@@ -12,9 +12,34 @@
 
 #include "bench/scratch.h"
 #include "install/platform/platform.h"
+#include "install/runtime/observers/human_stream.h"
 #include "install/runtime/observers/log_observer.h"
 #include "install/runtime/observers/machine_stream.h"
-#include "install/runtime/ure.h"
+#include "install/runtime/runtime_ports.h"
+
+namespace kz7::bench {
+
+static std::uint64_t allocations = 0;
+
+}  // namespace kz7::bench
+
+// Not inlined: gcc would take the pair for a mismatch.
+[[gnu::noinline]] void* operator new(std::size_t size) {
+    ++kz7::bench::allocations;
+    void* const memory = std::malloc(size);
+    if (memory == nullptr) {
+        throw std::bad_alloc();
+    }
+    return memory;
+}
+
+[[gnu::noinline]] void operator delete(void* memory) noexcept {
+    std::free(memory);
+}
+
+[[gnu::noinline]] void operator delete(void* memory, std::size_t) noexcept {
+    std::free(memory);
+}
 
 namespace kz7 {
 namespace {
@@ -53,8 +78,7 @@ class Run {
 public:
     explicit Run(const Scratch& scratch)
         : platform_(hostPlatform({.program = "bench", .stateDirectory = scratch.file("state")})),
-          engine({platform_->files(), platform_->processes(), platform_->threads(), platform_->console(),
-                  platform_->lines(), platform_->terminal(), platform_->clock(), platform_->identity()}),
+          engine(portsOf(*platform_)),
           log(*URELogObserver::getInstance(engine)) {
         log.setLogFile(productPath(scratch, "kz7msi.log"));
         engine.registerObserver(log, Takes::everything);
@@ -118,6 +142,27 @@ void protocolLine(benchmark::State& state) {
     UREExternalObserverMachineStream::release();
 }
 BENCHMARK(protocolLine);
+
+void infoToThreeObservers(benchmark::State& state) {
+    const Scratch scratch;
+    Run run(scratch);
+    const OutputToFile output(scratch.file("output"));
+    auto* machine = UREExternalObserverMachineStream::getInstance(run.engine);
+    auto* human = UREExternalObserverHumanStream::getInstance(run.engine);
+    run.engine.registerObserver(*machine);
+    run.engine.registerObserver(*human);
+    run.engine.error(kCodeError, "Copier::copy", 10, kNotExecuted);
+    const std::uint64_t before = bench::allocations;
+    for ([[maybe_unused]] auto each : state) {
+        run.engine.error(kCodeError, "Copier::copy", 10, kNotExecuted);
+    }
+    state.counters["allocations"] = static_cast<double>(bench::allocations - before);
+    run.engine.unregisterObserver(*human);
+    run.engine.unregisterObserver(*machine);
+    UREExternalObserverHumanStream::release();
+    UREExternalObserverMachineStream::release();
+}
+BENCHMARK(infoToThreeObservers);
 
 void spdlogStandardOutput(benchmark::State& state) {
     const Scratch scratch;
