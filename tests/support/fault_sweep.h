@@ -12,8 +12,10 @@
 #include "install/platform/faulty/fault_counter.h"
 #include "install/platform/faulty/file_system.h"
 #include "install/platform/faulty/library_loader.h"
+#include "install/platform/faulty/process_host.h"
 #include "install/platform/faulty/registry.h"
 #include "install/platform/faulty/services.h"
+#include "install/platform/faulty/threads.h"
 #include "tests/support/machine.h"
 
 namespace kz7::test {
@@ -29,6 +31,8 @@ public:
     IFileSystem& files() override { return faultyFiles_; }
     ILibraryLoader& libraries() override { return faultyLibraries_; }
     IAssemblyCache& assemblies() override { return faultyAssemblies_; }
+    IProcessHost& processes() override { return faultyProcesses_; }
+    IThreads& threads() override { return faultyThreads_; }
 
     FaultCounter faults_;
 
@@ -39,6 +43,8 @@ private:
     FaultyFileSystem faultyFiles_{files_, faults_};
     FaultyLibraryLoader faultyLibraries_{libraries_, faults_};
     FaultyAssemblyCache faultyAssemblies_{assemblies_, faults_};
+    FaultyProcessHost faultyProcesses_{processes_, faults_};
+    FaultyThreads faultyThreads_{threads_, faults_};
 };
 
 inline constexpr Status kFault = 4321;  // no platform's number, so that it is recognised wherever it goes
