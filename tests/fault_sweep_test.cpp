@@ -6,6 +6,7 @@
 #include <set>
 #include <sstream>
 
+#include "install/src/services/management_service.h"
 #include "tests/support/fault_sweep.h"
 
 namespace kz7::test {
@@ -138,6 +139,44 @@ TEST(FaultSweep, EveryFlowEndsSaysSoAndTouchesNothingElse) {
         }
     }
     EXPECT_EQ(told, kToldLines);
+}
+
+// The start of a service, which no flow reaches as long as the service is new to it.
+TEST(ServiceUnderFaults, AStartIsReportedStepByStep) {
+    std::set<std::string> outcomes;
+    sweepFaults(
+        false, [](FaultyMachine& machine) { machine.files_.add("C:\\KZ\\bin\\kz7mgmtsvc.exe"); },
+        [](FaultyMachine& machine) {
+            Report report(machine.console());
+            return registerManagementService(machine.registry(), machine.services(), report, "C:\\KZ", "NEW", true);
+        },
+        [&](FaultyMachine& machine, Status status) {
+            machine.servicesLeftOpen = 2;
+            const auto* service = machine.services_.find("KZ7MGMTSVC_NEW");
+            const bool runs = service != nullptr && service->state == ServiceState::running;
+            std::string error = machine.console_.error;
+            error.erase(0, error.empty() ? 0 : kPrefix.size());
+            outcomes.insert(machine.faults_.failed() + ": " + std::to_string(status) + (runs ? " runs " : " ") + error +
+                            machine.console_.output);
+        });
+    const std::string notStarted =
+        "The KZ7 Management service could not be started - some function not\n"
+        "yet ported to the new registry layout may not function properly\n";
+    const std::set<std::string> expected = {
+        ": 0 runs ",
+        "changeStartType: 0 runs 1541: Unable to update the start type of the service KZ7MGMTSVC_NEW - error 4321\n",
+        "closeHandle: 0 runs ",
+        "closeKey: 0 runs ",
+        "createKey: 4321 1800: Failed to create Event log registry key -error 4321\n",
+        "createService: 4321 1775: Failed to create service- error code 4321\n",
+        "openManager: 4321 1510: Failed open the SCM - error code 4321\n" + notStarted,
+        "openManager: 4321 1739: Failed open the SCM - error code 4321\n",
+        "openService: 4321 1523: Failed open the Service KZ7MGMTSVC_NEW - error code 4321\n" + notStarted,
+        "setValue: 4321 1816: Failed to set EventMessageFile -error 4321\n",
+        "setValue: 4321 1838: Failed to set TypesSupported -error 4321\n",
+        "startService: 4321 1552: Unable to start the service KZ7MGMTSVC_NEW - error 4321\n" + notStarted,
+    };
+    EXPECT_EQ(outcomes, expected);
 }
 
 // What a removal takes away when one of its calls fails once. The list is read first: a copy that could not be

@@ -130,8 +130,11 @@ TEST(DotNet, OnlyTheAliasRewriteAndTheStoreDecideTheResult) {
                   told("1602: Unable to deregister the KZ7 .NET Data Provider - 9.7.8\n"));
         EXPECT_EQ(failed == "registerProviders", told("1636: Some provider versions were not registered in the GAC "
                                                       "because you don't have the appropriate framework installed\n"));
-        EXPECT_EQ(machine.processes_.started.size(), failed == "registerProviders" || failed == "probe" ? 2U : 3U)
-            << "no step stops the next, but the cache tool is not run";
+        const bool oneFails = told("1629: ") || told("1668: ") || told("1689: ");
+        EXPECT_GE(machine.processes_.started.size(), 2U) << "no step stops the next";
+        EXPECT_TRUE(machine.processes_.started.size() == 3U || oneFails || failed == "registerProviders" ||
+                    failed == "probe")
+            << "the cache tool alone may not be run without a word";
         if (failed == "commit" || (failed != "openKey" && failed != "setValue")) {
             EXPECT_EQ(status, failed == "commit" ? kFault : kSuccess);
         }

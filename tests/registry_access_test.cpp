@@ -25,7 +25,11 @@ TEST(TreeCopyTest, EndsWithZero) {
     for (const auto& row : rows) {
         Machine machine;
         machine.set(row.key, row.name, row.data);
+        // What the path on the target's side would name if it were cut.
+        const std::string cut = ("Longer target" + row.key.substr(4)).substr(0, 1023);
+        machine.set(cut, "v", "a sibling's");
         EXPECT_EQ(TreeCopy(machine.registry_).copy(kMachine, "From", kMachine, "Longer target", true), 0) << row.why;
+        EXPECT_EQ(machine.values(cut), "v=a sibling's!") << row.why;
     }
 }
 

@@ -1,6 +1,9 @@
 // The migrations between the version-8 layout and the copies: exact lines and registries, there and back.
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <numeric>
+#include <set>
 #include <sstream>
 
 #include "install/src/version8.h"
@@ -205,6 +208,29 @@ TEST_F(Version9, WhatIsMissingIsToldAndTheRestIsDone) {
     EXPECT_TRUE(machine.has("SOFTWARE\\NVQ\\KZ7\\PROFILES\\I"));
 }
 
+// The lines that are in one dump and no longer in another, and those that came, the aliases and the migrated copy left
+// out.
+std::string lost(const std::string& before, const std::string& after, std::string& added) {
+    const auto lines = [](const std::string& text) {
+        std::multiset<std::string> all;
+        std::istringstream stream(text);
+        for (std::string line; std::getline(stream, line);) {
+            if (line.find("KZ7\\InstalledCopies :") == std::string::npos &&
+                line.find("\\kz7build") == std::string::npos) {
+                all.insert(line + "\n");
+            }
+        }
+        return all;
+    };
+    const auto minus = [](const std::multiset<std::string>& left, const std::multiset<std::string>& right) {
+        std::vector<std::string> rest;
+        std::set_difference(left.begin(), left.end(), right.begin(), right.end(), std::back_inserter(rest));
+        return std::accumulate(rest.begin(), rest.end(), std::string{});
+    };
+    added = minus(lines(after), lines(before));
+    return minus(lines(before), lines(after));
+}
+
 TEST_F(Version9, ThereAndBackAgainLosesNothing) {
     const std::string product = "SOFTWARE\\NVQ\\KZ7";
     std::string deep = product;
@@ -213,12 +239,15 @@ TEST_F(Version9, ThereAndBackAgainLosesNothing) {
     }
     machine.make(deep, "a class");
     machine.set(deep, "at the bottom", "v");
-    machine.setRaw(deep, "b%s", std::string_view("\0\xFF\0", 3), ValueType::binary);
+    for (const ValueType type : {ValueType::none, ValueType::expandSz, ValueType::binary, ValueType::dword,
+                                 ValueType::multiSz, ValueType::qword}) {
+        machine.setRaw(deep, "type " + std::to_string(static_cast<int>(type)), std::string_view("\0\xFF\0", 3), type);
+    }
     for (const char* path : {"\\InstalledCopies\\InstalledCopies", "\\PROFILES\\InstalledCopies\\x",
                              "\\$CurrentInstallationName$", "\\PROFILES\\$CurrentInstallationName$"}) {
         machine.set(product + path, "", "default");
     }
-    for (int value = 0; value < 1000; ++value) {
+    for (int value = 0; value < 10000; ++value) {
         machine.set(product + "\\Many", "v" + std::to_string(value), "x");
     }
     // Just under the limit of a path in the backup, whose key is eight characters longer.
@@ -226,21 +255,38 @@ TEST_F(Version9, ThereAndBackAgainLosesNothing) {
     while (longest.size() + 201 <= 1023 - 8) {
         longest += "\\" + std::string(200, 'l');
     }
+    longest += "\\" + std::string(1023 - 8 - longest.size() - 1, 's');
     machine.set(longest, "v", "");
     const std::string before = machine.dump(product);
 
     migrate();
-    machine.servicesLeftOpen = 1;
+    machine.servicesLeftOpen = 2;
     EXPECT_EQ(machine.run({"-v8", "C:\\KZ8"}), kSuccess);
-
-    // What was in the copies key stayed there all the time; the rest came back out of the backup. The
-    // defaults and the migrated copy were added.
-    const std::string after = machine.dump(product);
-    std::istringstream lines(before);
-    for (std::string line; std::getline(lines, line);) {
-        EXPECT_NE(after.find(line + "\n"), std::string::npos) << line;
-    }
     EXPECT_FALSE(machine.has(product + "BackupV8"));
+    // What was in the copies key stayed there all the time; the rest came back out of the backup. The migrated copy
+    // stays, the defaults are new.
+    std::string added;
+    EXPECT_EQ(lost(before, machine.dump(product), added), "");
+    EXPECT_EQ(added,
+              "SOFTWARE\\NVQ\\KZ7 : KZ7 Path Name = 1:C:\\KZ8\\x00\n"
+              "SOFTWARE\\NVQ\\KZ7\\CurrentVersion : Modification = 1:3\\x00\n"
+              "SOFTWARE\\NVQ\\KZ7\\CurrentVersion : Release = 1:2\\x00\n"
+              "SOFTWARE\\NVQ\\KZ7\\CurrentVersion : Service Level = 1:BUILD\\x00\n"
+              "SOFTWARE\\NVQ\\KZ7\\CurrentVersion : Version = 1:8\\x00\n"
+              "SOFTWARE\\NVQ\\KZ7\\DAS_PROFILES :  = 1:\\x00\n"
+              "SOFTWARE\\NVQ\\KZ7\\GLOBAL_PROFILE : KZ7PATH = 1:C:\\KZ8\\x00\n"
+              "SOFTWARE\\NVQ\\KZ7\\PROFILES :  = 1:\\x00\n"
+              "[SOFTWARE\\NVQ\\KZ7\\CurrentVersion] \n"
+              "[SOFTWARE\\NVQ\\KZ7\\DAS_PROFILES] \n"
+              "[SOFTWARE\\NVQ\\KZ7\\GLOBAL_PROFILE] \n");
+
+    // One more character, and the backup cannot be made: nothing is migrated. Cut, the path would name the sibling.
+    machine.set(longest + "s", "v", "over the limit");
+    const std::string over = machine.dump(product);
+    EXPECT_EQ(machine.run({"-v9", "C:\\KZ9"}), kSuccess);
+    EXPECT_NE(machine.console_.error.find(":421: "), std::string::npos);
+    EXPECT_EQ(machine.run({"-v8", "C:\\KZ8"}), kSuccess);
+    EXPECT_EQ(lost(over, machine.dump(product), added) + added, "");
 }
 
 }  // namespace
