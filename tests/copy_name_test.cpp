@@ -43,6 +43,11 @@ TEST(CopyName, ResultGoesWhereTheCallerSays) {
     EXPECT_EQ(std::string(output), std::string(25, 'n')) << "cut to the size and terminated";
     EXPECT_EQ(output[26], '#') << "never past it";
 
+    const std::string longer(2000, 'l');
+    EXPECT_EQ(iSubstituteCopyName(longer.c_str(), "X", 0, nullptr), longer.c_str()) << "unchanged, it needs no room";
+    std::string room(2001, '#');
+    EXPECT_EQ(iSubstituteCopyName(longer.c_str(), nullptr, 2001, room.data()), longer.c_str());
+    EXPECT_EQ(room.c_str(), longer);
     const std::string filled = std::string(iSubstituteCopyName(text, std::string(2000, 'n').c_str(), 0, nullptr));
     EXPECT_EQ(filled.size(), kSubstitutedSize - 1);
 }

@@ -1,5 +1,6 @@
 // kz7admin commit as people run it, with the sample's command processor, alone and under the front end.
 #include <gtest/gtest.h>
+#include <sys/stat.h>
 
 #include <filesystem>
 #include <fstream>
@@ -68,6 +69,8 @@ TEST_F(CommitProgram, SetsWhatAResponseFileSays) {
 
 TEST_F(CommitProgram, TellsWhyItCannotBegin) {
     const std::string before = store_.dump();
+    const std::string pipe = files_.path() + "/pipe";
+    ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
     // clang-format off
     const struct { const char* why; std::vector<std::string> words; std::string told; } rows[] = {
         {"no such copy",      {"--copy", "C2", "--response-file", responses(kGood)}, "C2: there is no such copy (see kz7admin copies)"},
@@ -76,6 +79,7 @@ TEST_F(CommitProgram, TellsWhyItCannotBegin) {
         {"a long instance",   {"--copy", "COPY1", "--instance", "INSTANCE9", "--response-file", responses(kGood)}, "INSTANCE9: an instance name has at most 8 characters and no separator"},
         {"another folder",    {"--copy", "COPY1", "--instance", "..", "--response-file", responses(kGood)}, "..: an instance name has at most 8 characters and no separator"},
         {"no folder for a log", {"--copy", "COPY1", "--log", "/nowhere/l", "--response-file", responses(kGood)}, "/nowhere/l: the log cannot be written: error 3"},
+        {"a pipe for a log",  {"--copy", "COPY1", "--log", pipe, "--response-file", responses(kGood)}, pipe + ": the log cannot be written: error 5"},
     };
     // clang-format on
     for (const auto& row : rows) {
@@ -95,19 +99,20 @@ TEST_F(CommitProgram, ReportsWhatTheProcessorDoes) {
     // clang-format off
     const struct { const char* why; const char* variable; const char* value; const char* log; } rows[] = {
         {"it fails",                      "KZ7_SAMPLE_EXIT", "7", "error 5030: exit code 7\nNote: The program wrote: "},
-        {"it sees what was set before it", "KZ7_SAMPLE_HOOK", "\"$KZ7_ADMIN\" tree | grep -q KZ7ACCOUNT", "parameter set: DIAGLEVEL=3"},
+        {"it sees what was set, and writes", "KZ7_SAMPLE_HOOK", "\"$KZ7_ADMIN\" tree | grep -q KZ7ACCOUNT && \"$KZ7_TOOL\" -addKZ7Copy C2 'C:\\c2' >&2", "parameter set: DIAGLEVEL=3"},
         {"it floods its output",          "KZ7_SAMPLE_HOOK", "head -c 104857600 /dev/zero | tr '\\0' x", "parameter set: DIAGLEVEL=3"},
-        {"it leaves somebody behind",     "KZ7_SAMPLE_HOOK", "(cat /proc/uptime >/dev/null &)", "parameter set: DIAGLEVEL=3"},
+        {"it leaves somebody behind",     "KZ7_SAMPLE_HOOK", "f=$KZ7_STATE_DIR/pipe; mkfifo $f; (cat $f & echo late >$f &)", "parameter set: DIAGLEVEL=3"},
         {"it reads its input",            "KZ7_SAMPLE_HOOK", "cat", "parameter set: DIAGLEVEL=3"},
     };
     // clang-format on
     for (const auto& row : rows) {
         const std::string file = files_.path() + "/log";
         fs::remove(file);
-        const ProgramResult result = commit(
-            kGood, {"--instance", "INST", "--log", file},
-            {.environment = {std::string(row.variable) + "=" + row.value, "KZ7_ADMIN=" + programPath("kz7admin")},
-             .inChild = {}});
+        const ProgramResult result =
+            commit(kGood, {"--instance", "INST", "--log", file},
+                   {.environment = {std::string(row.variable) + "=" + row.value, "KZ7_ADMIN=" + programPath("kz7admin"),
+                                    "KZ7_TOOL=" + programPath("kz7InstallReg")},
+                    .inChild = {}});
         const std::string text = log(file);
         EXPECT_NE(text.find(row.log), std::string::npos) << row.why << "\n" << text;
         EXPECT_EQ(result.exitCode, text.find("error 5057") != std::string::npos ? 1 : 0) << row.why;

@@ -253,6 +253,7 @@ TEST(HumanStream, BreaksLinesWhereTheyFit) {
         {"a long word",              "abcdefgh",       3, "abc|def|gh|"},
         {"line feeds",               "a\n\nb",         5, "a||b|"},
         {"no width",                 "abc def",        0, "abc def|"},
+        {"wider than the terminal",  "a\xE2\x82\xACx",  1, "a|\xE2\x82\xAC|x|"},
         {"characters, not bytes",    "\xC3\xA4\xC3\xB6\xC3\xBC x", 3, "\xC3\xA4\xC3\xB6\xC3\xBC|x|"},
     };
     // clang-format on

@@ -29,7 +29,8 @@ public:
     virtual Status readFile(std::string_view path, std::string& content) = 0;
 
     // Opens a file for writing at its end, making one that is missing for its owner and readers. The caller
-    // closes it. kPathNotFound: its folder is missing; kAccessDenied: also a link where the file should be.
+    // closes it. kPathNotFound: its folder is missing; kAccessDenied: also a link, or
+    // what is no file, where the file should be.
     virtual Status openForAppend(std::string_view path, FileHandle& file) = 0;
 
     // Writes at the end, at once. `written` tells the bytes that were taken, on a failure too; a success may

@@ -60,13 +60,12 @@ std::string_view takeWrappedLine(std::string_view& text, std::uint32_t columns) 
     std::size_t blank = std::string_view::npos;
     std::uint32_t shown = 0;
     while (end < text.size() && text[end] != '\n') {
-        shown += columnsOf(text[end]);
-        if (columns != 0 && shown > columns && text[end] != ' ') {
-            if (blank != std::string_view::npos || end != 0) {
-                end = std::min(blank, end);
-                break;
-            }
-            // A character wider than the terminal stands alone.
+        const std::uint32_t width = columnsOf(text[end]);
+        shown += width;
+        // A character wider than the terminal stands alone.
+        if (columns != 0 && shown > columns && width != 0 && end != 0 && text[end] != ' ') {
+            end = std::min(blank, end);
+            break;
         }
         if (text[end] == ' ') {
             blank = end;

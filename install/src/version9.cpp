@@ -67,6 +67,8 @@ void copyProfile(IRegistryStore& registry, Report& report, std::string_view prof
 
 void migrate(IRegistryStore& registry, IServiceManager& services, Report& report, const LevelQuery& level,
              std::string_view location) {
+    // Deliberate: a registry that is version 9 already is refreshed, not left alone; only what would take a backup or
+    // read one is left out.
     const bool refresh = isVersion9(registry);
     if (refresh) {
         report.line(kNoBackup);

@@ -2,6 +2,7 @@
 
 #include <dirent.h>
 #include <fcntl.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -23,6 +24,7 @@ Status statusOf(int error) {
         case EPERM:
         case EROFS:
         case EISDIR:
+        case ENXIO:
         case ELOOP:
             return kAccessDenied;
         case ENOENT:
@@ -86,10 +88,16 @@ Status EmbeddedFileSystem::openForAppend(std::string_view path, FileHandle& file
     if (host.empty()) {
         return kFileNotFound;
     }
-    // A link that somebody left in a folder open to all is not followed.
-    const int descriptor = open(host.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC | O_NOFOLLOW, kLogFileMode);
+    // A link that somebody left in a folder open to all is not followed, a pipe without a reader not waited for.
+    const int descriptor =
+        open(host.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, kLogFileMode);
     if (descriptor == -1) {
         return errno == ENOENT || errno == ENOTDIR ? kPathNotFound : statusOf(errno);
+    }
+    struct stat found {};
+    if (fstat(descriptor, &found) == -1 || !S_ISREG(found.st_mode)) {
+        close(descriptor);
+        return kAccessDenied;
     }
     file = files_.give(descriptor);
     return kSuccess;

