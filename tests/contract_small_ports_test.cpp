@@ -140,6 +140,16 @@ TEST_P(SmallPortContract, LinesAreReadToTheirEndAndCutToTheirRoom) {
     }
 }
 
+TEST_P(SmallPortContract, DebugTextsReachNoStreamUnlessAskedFor) {
+    const std::string both = backend_->written(true, [&](IConsole& console) {
+        for (const std::string& text : {std::string("100%s %n"), std::string(100000, 'x'), std::string()}) {
+            platform_.debugOutput().write(text);
+        }
+        console.writeOutput("a line");
+    });
+    EXPECT_EQ(both, "a line");
+}
+
 TEST_P(SmallPortContract, AFileIsNoTerminal) {
     TerminalView views[3];
     backend_->written(true, [&](IConsole&) {
