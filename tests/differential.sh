@@ -121,5 +121,17 @@ same 'a copy after that'                     -addKZ7Copy COPY1 'C:\KZ7\copy1'
 same 'removal of the last copy'              -removeKZ7Copy COPY1
 same 'nothing is left to remove'             -removeKZ7Copy COPY1
 
+# The sample copy, which the build makes beside the programs: its library knows a level, its programs succeed.
+for drive in "$KZ7_STATE_DIR/drive_c:$linux" "$WINEPREFIX/drive_c:$windows"; do
+    mkdir -p "${drive%%:*}/sample"
+    cp -r "${drive#*:}/../examples/copy/bin" "${drive%%:*}/sample"
+done
+same 'a version-8 registry'                  -v8 'C:\KZ8'
+same 'to version 9, with its programs'       -v9 'C:\sample'
+same 'providers of the sample'               -dotnet 'C:\sample\'
+same 'a second copy of version 9'            -addv9 'C:\sample' 'C:\sample'
+same 'to version 9 once more'                -v9 'C:\sample'
+same 'and back'                              -v8 'C:\KZ8'
+
 echo "differential: $rows commands, $failed differ"
 [ "$failed" -eq 0 ]
