@@ -77,7 +77,7 @@ Status MemoryInstallerSession::activeDatabase(SessionHandle& database) {
 }
 
 Status MemoryInstallerSession::openView(SessionHandle database, std::string_view query, SessionHandle& view) {
-    if (databases_.count(database) == 0) {
+    if (!databases_.contains(database)) {
         return kInvalidHandle;
     }
     if (query != kPropertyQuery) {
