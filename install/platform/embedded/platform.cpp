@@ -52,6 +52,8 @@ public:
           libraries_(directory_),
           assemblies_(registry_, directory_) {}
 
+    const std::string& directory() const { return directory_; }
+
     IRegistryStore& registry() override { return registry_; }
     IServiceManager& services() override { return services_; }
     IConsole& console() override { return console_; }
@@ -66,9 +68,7 @@ public:
     ITerminal& terminal() override { return terminal_; }
     IHostIdentity& identity() override { return identity_; }
     Status ownFolder(std::string& path) override {
-        std::error_code error;
-        std::filesystem::create_directories(directory_, error);
-        return error ? kPathNotFound : files_.productPath(directory_, path);
+        return makeFolder(directory_) != 0 ? kPathNotFound : files_.productPath(directory_, path);
     }
     std::string storeName() override { return registry_.path(); }
     bool storeIsOwn() override { return true; }
@@ -103,16 +103,16 @@ private:
 }  // namespace
 
 std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options) {
-    auto platform = std::make_unique<EmbeddedPlatform>(options);
     if (options.ownProcess) {
         settleInheritedState();
         // A reader that went away or a file at its limit is a status of the write, never the end of a half-done run.
         std::signal(SIGPIPE, SIG_IGN);
         std::signal(SIGXFSZ, SIG_IGN);
+    }
+    auto platform = std::make_unique<EmbeddedPlatform>(options);
+    if (options.ownProcess && !options.stateDirectory.empty()) {
         // Programs that are started work on the same store.
-        if (!options.stateDirectory.empty()) {
-            setenv("KZ7_STATE_DIR", absolute(options.stateDirectory).c_str(), 1);
-        }
+        setenv("KZ7_STATE_DIR", platform->directory().c_str(), 1);
     }
     return platform;
 }

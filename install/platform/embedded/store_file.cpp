@@ -33,31 +33,6 @@ std::string environment(const char* name) {
     return value == nullptr ? std::string{} : value;
 }
 
-// Creates the folder and its missing parents; 0 or the error of the call that failed.
-int makeFolder(const std::string& path) {
-    if (mkdir(path.c_str(), 0700) == 0) {
-        return 0;
-    }
-    if (errno == ENOENT) {
-        const std::size_t cut = path.find_last_of('/');
-        if (cut != std::string::npos && cut != 0) {
-            if (const int error = makeFolder(path.substr(0, cut)); error != 0) {
-                return error;
-            }
-            return mkdir(path.c_str(), 0700) == 0 || errno == EEXIST ? 0 : errno;
-        }
-        return ENOENT;
-    }
-    if (errno != EEXIST) {
-        return errno;
-    }
-    struct stat found {};
-    if (stat(path.c_str(), &found) != 0) {
-        return errno;
-    }
-    return S_ISDIR(found.st_mode) ? 0 : ENOTDIR;
-}
-
 // A suffix that nobody can guess.
 bool randomSuffix(std::string& suffix) {
     std::array<unsigned char, 16> noise{};
@@ -84,6 +59,30 @@ int syncFile(const std::string& path, int flags) {
 }
 
 }  // namespace
+
+int makeFolder(const std::string& path) {
+    if (mkdir(path.c_str(), 0700) == 0) {
+        return 0;
+    }
+    if (errno == ENOENT) {
+        const std::size_t cut = path.find_last_of('/');
+        if (cut != std::string::npos && cut != 0) {
+            if (const int error = makeFolder(path.substr(0, cut)); error != 0) {
+                return error;
+            }
+            return mkdir(path.c_str(), 0700) == 0 || errno == EEXIST ? 0 : errno;
+        }
+        return ENOENT;
+    }
+    if (errno != EEXIST) {
+        return errno;
+    }
+    struct stat found {};
+    if (stat(path.c_str(), &found) != 0) {
+        return errno;
+    }
+    return S_ISDIR(found.st_mode) ? 0 : ENOTDIR;
+}
 
 std::string usualStateDirectory() {
     if (std::string named = environment("KZ7_STATE_DIR"); !named.empty()) {

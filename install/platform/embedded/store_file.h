@@ -14,6 +14,9 @@ inline constexpr const char* kMachineStateDirectory = "/var/lib/kz7";
 // $KZ7_STATE_DIR; else /var/lib/kz7 for root; else $XDG_STATE_HOME/kz7 or ~/.local/state/kz7; else empty.
 std::string usualStateDirectory();
 
+// Makes a folder and its missing parents for their owner alone; 0 or the error of the call that failed.
+int makeFolder(const std::string& path);
+
 struct StoreFault {
     Status status = kSuccess;
     std::string file;    // what could not be used
