@@ -2,7 +2,6 @@
 
 #include <CLI/CLI.hpp>
 #include <algorithm>
-#include <cstring>
 
 #include "install/admin/configuration_run.h"
 #include "install/admin/copy_location.h"
@@ -31,16 +30,13 @@ bool isOneName(const std::string& name) {
 }
 
 Answer readResponses(Admin& admin, const Words& words, ConfigurationRequest& request) {
-    const std::string shown = words.responseFile == "-" ? "standard input" : shownText(words.responseFile);
-    std::string file;
-    if (const int error = readInput(words.responseFile, file); error != 0) {
-        return admin.fault(shown + ": " + std::strerror(error));
+    InputFile file(admin, words.responseFile);
+    if (const Answer answer = file.read(); answer != kAnswerYes) {
+        return answer;
     }
     ResponseFault bad;
-    if (parseResponseFile(file, request.responses, bad) != kSuccess) {
-        return admin.fault(compose("%s:%u: %s", {shown, bad.line, bad.reason}));
-    }
-    return kAnswerYes;
+    const Status status = parseResponseFile(file.bytes(), request.responses, bad);
+    return status == kSuccess ? kAnswerYes : file.badLine(bad.line, bad.reason);
 }
 
 Answer findCopy(Admin& admin, const Words& words, ConfigurationRequest& request) {

@@ -1,7 +1,6 @@
 #include "install/admin/import_command.h"
 
 #include <CLI/CLI.hpp>
-#include <cstring>
 
 #include "install/admin/input_file.h"
 #include "install/admin/reg_text.h"
@@ -14,32 +13,31 @@ Answer importFile(Admin& admin, const std::string& path) {
     if (!admin.open(false)) {
         return kAnswerFault;
     }
-    const std::string shown = path == "-" ? "standard input" : shownText(path);
-    std::string file;
-    if (const int error = readInput(path, file); error != 0) {
-        return admin.fault(shown + ": " + std::strerror(error));
+    InputFile file(admin, path);
+    if (const Answer answer = file.read(); answer != kAnswerYes) {
+        return answer;
     }
     std::vector<KeyChange> changes;
     TextFault bad;
-    if (!parseRegText(file, changes, bad)) {
-        return admin.fault(compose("%s:%u: %s", {shown, bad.line, bad.reason}));
+    if (!parseRegText(file.bytes(), changes, bad)) {
+        return file.badLine(bad.line, bad.reason);
     }
     std::uint32_t line = 0;
     Status status = applyChanges(admin.registry(), changes, line);
     if (status != kSuccess) {
-        return admin.storeFault(compose("%s:%u: this cannot be done", {shown, line}), status);
+        return admin.storeFault(compose("%s:%u: this cannot be done", {file.shown(), line}), status);
     }
     status = admin.registry().commit();
     if (status != kSuccess) {
-        return admin.storeFault(shown + ": what it asks for cannot be kept", status);
+        return admin.storeFault(file.shown() + ": what it asks for cannot be kept", status);
     }
     std::size_t values = 0;
     for (const KeyChange& change : changes) {
         values += change.values.size();
     }
-    return admin.write(compose(
-        "imported %s into %s: %u keys, %u values\n",
-        {shown, admin.storeLine(), static_cast<std::uint32_t>(changes.size()), static_cast<std::uint32_t>(values)}));
+    return admin.write(compose("imported %s into %s: %u keys, %u values\n",
+                               {file.shown(), admin.storeLine(), static_cast<std::uint32_t>(changes.size()),
+                                static_cast<std::uint32_t>(values)}));
 }
 
 }  // namespace

@@ -2,9 +2,14 @@
 
 #include <cerrno>
 #include <cstdio>
+#include <cstring>
+
+#include "install/platform/text.h"
 
 namespace kz7 {
+namespace {
 
+// 0 or the error of the call that failed.
 int readInput(const std::string& path, std::string& bytes) {
     std::FILE* file = path == "-" ? stdin : std::fopen(path.c_str(), "rb");
     if (file == nullptr) {
@@ -20,6 +25,20 @@ int readInput(const std::string& path, std::string& bytes) {
         std::fclose(file);
     }
     return error;
+}
+
+}  // namespace
+
+InputFile::InputFile(Admin& admin, const std::string& path)
+    : admin_(admin), path_(path), shown_(path == "-" ? "standard input" : shownText(path)) {}
+
+Answer InputFile::read() {
+    const int error = readInput(path_, bytes_);
+    return error == 0 ? kAnswerYes : admin_.fault(shown_ + ": " + std::strerror(error));
+}
+
+Answer InputFile::badLine(std::uint32_t line, std::string_view reason) {
+    return admin_.fault(compose("%s:%u: %s", {shown_, line, reason}));
 }
 
 }  // namespace kz7
