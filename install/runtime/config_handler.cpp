@@ -53,17 +53,18 @@ Status KZ7CfgHandler::recordParameter(std::string_view name, std::string_view va
     return record(kDatabaseManagerParameters, parameters_, name, value) ? kSuccess : kMissingItem;
 }
 
-void KZ7CfgHandler::tell(Status message, std::uint32_t code, std::initializer_list<Insert> inserts) {
-    if (code == kTraceError) {
-        ++successes_;
-        ure_.traceMessage(message, inserts);
-    } else {
-        ++failures_;
-        ure_.message(code, message, inserts);
-    }
+void KZ7CfgHandler::tellSet(Status message, std::initializer_list<Insert> inserts) {
+    ++successes_;
+    ure_.traceMessage(message, inserts);
+}
+
+void KZ7CfgHandler::tellNotSet(Status message, std::initializer_list<Insert> inserts) {
+    ++failures_;
+    ure_.message(kCodeError, message, inserts);
 }
 
 Status KZ7CfgHandler::commitProfileReg() {
+    const std::string_view instance = target_.isInstance() ? target_.instance.view() : "";
     Status last = kSuccess;
     for (std::size_t row = 0; row < kRegistryVariables.size(); ++row) {
         if (!variables_[row]) {
@@ -74,10 +75,9 @@ Status KZ7CfgHandler::commitProfileReg() {
         const Status status = setVariable(variable, value);
         if (status == kSuccess) {
             read_[row].reset();
-            tell(kVariableSet, kTraceError,
-                 {variable.name, value, target_.isInstance() ? target_.instance.view() : ""});
+            tellSet(kVariableSet, {variable.name, value, instance});
         } else {
-            tell(status, kCodeError, {variable.name, value, target_.isInstance() ? target_.instance.view() : ""});
+            tellNotSet(status, {variable.name, value, instance});
             last = status;
         }
     }
@@ -151,9 +151,9 @@ Status KZ7CfgHandler::commitDBMCfg(std::string_view instance) {
             followUp_();
         }
         if (status == kSuccess) {
-            tell(kParameterSet, kTraceError, {parameter.name, value, instance});
+            tellSet(kParameterSet, {parameter.name, value, instance});
         } else {
-            tell(kParameterNotSet, kCodeError, {parameter.name, value, instance, status});
+            tellNotSet(kParameterNotSet, {parameter.name, value, instance, status});
         }
     }
     return kSuccess;

@@ -68,7 +68,8 @@ private:
     Status setParameter(std::string_view instance, std::uint32_t identifier, std::string_view value,
                         const std::string& folder, bool& ran);
     Status runProcessor(const std::string& folder, std::string_view parameter, std::string_view value, bool& ran);
-    void tell(Status message, std::uint32_t code, std::initializer_list<Insert> inserts);
+    void tellSet(Status message, std::initializer_list<Insert> inserts);
+    void tellNotSet(Status message, std::initializer_list<Insert> inserts);
 
     URE& ure_;
     ProfileRegistry& profile_;
