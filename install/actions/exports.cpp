@@ -8,21 +8,13 @@
 #include "install/platform/platform.h"
 #include "install/runtime/copy_name.h"
 #include "install/runtime/installer_properties.h"
-#include "install/runtime/observers/log_observer.h"
+#include "install/runtime/observers/observers_end.h"
 #include "install/runtime/runtime_ports.h"
 
 namespace kz7 {
 namespace {
 
 constexpr char kResponseFile[] = "RSP_FILE_PATH";
-
-// The log is the process's; it ends before the engine that it observes.
-struct LogEnd {
-    LogEnd() = default;
-    LogEnd(const LogEnd&) = delete;
-    LogEnd& operator=(const LogEnd&) = delete;
-    ~LogEnd() { URELogObserver::release(); }
-};
 
 // One call: this machine, the installation, and an engine whose log is the installer's.
 class ActionCall {
@@ -65,7 +57,7 @@ private:
     std::unique_ptr<IPlatform> platform_;
     std::unique_ptr<IInstallerSession> session_;
     URE engine_;
-    LogEnd logEnd_;
+    ObserversEnd observersEnd_;
     Installation at_;
 };
 

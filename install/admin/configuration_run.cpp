@@ -1,9 +1,7 @@
 #include "install/admin/configuration_run.h"
 
 #include "install/runtime/config_handler.h"
-#include "install/runtime/observers/human_stream.h"
-#include "install/runtime/observers/log_observer.h"
-#include "install/runtime/observers/machine_stream.h"
+#include "install/runtime/observers/observers_end.h"
 #include "install/runtime/runtime_ports.h"
 
 namespace kz7 {
@@ -13,19 +11,6 @@ constexpr std::int32_t kVariablesTask = 1;
 constexpr std::int32_t kParametersTask = 2;
 constexpr std::string_view kTasks = "1,10;2,90";  // with the share of the time that each takes
 constexpr std::uint64_t kParametersStart = 10;
-
-// The process's observers, which end with a run.
-struct ObserversEnd {
-    ObserversEnd() = default;
-    ObserversEnd(const ObserversEnd&) = delete;
-    ObserversEnd& operator=(const ObserversEnd&) = delete;
-    ~ObserversEnd() {
-        // The last line of a front end names the log.
-        UREExternalObserverMachineStream::release();
-        UREExternalObserverHumanStream::release();
-        URELogObserver::release();
-    }
-};
 
 // The log and the stream of one run.
 class Observers {

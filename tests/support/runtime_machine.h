@@ -7,9 +7,7 @@
 
 #include "install/platform/memory/installer_session.h"
 #include "install/platform/memory/platform.h"
-#include "install/runtime/observers/human_stream.h"
-#include "install/runtime/observers/log_observer.h"
-#include "install/runtime/observers/machine_stream.h"
+#include "install/runtime/observers/observers_end.h"
 #include "install/runtime/runtime_ports.h"
 #include "install/runtime/ure.h"
 
@@ -39,9 +37,7 @@ public:
         files_.add(std::string(kFolder) + "readme");
     }
     ~RuntimeMachine() override {
-        UREExternalObserverMachineStream::release();
-        UREExternalObserverHumanStream::release();
-        URELogObserver::release();
+        ObserversEnd{};
         EXPECT_EQ(files_.openFiles() + processes_.openHandles() + session.openHandles(), 0U);
     }
     RuntimeMachine(const RuntimeMachine&) = delete;
