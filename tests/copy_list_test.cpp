@@ -3,7 +3,7 @@
 #include <cstring>
 
 #include "install/src/copies/ilist.h"
-#include "install/src/copies/install_copy_list.h"
+#include "install/src/copies/product_lists.h"
 #include "tests/support/machine.h"
 
 namespace kz7::test {
@@ -37,6 +37,22 @@ TEST(IntrusiveList, AWalkGoesOnAfterARemovalUnderItAndTheEndFreesEveryElement) {
         texts.append(strdup("a plain buffer"));
     }
     EXPECT_EQ(alive, 0);
+}
+
+TEST(ClassTree, KeyObjectsOpenOrCreateAndListsOwnTheirElements) {
+    Machine machine;
+    InstalledProdList products;
+    products.append(new InstalledProd("KZ7"));
+    IKZ7INSTANCELIST instances;
+    instances.append(new IKZ7INSTANCE("INST"));
+    EXPECT_EQ(products.first()->name() + instances.first()->name(), "KZ7INST");
+    const KZ7iCopyNameRegistry key(machine.registry_, KeyHandle::localMachine, "Copies\\$CurrentInstallationName$",
+                                   "C1");
+    EXPECT_EQ(key.status(), kSuccess);
+    EXPECT_TRUE(machine.has("Copies\\C1"));
+    const KZ7iRegistry none(machine.registry_, KeyHandle::localMachine, std::string(256, 'k'));
+    EXPECT_EQ(none.status(), kInvalidParameter);
+    EXPECT_EQ(InstallCopyListSingleton(machine.registry_, machine.debugOutput_, false, false).count(), 0U);
 }
 
 std::string names(InstallCopyList& copies) {
