@@ -116,7 +116,7 @@ TEST(AddCopy, NamesAreTakenAsTheyStand) {
 
 TEST(RemoveCopy, TakesTheNativeTreeAndTheServiceAndTheLastOneTheProduct) {
     Machine machine;
-    machine.files_.add("C:\\one\\bin\\kz7mgmtsvc.exe");
+    machine.addService("KZ7MGMTSVC_COPY1", true);
     machine.run({"-addKZ7Copy", "COPY1", "C:\\one"});
     machine.set(kCopies, "9", "COPY1");
     machine.run({"-addKZ7Copy", "COPY2", "C:\\two"});
@@ -124,12 +124,6 @@ TEST(RemoveCopy, TakesTheNativeTreeAndTheServiceAndTheLastOneTheProduct) {
     EXPECT_EQ(machine.told({"-removeKZ7Copy", "%s"}), "The KZ7 Copy %s was not found\n||5021");
     EXPECT_EQ(machine.dump(), before);
 
-    OwnedService manager(machine.services_);
-    OwnedService service(machine.services_);
-    machine.services_.openManager(kServiceManagerAllAccess, manager.receive());
-    machine.services_.openService(manager.get(), "KZ7MGMTSVC_COPY1", kServiceAllAccess, service.receive());
-    ASSERT_EQ(machine.services_.startService(service.get()), kSuccess);
-    service.reset();
     EXPECT_EQ(machine.told({"-removekz7copy", "copy1"}), "The KZ7 Copy copy1 has been removed||0");
     EXPECT_EQ(machine.dump(kCopies),
               kCopies + " : 9 = 1:COPY1\\x00\n[" + kCopies + "\\COPY2] \n" + copyDump(kCopies + "\\COPY2", "C:\\two"));

@@ -5,7 +5,7 @@
 
 #include "install/platform/text.h"
 #include "install/src/services/provider_registration.h"
-#include "tests/support/fault_sweep.h"
+#include "tests/support/machine.h"
 
 namespace kz7::test {
 namespace {
@@ -114,33 +114,6 @@ TEST(DotNet, TellsWhatFailsAndGoesOn) {
         EXPECT_EQ(machine.processes_.started.size(), row.programs) << row.why;
         EXPECT_EQ(machine.values(kCopies), kAliases) << row.why;
     }
-}
-
-TEST(DotNet, OnlyTheAliasRewriteAndTheStoreDecideTheResult) {
-    const auto prepare = [](FaultyMachine& machine) { installAt(machine, "C:\\KZ7"); };
-    const auto flow = [](FaultyMachine& machine) { return machine.run({"-dotnet", "C:\\KZ7"}); };
-    sweepFaults(false, prepare, flow, [](FaultyMachine& machine, Status status) {
-        const std::string& failed = machine.faults_.failed();
-        const auto told = [&](const std::string& line) {
-            return machine.console_.error.find(kPrefix + line) != std::string::npos;
-        };
-        EXPECT_EQ(failed == "load", told("601: "));
-        EXPECT_EQ(failed == "resolve", told("595: "));
-        EXPECT_EQ(failed == "deregisterProviders",
-                  told("1602: Unable to deregister the KZ7 .NET Data Provider - 9.7.8\n"));
-        EXPECT_EQ(failed == "registerProviders", told("1636: Some provider versions were not registered in the GAC "
-                                                      "because you don't have the appropriate framework installed\n"));
-        const bool oneFails = told("1629: ") || told("1668: ") || told("1689: ");
-        EXPECT_GE(machine.processes_.started.size(), 2U) << "no step stops the next";
-        EXPECT_TRUE(machine.processes_.started.size() == 3U || oneFails || failed == "registerProviders" ||
-                    failed == "probe")
-            << "the cache tool alone may not be run without a word";
-        if (failed == "commit" || (failed != "openKey" && failed != "setValue")) {
-            EXPECT_EQ(status, failed == "commit" ? kFault : kSuccess);
-        }
-    });
-    Machine without;
-    EXPECT_EQ(without.run({"-dotnet", "C:\\KZ7"}), kFailed) << "no copies, no aliases";
 }
 
 TEST(DotNet, TakesLocationsAsTheyStand) {

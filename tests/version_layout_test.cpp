@@ -2,7 +2,6 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <numeric>
 #include <set>
 #include <sstream>
 
@@ -25,18 +24,6 @@ const std::string kDefaultLines =
     "Creating registry key  under SOFTWARE\\NVQ\\KZ7\\DAS_PROFILES with value \n"
     "Creating registry key  under SOFTWARE\\NVQ\\KZ7\\InstalledCopies with value KZ7V8\n";
 
-void makeService(Machine& machine, bool running) {
-    machine.files_.add("C:\\svc.exe");
-    OwnedService manager(machine.services_);
-    OwnedService service(machine.services_);
-    machine.services_.openManager(kServiceManagerAllAccess, manager.receive());
-    machine.services_.createService(manager.get(), {"KZ7MGMTSVC", "KZ7 Management Service", "C:\\svc.exe"},
-                                    service.receive());
-    if (running) {
-        machine.services_.startService(service.get());
-    }
-}
-
 TEST(Version8, RestoresTheBackupAndWritesTheDefaults) {
     Machine machine;
     machine.set("SOFTWARE\\NVQ\\KZ7", "KZ7 Path Name", "C:\\now");
@@ -44,7 +31,7 @@ TEST(Version8, RestoresTheBackupAndWritesTheDefaults) {
     machine.set("SOFTWARE\\NVQ\\KZ7", "top", "now");
     machine.set("SOFTWARE\\NVQ\\KZ7BackupV8", "top", "backup");
     machine.set("SOFTWARE\\NVQ\\KZ7BackupV8\\PROFILES\\I", "", "instance");
-    makeService(machine, false);
+    machine.addService("KZ7MGMTSVC", false);
     machine.servicesLeftOpen = 2;  // by the switch-off
 
     EXPECT_EQ(machine.told({"-V8", "C:\\KZ8"}), "Creating version 8 registry\n" + kDefaultLines +
@@ -78,7 +65,7 @@ TEST(Version8, WritesTheDefaultsWhateverElseFails) {
                   "Version 8 default registry keys created successfully\n" + kPrefix +
                   "1523: Failed open the Service KZ7MGMTSVC - error code 1060\n");
     machine.set("SOFTWARE\\NVQ\\KZ7BackupV8", "too large", std::string(10001, 'x'));
-    makeService(machine, true);
+    machine.addService("KZ7MGMTSVC", true);
     machine.servicesLeftOpen = 3;
     EXPECT_EQ(machine.run({"-v8", "C:\\KZ8"}), kSuccess);
     EXPECT_TRUE(machine.console_.error.ends_with(kPrefix + "1566: Unable to stop the service KZ7MGMTSVC - error 1\n"))
@@ -208,27 +195,16 @@ TEST_F(Version9, WhatIsMissingIsToldAndTheRestIsDone) {
     EXPECT_TRUE(machine.has("SOFTWARE\\NVQ\\KZ7\\PROFILES\\I"));
 }
 
-// The lines that are in one dump and no longer in another, and those that came, the aliases and the migrated copy left
-// out.
-std::string lost(const std::string& before, const std::string& after, std::string& added) {
-    const auto lines = [](const std::string& text) {
-        std::multiset<std::string> all;
-        std::istringstream stream(text);
-        for (std::string line; std::getline(stream, line);) {
-            if (line.find("KZ7\\InstalledCopies :") == std::string::npos &&
-                line.find("\\kz7build") == std::string::npos) {
-                all.insert(line + "\n");
-            }
+// The lines of a dump, but for the aliases, which follow the copies.
+std::set<std::string> linesOf(const std::string& dump) {
+    std::set<std::string> all;
+    std::istringstream lines(dump);
+    for (std::string line; std::getline(lines, line);) {
+        if (line.find("KZ7\\InstalledCopies :") == std::string::npos) {
+            all.insert(line);
         }
-        return all;
-    };
-    const auto minus = [](const std::multiset<std::string>& left, const std::multiset<std::string>& right) {
-        std::vector<std::string> rest;
-        std::set_difference(left.begin(), left.end(), right.begin(), right.end(), std::back_inserter(rest));
-        return std::accumulate(rest.begin(), rest.end(), std::string{});
-    };
-    added = minus(lines(after), lines(before));
-    return minus(lines(before), lines(after));
+    }
+    return all;
 }
 
 TEST_F(Version9, ThereAndBackAgainLosesNothing) {
@@ -257,36 +233,24 @@ TEST_F(Version9, ThereAndBackAgainLosesNothing) {
     }
     longest += "\\" + std::string(1023 - 8 - longest.size() - 1, 's');
     machine.set(longest, "v", "");
-    const std::string before = machine.dump(product);
+    const auto before = linesOf(machine.dump(product));
 
     migrate();
     machine.servicesLeftOpen = 2;
     EXPECT_EQ(machine.run({"-v8", "C:\\KZ8"}), kSuccess);
     EXPECT_FALSE(machine.has(product + "BackupV8"));
-    // What was in the copies key stayed there all the time; the rest came back out of the backup. The migrated copy
-    // stays, the defaults are new.
-    std::string added;
-    EXPECT_EQ(lost(before, machine.dump(product), added), "");
-    EXPECT_EQ(added,
-              "SOFTWARE\\NVQ\\KZ7 : KZ7 Path Name = 1:C:\\KZ8\\x00\n"
-              "SOFTWARE\\NVQ\\KZ7\\CurrentVersion : Modification = 1:3\\x00\n"
-              "SOFTWARE\\NVQ\\KZ7\\CurrentVersion : Release = 1:2\\x00\n"
-              "SOFTWARE\\NVQ\\KZ7\\CurrentVersion : Service Level = 1:BUILD\\x00\n"
-              "SOFTWARE\\NVQ\\KZ7\\CurrentVersion : Version = 1:8\\x00\n"
-              "SOFTWARE\\NVQ\\KZ7\\DAS_PROFILES :  = 1:\\x00\n"
-              "SOFTWARE\\NVQ\\KZ7\\GLOBAL_PROFILE : KZ7PATH = 1:C:\\KZ8\\x00\n"
-              "SOFTWARE\\NVQ\\KZ7\\PROFILES :  = 1:\\x00\n"
-              "[SOFTWARE\\NVQ\\KZ7\\CurrentVersion] \n"
-              "[SOFTWARE\\NVQ\\KZ7\\DAS_PROFILES] \n"
-              "[SOFTWARE\\NVQ\\KZ7\\GLOBAL_PROFILE] \n");
+    const auto after = linesOf(machine.dump(product));
+    std::vector<std::string> lost;
+    std::set_difference(before.begin(), before.end(), after.begin(), after.end(), std::back_inserter(lost));
+    EXPECT_EQ(lost, std::vector<std::string>{}) << "all stayed in the copies key or came out of the backup";
 
     // One more character, and the backup cannot be made: nothing is migrated. Cut, the path would name the sibling.
     machine.set(longest + "s", "v", "over the limit");
-    const std::string over = machine.dump(product);
+    const auto over = linesOf(machine.dump(product));
     EXPECT_EQ(machine.run({"-v9", "C:\\KZ9"}), kSuccess);
     EXPECT_NE(machine.console_.error.find(":421: "), std::string::npos);
     EXPECT_EQ(machine.run({"-v8", "C:\\KZ8"}), kSuccess);
-    EXPECT_EQ(lost(over, machine.dump(product), added) + added, "");
+    EXPECT_EQ(linesOf(machine.dump(product)), over);
 }
 
 }  // namespace

@@ -52,6 +52,17 @@ public:
         OwnedKey key(registry_);
         registry_.createKey(KeyHandle::localMachine, path, keyClass, kKeyFull, key.receive());
     }
+    // A service of another's making.
+    void addService(const std::string& name, bool running) {
+        files_.add("C:\\svc.exe");
+        OwnedService manager(services_);
+        OwnedService service(services_);
+        services_.openManager(kServiceManagerAllAccess, manager.receive());
+        services_.createService(manager.get(), {name, "", "C:\\svc.exe"}, service.receive());
+        if (running) {
+            services_.startService(service.get());
+        }
+    }
     // Bytes as they are.
     void setRaw(const std::string& path, const std::string& name, std::string_view data,
                 ValueType type = ValueType::sz) {
