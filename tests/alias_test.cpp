@@ -2,6 +2,7 @@
 // its ways to fail.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <random>
 #include <set>
 
@@ -174,60 +175,55 @@ void staleAliases(FaultyMachine& machine) {
     machine.setRaw(kNative, "8.1", kLongData);
 }
 
-// What a rewrite of these aliases left, in words; as it stands where there are none for it.
-std::string stateOf(FaultyMachine& machine) {
-    const std::string native = machine.values(kNative);
-    const std::string wow = machine.values(kWow);
+// What a rewrite of these aliases left in a view, in words; as it stands where there are none for it.
+std::string stateOf(const std::string& values) {
     const std::string fresh = "9.7.0.0=A 9.7.0=A 9.7=A 9=A";
-    if (native == fresh && wow == fresh) {
-        return "after";
+    const std::pair<std::string, const char*> states[] = {
+        {fresh, "new"},
+        {"", "none"},
+        {"8=GONE 9=OLD", "old"},
+        {"8.1=" + kLongData + " 8=GONE 9=OLD", "old"},
+        {"8.1= 8=GONE 9=OLD", "old, data over 99 characters empty"},
+    };
+    for (const auto& [text, state] : states) {
+        if (values == text) {
+            return state;
+        }
     }
-    const std::set<std::string> lackingOne = {"9.7.0=A 9.7=A 9=A", "9.7.0.0=A 9.7=A 9=A", "9.7.0.0=A 9.7.0=A 9=A",
-                                              "9.7.0.0=A 9.7.0=A 9.7=A"};
-    if ((native == fresh && lackingOne.contains(wow)) || (wow == fresh && lackingOne.contains(native))) {
-        return "after, but for one alias of one view";
-    }
-    if (native.empty() && wow.empty()) {
-        return "no aliases";
-    }
-    if (wow == "8=GONE 9=OLD" && native == "8.1=" + kLongData + " 8=GONE 9=OLD") {
-        return "before";
-    }
-    if (wow == "8=GONE 9=OLD" && native == "8.1= 8=GONE 9=OLD") {
-        return "restored, data over 99 characters empty";
-    }
-    if (native.ends_with(fresh) && wow.ends_with(fresh)) {
-        return "after, beside old aliases that were not listed";
-    }
-    return native + " | " + wow;
+    const bool isPart = std::count(values.begin(), values.end(), '=') == 3 && values.find("OLD") == std::string::npos;
+    return isPart ? "new but for one" : values.ends_with(fresh) ? "new beside old" : values;
 }
 
 TEST(AliasRewriteUnderFaults, LeavesWhatTheStepThatFailedStatesAndNothingElse) {
     std::set<std::string> outcomes;
     const auto flow = [](FaultyMachine& machine) { return rewrite(machine); };
     const std::uint64_t calls = sweepFaults(false, staleAliases, flow, [&](FaultyMachine& machine, Status status) {
-        outcomes.insert(machine.faults_.failed() + ": " + (status == kSuccess ? "0 " : "-1 ") + stateOf(machine));
+        outcomes.insert(machine.faults_.failed() + ": " + (status == kSuccess ? "0 " : "-1 ") +
+                        stateOf(machine.values(kNative)) + " | " + stateOf(machine.values(kWow)));
     });
     EXPECT_GT(calls, 60U);
     const std::set<std::string> expected = {
-        ": 0 after",
-        "closeKey: 0 after",
+        ": 0 new | new",
+        "closeKey: 0 new | new",
         // A view that cannot be opened, before anything is deleted and while it is.
-        "openKey: -1 before",
-        "openKey: -1 restored, data over 99 characters empty",
-        "deleteValue: -1 restored, data over 99 characters empty",
-        "openKey: -1 after, but for one alias of one view",
-        "setValue: -1 after, but for one alias of one view",
+        "openKey: -1 old | old",
+        "openKey: -1 old, data over 99 characters empty | old",
+        "deleteValue: -1 old, data over 99 characters empty | old",
+        "openKey: -1 new but for one | new",
+        "openKey: -1 new | new but for one",
+        "setValue: -1 new but for one | new",
+        "setValue: -1 new | new but for one",
         // A walk that breaks off is one that has ended.
-        "enumerateValue: 0 after",
-        "enumerateValue: 0 after, beside old aliases that were not listed",
-        "enumerateKey: 0 after",
+        "enumerateValue: 0 new | new",
+        "enumerateValue: 0 new beside old | new",
+        "enumerateValue: 0 new | new beside old",
+        "enumerateKey: 0 new | new",
         // A copy that is not listed or cannot be read has no aliases; a missing fix level is 0.
-        "enumerateKey: 0 no aliases",
-        "openKey: 0 no aliases",
-        "openKey: 0 after",
-        "queryValue: 0 no aliases",
-        "queryValue: 0 after",
+        "enumerateKey: 0 none | none",
+        "openKey: 0 none | none",
+        "openKey: 0 new | new",
+        "queryValue: 0 none | none",
+        "queryValue: 0 new | new",
     };
     EXPECT_EQ(outcomes, expected);
 }
