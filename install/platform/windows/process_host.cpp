@@ -2,6 +2,7 @@
 
 #include <windows.h>
 
+#include <cstdlib>
 #include <string>
 #include <vector>
 
@@ -58,9 +59,34 @@ private:
     bool wasSet_ = false;
 };
 
-// A program with a folder in its path that hangs on the current folder or drive.
-bool hangsOnCurrentFolder(std::string_view program) {
-    return !isBareName(program) && !isAbsolutePath(program);
+// Whether the system finds the program by its bare name: beside this program, in its own folders or along the path.
+bool isFoundByName(std::string_view program) {
+    char folder[MAX_PATH] = {};
+    std::string folders;
+    GetModuleFileNameA(nullptr, folder, MAX_PATH);
+    folders.append(folder, std::string_view(folder).find_last_of('\\'));
+    for (const auto systemFolder : {GetSystemDirectoryA, GetWindowsDirectoryA}) {
+        systemFolder(folder, MAX_PATH);
+        folders.append(";").append(folder);
+    }
+    if (const char* path = std::getenv("PATH"); path != nullptr) {
+        folders.append(";").append(path);
+    }
+    return SearchPathA(folders.c_str(), std::string(program).c_str(), ".exe", 0, nullptr, nullptr) != 0;
+}
+
+// Whether the reading that the system would settle for hangs on the current folder or drive. It takes the first of
+// which there is a file; behind a bare name that is not found, "a b\c.exe" may be one.
+bool hangsOnCurrentFolder(const std::vector<CommandReading>& readings) {
+    for (const CommandReading& reading : readings) {
+        if (!isBareName(reading.program)) {
+            return !isAbsolutePath(reading.program);
+        }
+        if (isFoundByName(reading.program)) {
+            return false;
+        }
+    }
+    return false;
 }
 
 }  // namespace
@@ -120,7 +146,7 @@ Status WindowsProcessHost::closeStream(StreamHandle stream) {
 
 Status WindowsProcessHost::startProcess(const ProcessStart& start, ProcessInformation& started) {
     const std::vector<CommandReading> readings = commandReadings(start.commandLine);
-    if (readings.empty() || hangsOnCurrentFolder(readings.front().program)) {
+    if (readings.empty() || hangsOnCurrentFolder(readings)) {
         return kFileNotFound;
     }
     STARTUPINFOA startup{};
