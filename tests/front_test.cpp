@@ -7,7 +7,7 @@
 
 #include "install/admin/front.h"
 #include "install/platform/command_line.h"
-#include "install/platform/memory/platform.h"
+#include "tests/support/machine.h"
 
 namespace kz7::test {
 namespace {
@@ -36,25 +36,19 @@ TEST(ProtocolReader, TakesAnyLine) {
         {"MESSAGE INFO INSTALLSTART",                               "installStart|"},
         {"MESSAGE INFO INSTALLSTARTED",                             "other|MESSAGE INFO INSTALLSTARTED"},
         {"MESSAGE INFO INSTALLEND :: \\var\\a :: b.log",            "installEnd|\\var\\a :: b.log"},
-        {"MESSAGE INFO UNDOSTART",                                  "undoStart|"},
-        {"MESSAGE INFO UNDOEND",                                    "undoEnd|"},
         {"PROGRESS TASK START :: INSTALLATION :: 40 :: 10 :: a :: b", "taskStart i 40 10|a :: b"},
         {"PROGRESS TASK START :: CONFIGURATION :: 4294967295 :: -1 :: ", "taskStart c 4294967295 -1|"},
         {"PROGRESS TASK END :: CONFIGURATION :: 10 :: x",           "taskEnd c 0 10|x"},
         {"PROGRESS TASK START :: INSTALLATION :: 40",               "other|PROGRESS TASK START :: INSTALLATION :: 40"},
         {"PROGRESS TASK START :: INSTALLATION :: 4294967296 :: 1 :: x", "other|PROGRESS TASK START :: INSTALLATION :: 4294967296 :: 1 :: x"},
-        {"PROGRESS TASK END :: ELSEWHERE :: 10 :: x",               "other|PROGRESS TASK END :: ELSEWHERE :: 10 :: x"},
-        {"PROGRESS INFO TASKCOUNT :: 2",                            "taskCount|"},
         {"PROGRESS INFO TASKCOUNT :: two",                          "other|PROGRESS INFO TASKCOUNT :: two"},
         {"PROGRESS INFO TASKIDS :: 10 :: 11",                       "taskIds <10> <11>|"},
         {"PROGRESS INFO TASKTIMES ::  :: 45",                       "taskTimes <> <45>|"},
-        {"MESSAGE ERROR GENERAL :: a :: b",                         "error|a :: b"},
-        {"MESSAGE ERROR LATER :: of a newer program",               "error|of a newer program"},
+        {"MESSAGE ERROR LATER :: of a newer :: program",            "error|of a newer :: program"},
         {"MESSAGE QUERY CDPATH :: Where :: is it? :: D:\\",         "query <D:\\>|Where :: is it?"},
         {"MESSAGE QUERY CDPATH :: Where? :: ",                      "query <>|Where?"},
         {"MESSAGE QUERY CDPATH :: Where?",                          "query <>|Where?"},
         {"MESSAGE QUERY OTHER :: Where? :: x",                      "other|MESSAGE QUERY OTHER :: Where? :: x"},
-        {"some words",                                              "other|some words"},
         {"",                                                        "nothing|"},
     };
     // clang-format on
@@ -81,25 +75,29 @@ TEST(LineCutter, CutsPiecesIntoLines) {
 
 TEST(FrontProgress, NeverGoesBackInAPhase) {
     FrontProgress progress;
-    EXPECT_EQ(progress.percent(), -1) << "nothing is announced";
+    std::string percents;
+    const auto look = [&] { percents += std::to_string(progress.percent()) + ' '; };
+    look();
     progress.takeIds({"10", "11", "12", "x"});
     progress.takeTimes({"30", "50", "0"});
     progress.beginPhase();
-    EXPECT_EQ(progress.percent(), 0);
+    look();
     for (const std::int32_t task : {10, 10, 99}) {
         progress.endTask(task);
-        EXPECT_EQ(progress.percent(), 36) << "30 of 30 + 50 + 1 + 1; once, and announced tasks only";
+        look();
     }
     progress.takeIds({"10", "11", "12", "13", "14"});
-    EXPECT_EQ(progress.percent(), 36) << "more to do";
+    look();
     progress.endTask(11);
-    EXPECT_EQ(progress.percent(), 40);
+    look();
     progress.beginPhase();
     progress.endTask(13);
-    EXPECT_EQ(progress.percent(), 33) << "of the three that are left";
+    look();
     progress.completePhase();
     progress.takeTimes({"999999999999999999999", "-5", "4000000000"});
-    EXPECT_EQ(progress.percent(), 100);
+    look();
+    // Nothing is announced; 30 of 30 + 50 + 1 + 1, once, for announced tasks only; more to do; one of three is left.
+    EXPECT_EQ(percents, "-1 0 36 36 36 36 40 33 100 ");
 }
 
 TEST(FrontScreen, BarsFitTheirColumns) {
@@ -110,8 +108,6 @@ TEST(FrontScreen, BarsFitTheirColumns) {
         {{"Installing", 30, "Copying files"}, 40,  "Installing   [###.......]  30% Copying f"},
         {{"Installing", 30, "Copying files"}, 31,  "Installing   [###.......]  30% "},
         {{"Installing", 30, "Copying files"}, 30,  "Installing 30%: Copying files"},
-        {{"Installing", 30, "Copying files"}, 12,  "Installing 3"},
-        {{"Undoing", -1, "taken back"},       40,  "Undoing      taken back"},
         {{"Undoing", -1, "taken back"},       1,   "U"},
         {{"Installing", 0, "\xE6\x97\xA5\xE6\x9C\xAC\xC3\xA4"}, 36, "Installing   [..........]   0% \xE6\x97\xA5\xE6\x9C\xAC\xC3\xA4"},
         {{"Installing", 0, "\xE6\x97\xA5\xE6\x9C\xAC\xC3\xA4"}, 34, "Installing   [..........]   0% \xE6\x97\xA5"},
@@ -123,30 +119,28 @@ TEST(FrontScreen, BarsFitTheirColumns) {
 }
 
 TEST(CommandLine, JoinsWhatItSplits) {
-    const std::vector<std::string> words = {"C:\\a b\\p.exe", "",     "a b",          "\"",   "\\",
-                                            "a\\\\",          "\\\"", "x\\\"y\\\\\"", "'$*?", "\t"};
+    const std::vector<std::string> words = {"C:\\a b\\p.exe", "", "a b", "\\", "a\\\\", "x\\\"y\\\\\"", "'$*?", "\t"};
     const std::string line = joinArguments(words);
     const CommandReading reading = commandReadings(line).at(0);
     EXPECT_EQ(reading.program, words[0]);
     EXPECT_EQ(splitArguments(reading.arguments), std::vector<std::string>(words.begin() + 1, words.end()));
 }
 
-constexpr const char* kProgramLines =
-    "MESSAGE INFO INSTALLSTART\n"
-    "PROGRESS INFO TASKCOUNT :: 2\nPROGRESS INFO TASKIDS :: 1 :: 2\nPROGRESS INFO TASKTIMES :: 3 :: 1\n"
-    "PROGRESS TASK START :: INSTALLATION :: 0 :: 1 :: Files\n"
-    "MESSAGE QUERY CDPATH :: Where? :: D:\\\n\n"
-    "PROGRESS TASK END :: INSTALLATION :: 1 :: Files\n"
-    "garbage \x1b[2J\n"
-    "MESSAGE ERROR GENERAL :: it failed\n"
-    "MESSAGE INFO UNDOSTART\nMESSAGE INFO UNDOEND\n"
-    "MESSAGE INFO INSTALLEND :: C:\\x.log\n"
-    "half";
-
 TEST(Front, DrawsOneBarForEachPhaseOnATerminal) {
-    MemoryPlatform machine;
+    Machine machine;
     machine.terminal_.view = {.terminal = true, .redraws = true, .colours = true, .columns = 40};
-    machine.processes_.addProgram("setup.exe", {.output = kProgramLines});
+    machine.processes_.addProgram(
+        "setup.exe",
+        {.output = "MESSAGE INFO INSTALLSTART\n"
+                   "PROGRESS INFO TASKCOUNT :: 2\nPROGRESS INFO TASKIDS :: 1 :: 2\nPROGRESS INFO TASKTIMES :: 3 :: 1\n"
+                   "PROGRESS TASK START :: INSTALLATION :: 0 :: 1 :: Files\n"
+                   "MESSAGE QUERY CDPATH :: Where? :: D:\\\n\n"
+                   "PROGRESS TASK END :: INSTALLATION :: 1 :: Files\n"
+                   "garbage \x1b[2J\n"
+                   "MESSAGE ERROR GENERAL :: it failed\n"
+                   "MESSAGE INFO UNDOSTART\nMESSAGE INFO UNDOEND\n"
+                   "MESSAGE INFO INSTALLEND :: C:\\x.log\n"
+                   "half"});
     std::uint32_t exitCode = 4711;
     EXPECT_EQ(runFront({machine.processes_, machine.threads_, machine.files_, machine.lines_, machine.terminal_,
                         machine.console_},
@@ -154,7 +148,6 @@ TEST(Front, DrawsOneBarForEachPhaseOnATerminal) {
               kSuccess);
     EXPECT_EQ(exitCode, 0U);
     EXPECT_EQ(machine.processes_.started, std::vector<std::string>{"\"setup.exe\" \"a b\""});
-    EXPECT_EQ(machine.processes_.openHandles() + machine.threads_.openHandles(), 0U);
     EXPECT_FALSE(machine.terminal_.leavesInterrupts);
     const std::string wipe = "\r\x1b[K";
     const std::string bar = wipe + "Installing   [#######...]  75% Files, d";

@@ -42,6 +42,7 @@ protected:
 
     StateDirectory store_;
     TemporaryDirectory files_;
+    const std::string told_ = "MESSAGE INFO INSTALLEND :: " + logPath() + "\n";  // in the end
 };
 
 // The log of a run that was not aborted, from its tasks on.
@@ -53,12 +54,10 @@ constexpr const char* kLoggedRun =
 TEST_F(RuntimeProgram, FinishesItsWorkWhateverTheFrontEndDoes) {
     // clang-format off
     const struct { const char* why; std::string input; bool aborted; } rows[] = {
-        {"an answer",         "RESPONSE :: x\n",                       false},
         {"nothing",           "",                                      false},
         {"1 MiB on a line",   std::string(1 << 20, 'A') + "\nABORT\n", false},
         {"NUL bytes",         std::string("\0\0ABORT\0\n", 9),         false},
         {"no line end",       "ABORT",                                 true},
-        {"CR LF",             "ABORT\r\n",                             true},
     };
     // clang-format on
     for (const auto& row : rows) {
@@ -66,16 +65,15 @@ TEST_F(RuntimeProgram, FinishesItsWorkWhateverTheFrontEndDoes) {
         const ProgramResult result = install(withInput(row.input));
         EXPECT_EQ(result.exitCode, row.aborted ? 1 : 0) << row.why;
         EXPECT_EQ(result.error, "") << row.why;
-        EXPECT_TRUE(result.output.starts_with("MESSAGE INFO INSTALLSTART\n")) << row.why;
-        EXPECT_TRUE(result.output.ends_with("MESSAGE INFO INSTALLEND :: " + logPath() + "\n")) << row.why;
-        EXPECT_EQ(result.output.find("MESSAGE INFO UNDOEND\n") != std::string::npos, row.aborted) << row.why;
+        EXPECT_TRUE(result.output.ends_with(
+            (row.aborted ? "\nMESSAGE INFO UNDOEND\n" : ":: 20 :: Creating the instance\n") + told_))
+            << row.why << result.output;
         EXPECT_EQ(log().find(kLoggedRun) != std::string::npos, !row.aborted) << row.why;
     }
 }
 
 TEST_F(RuntimeProgram, KeepsItsLogWithoutAReaderAndItsReaderWithoutALog) {
-    ProgramOptions closed;
-    closed.inChild = [] {
+    const auto closed = [] {
         int ends[2];
         if (pipe(ends) == 0) {
             dup2(ends[1], 1);
@@ -83,28 +81,26 @@ TEST_F(RuntimeProgram, KeepsItsLogWithoutAReaderAndItsReaderWithoutALog) {
             close(ends[1]);
         }
     };
-    EXPECT_EQ(install(closed).exitCode, 0);
+    EXPECT_EQ(install({.environment = {}, .inChild = closed}).exitCode, 0);
     EXPECT_NE(log().find(kLoggedRun), std::string::npos);
 
     // More than the lines on standard output, which meet the same limit.
     const std::string before = log() + std::string(10'000, 'x') + '\n';
     overwrite(path("setup.log"), before);
-    ProgramOptions limited = withInput("");
-    limited.inChild = [input = limited.inChild, size = before.size() + 50] {
-        input();
+    const auto limited = [size = before.size() + 50] {
         const rlimit room{size, size};
         setrlimit(RLIMIT_FSIZE, &room);
     };
-    const ProgramResult full = install(limited);
+    const ProgramResult full = install({.environment = {}, .inChild = limited});
     EXPECT_EQ(full.exitCode, 0);
-    EXPECT_TRUE(full.output.ends_with("MESSAGE INFO INSTALLEND :: " + logPath() + "\n"));
+    EXPECT_TRUE(full.output.ends_with(told_));
     EXPECT_TRUE(log().starts_with(before)) << "the log of the earlier run stays";
 
     // A log behind a link is not written: somebody else may have laid it.
     std::filesystem::remove(path("setup.log"));
     overwrite(path("precious"), "precious");
     std::filesystem::create_symlink(path("precious"), path("setup.log"));
-    EXPECT_EQ(install(withInput("")).exitCode, 0);
+    EXPECT_EQ(install({}).exitCode, 0);
     EXPECT_EQ(log(), "precious");
 }
 
@@ -135,16 +131,20 @@ TEST_F(RuntimeProgram, FrontShowsARunAndAnswersIt) {
 }
 
 TEST_F(RuntimeProgram, FrontTakesWhateverAProgramDoes) {
+    std::string bars;
+    std::string complaints;
+    for (int i = 0; i < 3000; ++i) {
+        bars += "Installing: x\n";
+        complaints += "y\n";
+    }
     // clang-format off
     const struct { const char* why; std::string lines; int exitCode; std::string output; std::string error; } rows[] = {
         {"garbage and half a line", R"(printf 'a\001b\n\n\377\nPROGRESS TASK\nhalf'; exit 3)", 3,
                                     "a\\x01b\n\\xff\nPROGRESS TASK\nhalf\n", ""},
         {"it dies",                 "echo x; kill -9 $$",                         137, "x\n", ""},
         {"it leaves a child that holds its output", "sleep 600 & echo $! > \"$1\"; echo x", 0, "x\nDone.\n", ""},
-        {"its own complaints",      "echo x >&2; exit 300",                       44,  "", "x\n"},
         {"it closes all and goes on", "exec <&- >&- 2>&-; sleep 0.1; exit 9",     9,   "", ""},
-        {"nothing",                 "exit 0",                                     0,   "Done.\n", ""},
-        {"it floods both streams",  "i=0; while [ $i -lt 3000 ]; do echo 'PROGRESS TASK START :: INSTALLATION :: 1 :: 1 :: x'; echo y >&2; i=$((i+1)); done; exit 1", 1, "-", "-"},
+        {"it floods both streams",  "i=0; while [ $i -lt 3000 ]; do echo 'PROGRESS TASK START :: INSTALLATION :: 1 :: 1 :: x'; echo y >&2; i=$((i+1)); done; exit 300", 44, bars, complaints},
         {"it echoes its answer",    "echo 'MESSAGE QUERY CDPATH :: x :: '; read a; echo \"$a\"", 0,
                                     "x\nAnswer, or ABORT: ABORT\nABORT\nDone.\n", ""},
     };
@@ -155,10 +155,6 @@ TEST_F(RuntimeProgram, FrontTakesWhateverAProgramDoes) {
         std::filesystem::permissions(program, std::filesystem::perms::owner_all);
         const ProgramResult result = front({program, path("child")});
         EXPECT_EQ(result.exitCode, row.exitCode) << row.why;
-        if (row.output == "-") {
-            EXPECT_EQ(std::count(result.output.begin(), result.output.end(), '\n'), 3000) << row.why;
-            continue;
-        }
         EXPECT_EQ(result.output, row.output) << row.why;
         const std::string ended = program + " ended with exit code " + std::to_string(row.exitCode) + ".\n";
         EXPECT_EQ(result.error, row.error + (row.exitCode == 0 ? "" : ended)) << row.why;
