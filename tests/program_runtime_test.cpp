@@ -6,7 +6,6 @@
 #include <sys/resource.h>
 #include <unistd.h>
 
-#include <algorithm>
 #include <csignal>
 #include <filesystem>
 
@@ -17,33 +16,26 @@ namespace {
 
 class RuntimeProgram : public testing::Test {
 protected:
-    std::string path(const std::string& name) const { return files_.path() + "/" + name; }
-    std::string log() const { return contents(path("setup.log")); }
+    RuntimeProgram() { std::filesystem::create_directories(path("")); }
 
-    // The product's path of the log.
-    std::string logPath() const {
-        std::string product = path("setup.log");
-        std::replace(product.begin(), product.end(), '/', '\\');
-        return product;
-    }
+    // In the folder of the log, the product's "C:\setup.log".
+    std::string path(const std::string& name) const { return store_.file("drive_c/" + name); }
+    std::string log() const { return contents(path("setup.log")); }
 
     ProgramOptions withInput(const std::string& input) const {
         overwrite(path("input"), input);
         return {.environment = {}, .inChild = [file = path("input")] { dup2(open(file.c_str(), O_RDONLY), 0); }};
     }
-
-    ProgramResult install(const ProgramOptions& options) const {
-        return store_.run("kz7_installer", {logPath(), "0"}, options);
-    }
+    ProgramResult install(const ProgramOptions& options) const { return store_.run("kz7_installer", {"0"}, options); }
     ProgramResult front(std::vector<std::string> command, const std::string& input = {}) const {
         command.insert(command.begin(), {"front", "--"});
         return store_.run("kz7admin", std::move(command), withInput(input));
     }
 
     StateDirectory store_;
-    TemporaryDirectory files_;
-    const std::string told_ = "MESSAGE INFO INSTALLEND :: " + logPath() + "\n";  // in the end
 };
+
+constexpr const char* kLastLine = "MESSAGE INFO INSTALLEND :: C:\\setup.log\n";
 
 // The log of a run that was not aborted, from its tasks on.
 constexpr const char* kLoggedRun =
@@ -66,7 +58,7 @@ TEST_F(RuntimeProgram, FinishesItsWorkWhateverTheFrontEndDoes) {
         EXPECT_EQ(result.exitCode, row.aborted ? 1 : 0) << row.why;
         EXPECT_EQ(result.error, "") << row.why;
         EXPECT_TRUE(result.output.ends_with(
-            (row.aborted ? "\nMESSAGE INFO UNDOEND\n" : ":: 20 :: Creating the instance\n") + told_))
+            std::string(row.aborted ? "\nMESSAGE INFO UNDOEND\n" : ":: 20 :: Creating the instance\n") + kLastLine))
             << row.why << result.output;
         EXPECT_EQ(log().find(kLoggedRun) != std::string::npos, !row.aborted) << row.why;
     }
@@ -93,7 +85,7 @@ TEST_F(RuntimeProgram, KeepsItsLogWithoutAReaderAndItsReaderWithoutALog) {
     };
     const ProgramResult full = install({.environment = {}, .inChild = limited});
     EXPECT_EQ(full.exitCode, 0);
-    EXPECT_TRUE(full.output.ends_with(told_));
+    EXPECT_TRUE(full.output.ends_with(kLastLine));
     EXPECT_TRUE(log().starts_with(before)) << "the log of the earlier run stays";
 
     // A log behind a link is not written: somebody else may have laid it.
@@ -106,7 +98,7 @@ TEST_F(RuntimeProgram, KeepsItsLogWithoutAReaderAndItsReaderWithoutALog) {
 
 TEST_F(RuntimeProgram, FrontShowsARunAndAnswersIt) {
     const std::string installer = programPath("kz7_installer");
-    const ProgramResult run = front({installer, logPath(), "5"}, "/media\n");
+    const ProgramResult run = front({installer, "5"}, "/media\n");
     EXPECT_EQ(run.exitCode, 5);
     EXPECT_EQ(run.output,
               "Installing 0%: Copying files\n"
@@ -124,7 +116,7 @@ TEST_F(RuntimeProgram, FrontShowsARunAndAnswersIt) {
               "error: Install CD not found\n"
               "error: Installer::configure, step 20: error 5030: The program was not run, or it failed.\n" +
                   installer + " ended with exit code 5.\n");
-    const ProgramResult aborted = front({installer, logPath(), "0"});
+    const ProgramResult aborted = front({installer, "0"});
     EXPECT_EQ(aborted.exitCode, 1) << "no more answers abort";
     EXPECT_NE(aborted.output.find("Answer, or ABORT [D:\\]: ABORT\n"), std::string::npos);
     EXPECT_NE(aborted.output.find("Undoing: done\n"), std::string::npos);
@@ -141,6 +133,7 @@ TEST_F(RuntimeProgram, FrontTakesWhateverAProgramDoes) {
     const struct { const char* why; std::string lines; int exitCode; std::string output; std::string error; } rows[] = {
         {"garbage and half a line", R"(printf 'a\001b\n\n\377\nPROGRESS TASK\nhalf'; exit 3)", 3,
                                     "a\\x01b\n\\xff\nPROGRESS TASK\nhalf\n", ""},
+        {"its words", "shift; printf '%s\\n' \"$@\"", 0, "a b\n\"\\\n\\\\a\\\\\n'$*?\nDone.\n", ""},
         {"it dies",                 "echo x; kill -9 $$",                         137, "x\n", ""},
         {"it leaves a child that holds its output", "sleep 600 & echo $! > \"$1\"; echo x", 0, "x\nDone.\n", ""},
         {"it closes all and goes on", "exec <&- >&- 2>&-; sleep 0.1; exit 9",     9,   "", ""},
@@ -153,7 +146,7 @@ TEST_F(RuntimeProgram, FrontTakesWhateverAProgramDoes) {
     for (const auto& row : rows) {
         overwrite(program, "#!/bin/sh\n" + row.lines + "\n");
         std::filesystem::permissions(program, std::filesystem::perms::owner_all);
-        const ProgramResult result = front({program, path("child")});
+        const ProgramResult result = front({program, path("child"), "a b", "", "\"\\", "\\\\a\\\\", "'$*?"});
         EXPECT_EQ(result.exitCode, row.exitCode) << row.why;
         EXPECT_EQ(result.output, row.output) << row.why;
         const std::string ended = program + " ended with exit code " + std::to_string(row.exitCode) + ".\n";

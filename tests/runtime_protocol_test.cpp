@@ -39,25 +39,6 @@ TEST(ProtocolLines, KeepTheirLineFeedAndTellNoOtherEvent) {
     EXPECT_EQ(line.view().substr(1020), "xx\n");
     EXPECT_EQ(queryLine(std::string(3000, 'a'), "b").view().substr(1020), "aa\n");
     EXPECT_FALSE(progressLine({ProgressKind{0x300}, 1, 1, true, "x"}, line));
-}
-
-TEST(ProtocolLines, TellTaskLists) {
-    const std::string twenty = "12345678901234567890";
-    // clang-format off
-    const struct { const char* why; std::string list; int count; std::string identifiers; std::string times; } rows[] = {
-        {"a missing time",               "10;11,5",         2, " :: 10 :: 11",     " ::  :: 5"},
-        {"an empty entry",               "1,2;;3,4",        3, " :: 1 ::  :: 3",   " :: 2 ::  :: 4"},
-        {"an entry is cut as a whole",   "1," + twenty,     1, " :: 1",            " :: 12345678901234567"},
-        {"an identifier of 20",          twenty + ",5",     1, " :: 1234567890123456789", " :: "},
-        {"line ends",                    "1,2\n;3,4",       2, " :: 1 :: 3",       " :: 2  :: 4"},
-    };
-    // clang-format on
-    for (const auto& row : rows) {
-        const TaskListLines lines = taskListLines(row.list);
-        EXPECT_EQ(lines.count.view(), "PROGRESS INFO TASKCOUNT :: " + std::to_string(row.count) + "\n") << row.why;
-        EXPECT_EQ(lines.identifiers.view(), "PROGRESS INFO TASKIDS" + row.identifiers) << row.why;
-        EXPECT_EQ(lines.times.view(), "PROGRESS INFO TASKTIMES" + row.times) << row.why;
-    }
     const TaskListLines many = taskListLines(std::string(3000, ';'));
     EXPECT_EQ(many.count.view(), "PROGRESS INFO TASKCOUNT :: 1024\n") << "1,024 characters are read";
     EXPECT_EQ(many.identifiers.view().size(), 1024U);
@@ -94,7 +75,8 @@ TEST(Pipe, WritesWhatIsQueuedCutAndWithPercentSignsOnce) {
     EXPECT_EQ(machine.console_.flushed, machine.console_.output.size());
 }
 
-// As an installer makes it: tasks, errors, questions, a roll-back. A line that is longer than any answer is one line.
+// As an installer makes it: tasks, errors, questions, a roll-back. Entries of a task list are cut as a whole,
+// and a line that is longer than any answer is one line.
 TEST(MachineStream, TellsAWholeRunToTheByte) {
     RuntimeMachine machine;
     URE& engine = machine.engine;
@@ -105,7 +87,7 @@ TEST(MachineStream, TellsAWholeRunToTheByte) {
     const std::string log = machine.logged([&] {
         const Shown<UREExternalObserverMachineStream> shown(engine);
         EXPECT_TRUE(machine.lines_.keepsLineFeeds);
-        engine.announceTasks("10,30;11,45;");
+        engine.announceTasks("10,30;;11;1,2\n;12345678901234567890,5;1,12345678901234567890;");
         engine.startTask(40, 10, true, "Copying files");
         engine.trace(kTraceError, "Copier::copy", 10, kSuccess, "42 files");
         responses.push_back(engine.ask(1, kMediumNeededMessage, {}, "D:\\", answer));
@@ -129,7 +111,9 @@ TEST(MachineStream, TellsAWholeRunToTheByte) {
     EXPECT_EQ(
         machine.console_.output,
         "MESSAGE INFO INSTALLSTART\n"
-        "PROGRESS INFO TASKCOUNT :: 2\nPROGRESS INFO TASKIDS :: 10 :: 11\nPROGRESS INFO TASKTIMES :: 30 :: 45\n"
+        "PROGRESS INFO TASKCOUNT :: 6\n"
+        "PROGRESS INFO TASKIDS :: 10 ::  :: 11 :: 1 :: 1234567890123456789 :: 1\n"
+        "PROGRESS INFO TASKTIMES :: 30 ::  ::  :: 2  ::  :: 12345678901234567\n"
         "PROGRESS TASK START :: INSTALLATION :: 40 :: 10 :: Copying files\n"
         "MESSAGE ERROR CDNOTFOUND :: Install CD not found\n"
         "MESSAGE QUERY CDPATH :: The installation medium was not found. Where is it? :: D:\\\n\n"
@@ -144,7 +128,8 @@ TEST(MachineStream, TellsAWholeRunToTheByte) {
         "MESSAGE QUERY CDPATH :: The text of message 0x44000002 is missing. :: \n\n"
         "MESSAGE INFO INSTALLEND :: C:\\Setup Logs\\setup.log\n");
     EXPECT_EQ(log,
-              "Tasks: 10,30;11,45;\nCopying files\nNote: Copier::copy, step 10: 42 files\n"
+              "Tasks: 10,30;;11;1,2\n;12345678901234567890,5;1,12345678901234567890;\nCopying files\nNote: "
+              "Copier::copy, step 10: 42 files\n"
               "Note: The installation medium was not found. Where is it?\nCopying files\n"
               "100%% of the\nconfiguration\nGo on?\n"
               "ERROR: Copier::configure, step 20: error 5030: The program was not run, or it failed.\n"
@@ -203,6 +188,10 @@ TEST(HumanStream, IsReadableAndAsWideAsTheTerminal) {
     EXPECT_EQ(answer, "/media/disc");
     EXPECT_EQ(engine.ask(2, kMediumNeededMessage, {}, "D:\\", answer), Response::answered);
     EXPECT_EQ(answer, "D:\\");
+    machine.terminal_.view.columns = 6;
+    machine.say(0x01000005, "abc def abcdef ghi\n\nabcdefgh \xC3\xA4\xC3\xB6\xC3\xBC\xC3\xA4\xC3\xB6\xC3\xBC x");
+    machine.terminal_.view.columns = 1;
+    machine.say(0x01000005, "a\xE2\x82\xACx");
     machine.terminal_.view.columns = 0;
     EXPECT_EQ(engine.ask(2, kMediumNeededMessage, {}, "D:\\", answer), Response::aborted);
     machine.say(0x01000005, "a text that nobody breaks where there is no width");
@@ -213,32 +202,14 @@ TEST(HumanStream, IsReadableAndAsWideAsTheTerminal) {
     EXPECT_EQ(machine.console_.output,
               "Copying files ...\n"
               "Error: Copier::copy, step 10:\nerror 112\n" +
-                  asked + asked + "The installation medium was not found. Where is it? [D:\\] (ABORT to stop): \n" +
+                  asked + asked +
+                  "abc\ndef\nabcdef\nghi\n\nabcdef\ngh\n\xC3\xA4\xC3\xB6\xC3\xBC\xC3\xA4\xC3\xB6\xC3\xBC\nx\na\n\xE2"
+                  "\x82\xAC\nx\n"
+                  "The installation medium was not found. Where is it? [D:\\] (ABORT to stop): \n" +
                   "a text that nobody breaks where there is no width\n"
                   "Copying files: done\n"
                   "Undoing what was done ...\n"
                   "Sure? [] (ABORT to stop): \n");
-}
-
-TEST(HumanStream, BreaksLinesWhereTheyFit) {
-    // clang-format off
-    const struct { const char* why; std::string_view text; std::uint32_t columns; const char* lines; } rows[] = {
-        {"just fits",                "abc def",        7, "abc def|"},
-        {"breaks at a blank",        "abc def",        6, "abc|def|"},
-        {"a blank at the edge",      "abcdef ghi",     6, "abcdef|ghi|"},
-        {"a long word",              "abcdefgh",       3, "abc|def|gh|"},
-        {"line feeds",               "a\n\nb",         5, "a||b|"},
-        {"wider than the terminal",  "a\xE2\x82\xACx",  1, "a|\xE2\x82\xAC|x|"},
-        {"characters, not bytes",    "\xC3\xA4\xC3\xB6\xC3\xBC x", 3, "\xC3\xA4\xC3\xB6\xC3\xBC|x|"},
-    };
-    // clang-format on
-    for (auto row : rows) {
-        std::string lines;
-        while (!row.text.empty()) {
-            lines.append(takeWrappedLine(row.text, row.columns)).append("|");
-        }
-        EXPECT_EQ(lines, row.lines) << row.why;
-    }
 }
 
 TEST(DisplayObserver, ShowsInfosInTheInstaller) {
