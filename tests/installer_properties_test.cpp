@@ -72,32 +72,17 @@ TEST_F(InstallerProperties, AreReadFromTheInstallerOrFromWhatWasSaved) {
 TEST_F(InstallerProperties, MissingArgumentsDependOnTheKindOfAction) {
     char room[8];
     std::uint32_t size = sizeof room;
-    // clang-format off
-    const struct { const char* why; bool scheduled; bool rollback; const char* name; char* buffer; std::uint32_t* size; Status status; } rows[] = {
-        {"immediate, no name",   false, false, nullptr, room,    &size,   kMissingItem},
-        {"immediate, no buffer", false, false, "P",     nullptr, &size,   kMissingItem},
-        {"immediate, no size",   false, false, "P",     room,    nullptr, kInvalidParameter},
-        {"deferred, no name",    true,  false, nullptr, room,    &size,   kInvalidParameter},
-        {"deferred, no buffer",  true,  false, "P",     nullptr, &size,   kInvalidParameter},
-        {"rollback, no size",    false, true,  "P",     room,    nullptr, kInvalidParameter},
-    };
-    // clang-format on
-    for (const auto& row : rows) {
-        machine.session.isScheduled = row.scheduled;
-        machine.session.isRollback = row.rollback;
-        EXPECT_EQ(iMsiGetProperty(at, row.name, row.buffer, row.size), row.status) << row.why;
+    for (const bool deferred : {false, true}) {
+        machine.session.isScheduled = deferred;
+        const Status missing = deferred ? kInvalidParameter : kMissingItem;
+        EXPECT_EQ(iMsiGetProperty(at, nullptr, room, &size), missing);
+        EXPECT_EQ(iMsiGetProperty(at, "P", nullptr, &size), missing);
+        EXPECT_EQ(iMsiGetProperty(at, "P", room, nullptr), kInvalidParameter);
     }
+    machine.session.isScheduled = false;
+    machine.session.isRollback = true;
+    EXPECT_EQ(iMsiGetProperty(at, nullptr, room, &size), kInvalidParameter) << "a rollback is deferred too";
     EXPECT_EQ(iMsiSetProperty(at, "P", "x"), kFunctionFailed) << "the installer's answer to a rollback";
-}
-
-TEST_F(InstallerProperties, ReadingTakesTheSharedBufferOfTheSubstitution) {
-    const char* earlier = iSubstituteCopyName("a\\$CurrentInstallationName$", "X", 0, nullptr);
-    ASSERT_STREQ(earlier, "a\\X");
-    machine.session.isScheduled = true;
-    char room[8];
-    std::uint32_t size = sizeof room;
-    iMsiGetProperty(at, "P", room, &size);
-    EXPECT_EQ(earlier, kKey);
 }
 
 TEST_F(InstallerProperties, EverythingThatDeferredActionsNeedIsSaved) {
@@ -147,8 +132,11 @@ TEST_F(InstallerProperties, EverythingThatDeferredActionsNeedIsSaved) {
     properties["Z_LAST"] = "changed since";
     char room[kPropertySize];
     std::uint32_t size = sizeof room;
+    const char* earlier = iSubstituteCopyName("$CurrentInstallationName$", "X", 0, nullptr);
+    EXPECT_STREQ(earlier, "X");
     EXPECT_EQ(iMsiGetProperty(at, "Z_LAST", room, &size), kSuccess);
     EXPECT_STREQ(room, "z");
+    EXPECT_EQ(earlier, kKey) << "reading takes the shared buffer of the substitution";
     EXPECT_EQ(iDeleteSavedProperties(at), kSuccess);
     EXPECT_EQ(dumpRegistry(machine.registry_, KeyHandle::users, key), "[" + key + "] cannot be opened\n");
     EXPECT_EQ(iDeleteSavedProperties(at), kSuccess) << "nothing saved is a successful delete";

@@ -122,6 +122,24 @@ TEST_F(RuntimeProgram, FrontShowsARunAndAnswersIt) {
     EXPECT_NE(aborted.output.find("Undoing: done\n"), std::string::npos);
 }
 
+// Each task counts once and by its announced time, one that was not announced not at all. More to do takes nothing
+// back.
+TEST_F(RuntimeProgram, FrontNeverGoesBackInAPhase) {
+    const ProgramResult run =
+        front({"/usr/bin/printf", "%s\\n", "PROGRESS INFO TASKIDS :: 10 :: 11 :: 12 :: x",
+               "PROGRESS INFO TASKTIMES :: 30 :: 50 :: 0", "PROGRESS TASK START :: INSTALLATION :: 0 :: 10 :: a",
+               "PROGRESS TASK END :: INSTALLATION :: 10 :: a", "PROGRESS TASK END :: INSTALLATION :: 10 :: again",
+               "PROGRESS TASK END :: INSTALLATION :: 99 :: b", "PROGRESS INFO TASKIDS :: 10 :: 11 :: 12 :: 13 :: 14",
+               "PROGRESS TASK START :: INSTALLATION :: 0 :: 11 :: c", "PROGRESS TASK END :: INSTALLATION :: 11 :: c",
+               "PROGRESS TASK START :: CONFIGURATION :: 0 :: 13 :: d", "PROGRESS TASK END :: CONFIGURATION :: 13 :: d",
+               "PROGRESS INFO TASKTIMES :: 999999999999999999999 :: -5 :: 4000000000",
+               "PROGRESS TASK END :: CONFIGURATION :: 14 :: e"});
+    EXPECT_EQ(run.output,
+              "Installing 0%: a\nInstalling 36%: a, done\nInstalling 36%: again, done\nInstalling 36%: b, done\n"
+              "Installing 36%: c\nInstalling 40%: c, done\nInstalling 100%: done\n"
+              "Configuring 0%: d\nConfiguring 33%: d, done\nConfiguring 33%: e, done\nConfiguring 100%: done\nDone.\n");
+}
+
 TEST_F(RuntimeProgram, FrontTakesWhateverAProgramDoes) {
     std::string bars;
     std::string complaints;
@@ -129,6 +147,7 @@ TEST_F(RuntimeProgram, FrontTakesWhateverAProgramDoes) {
         bars += "Installing: x\n";
         complaints += "y\n";
     }
+    const std::string longest(64 * 1024, 'x');
     // clang-format off
     const struct { const char* why; std::string lines; int exitCode; std::string output; std::string error; } rows[] = {
         {"garbage and half a line", R"(printf 'a\001b\n\n\377\nPROGRESS TASK\nhalf'; exit 3)", 3,
@@ -136,6 +155,7 @@ TEST_F(RuntimeProgram, FrontTakesWhateverAProgramDoes) {
         {"its words", "shift; printf '%s\\n' \"$@\"", 0, "a b\n\"\\\n\\\\a\\\\\n'$*?\nDone.\n", ""},
         {"it dies",                 "echo x; kill -9 $$",                         137, "x\n", ""},
         {"it leaves a child that holds its output", "sleep 600 & echo $! > \"$1\"; echo x", 0, "x\nDone.\n", ""},
+        {"a line over 64 KiB", "head -c 65546 /dev/zero | tr '\\0' x; printf '\\r\\nd\\n'", 0, longest + "\nd\nDone.\n", ""},
         {"it closes all and goes on", "exec <&- >&- 2>&-; sleep 0.1; exit 9",     9,   "", ""},
         {"it floods both streams",  "i=0; while [ $i -lt 3000 ]; do echo 'PROGRESS TASK START :: INSTALLATION :: 1 :: 1 :: x'; echo y >&2; i=$((i+1)); done; exit 300", 44, bars, complaints},
         {"it echoes its answer",    "echo 'MESSAGE QUERY CDPATH :: x :: '; read a; echo \"$a\"", 0,

@@ -84,7 +84,7 @@ TEST(MachineStream, TellsAWholeRunToTheByte) {
     machine.openLog();
     std::vector<Response> responses;
     std::string answer = "unchanged";
-    const std::string log = machine.logged([&] {
+    {
         const Shown<UREExternalObserverMachineStream> shown(engine);
         EXPECT_TRUE(machine.lines_.keepsLineFeeds);
         engine.announceTasks("10,30;;11;1,2\n;12345678901234567890,5;1,12345678901234567890;");
@@ -103,7 +103,7 @@ TEST(MachineStream, TellsAWholeRunToTheByte) {
         engine.startTask(0x1FFFFFFFF, -1, true, "a\r\n :: %s%n%%");
         engine.endTask(5, false, "a\0b"sv);
         responses.push_back(engine.ask(2, 1, {}, "", answer));
-    });
+    }
     EXPECT_FALSE(machine.lines_.keepsLineFeeds);
     EXPECT_EQ(responses, (std::vector{Response::answered, Response::none, Response::aborted}));
     EXPECT_EQ(answer, "");
@@ -127,14 +127,6 @@ TEST(MachineStream, TellsAWholeRunToTheByte) {
         "PROGRESS TASK END :: CONFIGURATION :: 5 :: a\n"
         "MESSAGE QUERY CDPATH :: The text of message 0x44000002 is missing. :: \n\n"
         "MESSAGE INFO INSTALLEND :: C:\\Setup Logs\\setup.log\n");
-    EXPECT_EQ(log,
-              "Tasks: 10,30;;11;1,2\n;12345678901234567890,5;1,12345678901234567890;\nCopying files\nNote: "
-              "Copier::copy, step 10: 42 files\n"
-              "Note: The installation medium was not found. Where is it?\nCopying files\n"
-              "100%% of the\nconfiguration\nGo on?\n"
-              "ERROR: Copier::configure, step 20: error 5030: The program was not run, or it failed.\n"
-              "Note: The program wrote: SQL0000\nNote: other\nnot for front ends\nundo\nundo\na\r\n :: %s%n%%\n"
-              "a\0b\nWARNING: The text of message 0x44000002 is missing.\n"sv);
 }
 
 TEST(Pipe, AnAllocationThatFailsIsReportedAndLosesOneLine) {
