@@ -11,49 +11,60 @@
 namespace kz7::test {
 namespace {
 
-std::string shown(const ProtocolEvent& event) {
-    static constexpr const char* kNames[] = {"installStart", "installEnd", "undoStart", "undoEnd",   "taskStart",
-                                             "taskEnd",      "taskCount",  "taskIds",   "taskTimes", "error",
-                                             "query",        "other",      "nothing"};
-    std::string text = kNames[static_cast<int>(event.kind)];
-    if (event.kind == EventKind::taskStart || event.kind == EventKind::taskEnd) {
-        text += event.isInstallation ? " i" : " c";
-        text += ' ' + std::to_string(event.startValue) + ' ' + std::to_string(event.task);
-    }
-    for (const std::string_view field : event.fields) {
-        text += " <" + std::string(field) + '>';
-    }
-    if (event.kind == EventKind::query) {
-        text += " <" + std::string(event.proposal) + '>';
-    }
-    return text + '|' + std::string(event.text);
+// Runs a program that prints those lines under the front end.
+void runLines(Machine& machine, const std::string& lines) {
+    machine.processes_.addProgram("setup.exe", {.output = lines});
+    std::uint32_t exitCode = 4711;
+    const FrontPorts ports{machine.processes_, machine.threads_,  machine.files_,
+                           machine.lines_,     machine.terminal_, machine.console_};
+    EXPECT_EQ(runFront(ports, {"setup.exe", "a b"}, exitCode), kSuccess);
+    EXPECT_EQ(exitCode, 0U);
 }
 
-TEST(ProtocolReader, TakesAnyLine) {
+// A task counts once and by its announced time, one that was not announced not at all; more to do takes nothing back.
+TEST(Front, ShowsAnyLine) {
     // clang-format off
-    const struct { const char* line; const char* event; } rows[] = {
-        {"MESSAGE INFO INSTALLSTART",                               "installStart|"},
-        {"MESSAGE INFO INSTALLSTARTED",                             "other|MESSAGE INFO INSTALLSTARTED"},
-        {"MESSAGE INFO INSTALLEND :: \\var\\a :: b.log",            "installEnd|\\var\\a :: b.log"},
-        {"PROGRESS TASK START :: INSTALLATION :: 40 :: 10 :: a :: b", "taskStart i 40 10|a :: b"},
-        {"PROGRESS TASK START :: CONFIGURATION :: 4294967295 :: -1 :: ", "taskStart c 4294967295 -1|"},
-        {"PROGRESS TASK END :: CONFIGURATION :: 10 :: x",           "taskEnd c 0 10|x"},
-        {"PROGRESS TASK START :: INSTALLATION :: 40",               "other|PROGRESS TASK START :: INSTALLATION :: 40"},
-        {"PROGRESS TASK START :: INSTALLATION :: 4294967296 :: 1 :: x", "other|PROGRESS TASK START :: INSTALLATION :: 4294967296 :: 1 :: x"},
-        {"PROGRESS INFO TASKCOUNT :: two",                          "other|PROGRESS INFO TASKCOUNT :: two"},
-        {"PROGRESS INFO TASKIDS :: 10 :: 11",                       "taskIds <10> <11>|"},
-        {"PROGRESS INFO TASKTIMES ::  :: 45",                       "taskTimes <> <45>|"},
-        {"MESSAGE ERROR LATER :: of a newer :: program",            "error|of a newer :: program"},
-        {"MESSAGE QUERY CDPATH :: Where :: is it? :: D:\\",         "query <D:\\>|Where :: is it?"},
-        {"MESSAGE QUERY CDPATH :: Where? :: ",                      "query <>|Where?"},
-        {"MESSAGE QUERY CDPATH :: Where?",                          "query <>|Where?"},
-        {"MESSAGE QUERY OTHER :: Where? :: x",                      "other|MESSAGE QUERY OTHER :: Where? :: x"},
-        {"",                                                        "nothing|"},
+    const struct { const char* line; const char* shown; } rows[] = {
+        {"MESSAGE INFO INSTALLSTARTED",                                  "MESSAGE INFO INSTALLSTARTED\n"},
+        {"PROGRESS TASK START :: INSTALLATION :: 4294967295 :: -1 :: ",  "Installing\n"},
+        {"PROGRESS TASK START :: INSTALLATION :: 4294967296 :: 1 :: x",  "PROGRESS TASK START :: INSTALLATION :: 4294967296 :: 1 :: x\n"},
+        {"PROGRESS TASK START :: INSTALLATION :: 40",                    "PROGRESS TASK START :: INSTALLATION :: 40\n"},
+        {"PROGRESS TASK END :: ELSEWHERE :: 10 :: x",                    "PROGRESS TASK END :: ELSEWHERE :: 10 :: x\n"},
+        {"PROGRESS INFO TASKCOUNT :: two",                               "PROGRESS INFO TASKCOUNT :: two\n"},
+        {"PROGRESS INFO TASKCOUNT :: 4",                                 ""},
+        {"PROGRESS INFO TASKIDS :: 10 :: 11 :: 12 :: x",                 ""},
+        {"PROGRESS INFO TASKTIMES :: 30 :: 50 ::  :: 2",                 ""},
+        {"PROGRESS TASK START :: INSTALLATION :: 0 :: 10 :: a :: b",     "Installing 0%: a :: b\n"},
+        {"PROGRESS TASK END :: INSTALLATION :: 10 :: a :: b",            "Installing 36%: a :: b, done\n"},
+        {"PROGRESS TASK END :: INSTALLATION :: 10 :: again",             "Installing 36%: again, done\n"},
+        {"PROGRESS TASK END :: INSTALLATION :: 99 :: b",                 "Installing 36%: b, done\n"},
+        {"PROGRESS INFO TASKIDS :: 10 :: 11 :: 12 :: 13 :: 14",          ""},
+        {"PROGRESS TASK START :: INSTALLATION :: 0 :: 11 :: c",          "Installing 36%: c\n"},
+        {"PROGRESS TASK END :: INSTALLATION :: 11 :: c",                 "Installing 40%: c, done\n"},
+        {"PROGRESS TASK START :: CONFIGURATION :: 0 :: 13 :: d",         "Installing 100%: done\nConfiguring 0%: d\n"},
+        {"PROGRESS TASK END :: CONFIGURATION :: 13 :: d",                "Configuring 33%: d, done\n"},
+        {"PROGRESS INFO TASKTIMES :: 999999999999999999999 :: -5 :: 4000000000", ""},
+        {"PROGRESS TASK END :: CONFIGURATION :: 14 :: e",                "Configuring 33%: e, done\n"},
+        {"MESSAGE ERROR LATER :: of a newer :: program",                 "error: of a newer :: program\n"},
+        {"MESSAGE QUERY CDPATH :: Where :: is it? :: D:\\",              "Where :: is it?\nAnswer, or ABORT [D:\\]: D:\\\n"},
+        {"MESSAGE QUERY CDPATH :: Where? :: ",                           "Where?\nAnswer, or ABORT: x\n"},
+        {"MESSAGE QUERY CDPATH :: Where? ::",                            "Where?\nAnswer, or ABORT: ABORT\n"},
+        {"MESSAGE QUERY CDPATH :: Where?",                               "Where?\nAnswer, or ABORT: ABORT\n"},
+        {"MESSAGE QUERY OTHER :: Where? :: x",                           "MESSAGE QUERY OTHER :: Where? :: x\n"},
+        {"MESSAGE INFO INSTALLEND :: \\var\\a :: b.log",                ""},
+        {"",                                                             ""},
     };
     // clang-format on
+    Machine machine;
+    machine.lines_.input = "\nx\nabort\n";
+    std::string lines;
+    std::string shown;
     for (const auto& row : rows) {
-        EXPECT_EQ(shown(readProtocolLine(row.line)), row.event) << row.line;
+        lines.append(row.line).append("\n");
+        shown += row.shown;
     }
+    runLines(machine, lines);
+    EXPECT_EQ(machine.console_.both, shown + "Configuring 100%: done\nThe log is \\var\\a :: b.log\nDone.\n");
 }
 
 TEST(FrontScreen, BarsFitTheirColumns) {
@@ -75,24 +86,17 @@ TEST(FrontScreen, BarsFitTheirColumns) {
 TEST(Front, DrawsOneBarForEachPhaseOnATerminal) {
     Machine machine;
     machine.terminal_.view = {.terminal = true, .redraws = true, .colours = true, .columns = 40};
-    machine.processes_.addProgram(
-        "setup.exe",
-        {.output = "MESSAGE INFO INSTALLSTART\n"
-                   "PROGRESS INFO TASKCOUNT :: 2\nPROGRESS INFO TASKIDS :: 1 :: 2\nPROGRESS INFO TASKTIMES :: 3 :: 1\n"
-                   "PROGRESS TASK START :: INSTALLATION :: 0 :: 1 :: Files\n"
-                   "MESSAGE QUERY CDPATH :: Where? :: D:\\\n\n"
-                   "PROGRESS TASK END :: INSTALLATION :: 1 :: Files\n"
-                   "garbage \x1b[2J\n"
-                   "MESSAGE ERROR GENERAL :: it failed\n"
-                   "MESSAGE INFO UNDOSTART\nMESSAGE INFO UNDOEND\n"
-                   "MESSAGE INFO INSTALLEND :: C:\\x.log\n"
-                   "half"});
-    std::uint32_t exitCode = 4711;
-    EXPECT_EQ(runFront({machine.processes_, machine.threads_, machine.files_, machine.lines_, machine.terminal_,
-                        machine.console_},
-                       {"setup.exe", "a b"}, exitCode),
-              kSuccess);
-    EXPECT_EQ(exitCode, 0U);
+    runLines(machine,
+             "MESSAGE INFO INSTALLSTART\n"
+             "PROGRESS INFO TASKIDS :: 1 :: 2\nPROGRESS INFO TASKTIMES :: 3 :: 1\n"
+             "PROGRESS TASK START :: INSTALLATION :: 0 :: 1 :: Files\n"
+             "MESSAGE QUERY CDPATH :: Where? :: D:\\\n\n"
+             "PROGRESS TASK END :: INSTALLATION :: 1 :: Files\n"
+             "garbage \x1b[2J\n"
+             "MESSAGE ERROR GENERAL :: it failed\n"
+             "MESSAGE INFO UNDOSTART\nMESSAGE INFO UNDOEND\n"
+             "MESSAGE INFO INSTALLEND :: C:\\x.log\n"
+             "half");
     EXPECT_EQ(machine.processes_.started, std::vector<std::string>{"\"setup.exe\" \"a b\""});
     EXPECT_FALSE(machine.terminal_.leavesInterrupts);
     const std::string wipe = "\r\x1b[K";

@@ -122,24 +122,6 @@ TEST_F(RuntimeProgram, FrontShowsARunAndAnswersIt) {
     EXPECT_NE(aborted.output.find("Undoing: done\n"), std::string::npos);
 }
 
-// Each task counts once and by its announced time, one that was not announced not at all. More to do takes nothing
-// back.
-TEST_F(RuntimeProgram, FrontNeverGoesBackInAPhase) {
-    const ProgramResult run =
-        front({"/usr/bin/printf", "%s\\n", "PROGRESS INFO TASKIDS :: 10 :: 11 :: 12 :: x",
-               "PROGRESS INFO TASKTIMES :: 30 :: 50 :: 0", "PROGRESS TASK START :: INSTALLATION :: 0 :: 10 :: a",
-               "PROGRESS TASK END :: INSTALLATION :: 10 :: a", "PROGRESS TASK END :: INSTALLATION :: 10 :: again",
-               "PROGRESS TASK END :: INSTALLATION :: 99 :: b", "PROGRESS INFO TASKIDS :: 10 :: 11 :: 12 :: 13 :: 14",
-               "PROGRESS TASK START :: INSTALLATION :: 0 :: 11 :: c", "PROGRESS TASK END :: INSTALLATION :: 11 :: c",
-               "PROGRESS TASK START :: CONFIGURATION :: 0 :: 13 :: d", "PROGRESS TASK END :: CONFIGURATION :: 13 :: d",
-               "PROGRESS INFO TASKTIMES :: 999999999999999999999 :: -5 :: 4000000000",
-               "PROGRESS TASK END :: CONFIGURATION :: 14 :: e"});
-    EXPECT_EQ(run.output,
-              "Installing 0%: a\nInstalling 36%: a, done\nInstalling 36%: again, done\nInstalling 36%: b, done\n"
-              "Installing 36%: c\nInstalling 40%: c, done\nInstalling 100%: done\n"
-              "Configuring 0%: d\nConfiguring 33%: d, done\nConfiguring 33%: e, done\nConfiguring 100%: done\nDone.\n");
-}
-
 TEST_F(RuntimeProgram, FrontTakesWhateverAProgramDoes) {
     std::string bars;
     std::string complaints;
