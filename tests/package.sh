@@ -128,33 +128,9 @@ outcome() { # exit code, files
     echo 'log:'
 }
 
-failed_installation() {
-    outcome 1603
-    immediate_actions Y
-    deferred_actions deferred Y '' SELECTED 'two  words '
-    deferred_actions rollback Y '' SELECTED 'two  words '
-    deleted rollback
-}
-
-installation() {
-    outcome 0 client.txt odbc.txt
-    immediate_actions Y
-    deferred_actions deferred Y '' SELECTED 'two  words '
-    committed
-}
-
-removal() {
-    outcome 0
-    echo "ERROR: ureReadRspFile, step 2: error 13: there is no '=' in it"
-    immediate_actions N
-    deferred_actions deferred N ALL DESELECTED ''
-    committed
-}
-
-same() { # why, what is expected, what msiexec is told
-    "$2" >expected
-    run "${@:3}" >seen
-    diff -u --label expected --label seen expected seen || { echo "FAILED: $1: msiexec ${*:3}"; exit 1; }
+same() { # why, what msiexec is told; what is expected stands in a file
+    run "${@:2}" >seen
+    diff -u --label expected --label seen expected seen || { echo "FAILED: $1: msiexec ${*:2}"; exit 1; }
 }
 
 printf '%s\r\n' '* of a user' 'PROD = PROD_ESE' 'KZ7.PASSWORD = "two  words "' 'EMPTY =' >responses
@@ -162,8 +138,27 @@ printf '%s\r\n' 'LEVEL = 8' 'no keyword' >bad_responses
 good=RSP_FILE_PATH=$(windows_path "$folder/responses")
 bad=RSP_FILE_PATH=$(windows_path "$folder/bad_responses")
 
-same 'a deferred action fails: it is rolled back'       failed_installation /i package.msi "$good" FAIL=1
-same 'an installation, after one that was rolled back'  installation        /i package.msi "$good"
-same 'its removal, with responses that cannot be read'  removal             /x package.msi "$bad"
-
+{
+    outcome 1603
+    immediate_actions Y
+    deferred_actions deferred Y '' SELECTED 'two  words '
+    deferred_actions rollback Y '' SELECTED 'two  words '
+    deleted rollback
+} >expected
+same 'a deferred action fails: it is rolled back' /i package.msi "$good" FAIL=1
+{
+    outcome 0 client.txt odbc.txt
+    immediate_actions Y
+    deferred_actions deferred Y '' SELECTED 'two  words '
+    committed
+} >expected
+same 'an installation, after one that was rolled back' /i package.msi "$good"
+{
+    outcome 0
+    echo "ERROR: ureReadRspFile, step 2: error 13: there is no '=' in it"
+    immediate_actions N
+    deferred_actions deferred N ALL DESELECTED ''
+    committed
+} >expected
+same 'its removal, with responses that cannot be read' /x package.msi "$bad"
 echo 'package: all runs of the installer as expected'

@@ -169,7 +169,7 @@ TEST(LogFile, AnyCallMayFail) {
                 URELogObserver* log = URELogObserver::getInstance(engine);
                 log->setLogFile(RuntimeMachine::kLogFile);
                 engine.registerObserver(*log, Takes::everything);
-                const Shown<UREExternalObserverMachineStream> shown(engine);
+                engine.registerObserver(*UREExternalObserverMachineStream::getInstance(engine));
                 engine.startTask(1, 10, true, "Copying files");
                 log->writeFunction("in words");
                 engine.endTask(10, true, "Copying files");

@@ -17,22 +17,6 @@
 
 namespace kz7::test {
 
-// A stream that shows what the engine does for as long as the object is there.
-template <typename Stream>
-class Shown {
-public:
-    explicit Shown(URE& engine) : engine_(engine) { engine.registerObserver(*Stream::getInstance(engine)); }
-    ~Shown() {
-        engine_.unregisterObserver(*Stream::getInstance(engine_));
-        Stream::release();
-    }
-    Shown(const Shown&) = delete;
-    Shown& operator=(const Shown&) = delete;
-
-private:
-    URE& engine_;
-};
-
 // The process-wide observers of a test go with it, and nothing may then be open.
 class RuntimeMachine : public MemoryPlatform {
 public:
