@@ -40,7 +40,7 @@ TEST_F(InstallerProperties, AreReadFromTheInstallerOrFromWhatWasSaved) {
         {"immediate: what was saved is not looked at",             false, "",       "",      "old\0"sv, "live", 5,    kSuccess, "live", 4},
         {"immediate: too small, the installer's hint",             false, "",       nullptr, ""sv,      "live", 4,    kMoreData, "", 8},
         {"deferred: saved wins, its size counts the NUL",          true,  "",       "",      "old\0"sv, "live", 1024, kSuccess, "old", 4},
-        {"deferred: in the key of the user who installs",          true,  "S-1-5",  "S-1-5", "old\0"sv, "",     1024, kSuccess, "old", 4},
+        {"deferred: in the key of the user who installs",          true,  "S-1-5",  "S-1-5", "old\0"sv, "",     4,    kSuccess, "old", 4},
         {"deferred: that user has no key here, so the caller's",   true,  "S-1-8",  "",      "old\0"sv, "",     1024, kSuccess, "old", 4},
         {"deferred: nothing saved, a private property is empty",   true,  "",       nullptr, ""sv,      "live", 1024, kSuccess, "", 0},
         {"deferred: saved empty reads empty",                      true,  "",       "",      "\0"sv,    "live", 1024, kSuccess, "", 1},
