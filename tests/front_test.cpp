@@ -6,100 +6,65 @@
 #include <vector>
 
 #include "install/admin/front.h"
-#include "install/platform/command_line.h"
-#include "install/platform/memory/platform.h"
+#include "tests/support/machine.h"
 
 namespace kz7::test {
 namespace {
 
-std::string shown(const ProtocolEvent& event) {
-    static constexpr const char* kNames[] = {"installStart", "installEnd", "undoStart", "undoEnd",   "taskStart",
-                                             "taskEnd",      "taskCount",  "taskIds",   "taskTimes", "error",
-                                             "query",        "other",      "nothing"};
-    std::string text = kNames[static_cast<int>(event.kind)];
-    if (event.kind == EventKind::taskStart || event.kind == EventKind::taskEnd) {
-        text += event.isInstallation ? " i" : " c";
-        text += ' ' + std::to_string(event.startValue) + ' ' + std::to_string(event.task);
-    }
-    for (const std::string_view field : event.fields) {
-        text += " <" + std::string(field) + '>';
-    }
-    if (event.kind == EventKind::query) {
-        text += " <" + std::string(event.proposal) + '>';
-    }
-    return text + '|' + std::string(event.text);
+// Runs a program that prints those lines under the front end.
+void runLines(Machine& machine, const std::string& lines) {
+    machine.processes_.addProgram("setup.exe", {.output = lines});
+    std::uint32_t exitCode = 4711;
+    const FrontPorts ports{machine.processes_, machine.threads_,  machine.files_,
+                           machine.lines_,     machine.terminal_, machine.console_};
+    EXPECT_EQ(runFront(ports, {"setup.exe", "a b"}, exitCode), kSuccess);
+    EXPECT_EQ(exitCode, 0U);
 }
 
-TEST(ProtocolReader, TakesAnyLine) {
+// A task counts once and by its announced time, one that was not announced not at all; more to do takes nothing back.
+TEST(Front, ShowsAnyLine) {
     // clang-format off
-    const struct { const char* line; const char* event; } rows[] = {
-        {"MESSAGE INFO INSTALLSTART",                               "installStart|"},
-        {"MESSAGE INFO INSTALLSTARTED",                             "other|MESSAGE INFO INSTALLSTARTED"},
-        {"MESSAGE INFO INSTALLEND :: \\var\\a :: b.log",            "installEnd|\\var\\a :: b.log"},
-        {"MESSAGE INFO UNDOSTART",                                  "undoStart|"},
-        {"MESSAGE INFO UNDOEND",                                    "undoEnd|"},
-        {"PROGRESS TASK START :: INSTALLATION :: 40 :: 10 :: a :: b", "taskStart i 40 10|a :: b"},
-        {"PROGRESS TASK START :: CONFIGURATION :: 4294967295 :: -1 :: ", "taskStart c 4294967295 -1|"},
-        {"PROGRESS TASK END :: CONFIGURATION :: 10 :: x",           "taskEnd c 0 10|x"},
-        {"PROGRESS TASK START :: INSTALLATION :: 40",               "other|PROGRESS TASK START :: INSTALLATION :: 40"},
-        {"PROGRESS TASK START :: INSTALLATION :: 4294967296 :: 1 :: x", "other|PROGRESS TASK START :: INSTALLATION :: 4294967296 :: 1 :: x"},
-        {"PROGRESS TASK END :: ELSEWHERE :: 10 :: x",               "other|PROGRESS TASK END :: ELSEWHERE :: 10 :: x"},
-        {"PROGRESS INFO TASKCOUNT :: 2",                            "taskCount|"},
-        {"PROGRESS INFO TASKCOUNT :: two",                          "other|PROGRESS INFO TASKCOUNT :: two"},
-        {"PROGRESS INFO TASKIDS :: 10 :: 11",                       "taskIds <10> <11>|"},
-        {"PROGRESS INFO TASKTIMES ::  :: 45",                       "taskTimes <> <45>|"},
-        {"MESSAGE ERROR GENERAL :: a :: b",                         "error|a :: b"},
-        {"MESSAGE ERROR LATER :: of a newer program",               "error|of a newer program"},
-        {"MESSAGE QUERY CDPATH :: Where :: is it? :: D:\\",         "query <D:\\>|Where :: is it?"},
-        {"MESSAGE QUERY CDPATH :: Where? :: ",                      "query <>|Where?"},
-        {"MESSAGE QUERY CDPATH :: Where?",                          "query <>|Where?"},
-        {"MESSAGE QUERY OTHER :: Where? :: x",                      "other|MESSAGE QUERY OTHER :: Where? :: x"},
-        {"some words",                                              "other|some words"},
-        {"",                                                        "nothing|"},
+    const struct { const char* line; const char* shown; } rows[] = {
+        {"MESSAGE INFO INSTALLSTARTED",                                  "MESSAGE INFO INSTALLSTARTED\n"},
+        {"PROGRESS TASK START :: INSTALLATION :: 4294967295 :: -1 :: ",  "Installing\n"},
+        {"PROGRESS TASK START :: INSTALLATION :: 4294967296 :: 1 :: x",  "PROGRESS TASK START :: INSTALLATION :: 4294967296 :: 1 :: x\n"},
+        {"PROGRESS TASK START :: INSTALLATION :: 40",                    "PROGRESS TASK START :: INSTALLATION :: 40\n"},
+        {"PROGRESS TASK END :: ELSEWHERE :: 10 :: x",                    "PROGRESS TASK END :: ELSEWHERE :: 10 :: x\n"},
+        {"PROGRESS INFO TASKCOUNT :: two",                               "PROGRESS INFO TASKCOUNT :: two\n"},
+        {"PROGRESS INFO TASKCOUNT :: 4",                                 ""},
+        {"PROGRESS INFO TASKIDS :: 10 :: 11 :: 12 :: x",                 ""},
+        {"PROGRESS INFO TASKTIMES :: 30 :: 50 ::  :: 2",                 ""},
+        {"PROGRESS TASK START :: INSTALLATION :: 0 :: 10 :: a :: b",     "Installing 0%: a :: b\n"},
+        {"PROGRESS TASK END :: INSTALLATION :: 10 :: a :: b",            "Installing 36%: a :: b, done\n"},
+        {"PROGRESS TASK END :: INSTALLATION :: 10 :: again",             "Installing 36%: again, done\n"},
+        {"PROGRESS TASK END :: INSTALLATION :: 99 :: b",                 "Installing 36%: b, done\n"},
+        {"PROGRESS INFO TASKIDS :: 10 :: 11 :: 12 :: 13 :: 14",          ""},
+        {"PROGRESS TASK START :: INSTALLATION :: 0 :: 11 :: c",          "Installing 36%: c\n"},
+        {"PROGRESS TASK END :: INSTALLATION :: 11 :: c",                 "Installing 40%: c, done\n"},
+        {"PROGRESS TASK START :: CONFIGURATION :: 0 :: 13 :: d",         "Installing 100%: done\nConfiguring 0%: d\n"},
+        {"PROGRESS TASK END :: CONFIGURATION :: 13 :: d",                "Configuring 33%: d, done\n"},
+        {"PROGRESS INFO TASKTIMES :: 999999999999999999999 :: -5 :: 4000000000", ""},
+        {"PROGRESS TASK END :: CONFIGURATION :: 14 :: e",                "Configuring 33%: e, done\n"},
+        {"MESSAGE ERROR LATER :: of a newer :: program",                 "error: of a newer :: program\n"},
+        {"MESSAGE QUERY CDPATH :: Where :: is it? :: D:\\",              "Where :: is it?\nAnswer, or ABORT [D:\\]: D:\\\n"},
+        {"MESSAGE QUERY CDPATH :: Where? :: ",                           "Where?\nAnswer, or ABORT: x\n"},
+        {"MESSAGE QUERY CDPATH :: Where? ::",                            "Where?\nAnswer, or ABORT: ABORT\n"},
+        {"MESSAGE QUERY CDPATH :: Where?",                               "Where?\nAnswer, or ABORT: ABORT\n"},
+        {"MESSAGE QUERY OTHER :: Where? :: x",                           "MESSAGE QUERY OTHER :: Where? :: x\n"},
+        {"MESSAGE INFO INSTALLEND :: \\var\\a :: b.log",                ""},
+        {"",                                                             ""},
     };
     // clang-format on
+    Machine machine;
+    machine.lines_.input = "\nx\nabort\n";
+    std::string lines;
+    std::string shown;
     for (const auto& row : rows) {
-        EXPECT_EQ(shown(readProtocolLine(row.line)), row.event) << row.line;
+        lines.append(row.line).append("\n");
+        shown += row.shown;
     }
-}
-
-TEST(LineCutter, CutsPiecesIntoLines) {
-    const std::string large(LineCutter::kMaxLine + 10, 'x');
-    const std::string input = "a\n\nbc\r\n" + large + "\nd\n" + std::string("\0", 1) + "\nhalf";
-    for (const std::size_t piece : {1U, 7U, 4096U, 1U << 20}) {
-        LineCutter cutter;
-        std::string lines;
-        const auto take = [&](std::string_view line) { lines.append(line).append("\n"); };
-        for (std::size_t at = 0; at < input.size(); at += piece) {
-            cutter.add(std::string_view(input).substr(at, piece), take);
-        }
-        cutter.end(take);
-        cutter.end(take);
-        EXPECT_TRUE(lines == std::string(input).erase(input.find('x'), 10) + "\n") << piece;
-    }
-}
-
-TEST(FrontProgress, NeverGoesBackInAPhase) {
-    FrontProgress progress;
-    EXPECT_EQ(progress.percent(), -1) << "nothing is announced";
-    progress.takeIds({"10", "11", "12", "x"});
-    progress.takeTimes({"30", "50", "0"});
-    progress.beginPhase();
-    EXPECT_EQ(progress.percent(), 0);
-    for (const std::int32_t task : {10, 10, 99}) {
-        progress.endTask(task);
-        EXPECT_EQ(progress.percent(), 36) << "30 of 30 + 50 + 1 + 1; once, and announced tasks only";
-    }
-    progress.takeIds({"10", "11", "12", "13", "14"});
-    EXPECT_EQ(progress.percent(), 36) << "more to do";
-    progress.endTask(11);
-    EXPECT_EQ(progress.percent(), 40);
-    progress.beginPhase();
-    progress.endTask(13);
-    EXPECT_EQ(progress.percent(), 33) << "of the three that are left";
-    progress.completePhase();
-    progress.takeTimes({"999999999999999999999", "-5", "4000000000"});
-    EXPECT_EQ(progress.percent(), 100);
+    runLines(machine, lines);
+    EXPECT_EQ(machine.console_.both, shown + "Configuring 100%: done\nThe log is \\var\\a :: b.log\nDone.\n");
 }
 
 TEST(FrontScreen, BarsFitTheirColumns) {
@@ -107,12 +72,8 @@ TEST(FrontScreen, BarsFitTheirColumns) {
     const struct { FrontScreen::Bar bar; std::uint32_t columns; const char* line; } rows[] = {
         {{"Installing", 50, "Copying files"}, 79,  "Installing   [##############..............]  50% Copying files"},
         {{"Installing", 100, "done"},         200, "Installing   [########################################] 100% done"},
-        {{"Installing", 30, "Copying files"}, 40,  "Installing   [###.......]  30% Copying f"},
-        {{"Installing", 30, "Copying files"}, 31,  "Installing   [###.......]  30% "},
         {{"Installing", 30, "Copying files"}, 30,  "Installing 30%: Copying files"},
-        {{"Installing", 30, "Copying files"}, 12,  "Installing 3"},
-        {{"Undoing", -1, "taken back"},       40,  "Undoing      taken back"},
-        {{"Undoing", -1, "taken back"},       1,   "U"},
+        {{"Undoing", -1, "taken back"},       15,  "Undoing      ta"},
         {{"Installing", 0, "\xE6\x97\xA5\xE6\x9C\xAC\xC3\xA4"}, 36, "Installing   [..........]   0% \xE6\x97\xA5\xE6\x9C\xAC\xC3\xA4"},
         {{"Installing", 0, "\xE6\x97\xA5\xE6\x9C\xAC\xC3\xA4"}, 34, "Installing   [..........]   0% \xE6\x97\xA5"},
     };
@@ -122,39 +83,21 @@ TEST(FrontScreen, BarsFitTheirColumns) {
     }
 }
 
-TEST(CommandLine, JoinsWhatItSplits) {
-    const std::vector<std::string> words = {"C:\\a b\\p.exe", "",     "a b",          "\"",   "\\",
-                                            "a\\\\",          "\\\"", "x\\\"y\\\\\"", "'$*?", "\t"};
-    const std::string line = joinArguments(words);
-    const CommandReading reading = commandReadings(line).at(0);
-    EXPECT_EQ(reading.program, words[0]);
-    EXPECT_EQ(splitArguments(reading.arguments), std::vector<std::string>(words.begin() + 1, words.end()));
-}
-
-constexpr const char* kProgramLines =
-    "MESSAGE INFO INSTALLSTART\n"
-    "PROGRESS INFO TASKCOUNT :: 2\nPROGRESS INFO TASKIDS :: 1 :: 2\nPROGRESS INFO TASKTIMES :: 3 :: 1\n"
-    "PROGRESS TASK START :: INSTALLATION :: 0 :: 1 :: Files\n"
-    "MESSAGE QUERY CDPATH :: Where? :: D:\\\n\n"
-    "PROGRESS TASK END :: INSTALLATION :: 1 :: Files\n"
-    "garbage \x1b[2J\n"
-    "MESSAGE ERROR GENERAL :: it failed\n"
-    "MESSAGE INFO UNDOSTART\nMESSAGE INFO UNDOEND\n"
-    "MESSAGE INFO INSTALLEND :: C:\\x.log\n"
-    "half";
-
 TEST(Front, DrawsOneBarForEachPhaseOnATerminal) {
-    MemoryPlatform machine;
+    Machine machine;
     machine.terminal_.view = {.terminal = true, .redraws = true, .colours = true, .columns = 40};
-    machine.processes_.addProgram("setup.exe", {.output = kProgramLines});
-    std::uint32_t exitCode = 4711;
-    EXPECT_EQ(runFront({machine.processes_, machine.threads_, machine.files_, machine.lines_, machine.terminal_,
-                        machine.console_},
-                       {"setup.exe", "a b"}, exitCode),
-              kSuccess);
-    EXPECT_EQ(exitCode, 0U);
+    runLines(machine,
+             "MESSAGE INFO INSTALLSTART\n"
+             "PROGRESS INFO TASKIDS :: 1 :: 2\nPROGRESS INFO TASKTIMES :: 3 :: 1\n"
+             "PROGRESS TASK START :: INSTALLATION :: 0 :: 1 :: Files\n"
+             "MESSAGE QUERY CDPATH :: Where? :: D:\\\n\n"
+             "PROGRESS TASK END :: INSTALLATION :: 1 :: Files\n"
+             "garbage \x1b[2J\n"
+             "MESSAGE ERROR GENERAL :: it failed\n"
+             "MESSAGE INFO UNDOSTART\nMESSAGE INFO UNDOEND\n"
+             "MESSAGE INFO INSTALLEND :: C:\\x.log\n"
+             "half");
     EXPECT_EQ(machine.processes_.started, std::vector<std::string>{"\"setup.exe\" \"a b\""});
-    EXPECT_EQ(machine.processes_.openHandles() + machine.threads_.openHandles(), 0U);
     EXPECT_FALSE(machine.terminal_.leavesInterrupts);
     const std::string wipe = "\r\x1b[K";
     const std::string bar = wipe + "Installing   [#######...]  75% Files, d";

@@ -1,12 +1,11 @@
 // An installer program for tests: a run of the installer runtime on this machine's ports.
-//   kz7_installer LOG EXITCODE
-// Answered ABORT, it undoes what it did and ends with 1.
+//   kz7_installer EXITCODE
+// Its log is C:\setup.log. Answered ABORT, it undoes what it did and ends with 1.
 #include <cstdlib>
 #include <string>
 
 #include "install/platform/platform.h"
-#include "install/runtime/observers/log_observer.h"
-#include "install/runtime/observers/machine_stream.h"
+#include "install/runtime/observers/observers_end.h"
 #include "install/runtime/runtime_ports.h"
 
 namespace kz7::test {
@@ -38,23 +37,17 @@ int install(URE& engine, int exitCode) {
 }  // namespace
 }  // namespace kz7::test
 
-int main(int argc, char** argv) {
+int main(int, char** argv) {
     using namespace kz7;
-    if (argc < 3) {
-        return 2;
-    }
     const auto platform = hostPlatform({.program = "kz7_installer"});
     URE engine(portsOf(*platform));
     engine.mode = kModeInstall;
+    const ObserversEnd end;
     URELogObserver* log = URELogObserver::getInstance(engine);
-    log->setLogFile(argv[1]);
+    log->setLogFile("C:\\setup.log");
     engine.registerObserver(*log, Takes::everything);
-    auto* stream = UREExternalObserverMachineStream::getInstance(engine);
-    engine.registerObserver(*stream);
-    const int exitCode = test::install(engine, std::atoi(argv[2]));
-    engine.unregisterObserver(*stream);
+    engine.registerObserver(*UREExternalObserverMachineStream::getInstance(engine));
+    const int exitCode = test::install(engine, std::atoi(argv[1]));
     log->writeHeader(true);
-    UREExternalObserverMachineStream::release();
-    URELogObserver::release();
     return exitCode;
 }

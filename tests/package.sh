@@ -30,9 +30,9 @@ retype() {
 cp "$programs/kz7actions64.dll" "$programs/kz7_probe.dll" .
 echo installed >file.txt
 wixl -a x64 -D FILE=file.txt -D ACTIONS=kz7actions64.dll -D PROBE=kz7_probe.dll -o package.msi "$source"
-retype 1 Save ProbeImmediate ProbeChange                    # at once
-retype 51 SetDebugProp TellImmediate TellProbe{RolledBack,Rollback,Deferred,Room,Commit,Committed}
-retype 3073 ProbeDeferred ProbeRoom Fail                    # deferred
+retype 1 Save ProbeChange                                   # at once
+retype 51 SetDebugProp TellImmediate TellProbe{RolledBack,Rollback,Deferred,Commit,Committed}
+retype 3073 ProbeDeferred Fail                              # deferred
 retype 3329 ProbeRollback DeleteAtRollback ProbeRolledBack  # in a rollback
 retype 3585 ProbeCommit DeleteAtCommit ProbeCommitted       # at the end
 
@@ -59,74 +59,51 @@ run() {
 # as it was last set.
 note() { printf 'Note: %s: %s, status %u\n' "$@"; }
 probe() { printf "probe %s: $2\n" "$1" "${@:3}"; }
-saved() { note iMsiGetProperty "$2" 0 && probe "$1" "%s in 1024: size %u, '%s'" "$2" $((${#3} + 1)) "$3"; }
-given() { note iMsiGetProperty "$2" 0 && probe "$1" "%s in %u: size %u, '%s'" "$2" "${4:-1024}" ${#3} "$3"; }
-changed() {
-    given immediate "$1" "$2" 4096
-    note iMsiSetProperty "$1" 0
-    probe immediate 'setting %s: status 0' "$1"
-    given immediate "$1" new 4096
+given() { # kind of action, name, value, whether its terminator counts
+    note iMsiGetProperty "$2" 0
+    probe "$1" "%s: status 0, size %u, '%s'" "$2" $((${#3} + ${4:-0})) "$3"
 }
-substituted() {
-    probe "$1" 'substituted: InstalledCopies\\COPY1'
-    probe "$1" 'substituted without a buffer: InstalledCopies\\COPY2'
-    probe "$1" 'without room: null'
-    probe "$1" 'without a copy: the text itself'
-}
+saved() { given "$@" 1; }
+
+changed=(DEBUG_PROP TABLE_PUBLIC TablePrivate KZ7_COPY_NAME MIGRATION_FILES_PATH INI_FILES_PATH NOT_INSTALL_DOTNET
+    NotSaved BASE_CLIENT_BIN_SELECTED)
+before=('of the immediate phase' 'of the table' '100% of the table' COPY1 "$(long 1023)" "$(long 1024)" '' '')
 
 immediate_actions() { # the feature BASE_CLIENT.bin selected: Y or N
     note iMsiGetProperty UserSID 0
     note iMsiSetProperty BASE_CLIENT_BIN_SELECTED 0
     note iMsiGetProperty INI_FILES_PATH 234 # too long to be saved
-    note iMsiGetProperty DEBUG_PROP 234
-    probe immediate 'DEBUG_PROP in 4: status 234, a larger size'
-    substituted immediate
-    changed DEBUG_PROP 'of the immediate phase'
-    changed TABLE_PUBLIC 'of the table'
-    changed TablePrivate '100% of the table'
-    changed KZ7_COPY_NAME COPY1
-    changed MIGRATION_FILES_PATH "$(long 1023)"
-    changed INI_FILES_PATH "$(long 1024)"
-    changed NOT_INSTALL_DOTNET ''
-    changed NotSaved ''
-    changed BASE_CLIENT_BIN_SELECTED "$1"
+    probe immediate 'substituted: InstalledCopies\\COPY1'
+    probe immediate 'substituted without a buffer: InstalledCopies\\COPY2'
+    local i name values=("${before[@]}" "$1")
+    for i in "${!changed[@]}"; do
+        given immediate "${changed[i]}" "${values[i]}"
+    done
+    for name in "${changed[@]}"; do
+        note iMsiSetProperty "$name" 0
+        probe immediate 'setting %s: status 0' "$name"
+    done
+    for name in "${changed[@]}"; do
+        given immediate "$name" new
+    done
 }
 
-read_back() { # kind of action, installation or removal
+deferred_actions() { # kind of action, the feature selected; as saved: REMOVE, state of features, a response
     probe "$1" 'opening the key: status 0'
-    saved "$1" DEBUG_PROP 'of the immediate phase'
-    saved "$1" TABLE_PUBLIC 'of the table'
-    saved "$1" TablePrivate '100% of the table'
-    saved "$1" KZ7_COPY_NAME COPY1
-    saved "$1" MIGRATION_FILES_PATH "$(long 1023)"
-    given "$1" INI_FILES_PATH new
-    saved "$1" NOT_INSTALL_DOTNET ''
-    given "$1" NotSaved new
-    if [ "$2" = installation ]; then
-        saved "$1" BASE_CLIENT_BIN_SELECTED Y
-        saved "$1" REMOVE ''
-        saved "$1" BASE_CLIENT.bin_SELECT_STATE SELECTED
-        saved "$1" ODBC_SUPPORT_SELECT_STATE SELECTED
-        given "$1" LDAP.bin_SELECT_STATE ''
-        saved "$1" PROP_RSP_KZ7.PASSWORD 'two  words '
-        saved "$1" PROP_RSP_LEVEL 7
-    else
-        saved "$1" BASE_CLIENT_BIN_SELECTED N
-        saved "$1" REMOVE ALL
-        saved "$1" BASE_CLIENT.bin_SELECT_STATE DESELECTED
-        saved "$1" ODBC_SUPPORT_SELECT_STATE DESELECTED
-        given "$1" LDAP.bin_SELECT_STATE ''
-        saved "$1" PROP_RSP_KZ7.PASSWORD ''
-        given "$1" PROP_RSP_LEVEL ''
-    fi
+    local i values=("${before[@]}" "$2")
+    for i in "${!changed[@]}"; do
+        case ${changed[i]} in
+            INI_FILES_PATH | NotSaved) given "$1" "${changed[i]}" new ;;
+            *) saved "$1" "${changed[i]}" "${values[i]}" ;;
+        esac
+    done
+    saved "$1" REMOVE "$3"
+    saved "$1" BASE_CLIENT.bin_SELECT_STATE "$4"
+    saved "$1" ODBC_SUPPORT_SELECT_STATE "$4"
+    given "$1" LDAP.bin_SELECT_STATE ''
+    saved "$1" PROP_RSP_KZ7.PASSWORD "$5"
     given "$1" PROP_RSP_EMPTY ''
     saved "$1" PROP_RSP_PROD ''
-}
-
-deferred_actions() { # installation or removal
-    read_back deferred "$1"
-    given deferred DEBUG_PROP new 4 # too little for what was saved
-    substituted deferred
 }
 
 deleted() { # kind of action
@@ -151,54 +128,37 @@ outcome() { # exit code, files
     echo 'log:'
 }
 
-failed_installation() {
-    outcome 1603
-    immediate_actions Y
-    deferred_actions installation
-    read_back rollback installation
-    deleted rollback
+same() { # why, what msiexec is told; what is expected stands in a file
+    run "${@:2}" >seen
+    diff -u --label expected --label seen expected seen || { echo "FAILED: $1: msiexec ${*:2}"; exit 1; }
 }
 
-installation() {
-    outcome 0 client.txt odbc.txt
-    immediate_actions Y
-    deferred_actions installation
-    committed
-}
-
-removal() {
-    outcome 0
-    echo "ERROR: ureReadRspFile, step 2: error 13: there is no '=' in it"
-    immediate_actions N
-    deferred_actions removal
-    committed
-}
-
-runs=0
-failed=0
-same() {
-    local why=$1 expected=$2
-    shift 2
-    runs=$((runs + 1))
-    "$expected" >expected
-    run "$@" >seen
-    if ! diff -u --label expected --label seen expected seen >difference; then
-        printf 'FAILED: %s: msiexec' "$why"
-        printf ' %q' "$@"
-        printf '\n'
-        cat difference
-        failed=$((failed + 1))
-    fi
-}
-
-printf '%s\r\n' '* of a user' 'PROD = PROD_ESE' 'KZ7.PASSWORD = "two  words "' 'LEVEL = 7' 'EMPTY =' >responses
+printf '%s\r\n' '* of a user' 'PROD = PROD_ESE' 'KZ7.PASSWORD = "two  words "' 'EMPTY =' >responses
 printf '%s\r\n' 'LEVEL = 8' 'no keyword' >bad_responses
 good=RSP_FILE_PATH=$(windows_path "$folder/responses")
 bad=RSP_FILE_PATH=$(windows_path "$folder/bad_responses")
 
-same 'a deferred action fails: it is rolled back'       failed_installation /i package.msi "$good" FAIL=1
-same 'an installation, after one that was rolled back'  installation        /i package.msi "$good"
-same 'its removal, with responses that cannot be read'  removal             /x package.msi "$bad"
-
-echo "package: $runs runs of the installer, $failed differ"
-[ "$failed" -eq 0 ]
+{
+    outcome 1603
+    immediate_actions Y
+    deferred_actions deferred Y '' SELECTED 'two  words '
+    deferred_actions rollback Y '' SELECTED 'two  words '
+    deleted rollback
+} >expected
+same 'a deferred action fails: it is rolled back' /i package.msi "$good" FAIL=1
+{
+    outcome 0 client.txt odbc.txt
+    immediate_actions Y
+    deferred_actions deferred Y '' SELECTED 'two  words '
+    committed
+} >expected
+same 'an installation, after one that was rolled back' /i package.msi "$good"
+{
+    outcome 0
+    echo "ERROR: ureReadRspFile, step 2: error 13: there is no '=' in it"
+    immediate_actions N
+    deferred_actions deferred N ALL DESELECTED ''
+    committed
+} >expected
+same 'its removal, with responses that cannot be read' /x package.msi "$bad"
+echo 'package: all runs of the installer as expected'

@@ -1,24 +1,18 @@
 // The log of a run: exact files with a clock that stands still, the session's log, and what goes wrong.
 #include <gtest/gtest.h>
 
-#include <array>
+#include <regex>
 
 #include "install/platform/faulty/clock.h"
-#include "install/platform/faulty/file_system.h"
 #include "install/platform/faulty/host_identity.h"
 #include "install/platform/faulty/installer_session.h"
-#include "install/platform/faulty/process_host.h"
-#include "install/platform/faulty/threads.h"
+#include "tests/support/fault_sweep.h"
 #include "tests/support/runtime_machine.h"
 
 namespace kz7::test {
 namespace {
 
 const std::string kLine60 = "============================================================\n";
-
-void raise(URE& engine, std::uint32_t code, std::string_view text) {
-    engine.message(code, kTextMessage, std::array<Insert, 1>{text});
-}
 
 TEST(LogFile, HoldsARunToTheByte) {
     RuntimeMachine machine;
@@ -32,10 +26,10 @@ TEST(LogFile, HoldsARunToTheByte) {
     machine.engine.error(kCodeError, "Copier::copy", 20, kDiskFull);
     machine.engine.error(kCodeWarning, "Copier::copy", 30, kSuccess);
     log.writeFunction("an error in words");
-    raise(machine.engine, 0x4000000, "a report without a time");
-    raise(machine.engine, 0x1000005, "\"quoted\"");
-    raise(machine.engine, 0x4000001, "\"");
-    raise(machine.engine, 0x1000005, "");
+    machine.say(0x4000000, "a report without a time");
+    machine.say(0x1000005, "\"quoted\"");
+    machine.say(0x4000001, "\"");
+    machine.say(0x1000005, "");
     machine.engine.message(0x4000100, 12345, {});
     EXPECT_EQ(log.writeHeader(true), kSuccess);
     EXPECT_EQ(machine.logText(), "\nInstallation started: Tue Jan  2 03:04:05 2024 UTC\n" + kLine60 +
@@ -59,7 +53,7 @@ TEST(LogFile, HoldsARunToTheByte) {
     EXPECT_STREQ(path, "C:\\SetupLogs\\kz7msi.log");
     EXPECT_STREQ(log.componentLogPath(nullptr), path);
     for (const std::size_t length : {255U, 256U, 257U, 512U, 5000U, 100U << 20}) {
-        const std::string line = machine.logged([&] { raise(machine.engine, 0x4000001, std::string(length, 'x')); });
+        const std::string line = machine.logged([&] { machine.say(0x4000001, std::string(length, 'x')); });
         EXPECT_TRUE(line == "Note: " + std::string(length, 'x') + "\n") << length << " " << line.size();
     }
 }
@@ -76,73 +70,58 @@ TEST(LogFile, TitlesComeFromTheModeAndTheCatalogue) {
         {"44 characters",           1,       "2000 = aaaaaaaaaabbbbbbbbbbccccccccccddddddddddeeeeeeeeee", false, "aaaaaaaaaabbbbbbbbbbccccccccccddddddddddeeee"},
     };
     // clang-format on
+    RuntimeMachine machine;
+    machine.openLog();
+    machine.clock_.dateAndZone = std::string(50, '9');
     for (const auto& row : rows) {
-        RuntimeMachine machine;
-        machine.openLog();
         ResponseFault fault;
-        ASSERT_EQ(machine.engine.messages.load(row.catalogue, fault), kSuccess) << row.why;
+        EXPECT_EQ(machine.engine.messages.load(row.catalogue, fault), kSuccess) << row.why;
         machine.engine.mode = row.mode;
-        machine.clock_.dateAndZone = std::string(50, '9');
-        EXPECT_EQ(machine.logged([&] { machine.log().writeHeader(row.isEnd); }),
-                  "\n" + row.title + std::string(42, '9') + "\n" + kLine60)
-            << row.why;
+        const std::string header = machine.logged([&] { machine.log().writeHeader(row.isEnd); });
+        EXPECT_EQ(header, "\n" + row.title + std::string(42, '9') + "\n" + kLine60) << row.why;
     }
 }
 
 TEST(LogFile, SaysWhatTheMachineRuns) {
     const std::string cut(79, 'x');
-    // clang-format off
-    const struct { const char* why; std::optional<ScriptedProgram> uname; std::string line; } rows[] = {
-        {"no such program",  std::nullopt,                                   "Memory 1.0"},
-        {"it fails",         ScriptedProgram{.output = "x", .exitCode = 1},  "Memory 1.0"},
-        {"79 characters",    ScriptedProgram{.output = cut + "x"},           cut + " " + cut + "." + cut},
-        {"it says nothing",  ScriptedProgram{},                              "Memory 1.0"},
+    const std::pair<ScriptedProgram, std::string> rows[] = {
+        {{.output = "it fails", .exitCode = 1}, "Memory 1.0"},
+        {{.output = cut + "x"}, cut + " " + cut + "." + cut},
     };
-    // clang-format on
-    for (const auto& row : rows) {
+    for (const auto& [uname, line] : rows) {
         RuntimeMachine machine;
-        if (row.uname) {
-            machine.processes_.addProgram("uname", *row.uname);
-        }
+        machine.processes_.addProgram("uname", uname);
         machine.openLog();
-        EXPECT_EQ(machine.logText(), "\nTue Jan  2 03:04:05 2024 UTC\n" + kLine60 + row.line + "\n") << row.why;
+        EXPECT_EQ(machine.logText(), "\nTue Jan  2 03:04:05 2024 UTC\n" + kLine60 + line + "\n");
     }
 }
 
 TEST(LogFile, ThatCannotBeKeptStandsInNobodysWay) {
+    const std::string onlyNotes = "in the session, [Secret] [1] ][\na note\n";
+    const std::string all = "in the session, [Secret] [1] ][\nNote: a note\nERROR: an error\na task\n";
+    const std::string header = "\nTue Jan  2 03:04:05 2024 UTC\n" + kLine60 + "Memory 1.0\n";
+    const std::string report = "ERROR: URELogObserver::setLogFile, step 10: error ";
     // clang-format off
-    const struct { const char* why; std::string path; bool reported; } rows[] = {
-        {"no folder in the path",     "setup.log",                                false},
-        {"no path",                   "",                                         false},
-        {"no short form",             "C:\\absent\\setup.log",                    false},
-        {"the folder went away",      "C:\\Gone\\setup.log",                      true},
-        {"a path that does not fit",  "C:\\Setup Logs\\" + std::string(300, 'x'), true},
+    const struct { const char* why; std::string path; std::string told; } rows[] = {
+        {"no folder in the path",     "setup.log",                                onlyNotes},
+        {"no path",                   "",                                         onlyNotes},
+        {"no short form",             "C:\\absent\\setup.log",                    onlyNotes},
+        {"the folder went away",      "C:\\Gone\\setup.log",                      report + "3\n" + header + all},
+        {"a path that does not fit",  "C:\\Setup Logs\\" + std::string(300, 'x'), report + "206\n" + header + all},
     };
     // clang-format on
     for (const auto& row : rows) {
         RuntimeMachine machine(true);
         machine.processes_.addProgram("C:\\Gone\\", {});
         machine.session.properties["Secret"] = "hunter2";
-        URELogObserver& log = machine.log();
-        machine.engine.registerObserver(log, Takes::everything);
-        log.setLogFile(row.path);
-        auto& messages = machine.session.messages;
-        ASSERT_EQ(messages.empty(), !row.reported) << row.why;
-        EXPECT_TRUE(messages.empty() ||
-                    messages[0].fields[1].starts_with("ERROR: URELogObserver::setLogFile, step 10: "));
-        messages.clear();
-        EXPECT_EQ(log.writeLine("in the session, [Secret] [1] ]["), kSuccess);
-        raise(machine.engine, 0x4000001, "\"a note\"");
-        raise(machine.engine, 0x4000100, "an error");
+        machine.engine.registerObserver(machine.log(), Takes::everything);
+        machine.log().setLogFile(row.path);
+        EXPECT_EQ(machine.log().writeLine("in the session, [Secret] [1] ]["), kSuccess);
+        machine.say(0x4000001, "\"a note\"");
+        machine.say(0x4000100, "an error");
         machine.engine.startTask(1, 1, true, "a task");
-        std::string lines;
-        for (const auto& message : messages) {
-            EXPECT_EQ(message.kind, 0x4000000U);
-            lines += message.fields[0] + message.fields[1] + '\n';
-        }
-        EXPECT_EQ(lines, std::string("in the session, [Secret] [1] ][\n") +
-                             (row.reported ? "Note: a note\nERROR: an error\na task\n" : "a note\n"))
-            << row.why << ": only plain notes where nothing is reported";
+        EXPECT_EQ(machine.shownInSession(), std::regex_replace(row.told, std::regex("(.*)\n"), "4000000||$1\n"))
+            << row.why;
         EXPECT_EQ(machine.logText(), "") << row.why;
     }
     RuntimeMachine machine;
@@ -171,44 +150,45 @@ TEST(LogFile, TellsShortWrites) {
 // front end is told everything, and the log ends with a whole line.
 TEST(LogFile, AnyCallMayFail) {
     for (const bool forGood : {false, true}) {
-        std::string failed = "none yet";
-        for (std::uint64_t call = 1; !failed.empty(); ++call) {
-            FaultCounter faults(call, forGood, kDiskFull);
-            RuntimeMachine machine(true);
-            machine.processes_.addProgram("uname", {.output = "Linux\n"});
-            FaultyFileSystem files(machine.files_, faults);
-            FaultyProcessHost processes(machine.processes_, faults);
-            FaultyThreads threads(machine.threads_, faults);
-            FaultyClock clock(machine.clock_, faults);
-            FaultyHostIdentity identity(machine.identity_, faults);
-            FaultyInstallerSession session(machine.session, faults);
-            URE engine({files, processes, threads, machine.console_, machine.lines_, machine.terminal_, clock, identity,
-                        &session});
-            URELogObserver* log = URELogObserver::getInstance(engine);
-            log->setLogFile(RuntimeMachine::kLogFile);
-            engine.registerObserver(*log, Takes::everything);
-            {
-                const Shown<UREExternalObserverMachineStream> shown(engine);
+        const std::uint64_t calls = sweepFaults(
+            forGood,
+            [](FaultyMachine& machine) {
+                machine.processes_.addProgram(RuntimeMachine::kFolder, {});
+                machine.processes_.addProgram("uname", {.output = "Linux\n"});
+                machine.files_.add(std::string(RuntimeMachine::kFolder) + "readme");
+            },
+            [](FaultyMachine& machine) {
+                FaultyClock clock(machine.clock_, machine.faults_);
+                FaultyHostIdentity identity(machine.identity_, machine.faults_);
+                MemoryInstallerSession kept;
+                FaultyInstallerSession session(kept, machine.faults_);
+                URE engine({machine.files(), machine.processes(), machine.threads(), machine.console_, machine.lines_,
+                            machine.terminal_, clock, identity, &session});
+                const ObserversEnd end;
+                URELogObserver* log = URELogObserver::getInstance(engine);
+                log->setLogFile(RuntimeMachine::kLogFile);
+                engine.registerObserver(*log, Takes::everything);
+                engine.registerObserver(*UREExternalObserverMachineStream::getInstance(engine));
                 engine.startTask(1, 10, true, "Copying files");
                 log->writeFunction("in words");
                 engine.endTask(10, true, "Copying files");
                 log->writeHeader(true);
-            }
-            URELogObserver::release();
-            failed = faults.failed();
-            EXPECT_TRUE(machine.console_.output.ends_with(
-                "MESSAGE INFO INSTALLSTART\n"
-                "PROGRESS TASK START :: INSTALLATION :: 1 :: 10 :: Copying files\n"
-                "MESSAGE ERROR GENERAL :: writeFunction, step 10: in words\n"
-                "PROGRESS TASK END :: INSTALLATION :: 10 :: Copying files\n"
-                "MESSAGE INFO INSTALLEND :: " +
-                std::string(failed == "shortPath" ? "" : RuntimeMachine::kLogFile) + "\n"))
-                << failed << call << "\n"
-                << machine.console_.output;
-            const std::string text = machine.logText();
-            EXPECT_TRUE(text.empty() || text.ends_with('\n')) << failed << call << "\n" << text;
-            EXPECT_TRUE(!failed.empty() || call > 40) << "the sweep reaches every step";
-        }
+                return kSuccess;
+            },
+            [](FaultyMachine& machine, Status) {
+                const std::string named = machine.faults_.failed() == "shortPath" ? "" : RuntimeMachine::kLogFile;
+                EXPECT_EQ(machine.console_.output,
+                          "MESSAGE INFO INSTALLSTART\n"
+                          "PROGRESS TASK START :: INSTALLATION :: 1 :: 10 :: Copying files\n"
+                          "MESSAGE ERROR GENERAL :: writeFunction, step 10: in words\n"
+                          "PROGRESS TASK END :: INSTALLATION :: 10 :: Copying files\n"
+                          "MESSAGE INFO INSTALLEND :: " +
+                              named + "\n");
+                const std::string log = machine.files_.content(RuntimeMachine::kLogFile);
+                EXPECT_TRUE(log.empty() || log.ends_with('\n')) << log;
+                EXPECT_EQ(machine.files_.openFiles(), 0U);
+            });
+        EXPECT_GT(calls, 40U) << "the sweep reaches every step";
     }
 }
 

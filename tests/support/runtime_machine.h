@@ -3,7 +3,11 @@
 
 #include <gtest/gtest.h>
 
+#include <array>
+#include <ios>
+#include <sstream>
 #include <string>
+#include <utility>
 
 #include "install/platform/memory/installer_session.h"
 #include "install/platform/memory/platform.h"
@@ -12,22 +16,6 @@
 #include "install/runtime/ure.h"
 
 namespace kz7::test {
-
-// A stream that shows what the engine does for as long as the object is there.
-template <typename Stream>
-class Shown {
-public:
-    explicit Shown(URE& engine) : engine_(engine) { engine.registerObserver(*Stream::getInstance(engine)); }
-    ~Shown() {
-        engine_.unregisterObserver(*Stream::getInstance(engine_));
-        Stream::release();
-    }
-    Shown(const Shown&) = delete;
-    Shown& operator=(const Shown&) = delete;
-
-private:
-    URE& engine_;
-};
 
 // The process-wide observers of a test go with it, and nothing may then be open.
 class RuntimeMachine : public MemoryPlatform {
@@ -39,6 +27,7 @@ public:
     ~RuntimeMachine() override {
         ObserversEnd{};
         EXPECT_EQ(files_.openFiles() + processes_.openHandles() + session.openHandles(), 0U);
+        EXPECT_EQ(registry_.openHandles(), 0U);
     }
     RuntimeMachine(const RuntimeMachine&) = delete;
     RuntimeMachine& operator=(const RuntimeMachine&) = delete;
@@ -58,6 +47,24 @@ public:
         const std::size_t before = logText().size();
         action();
         return logText().substr(before);
+    }
+
+    // Raises a message that is nothing but a text.
+    void say(std::uint32_t code, std::string_view text) {
+        engine.message(code, kTextMessage, std::array<Insert, 1>{text});
+    }
+
+    // What the session showed since the last look: "kind|field|field", a line for each message.
+    std::string shownInSession() {
+        std::ostringstream text;
+        for (const auto& message : std::exchange(session.messages, {})) {
+            text << std::hex << message.kind;
+            for (const std::string& field : message.fields) {
+                text << '|' << field;
+            }
+            text << '\n';
+        }
+        return text.str();
     }
 
     static constexpr const char* kFolder = "C:\\Setup Logs\\";
