@@ -9,7 +9,7 @@
 namespace kz7::test {
 namespace {
 
-class ServicesContract : public testing::TestWithParam<const char*> {
+class ServicesContract : public Contract {
 protected:
     ServicesContract() { EXPECT_EQ(services_.openManager(kServiceManagerAllAccess, manager_.receive()), kSuccess); }
     ~ServicesContract() override {
@@ -32,9 +32,8 @@ protected:
     auto settled(Call call, Again again) {
         const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(60);
         auto answer = call();
-        while (again(answer) && std::chrono::steady_clock::now() < end) {
+        for (; again(answer) && std::chrono::steady_clock::now() < end; answer = call()) {
             std::this_thread::yield();
-            answer = call();
         }
         return answer;
     }
@@ -45,20 +44,17 @@ protected:
                        [](Status status) { return status == kDatabaseLocked; });
     }
     ServiceState stateOf(const OwnedService& service) {
+        const auto state = [&] {
+            ServiceState found{};
+            EXPECT_EQ(services_.queryState(service.get(), found), kSuccess);
+            return found;
+        };
         return settled(
-            [&] {
-                ServiceState state{};
-                EXPECT_EQ(services_.queryState(service.get(), state), kSuccess);
-                return state;
-            },
-            [](ServiceState state) {
-                return state == ServiceState::startPending || state == ServiceState::stopPending;
-            });
+            state, [](ServiceState found) { return found != ServiceState::running && found != ServiceState::stopped; });
     }
 
     static constexpr auto kName = "KZ7ContractTest";
-    std::unique_ptr<Backend> backend_ = backendNamed(GetParam());
-    IServiceManager& services_ = backend_->platform().services();
+    IServiceManager& services_ = platform_.services();
     OwnedService manager_{services_};
 };
 
@@ -66,10 +62,10 @@ INSTANTIATE_TEST_SUITE_P(Managers, ServicesContract, testing::ValuesIn(kBackends
 
 TEST_P(ServicesContract, AServiceIsMadeFoundRunAndDeleted) {
     OwnedService service(services_);
+    OwnedService second(services_);
     EXPECT_EQ(open(kName, service), kServiceDoesNotExist);
     ASSERT_EQ(create(service, kName, backend_->program()), kSuccess);
     EXPECT_EQ(stateOf(service), ServiceState::stopped);
-    OwnedService second(services_);
     EXPECT_EQ(create(second, "kz7CONTRACTtest", backend_->program()), kServiceExists) << "names compare without case";
     EXPECT_FALSE(second);
     EXPECT_EQ(open("kz7CONTRACTtest", second), kSuccess);
@@ -83,7 +79,6 @@ TEST_P(ServicesContract, AServiceIsMadeFoundRunAndDeleted) {
         EXPECT_EQ(stateOf(service), ServiceState::running) << "a new start type leaves the rest";
         EXPECT_EQ(services_.stopService(service.get()), kSuccess);
         EXPECT_EQ(stateOf(service), ServiceState::stopped);
-        EXPECT_EQ(services_.stopService(second.get()), kServiceNotActive);
         EXPECT_EQ(services_.changeStartType(service.get(), ServiceStart::automatic), kSuccess);
     }
 
@@ -104,17 +99,14 @@ TEST_P(ServicesContract, AServiceIsMadeFoundRunAndDeleted) {
     for (const std::string& name : {std::string(), std::string("a/b"), std::string("a\\b"), std::string(257, 's')}) {
         EXPECT_EQ(create(second, name, backend_->program()), kInvalidName) << name;
         EXPECT_EQ(open(name, second), kInvalidName) << name;
-        EXPECT_FALSE(second) << name;
     }
 }
 
 TEST_P(ServicesContract, HandlesAreJudgedByWhatTheyAreAndMayDo) {
-    OwnedService service(services_);
-    ASSERT_EQ(create(service, kName, backend_->program()), kSuccess);
     OwnedService query(services_);
-    ASSERT_EQ(open(kName, query, kServiceQueryStatus), kSuccess);
     OwnedService other(services_);
-    ASSERT_EQ(open(kName, other), kSuccess);
+    ASSERT_EQ(create(other, kName, backend_->program()), kSuccess);
+    ASSERT_EQ(open(kName, query, kServiceQueryStatus), kSuccess);
     const ServiceHandle closed = other.get();
     other.reset();
     for (const ServiceHandle handle : {closed, ServiceHandle::none, manager_.get(), query.get()}) {
@@ -126,7 +118,7 @@ TEST_P(ServicesContract, HandlesAreJudgedByWhatTheyAreAndMayDo) {
         ServiceState state{};
         EXPECT_EQ(services_.queryState(handle, state), handle == query.get() ? kSuccess : kInvalidHandle);
     }
-    EXPECT_EQ(services_.openService(service.get(), kName, kServiceAllAccess, other.receive()), kInvalidHandle);
+    EXPECT_EQ(services_.openService(query.get(), kName, kServiceAllAccess, other.receive()), kInvalidHandle);
     EXPECT_EQ(services_.closeHandle(closed), kInvalidHandle);
     EXPECT_EQ(services_.closeHandle(ServiceHandle::none), kInvalidHandle);
 }

@@ -222,7 +222,7 @@ protected:
         return InstallProcess(*host_, *threads_, sink_, (childProgram() + " " + arguments).c_str());
     }
 
-    std::unique_ptr<Backend> backend_ = hostBackend();
+    std::unique_ptr<Backend> backend_ = backendNamed("host");
     IProcessHost* host_ = &backend_->platform().processes();
     IThreads* threads_ = &backend_->platform().threads();
     ListedSink sink_;

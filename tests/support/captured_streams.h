@@ -10,13 +10,10 @@ namespace kz7::test {
 
 class CapturedStreams {
 public:
-    // Standard output, or standard error with it.
-    explicit CapturedStreams(bool both) : output_(dup(1)), error_(dup(2)), file_(std::tmpfile()) {
+    CapturedStreams() : output_(dup(1)), error_(dup(2)), file_(std::tmpfile()) {
         std::fflush(stdout);
         dup2(fileno(file_), 1);
-        if (both) {
-            dup2(fileno(file_), 2);
-        }
+        dup2(fileno(file_), 2);
     }
     ~CapturedStreams() { std::fclose(file_); }
     CapturedStreams(const CapturedStreams&) = delete;
