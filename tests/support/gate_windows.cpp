@@ -26,11 +26,6 @@ void waitAtGate(const char* name) {
     CloseHandle(event);
 }
 
-void closeStandardStreams() {
-    CloseHandle(GetStdHandle(STD_OUTPUT_HANDLE));
-    CloseHandle(GetStdHandle(STD_ERROR_HANDLE));
-}
-
 bool startInheriting(const char* program, const char* mode, const char* argument) {
     std::string commandLine = std::string("\"") + program + "\" " + mode + " " + argument;
     STARTUPINFOA startup{};
