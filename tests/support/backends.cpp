@@ -1,10 +1,14 @@
 #include "tests/support/backends.h"
 
+#include <unistd.h>
+
+#include <cstdio>
 #include <cstring>
 #include <fstream>
+#include <utility>
+#include <vector>
 
 #include "install/platform/memory/platform.h"
-#include "tests/support/captured_streams.h"
 #include "tests/support/temporary_directory.h"
 
 namespace kz7::test {
@@ -39,6 +43,47 @@ private:
     MemoryPlatform platform_;
 };
 
+// Streams of this process as a file that holds a text, for as long as the object is there.
+class Redirected {
+public:
+    explicit Redirected(const std::vector<int>& streams, const std::string& text = {}) {
+        std::fwrite(text.data(), 1, text.size(), file_);
+        std::rewind(file_);
+        std::fflush(stdout);
+        for (const int stream : streams) {
+            kept_.emplace_back(stream, dup(stream));
+            dup2(fileno(file_), stream);
+        }
+        std::clearerr(stdin);
+    }
+    ~Redirected() {
+        std::fflush(stdout);
+        for (const auto& [stream, kept] : kept_) {
+            dup2(kept, stream);
+            close(kept);
+        }
+        std::clearerr(stdin);
+        std::fclose(file_);
+    }
+    Redirected(const Redirected&) = delete;
+    Redirected& operator=(const Redirected&) = delete;
+
+    // What was written, with plain line feeds.
+    std::string text() const {
+        std::fflush(stdout);
+        std::rewind(file_);
+        std::string text;
+        for (int c = std::fgetc(file_); c != EOF; c = std::fgetc(file_)) {
+            text.append(c == '\r' ? 0 : 1, static_cast<char>(c));
+        }
+        return text;
+    }
+
+private:
+    std::FILE* file_ = std::tmpfile();
+    std::vector<std::pair<int, int>> kept_;
+};
+
 class HostBackend final : public Backend {
 public:
     HostBackend() {
@@ -58,13 +103,13 @@ public:
         std::ofstream(ports_.hostFolder / "bin/kz7nmpdata.dll") << "provider";
     }
     void reading(const std::string& input, const std::function<void()>& body) override {
-        const FedInput fed(input);
+        const Redirected fed({0}, input);
         body();
     }
     std::string written(const std::function<void(IConsole&)>& writing) override {
-        CapturedStreams streams;
+        const Redirected streams({1, 2});
         writing(platform().console());
-        return streams.end();
+        return streams.text();
     }
 
 private:
