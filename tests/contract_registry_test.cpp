@@ -1,10 +1,8 @@
 // What every registry must do alike: the one in memory and this machine's.
 #include <gtest/gtest.h>
 
-#include <algorithm>
 #include <functional>
 #include <sstream>
-#include <vector>
 
 #include "install/src/registry_access.h"
 #include "tests/support/backends.h"
@@ -51,22 +49,17 @@ protected:
         FixedBuffer<16> keyClass;
         const Status status = ofKeys ? registry_.enumerateKey(key_.get(), index, name_, &keyClass)
                                      : registry_.enumerateValue(key_.get(), index, name_, nullptr, nullptr);
-        const std::string shownClass = (keyClass.size == 0 ? "" : "=") + std::string(keyClass.view());
-        return status == kSuccess ? std::string(name_.view()) + shownClass : "<" + std::to_string(status) + ">";
+        return status != kSuccess   ? "<" + std::to_string(status) + ">"
+               : keyClass.size != 0 ? std::string(name_.view()) + "=" + keyClass.data
+                                    : std::string(name_.view());
     }
     std::string names(bool ofKeys) {
-        std::vector<std::string> all;
-        for (std::string name = nameAt(ofKeys, 0); name != "<259>"; name = nameAt(ofKeys, all.size())) {
-            all.push_back(name);
+        std::string all;
+        std::string name;
+        for (std::size_t index = 0; (name = nameAt(ofKeys, index)) != "<259>"; ++index) {
+            all += (index == 0 ? "" : ",") + name;
         }
-        if (!ofKeys && differences_.ordersValuesByName) {
-            std::sort(all.begin(), all.end());
-        }
-        std::string text;
-        for (const std::string& name : all) {
-            text += (text.empty() ? "" : ",") + name;
-        }
-        return text;
+        return all;
     }
 
     // What the steps of a script answer, with blanks between them; "@" is the empty name.
@@ -127,7 +120,7 @@ TEST_P(RegistryContract, StepsAnswerAlike) {
          "make b; make _x; make A; make z0; make Z1; make aa; make 1; make ~; keys",
          differences_.ordersKeysByLowerCase ? "0 0 0 0 0 0 0 0 1,_x,A,aa,b,z0,Z1,~" : "0 0 0 0 0 0 0 0 1,A,aa,b,z0,Z1,_x,~"},
         {"values by age", "set b; set _x; set A; set z0; set a again; unset Z0; set Z0; values",
-         differences_.ordersValuesByName ? "0 0 0 0 0 0 0 A,Z0,_x,b" : "0 0 0 0 0 0 0 b,_x,A,Z0"},
+         differences_.ordersValuesByName ? "0 0 0 0 0 0 0 _x,A,b,Z0" : "0 0 0 0 0 0 0 b,_x,A,Z0"},
         {"a class stays with its key", "make One its; make One late; keys",
          differences_.passesClassesOn ? "0 0 One=late" : "0 0 One=its"},
         {"parents that are made have none", "make Two\\Three its; keys",

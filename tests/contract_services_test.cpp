@@ -1,9 +1,6 @@
 // What every service manager must do alike: the one in memory and this machine's.
 #include <gtest/gtest.h>
 
-#include <chrono>
-#include <thread>
-
 #include "tests/support/backends.h"
 
 namespace kz7::test {
@@ -27,30 +24,16 @@ protected:
     Status open(std::string_view name, OwnedService& service, std::uint32_t access = kServiceAllAccess) {
         return services_.openService(manager_.get(), name, access, service.receive());
     }
-    // Calls again while the answer says so; a manager that never comes to an end shows in the answer.
-    template <typename Call, typename Again>
-    auto settled(Call call, Again again) {
-        const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(60);
-        auto answer = call();
-        for (; again(answer) && std::chrono::steady_clock::now() < end; answer = call()) {
-            std::this_thread::yield();
-        }
-        return answer;
-    }
     Status start(const OwnedService& service) {
         // A machine that is still starting its own services starts no other.
         constexpr Status kDatabaseLocked = 1055;
-        return settled([&] { return services_.startService(service.get()); },
-                       [](Status status) { return status == kDatabaseLocked; });
+        Status status = kDatabaseLocked;
+        eventually([&] { return (status = services_.startService(service.get())) != kDatabaseLocked; });
+        return status;
     }
-    ServiceState stateOf(const OwnedService& service) {
-        const auto state = [&] {
-            ServiceState found{};
-            EXPECT_EQ(services_.queryState(service.get(), found), kSuccess);
-            return found;
-        };
-        return settled(
-            state, [](ServiceState found) { return found != ServiceState::running && found != ServiceState::stopped; });
+    bool becomes(const OwnedService& service, ServiceState expected) {
+        ServiceState state{};
+        return eventually([&] { return services_.queryState(service.get(), state) == kSuccess && state == expected; });
     }
 
     static constexpr auto kName = "KZ7ContractTest";
@@ -65,7 +48,7 @@ TEST_P(ServicesContract, AServiceIsMadeFoundRunAndDeleted) {
     OwnedService second(services_);
     EXPECT_EQ(open(kName, service), kServiceDoesNotExist);
     ASSERT_EQ(create(service, kName, backend_->program()), kSuccess);
-    EXPECT_EQ(stateOf(service), ServiceState::stopped);
+    EXPECT_TRUE(becomes(service, ServiceState::stopped));
     EXPECT_EQ(create(second, "kz7CONTRACTtest", backend_->program()), kServiceExists) << "names compare without case";
     EXPECT_FALSE(second);
     EXPECT_EQ(open("kz7CONTRACTtest", second), kSuccess);
@@ -73,12 +56,12 @@ TEST_P(ServicesContract, AServiceIsMadeFoundRunAndDeleted) {
     EXPECT_EQ(services_.stopService(service.get()), kServiceNotActive);
     for (const ServiceStart type : {ServiceStart::disabled, ServiceStart::automatic}) {
         EXPECT_EQ(start(service), kSuccess);
-        EXPECT_EQ(stateOf(second), ServiceState::running);
+        EXPECT_TRUE(becomes(second, ServiceState::running));
         EXPECT_EQ(start(second), kServiceAlreadyRunning);
         EXPECT_EQ(services_.changeStartType(service.get(), type), kSuccess);
-        EXPECT_EQ(stateOf(service), ServiceState::running) << "a new start type leaves the rest";
+        EXPECT_TRUE(becomes(service, ServiceState::running)) << "a new start type leaves the rest";
         EXPECT_EQ(services_.stopService(service.get()), kSuccess);
-        EXPECT_EQ(stateOf(service), ServiceState::stopped);
+        EXPECT_TRUE(becomes(service, ServiceState::stopped));
         EXPECT_EQ(services_.changeStartType(service.get(), ServiceStart::automatic), kSuccess);
     }
 
@@ -92,10 +75,10 @@ TEST_P(ServicesContract, AServiceIsMadeFoundRunAndDeleted) {
     EXPECT_EQ(create(service, kName, backend_->program()), kServiceMarkedForDelete) << "while it is open elsewhere";
     second.reset();
     // A manager may hold on to it for a moment longer.
-    EXPECT_EQ(settled([&] { return open(kName, service); }, succeeded), kServiceDoesNotExist);
+    EXPECT_TRUE(eventually([&] { return open(kName, service) == kServiceDoesNotExist; }));
     EXPECT_EQ(create(service, kName, backend_->folder() + "\\absent.exe"), kSuccess) << "its name is free again";
     EXPECT_EQ(start(service), kFileNotFound);
-    EXPECT_EQ(stateOf(service), ServiceState::stopped);
+    EXPECT_TRUE(becomes(service, ServiceState::stopped));
     for (const std::string& name : {std::string(), std::string("a/b"), std::string("a\\b"), std::string(257, 's')}) {
         EXPECT_EQ(create(second, name, backend_->program()), kInvalidName) << name;
         EXPECT_EQ(open(name, second), kInvalidName) << name;

@@ -185,7 +185,7 @@ protected:
     StreamHandle error_ = StreamHandle::none;
 };
 
-TEST_F(RealProcess, CapturesWhatProgramsWriteAndHowTheyEnd) {
+TEST_F(RealProcess, CapturesWhatProgramsWriteAndHowTheyEndAndRestoresBothSlotsThroughOne) {
     Gate gate;
     const std::string flood(kFloodMebibytes << 20, 'x');
     // clang-format off
@@ -202,7 +202,10 @@ TEST_F(RealProcess, CapturesWhatProgramsWriteAndHowTheyEnd) {
         {"close " + gate.name() + " 9",   false, "0 9 ",                 "waited for although it closes its output at once"},
     };
     // clang-format on
+    StreamHandle before = StreamHandle::none;
+    StreamHandle now = StreamHandle::none;
     for (const auto& row : rows) {
+        host_->getSlot(StandardSlot::error, before);
         InstallProcess process = make(row.arguments);
         EXPECT_EQ(process.execute(row.wait, false), kSuccess) << row.why;
         if (row.arguments.find(gate.name()) != std::string::npos) {
@@ -210,21 +213,10 @@ TEST_F(RealProcess, CapturesWhatProgramsWriteAndHowTheyEnd) {
         }
         const std::string told = ending(process, sink_);
         EXPECT_TRUE(told == row.ending) << row.why << ": " << told.substr(0, 100);
-    }
-}
-
-TEST_F(RealProcess, RestoresBothSlotsThroughTheOneOfStandardOutput) {
-    StreamHandle output = StreamHandle::none;
-    StreamHandle error = StreamHandle::none;
-    for (int run = 0; run < 3; ++run) {
-        host_->getSlot(StandardSlot::error, error);
-        InstallProcess process = make("print said cried 0");
-        process.execute(true, false);
-        EXPECT_EQ(ending(process, sink_), "0 0 said|cried") << run;
-        host_->getSlot(StandardSlot::output, output);
-        EXPECT_EQ(output, error) << "standard output holds the old standard error";
-        host_->getSlot(StandardSlot::error, error);
-        EXPECT_NE(error, error_) << "standard error names a closed pipe";
+        host_->getSlot(StandardSlot::output, now);
+        EXPECT_EQ(now, before) << "the slot of standard output holds the old standard error";
+        host_->getSlot(StandardSlot::error, now);
+        EXPECT_NE(now, error_) << "that of standard error names a closed pipe";
     }
 }
 
@@ -245,8 +237,8 @@ TEST_F(RealProcess, ATimeoutStopsTheReadersAndLeavesTheProgram) {
         EXPECT_FALSE(ending(flood, sink_).starts_with("0 259 ")) << "nobody reads: its writing ends it";
 
         gate.open();
-        EXPECT_EQ(ending(quiet, sink_).substr(0, 2), "0 ");
-        EXPECT_FALSE(ending(quiet, sink_).starts_with("0 259 ")) << "it ran to an end of its own";
+        const std::string told = ending(quiet, sink_);
+        EXPECT_TRUE(told == "0 8 " || told == "0 141 ") << "it ran to an end of its own: " << told;
     }
 }
 

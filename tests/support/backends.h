@@ -8,6 +8,7 @@
 #include <functional>
 #include <memory>
 #include <string>
+#include <thread>
 
 #include "install/platform/platform.h"
 
@@ -67,6 +68,16 @@ HostPorts hostPorts(const std::string& place);
 // a pipe is slow where the host is emulated.
 std::string childProgram();
 extern const std::size_t kFloodMebibytes;
+
+// For what a system shows only a moment later: that a thread, a child or a service has ended.
+inline bool eventually(const std::function<bool()>& holds) {
+    bool held = holds();
+    for (int i = 0; i < 1'000'000 && !held; ++i) {
+        std::this_thread::yield();
+        held = holds();
+    }
+    return held;
+}
 
 // What every contract suite begins with: one of the implementations.
 class Contract : public testing::TestWithParam<const char*> {
