@@ -27,13 +27,8 @@ public:
     const std::string& path() const { return path_; }
 
 private:
-    static std::string fresh() {
-        std::random_device random;
-        const std::string name = "kz7test." + std::to_string(random()) + "." + std::to_string(random());
-        return (std::filesystem::temp_directory_path() / name).string();
-    }
-
-    std::string path_ = fresh();
+    std::string path_ =
+        (std::filesystem::temp_directory_path() / ("kz7test." + std::to_string(std::random_device()()))).string();
 };
 
 }  // namespace kz7::test
