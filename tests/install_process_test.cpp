@@ -4,11 +4,10 @@
 
 #include <set>
 
-#include "install/platform/faulty/process_host.h"
-#include "install/platform/faulty/threads.h"
 #include "install/platform/memory/process_host.h"
 #include "install/platform/memory/threads.h"
 #include "tests/support/backends.h"
+#include "tests/support/fault_sweep.h"
 #include "tests/support/gate.h"
 #include "tests/support/told_run.h"
 
@@ -115,31 +114,27 @@ TEST_F(ScriptedProcess, TellsWhatWasNotExecutedWhatCouldNotBeAndWhatRunsOn) {
 // What comes of a run when one call of it fails once: the statuses of its execution and of the wait. A failed close
 // closes, and nothing that fails after the program's end changes how it ended.
 TEST_F(ScriptedProcess, AFailedCallOfARunGivesItsCodeAndLeavesNothingOpen) {
-    host_.addProgram("C:\\k\\t.cmd", {.output = "said", .error = "cried", .exitCode = 7});
     std::set<std::string> outcomes;
     for (const bool forGood : {false, true}) {
-        std::string failed = "none yet";
-        for (std::uint64_t call = 1; !failed.empty(); ++call) {
-            FaultCounter faults(call, forGood, kGeneralFailure);
-            FaultyProcessHost host(host_, faults);
-            FaultyThreads threads(threads_, faults);
-            host_.started.clear();
-            std::string outcome;
-            {
-                InstallProcess process(host, threads, sink_, "C:\\k\\t.cmd x");
-                outcome = std::to_string(process.execute(true, false));
-                std::uint32_t code = 0;
-                const Status waited = process.waitForCompletion(code, kInfiniteWait);
-                outcome += " " + std::to_string(waited) + (host_.started.empty() ? ", not started" : "");
-                EXPECT_EQ(code, waited == kSuccess ? 7U : waited) << faults.failed() << call;
-                process.postOutput("swept", 0);
-            }
-            failed = faults.failed();
-            ASSERT_EQ(host_.openHandles() + threads_.openHandles(), 0U) << failed << call;
+        std::string outcome;
+        std::uint32_t code = 0;
+        const auto prepare = [](FaultyMachine& machine) {
+            machine.processes_.addProgram("C:\\k\\t.cmd", {.output = "said", .error = "cried", .exitCode = 7});
+        };
+        const auto run = [&](FaultyMachine& machine) {
+            InstallProcess process(machine.processes(), machine.threads(), sink_, "C:\\k\\t.cmd x");
+            outcome = std::to_string(process.execute(true, false));
+            const Status waited = process.waitForCompletion(code, kInfiniteWait);
+            process.postOutput("swept", 0);
+            return waited;
+        };
+        sweepFaults(forGood, prepare, run, [&](FaultyMachine& machine, Status waited) {
+            EXPECT_EQ(code, waited == kSuccess ? 7U : waited);
             if (!forGood) {
-                outcomes.insert(failed + ": " + outcome);
+                outcomes.insert(machine.faults_.failed() + ": " + outcome + " " + std::to_string(waited) +
+                                (machine.processes_.started.empty() ? ", not started" : ""));
             }
-        }
+        });
     }
     const std::set<std::string> expected = {
         ": 0 0", "closeProcess: 0 0", "closeStream: 0 0", "closeThread: 0 0", "getSlot: 0 0", "read: 0 0",
@@ -151,7 +146,7 @@ TEST_F(ScriptedProcess, AFailedCallOfARunGivesItsCodeAndLeavesNothingOpen) {
         "startThread: 0 0",  // that of the first reader is not told
         "startProcess: 0 5082, not started", "exitCode: 0 5082"};
     EXPECT_EQ(outcomes, expected);
-    EXPECT_NE(sink_.lines.find("trace 67108865 ureCreateThread 30 31 \n"), std::string::npos);
+    EXPECT_NE(sink_.lines.find("trace 67108865 ureCreateThread 30 4321 \n"), std::string::npos);
     EXPECT_EQ(ureCreateThread(threads_, sink_, nullptr, nullptr, nullptr), kNullArgument);
 }
 

@@ -58,24 +58,20 @@ protected:
 };
 
 TEST_F(PosixProcess, FindsProgramsWhereTheProductAndTheHostKeepThem) {
-    const char* const script = "#!/bin/sh\nprintf '[%s]' \"$@\"\n";
-    const struct {
-        std::string path;
-        const char* text;
-        mode_t mode = 0755;
-    } files[] = {{"drive_c/Program Files/x/run.cmd", script},
-                 {"drive_c/Program", "in the way, but no program"},
-                 {"drive_c/t.exe", script},
-                 {"drive_c/lost.exe", "#!/no/such/interpreter\n"},
-                 {"drive_c/plain.exe", script, 0644},
-                 {"path/bare", script},
-                 {"path/added.exe", script},
-                 {"here/stray", script}};
-    for (const auto& file : files) {
-        const fs::path path = fs::path(root_) / file.path;
+    const std::string script = "#!/bin/sh\nprintf '[%s]' \"$@\"\n";
+    const std::pair<std::string, std::string> files[] = {{"drive_c/Program Files/x/run.cmd", script},
+                                                         {"drive_c/Program", "in the way, but no program"},
+                                                         {"drive_c/t.exe", script},
+                                                         {"drive_c/lost.exe", "#!/no/such/interpreter\n"},
+                                                         {"drive_c/plain.exe", script},
+                                                         {"path/bare", script},
+                                                         {"path/added.exe", script},
+                                                         {"here/stray", script}};
+    for (const auto& [name, text] : files) {
+        const fs::path path = fs::path(root_) / name;
         fs::create_directories(path.parent_path());
-        overwrite(path, file.text);
-        chmod(path.c_str(), file.mode);
+        overwrite(path, text);
+        chmod(path.c_str(), name == "drive_c/plain.exe" ? 0644 : 0755);
     }
     // clang-format off
     const struct { std::string commandLine; const char* output; const char* why; } rows[] = {

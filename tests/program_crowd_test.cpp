@@ -12,8 +12,6 @@
 #include <random>
 #include <set>
 
-#include "install/platform/embedded/registry.h"
-#include "tests/support/registry_dump.h"
 #include "tests/support/state_directory.h"
 
 namespace kz7::test {
@@ -92,8 +90,7 @@ std::set<std::string> statesOfChildren(const StateDirectory& start, const Argume
     EXPECT_EQ(state.tool(command, {{hook}, {}}).exitCode, 0);
     std::set<std::string> states;
     for (const auto& entry : std::filesystem::directory_iterator(seen.path())) {
-        EmbeddedRegistry registry(entry.path(), true, [](const StoreFault&) {});
-        states.insert(dumpRegistry(registry));
+        states.insert(StateDirectory::dumpOf(entry.path()));
     }
     return states;
 }

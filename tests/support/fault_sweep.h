@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <functional>
+#include <optional>
 #include <string>
 
 #include "install/platform/faulty/assembly_cache.h"
@@ -54,12 +55,14 @@ inline std::uint64_t sweepFaults(bool forGood, const std::function<void(FaultyMa
                                  const std::function<Status(FaultyMachine&)>& flow,
                                  const std::function<void(FaultyMachine&, Status)>& check) {
     for (std::uint64_t call = 1;; ++call) {
+        std::optional<testing::ScopedTrace> row;  // goes after the machine, which looks for what was left open
         FaultyMachine machine(FaultCounter(0, false, kFault));
         prepare(machine);
         machine.faults_ = FaultCounter(call, forGood, kFault);
         const Status status = flow(machine);
         const std::string failed = machine.faults_.failed();
-        SCOPED_TRACE("call " + std::to_string(call) + " (" + failed + ") fails" + (forGood ? " for good" : ""));
+        row.emplace(__FILE__, __LINE__,
+                    "call " + std::to_string(call) + " (" + failed + ") fails" + (forGood ? " for good" : ""));
         check(machine, status);
         if (failed.empty()) {
             return machine.faults_.calls();

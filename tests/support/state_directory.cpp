@@ -20,9 +20,9 @@ pid_t StateDirectory::start(Arguments arguments) const {
     return startProgram(arguments, {{"KZ7_STATE_DIR=" + path()}, {}});
 }
 
-std::string StateDirectory::dump() const {
+std::string StateDirectory::dumpOf(const std::string& folder) {
     std::string faults;
-    EmbeddedRegistry registry(path(), true,
+    EmbeddedRegistry registry(folder, true,
                               [&](const StoreFault& fault) { faults += "fault: " + fault.reason + "\n"; });
     std::string text = dumpRegistry(registry);
     return faults + text;

@@ -26,8 +26,10 @@ public:
     // Starts the tool without waiting; output and errors are dropped.
     pid_t start(Arguments arguments) const;
 
-    // Everything in the store; a store that is not there reads as empty. A fault of the store is told in the text.
-    std::string dump() const;
+    // Everything in the store of a folder, or this one; a store that is not there reads as empty. A fault of the store
+    // is told in the text.
+    static std::string dumpOf(const std::string& folder);
+    std::string dump() const { return dumpOf(path()); }
 
     // "ok", or what SQLite's own check finds.
     std::string integrity() const;
