@@ -2,6 +2,7 @@
 #include <gtest/gtest.h>
 
 #include <functional>
+#include <numeric>
 #include <sstream>
 
 #include "install/src/registry_access.h"
@@ -210,10 +211,8 @@ TEST_P(RegistryContract, PathsAreReadAlike) {
 }
 
 TEST_P(RegistryContract, ValuesKeepEveryByte) {
-    std::string allBytes;
-    for (int byte = 0; byte < 256; ++byte) {
-        allBytes += static_cast<char>(byte);
-    }
+    std::string allBytes(256, '\0');
+    std::iota(allBytes.begin(), allBytes.end(), '\0');
     // clang-format off
     const struct { const char* why; ValueType type; std::string data; } rows[] = {
         {"every byte",             ValueType::binary,          allBytes},
