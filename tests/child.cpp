@@ -1,21 +1,14 @@
 // A program for the tests of process execution: each of its modes is one thing that a started program may do
 // to whoever started it.
 #include <cstdio>
-#include <cstdlib>
 #include <string>
 
 #include "tests/support/gate.h"
 
-namespace {
-
 using namespace kz7::test;
 
-int number(const char* text) {
-    return std::atoi(text);
-}
-
 // Writes to both streams in turn until a write fails or all is written.
-bool flood(long pieces) {
+static bool flood(long pieces) {
     const std::string piece(64 * 1024, 'x');
     for (long written = 0; written != pieces; ++written) {
         if (std::fwrite(piece.data(), 1, piece.size(), stdout) != piece.size() ||
@@ -26,16 +19,14 @@ bool flood(long pieces) {
     return std::fflush(stdout) == 0;
 }
 
-}  // namespace
-
 int main(int argc, char** argv) {
     const std::string mode = argc > 1 ? argv[1] : "";
     const char* first = argc > 2 ? argv[2] : "";
-    const char* second = argc > 3 ? argv[3] : "";
+    const int code = argc > 3 ? std::atoi(argv[argc - 1]) : 0;
     if (mode == "print") {  // OUTPUT ERROR CODE
         std::fputs(first, stdout);
-        std::fputs(second, stderr);
-        return number(argc > 4 ? argv[4] : "0");
+        std::fputs(argv[3], stderr);
+        return code;
     }
     if (mode == "arguments") {
         for (int i = 2; i < argc; ++i) {
@@ -44,7 +35,7 @@ int main(int argc, char** argv) {
         return 0;
     }
     if (mode == "flood") {  // MIB CODE; 0 MIB: until nobody reads
-        return flood(number(first) == 0 ? -1 : 16L * number(first)) ? number(second) : 1;
+        return flood(std::atoi(first) == 0 ? -1 : 16L * std::atoi(first)) ? code : 1;
     }
     if (mode == "input") {  // counts what it can read
         long count = 0;
@@ -55,14 +46,15 @@ int main(int argc, char** argv) {
         return 0;
     }
     if (mode == "close") {  // GATE CODE: closes its output, then runs on to the gate
-        closeStandardStreams();
+        std::fclose(stdout);
+        std::fclose(stderr);
         waitAtGate(first);
-        return number(second);
+        return code;
     }
     if (mode == "gate") {  // GATE CODE
         waitAtGate(first);
         std::fputs(" and after", stdout);
-        return number(second);
+        return code;
     }
     if (mode == "leave") {  // GATE: leaves its pipes to a program that waits at the gate
         std::fputs("before", stdout);

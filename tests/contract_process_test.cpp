@@ -2,18 +2,16 @@
 #include <gtest/gtest.h>
 
 #include <filesystem>
-#include <random>
 
 #include "tests/support/backends.h"
+#include "tests/support/temporary_directory.h"
 
 namespace kz7::test {
 namespace {
 
-class ProcessHostContract : public testing::TestWithParam<const char*> {
+class ProcessHostContract : public Contract {
 protected:
-    std::unique_ptr<Backend> backend_ = backendNamed(GetParam());
-    IProcessHost* host_ = &backend_->platform().processes();
-    StreamHandle copy_ = StreamHandle::none;
+    IProcessHost* host_ = &platform_.processes();
     FixedBuffer<3> piece_;
 };
 
@@ -22,16 +20,16 @@ INSTANTIATE_TEST_SUITE_P(Hosts, ProcessHostContract, testing::ValuesIn(kBackends
 TEST_P(ProcessHostContract, PipesCarryBytesToTheirEndAndTellWhenTheOtherSideIsGone) {
     OwnedStream reading(*host_);
     OwnedStream writing(*host_);
-    ASSERT_EQ(host_->createPipe(reading.receive(), writing.receive()), kSuccess);
     OwnedStream copy(*host_);
+    ASSERT_EQ(host_->createPipe(reading.receive(), writing.receive()), kSuccess);
     ASSERT_EQ(host_->duplicate(reading.get(), copy.receive()), kSuccess);
     reading.reset();
     const std::string bytes("one\0two", 7);
     EXPECT_EQ(host_->write(writing.get(), bytes), kSuccess);
     writing.reset();
     std::string all;
-    Status ending = host_->read(copy.get(), piece_);
-    for (; ending == kSuccess; ending = host_->read(copy.get(), piece_)) {
+    Status ending = kSuccess;
+    while ((ending = host_->read(copy.get(), piece_)) == kSuccess) {
         all += piece_.view();
     }
     EXPECT_EQ(all, bytes);
@@ -44,9 +42,10 @@ TEST_P(ProcessHostContract, PipesCarryBytesToTheirEndAndTellWhenTheOtherSideIsGo
 
 TEST_P(ProcessHostContract, HandlesThatAreNotOpenAreRefused) {
     std::uint32_t code = 77;
+    OwnedStream copy(*host_);
     EXPECT_EQ(host_->read(StreamHandle::none, piece_), kInvalidHandle);
     EXPECT_EQ(host_->write(StreamHandle::none, "x"), kInvalidHandle);
-    EXPECT_EQ(host_->duplicate(StreamHandle::none, copy_), kInvalidHandle);
+    EXPECT_EQ(host_->duplicate(StreamHandle::none, copy.receive()), kInvalidHandle);
     EXPECT_EQ(host_->closeStream(StreamHandle::none), kInvalidHandle);
     EXPECT_EQ(host_->waitProcess(ProcessHandle::none, kInfiniteWait), kInvalidHandle);
     EXPECT_EQ(host_->exitCode(ProcessHandle::none, code), kInvalidHandle);
@@ -56,19 +55,19 @@ TEST_P(ProcessHostContract, HandlesThatAreNotOpenAreRefused) {
 
 TEST_P(ProcessHostContract, ProgramsThatAreNotThereDoNotStart) {
     namespace fs = std::filesystem;
+    const TemporaryDirectory directory;
+    const fs::path folder = directory.path();
     const fs::path before = fs::current_path();
-    const fs::path folder = fs::temp_directory_path() / ("kz7-stray-" + std::to_string(std::random_device()()));
-    fs::create_directories(folder);
     fs::copy_file(childProgram(), folder / "kz7_stray.exe");
     fs::current_path(folder);
     // clang-format off
     const struct { std::string commandLine; bool pathMayBeNamed; const char* why; } rows[] = {
-        {"\"/no such/program.exe\" x",                                   true,  "no such file"},
-        {"..\\" + folder.filename().string() + "\\kz7_stray.exe x",      true,  "nothing is started from the current folder"},
-        {"kz7-no-such-program",                                          true,  "nowhere on the search path"},
-        {"kz7_stray.exe",                                                false, "a bare name in the current folder"},
-        {"kz7_stray",                                                    false, "the same without its ending"},
-        {"\"kz7_stray.exe\" input",                                      false, "the same in quotes"},
+        {"\"/no such/program.exe\" x",                              true,  "no such file"},
+        {"..\\" + folder.filename().string() + "\\kz7_stray.exe x", true,  "nothing is started from the current folder"},
+        {"kz7-no-such-program",                                     true,  "nowhere on the search path"},
+        {"kz7_stray.exe",                                           false, "a bare name in the current folder"},
+        {"kz7_stray",                                               false, "the same without its ending"},
+        {"\"kz7_stray.exe\" input",                                 false, "the same in quotes"},
     };
     // clang-format on
     for (const auto& row : rows) {
@@ -79,11 +78,10 @@ TEST_P(ProcessHostContract, ProgramsThatAreNotThereDoNotStart) {
         EXPECT_EQ(child.process, ProcessHandle::none) << row.why;
     }
     fs::current_path(before);
-    fs::remove_all(folder);
 }
 
 TEST_P(ProcessHostContract, ThreadsCallTheirFunctionAndAreWaitedForAnyNumberOfTimes) {
-    IThreads& threads = backend_->platform().threads();
+    IThreads& threads = platform_.threads();
     int called = 0;
     auto record = std::make_unique<ThreadStart>(ThreadStart{[](void* value) { ++*static_cast<int*>(value); }, &called});
     std::uint32_t id = 0;

@@ -5,9 +5,7 @@
 #include <cerrno>
 #include <cstdlib>
 
-namespace {
-
-bool fails() {
+static bool fails() {
     static const char* chosen = std::getenv("KZ7_FAIL_ALLOCATION");
     static const char* lasting = std::getenv("KZ7_FAIL_FOR_GOOD");
     static long count = -2;
@@ -19,27 +17,21 @@ bool fails() {
     return count == at || (lasting != nullptr && *lasting == '1' && count > at);
 }
 
-template <typename Function>
-Function next(const char* name) {
-    return reinterpret_cast<Function>(dlsym(RTLD_NEXT, name));
-}
-
-}  // namespace
-
-extern "C" void* malloc(std::size_t size) {
-    static const auto real = next<void* (*)(std::size_t)>("malloc");
+// One for malloc and one for realloc: each keeps the real function of its name.
+template <typename... Arguments>
+static void* allocate(const char* name, Arguments... arguments) {
+    static const auto real = reinterpret_cast<void* (*)(Arguments...)>(dlsym(RTLD_NEXT, name));
     if (fails()) {
         errno = ENOMEM;
         return nullptr;
     }
-    return real(size);
+    return real(arguments...);
+}
+
+extern "C" void* malloc(std::size_t size) {
+    return allocate("malloc", size);
 }
 
 extern "C" void* realloc(void* block, std::size_t size) {
-    static const auto real = next<void* (*)(void*, std::size_t)>("realloc");
-    if (fails()) {
-        errno = ENOMEM;
-        return nullptr;
-    }
-    return real(block, size);
+    return allocate("realloc", block, size);
 }

@@ -2,11 +2,13 @@
 // Each is fresh, or open on a place of its own that goes with it.
 #pragma once
 
+#include <gtest/gtest.h>
+
 #include <filesystem>
 #include <functional>
 #include <memory>
 #include <string>
-#include <string_view>
+#include <thread>
 
 #include "install/platform/platform.h"
 
@@ -30,11 +32,10 @@ public:
     virtual IPlatform& platform() = 0;
     virtual Differences differences() const { return {}; }
 
-    // The product's path of a folder that is there, and of a program in it that can run as a service.
+    // The product's path of a folder that is there, of a program in it that can run as a service, and of the sample
+    // copy's level library in it.
     virtual std::string folder() = 0;
-    virtual std::string program() = 0;
-
-    // The sample copy's level library in that folder.
+    std::string program() { return folder() + "\\Program.exe"; }
     std::string library() { return folder() + "\\kz7install64.dll"; }
 
     // Puts a data provider, which is none that a framework would take, into the bin folder below that folder.
@@ -43,25 +44,46 @@ public:
     // Does it while standard input is that text.
     virtual void reading(const std::string& input, const std::function<void()>& body) = 0;
 
-    // What `writing` brings out on standard output, or on both streams in the order in which it arrives.
-    virtual std::string written(bool both, const std::function<void(IConsole&)>& writing) = 0;
+    // What `writing` brings out on standard output and standard error, in the order in which it arrives.
+    virtual std::string written(const std::function<void(IConsole&)>& writing) = 0;
 };
 
-std::unique_ptr<Backend> hostBackend();
+inline constexpr const char* kBackends[] = {"memory", "host"};
+
+std::unique_ptr<Backend> backendNamed(const std::string& name);
+
+// This machine's ports, and what goes into the folder that they see.
+struct HostPorts {
+    std::unique_ptr<IPlatform> platform;
+    std::string folder;
+    std::filesystem::path hostFolder;
+    std::filesystem::path service;  // a program that runs as one
+    Differences differences = {};
+};
+
+// For a place of the host that nobody else uses.
+HostPorts hostPorts(const std::string& place);
 
 // The path of the program that the tests start, in the host's form, and how much it writes on each stream in a flood:
 // a pipe is slow where the host is emulated.
 std::string childProgram();
 extern const std::size_t kFloodMebibytes;
 
-// The level library of the sample copy, which is built beside the programs.
-inline std::filesystem::path sampleLibrary() {
-    return std::filesystem::path(childProgram()).parent_path().parent_path() / "examples/copy/bin/kz7install64.dll";
+// For what a system shows only a moment later: that a thread, a child or a service has ended.
+inline bool eventually(const std::function<bool()>& holds) {
+    bool held = holds();
+    for (int i = 0; i < 1'000'000 && !held; ++i) {
+        std::this_thread::yield();
+        held = holds();
+    }
+    return held;
 }
 
-// The name is one of kBackends.
-std::unique_ptr<Backend> backendNamed(std::string_view name);
-
-inline constexpr const char* kBackends[] = {"memory", "host"};
+// What every contract suite begins with: one of the implementations.
+class Contract : public testing::TestWithParam<const char*> {
+protected:
+    std::unique_ptr<Backend> backend_ = backendNamed(GetParam());
+    IPlatform& platform_ = backend_->platform();
+};
 
 }  // namespace kz7::test

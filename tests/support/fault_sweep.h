@@ -55,7 +55,7 @@ inline std::uint64_t sweepFaults(bool forGood, const std::function<void(FaultyMa
                                  const std::function<Status(FaultyMachine&)>& flow,
                                  const std::function<void(FaultyMachine&, Status)>& check) {
     for (std::uint64_t call = 1;; ++call) {
-        std::optional<testing::ScopedTrace> row;
+        std::optional<testing::ScopedTrace> row;  // goes after the machine, which looks for what was left open
         FaultyMachine machine(FaultCounter(0, false, kFault));
         prepare(machine);
         machine.faults_ = FaultCounter(call, forGood, kFault);

@@ -25,7 +25,6 @@ private:
 
 // In the child.
 void waitAtGate(const char* name);
-void closeStandardStreams();
 bool startInheriting(const char* program, const char* mode, const char* argument);
 
 }  // namespace kz7::test

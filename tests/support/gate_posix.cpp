@@ -5,24 +5,20 @@
 
 #include <cstdlib>
 #include <filesystem>
+#include <random>
 
 #include "tests/support/gate.h"
 
 namespace kz7::test {
 
-Gate::Gate() {
-    std::string folder = std::filesystem::temp_directory_path() / "kz7-gate-XXXXXX";
-    if (mkdtemp(folder.data()) == nullptr) {
-        std::abort();
-    }
-    name_ = folder + "/gate";
+Gate::Gate() : name_(std::filesystem::temp_directory_path() / ("kz7-gate-" + std::to_string(std::random_device()()))) {
     if (mkfifo(name_.c_str(), 0600) != 0) {
         std::abort();
     }
 }
 
 Gate::~Gate() {
-    std::filesystem::remove_all(std::filesystem::path(name_).parent_path());
+    unlink(name_.c_str());
 }
 
 void Gate::open() {
@@ -35,11 +31,6 @@ void waitAtGate(const char* name) {
     while (read(gate, &byte, 1) > 0) {
     }
     close(gate);
-}
-
-void closeStandardStreams() {
-    close(STDOUT_FILENO);
-    close(STDERR_FILENO);
 }
 
 bool startInheriting(const char* program, const char* mode, const char* argument) {

@@ -1,6 +1,5 @@
+#include <process.h>
 #include <windows.h>
-
-#include <string>
 
 #include "tests/support/gate.h"
 
@@ -26,21 +25,8 @@ void waitAtGate(const char* name) {
     CloseHandle(event);
 }
 
-void closeStandardStreams() {
-    CloseHandle(GetStdHandle(STD_OUTPUT_HANDLE));
-    CloseHandle(GetStdHandle(STD_ERROR_HANDLE));
-}
-
 bool startInheriting(const char* program, const char* mode, const char* argument) {
-    std::string commandLine = std::string("\"") + program + "\" " + mode + " " + argument;
-    STARTUPINFOA startup{};
-    startup.cb = sizeof startup;
-    startup.dwFlags = STARTF_USESTDHANDLES;
-    startup.hStdOutput = GetStdHandle(STD_OUTPUT_HANDLE);
-    startup.hStdError = GetStdHandle(STD_ERROR_HANDLE);
-    PROCESS_INFORMATION started{};
-    return CreateProcessA(nullptr, commandLine.data(), nullptr, nullptr, TRUE, 0, nullptr, nullptr, &startup,
-                          &started) != FALSE;
+    return _spawnl(_P_NOWAIT, program, program, mode, argument, nullptr) != -1;
 }
 
 }  // namespace kz7::test

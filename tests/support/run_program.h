@@ -12,8 +12,7 @@
 namespace kz7::test {
 
 struct ProgramResult {
-    int exitCode = -1;
-    int signal = 0;  // that ended it, if one did
+    int exitCode = 0;  // or, below 0, the signal that ended it
     std::string output;
     std::string error;
 };
@@ -31,10 +30,9 @@ void overwrite(const std::string& path, const std::string& bytes);
 // The path of one of the project's programs.
 std::string programPath(const std::string& name);
 
-// Standard input is empty.
+// Starts without waiting. Standard input is empty.
+pid_t startProgram(const std::vector<std::string>& command, const ProgramOptions& options = {},
+                   const std::string& output = "/dev/null", const std::string& error = "/dev/null");
 ProgramResult runProgram(const std::vector<std::string>& command, const ProgramOptions& options = {});
-
-// Starts without waiting; output and errors are dropped.
-pid_t startProgram(const std::vector<std::string>& command, const ProgramOptions& options = {});
 
 }  // namespace kz7::test

@@ -9,41 +9,34 @@
 
 namespace kz7::test {
 
-ProgramResult StateDirectory::run(const std::string& program, std::vector<std::string> arguments,
-                                  ProgramOptions options) const {
+ProgramResult StateDirectory::run(const std::string& program, Arguments arguments, ProgramOptions options) const {
     arguments.insert(arguments.begin(), programPath(program));
     options.environment.push_back("KZ7_STATE_DIR=" + path());
     return runProgram(arguments, options);
 }
 
-ProgramResult StateDirectory::tool(std::vector<std::string> arguments, ProgramOptions options) const {
-    return run("kz7InstallReg", std::move(arguments), std::move(options));
-}
-
-pid_t StateDirectory::start(std::vector<std::string> arguments) const {
+pid_t StateDirectory::start(Arguments arguments) const {
     arguments.insert(arguments.begin(), programPath("kz7InstallReg"));
     return startProgram(arguments, {{"KZ7_STATE_DIR=" + path()}, {}});
 }
 
-std::string StateDirectory::dump() const {
+std::string StateDirectory::dumpOf(const std::string& folder) {
     std::string faults;
-    EmbeddedRegistry registry(path(), true,
+    EmbeddedRegistry registry(folder, true,
                               [&](const StoreFault& fault) { faults += "fault: " + fault.reason + "\n"; });
     std::string text = dumpRegistry(registry);
     return faults + text;
 }
 
 std::string StateDirectory::integrity() const {
-    sqlite3* database = nullptr;
     std::string found;
+    const auto note = [](void* text, int, char** row, char**) {
+        *static_cast<std::string*>(text) += row[0];
+        return 0;
+    };
+    sqlite3* database = nullptr;
     if (sqlite3_open_v2(file("registry.db").c_str(), &database, SQLITE_OPEN_READWRITE, nullptr) != SQLITE_OK ||
-        sqlite3_exec(
-            database, "PRAGMA integrity_check",
-            [](void* text, int, char** row, char**) {
-                *static_cast<std::string*>(text) += row[0];
-                return 0;
-            },
-            &found, nullptr) != SQLITE_OK) {
+        sqlite3_exec(database, "PRAGMA integrity_check", note, &found, nullptr) != SQLITE_OK) {
         found = sqlite3_errmsg(database);
     }
     sqlite3_close(database);

@@ -8,20 +8,28 @@
 
 namespace kz7::test {
 
+using Arguments = std::vector<std::string>;
+
+inline const Arguments kAddFirst = {"-addKZ7Copy", "FIRST", "C:\\KZ7\\first"};
+inline const Arguments kAddSecond = {"-addKZ7Copy", "SECOND", "C:\\KZ7\\second"};
+
 class StateDirectory {
 public:
     const std::string& path() const { return directory_.path(); }
     std::string file(const std::string& name) const { return path() + "/" + name; }
 
-    // Runs a program of the project on this store.
-    ProgramResult run(const std::string& program, std::vector<std::string> arguments,
-                      ProgramOptions options = {}) const;
-    ProgramResult tool(std::vector<std::string> arguments, ProgramOptions options = {}) const;
+    // Runs a program of the project, or the tool, on this store.
+    ProgramResult run(const std::string& program, Arguments arguments, ProgramOptions options = {}) const;
+    ProgramResult tool(Arguments arguments, ProgramOptions options = {}) const {
+        return run("kz7InstallReg", std::move(arguments), std::move(options));
+    }
     // Starts the tool without waiting; output and errors are dropped.
-    pid_t start(std::vector<std::string> arguments) const;
+    pid_t start(Arguments arguments) const;
 
-    // Everything in the store; a store that is not there reads as empty. A fault of the store is told in the text.
-    std::string dump() const;
+    // Everything in the store of a folder, or this one; a store that is not there reads as empty. A fault of the store
+    // is told in the text.
+    static std::string dumpOf(const std::string& folder);
+    std::string dump() const { return dumpOf(path()); }
 
     // "ok", or what SQLite's own check finds.
     std::string integrity() const;
