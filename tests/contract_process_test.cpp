@@ -58,12 +58,15 @@ TEST_P(ProcessHostContract, ProgramsThatAreNotThereDoNotStart) {
     const TemporaryDirectory directory;
     const fs::path folder = directory.path();
     const fs::path before = fs::current_path();
+    fs::create_directory(folder / "bare folder");
     fs::copy_file(childProgram(), folder / "kz7_stray.exe");
+    fs::copy_file(childProgram(), folder / "bare folder/kz7_stray.exe");
     fs::current_path(folder);
     // clang-format off
     const struct { std::string commandLine; bool pathMayBeNamed; const char* why; } rows[] = {
         {"\"/no such/program.exe\" x",                              true,  "no such file"},
         {"..\\" + folder.filename().string() + "\\kz7_stray.exe x", true,  "nothing is started from the current folder"},
+        {"bare folder\\kz7_stray.exe x", true, "the same behind a bare name that is nowhere"},
         {"kz7-no-such-program",                                     true,  "nowhere on the search path"},
         {"kz7_stray.exe",                                           false, "a bare name in the current folder"},
         {"kz7_stray",                                               false, "the same without its ending"},
