@@ -3,8 +3,6 @@
 
 #include <regex>
 
-#include "install/platform/faulty/clock.h"
-#include "install/platform/faulty/host_identity.h"
 #include "install/platform/faulty/installer_session.h"
 #include "tests/support/fault_sweep.h"
 #include "tests/support/runtime_machine.h"
@@ -158,12 +156,10 @@ TEST(LogFile, AnyCallMayFail) {
                 machine.files_.add(std::string(RuntimeMachine::kFolder) + "readme");
             },
             [](FaultyMachine& machine) {
-                FaultyClock clock(machine.clock_, machine.faults_);
-                FaultyHostIdentity identity(machine.identity_, machine.faults_);
                 MemoryInstallerSession kept;
                 FaultyInstallerSession session(kept, machine.faults_);
                 URE engine({machine.files(), machine.processes(), machine.threads(), machine.console_, machine.lines_,
-                            machine.terminal_, clock, identity, &session});
+                            machine.terminal_, machine.clock(), machine.identity(), &session});
                 const ObserversEnd end;
                 URELogObserver* log = URELogObserver::getInstance(engine);
                 log->setLogFile(RuntimeMachine::kLogFile);

@@ -7,45 +7,12 @@
 #include <optional>
 #include <string>
 
-#include "install/platform/faulty/assembly_cache.h"
-#include "install/platform/faulty/console.h"
-#include "install/platform/faulty/fault_counter.h"
-#include "install/platform/faulty/file_system.h"
-#include "install/platform/faulty/library_loader.h"
-#include "install/platform/faulty/process_host.h"
-#include "install/platform/faulty/registry.h"
-#include "install/platform/faulty/services.h"
-#include "install/platform/faulty/threads.h"
+#include "install/platform/faulty/platform.h"
 #include "tests/support/machine.h"
 
 namespace kz7::test {
 
-// A machine whose flows meet the faults; what a test asks of it meets none.
-class FaultyMachine : public Machine {
-public:
-    explicit FaultyMachine(FaultCounter faults) : faults_(faults) {}
-
-    IRegistryStore& registry() override { return faultyRegistry_; }
-    IServiceManager& services() override { return faultyServices_; }
-    IConsole& console() override { return faultyConsole_; }
-    IFileSystem& files() override { return faultyFiles_; }
-    ILibraryLoader& libraries() override { return faultyLibraries_; }
-    IAssemblyCache& assemblies() override { return faultyAssemblies_; }
-    IProcessHost& processes() override { return faultyProcesses_; }
-    IThreads& threads() override { return faultyThreads_; }
-
-    FaultCounter faults_;
-
-private:
-    FaultyRegistry faultyRegistry_{registry_, faults_};
-    FaultyServiceManager faultyServices_{services_, faults_};
-    FaultyConsole faultyConsole_{console_, faults_};
-    FaultyFileSystem faultyFiles_{files_, faults_};
-    FaultyLibraryLoader faultyLibraries_{libraries_, faults_};
-    FaultyAssemblyCache faultyAssemblies_{assemblies_, faults_};
-    FaultyProcessHost faultyProcesses_{processes_, faults_};
-    FaultyThreads faultyThreads_{threads_, faults_};
-};
+using FaultyMachine = FaultyPlatform<Machine>;
 
 inline constexpr Status kFault = 4321;  // no platform's number, so that it is recognised wherever it goes
 
