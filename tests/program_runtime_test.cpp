@@ -6,6 +6,7 @@
 #include <sys/resource.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <csignal>
 #include <filesystem>
 
@@ -16,11 +17,14 @@ namespace {
 
 class RuntimeProgram : public testing::Test {
 protected:
-    RuntimeProgram() { std::filesystem::create_directories(path("")); }
-
-    // In the folder of the log, the product's "C:\setup.log".
-    std::string path(const std::string& name) const { return store_.file("drive_c/" + name); }
+    // In the folder of the log.
+    std::string path(const std::string& name) const { return store_.file(name); }
     std::string log() const { return contents(path("setup.log")); }
+    std::string lastLine() const {
+        std::string line = "MESSAGE INFO INSTALLEND :: " + path("setup.log") + "\n";
+        std::replace(line.begin(), line.end(), '/', '\\');
+        return line;
+    }
 
     ProgramOptions withInput(const std::string& input) const {
         overwrite(path("input"), input);
@@ -34,8 +38,6 @@ protected:
 
     StateDirectory store_;
 };
-
-constexpr const char* kLastLine = "MESSAGE INFO INSTALLEND :: C:\\setup.log\n";
 
 // The log of a run that was not aborted, from its tasks on.
 constexpr const char* kLoggedRun =
@@ -58,7 +60,7 @@ TEST_F(RuntimeProgram, FinishesItsWorkWhateverTheFrontEndDoes) {
         EXPECT_EQ(result.exitCode, row.aborted ? 1 : 0) << row.why;
         EXPECT_EQ(result.error, "") << row.why;
         EXPECT_TRUE(result.output.ends_with(
-            std::string(row.aborted ? "\nMESSAGE INFO UNDOEND\n" : ":: 20 :: Creating the instance\n") + kLastLine))
+            std::string(row.aborted ? "\nMESSAGE INFO UNDOEND\n" : ":: 20 :: Creating the instance\n") + lastLine()))
             << row.why << result.output;
         EXPECT_EQ(log().find(kLoggedRun) != std::string::npos, !row.aborted) << row.why;
     }
@@ -85,7 +87,7 @@ TEST_F(RuntimeProgram, KeepsItsLogWithoutAReaderAndItsReaderWithoutALog) {
     };
     const ProgramResult full = install({.environment = {}, .inChild = limited});
     EXPECT_EQ(full.exitCode, 0);
-    EXPECT_TRUE(full.output.ends_with(kLastLine));
+    EXPECT_TRUE(full.output.ends_with(lastLine()));
     EXPECT_TRUE(log().starts_with(before)) << "the log of the earlier run stays";
 
     // A log behind a link is not written: somebody else may have laid it.

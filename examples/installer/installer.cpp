@@ -1,6 +1,6 @@
-// An installer program for tests: a run of the installer runtime on this machine's ports.
-//   kz7_installer EXITCODE
-// Its log is C:\setup.log. Answered ABORT, it undoes what it did and ends with 1.
+// An installer program, for a front end to drive: announces its tasks, tells of each, asks where its medium is, keeps a
+// log, setup.log, in the folder of the programs' own. Answered ABORT, it undoes what it did and ends with 1; else it
+// ends with the exit code that it is given, or 0.
 #include <cstdlib>
 #include <string>
 
@@ -8,7 +8,7 @@
 #include "install/runtime/observers/observers_end.h"
 #include "install/runtime/runtime_ports.h"
 
-namespace kz7::test {
+namespace kz7 {
 namespace {
 
 int install(URE& engine, int exitCode) {
@@ -35,19 +35,22 @@ int install(URE& engine, int exitCode) {
 }
 
 }  // namespace
-}  // namespace kz7::test
+}  // namespace kz7
 
-int main(int, char** argv) {
+int main(int argc, char** argv) {
     using namespace kz7;
     const auto platform = hostPlatform({.program = "kz7_installer"});
     URE engine(portsOf(*platform));
     engine.mode = kModeInstall;
     const ObserversEnd end;
     URELogObserver* log = URELogObserver::getInstance(engine);
-    log->setLogFile("C:\\setup.log");
+    std::string folder;
+    if (platform->ownFolder(folder) == kSuccess) {
+        log->setLogFile(folder + "\\setup.log");
+    }
     engine.registerObserver(*log, Takes::everything);
     engine.registerObserver(*UREExternalObserverMachineStream::getInstance(engine));
-    const int exitCode = test::install(engine, std::atoi(argv[1]));
+    const int exitCode = install(engine, argc > 1 ? std::atoi(argv[1]) : 0);
     log->writeHeader(true);
     return exitCode;
 }
