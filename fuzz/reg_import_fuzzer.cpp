@@ -1,8 +1,8 @@
 // Whatever a file holds, it is refused or it imports; and what it made exports to a text that makes the same
 // store again, in both encodings.
+#include "fuzz/fuzzer.h"
 #include "install/admin/reg_text.h"
 #include "install/platform/memory/registry.h"
-#include "tests/fuzz/fuzzer.h"
 #include "tests/support/reg_text_store.h"
 
 void tryInput(std::string_view input) {

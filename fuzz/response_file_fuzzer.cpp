@@ -2,9 +2,9 @@
 // same; and as a catalogue it never breaks a text.
 #include <algorithm>
 
+#include "fuzz/fuzzer.h"
 #include "install/runtime/message_catalogue.h"
 #include "install/runtime/response_file.h"
-#include "tests/fuzz/fuzzer.h"
 
 void tryInput(std::string_view input) {
     const auto lines = static_cast<std::uint32_t>(std::count(input.begin(), input.end(), '\n')) + 1;

@@ -1,8 +1,8 @@
 // Whatever a task list holds, its lines keep to their lengths and to one line each, and a reader finds as many
 // fields as were counted where nothing was cut.
+#include "fuzz/fuzzer.h"
 #include "install/admin/protocol_reader.h"
 #include "install/runtime/observers/protocol_lines.h"
-#include "tests/fuzz/fuzzer.h"
 
 void tryInput(std::string_view input) {
     const kz7::TaskListLines lines = kz7::taskListLines(input);

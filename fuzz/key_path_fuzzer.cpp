@@ -1,11 +1,11 @@
 // Whatever a path holds, both stores of our own answer it alike; what was made is there, and goes again. The
 // first line is the path, the rest a copy name.
+#include "fuzz/fuzzer.h"
 #include "install/platform/embedded/paths.h"
 #include "install/platform/embedded/registry.h"
 #include "install/platform/memory/registry.h"
 #include "install/runtime/copy_name.h"
 #include "install/src/registry_access.h"
-#include "tests/fuzz/fuzzer.h"
 #include "tests/support/registry_dump.h"
 #include "tests/support/temporary_directory.h"
 

@@ -1,5 +1,5 @@
 // Whatever a front end sends, a question takes one line of it and is answered, aborted or left as it was.
-#include "tests/fuzz/fuzzer.h"
+#include "fuzz/fuzzer.h"
 #include "tests/support/runtime_machine.h"
 
 void tryInput(std::string_view input) {
