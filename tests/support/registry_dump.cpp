@@ -1,6 +1,7 @@
 #include "tests/support/registry_dump.h"
 
 #include <cstdio>
+#include <memory>
 
 namespace kz7::test {
 namespace {
@@ -46,8 +47,9 @@ public:
 private:
     IRegistryStore& registry_;
     KeyHandle root_;
-    std::string room_ = std::string(1 << 20, '\0');
-    Buffer bytes_{room_.data(), static_cast<std::uint32_t>(room_.size())};
+    static constexpr std::uint32_t kRoom = 1 << 20;
+    std::unique_ptr<char[]> room_ = std::make_unique_for_overwrite<char[]>(kRoom);
+    Buffer bytes_{room_.get(), kRoom};
     FixedBuffer<kMaxValueName + 1> name_;
     FixedBuffer<1024> class_;
     ValueType type_{};
