@@ -117,13 +117,6 @@ const StoreWithCopies& storeWith(std::int64_t copies, Shape shape) {
     return *kept;
 }
 
-const std::string& nameOf(const std::string& name) {
-    return name;
-}
-const std::string& nameOf(const InstallCopyInfo& copy) {
-    return copy.getName();
-}
-
 // Every prefix is given to the greatest text that has it: what no program can do without. Case is not looked
 // at, and the prefixes that a text shares with its neighbour are passed over.
 template <class Copies>
@@ -133,26 +126,22 @@ void onePass(const Copies& copies, AliasMap& aliases) {
         const std::string_view text = copy->first;
         for (std::size_t dot = text.find('.', commonLength(text, greater)); dot != std::string_view::npos;
              dot = text.find('.', dot + 1)) {
-            aliases.emplace(text.substr(0, dot), nameOf(copy->second));
+            aliases.emplace(text.substr(0, dot), copy->second);
         }
-        aliases.emplace(text, nameOf(copy->second));
+        aliases.emplace(text, copy->second);
         greater = text;
     }
 }
 
-void passOver(benchmark::State& state, Shape shape, bool records) {
+void onePassOverSortedTexts(benchmark::State& state, Shape shape) {
     const auto registry = storeWith(state.range(0), shape).open();
     Debug debug;
     InstallCopiesProfile profile(*registry, debug.output);
     require(profile.generateInstallCopiesList() == kSuccess, "no copies");
-    SortedCopies copies;
-    for (const auto& [text, copy] : profile.copiesByVersion()) {
-        copies.emplace(text, copy.getName());
-    }
     AliasMap aliases;
     for (auto _ : state) {
         aliases.clear();
-        records ? onePass(profile.copiesByVersion(), aliases) : onePass(copies, aliases);
+        onePass(profile.copiesByVersion(), aliases);
         benchmark::DoNotOptimize(aliases);
     }
     profile.generateProfileInfo();
@@ -160,16 +149,6 @@ void passOver(benchmark::State& state, Shape shape, bool records) {
     require(shape == balanced ? aliases == profile.profileInfo() : aliases.size() == profile.profileInfo().size(),
             "both compute the same");
     state.SetComplexityN(state.range(0));
-}
-
-// The texts and names alone, laid out in memory in that order.
-void onePassOverSortedTexts(benchmark::State& state, Shape shape) {
-    passOver(state, shape, false);
-}
-
-// The records as they were read, in the order of their texts.
-void onePassOverTheRecords(benchmark::State& state, Shape shape) {
-    passOver(state, shape, true);
 }
 
 void aliasesComputed(benchmark::State& state, Shape shape) {
@@ -333,7 +312,6 @@ void sizes(benchmark::internal::Benchmark* benchmark) {
 
 void addShape(const std::string& name, Shape shape) {
     sizes(benchmark::RegisterBenchmark(("onePassOverSortedTexts/" + name).c_str(), onePassOverSortedTexts, shape));
-    sizes(benchmark::RegisterBenchmark(("onePassOverTheRecords/" + name).c_str(), onePassOverTheRecords, shape));
     sizes(benchmark::RegisterBenchmark(("aliasesComputed/" + name).c_str(), aliasesComputed, shape));
 }
 

@@ -43,7 +43,7 @@ std::string literalHighest(const CopiesByVersion& copies, const std::string& pre
         const std::string& text = copy->first;
         if (exact ? equalsIgnoreCase(text, prefix)
                   : text.size() > prefix.size() && equalsIgnoreCase(text.substr(0, prefix.size() + 1), prefix + ".")) {
-            return copy->second.getName();
+            return copy->second;
         }
     }
     return {};
@@ -86,8 +86,7 @@ TEST(HighestVersion, IsWhatTheWalkFromTheGreatestTextFinds) {
         for (int query = 0; query < 20; ++query) {
             const std::string prefix = pick() + (random() % 2 == 0 ? "" : "." + pick());
             const bool exact = random() % 2 == 0;
-            const InstallCopyInfo* found = highestVersionLeadingBy(byVersion, prefix, exact);
-            ASSERT_EQ(found == nullptr ? "" : found->getName(), literalHighest(byVersion, prefix, exact))
+            ASSERT_EQ(highestVersionLeadingBy(byVersion, prefix, exact), literalHighest(byVersion, prefix, exact))
                 << "round " << round << ": " << prefix;
         }
         std::set<std::string> folded;

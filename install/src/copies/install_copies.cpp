@@ -40,11 +40,16 @@ Status readInstallCopies(RegistryValues& values, CopiesByName& byName, CopiesByV
         const InstallCopyInfo& copy =
             byName.insert_or_assign(std::string(name.text()), InstallCopyInfo(values, name.text())).first->second;
         if (copy.isValid()) {
-            byVersion.insert_or_assign(copy.getVersion(), copy);
+            byVersion.emplace_back(copy.getVersion(), copy.getName());
         }
         values.tell("%s version info of Install Copy '%s'",
                     {std::string_view(copy.isValid() ? "Valid" : "Invalid"), copy.getName()});
     }
+    std::stable_sort(byVersion.begin(), byVersion.end(),
+                     [](const auto& left, const auto& right) { return left.first < right.first; });
+    const auto first = std::unique(byVersion.rbegin(), byVersion.rend(),
+                                   [](const auto& left, const auto& right) { return left.first == right.first; });
+    byVersion.erase(byVersion.begin(), first.base());
     return kSuccess;
 }
 
@@ -53,7 +58,7 @@ std::size_t commonLength(std::string_view left, std::string_view right) {
     return static_cast<std::size_t>(end - left.begin());
 }
 
-const InstallCopyInfo* highestVersionLeadingBy(const CopiesByVersion& copies, std::string_view prefix, bool exact) {
+std::string highestVersionLeadingBy(const CopiesByVersion& copies, std::string_view prefix, bool exact) {
     const auto answers = [&](const CopiesByVersion::value_type& copy) {
         const std::string_view text = copy.first;
         const bool hasLength =
@@ -61,7 +66,7 @@ const InstallCopyInfo* highestVersionLeadingBy(const CopiesByVersion& copies, st
         return hasLength && equalsIgnoreCase(text.substr(0, prefix.size()), prefix);
     };
     const auto highest = std::find_if(copies.rbegin(), copies.rend(), answers);
-    return highest == copies.rend() ? nullptr : &highest->second;
+    return highest == copies.rend() ? std::string{} : highest->second;
 }
 
 }  // namespace kz7

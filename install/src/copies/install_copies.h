@@ -5,6 +5,8 @@
 #include <map>
 #include <string>
 #include <string_view>
+#include <utility>
+#include <vector>
 
 #include "install/src/copies/registry_values.h"
 #include "install/src/copy_layout.h"
@@ -37,15 +39,18 @@ private:
 };
 
 using CopiesByName = std::map<std::string, InstallCopyInfo>;
-using CopiesByVersion = std::map<std::string, InstallCopyInfo>;  // valid copies only; bytes compare unsigned
+
+// Version text and name of every valid copy, ordered by the texts, whose bytes compare unsigned. One behind the other
+// in memory: the aliases are computed in one pass over them.
+using CopiesByVersion = std::vector<std::pair<std::string, std::string>>;
 
 // Reads the copies below the native view's key, in the order in which it lists them: of two copies with one
 // version text the later stays. kFailed when the key cannot be opened, both maps are then empty.
 Status readInstallCopies(RegistryValues& values, CopiesByName& byName, CopiesByVersion& byVersion);
 
-// The copy with the greatest version text that begins with `prefix` and a dot, or that is `exact`ly `prefix`,
-// without regard to case. Null when there is none. One question is a walk over the copies.
-const InstallCopyInfo* highestVersionLeadingBy(const CopiesByVersion& copies, std::string_view prefix, bool exact);
+// The name of the copy with the greatest version text that begins with `prefix` and a dot, or that is `exact`ly
+// `prefix`, without regard to case. Empty when there is none. One question is a walk over the copies.
+std::string highestVersionLeadingBy(const CopiesByVersion& copies, std::string_view prefix, bool exact);
 
 // How many bytes two texts have in common from their beginning.
 std::size_t commonLength(std::string_view left, std::string_view right);

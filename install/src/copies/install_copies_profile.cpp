@@ -144,7 +144,7 @@ Status InstallCopiesProfile::generateProfileInfo() {
             // two empty aliases; what finds nothing is written all the same.
             if ((open.size() == kWholeVersion) == (end == text.size())) {
                 const Alias* first = hasLetter ? *answered.insert(&*alias).first : &*alias;
-                alias->second = first == &*alias ? version->second.getName() : first->second;
+                alias->second = first == &*alias ? version->second : first->second;
             } else if (hasLetter) {
                 unanswered.push_back(alias);
             }
