@@ -86,12 +86,15 @@ TEST_F(ProviderProgram, CopiesAreShownWithTheirServicesAndAliasesWithWhatIsWrong
     store_.tool({"-addKZ7Copy", "COPY1", "C:\\KZ7"});
     const std::string text =
         "Windows Registry Editor Version 5.00\n"
-        "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies]\n\"8.2\"=\"GONE\"\n\"9.8.0\"=\"COPY1\"\n\"" +
+        "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies]\n\"8.2\"=\"GONE\"\n\"9.8.0\"=\"COPY1\"\n\"v9\"="
+        "\"vee\"\n\"" +
         std::string(100, 'x') +
         "\"=\"\"\n\"8.1\"=\"GONE\"\n\"8.3\"=\"GONE\"\n"
         "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies]\n\"8.3\"=\"GONE\"\n"
         "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies\\five\\CurrentVersion]\n"
         "\"Version\"=\"9\"\n\"Release\"=\"8\"\n\"Modification\"=\"0\"\n\"Fix Level\"=\"0.1\"\n"
+        "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies\\vee\\CurrentVersion]\n"
+        "\"Version\"=\"v9\"\n\"Release\"=\"8\"\n\"Modification\"=\"0\"\n"
         "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies\\half]\n\"KZ7 Path Name\"=\"C:\\\\h\"\n";
     overwrite(store_.file("more.reg"), text);
     ASSERT_EQ(store_.run("kz7admin", {"import", store_.file("more.reg")}).exitCode, 0);
@@ -103,7 +106,8 @@ TEST_F(ProviderProgram, CopiesAreShownWithTheirServicesAndAliasesWithWhatIsWrong
                   "COPY1  native  9.7.800.0  yes    C:\\KZ7    KZ7MGMTSVC_COPY1 stopped\n"
                   "COPY1  32-bit  9.7.800.0  yes    C:\\KZ7    KZ7MGMTSVC_COPY1 stopped\n"
                   "five   native  9.8.0.0.1  yes    none      none\n"
-                  "half   native  ...0       no     C:\\h      none\n");
+                  "half   native  ...0       no     C:\\h      none\n"
+                  "vee    native  v9.8.0.0   yes    none      none\n");
     const std::string json = store_.run("kz7admin", {"copies", "--json"}).output;
     EXPECT_EQ(json.substr(0, json.find(",\n")),
               "{\"store\":\"" + storeLine +
@@ -117,6 +121,9 @@ TEST_F(ProviderProgram, CopiesAreShownWithTheirServicesAndAliasesWithWhatIsWrong
                   "9.8.0      COPY1   -       five       9.8.0.0.1 is the highest that begins with it\n"
                   "9.8.0.0    -       -       (empty)    no copy has exactly this version; written empty\n"
                   "9.8.0.0.1  -       -       (empty)    no version goes on behind it; written empty\n");
+    EXPECT_NE(store_.run("kz7admin", {"aliases", "v9"}).output.find("v9        vee     -       vee        v9.8.0.0 is"),
+              std::string::npos)
+        << "a due alias that does not look like one";
     const std::string gone = "no copy has such a version; the next rewrite ";
     const std::string ended = ": a value name of 100 bytes or more ends its walk\n";
     EXPECT_EQ(store_.run("kz7admin", {"aliases", "8"}).output,
@@ -124,6 +131,11 @@ TEST_F(ProviderProgram, CopiesAreShownWithTheirServicesAndAliasesWithWhatIsWrong
                   "8.1     GONE    -       -          " + gone + "leaves it" + ended +  //
                   "8.2     GONE    -       -          " + gone + "deletes it\n" +       //
                   "8.3     GONE    GONE    -          " + gone + "deletes it from the 32-bit view only" + ended);
+    const StateDirectory native;
+    overwrite(store_.file("more.reg"), text.substr(0, text.find("[HKEY_LOCAL_MACHINE\\SOFTWARE\\Wow")));
+    ASSERT_EQ(native.run("kz7admin", {"import", store_.file("more.reg")}).exitCode, 0);
+    EXPECT_NE(native.run("kz7admin", {"aliases", "8.2"}).output.find(gone + "leaves it: there is no key of the copies"),
+              std::string::npos);
 }
 
 }  // namespace

@@ -36,8 +36,8 @@ AliasRow& rowOf(AliasRows& rows, std::string_view prefix) {
     return row;
 }
 
-// The aliases of one view, also those that the rewrite's own walk does not get to.
-Status readAliases(IRegistryStore& registry, std::string_view path, std::size_t view, AliasRows& rows) {
+// The values of one view, also those that the rewrite's own walk does not get to. kFileNotFound: it has no copies' key.
+Status readValues(IRegistryStore& registry, std::string_view path, std::size_t view, AliasRows& rows) {
     OwnedKey key(registry);
     Status status = registry.openKey(KeyHandle::localMachine, path, kKeyRead, key.receive());
     FixedBuffer<kMaxValueName + 1> name;
@@ -48,13 +48,11 @@ Status readAliases(IRegistryStore& registry, std::string_view path, std::size_t 
          succeeded(status) && succeeded(status = registry.enumerateValue(key.get(), index, name, nullptr, &data));
          ++index) {
         walked = walked && name.text().size() < kAliasNameRoom;
-        if (isAliasName(name.text())) {
-            AliasRow& row = rowOf(rows, name.text());
-            row.names[view] = data.text();
-            row.deletable[view] = walked;
-        }
+        AliasRow& row = rowOf(rows, name.text());
+        row.names[view] = data.text();
+        row.deletable[view] = walked;
     }
-    return isNotFound(status) || isEndOfItems(status) ? kSuccess : status;
+    return isEndOfItems(status) ? kSuccess : status;
 }
 
 // What the rewrite would write; without the copies' key there is nothing.
@@ -72,9 +70,12 @@ void computeAliases(Admin& admin, AliasRows& rows) {
     }
 }
 
-std::string why(const AliasRow& row) {
+std::string why(const AliasRow& row, std::string_view missingView) {
     if (!row.should) {
         std::string reason = "no copy has such a version; the next rewrite ";
+        if (!missingView.empty()) {
+            return reason.append("leaves it: there is no key of the copies in the ").append(missingView) + " view";
+        }
         const auto stays = [&](std::size_t view) { return row.names[view] && !row.deletable[view]; };
         if (!stays(0) && !stays(1)) {
             return reason + "deletes it";
@@ -106,8 +107,12 @@ Answer showAliases(Admin& admin, const std::string& asked) {
         return kAnswerFault;
     }
     AliasRows rows;
+    std::string_view missingView;  // a rewrite then fails before it changes anything
     for (const auto& [path, view] : {std::pair{layout::kCopies, 0U}, {layout::kCopies32, 1U}}) {
-        if (const Status status = readAliases(admin.registry(), path, view, rows); !succeeded(status)) {
+        const Status status = readValues(admin.registry(), path, view, rows);
+        if (isNotFound(status)) {
+            missingView = view == 0 ? "native" : "32-bit";
+        } else if (!succeeded(status)) {
             return admin.storeFault("the aliases cannot be read", status);
         }
     }
@@ -117,9 +122,9 @@ Answer showAliases(Admin& admin, const std::string& asked) {
     }
     std::vector<TableRow> table = {{"PREFIX", "NATIVE", "32-BIT", "SHOULD BE", "WHY"}};
     for (const auto& [key, row] : rows) {
-        if (isAskedFor(row.prefix, asked)) {
+        if ((row.should || isAliasName(row.prefix)) && isAskedFor(row.prefix, asked)) {
             table.push_back({row.prefix.empty() ? "(default)" : shownText(row.prefix), shownName(row.names[0]),
-                             shownName(row.names[1]), shownName(row.should), why(row)});
+                             shownName(row.names[1]), shownName(row.should), why(row, missingView)});
         }
     }
     if (table.size() == 1) {
