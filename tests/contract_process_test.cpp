@@ -1,6 +1,7 @@
 // What every process host and every kind of threads must do alike: this machine's and the ones in memory.
 #include <gtest/gtest.h>
 
+#include <cstdlib>
 #include <filesystem>
 
 #include "tests/support/backends.h"
@@ -58,10 +59,12 @@ TEST_P(ProcessHostContract, ProgramsThatAreNotThereDoNotStart) {
     const TemporaryDirectory directory;
     const fs::path folder = directory.path();
     const fs::path before = fs::current_path();
+    const std::string searchPath = std::getenv("PATH");
     fs::create_directory(folder / "bare folder");
     fs::copy_file(childProgram(), folder / "kz7_stray.exe");
     fs::copy_file(childProgram(), folder / "bare folder/kz7_stray.exe");
     fs::current_path(folder);
+    setSearchPath(".");  // hangs on the current folder like the rest
     // clang-format off
     const struct { std::string commandLine; bool pathMayBeNamed; const char* why; } rows[] = {
         {"\"/no such/program.exe\" x",                              true,  "no such file"},
@@ -80,6 +83,10 @@ TEST_P(ProcessHostContract, ProgramsThatAreNotThereDoNotStart) {
             << row.why << ": " << status;
         EXPECT_EQ(child.process, ProcessHandle::none) << row.why;
     }
+    ProcessInformation child;
+    const ProcessStart elsewhere{childProgram(), "bare folder", StreamHandle::none, StreamHandle::none};
+    EXPECT_NE(host_->startProcess(elsewhere, child), kSuccess) << "a working directory that hangs on the current one";
+    setSearchPath(searchPath);
     fs::current_path(before);
 }
 

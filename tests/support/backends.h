@@ -69,6 +69,8 @@ HostPorts hostPorts(const std::string& place);
 std::string childProgram();
 extern const std::size_t kFloodMebibytes;
 
+void setSearchPath(const std::string& path);
+
 // For what a system shows only a moment later: that a thread, a child or a service has ended.
 inline bool eventually(const std::function<bool()>& holds) {
     bool held = holds();

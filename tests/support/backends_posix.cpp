@@ -14,4 +14,8 @@ HostPorts hostPorts(const std::string& place) {
             childProgram()};
 }
 
+void setSearchPath(const std::string& path) {
+    setenv("PATH", path.c_str(), 1);
+}
+
 }  // namespace kz7::test

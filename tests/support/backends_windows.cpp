@@ -28,4 +28,8 @@ HostPorts hostPorts(const std::string& place) {
              .usesHandlesAgain = true}};
 }
 
+void setSearchPath(const std::string& path) {
+    _putenv_s("PATH", path.c_str());
+}
+
 }  // namespace kz7::test

@@ -2,7 +2,7 @@
 
 #include <windows.h>
 
-#include <cstdlib>
+#include <algorithm>
 #include <string>
 #include <vector>
 
@@ -30,6 +30,24 @@ DWORD slotNumber(StandardSlot slot) {
     return slot == StandardSlot::output ? STD_OUTPUT_HANDLE : STD_ERROR_HANDLE;
 }
 
+// The folders of a search path that lie at one place, wherever this process stands.
+std::wstring absoluteFolders(const std::wstring& path) {
+    std::wstring kept;
+    for (std::size_t at = 0; at < path.size();) {
+        const std::size_t end = std::min(path.find(L';', at), path.size());
+        const std::wstring folder = path.substr(at, end - at);
+        std::string begin;
+        for (const wchar_t c : folder.substr(0, 3)) {
+            begin += c < 0x80 ? static_cast<char>(c) : '?';
+        }
+        if (isAbsolutePath(begin)) {
+            kept += folder + L';';
+        }
+        at = end + 1;
+    }
+    return kept;
+}
+
 // While it lives, the system searches for bare program names without the current folder: nothing is taken from
 // the folder that the tool happens to be run in. A child gets the environment as it was before.
 class SearchWithoutCurrentFolder {
@@ -39,8 +57,12 @@ public:
         if (!wasSet_) {
             SetEnvironmentVariableW(kSwitch, L"1");
         }
+        path_.resize(GetEnvironmentVariableW(kPath, nullptr, 0));
+        path_.resize(GetEnvironmentVariableW(kPath, path_.data(), static_cast<DWORD>(path_.size())));
+        SetEnvironmentVariableW(kPath, absoluteFolders(path_).c_str());
     }
     ~SearchWithoutCurrentFolder() {
+        SetEnvironmentVariableW(kPath, path_.c_str());
         if (!wasSet_) {
             SetEnvironmentVariableW(kSwitch, nullptr);
         }
@@ -55,7 +77,9 @@ public:
 
 private:
     static constexpr const wchar_t* kSwitch = L"NoDefaultCurrentDirectoryInExePath";
+    static constexpr const wchar_t* kPath = L"PATH";
     wchar_t* environment_;
+    std::wstring path_;
     bool wasSet_ = false;
 };
 
@@ -69,9 +93,9 @@ bool isFoundByName(std::string_view program) {
         systemFolder(folder, MAX_PATH);
         folders.append(";").append(folder);
     }
-    if (const char* path = std::getenv("PATH"); path != nullptr) {
-        folders.append(";").append(path);
-    }
+    std::string path(GetEnvironmentVariableA("PATH", nullptr, 0), '\0');
+    path.resize(GetEnvironmentVariableA("PATH", path.data(), static_cast<DWORD>(path.size())));
+    folders.append(";").append(path);
     return SearchPathA(folders.c_str(), std::string(program).c_str(), ".exe", 0, nullptr, nullptr) != 0;
 }
 
@@ -146,8 +170,13 @@ Status WindowsProcessHost::closeStream(StreamHandle stream) {
 
 Status WindowsProcessHost::startProcess(const ProcessStart& start, ProcessInformation& started) {
     const std::vector<CommandReading> readings = commandReadings(start.commandLine);
+    const SearchWithoutCurrentFolder search;
     if (readings.empty() || hangsOnCurrentFolder(readings)) {
         return kFileNotFound;
+    }
+    const std::string directory(start.workingDirectory);
+    if (!directory.empty() && !isAbsolutePath(directory)) {
+        return kBadDirectory;
     }
     STARTUPINFOA startup{};
     startup.cb = sizeof startup;
@@ -157,8 +186,6 @@ Status WindowsProcessHost::startProcess(const ProcessStart& start, ProcessInform
     startup.hStdOutput = native(start.output);
     startup.hStdError = native(start.error);
     std::string commandLine(start.commandLine);  // the call writes into it
-    const std::string directory(start.workingDirectory);
-    const SearchWithoutCurrentFolder search;
     PROCESS_INFORMATION information{};
     const Status status = judged(CreateProcessA(
         nullptr, commandLine.data(), nullptr, nullptr, TRUE, NORMAL_PRIORITY_CLASS | CREATE_UNICODE_ENVIRONMENT,
