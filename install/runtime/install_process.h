@@ -46,8 +46,9 @@ public:
     InstallProcess& operator=(const InstallProcess&) = delete;
 
     // Starts the program; with `wait`, returns once it has ended or the timeout passed, which is infinite
-    // unless an earlier wait set another or an earlier program could not be started. Returns the status of starting the reader of standard error and
-    // nothing else: whether the program runs is for the wait to say. An earlier run of the object is given up.
+    // unless an earlier wait set another or an earlier program could not be started. Returns the status of starting the
+    // reader of standard error and nothing else: whether the program runs is for the wait to say. An earlier run of the
+    // object is given up.
     Status execute(bool wait, bool trace);
 
     // Waits for the program and its readers. kNotExecuted; kExitCodeUnavailable: the program could not be

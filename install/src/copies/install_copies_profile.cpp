@@ -164,6 +164,7 @@ void InstallCopiesProfile::tellProfile() {
     if (!values_.isHeard()) {
         return;
     }
+    // Deliberate: once for each prefix, as it was answered, not for each copy that has it.
     for (const auto& [prefix, name] : profileInfo_) {
         if (name.empty()) {
             values_.tell("The highest version leading by '%s': ( none )", {prefix});
