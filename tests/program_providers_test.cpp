@@ -61,6 +61,11 @@ TEST_F(ProviderProgram, ErrorsStandBetweenTheLinesThatTheyBelongTo) {
                   "1677: kz7nmpcfg.exe returned an error. rc = 5\n"
                   "C:\\KZ7\\bin\\kz7nmpcfg_32.exe -register -level 9.1.0 -kz7path C:\\KZ7 -migratev8 " +
                   kPrefix + "1697: kz7nmpcfg_32.exe returned an error. rc = 5\n");
+    const ProgramResult watched = store_.tool({"-dotnet", "C:\\KZ7"}, {{"KZ7_DEBUG=1"}, {}});
+    EXPECT_EQ(watched.error,
+              "debug: Failed to open the registry key: SOFTWARE\\NVQ\\KZ7\\InstalledCopies\n"
+              "debug: Failed to backup the old profile info\n")
+        << "texts for a debugger, shown when asked for";
     EXPECT_TRUE(both(" -v8 'C:\\KZ8'").output.starts_with("Creating version 8 registry\n" + kPrefix + "1466: "));
 }
 
