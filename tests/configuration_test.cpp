@@ -1,7 +1,7 @@
 // The configuration handler: variables of the profile registry, and parameters through the command processor.
 #include <gtest/gtest.h>
 
-#include <regex>
+#include <sstream>
 #include <utility>
 #include <vector>
 
@@ -55,7 +55,14 @@ protected:
 
     // What the copy's profiles hold, by the ends of their paths.
     std::string profiles() {
-        return std::regex_replace(dumpRegistry(machine.registry_), std::regex("\\[.*\n|.*COPY1."), "");
+        std::istringstream dump(dumpRegistry(machine.registry_));
+        std::string values;
+        for (std::string line; std::getline(dump, line);) {
+            if (line.front() != '[') {
+                values += line.substr(line.find("COPY1\\") + 6) + "\n";
+            }
+        }
+        return values;
     }
 
     RuntimeMachine machine;

@@ -1,7 +1,7 @@
 // The log of a run: exact files with a clock that stands still, the session's log, and what goes wrong.
 #include <gtest/gtest.h>
 
-#include <regex>
+#include <sstream>
 
 #include "install/platform/faulty/installer_session.h"
 #include "tests/support/fault_sweep.h"
@@ -118,8 +118,12 @@ TEST(LogFile, ThatCannotBeKeptStandsInNobodysWay) {
         machine.say(0x4000001, "\"a note\"");
         machine.say(0x4000100, "an error");
         machine.engine.startTask(1, 1, true, "a task");
-        EXPECT_EQ(machine.shownInSession(), std::regex_replace(row.told, std::regex("(.*)\n"), "4000000||$1\n"))
-            << row.why;
+        std::istringstream told(row.told);
+        std::string shown;
+        for (std::string line; std::getline(told, line);) {
+            shown += "4000000||" + line + "\n";
+        }
+        EXPECT_EQ(machine.shownInSession(), shown) << row.why;
         EXPECT_EQ(machine.logText(), "") << row.why;
     }
     RuntimeMachine machine;
