@@ -84,7 +84,8 @@ TEST_P(ProcessHostContract, ProgramsThatAreNotThereDoNotStart) {
         EXPECT_EQ(child.process, ProcessHandle::none) << row.why;
     }
     ProcessInformation child;
-    const ProcessStart elsewhere{childProgram(), "bare folder", StreamHandle::none, StreamHandle::none};
+    const std::string program = childProgram();
+    const ProcessStart elsewhere{program, "bare folder", StreamHandle::none, StreamHandle::none};
     EXPECT_NE(host_->startProcess(elsewhere, child), kSuccess) << "a working directory that hangs on the current one";
     setSearchPath(searchPath);
     fs::current_path(before);
