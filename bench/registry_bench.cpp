@@ -14,7 +14,7 @@
 #include "install/platform/standard_console.h"
 #include "install/src/copies/install_copy_list.h"
 #include "install/src/held_console.h"
-#include "install/src/registry_access.h"
+#include "install/src/registry/registry_access.h"
 #include "install/src/version8.h"
 #include "install/src/version9.h"
 

@@ -4,8 +4,8 @@
 #include "install/platform/embedded/paths.h"
 #include "install/platform/embedded/registry.h"
 #include "install/platform/memory/registry.h"
-#include "install/runtime/copy_name.h"
-#include "install/src/registry_access.h"
+#include "install/src/registry/copy_name.h"
+#include "install/src/registry/registry_access.h"
 #include "tests/support/registry_dump.h"
 #include "tests/support/temporary_directory.h"
 

@@ -1,7 +1,7 @@
 // Whatever a program writes, the front end shows it, in whatever pieces it comes, and what it shows steers no
 // terminal.
 #include "fuzz/fuzzer.h"
-#include "install/admin/front.h"
+#include "install/admin/front/front.h"
 #include "install/platform/memory/platform.h"
 
 static std::string shown(std::string_view input, std::size_t piece, bool onTerminal) {

@@ -1,7 +1,7 @@
 // Whatever a file holds, it is refused or it imports; and what it made exports to a text that makes the same
 // store again, in both encodings.
 #include "fuzz/fuzzer.h"
-#include "install/admin/reg_text.h"
+#include "install/admin/formats/reg_text.h"
 #include "install/platform/memory/registry.h"
 #include "tests/support/reg_text_store.h"
 

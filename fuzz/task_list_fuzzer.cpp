@@ -1,7 +1,7 @@
 // Whatever a task list holds, its lines keep to their lengths and to one line each, and a reader finds as many
 // fields as were counted where nothing was cut.
 #include "fuzz/fuzzer.h"
-#include "install/admin/protocol_reader.h"
+#include "install/admin/front/protocol_reader.h"
 #include "install/runtime/observers/protocol_lines.h"
 
 void tryInput(std::string_view input) {

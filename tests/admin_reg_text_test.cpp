@@ -4,7 +4,7 @@
 #include <algorithm>
 #include <sstream>
 
-#include "install/admin/reg_text.h"
+#include "install/admin/formats/reg_text.h"
 #include "install/platform/encoding.h"
 #include "install/platform/memory/registry.h"
 #include "tests/support/fault_sweep.h"

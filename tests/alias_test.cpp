@@ -7,7 +7,7 @@
 #include <set>
 
 #include "install/src/copies/install_copies_profile.h"
-#include "install/src/copy_layout.h"
+#include "install/src/registry/copy_layout.h"
 #include "tests/support/fault_sweep.h"
 
 namespace kz7::test {

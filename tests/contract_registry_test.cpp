@@ -5,7 +5,7 @@
 #include <numeric>
 #include <sstream>
 
-#include "install/src/registry_access.h"
+#include "install/src/registry/registry_access.h"
 #include "tests/support/backends.h"
 
 namespace kz7::test {

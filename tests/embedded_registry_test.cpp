@@ -6,7 +6,7 @@
 
 #include <filesystem>
 
-#include "install/src/registry_access.h"
+#include "install/src/registry/registry_access.h"
 #include "tests/support/registry_dump.h"
 #include "tests/support/temporary_directory.h"
 

@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "install/admin/front.h"
+#include "install/admin/front/front.h"
 #include "tests/support/machine.h"
 
 namespace kz7::test {

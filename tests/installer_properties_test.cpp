@@ -2,9 +2,9 @@
 #include <gtest/gtest.h>
 
 #include "install/platform/faulty/installer_session.h"
-#include "install/runtime/copy_name.h"
 #include "install/runtime/installer_properties.h"
 #include "install/runtime/saved_property_names.h"
+#include "install/src/registry/copy_name.h"
 #include "tests/support/fault_sweep.h"
 #include "tests/support/runtime_machine.h"
 

@@ -1,4 +1,4 @@
-#include "install/src/registry_access.h"
+#include "install/src/registry/registry_access.h"
 
 #include <gtest/gtest.h>
 

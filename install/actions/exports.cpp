@@ -6,10 +6,10 @@
 #include "install/actions/kz7actions.h"
 #include "install/platform/installer_session.h"
 #include "install/platform/platform.h"
-#include "install/runtime/copy_name.h"
 #include "install/runtime/installer_properties.h"
 #include "install/runtime/observers/observers_end.h"
 #include "install/runtime/runtime_ports.h"
+#include "install/src/registry/copy_name.h"
 
 namespace kz7 {
 namespace {

@@ -1,7 +1,7 @@
 #include "install/admin/copy_location.h"
 
-#include "install/src/copy_layout.h"
-#include "install/src/registry_access.h"
+#include "install/src/registry/copy_layout.h"
+#include "install/src/registry/registry_access.h"
 
 namespace kz7 {
 

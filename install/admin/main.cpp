@@ -3,13 +3,13 @@
 #include <exception>
 #include <new>
 
-#include "install/admin/aliases_command.h"
-#include "install/admin/commit_command.h"
-#include "install/admin/copies_command.h"
-#include "install/admin/export_command.h"
-#include "install/admin/front_command.h"
-#include "install/admin/import_command.h"
-#include "install/admin/tree_command.h"
+#include "install/admin/commands/aliases_command.h"
+#include "install/admin/commands/commit_command.h"
+#include "install/admin/commands/copies_command.h"
+#include "install/admin/commands/export_command.h"
+#include "install/admin/commands/front_command.h"
+#include "install/admin/commands/import_command.h"
+#include "install/admin/commands/tree_command.h"
 
 namespace kz7 {
 namespace {

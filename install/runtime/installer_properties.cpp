@@ -3,9 +3,9 @@
 #include <array>
 #include <string>
 
-#include "install/runtime/copy_name.h"
 #include "install/runtime/saved_property_names.h"
-#include "install/src/registry_access.h"
+#include "install/src/registry/copy_name.h"
+#include "install/src/registry/registry_access.h"
 
 namespace kz7 {
 namespace {

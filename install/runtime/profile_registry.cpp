@@ -1,8 +1,8 @@
 #include "install/runtime/profile_registry.h"
 
-#include "install/runtime/copy_name.h"
-#include "install/src/copy_layout.h"
-#include "install/src/registry_access.h"
+#include "install/src/registry/copy_layout.h"
+#include "install/src/registry/copy_name.h"
+#include "install/src/registry/registry_access.h"
 
 namespace kz7 {
 namespace {

@@ -2,9 +2,9 @@
 
 #include <array>
 
-#include "install/src/copy_layout.h"
-#include "install/src/registry_access.h"
-#include "install/src/row_writer.h"
+#include "install/src/registry/copy_layout.h"
+#include "install/src/registry/registry_access.h"
+#include "install/src/registry/row_writer.h"
 #include "install/src/services/management_service.h"
 
 namespace kz7 {

@@ -1,9 +1,9 @@
 #include "install/src/remove_copy.h"
 
-#include "install/runtime/copy_name.h"
 #include "install/src/copies/install_copy_list.h"
-#include "install/src/copy_layout.h"
-#include "install/src/registry_access.h"
+#include "install/src/registry/copy_layout.h"
+#include "install/src/registry/copy_name.h"
+#include "install/src/registry/registry_access.h"
 #include "install/src/services/management_service.h"
 
 namespace kz7 {

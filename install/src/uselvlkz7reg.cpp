@@ -1,8 +1,8 @@
 #include "install/src/uselvlkz7reg.h"
 
 #include "install/src/add_copy.h"
+#include "install/src/registry/report.h"
 #include "install/src/remove_copy.h"
-#include "install/src/report.h"
 #include "install/src/services/provider_registration.h"
 #include "install/src/version8.h"
 #include "install/src/version9.h"

@@ -2,8 +2,8 @@
 
 #include <string>
 
-#include "install/src/copy_layout.h"
-#include "install/src/registry_access.h"
+#include "install/src/registry/copy_layout.h"
+#include "install/src/registry/registry_access.h"
 #include "install/src/services/management_service.h"
 
 namespace kz7 {

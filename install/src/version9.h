@@ -8,7 +8,7 @@
 #include "install/platform/registry_store.h"
 #include "install/platform/service_manager.h"
 #include "install/src/add_copy.h"
-#include "install/src/report.h"
+#include "install/src/registry/report.h"
 
 namespace kz7 {
 

@@ -9,7 +9,7 @@
 #include <vector>
 
 #include "install/platform/memory/platform.h"
-#include "install/src/registry_access.h"
+#include "install/src/registry/registry_access.h"
 #include "install/src/uselvlkz7reg.h"
 #include "tests/support/registry_dump.h"
 

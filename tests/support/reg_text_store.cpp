@@ -1,6 +1,6 @@
 #include "tests/support/reg_text_store.h"
 
-#include "install/admin/reg_text.h"
+#include "install/admin/formats/reg_text.h"
 
 namespace kz7::test {
 

@@ -9,7 +9,7 @@
 #include <vector>
 
 #include "install/src/copies/registry_values.h"
-#include "install/src/copy_layout.h"
+#include "install/src/registry/copy_layout.h"
 
 namespace kz7 {
 

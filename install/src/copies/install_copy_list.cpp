@@ -5,8 +5,8 @@
 #include <memory>
 #include <string>
 
-#include "install/src/copy_layout.h"
-#include "install/src/registry_access.h"
+#include "install/src/registry/copy_layout.h"
+#include "install/src/registry/registry_access.h"
 
 namespace kz7 {
 

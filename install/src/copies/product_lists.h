@@ -5,9 +5,9 @@
 #include <utility>
 
 #include "install/platform/registry_store.h"
-#include "install/runtime/copy_name.h"
 #include "install/src/copies/ilist.h"
 #include "install/src/copies/install_copy_list.h"
+#include "install/src/registry/copy_name.h"
 
 namespace kz7 {
 

@@ -1,6 +1,6 @@
 #include "install/src/copies/registry_values.h"
 
-#include "install/src/registry_access.h"
+#include "install/src/registry/registry_access.h"
 
 namespace kz7 {
 namespace {

@@ -14,7 +14,7 @@
 #include "install/platform/process_host.h"
 #include "install/platform/registry_store.h"
 #include "install/platform/threads.h"
-#include "install/src/report.h"
+#include "install/src/registry/report.h"
 
 namespace kz7 {
 

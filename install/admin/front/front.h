@@ -10,8 +10,8 @@
 #include <string_view>
 #include <vector>
 
-#include "install/admin/front_screen.h"
-#include "install/admin/protocol_reader.h"
+#include "install/admin/front/front_screen.h"
+#include "install/admin/front/protocol_reader.h"
 #include "install/platform/file_system.h"
 #include "install/platform/line_channel.h"
 #include "install/platform/process_host.h"

@@ -1,4 +1,4 @@
-#include "install/admin/value_type.h"
+#include "install/admin/formats/value_type.h"
 
 #include <array>
 

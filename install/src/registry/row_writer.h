@@ -6,7 +6,7 @@
 #include <string_view>
 
 #include "install/platform/registry_store.h"
-#include "install/src/report.h"
+#include "install/src/registry/report.h"
 
 namespace kz7 {
 

@@ -1,4 +1,4 @@
-#include "install/admin/front_screen.h"
+#include "install/admin/front/front_screen.h"
 
 #include <algorithm>
 

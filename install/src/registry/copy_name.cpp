@@ -1,4 +1,4 @@
-#include "install/runtime/copy_name.h"
+#include "install/src/registry/copy_name.h"
 
 #include "install/platform/text.h"
 

@@ -1,10 +1,10 @@
-#include "install/admin/export_command.h"
+#include "install/admin/commands/export_command.h"
 
 #include <CLI/CLI.hpp>
 
-#include "install/admin/json_text.h"
-#include "install/admin/reg_text.h"
-#include "install/admin/value_type.h"
+#include "install/admin/formats/json_text.h"
+#include "install/admin/formats/reg_text.h"
+#include "install/admin/formats/value_type.h"
 
 namespace kz7 {
 namespace {

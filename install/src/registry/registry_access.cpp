@@ -1,6 +1,6 @@
-#include "install/src/registry_access.h"
+#include "install/src/registry/registry_access.h"
 
-#include "install/runtime/copy_name.h"
+#include "install/src/registry/copy_name.h"
 
 namespace kz7 {
 namespace {

@@ -1,4 +1,4 @@
-#include "install/admin/json_text.h"
+#include "install/admin/formats/json_text.h"
 
 #include "install/platform/encoding.h"
 

@@ -1,9 +1,9 @@
-#include "install/admin/front_command.h"
+#include "install/admin/commands/front_command.h"
 
 #include <CLI/CLI.hpp>
 #include <memory>
 
-#include "install/admin/front.h"
+#include "install/admin/front/front.h"
 #include "install/platform/command_line.h"
 #include "install/platform/text.h"
 

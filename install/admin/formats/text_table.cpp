@@ -1,4 +1,4 @@
-#include "install/admin/text_table.h"
+#include "install/admin/formats/text_table.h"
 
 #include <algorithm>
 

@@ -1,4 +1,4 @@
-#include "install/admin/protocol_reader.h"
+#include "install/admin/front/protocol_reader.h"
 
 #include <algorithm>
 #include <charconv>

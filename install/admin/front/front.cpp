@@ -1,4 +1,4 @@
-#include "install/admin/front.h"
+#include "install/admin/front/front.h"
 
 #include <algorithm>
 #include <array>

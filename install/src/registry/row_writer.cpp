@@ -1,9 +1,9 @@
-#include "install/src/row_writer.h"
+#include "install/src/registry/row_writer.h"
 
 #include <string>
 
-#include "install/runtime/copy_name.h"
-#include "install/src/registry_access.h"
+#include "install/src/registry/copy_name.h"
+#include "install/src/registry/registry_access.h"
 
 namespace kz7 {
 namespace {

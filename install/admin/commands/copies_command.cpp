@@ -1,4 +1,4 @@
-#include "install/admin/copies_command.h"
+#include "install/admin/commands/copies_command.h"
 
 #include <CLI/CLI.hpp>
 #include <array>
@@ -6,11 +6,11 @@
 #include <optional>
 
 #include "install/admin/copy_location.h"
-#include "install/admin/json_text.h"
-#include "install/admin/text_table.h"
+#include "install/admin/formats/json_text.h"
+#include "install/admin/formats/text_table.h"
 #include "install/platform/text.h"
 #include "install/src/copies/install_copies.h"
-#include "install/src/copy_layout.h"
+#include "install/src/registry/copy_layout.h"
 #include "install/src/services/management_service.h"
 
 namespace kz7 {

@@ -1,9 +1,9 @@
-#include "install/admin/import_command.h"
+#include "install/admin/commands/import_command.h"
 
 #include <CLI/CLI.hpp>
 
+#include "install/admin/formats/reg_text.h"
 #include "install/admin/input_file.h"
-#include "install/admin/reg_text.h"
 #include "install/platform/text.h"
 
 namespace kz7 {

@@ -1,14 +1,14 @@
-#include "install/admin/aliases_command.h"
+#include "install/admin/commands/aliases_command.h"
 
 #include <CLI/CLI.hpp>
 #include <array>
 #include <map>
 #include <optional>
 
-#include "install/admin/text_table.h"
+#include "install/admin/formats/text_table.h"
 #include "install/platform/text.h"
 #include "install/src/copies/install_copies_profile.h"
-#include "install/src/copy_layout.h"
+#include "install/src/registry/copy_layout.h"
 
 namespace kz7 {
 namespace {

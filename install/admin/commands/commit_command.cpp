@@ -1,4 +1,4 @@
-#include "install/admin/commit_command.h"
+#include "install/admin/commands/commit_command.h"
 
 #include <CLI/CLI.hpp>
 #include <algorithm>
@@ -8,9 +8,9 @@
 #include "install/admin/input_file.h"
 #include "install/platform/text.h"
 #include "install/runtime/config_handler.h"
-#include "install/runtime/copy_name.h"
 #include "install/runtime/observers/log_observer.h"
-#include "install/src/copy_layout.h"
+#include "install/src/registry/copy_layout.h"
+#include "install/src/registry/copy_name.h"
 
 namespace kz7 {
 namespace {

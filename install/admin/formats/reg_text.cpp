@@ -1,4 +1,4 @@
-#include "install/admin/reg_text.h"
+#include "install/admin/formats/reg_text.h"
 
 #include <algorithm>
 #include <charconv>

@@ -1,8 +1,8 @@
-#include "install/admin/tree_command.h"
+#include "install/admin/commands/tree_command.h"
 
 #include <CLI/CLI.hpp>
 
-#include "install/admin/value_type.h"
+#include "install/admin/formats/value_type.h"
 #include "install/platform/text.h"
 
 namespace kz7 {
