@@ -35,7 +35,7 @@ EmbeddedRegistry openStore(const Scratch& scratch) {
 class BareStore {
 public:
     explicit BareStore(const Scratch& scratch) {
-        const StoreFile file(scratch.path());
+        StoreFile file(scratch.path());
         require(file.openForWriting(connection_).status == kSuccess);
         addKey_ = prepare("INSERT INTO key (parent, fold, name, class) VALUES (?, ?, ?, '')");
         addValue_ = prepare("INSERT INTO value (key, fold, name, type, data, place) VALUES (?, ?, ?, 1, ?, ?)");

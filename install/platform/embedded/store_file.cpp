@@ -1,20 +1,20 @@
 #include "install/platform/embedded/store_file.h"
 
 #include <fcntl.h>
-#include <sys/random.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include <array>
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
+#include <memory>
 
 namespace kz7 {
 namespace {
 
 constexpr int kBusyTimeout = 5000;  // milliseconds that a run waits for another writer
 constexpr std::int64_t kSchemaVersion = 1;
+constexpr std::size_t kLongestDirectory = 440;  // bytes; SQLite takes 512 with the names of the files in it
 
 // Names are kept as they were first written beside their upper-cased form, which is what they are found and
 // ordered by. The roots are rows 1 and 2. Ids are never used again, so that a handle that another process's
@@ -28,77 +28,32 @@ constexpr const char* kSchema =
     " (2, 0, 'HKEY_USERS', 'HKEY_USERS', '');"
     "PRAGMA user_version = 1;";
 
-std::string environment(const char* name) {
-    const char* value = std::getenv(name);
-    return value == nullptr ? std::string{} : value;
+// SQLite's own file system but for one thing: names are used as they are given. Its own resolves links, and so would
+// turn the short name of a directory back into the long one.
+const char* fileSystemOfGivenNames() {
+    static sqlite3_vfs system = [] {
+        const sqlite3_vfs* const usual = sqlite3_vfs_find(nullptr);
+        sqlite3_vfs copy = usual == nullptr ? sqlite3_vfs{} : *usual;
+        copy.zName = "kz7";
+        copy.xFullPathname = [](sqlite3_vfs*, const char* name, int size, char* room) {
+            sqlite3_snprintf(size, room, "%s", name);
+            return SQLITE_OK;
+        };
+        return copy;
+    }();
+    static const bool known = system.xOpen != nullptr && sqlite3_vfs_register(&system, 0) == SQLITE_OK;
+    return known ? system.zName : nullptr;
 }
 
-// A suffix that nobody can guess.
-bool randomSuffix(std::string& suffix) {
-    std::array<unsigned char, 16> noise{};
-    if (getrandom(noise.data(), noise.size(), 0) != static_cast<ssize_t>(noise.size())) {
-        return false;
-    }
-    static constexpr char kDigits[] = "0123456789abcdef";
-    suffix.clear();
-    for (const unsigned char byte : noise) {
-        suffix += kDigits[byte >> 4];
-        suffix += kDigits[byte & 15];
-    }
-    return true;
-}
-
-int syncFile(const std::string& path, int flags) {
-    const int file = open(path.c_str(), O_RDONLY | O_CLOEXEC | flags);
-    if (file < 0) {
-        return errno;
-    }
-    const int error = fsync(file) == 0 ? 0 : errno;
-    close(file);
-    return error;
+bool isTooLong(const std::string& directory) {
+    const std::unique_ptr<char, void (*)(void*)> resolved(realpath(directory.c_str(), nullptr), std::free);
+    return directory.size() > kLongestDirectory ||
+           (resolved != nullptr && std::strlen(resolved.get()) > kLongestDirectory);
 }
 
 }  // namespace
 
-int makeFolder(const std::string& path) {
-    if (mkdir(path.c_str(), 0700) == 0) {
-        return 0;
-    }
-    if (errno == ENOENT) {
-        const std::size_t cut = path.find_last_of('/');
-        if (cut != std::string::npos && cut != 0) {
-            if (const int error = makeFolder(path.substr(0, cut)); error != 0) {
-                return error;
-            }
-            return mkdir(path.c_str(), 0700) == 0 || errno == EEXIST ? 0 : errno;
-        }
-        return ENOENT;
-    }
-    if (errno != EEXIST) {
-        return errno;
-    }
-    struct stat found {};
-    if (stat(path.c_str(), &found) != 0) {
-        return errno;
-    }
-    return S_ISDIR(found.st_mode) ? 0 : ENOTDIR;
-}
-
-std::string usualStateDirectory() {
-    if (std::string named = environment("KZ7_STATE_DIR"); !named.empty()) {
-        return named;
-    }
-    if (geteuid() == 0) {
-        return kMachineStateDirectory;
-    }
-    if (const std::string state = environment("XDG_STATE_HOME"); !state.empty()) {
-        return state + "/kz7";
-    }
-    const std::string home = environment("HOME");
-    return home.empty() ? std::string{} : home + "/.local/state/kz7";
-}
-
-StoreFile::StoreFile(std::string directory) : directory_(std::move(directory)), path_(directory_ + "/registry.db") {}
+StoreFile::StoreFile(std::string directory) : directory_(std::move(directory)), path_(directory_ + '/' + kStoreName) {}
 
 bool StoreFile::exists() const {
     // Only a definite "not there" is one: a folder that may not be searched is an error of the open.
@@ -114,7 +69,11 @@ StoreFault StoreFile::refused(Status status, const std::string& file, int error)
     return {status, file, std::strerror(error)};
 }
 
-StoreFault StoreFile::openForWriting(Connection& connection) const {
+StoreFault StoreFile::stayedLocked() const {
+    return {kBusy, path_, "stayed locked by another program for 5 seconds"};
+}
+
+StoreFault StoreFile::openForWriting(Connection& connection) {
     if (!exists()) {
         if (StoreFault fault = make(); fault.status != kSuccess) {
             return fault;
@@ -123,63 +82,85 @@ StoreFault StoreFile::openForWriting(Connection& connection) const {
     return open(connection);
 }
 
-// Several processes may make the store at once. Each builds its own under a name of its own and links it
-// into place; the first link wins and everybody opens that one. (Switching a shared new file to a
-// write-ahead log instead fails whatever the busy timeout.)
-StoreFault StoreFile::make() const {
+// Several processes may make the store at once: one of them holds the lock of the directory and builds it under
+// another name, and the rest find it made. A process that is killed leaves at most a file that the next one removes.
+// (Switching a shared new file to a write-ahead log instead fails whatever the busy timeout.)
+StoreFault StoreFile::make() {
     if (directory_.empty()) {
         return {kCannotOpen, "state directory", "neither KZ7_STATE_DIR nor HOME is set"};
     }
     if (const int error = makeFolder(directory_); error != 0) {
         return refused(kCannotOpen, directory_, error);
     }
-    std::string suffix;
-    if (!randomSuffix(suffix)) {
-        return refused(kCannotOpen, path_, errno);
+    OwnedDescriptor folder;
+    if (const int error = lockFolder(directory_, kBusyTimeout, folder); error != 0) {
+        return error == EWOULDBLOCK ? stayedLocked() : refused(kCannotOpen, directory_, error);
     }
-    const std::string temporary = path_ + "." + suffix;
-    StoreFault fault = build(temporary);
-    if (fault.status == kSuccess) {
-        int error = syncFile(temporary, 0);
-        if (error == 0 && link(temporary.c_str(), path_.c_str()) != 0 && errno != EEXIST) {
-            error = errno;
-        }
-        if (error == 0) {
-            error = syncFile(directory_, O_DIRECTORY);
-        }
-        if (error != 0) {
-            fault = refused(kCannotOpen, path_, error);
-        }
+    // Whatever has the name is left to the open, a link that leads nowhere too.
+    struct stat found {};
+    if (fstatat(folder.get(), kStoreName, &found, AT_SYMLINK_NOFOLLOW) == 0) {
+        return {};
     }
-    for (const char* end : {"", "-wal", "-shm", "-journal"}) {
-        unlink((temporary + end).c_str());
+    removeUnfinishedStores(directory_);
+    StoreFault fault = build(folder);
+    if (fault.status != kSuccess) {
+        removeUnfinishedStores(directory_);
     }
     return fault;
 }
 
-StoreFault StoreFile::build(const std::string& path) const {
-    const int file = ::open(path.c_str(), O_CREAT | O_EXCL | O_RDWR | O_CLOEXEC, 0600);
-    if (file < 0) {
-        return refused(kCannotOpen, path, errno);
+StoreFault StoreFile::build(const OwnedDescriptor& folder) {
+    std::string name;
+    if (!unfinishedStoreName(name)) {
+        return refused(kCannotOpen, path_, errno);
     }
-    close(file);
-    sqlite3* opened = nullptr;
-    int result = sqlite3_open_v2(path.c_str(), &opened, SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX, nullptr);
-    const Connection connection(opened);
+    // Open until the end: closing it earlier would drop SQLite's locks on the file.
+    const OwnedDescriptor file(
+        openat(folder.get(), name.c_str(), O_CREAT | O_EXCL | O_RDWR | O_NOFOLLOW | O_CLOEXEC, 0600));
+    if (!file) {
+        return refused(kCannotOpen, directory_ + '/' + name, errno);
+    }
+    Connection connection;
+    int result = connect(name, connection);
     // The schema first: a small file in rollback mode is written once, the switch then only marks its header.
     for (const char* sql :
          {"PRAGMA page_size = 4096; PRAGMA synchronous = OFF; BEGIN", kSchema, "COMMIT", "PRAGMA journal_mode = WAL"}) {
         if (result == SQLITE_OK) {
-            result = execute(opened, sql);
+            result = execute(connection.get(), sql);
         }
     }
-    return result == SQLITE_OK ? StoreFault{} : explain(opened, result);
+    if (result != SQLITE_OK) {
+        return explain(connection.get(), result);
+    }
+    connection.reset();
+    // The lock makes this safe on file systems without hard links and without a rename that replaces nothing.
+    if (fsync(file.get()) != 0 || renameat(folder.get(), name.c_str(), folder.get(), kStoreName) != 0 ||
+        fsync(folder.get()) != 0) {
+        return refused(kCannotOpen, path_, errno);
+    }
+    return {};
 }
 
-StoreFault StoreFile::open(Connection& connection) const {
+int StoreFile::connect(const std::string& name, Connection& connection) {
+    std::string path = directory_ + '/' + name;
+    const char* system = nullptr;
+    if (isTooLong(directory_)) {
+        if (!folder_) {
+            folder_.receive() = ::open(directory_.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC);
+        }
+        path = "/proc/self/fd/" + std::to_string(folder_.get()) + '/' + name;
+        system = fileSystemOfGivenNames();
+    }
     sqlite3* opened = nullptr;
-    int result = sqlite3_open_v2(path_.c_str(), &opened, SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX, nullptr);
-    Connection owned(opened);
+    const int result = sqlite3_open_v2(path.c_str(), &opened, SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX, system);
+    connection.reset(opened);
+    return result;
+}
+
+StoreFault StoreFile::open(Connection& connection) {
+    Connection owned;
+    int result = connect(kStoreName, owned);
+    sqlite3* const opened = owned.get();
     std::int64_t version = 0;
     if (result == SQLITE_OK) {
         sqlite3_extended_result_codes(opened, 1);
@@ -223,7 +204,7 @@ StoreFault StoreFile::explain(sqlite3* connection, int result) const {
     switch (result & 0xFF) {
         case SQLITE_BUSY:
         case SQLITE_LOCKED:
-            return {kBusy, path_, "stayed locked by another program for 5 seconds"};
+            return stayedLocked();
         case SQLITE_FULL:
             return {kDiskFull, path_, said};
         case SQLITE_CORRUPT:

@@ -5,17 +5,10 @@
 #include <string>
 
 #include "install/platform/embedded/database.h"
+#include "install/platform/embedded/store_directory.h"
 #include "install/platform/status.h"
 
 namespace kz7 {
-
-inline constexpr const char* kMachineStateDirectory = "/var/lib/kz7";
-
-// $KZ7_STATE_DIR; else /var/lib/kz7 for root; else $XDG_STATE_HOME/kz7 or ~/.local/state/kz7; else empty.
-std::string usualStateDirectory();
-
-// Makes a folder and its missing parents for their owner alone; 0 or the error of the call that failed.
-int makeFolder(const std::string& path);
 
 struct StoreFault {
     Status status = kSuccess;
@@ -31,10 +24,10 @@ public:
     bool exists() const;
 
     // Makes the state directory (mode 0700) and the store when they are missing, and opens it as a writer.
-    StoreFault openForWriting(Connection& connection) const;
+    StoreFault openForWriting(Connection& connection);
 
-    // Opens a store that exists.
-    StoreFault open(Connection& connection) const;
+    // Opens a store that exists. A connection must be closed before this object goes.
+    StoreFault open(Connection& connection);
 
     // An empty store in memory, for reading where there is none.
     StoreFault openEmpty(Connection& connection) const;
@@ -43,12 +36,16 @@ public:
     StoreFault explain(sqlite3* connection, int result) const;
 
 private:
-    StoreFault make() const;
-    StoreFault build(const std::string& path) const;
+    StoreFault make();
+    StoreFault build(const OwnedDescriptor& folder);
+    // Opens the file of that name in the state directory; the connection is there on failure too, for its message.
+    int connect(const std::string& name, Connection& connection);
     StoreFault refused(Status status, const std::string& file, int error) const;
+    StoreFault stayedLocked() const;
 
     std::string directory_;
     std::string path_;
+    OwnedDescriptor folder_;  // the state directory, where its path is too long for SQLite
 };
 
 }  // namespace kz7

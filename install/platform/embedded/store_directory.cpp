@@ -1,0 +1,126 @@
+#include "install/platform/embedded/store_directory.h"
+
+#include <dirent.h>
+#include <fcntl.h>
+#include <poll.h>
+#include <sys/file.h>
+#include <sys/random.h>
+#include <sys/stat.h>
+
+#include <array>
+#include <chrono>
+#include <cstdlib>
+#include <memory>
+#include <string_view>
+
+namespace kz7 {
+namespace {
+
+constexpr std::string_view kDigits = "0123456789abcdef";
+constexpr std::size_t kNoiseSize = 16;  // bytes of randomness in the name of an unfinished store
+
+std::string environment(const char* name) {
+    const char* value = std::getenv(name);
+    return value == nullptr ? std::string{} : value;
+}
+
+std::string unfinishedPrefix() {
+    return std::string(kStoreName) + '.';
+}
+
+// Also the name of a file that SQLite keeps beside such a store.
+bool isUnfinishedStore(std::string_view name) {
+    const std::string prefix = unfinishedPrefix();
+    if (!name.starts_with(prefix)) {
+        return false;
+    }
+    name.remove_prefix(prefix.size());
+    const std::size_t end = name.find_first_not_of(kDigits);
+    return (end == std::string_view::npos ? name.size() : end) == 2 * kNoiseSize &&
+           (end == std::string_view::npos || name[end] == '-');
+}
+
+int syncFolder(const std::string& path) {
+    const OwnedDescriptor folder(open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    // One that may be written but not read cannot be synced, and is no reason to make nothing in it.
+    const bool done = folder ? fsync(folder.get()) == 0 : errno == EACCES;
+    return done ? 0 : errno;
+}
+
+int makeOne(const std::string& path) {
+    if (mkdir(path.c_str(), 0700) == 0) {
+        const std::size_t cut = path.find_last_of('/');
+        return syncFolder(cut == std::string::npos ? "." : path.substr(0, cut + 1));
+    }
+    const int error = errno;
+    struct stat found {};
+    if (stat(path.c_str(), &found) != 0) {
+        return error == EEXIST ? errno : error;
+    }
+    return S_ISDIR(found.st_mode) ? 0 : ENOTDIR;
+}
+
+}  // namespace
+
+std::string usualStateDirectory() {
+    if (std::string named = environment("KZ7_STATE_DIR"); !named.empty()) {
+        return named;
+    }
+    if (geteuid() == 0) {
+        return kMachineStateDirectory;
+    }
+    if (const std::string state = environment("XDG_STATE_HOME"); !state.empty()) {
+        return state + "/kz7";
+    }
+    const std::string home = environment("HOME");
+    return home.empty() ? std::string{} : home + "/.local/state/kz7";
+}
+
+int makeFolder(const std::string& path) {
+    for (std::size_t end = path.find_first_not_of('/'); end != std::string::npos;) {
+        end = path.find('/', end);
+        if (const int error = makeOne(path.substr(0, end)); error != 0) {
+            return error;
+        }
+        end = end == std::string::npos ? end : path.find_first_not_of('/', end);
+    }
+    return 0;
+}
+
+int lockFolder(const std::string& path, int milliseconds, OwnedDescriptor& folder) {
+    using Clock = std::chrono::steady_clock;
+    const auto deadline = Clock::now() + std::chrono::milliseconds(milliseconds);
+    OwnedDescriptor opened(open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    while (!opened || flock(opened.get(), LOCK_EX | LOCK_NB) != 0) {
+        if (!opened || errno != EWOULDBLOCK || Clock::now() > deadline) {
+            return errno;
+        }
+        poll(nullptr, 0, 1);
+    }
+    folder = std::move(opened);
+    return 0;
+}
+
+bool unfinishedStoreName(std::string& name) {
+    std::array<unsigned char, kNoiseSize> noise{};
+    if (getrandom(noise.data(), noise.size(), 0) != static_cast<ssize_t>(noise.size())) {
+        return false;
+    }
+    name = unfinishedPrefix();
+    for (const unsigned char byte : noise) {
+        name += kDigits[byte >> 4];
+        name += kDigits[byte & 15];
+    }
+    return true;
+}
+
+void removeUnfinishedStores(const std::string& path) {
+    const std::unique_ptr<DIR, int (*)(DIR*)> entries(opendir(path.c_str()), closedir);
+    while (const dirent* entry = entries == nullptr ? nullptr : readdir(entries.get())) {
+        if (isUnfinishedStore(entry->d_name)) {
+            unlinkat(dirfd(entries.get()), entry->d_name, 0);
+        }
+    }
+}
+
+}  // namespace kz7

@@ -1,0 +1,31 @@
+// The state directory: which one it is, how it is made, and how the processes that make the store in it keep out
+// of each other's way.
+#pragma once
+
+#include <string>
+
+#include "install/platform/embedded/descriptor.h"
+
+namespace kz7 {
+
+inline constexpr const char* kMachineStateDirectory = "/var/lib/kz7";
+inline constexpr const char* kStoreName = "registry.db";
+
+// $KZ7_STATE_DIR; else /var/lib/kz7 for root; else $XDG_STATE_HOME/kz7 or ~/.local/state/kz7; else empty.
+std::string usualStateDirectory();
+
+// Makes a directory and its missing parents for their owner alone. Each new one is synced with its parent, so that a
+// power cut does not take a store with its directory. 0 or an error number.
+int makeFolder(const std::string& path);
+
+// Opens a directory and locks it exclusively for as long as `folder` is open; the system unlocks it when a process
+// dies. EWOULDBLOCK: another process held the lock all the time.
+int lockFolder(const std::string& path, int milliseconds, OwnedDescriptor& folder);
+
+// A name for a store that is being built, which nobody can guess. False when the system has no randomness.
+bool unfinishedStoreName(std::string& name);
+
+// Removes what builders of a store have left in a directory. The caller holds its lock, so all of them are dead.
+void removeUnfinishedStores(const std::string& path);
+
+}  // namespace kz7
