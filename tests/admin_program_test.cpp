@@ -1,5 +1,6 @@
 // kz7admin as people run it: what it shows, what it answers, and that a store stays as it was where it fails.
 #include <gtest/gtest.h>
+#include <sqlite3.h>
 
 #include <sys/resource.h>
 #include <unistd.h>
@@ -66,15 +67,13 @@ TEST_F(AdminProgram, ShowsForReadingAndForPrograms) {
     ASSERT_EQ(admin({"import", path}).exitCode, 0);
     const ProgramResult tree = admin({"tree"});
     EXPECT_EQ(tree.exitCode, 0);
-    EXPECT_EQ(tree.error, "");
-    EXPECT_EQ(tree.output, "store " + store_.file("registry.db") +
-                               R"(
-HKEY_LOCAL_MACHINE
+    EXPECT_EQ(tree.error, storeTold());
+    EXPECT_EQ(tree.output, R"(HKEY_LOCAL_MACHINE
   K (class "c\x1b")
     @ REG_SZ "a\b"
     "\x0a" REG_SZ "\x1b\xe9\u202e)"
-                               "\xC3\xA9"
-                               R"(" (without its end)
+                           "\xC3\xA9"
+                           R"(" (without its end)
     "d" REG_DWORD 255 (0xff)
     "m" REG_MULTI_SZ "a" "b" ""
     "q" REG_QWORD 4294967296 (0x100000000)
@@ -104,9 +103,9 @@ TEST_F(AdminProgram, AnswersNoAndTellsFaults) {
     const std::string unnamable = "HKU\\" + std::string(256, 'x');
     // clang-format off
     const struct { std::vector<std::string> arguments; int exitCode; std::string output; std::string error; } rows[] = {
-        {{"tree"},                1, "store " + missing + "\n", told(missing + ": there is nothing to show")},
+        {{"tree"},                1, "", told(missing + ": there is nothing to show")},
         {{"export"},              1, kHead, storeTold() + told(missing + ": there is nothing to show")},
-        {{"export", "HKU\\x\n"},  1, "", storeTold() + told("HKEY_USERS\\x\\x0a: there is no such key")},
+        {{"export", "HKU\\x\n"},  1, "", told("HKEY_USERS\\x\\x0a: there is no such key")},
         {{"tree", "HKCU"},        1, "", told("HKEY_CURRENT_USER: there is no such key")},
         {{"tree", unnamable},     2, "", told("HKEY_USERS" + unnamable.substr(3) + ": no key can be named so")},
         {{"import", bad},         2, "", told(bad + ":5: the line is no key, no value and no comment")},
@@ -127,6 +126,24 @@ TEST_F(AdminProgram, AnswersNoAndTellsFaults) {
     EXPECT_NE(access(missing.c_str(), F_OK), 0) << "nothing of all this makes a store";
 }
 
+TEST_F(AdminProgram, ReportsKeysThatAreListedAndCannotBeRead) {
+    ASSERT_EQ(admin({"import", file(kHead + "[HKLM\\a]\n[HKLM\\b]\n"s)}).exitCode, 0);
+    sqlite3* store = nullptr;
+    ASSERT_EQ(sqlite3_open(store_.file("registry.db").c_str(), &store), SQLITE_OK);
+    EXPECT_EQ(sqlite3_exec(store, "UPDATE key SET fold = 'AX' WHERE name = 'a'", nullptr, nullptr, nullptr), SQLITE_OK);
+    sqlite3_close(store);
+    const std::string line = "HKEY_LOCAL_MACHINE\\a: is listed but cannot be read: error 2";
+    const std::string json = R"({"key":"HKEY_LOCAL_MACHINE\\a","class":"","values":[],"error":2},)";
+    for (const auto& [command, shown] : {std::pair{Arguments{"tree"}, "  a (cannot be read: error 2)\n  b\n"s},
+                                         {{"export"}, kHead + "\n[HKEY_LOCAL_MACHINE\\b]\n"s},
+                                         {{"export", "--json"}, json}}) {
+        const ProgramResult result = admin(command);
+        EXPECT_EQ(result.exitCode, 2);
+        EXPECT_EQ(result.error, told(line) + storeTold());
+        EXPECT_NE(result.output.find(shown), std::string::npos) << result.output;
+    }
+}
+
 TEST_F(AdminProgram, KeepsAStoreThatItCannotChange) {
     ASSERT_EQ(store_.tool({"-addKZ7Copy", "COPY1", "C:\\KZ7"}).exitCode, 0);
     const std::string before = store_.dump();
@@ -145,10 +162,16 @@ TEST_F(AdminProgram, KeepsAStoreThatItCannotChange) {
     EXPECT_EQ(std::count(full.error.begin(), full.error.end(), '\n'), 1) << full.error;
     EXPECT_EQ(store_.dump(), before);
 
-    const ProgramResult noRoom = runProgram({"/bin/sh", "-c", programPath("kz7admin") + " tree >/dev/full"},
-                                            {{"KZ7_STATE_DIR=" + store_.path()}, {}});
-    EXPECT_EQ(noRoom.exitCode, 2);
-    EXPECT_EQ(noRoom.error, told("standard output takes no more"));
+    for (const auto& [command, exitCode, said] :
+         {std::tuple{"tree >/dev/full", 2, "error 112"},
+          {"copies >&-", 2, "error 29"},
+          {"export --utf16 | head -c 1 >/dev/null; exit ${PIPESTATUS[0]}", 0, ""}}) {
+        const ProgramResult result = runProgram({"/bin/bash", "-c", programPath("kz7admin") + " " + command},
+                                                {{"KZ7_STATE_DIR=" + store_.path()}, {}});
+        EXPECT_EQ(result.exitCode, exitCode) << command;
+        EXPECT_EQ(result.error,
+                  storeTold() + (exitCode == 0 ? "" : told("standard output cannot be written: "s + said)));
+    }
 
     overwrite(store_.file("registry.db"), "rubbish");
     for (const char* const command : {"tree", "import"}) {

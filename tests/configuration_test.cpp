@@ -21,6 +21,11 @@ ConfigurationTarget targetOf(std::string_view instance) {
     return target;
 }
 
+void addCopyKey(IRegistryStore& registry) {
+    OwnedKey key(registry);
+    registry.createKey(KeyHandle::localMachine, "SOFTWARE\\NVQ\\KZ7\\InstalledCopies\\COPY1", {}, 0, key.receive());
+}
+
 class Configuration : public testing::Test {
 protected:
     Configuration() {
@@ -29,6 +34,7 @@ protected:
         machine.files_.add("C:\\prof\\INST\\kz7systm");
         machine.processes_.addProgram(kProcessor, {.output = "done"});
         machine.processes_.started.clear();
+        addCopyKey(machine.registry_);
         profile.set("INST", "KZ7INSTPROF", "C:\\prof");
         profile.set("OTHER", "KZ7INSTPROF", "C:\\prof");
         profile.set(kGlobalProfile, "KZ7INSTPROF", "C:\\prof");
@@ -168,6 +174,7 @@ TEST_F(Configuration, NoFailureStopsTheOthers) {
         [](FaultyMachine& host) {
             host.files_.add("C:\\prof\\INST\\kz7systm");
             host.processes_.addProgram(kProcessor, {});
+            addCopyKey(host.registry_);
             ProfileRegistry(host.registry_, "COPY1").set("INST", "KZ7INSTPROF", "C:\\prof");
         },
         [](FaultyMachine& host) {

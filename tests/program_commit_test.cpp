@@ -50,6 +50,15 @@ TEST_F(CommitProgram, SetsWhatAResponseFileSays) {
         << kept;
     EXPECT_NE(store_.dump().find("COPY1\\PROFILES\\INST : KZ7ACCOUNT = 1:me\\x00\n"), std::string::npos);
 
+    const ProgramResult lost = runProgram({"/bin/sh", "-c",
+                                           programPath("kz7admin") + " commit --copy COPY1 --response-file " +
+                                               responses("KZ7COMM = a\nNOPE = 1\n") + " >&-"},
+                                          {{"KZ7_STATE_DIR=" + store_.path()}, {}});
+    EXPECT_EQ(lost.exitCode, 1) << "exits by what was set";
+    EXPECT_TRUE(lost.error.starts_with("Error: ") &&
+                lost.error.ends_with("\nkz7admin: standard output cannot be written: error 29\n"))
+        << lost.error;
+
     const ProgramResult machine = store_.run(
         "kz7admin", {"front", "--", programPath("kz7admin"), "--store", store_.path(), "commit", "--copy", "COPY1",
                      "--response-file", responses("KZ7LDAPHOST = l\nNOPE = 1\nKZ7ATLD_PORTS = 1\nDIAGLEVEL = 3\n"),

@@ -56,6 +56,27 @@ TEST_P(Crowd, AddsAtTheSameTimeOnAnEmptyMachineLoseNothing) {
     EXPECT_EQ(state.integrity(), "ok");
 }
 
+TEST(Race, ACopyThatIsRemovedWhileItsVariablesAreSetDoesNotComeBack) {
+    const StateDirectory start;
+    for (const Arguments& command : {kAddFirst, kAddSecond}) {
+        ASSERT_EQ(start.tool(command).exitCode, 0);
+    }
+    const StateDirectory removed;
+    removed.copyFrom(start);
+    ASSERT_EQ(removed.tool({"-removeKZ7Copy", "FIRST"}).exitCode, 0);
+    overwrite(start.file("responses"), "KZ7COMM = TCPIP\n");
+    for (int round = 0; round < 60; ++round) {
+        const StateDirectory state;
+        state.copyFrom(start);
+        const pid_t removal = state.start({"-removeKZ7Copy", "FIRST"});
+        state.run("kz7admin", {"commit", "--copy", "FIRST", "--response-file", state.file("responses")});
+        int status = 0;
+        waitpid(removal, &status, 0);
+        EXPECT_EQ(status, 0);
+        EXPECT_EQ(state.dump(), removed.dump()) << "round " << round;
+    }
+}
+
 INSTANTIATE_TEST_SUITE_P(Processes, Crowd, testing::Values(2, 8));
 
 // The sample copy's location; its programs can be made to look at the store that they were started on.

@@ -190,10 +190,9 @@ TEST(HumanStream, IsReadableAndAsWideAsTheTerminal) {
     engine.startTask(1, kUndoTask, true, "");
     EXPECT_EQ(engine.ask(2, kTextMessage, std::array<Insert, 1>{"Sure?"}, "", answer), Response::none);
     const std::string asked = "The installation medium was\nnot found. Where is it? [D:\\]\n(ABORT to stop): \n";
+    EXPECT_EQ(machine.console_.error, "Error: Copier::copy, step 10:\nerror 112\n");
     EXPECT_EQ(machine.console_.output,
-              "Copying files ...\n"
-              "Error: Copier::copy, step 10:\nerror 112\n" +
-                  asked + asked +
+              "Copying files ...\n" + asked + asked +
                   "abc\ndef\nabcdef\nghi\n\nabcdef\ngh\n\xC3\xA4\xC3\xB6\xC3\xBC\xC3\xA4\xC3\xB6\xC3\xBC\nx\na\n\xE2"
                   "\x82\xAC\nx\n"
                   "The installation medium was not found. Where is it? [D:\\] (ABORT to stop): \n" +

@@ -1,5 +1,7 @@
 #include "install/admin/admin.h"
 
+#include <utility>
+
 #include "install/platform/registry_path.h"
 #include "install/platform/text.h"
 
@@ -7,11 +9,12 @@ namespace kz7 {
 namespace {
 
 constexpr std::string_view kProgram = "kz7admin";
-constexpr std::size_t kPiece = 1 << 16;  // bytes written out at once
+constexpr std::size_t kPage = 1 << 16;  // bytes that are shown at once
 
 }  // namespace
 
 bool Admin::open(bool readOnly) {
+    readOnly_ = readOnly;
     platform_ = hostPlatform({.program = std::string(kProgram),
                               .stateDirectory = storeDirectory,
                               .readOnly = readOnly,
@@ -42,36 +45,52 @@ Answer Admin::selectKeys(const std::string& key, std::vector<KeyStart>& starts) 
     return status == kSuccess ? kAnswerYes : storeFault(shown + ": cannot be read", status);
 }
 
-Answer Admin::showKeys(const std::string& key, std::string head, const Appender& append, std::string_view tail) {
+Answer Admin::showKeys(const std::string& key, std::string text, const Appender& append, std::string_view tail,
+                       Reading reading) {
     std::vector<KeyStart> starts;
     if (const Answer selected = selectKeys(key, starts); selected != kAnswerYes) {
         return selected;
     }
-    std::string text = std::move(head);
     Answer written = kAnswerYes;
-    bool shown = false;
+    Answer outcome = kAnswerNo;
+    const auto visit = [&](const KeyRecord& record) {
+        if (record.status != kSuccess) {
+            if (platform_->storeFaultTold()) {
+                return record.status;
+            }
+            outcome = storeFault(shownText(record.name) + ": is listed but cannot be read", record.status);
+        } else if (isBareRoot(record) && !record.hasSubkeys) {
+            return kSuccess;
+        }
+        outcome = outcome == kAnswerNo ? kAnswerYes : outcome;
+        append(record, text);
+        if (reading == Reading::pages && text.size() > kPage) {
+            written = show(text);
+            text.clear();
+        }
+        return written == kAnswerYes ? kSuccess : kWriteFault;
+    };
     for (const KeyStart& start : starts) {
-        const Status status = walkKeys(registry(), start, [&](const KeyRecord& record) {
-            if (isBareRoot(record) && !record.hasSubkeys) {
-                return kSuccess;
-            }
-            shown = true;
-            append(record, text);
-            if (text.size() > kPiece) {
-                written = write(text);
-                text.clear();
-            }
-            return written == kAnswerYes ? kSuccess : kWriteFault;
-        });
+        const Status status = walkKeys(registry(), start, visit);
+        if (written != kAnswerYes) {
+            return written;
+        }
         if (status != kSuccess) {
-            return written != kAnswerYes ? written
-                                         : storeFault(shownText(fullKeyName(start.name)) + ": cannot be read", status);
+            return storeFault(shownText(fullKeyName(start.name)) + ": cannot be read", status);
         }
     }
-    text += tail;
-    written = write(text);
-    return written != kAnswerYes || shown ? written
-                                          : no(shownText(platform_->storeName()) + ": there is nothing to show");
+    written = show(text.append(tail));
+    if (written == kAnswerYes && outcome == kAnswerNo) {
+        tell(shownText(platform_->storeName()) + ": there is nothing to show");
+    }
+    return written != kAnswerYes ? written : outcome;
+}
+
+Answer Admin::show(std::string_view text) {
+    if (!text.empty() && !std::exchange(storeTold_, true)) {
+        tell(storeLine());
+    }
+    return write(text);
 }
 
 std::string Admin::storeLine() {
@@ -104,9 +123,17 @@ Answer Admin::storeFault(std::string_view what, Status status) {
 }
 
 Answer Admin::write(std::string_view text) {
+    if (readOnly_) {
+        registry().commit();
+    }
     IConsole& console = platform_->console();
-    const bool written = console.writeOutput(text) == kSuccess && console.flush() == kSuccess;
-    return written ? kAnswerYes : fault("standard output takes no more");
+    Status status = readerGone_ ? kPipeClosing : console.writeOutput(text);
+    if (status == kSuccess) {
+        status = console.flush();
+    }
+    readerGone_ = status == kPipeClosing;
+    return status == kSuccess || readerGone_ ? kAnswerYes
+                                             : fault(compose("standard output cannot be written: error %u", {status}));
 }
 
 }  // namespace kz7

@@ -35,9 +35,15 @@ public:
     IRegistryStore& registry() { return platform_->registry(); }
 
     // Shows the named key with all below it, or without a name all there is to show, between a head and a
-    // tail: `append` adds what a key looks like. It goes out piece by piece.
+    // tail: `append` adds what a key looks like, also one that cannot be read, which is told. By pages it goes out
+    // while it is read and others may write in between.
     using Appender = std::function<void(const KeyRecord&, std::string&)>;
-    Answer showKeys(const std::string& key, std::string head, const Appender& append, std::string_view tail);
+    enum class Reading { snapshot, pages };
+    Answer showKeys(const std::string& key, std::string text, const Appender& append, std::string_view tail,
+                    Reading reading);
+
+    // Writes to standard output; the store it comes from is told on standard error, once.
+    Answer show(std::string_view text);
 
     // Which store was opened, and what to know about that.
     std::string storeLine();
@@ -50,13 +56,17 @@ public:
     // The same for a status of the store, unless the store has told its fault already.
     Answer storeFault(std::string_view what, Status status);
 
-    // Writes to standard output what it is given and all before; the fault is told.
+    // Writes to standard output; a fault is told. A reader that is gone wants no more, which is no fault. A store that
+    // is open for reading is not held meanwhile.
     Answer write(std::string_view text);
 
 private:
     Answer selectKeys(const std::string& key, std::vector<KeyStart>& starts);
 
     std::unique_ptr<IPlatform> platform_;
+    bool readOnly_ = false;
+    bool storeTold_ = false;
+    bool readerGone_ = false;
 };
 
 }  // namespace kz7

@@ -50,6 +50,26 @@ public:
         });
     }
 
+    // Opens a key and reads what is in it.
+    Status key(KeyHandle parent, std::string_view path, OwnedKey& key, std::vector<KeyValue>& values,
+               std::vector<Subkey>& subkeys) {
+        values.clear();
+        Status status = registry_.openKey(parent, path, kKeyWalk, key.receive());
+        if (status == kSuccess) {
+            status = this->values(key.get(), values);
+        }
+        return status == kSuccess ? this->subkeys(key.get(), subkeys) : status;
+    }
+
+    // Whether a key still lists a subkey that could not be read. False when the key itself is deleted.
+    bool isListed(KeyHandle parent, std::string_view name) {
+        std::vector<Subkey> listed;
+        const Status status = subkeys(parent, listed);
+        return status == kSuccess ? std::any_of(listed.begin(), listed.end(),
+                                                [&](const Subkey& subkey) { return subkey.name == name; })
+                                  : !isNotFound(status) && status != kKeyDeleted;
+    }
+
 private:
     template <typename Item, typename Read>
     Status all(std::vector<Item>& found, std::string& room, Read read) {
@@ -153,19 +173,14 @@ Status walkKeys(IRegistryStore& registry, const KeyStart& start, const KeyVisito
     std::vector<Level> levels;
     const auto enter = [&](KeyHandle parent, std::string_view path) {
         Level level{OwnedKey(registry), {}, 0, record.name.size()};
-        Status status = registry.openKey(parent, path, kKeyWalk, level.key.receive());
-        if (status == kSuccess) {
-            status = reader.values(level.key.get(), record.values);
+        record.depth = levels.size();
+        record.status = reader.key(parent, path, level.key, record.values, level.subkeys);
+        record.hasSubkeys = !level.subkeys.empty();
+        if (record.status != kSuccess && (levels.empty() || !reader.isListed(parent, path))) {
+            return levels.empty() ? record.status : kSuccess;
         }
-        if (status == kSuccess) {
-            status = reader.subkeys(level.key.get(), level.subkeys);
-        }
-        if (status == kSuccess) {
-            record.depth = levels.size();
-            record.hasSubkeys = !level.subkeys.empty();
-            status = visit(record);
-        }
-        if (status == kSuccess) {
+        const Status status = visit(record);
+        if (status == kSuccess && record.status == kSuccess) {
             levels.push_back(std::move(level));
         }
         return status;
@@ -182,10 +197,6 @@ Status walkKeys(IRegistryStore& registry, const KeyStart& start, const KeyVisito
         record.name.append(1, '\\').append(subkey.name);
         record.keyClass = std::move(subkey.keyClass);
         status = enter(level.key.get(), subkey.name);
-        // On a live registry a key may go while its siblings are read.
-        if (isNotFound(status)) {
-            status = kSuccess;
-        }
     }
     return status;
 }

@@ -22,6 +22,7 @@ struct KeyRecord {
     std::string keyClass;
     bool hasSubkeys = false;
     std::vector<KeyValue> values;
+    Status status = kSuccess;  // else the key is listed but cannot be read, and nothing below it is visited
 };
 
 // A root without values of its own: it is always there and tells nothing.
@@ -44,7 +45,8 @@ Status findKey(IRegistryStore& registry, const KeyName& name, KeyStart& start);
 // machine's registry. None is success.
 Status findEverything(IRegistryStore& registry, bool storeIsOwn, std::vector<KeyStart>& starts);
 
-// The key and all below it, however deep. kFileNotFound: it is not there.
+// The key and all below it, however deep. kFileNotFound: it is not there. A key that is deleted during the walk is left
+// out.
 Status walkKeys(IRegistryStore& registry, const KeyStart& start, const KeyVisitor& visit);
 
 }  // namespace kz7

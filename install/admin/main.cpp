@@ -52,7 +52,7 @@ int main(int argc, char** argv) {
     } catch (const std::bad_alloc&) {
         std::fputs("kz7admin: out of memory\n", stderr);
     } catch (const std::exception& error) {
-        std::fprintf(stderr, "kz7admin: %s\n", error.what());
+        std::fprintf(stderr, "kz7admin: %s\n", kz7::shownText(error.what()).c_str());
     }
     return kz7::kAnswerFault;
 }

@@ -8,8 +8,8 @@
 
 namespace kz7 {
 
-// Texts are written as they are, whole and uncut; a line feed ends a line in the host's own way. A reader
-// that is gone is a status, never a signal. One thread.
+// Texts are written as they are, whole and uncut; a line feed ends a line in the host's own way. kPipeClosing: the
+// reader is gone, which is never a signal. One thread.
 class IConsole {
 public:
     virtual ~IConsole() = default;

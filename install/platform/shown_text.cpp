@@ -7,7 +7,7 @@ namespace {
 
 bool steersTerminal(char32_t character) {
     return character < 0x20 || (character >= 0x7F && character < 0xA0) || isSurrogate(character) ||
-           character == 0x200E || character == 0x200F || (character >= 0x2028 && character <= 0x202E) ||
+           character == 0x061C || character == 0x200E || character == 0x200F || (character >= 0x2028 && character <= 0x202E) ||
            (character >= 0x2066 && character <= 0x2069) || character == 0xFEFF;
 }
 

@@ -6,11 +6,12 @@
 namespace kz7 {
 namespace {
 
+Status lastStatus() {
+    return errno == EPIPE ? kPipeClosing : errno == ENOSPC ? kDiskFull : kWriteFault;
+}
+
 Status write(std::FILE* stream, std::string_view text) {
-    if (std::fwrite(text.data(), 1, text.size(), stream) == text.size()) {
-        return kSuccess;
-    }
-    return errno == ENOSPC ? kDiskFull : kWriteFault;
+    return std::fwrite(text.data(), 1, text.size(), stream) == text.size() ? kSuccess : lastStatus();
 }
 
 }  // namespace
@@ -27,7 +28,7 @@ Status StandardConsole::writeError(std::string_view text) {
 }
 
 Status StandardConsole::flush() {
-    return std::fflush(stdout) == 0 ? kSuccess : kWriteFault;
+    return std::fflush(stdout) == 0 ? kSuccess : lastStatus();
 }
 
 }  // namespace kz7

@@ -13,16 +13,36 @@ Status named(Status status) {
     return isNotFound(status) ? kVariableNotThere : status;
 }
 
+std::string profileOf(std::string_view instance) {
+    return instance == kGlobalProfile ? "GLOBAL_PROFILE" : "PROFILES\\" + std::string(instance);
+}
+
 }  // namespace
 
+ProfileRegistry::ProfileRegistry(IRegistryStore& registry, std::string_view copyName)
+    : registry_(registry), copyPath_(substituteCopyName(layout::kCopy, copyName)) {}
+
 std::string ProfileRegistry::keyOf(std::string_view instance) const {
-    const std::string copy = substituteCopyName(layout::kCopy, copyName_);
-    return instance == kGlobalProfile ? copy + "\\GLOBAL_PROFILE" : copy + "\\PROFILES\\" + std::string(instance);
+    return copyPath_ + '\\' + profileOf(instance);
 }
 
 Status ProfileRegistry::set(std::string_view instance, std::string_view variable, std::string_view value) {
-    const std::string key = keyOf(instance);
-    return value.empty() ? remove(key, variable) : setText(registry_, key, variable, value);
+    return value.empty() ? remove(keyOf(instance), variable) : write(profileOf(instance), variable, value);
+}
+
+// Below the open key of the copy: one that is removed meanwhile does not come back.
+Status ProfileRegistry::write(const std::string& profile, std::string_view variable, std::string_view value) {
+    Status status = checkPathLength(copyPath_ + '\\' + profile);
+    OwnedKey copy(registry_);
+    if (status == kSuccess) {
+        status = registry_.openKey(KeyHandle::localMachine, copyPath_, kKeyCreateSubkey, copy.receive());
+    }
+    OwnedKey key(registry_);
+    if (status == kSuccess) {
+        status = registry_.createKey(copy.get(), profile, {}, kKeySetValue, key.receive());
+    }
+    return status != kSuccess ? status
+                              : registry_.setValue(key.get(), variable, ValueType::sz, std::string(value) + '\0');
 }
 
 Status ProfileRegistry::remove(const std::string& path, std::string_view variable) {

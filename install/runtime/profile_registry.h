@@ -13,9 +13,9 @@ inline constexpr std::string_view kGlobalProfile = "KZ7GLOBALPF";  // the instan
 // The store outlives it. Changes wait for settle().
 class ProfileRegistry {
 public:
-    ProfileRegistry(IRegistryStore& registry, std::string_view copyName) : registry_(registry), copyName_(copyName) {}
+    ProfileRegistry(IRegistryStore& registry, std::string_view copyName);
 
-    // Sets a variable; the empty value removes it. kVariableNotThere: there is none to remove.
+    // Sets a variable of a copy that has a key; the empty value removes it. kVariableNotThere: there is none to remove.
     Status set(std::string_view instance, std::string_view variable, std::string_view value);
 
     // Ends what the store holds for this writer alone: others, a program that is started too, see what was set and
@@ -26,11 +26,12 @@ public:
     Status get(std::string_view instance, std::string_view variable, std::string& value);
 
 private:
+    Status write(const std::string& profile, std::string_view variable, std::string_view value);
     Status remove(const std::string& key, std::string_view variable);
     std::string keyOf(std::string_view instance) const;
 
     IRegistryStore& registry_;
-    std::string copyName_;
+    std::string copyPath_;
 };
 
 }  // namespace kz7

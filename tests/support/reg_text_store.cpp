@@ -14,7 +14,7 @@ std::string exportAll(IRegistryStore& registry) {
                 if (!isBareRoot(key)) {
                     appendRegText(key, text);
                 }
-                return kSuccess;
+                return key.status;
             });
         }
     }

@@ -130,7 +130,7 @@ Answer showAliases(Admin& admin, const std::string& asked) {
     if (table.size() == 1) {
         return admin.no(shownText(admin.platform().storeName()) + ": there is no such alias and none is due");
     }
-    return admin.write(admin.storeLine() + '\n' + tableText(table));
+    return admin.show(tableText(table));
 }
 
 }  // namespace

@@ -103,11 +103,9 @@ Answer commit(Admin& admin, const Words& words) {
         return admin.storeFault(shownText(words.copy) + ": what was set cannot be kept", outcome.kept);
     }
     if (!words.machine) {
-        const Answer told = admin.write(compose("%s: %u set, %u not set; the log is %s\n",
-                                                {shownText(words.copy), outcome.set, outcome.notSet, shownText(log)}));
-        if (told != kAnswerYes) {
-            return told;
-        }
+        // Text that is lost is told; what was set is set.
+        admin.write(compose("%s: %u set, %u not set; the log is %s\n",
+                            {shownText(words.copy), outcome.set, outcome.notSet, shownText(log)}));
     }
     return outcome.notSet == 0 ? kAnswerYes : kAnswerNo;
 }

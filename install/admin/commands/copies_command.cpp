@@ -156,11 +156,10 @@ Answer showCopies(Admin& admin, bool json) {
         return read;
     }
     const std::string store = admin.platform().storeName();
-    const Answer written = admin.write(json             ? copiesJson(copies, store)
-                                       : copies.empty() ? std::string{}
-                                                        : admin.storeLine() + '\n' + copiesText(copies));
-    return written != kAnswerYes || !copies.empty() ? written
-                                                    : admin.no(shownText(store) + ": there is no installed copy");
+    const Answer shown = admin.show(json             ? copiesJson(copies, store)
+                                    : copies.empty() ? std::string{}
+                                                     : copiesText(copies));
+    return shown != kAnswerYes || !copies.empty() ? shown : admin.no(shownText(store) + ": there is no installed copy");
 }
 
 }  // namespace

@@ -5,6 +5,7 @@
 #include "install/admin/formats/json_text.h"
 #include "install/admin/formats/reg_text.h"
 #include "install/admin/formats/value_type.h"
+#include "install/platform/text.h"
 
 namespace kz7 {
 namespace {
@@ -47,14 +48,17 @@ void appendJsonKey(const KeyRecord& key, std::string& json) {
         appendJsonValue(value, json);
         separator = ",\n  ";
     }
-    json += "]}";
+    json += ']';
+    if (key.status != kSuccess) {
+        json += compose(",\"error\":%u", {key.status});
+    }
+    json += '}';
 }
 
 Answer exportKeys(Admin& admin, const ExportOptions& options) {
     if (!admin.open(true)) {
         return kAnswerFault;
     }
-    admin.tell(admin.storeLine());
     std::string separator = "\n";
     if (options.json) {
         std::string head = "{\"store\":";
@@ -62,24 +66,25 @@ Answer exportKeys(Admin& admin, const ExportOptions& options) {
         return admin.showKeys(
             options.key, head + ",\"keys\":[",
             [&](const KeyRecord& key, std::string& json) {
-                if (!isBareRoot(key)) {
+                if (!isBareRoot(key) || key.status != kSuccess) {
                     json += std::exchange(separator, ",\n");
                     appendJsonKey(key, json);
                 }
             },
-            "]}\n");
+            "]}\n", Admin::Reading::snapshot);
     }
     std::string head = regTextHeader();
-    return admin.showKeys(options.key, options.utf16 ? std::string(kUtf16Mark) + utf16FileText(head) : head,
-                          [&](const KeyRecord& key, std::string& text) {
-                              if (isBareRoot(key)) {
-                                  return;
-                              }
-                              std::string shown;
-                              appendRegText(key, shown);
-                              text += options.utf16 ? utf16FileText(shown) : shown;
-                          },
-                          {});
+    return admin.showKeys(
+        options.key, options.utf16 ? std::string(kUtf16Mark) + utf16FileText(head) : head,
+        [&](const KeyRecord& key, std::string& text) {
+            if (isBareRoot(key) || key.status != kSuccess) {
+                return;
+            }
+            std::string shown;
+            appendRegText(key, shown);
+            text += options.utf16 ? utf16FileText(shown) : shown;
+        },
+        {}, Admin::Reading::snapshot);
 }
 
 }  // namespace

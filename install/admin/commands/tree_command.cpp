@@ -62,6 +62,9 @@ void appendTreeKey(const KeyRecord& key, std::string& text) {
     if (!key.keyClass.empty()) {
         text += " (class \"" + shownText(key.keyClass) + "\")";
     }
+    if (key.status != kSuccess) {
+        text += compose(" (cannot be read: error %u)", {key.status});
+    }
     text += '\n';
     for (const KeyValue& value : key.values) {
         const std::string_view type = typeName(value.type);
@@ -77,7 +80,7 @@ Answer showTree(Admin& admin, const std::string& key) {
     if (!admin.open(true)) {
         return kAnswerFault;
     }
-    return admin.showKeys(key, admin.storeLine() + '\n', appendTreeKey, {});
+    return admin.showKeys(key, {}, appendTreeKey, {}, Admin::Reading::pages);
 }
 
 }  // namespace

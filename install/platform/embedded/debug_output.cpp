@@ -3,6 +3,8 @@
 #include <cstdlib>
 #include <string>
 
+#include "install/platform/shown_text.h"
+
 namespace kz7 {
 
 EmbeddedDebugOutput::EmbeddedDebugOutput(IConsole& console) : console_(console) {
@@ -12,7 +14,7 @@ EmbeddedDebugOutput::EmbeddedDebugOutput(IConsole& console) : console_(console) 
 
 void EmbeddedDebugOutput::write(std::string_view text) {
     if (shown_) {
-        console_.writeError("debug: " + std::string(text) + "\n");
+        console_.writeError("debug: " + shownText(text) + "\n");
     }
 }
 

@@ -20,6 +20,7 @@
 #include "install/platform/embedded/services.h"
 #include "install/platform/embedded/terminal.h"
 #include "install/platform/embedded/threads.h"
+#include "install/platform/shown_text.h"
 #include "install/platform/standard_console.h"
 
 namespace kz7 {
@@ -43,7 +44,8 @@ public:
           registry_(directory_, options.readOnly,
                     [this](const StoreFault& fault) {
                         if (!faultTold_) {
-                            console_.writeError(program_ + ": " + fault.file + ": " + fault.reason + "\n");
+                            console_.writeError(program_ + ": " + shownText(fault.file) + ": " + shownText(fault.reason) +
+                                                "\n");
                         }
                         faultTold_ = true;
                     }),

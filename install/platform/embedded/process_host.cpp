@@ -219,10 +219,10 @@ void leaveToItself(pid_t id) {
 void settleInheritedState() {
     // Where it is ignored, children vanish with their exit codes.
     std::signal(SIGCHLD, SIG_DFL);
-    // The lowest free number is the one that is missing.
+    // The lowest free number is the one that is missing. A write to a stream that was closed must fail.
     int opened = 0;
     do {
-        opened = open("/dev/null", O_RDWR);
+        opened = open("/dev/null", O_RDONLY);
     } while (opened != -1 && opened < STDERR_FILENO);
     if (opened > STDERR_FILENO) {
         close(opened);

@@ -59,8 +59,8 @@ UREExternalObserverHumanStream::~UREExternalObserverHumanStream() {
     theStream = nullptr;
 }
 
-Status UREExternalObserverHumanStream::queueText(std::uint32_t textNumber, std::string_view text,
-                                                 std::string_view second, bool endsLine) {
+std::vector<std::string> UREExternalObserverHumanStream::linesOf(std::uint32_t textNumber, std::string_view text,
+                                                                 std::string_view second, TerminalStream stream) {
     const std::array<Insert, 2> inserts = {text, second};
     char room[2 * kMessageSize];
     std::size_t length = 0;
@@ -71,19 +71,35 @@ Status UREExternalObserverHumanStream::queueText(std::uint32_t textNumber, std::
         shown = shownLines(rest);
         rest = shown;
     }
-    const std::uint32_t columns = ure_.ports.terminal.look(TerminalStream::output).columns;
-    Status status = kSuccess;
+    const std::uint32_t columns = ure_.ports.terminal.look(stream).columns;
+    std::vector<std::string> lines;
     while (!rest.empty()) {
-        FixedText<kMessageSize> line(takeWrappedLine(rest, columns));
-        if (endsLine || !rest.empty()) {
-            line = FixedText<kMessageSize>(line.view().substr(0, kMessageSize - 2));
-            line.append("\n");
-        }
-        if (output().addQueueMessage(line.c_str()) != kSuccess) {
+        lines.emplace_back(takeWrappedLine(rest, columns).substr(0, kMessageSize - 2));
+    }
+    return lines;
+}
+
+Status UREExternalObserverHumanStream::queueText(std::uint32_t textNumber, std::string_view text,
+                                                 std::string_view second, bool endsLine) {
+    Status status = kSuccess;
+    std::vector<std::string> lines = linesOf(textNumber, text, second, TerminalStream::output);
+    for (std::size_t i = 0; i < lines.size(); ++i) {
+        lines[i].append(endsLine || i + 1 < lines.size() ? "\n" : "");
+        if (output().addQueueMessage(lines[i].c_str()) != kSuccess) {
             status = kFailed;
         }
     }
     return status;
+}
+
+// Errors do not go where the results of a program are read.
+Status UREExternalObserverHumanStream::writeError(std::string_view text) {
+    std::string lines;
+    for (const std::string& line : linesOf(kErrorMessage, text, {}, TerminalStream::error)) {
+        lines.append(line).append("\n");
+    }
+    output().flushQueue();
+    return ure_.ports.console.writeError(lines) == kSuccess ? kSuccess : kFailed;
 }
 
 Status UREExternalObserverHumanStream::handleProgress(UREProgressInfo& info) {
@@ -110,7 +126,7 @@ Status UREExternalObserverHumanStream::handleMessage(UREInfo& info) {
         return queueText(kQuestionMessage, text.view(), info.defaultValue(), false);
     }
     if (kind == kClassError || kind == kClassOtherError) {
-        return queueText(kErrorMessage, text.view(), {}, true);
+        return writeError(text.view());
     }
     return kind == kClassInformation ? queueText(kTextMessage, text.view(), {}, true) : kFailed;
 }

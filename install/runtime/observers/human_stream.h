@@ -1,5 +1,9 @@
-// The stream for a person: readable texts of the catalogue on standard output, as wide as the terminal.
+// The stream for a person: readable texts of the catalogue on standard output, errors on standard error, as
+// wide as the terminal.
 #pragma once
+
+#include <string>
+#include <vector>
 
 #include "install/runtime/observers/kz7iobs.h"
 #include "install/runtime/ure.h"
@@ -23,6 +27,9 @@ private:
     UREExternalObserverHumanStream(URE& ure, std::unique_ptr<UREExternalOutput> output);
     ~UREExternalObserverHumanStream() override;
 
+    std::vector<std::string> linesOf(std::uint32_t textNumber, std::string_view text, std::string_view second,
+                                     TerminalStream stream);
+    Status writeError(std::string_view text);
     Status queueText(std::uint32_t textNumber, std::string_view text, std::string_view second, bool endsLine);
 
     URE& ure_;
