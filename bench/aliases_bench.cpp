@@ -13,9 +13,8 @@
 #include <utility>
 
 #include "bench/scratch.h"
-#include "install/platform/embedded/debug_output.h"
+#include "install/platform/embedded/ports.h"
 #include "install/platform/embedded/registry.h"
-#include "install/platform/standard_console.h"
 #include "install/src/copies/install_copies_profile.h"
 
 namespace kz7 {
@@ -25,8 +24,8 @@ using SortedCopies = std::map<std::string, std::string>;  // version text -> nam
 
 // The debugger output of this machine, which nobody listens to.
 struct Debug {
-    StandardConsole console;
-    EmbeddedDebugOutput output{console};
+    const std::unique_ptr<IConsole> console = standardConsole();
+    const std::unique_ptr<IDebugOutput> output = embeddedDebugOutput(*console);
 };
 
 void require(bool condition, const char* what) {
@@ -80,7 +79,7 @@ public:
         }
         OwnedKey key(*registry);
         registry->createKey(KeyHandle::localMachine, layout::kCopies32, {}, kKeyFull, key.receive());
-        require(InstallCopiesProfile(*registry, debug_.output).run() == kSuccess && registry->commit() == kSuccess,
+        require(InstallCopiesProfile(*registry, *debug_.output).run() == kSuccess && registry->commit() == kSuccess,
                 "the store cannot be laid out");
     }
 
@@ -136,7 +135,7 @@ void onePass(const Copies& copies, AliasMap& aliases) {
 void onePassOverSortedTexts(benchmark::State& state, Shape shape) {
     const auto registry = storeWith(state.range(0), shape).open();
     Debug debug;
-    InstallCopiesProfile profile(*registry, debug.output);
+    InstallCopiesProfile profile(*registry, *debug.output);
     require(profile.generateInstallCopiesList() == kSuccess, "no copies");
     AliasMap aliases;
     for (auto _ : state) {
@@ -154,7 +153,7 @@ void onePassOverSortedTexts(benchmark::State& state, Shape shape) {
 void aliasesComputed(benchmark::State& state, Shape shape) {
     const auto registry = storeWith(state.range(0), shape).open();
     Debug debug;
-    InstallCopiesProfile profile(*registry, debug.output);
+    InstallCopiesProfile profile(*registry, *debug.output);
     require(profile.generateInstallCopiesList() == kSuccess, "no copies");
     for (auto _ : state) {
         profile.generateProfileInfo();
@@ -168,7 +167,7 @@ void aliasRewrite(benchmark::State& state) {
     Debug debug;
     for (auto _ : state) {
         const auto registry = store.open();
-        require(InstallCopiesProfile(*registry, debug.output).run() == kSuccess && registry->commit() == kSuccess,
+        require(InstallCopiesProfile(*registry, *debug.output).run() == kSuccess && registry->commit() == kSuccess,
                 "the rewrite failed");
     }
     state.SetComplexityN(state.range(0));

@@ -19,8 +19,7 @@
 #include <thread>
 #include <vector>
 
-#include "install/platform/embedded/process_host.h"
-#include "install/platform/embedded/threads.h"
+#include "install/platform/embedded/ports.h"
 #include "install/runtime/install_process.h"
 
 namespace kz7 {
@@ -88,10 +87,10 @@ void startAndWaitBare() {
 }
 
 void runOurs(std::size_t mebibytes) {
-    EmbeddedProcessHost host("/nonexistent");
-    EmbeddedThreads threads;
+    const std::unique_ptr<IProcessHost> host = embeddedProcesses("/nonexistent");
+    const std::unique_ptr<IThreads> threads = embeddedThreads();
     QuietSink sink;
-    InstallProcess process(host, threads, sink, (childProgram() + " " + std::to_string(mebibytes)).c_str());
+    InstallProcess process(*host, *threads, sink, (childProgram() + " " + std::to_string(mebibytes)).c_str());
     std::uint32_t code = 1;
     require(process.execute(true, false) == kSuccess);
     require(process.waitForCompletion(code, kInfiniteWait) == kSuccess && code == 0);

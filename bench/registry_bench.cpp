@@ -7,11 +7,9 @@
 #include <vector>
 
 #include "bench/scratch.h"
-#include "install/platform/embedded/debug_output.h"
-#include "install/platform/embedded/file_system.h"
+#include "install/platform/embedded/ports.h"
 #include "install/platform/embedded/registry.h"
-#include "install/platform/embedded/services.h"
-#include "install/platform/standard_console.h"
+#include "install/platform/service_records.h"
 #include "install/src/copies/install_copy_list.h"
 #include "install/src/held_console.h"
 #include "install/src/registry/registry_access.h"
@@ -202,8 +200,8 @@ void migrationThereAndBack(benchmark::State& state) {
                                     "SOFTWARE\\NVQ\\KZ7\\PROFILES", true) == 1 &&
             deleteTree(registry, KeyHandle::localMachine, "SOURCE", 0, {}, {}) == kSuccess &&
             registry.commit() == kSuccess);
-    EmbeddedFileSystem files(scratch.path());
-    EmbeddedServiceManager services(registry, files);
+    const std::unique_ptr<IFileSystem> files = embeddedFiles(scratch.path());
+    ServiceRecords services(registry, *files);
     HeldConsole console;
     Report report(console);
     for (auto step : state) {
@@ -284,10 +282,10 @@ void copiesList(benchmark::State& state) {
         require(setText(registry, path, "KZ7 Path Name", "C:\\KZ7") == kSuccess &&
                 setText(registry, path + "\\Components", "BASE_CLIENT", "") == kSuccess);
     }
-    StandardConsole console;
-    EmbeddedDebugOutput debug(console);
+    const std::unique_ptr<IConsole> console = standardConsole();
+    const std::unique_ptr<IDebugOutput> debug = embeddedDebugOutput(*console);
     for (auto step : state) {
-        InstallCopyList copies(registry, debug, false, false);
+        InstallCopyList copies(registry, *debug, false, false);
         require(copies.count() == state.range(0) && copies.findByName("copy9") != nullptr);
         require(copies.findByName("none") == nullptr);
     }

@@ -9,8 +9,8 @@ static std::string shown(std::string_view input, std::size_t piece, bool onTermi
     if (onTerminal) {
         machine.terminal_.view = {.terminal = true, .redraws = true, .colours = false, .columns = 30};
     }
-    const kz7::FrontPorts ports{machine.processes_, machine.threads_,  machine.files_,
-                                machine.lines_,     machine.terminal_, machine.console_};
+    const kz7::FrontPorts ports{machine.processes_, machine.threads_, machine.files_, machine.terminal_,
+                                machine.console_};
     kz7::FrontScreen screen(machine.console_, machine.terminal_);
     kz7::FrontView view(ports, screen);
     kz7::LineCutter cutter;

@@ -58,18 +58,20 @@ TEST(AddCopy, WritesBothViewsTheServiceAndItsEventSource) {
     EXPECT_EQ(machine.dump(kEventSource), kEventSource +
                                               " : EventMessageFile = 2:C:\\old\\100%s\\bin\\kz7wint64.dll\\x00\n" +
                                               kEventSource + " : TypesSupported = 4:\\x07\\x00\\x00\\x00\n");
-    const auto* service = machine.services_.find("KZ7MGMTSVC_COPY1");
-    ASSERT_NE(service, nullptr);
-    EXPECT_EQ(service->displayName, "KZ7 Management Service (COPY1)");
-    EXPECT_EQ(service->programPath, "C:\\old\\100%s\\bin\\kz7mgmtsvc.exe");
-    EXPECT_EQ(service->start, ServiceStart::automatic);
-    EXPECT_EQ(service->state, ServiceState::stopped);
+    EXPECT_EQ(machine.service("KZ7MGMTSVC_COPY1"),
+              filled("# : Type = 4:\\x10\\x00\\x00\\x00\n# : Start = 4:\\x02\\x00\\x00\\x00\n"
+                     "# : ErrorControl = 4:\\x01\\x00\\x00\\x00\n# : ImagePath = 2:@\\bin\\kz7mgmtsvc.exe\\x00\n"
+                     "# : DisplayName = 1:KZ7 Management Service (COPY1)\\x00\n# : ObjectName = 1:LocalSystem\\x00\n",
+                     "SYSTEM\\CurrentControlSet\\Services\\KZ7MGMTSVC_COPY1", "C:\\old\\100%s"))
+        << "automatic and stopped";
     EXPECT_EQ(machine.registry_.commits(), 1U);
 
     EXPECT_EQ(machine.run({"-addKZ7Copy", "copy1", "C:\\new\\"}), kSuccess);
     EXPECT_EQ(machine.dump(kCopies), "[" + kCopies + "\\COPY1] \n" + copyDump(kCopies + "\\COPY1", "C:\\new\\"))
         << "the first spelling of the name stays";
-    EXPECT_EQ(service->programPath, "C:\\old\\100%s\\bin\\kz7mgmtsvc.exe") << "an existing service is left";
+    EXPECT_NE(machine.service("KZ7MGMTSVC_COPY1").find("= 2:C:\\old\\100%s\\bin\\kz7mgmtsvc.exe\\x00"),
+              std::string::npos)
+        << "an existing service is left";
     EXPECT_NE(machine.dump(kEventSource).find("C:\\old\\100%s\\bin"), std::string::npos) << "and its source";
     machine.run({"-addKZ7Copy", "COPY2", "C:\\two\\"});
     EXPECT_NE(machine.dump(kEventSource).find("C:\\two\\\\bin\\kz7wint64.dll"), std::string::npos)
@@ -128,8 +130,8 @@ TEST(RemoveCopy, TakesTheNativeTreeAndTheServiceAndTheLastOneTheProduct) {
     EXPECT_EQ(machine.dump(kCopies),
               kCopies + " : 9 = 1:COPY1\\x00\n[" + kCopies + "\\COPY2] \n" + copyDump(kCopies + "\\COPY2", "C:\\two"));
     EXPECT_TRUE(machine.has(kCopies32 + "\\COPY1\\Components"));
-    EXPECT_EQ(machine.services_.find("KZ7MGMTSVC_COPY1"), nullptr) << "a running one is stopped and deleted";
-    EXPECT_NE(machine.services_.find("KZ7MGMTSVC_COPY2"), nullptr);
+    EXPECT_EQ(machine.service("KZ7MGMTSVC_COPY1"), "") << "a running one is stopped and deleted";
+    EXPECT_NE(machine.service("KZ7MGMTSVC_COPY2"), "");
 
     machine.set(kCopies + "\\NoService", "KZ7 Path Name", "C:\\x");
     EXPECT_EQ(machine.told({"-removeKZ7Copy", "NoService"}), "The KZ7 Copy NoService has been removed||0");
@@ -138,7 +140,7 @@ TEST(RemoveCopy, TakesTheNativeTreeAndTheServiceAndTheLastOneTheProduct) {
     EXPECT_FALSE(machine.has("SOFTWARE\\NVQ\\KZ7"));
     EXPECT_TRUE(machine.has("SOFTWARE\\NVQ"));
     EXPECT_TRUE(machine.has(kCopies32 + "\\COPY2"));
-    EXPECT_EQ(machine.services_.count(), 0U);
+    EXPECT_EQ(machine.service("KZ7MGMTSVC_COPY2"), "");
     EXPECT_EQ(machine.run({"-removeKZ7Copy", "COPY2"}), kMissingItem);
 }
 

@@ -97,14 +97,14 @@ TEST_P(ProcessHostContract, ThreadsCallTheirFunctionAndAreWaitedForAnyNumberOfTi
     auto record = std::make_unique<ThreadStart>(ThreadStart{[](void* value) { ++*static_cast<int*>(value); }, &called});
     std::uint32_t id = 0;
     ThreadHandle thread = ThreadHandle::none;
-    ASSERT_EQ(threads.start(record, 256 * 1024 + 1, id, thread), kSuccess);
+    ASSERT_EQ(threads.startThread(record, 256 * 1024 + 1, id, thread), kSuccess);
     EXPECT_EQ(record, nullptr);
-    EXPECT_EQ(threads.wait(thread), kSuccess);
-    EXPECT_EQ(threads.wait(thread), kSuccess);
+    EXPECT_EQ(threads.waitThread(thread), kSuccess);
+    EXPECT_EQ(threads.waitThread(thread), kSuccess);
     EXPECT_EQ(called, 1);
-    EXPECT_EQ(threads.close(thread), kSuccess);
-    EXPECT_EQ(threads.wait(ThreadHandle::none), kInvalidHandle);
-    EXPECT_EQ(threads.close(ThreadHandle::none), kInvalidHandle);
+    EXPECT_EQ(threads.closeThread(thread), kSuccess);
+    EXPECT_EQ(threads.waitThread(ThreadHandle::none), kInvalidHandle);
+    EXPECT_EQ(threads.closeThread(ThreadHandle::none), kInvalidHandle);
 }
 
 }  // namespace

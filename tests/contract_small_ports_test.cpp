@@ -97,10 +97,10 @@ TEST_P(SmallPortContract, TheTimeIsGivenWhereItFitsWithANul) {
     FixedBuffer<64> text;
     FixedBuffer<8> eight;
     FixedBuffer<9> nine;
-    ASSERT_EQ(platform_.clock().localTime(TimeText::dateAndZone, text), kSuccess);
+    ASSERT_EQ(platform_.host().localTime(TimeText::dateAndZone, text), kSuccess);
     EXPECT_GT(text.text().size(), 16U) << text.view();
-    EXPECT_EQ(platform_.clock().localTime(TimeText::timeOfDay, eight), kMoreData);
-    ASSERT_EQ(platform_.clock().localTime(TimeText::timeOfDay, nine), kSuccess);
+    EXPECT_EQ(platform_.host().localTime(TimeText::timeOfDay, eight), kMoreData);
+    ASSERT_EQ(platform_.host().localTime(TimeText::timeOfDay, nine), kSuccess);
     std::string shape(nine.view());
     std::replace_if(
         shape.begin(), shape.end(), [](char c) { return c >= '0' && c <= '9'; }, '0');
@@ -112,11 +112,11 @@ TEST_P(SmallPortContract, LinesAreReadToTheirEndAndCutToTheirRoom) {
     // Both line ends and none; what does not fit is no line of its own; a carriage return inside and at the end, a NUL.
     backend_->reading("one\n\ntwo\r\n123456789\nnext\r\n12345678\r\na\rb\nc\0d\ne\r"s, [&] {
         std::string lines;
-        while (platform_.lines().readLine(line) == kSuccess) {
+        while (platform_.terminal().readLine(line) == kSuccess) {
             lines.append(line.view()) += '|';
         }
         EXPECT_EQ(lines, "one||two|12345678|next|12345678|a\rb|c\0d|e|"s);
-        EXPECT_EQ(platform_.lines().readLine(line), kEndOfFile);
+        EXPECT_EQ(platform_.terminal().readLine(line), kEndOfFile);
     });
 }
 

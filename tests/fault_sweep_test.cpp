@@ -109,7 +109,7 @@ TEST(FaultSweep, EveryFlowEndsSaysSoAndTouchesNothingElse) {
             const auto check = [&](FaultyMachine& machine, Status status) {
                 machine.servicesLeftOpen = option == "-v8" ? 2 : 0;
                 EXPECT_NE(machine.dump("SOFTWARE\\Other").find("somebody else's"), std::string::npos);
-                EXPECT_TRUE(machine.services_.find("KZ7MGMTSVC_SECOND") != nullptr);
+                EXPECT_NE(machine.service("KZ7MGMTSVC_SECOND"), "");
                 const std::string& failed = machine.faults_.failed();
                 std::istringstream errors(machine.console_.error);
                 for (std::string line; !forGood && std::getline(errors, line);) {
@@ -153,8 +153,7 @@ TEST(ServiceUnderFaults, AStartIsReportedStepByStep) {
         },
         [&](FaultyMachine& machine, Status status) {
             machine.servicesLeftOpen = 2;
-            const auto* service = machine.services_.find("KZ7MGMTSVC_NEW");
-            const bool runs = service != nullptr && service->state == ServiceState::running;
+            const bool runs = machine.runs("KZ7MGMTSVC_NEW");
             std::string error = machine.console_.error;
             error.erase(0, error.empty() ? 0 : kPrefix.size());
             outcomes.insert(machine.faults_.failed() + ": " + std::to_string(status) + (runs ? " runs " : " ") + error +
@@ -221,6 +220,47 @@ TEST(RemovalUnderFaults, WhatIsLeftFollowsFromTheCallThatFailed) {
         "writeOutput: 0 product second",
     };
     EXPECT_EQ(outcomes, expected);
+}
+
+class Trace final : public ICallObserver {
+public:
+    void after(const PortCall& call) override { text += call.text() + '\n'; }
+
+    std::string text;
+};
+
+class TracedMachine : public Machine {
+public:
+    TracedMachine() { ports_ = intercepted_.ports(); }
+
+    Trace trace_;
+
+private:
+    InterceptedPorts intercepted_{ports_, trace_};
+};
+
+TEST(CallObserver, SeesEveryCallWithItsArgumentsAndResult) {
+    TracedMachine machine;
+    FixedBuffer<8> data;
+    ValueType type{};
+    ProcessInformation started;
+    {
+        OwnedKey key(machine.registry());
+        machine.registry().createKey(KeyHandle::localMachine, "A", "c", kKeyFull, key.receive());
+        machine.registry().setValue(key.get(), "n", ValueType::sz, std::string_view("x", 2));
+        machine.registry().queryValue(key.get(), "n", &type, data);
+        machine.registry().queryValue(key.get(), "m", nullptr, data);
+    }
+    machine.processes().startProcess({"a b", "", StreamHandle::none, StreamHandle::none}, started);
+    machine.terminal().keepLineFeeds(true);
+    EXPECT_EQ(machine.trace_.text,
+              "registry.createKey(0x80000002, \"A\", \"c\", 0xf003f, 0x100000001) = 0\n"
+              "registry.setValue(0x100000001, \"n\", 1, \"x\\x00\") = 0\n"
+              "registry.queryValue(0x100000001, \"n\", 1, \"x\\x00\") = 0\n"
+              "registry.queryValue(0x100000001, \"m\", null, ?) = 2\n"
+              "registry.closeKey(0x100000001) = 0\n"
+              "processes.startProcess(\"a b\", ?) = 2\n"
+              "terminal.keepLineFeeds(1) = 0\n");
 }
 
 }  // namespace

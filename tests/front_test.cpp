@@ -15,8 +15,7 @@ namespace {
 void runLines(Machine& machine, const std::string& lines) {
     machine.processes_.addProgram("setup.exe", {.output = lines});
     std::uint32_t exitCode = 4711;
-    const FrontPorts ports{machine.processes_, machine.threads_,  machine.files_,
-                           machine.lines_,     machine.terminal_, machine.console_};
+    const FrontPorts ports{machine.processes_, machine.threads_, machine.files_, machine.terminal_, machine.console_};
     EXPECT_EQ(runFront(ports, {"setup.exe", "a b"}, exitCode), kSuccess);
     EXPECT_EQ(exitCode, 0U);
 }
@@ -56,7 +55,7 @@ TEST(Front, ShowsAnyLine) {
     };
     // clang-format on
     Machine machine;
-    machine.lines_.input = "\nx\nabort\n";
+    machine.terminal_.input = "\nx\nabort\n";
     std::string lines;
     std::string shown;
     for (const auto& row : rows) {

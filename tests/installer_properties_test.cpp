@@ -1,7 +1,7 @@
 // Installer properties in immediate and deferred custom actions, on a session that allows what the installer allows.
 #include <gtest/gtest.h>
 
-#include "install/platform/faulty/installer_session.h"
+#include "install/platform/intercept/ports.h"
 #include "install/runtime/installer_properties.h"
 #include "install/runtime/saved_property_names.h"
 #include "install/src/registry/copy_name.h"
@@ -155,7 +155,7 @@ TEST(SavingProperties, AnyCallMayFail) {
                 kept.properties = {{"A", "a"}, {"B", "b"}};
                 kept.tableRows = {"A", "B"};
                 kept.features = {{"LDAP.bin", {FeatureState::absent, FeatureState::local}}};
-                FaultyInstallerSession session(kept, machine.faults_);
+                InterceptedSession session(kept, machine.faults_);
                 URE engine(portsOf(machine));
                 const Status status = iSavePropertiesForDeferred({session, machine.registry(), engine});
                 EXPECT_EQ(kept.openHandles(), 0U) << machine.faults_.failed();

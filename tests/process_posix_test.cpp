@@ -11,8 +11,7 @@
 #include <functional>
 #include <optional>
 
-#include "install/platform/embedded/process_host.h"
-#include "install/platform/embedded/threads.h"
+#include "install/platform/embedded/ports.h"
 #include "tests/support/backends.h"
 #include "tests/support/gate.h"
 #include "tests/support/run_program.h"
@@ -46,15 +45,15 @@ protected:
     // What came of a command.
     std::string told(const std::string& command, const char* directory = nullptr) {
         ListedSink sink;
-        InstallProcess process(host_, threads_, sink, command.c_str(), directory);
+        InstallProcess process(*host_, *threads_, sink, command.c_str(), directory);
         process.execute(true, false);
         return ending(process, sink);
     }
 
     TemporaryDirectory folder_;
     const std::string& root_ = folder_.path();
-    EmbeddedProcessHost host_{root_};
-    EmbeddedThreads threads_;
+    std::unique_ptr<IProcessHost> host_ = embeddedProcesses(root_);
+    std::unique_ptr<IThreads> threads_ = embeddedThreads();
 };
 
 TEST_F(PosixProcess, FindsProgramsWhereTheProductAndTheHostKeepThem) {
@@ -100,7 +99,7 @@ TEST_F(PosixProcess, FindsProgramsWhereTheProductAndTheHostKeepThem) {
                 EXPECT_EQ(told(row.commandLine), std::string("0 0 ") + row.output) << row.why;
             } else {
                 const ProcessStart start{row.commandLine, {}, StreamHandle::none, StreamHandle::none};
-                EXPECT_EQ(host_.startProcess(start, child), kFileNotFound) << row.why;
+                EXPECT_EQ(host_->startProcess(start, child), kFileNotFound) << row.why;
             }
         }
     });
@@ -193,7 +192,7 @@ TEST_F(PosixProcess, LeavesNoDescriptorThreadOrZombie) {
     for (const auto& row : rows) {
         const bool gated = row.arguments.find(gate.name()) != std::string::npos;
         {
-            InstallProcess process(host_, threads_, sink, (childProgram() + row.arguments).c_str());
+            InstallProcess process(*host_, *threads_, sink, (childProgram() + row.arguments).c_str());
             process.execute(false, false);
             if (gated && row.timeout == kInfiniteWait) {
                 gate.open();

@@ -3,7 +3,7 @@
 
 #include <sstream>
 
-#include "install/platform/faulty/installer_session.h"
+#include "install/platform/intercept/ports.h"
 #include "tests/support/fault_sweep.h"
 #include "tests/support/runtime_machine.h"
 
@@ -70,7 +70,7 @@ TEST(LogFile, TitlesComeFromTheModeAndTheCatalogue) {
     // clang-format on
     RuntimeMachine machine;
     machine.openLog();
-    machine.clock_.dateAndZone = std::string(50, '9');
+    machine.host_.dateAndZone = std::string(50, '9');
     for (const auto& row : rows) {
         ResponseFault fault;
         EXPECT_EQ(machine.engine.messages.load(row.catalogue, fault), kSuccess) << row.why;
@@ -161,9 +161,9 @@ TEST(LogFile, AnyCallMayFail) {
             },
             [](FaultyMachine& machine) {
                 MemoryInstallerSession kept;
-                FaultyInstallerSession session(kept, machine.faults_);
-                URE engine({machine.files(), machine.processes(), machine.threads(), machine.console_, machine.lines_,
-                            machine.terminal_, machine.clock(), machine.identity(), &session});
+                InterceptedSession session(kept, machine.faults_);
+                URE engine({machine.files(), machine.processes(), machine.threads(), machine.console_,
+                            machine.terminal_, machine.host(), &session});
                 const ObserversEnd end;
                 URELogObserver* log = URELogObserver::getInstance(engine);
                 log->setLogFile(RuntimeMachine::kLogFile);

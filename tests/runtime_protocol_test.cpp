@@ -59,7 +59,7 @@ TEST(ProtocolLines, TakeAnswers) {
 
 TEST(Pipe, WritesWhatIsQueuedCutAndWithPercentSignsOnce) {
     RuntimeMachine machine;
-    UREExternalOutputPipe pipe(machine.console_, machine.lines_, machine.engine);
+    UREExternalOutputPipe pipe(machine.console_, machine.terminal_, machine.engine);
     const std::string cut(1024, 'x');
     const std::string tooLong = cut + 'y';
     for (const char* text : {"100%%|", "%%%|", "", "%%%%|", "%|", "a%s%n%5d%%b|", tooLong.c_str()}) {
@@ -80,12 +80,12 @@ TEST(Pipe, WritesWhatIsQueuedCutAndWithPercentSignsOnce) {
 TEST(MachineStream, TellsAWholeRunToTheByte) {
     RuntimeMachine machine;
     URE& engine = machine.engine;
-    machine.lines_.input = "RESPONSE :: E\r\n" + std::string(5000, 'x') + "ABORT\nABORT\n";
+    machine.terminal_.input = "RESPONSE :: E\r\n" + std::string(5000, 'x') + "ABORT\nABORT\n";
     machine.openLog();
     std::vector<Response> responses;
     std::string answer = "unchanged";
     engine.registerObserver(*UREExternalObserverMachineStream::getInstance(engine));
-    EXPECT_TRUE(machine.lines_.keepsLineFeeds);
+    EXPECT_TRUE(machine.terminal_.keepsLineFeeds);
     engine.announceTasks("10,30;;11;1,2\n;12345678901234567890,5;1,12345678901234567890;");
     engine.startTask(40, 10, true, "Copying files");
     engine.trace(kTraceError, "Copier::copy", 10, kSuccess, "42 files");
@@ -103,7 +103,7 @@ TEST(MachineStream, TellsAWholeRunToTheByte) {
     engine.endTask(5, false, "a\0b"sv);
     responses.push_back(engine.ask(2, 1, {}, "", answer));
     ObserversEnd{};
-    EXPECT_FALSE(machine.lines_.keepsLineFeeds);
+    EXPECT_FALSE(machine.terminal_.keepsLineFeeds);
     EXPECT_EQ(responses, (std::vector{Response::answered, Response::none, Response::aborted}));
     EXPECT_EQ(answer, "");
     EXPECT_EQ(machine.console_.flushed, machine.console_.output.size());
@@ -152,7 +152,7 @@ TEST(Pipe, AnAllocationThatFailsIsReportedAndLosesOneLine) {
         std::string told;
         const std::string log = machine.logged([&] {
             allocationsUntilFailure = row.failing;
-            UREExternalOutputPipe pipe(machine.console_, machine.lines_, machine.engine);
+            UREExternalOutputPipe pipe(machine.console_, machine.terminal_, machine.engine);
             for (int line = 0; line < 5; ++line) {
                 told += pipe.addQueueMessage("x") == kSuccess ? 'x' : '-';
             }
@@ -169,7 +169,7 @@ TEST(HumanStream, IsReadableAndAsWideAsTheTerminal) {
     RuntimeMachine machine;
     URE& engine = machine.engine;
     machine.terminal_.view = {.terminal = true, .redraws = true, .colours = true, .columns = 30};
-    machine.lines_.input = "/media/disc\n\nABORT\n";
+    machine.terminal_.input = "/media/disc\n\nABORT\n";
     engine.registerObserver(*UREExternalObserverHumanStream::getInstance(engine));
     std::string answer = "unchanged";
     engine.startTask(1, 10, true, "Copying files");

@@ -2,13 +2,14 @@
 // process's standard-handle slots: redirecting a slot never redirects what is written here.
 #pragma once
 
+#include <memory>
 #include <string_view>
 
 #include "install/platform/status.h"
 
 namespace kz7 {
 
-// Texts are written as they are, whole and uncut; a line feed ends a line in the host's own way. kPipeClosing: the
+// Texts are written whole, as they are; a line feed ends a line in the host's own way. kPipeClosing: the
 // reader is gone, which is never a signal. One thread.
 class IConsole {
 public:
@@ -21,5 +22,8 @@ public:
 
     virtual Status flush() = 0;
 };
+
+// The streams of the C library, on every host.
+std::unique_ptr<IConsole> standardConsole();
 
 }  // namespace kz7

@@ -1,17 +1,15 @@
-// This machine's ports, built on first use: a run that only prints its usage creates nothing.
+// This machine's ports. Each opens what it needs on first use: a run that only prints its usage creates nothing.
 #pragma once
 
 #include <memory>
 #include <string>
 
 #include "install/platform/assembly_cache.h"
-#include "install/platform/clock.h"
 #include "install/platform/console.h"
 #include "install/platform/debug_output.h"
 #include "install/platform/file_system.h"
-#include "install/platform/host_identity.h"
+#include "install/platform/host_information.h"
 #include "install/platform/library_loader.h"
-#include "install/platform/line_channel.h"
 #include "install/platform/process_host.h"
 #include "install/platform/registry_store.h"
 #include "install/platform/service_manager.h"
@@ -28,40 +26,56 @@ struct PlatformOptions {
     bool ownProcess = true;           // false: a library in somebody else's, which leaves the process as it is
 };
 
+// The ports of one machine, none of them owned.
+struct Ports {
+    IRegistryStore* registry = nullptr;
+    IServiceManager* services = nullptr;
+    IConsole* console = nullptr;
+    IDebugOutput* debugOutput = nullptr;
+    IFileSystem* files = nullptr;
+    IProcessHost* processes = nullptr;
+    IThreads* threads = nullptr;
+    ILibraryLoader* libraries = nullptr;
+    IAssemblyCache* assemblies = nullptr;
+    IHostInformation* host = nullptr;
+    ITerminal* terminal = nullptr;
+};
+
 // The references stay valid as long as the platform. One thread.
 class IPlatform {
 public:
     virtual ~IPlatform() = default;
 
-    virtual IRegistryStore& registry() = 0;
-    virtual IServiceManager& services() = 0;
-    virtual IConsole& console() = 0;
-    virtual IDebugOutput& debugOutput() = 0;
-    virtual IFileSystem& files() = 0;
-    virtual IProcessHost& processes() = 0;
-    virtual IThreads& threads() = 0;
-    virtual ILibraryLoader& libraries() = 0;
-    virtual IAssemblyCache& assemblies() = 0;
-    virtual ILineChannel& lines() = 0;
-    virtual IClock& clock() = 0;
-    virtual ITerminal& terminal() = 0;
-    virtual IHostIdentity& identity() = 0;
+    IRegistryStore& registry() { return *ports_.registry; }
+    IServiceManager& services() { return *ports_.services; }
+    IConsole& console() { return *ports_.console; }
+    IDebugOutput& debugOutput() { return *ports_.debugOutput; }
+    IFileSystem& files() { return *ports_.files; }
+    IProcessHost& processes() { return *ports_.processes; }
+    IThreads& threads() { return *ports_.threads; }
+    ILibraryLoader& libraries() { return *ports_.libraries; }
+    IAssemblyCache& assemblies() { return *ports_.assemblies; }
+    IHostInformation& host() { return *ports_.host; }
+    ITerminal& terminal() { return *ports_.terminal; }
 
-    // The folder of what the programs keep for themselves, one of the product's paths; made where it is missing.
+    // The folder of what the programs keep for themselves, as a product path; created if it is missing.
     virtual Status ownFolder(std::string& path) = 0;
 
-    // The store's name for people: the file it is kept in, or the machine's registry.
+    // The store's name for people: its file, or the machine's registry.
     virtual std::string storeName() = 0;
 
-    // What a person who looks at that store should know about its choice: a sentence without an end, mostly
-    // none.
-    virtual std::string storeNote() = 0;
+    // What a person who looks at that store should know about its choice: a sentence without a full stop, usually
+    // empty.
+    virtual std::string storeNote() { return {}; }
 
-    // Whether the store is the programs' own and holds nothing else; else it is the whole machine's.
-    virtual bool storeIsOwn() = 0;
+    // Whether the store is the programs' own and holds nothing else. Otherwise it is that of the whole machine.
+    virtual bool storeIsOwn() { return true; }
 
-    // Whether a fault of the store was told on standard error, so that its status needs no further line.
-    virtual bool storeFaultTold() = 0;
+    // Whether a fault of the store was reported on standard error, so that its status needs no further line.
+    virtual bool storeFaultTold() { return false; }
+
+protected:
+    Ports ports_;
 };
 
 std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options);

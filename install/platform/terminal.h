@@ -1,7 +1,11 @@
-// The terminal port: what people see standard output and error on, and what their interrupt key does.
+// The terminal port: lines of standard input, what people see the standard streams on, and what their interrupt key
+// does. The other end may be a program at two pipes as well as a person. Output goes through the console port.
 #pragma once
 
 #include <cstdint>
+
+#include "install/platform/buffer.h"
+#include "install/platform/status.h"
 
 namespace kz7 {
 
@@ -18,11 +22,22 @@ class ITerminal {
 public:
     virtual ~ITerminal() = default;
 
-    // How the stream is seen now: people change the width of a window.
+    // Reads one line of standard input without its line end; a carriage return before it belongs to the line end.
+    // What does not fit is read and dropped, so that it never passes for a line of its own. kEndOfFile: nothing is
+    // left.
+    virtual Status readLine(Buffer& line) = 0;
+
+    // While on, a line feed on standard output is written as that one byte on every host.
+    virtual void keepLineFeeds(bool on) = 0;
+
+    // The stream as it is now: people change the width of a window.
     virtual TerminalView look(TerminalStream stream) = 0;
 
     // While on, the interrupt key does not end this process. The programs on the same terminal get it as ever.
     virtual void leaveInterruptsToOthers(bool on) = 0;
 };
+
+// ITerminal::readLine() on the C library's standard input, for the implementations.
+Status readStandardLine(Buffer& line);
 
 }  // namespace kz7

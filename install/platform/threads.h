@@ -30,14 +30,14 @@ public:
     // Starts a thread with a stack of `stackBytes` (0: the host's usual size), which takes no signals. The
     // record is the new thread's on success and stays the caller's on failure. `id` tells the threads of this
     // process apart. The caller closes `thread`.
-    virtual Status start(std::unique_ptr<ThreadStart>& record, std::uint32_t stackBytes, std::uint32_t& id,
-                         ThreadHandle& thread) = 0;
+    virtual Status startThread(std::unique_ptr<ThreadStart>& record, std::uint32_t stackBytes, std::uint32_t& id,
+                               ThreadHandle& thread) = 0;
 
     // Waits until the thread has ended, any number of times; what it wrote is then seen.
-    virtual Status wait(ThreadHandle thread) = 0;
+    virtual Status waitThread(ThreadHandle thread) = 0;
 
     // A thread that still runs, runs on.
-    virtual Status close(ThreadHandle thread) = 0;
+    virtual Status closeThread(ThreadHandle thread) = 0;
 };
 
 }  // namespace kz7

@@ -17,7 +17,7 @@ Status ureCreateThread(IThreads& threads, IReportSink& sink, void (*function)(vo
     if (start == nullptr) {
         return failed(kNoMemory, 20, kOutOfMemory);
     }
-    const Status status = threads.start(start, record->stackSize, record->id, record->handle);
+    const Status status = threads.startThread(start, record->stackSize, record->id, record->handle);
     if (status != kSuccess) {
         return failed(kThreadStartFailed, 30, status);
     }

@@ -331,10 +331,10 @@ bool InstallProcess::joinReader(ThreadRecord& record) {
     if (record.handle == ThreadHandle::none) {
         return true;
     }
-    if (threads_.wait(record.handle) != kSuccess) {
+    if (threads_.waitThread(record.handle) != kSuccess) {
         return false;
     }
-    threads_.close(std::exchange(record.handle, ThreadHandle::none));
+    threads_.closeThread(std::exchange(record.handle, ThreadHandle::none));
     return true;
 }
 
@@ -390,7 +390,7 @@ void InstallProcess::giveUpRun() {
     for (ThreadRecord* record : {&outputReader_, &errorReader_}) {
         if (!joinReader(*record)) {
             // It has its text to itself.
-            threads_.close(record->handle);
+            threads_.closeThread(record->handle);
         }
         *record = {};
     }

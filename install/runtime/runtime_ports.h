@@ -7,9 +7,13 @@
 namespace kz7 {
 
 inline RuntimePorts portsOf(IPlatform& platform, IInstallerSession* session = nullptr) {
-    return {platform.files(),   platform.processes(), platform.threads(),
-            platform.console(), platform.lines(),     platform.terminal(),
-            platform.clock(),   platform.identity(),  session};
+    return {platform.files(),
+            platform.processes(),
+            platform.threads(),
+            platform.console(),
+            platform.terminal(),
+            platform.host(),
+            session};
 }
 
 }  // namespace kz7

@@ -8,12 +8,10 @@
 #include <string_view>
 #include <vector>
 
-#include "install/platform/clock.h"
 #include "install/platform/console.h"
 #include "install/platform/file_system.h"
-#include "install/platform/host_identity.h"
+#include "install/platform/host_information.h"
 #include "install/platform/installer_session.h"
-#include "install/platform/line_channel.h"
 #include "install/platform/process_host.h"
 #include "install/platform/terminal.h"
 #include "install/platform/threads.h"
@@ -41,10 +39,8 @@ struct RuntimePorts {
     IProcessHost& processes;
     IThreads& threads;
     IConsole& console;
-    ILineChannel& lines;
     ITerminal& terminal;
-    IClock& clock;
-    IHostIdentity& identity;
+    IHostInformation& host;
     IInstallerSession* session = nullptr;  // null: there is none
 };
 

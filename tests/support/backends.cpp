@@ -31,7 +31,7 @@ public:
     std::string folder() override { return "C:\\contract"; }
     void addProvider() override { platform_.assemblies_.files.emplace_back("kz7nmpdata.dll"); }
     void reading(const std::string& input, const std::function<void()>& body) override {
-        platform_.lines_.input = input;
+        platform_.terminal_.input = input;
         body();
     }
     std::string written(const std::function<void(IConsole&)>& writing) override {

@@ -7,12 +7,22 @@
 #include <optional>
 #include <string>
 
-#include "install/platform/faulty/platform.h"
+#include "install/platform/intercept/fault_counter.h"
+#include "install/platform/intercept/ports.h"
 #include "tests/support/machine.h"
 
 namespace kz7::test {
 
-using FaultyMachine = FaultyPlatform<Machine>;
+// A machine whose flows meet the faults, in any of its ports. Calls of its plain members meet none.
+class FaultyMachine : public Machine {
+public:
+    FaultyMachine() { ports_ = intercepted_.ports(); }
+
+    FaultCounter faults_{0, false, kSuccess};
+
+private:
+    InterceptedPorts intercepted_{ports_, faults_};
+};
 
 inline constexpr Status kFault = 4321;  // no platform's number, so that it is recognised wherever it goes
 
@@ -23,13 +33,14 @@ inline std::uint64_t sweepFaults(bool forGood, const std::function<void(FaultyMa
                                  const std::function<void(FaultyMachine&, Status)>& check) {
     for (std::uint64_t call = 1;; ++call) {
         std::optional<testing::ScopedTrace> row;  // goes after the machine, which looks for what was left open
-        FaultyMachine machine(FaultCounter(0, false, kFault));
+        FaultyMachine machine;
         prepare(machine);
         machine.faults_ = FaultCounter(call, forGood, kFault);
         const Status status = flow(machine);
         const std::string failed = machine.faults_.failed();
         row.emplace(__FILE__, __LINE__,
-                    "call " + std::to_string(call) + " (" + failed + ") fails" + (forGood ? " for good" : ""));
+                    "call " + std::to_string(call) + ", " + machine.faults_.failedCall() +
+                        (forGood ? " for good" : ""));
         check(machine, status);
         if (failed.empty()) {
             return machine.faults_.calls();

@@ -52,6 +52,12 @@ public:
         OwnedKey key(registry_);
         registry_.createKey(KeyHandle::localMachine, path, keyClass, kKeyFull, key.receive());
     }
+    // The record of a service as text; empty without one.
+    std::string service(const std::string& name) {
+        const std::string path = "SYSTEM\\CurrentControlSet\\Services\\" + name;
+        return has(path) ? dump(path) : "";
+    }
+    bool runs(const std::string& name) { return service(name).find("CurrentState = 4:\\x04") != std::string::npos; }
     // A service of another's making.
     void addService(const std::string& name, bool running) {
         files_.add("C:\\svc.exe");

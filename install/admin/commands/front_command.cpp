@@ -17,8 +17,8 @@ Answer runProgram(Admin& admin, const std::vector<std::string>& command) {
         return kAnswerFault;
     }
     IPlatform& platform = admin.platform();
-    const FrontPorts ports{platform.processes(), platform.threads(),  platform.files(),
-                           platform.lines(),     platform.terminal(), platform.console()};
+    const FrontPorts ports{platform.processes(), platform.threads(), platform.files(), platform.terminal(),
+                           platform.console()};
     std::uint32_t exitCode = 0;
     const Status status = runFront(ports, command, exitCode);
     if (status == kSuccess) {

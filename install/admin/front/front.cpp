@@ -40,7 +40,7 @@ public:
     Status start() {
         auto record = std::make_unique<ThreadStart>(ThreadStart{run, this});
         std::uint32_t id = 0;
-        return ports_.threads.start(record, 0, id, thread_);
+        return ports_.threads.startThread(record, 0, id, thread_);
     }
 
     // Once the program has ended: reads what it left, and ends.
@@ -48,8 +48,8 @@ public:
         if (thread_ != ThreadHandle::none) {
             isEnding_ = true;
             ports_.processes.write(writeEnd_.get(), "\n" + std::string(kEndLine) + "\n");
-            ports_.threads.wait(thread_);
-            ports_.threads.close(std::exchange(thread_, ThreadHandle::none));
+            ports_.threads.waitThread(thread_);
+            ports_.threads.closeThread(std::exchange(thread_, ThreadHandle::none));
         }
     }
 
@@ -227,7 +227,7 @@ void FrontView::ask(std::string_view text, std::string_view proposal, const Answ
                                                 : "Answer, or ABORT [" + std::string(proposal) + "]: ");
     FixedBuffer<kMaxAnswer> line;
     isAsking_ = true;
-    const bool answered = ports_.lines.readLine(line) == kSuccess;
+    const bool answered = ports_.terminal.readLine(line) == kSuccess;
     isAsking_ = false;
     const std::string_view typed = line.text().empty() ? proposal : line.text();
     const bool aborts = !answered || equalsIgnoreCase(line.text(), kAbort);

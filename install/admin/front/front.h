@@ -13,7 +13,6 @@
 #include "install/admin/front/front_screen.h"
 #include "install/admin/front/protocol_reader.h"
 #include "install/platform/file_system.h"
-#include "install/platform/line_channel.h"
 #include "install/platform/process_host.h"
 #include "install/platform/threads.h"
 
@@ -48,7 +47,6 @@ struct FrontPorts {
     IProcessHost& processes;
     IThreads& threads;
     IFileSystem& files;
-    ILineChannel& lines;
     ITerminal& terminal;
     IConsole& console;
 };

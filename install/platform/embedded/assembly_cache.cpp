@@ -1,7 +1,8 @@
-#include "install/platform/embedded/assembly_cache.h"
+#include "install/platform/embedded/ports.h"
 
 #include <algorithm>
 #include <filesystem>
+#include <string>
 #include <system_error>
 #include <utility>
 #include <vector>
@@ -10,28 +11,42 @@
 #include "install/platform/embedded/paths.h"
 
 namespace kz7 {
+namespace {
 
-EmbeddedAssemblyCache::EmbeddedAssemblyCache(IRegistryStore& registry, std::string stateDirectory)
-    : registry_(registry), stateDirectory_(std::move(stateDirectory)) {}
+// The assembly cache of a host without the framework: the provider files that lie in a location's bin folder,
+// as records in the registry store.
+class EmbeddedAssemblyCache final : public IAssemblyCache {
+public:
+    EmbeddedAssemblyCache(IRegistryStore& registry, std::string stateDirectory)
+        : registry_(registry), stateDirectory_(std::move(stateDirectory)) {}
 
-Status EmbeddedAssemblyCache::deregisterProviders(std::string_view level) {
-    return dropProviders(registry_, level);
-}
+    Status deregisterProviders(std::string_view level) override { return dropProviders(registry_, level); }
 
-Status EmbeddedAssemblyCache::registerProviders(std::string_view location, std::string_view level,
-                                                FrameworkGenerations generations) {
-    const std::string folder = hostPath(std::string(location) + "\\bin", stateDirectory_);
-    std::vector<std::string> files;
-    // A folder that is missing or cannot be read has nothing to register.
-    std::error_code ignored;
-    for (std::filesystem::directory_iterator entry(folder, ignored), end; entry != end; entry.increment(ignored)) {
-        std::string file = entry->path().filename().string();
-        if (isProviderFile(file) && entry->is_regular_file(ignored)) {
-            files.push_back(std::move(file));
+    Status registerProviders(std::string_view location, std::string_view level,
+                             FrameworkGenerations generations) override {
+        const std::string folder = hostPath(std::string(location) + "\\bin", stateDirectory_);
+        std::vector<std::string> files;
+        // A folder that is missing or cannot be read has nothing to register.
+        std::error_code ignored;
+        for (std::filesystem::directory_iterator entry(folder, ignored), end; entry != end; entry.increment(ignored)) {
+            std::string file = entry->path().filename().string();
+            if (isProviderFile(file) && entry->is_regular_file(ignored)) {
+                files.push_back(std::move(file));
+            }
         }
+        std::sort(files.begin(), files.end());
+        return recordProviders(registry_, location, level, generations, files);
     }
-    std::sort(files.begin(), files.end());
-    return recordProviders(registry_, location, level, generations, files);
+
+private:
+    IRegistryStore& registry_;
+    std::string stateDirectory_;
+};
+
+}  // namespace
+
+std::unique_ptr<IAssemblyCache> embeddedAssemblies(IRegistryStore& registry, std::string stateDirectory) {
+    return std::make_unique<EmbeddedAssemblyCache>(registry, std::move(stateDirectory));
 }
 
 }  // namespace kz7

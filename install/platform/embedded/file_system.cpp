@@ -1,4 +1,4 @@
-#include "install/platform/embedded/file_system.h"
+#include "install/platform/embedded/ports.h"
 
 #include <dirent.h>
 #include <fcntl.h>
@@ -9,7 +9,9 @@
 #include <cerrno>
 #include <filesystem>
 #include <memory>
+#include <string>
 
+#include "install/platform/embedded/descriptor_table.h"
 #include "install/platform/embedded/paths.h"
 
 namespace kz7 {
@@ -46,119 +48,129 @@ Status statusOf(int error) {
     }
 }
 
-}  // namespace
+// The file-system port on POSIX: product paths are led into the state directory.
+class EmbeddedFileSystem final : public IFileSystem {
+public:
+    explicit EmbeddedFileSystem(std::string stateDirectory) : stateDirectory_(std::move(stateDirectory)) {}
 
-EmbeddedFileSystem::EmbeddedFileSystem(std::string stateDirectory) : stateDirectory_(std::move(stateDirectory)) {}
-
-Status EmbeddedFileSystem::probe(std::string_view path) {
-    const std::string host = hostPath(path, stateDirectory_);
-    if (host.empty()) {
-        return kFileNotFound;
+    Status probe(std::string_view path) override {
+        const std::string host = hostPath(path, stateDirectory_);
+        if (host.empty()) {
+            return kFileNotFound;
+        }
+        if (access(host.c_str(), F_OK) == 0) {
+            return kSuccess;
+        }
+        return errno == EACCES ? kAccessDenied : kFileNotFound;
     }
-    if (access(host.c_str(), F_OK) == 0) {
+
+    Status readFile(std::string_view path, std::string& content) override {
+        const std::string host = hostPath(path, stateDirectory_);
+        const int descriptor = host.empty() ? -1 : open(host.c_str(), O_RDONLY | O_CLOEXEC);
+        if (descriptor == -1) {
+            return host.empty() ? kFileNotFound : statusOf(errno);
+        }
+        std::string read;
+        ssize_t count = 0;
+        do {
+            const std::size_t length = read.size();
+            read.resize(length + kReadPiece);
+            count = ::read(descriptor, read.data() + length, kReadPiece);
+            read.resize(length + (count > 0 ? static_cast<std::size_t>(count) : 0));
+        } while (count > 0 || (count == -1 && errno == EINTR));
+        const Status status = count == -1 ? statusOf(errno) : kSuccess;
+        close(descriptor);
+        if (status == kSuccess) {
+            content = std::move(read);
+        }
+        return status;
+    }
+
+    Status openForAppend(std::string_view path, FileHandle& file) override {
+        const std::string host = hostPath(path, stateDirectory_);
+        if (host.empty()) {
+            return kFileNotFound;
+        }
+        // A link that somebody left in a folder open to all is not followed, a pipe without a reader not waited for.
+        const int descriptor =
+            open(host.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, kLogFileMode);
+        if (descriptor == -1) {
+            return errno == ENOENT || errno == ENOTDIR ? kPathNotFound : statusOf(errno);
+        }
+        struct stat found {};
+        if (fstat(descriptor, &found) == -1 || !S_ISREG(found.st_mode)) {
+            close(descriptor);
+            return kAccessDenied;
+        }
+        file = files_.give(descriptor);
         return kSuccess;
     }
-    return errno == EACCES ? kAccessDenied : kFileNotFound;
-}
 
-Status EmbeddedFileSystem::readFile(std::string_view path, std::string& content) {
-    const std::string host = hostPath(path, stateDirectory_);
-    const int descriptor = host.empty() ? -1 : open(host.c_str(), O_RDONLY | O_CLOEXEC);
-    if (descriptor == -1) {
-        return host.empty() ? kFileNotFound : statusOf(errno);
+    Status write(FileHandle file, std::string_view data, std::uint32_t& written) override {
+        const int descriptor = files_.find(file);
+        written = 0;
+        while (written < data.size()) {
+            const ssize_t count = ::write(descriptor, data.data() + written, data.size() - written);
+            if (count == -1 && errno != EINTR) {
+                return statusOf(errno);
+            }
+            written += count == -1 ? 0 : static_cast<std::uint32_t>(count);
+        }
+        return kSuccess;
     }
-    std::string read;
-    ssize_t count = 0;
-    do {
-        const std::size_t length = read.size();
-        read.resize(length + kReadPiece);
-        count = ::read(descriptor, read.data() + length, kReadPiece);
-        read.resize(length + (count > 0 ? static_cast<std::size_t>(count) : 0));
-    } while (count > 0 || (count == -1 && errno == EINTR));
-    const Status status = count == -1 ? statusOf(errno) : kSuccess;
-    close(descriptor);
-    if (status == kSuccess) {
-        content = std::move(read);
-    }
-    return status;
-}
 
-Status EmbeddedFileSystem::openForAppend(std::string_view path, FileHandle& file) {
-    const std::string host = hostPath(path, stateDirectory_);
-    if (host.empty()) {
-        return kFileNotFound;
-    }
-    // A link that somebody left in a folder open to all is not followed, a pipe without a reader not waited for.
-    const int descriptor =
-        open(host.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, kLogFileMode);
-    if (descriptor == -1) {
-        return errno == ENOENT || errno == ENOTDIR ? kPathNotFound : statusOf(errno);
-    }
-    struct stat found {};
-    if (fstat(descriptor, &found) == -1 || !S_ISREG(found.st_mode)) {
-        close(descriptor);
-        return kAccessDenied;
-    }
-    file = files_.give(descriptor);
-    return kSuccess;
-}
+    Status closeFile(FileHandle file) override { return close(files_.take(file)) == 0 ? kSuccess : statusOf(errno); }
 
-Status EmbeddedFileSystem::write(FileHandle file, std::string_view data, std::uint32_t& written) {
-    const int descriptor = files_.find(file);
-    written = 0;
-    while (written < data.size()) {
-        const ssize_t count = ::write(descriptor, data.data() + written, data.size() - written);
-        if (count == -1 && errno != EINTR) {
+    Status findFile(std::string_view pattern, std::string& name) override {
+        const std::string host = hostPath(pattern, stateDirectory_);
+        const std::size_t folder = host.find_last_of('/');
+        if (folder == std::string::npos) {
+            return kFileNotFound;
+        }
+        const std::unique_ptr<DIR, int (*)(DIR*)> entries(opendir(host.substr(0, folder + 1).c_str()), closedir);
+        if (entries == nullptr) {
             return statusOf(errno);
         }
-        written += count == -1 ? 0 : static_cast<std::uint32_t>(count);
-    }
-    return kSuccess;
-}
-
-Status EmbeddedFileSystem::closeFile(FileHandle file) {
-    return close(files_.take(file)) == 0 ? kSuccess : statusOf(errno);
-}
-
-Status EmbeddedFileSystem::findFile(std::string_view pattern, std::string& name) {
-    const std::string host = hostPath(pattern, stateDirectory_);
-    const std::size_t folder = host.find_last_of('/');
-    if (folder == std::string::npos) {
-        return kFileNotFound;
-    }
-    const std::unique_ptr<DIR, int (*)(DIR*)> entries(opendir(host.substr(0, folder + 1).c_str()), closedir);
-    if (entries == nullptr) {
-        return statusOf(errno);
-    }
-    std::string first;
-    while (const dirent* entry = readdir(entries.get())) {
-        if (fitsPattern(entry->d_name, std::string_view(host).substr(folder + 1)) &&
-            (first.empty() || entry->d_name < first)) {
-            first = entry->d_name;
+        std::string first;
+        while (const dirent* entry = readdir(entries.get())) {
+            if (fitsPattern(entry->d_name, std::string_view(host).substr(folder + 1)) &&
+                (first.empty() || entry->d_name < first)) {
+                first = entry->d_name;
+            }
         }
+        if (first.empty()) {
+            return kFileNotFound;
+        }
+        name = std::move(first);
+        return kSuccess;
     }
-    if (first.empty()) {
-        return kFileNotFound;
-    }
-    name = std::move(first);
-    return kSuccess;
-}
 
-Status EmbeddedFileSystem::productPath(std::string_view hostPath, std::string& path) {
-    std::error_code error;
-    std::string whole = std::filesystem::absolute(hostPath, error).string();
-    // A backslash separates in the product's paths.
-    if (error || whole.find('\\') != std::string::npos || whole.find('\0') != std::string::npos) {
-        return kInvalidName;
+    Status productPath(std::string_view hostPath, std::string& path) override {
+        std::error_code error;
+        std::string whole = std::filesystem::absolute(hostPath, error).string();
+        // A backslash separates in the product's paths.
+        if (error || whole.find('\\') != std::string::npos || whole.find('\0') != std::string::npos) {
+            return kInvalidName;
+        }
+        std::replace(whole.begin(), whole.end(), '/', '\\');
+        path = std::move(whole);
+        return kSuccess;
     }
-    std::replace(whole.begin(), whole.end(), '/', '\\');
-    path = std::move(whole);
-    return kSuccess;
-}
 
-std::string EmbeddedFileSystem::shownPath(std::string_view path) {
-    const std::string host = hostPath(path, stateDirectory_);
-    return host.empty() ? std::string(path) : host;
+    std::string shownPath(std::string_view path) override {
+        const std::string host = hostPath(path, stateDirectory_);
+        return host.empty() ? std::string(path) : host;
+    }
+
+private:
+    std::string stateDirectory_;
+    DescriptorTable<FileHandle> files_;
+};
+
+}  // namespace
+
+std::unique_ptr<IFileSystem> embeddedFiles(std::string stateDirectory) {
+    return std::make_unique<EmbeddedFileSystem>(std::move(stateDirectory));
 }
 
 }  // namespace kz7

@@ -8,20 +8,10 @@
 #include <cstdlib>
 #include <filesystem>
 
-#include "install/platform/embedded/assembly_cache.h"
-#include "install/platform/embedded/clock.h"
-#include "install/platform/embedded/debug_output.h"
-#include "install/platform/embedded/file_system.h"
-#include "install/platform/embedded/host_identity.h"
-#include "install/platform/embedded/library_loader.h"
-#include "install/platform/embedded/line_channel.h"
-#include "install/platform/embedded/process_host.h"
+#include "install/platform/embedded/ports.h"
 #include "install/platform/embedded/registry.h"
-#include "install/platform/embedded/services.h"
-#include "install/platform/embedded/terminal.h"
-#include "install/platform/embedded/threads.h"
+#include "install/platform/service_records.h"
 #include "install/platform/shown_text.h"
-#include "install/platform/standard_console.h"
 
 namespace kz7 {
 namespace {
@@ -39,41 +29,23 @@ public:
         : program_(options.program),
           byDefault_(options.stateDirectory.empty() && std::getenv("KZ7_STATE_DIR") == nullptr),
           directory_(absolute(options.stateDirectory.empty() ? usualStateDirectory() : options.stateDirectory)),
-          debugOutput_(console_),
-          files_(directory_),
-          registry_(directory_, options.readOnly,
-                    [this](const StoreFault& fault) {
-                        if (!faultTold_) {
-                            console_.writeError(program_ + ": " + shownText(fault.file) + ": " + shownText(fault.reason) +
-                                                "\n");
-                        }
-                        faultTold_ = true;
-                    }),
-          services_(registry_, files_),
-          processes_(directory_),
-          libraries_(directory_),
-          assemblies_(registry_, directory_) {}
+          registry_(directory_, options.readOnly, [this](const StoreFault& fault) {
+              if (!faultTold_) {
+                  console_->writeError(program_ + ": " + shownText(fault.file) + ": " + shownText(fault.reason) + "\n");
+              }
+              faultTold_ = true;
+          }) {
+        ports_ = {&registry_,        &services_,       console_.get(), debugOutput_.get(),
+                  files_.get(),      processes_.get(), threads_.get(), libraries_.get(),
+                  assemblies_.get(), host_.get(),      terminal_.get()};
+    }
 
     const std::string& directory() const { return directory_; }
 
-    IRegistryStore& registry() override { return registry_; }
-    IServiceManager& services() override { return services_; }
-    IConsole& console() override { return console_; }
-    IDebugOutput& debugOutput() override { return debugOutput_; }
-    IFileSystem& files() override { return files_; }
-    IProcessHost& processes() override { return processes_; }
-    IThreads& threads() override { return threads_; }
-    ILibraryLoader& libraries() override { return libraries_; }
-    IAssemblyCache& assemblies() override { return assemblies_; }
-    ILineChannel& lines() override { return lines_; }
-    IClock& clock() override { return clock_; }
-    ITerminal& terminal() override { return terminal_; }
-    IHostIdentity& identity() override { return identity_; }
     Status ownFolder(std::string& path) override {
-        return makeFolder(directory_) != 0 ? kPathNotFound : files_.productPath(directory_, path);
+        return makeFolder(directory_) != 0 ? kPathNotFound : files_->productPath(directory_, path);
     }
     std::string storeName() override { return registry_.path(); }
-    bool storeIsOwn() override { return true; }
     bool storeFaultTold() override { return faultTold_; }
 
     std::string storeNote() override {
@@ -87,19 +59,17 @@ private:
     bool byDefault_;
     bool faultTold_ = false;
     std::string directory_;
-    StandardConsole console_;
-    EmbeddedDebugOutput debugOutput_;
-    EmbeddedFileSystem files_;
+    std::unique_ptr<IConsole> console_ = standardConsole();
+    std::unique_ptr<IDebugOutput> debugOutput_ = embeddedDebugOutput(*console_);
+    std::unique_ptr<IFileSystem> files_ = embeddedFiles(directory_);
     EmbeddedRegistry registry_;
-    EmbeddedServiceManager services_;
-    EmbeddedProcessHost processes_;
-    EmbeddedThreads threads_;
-    EmbeddedLibraryLoader libraries_;
-    EmbeddedAssemblyCache assemblies_;
-    EmbeddedLineChannel lines_;
-    EmbeddedClock clock_;
-    EmbeddedTerminal terminal_;
-    EmbeddedHostIdentity identity_;
+    ServiceRecords services_{registry_, *files_};
+    std::unique_ptr<IProcessHost> processes_ = embeddedProcesses(directory_);
+    std::unique_ptr<IThreads> threads_ = embeddedThreads();
+    std::unique_ptr<ILibraryLoader> libraries_ = embeddedLibraries(directory_);
+    std::unique_ptr<IAssemblyCache> assemblies_ = embeddedAssemblies(registry_, directory_);
+    std::unique_ptr<IHostInformation> host_ = embeddedHost();
+    std::unique_ptr<ITerminal> terminal_ = embeddedTerminal();
 };
 
 }  // namespace

@@ -1,4 +1,4 @@
-#include "install/platform/embedded/process_host.h"
+#include "install/platform/embedded/ports.h"
 
 #include <fcntl.h>
 #include <poll.h>
@@ -6,20 +6,25 @@
 #include <spawn.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
+#include <sys/types.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <array>
 #include <cerrno>
 #include <chrono>
 #include <climits>
 #include <csignal>
 #include <cstdlib>
+#include <map>
 #include <memory>
+#include <string>
 #include <utility>
 #include <vector>
 
 #include "install/platform/command_line.h"
+#include "install/platform/embedded/descriptor_table.h"
 #include "install/platform/embedded/paths.h"
 #include "install/platform/embedded/threads.h"
 
@@ -214,7 +219,223 @@ void leaveToItself(pid_t id) {
     pthread_attr_destroy(&attributes);
 }
 
+// The process port on POSIX. Handles and what the standard-handle slots hold are tokens of this object,
+// never descriptors.
+class EmbeddedProcessHost final : public IProcessHost {
+public:
+    explicit EmbeddedProcessHost(std::string stateDirectory)
+        : stateDirectory_(std::move(stateDirectory)), slots_{StreamHandle{1}, StreamHandle{2}}, streams_(2) {}
+
+    Status getSlot(StandardSlot slot, StreamHandle& stream) override {
+        stream = slots_[static_cast<std::size_t>(slot)];
+        return kSuccess;
+    }
+
+    Status setSlot(StandardSlot slot, StreamHandle stream) override {
+        slots_[static_cast<std::size_t>(slot)] = stream;
+        return kSuccess;
+    }
+
+    Status createPipe(StreamHandle& readEnd, StreamHandle& writeEnd) override {
+        // A child is given its ends by name: none of ours passes an exec by itself.
+        int ends[2];
+        if (pipe2(ends, O_CLOEXEC) == -1) {
+            return statusOf(errno);
+        }
+        const int reading = moveUp(ends[0]);
+        const int writing = moveUp(ends[1]);
+        if (reading == -1 || writing == -1) {
+            const Status status = statusOf(errno);
+            close(reading);
+            close(writing);
+            return status;
+        }
+        readEnd = streams_.give(reading);
+        writeEnd = streams_.give(writing);
+        return kSuccess;
+    }
+
+    Status duplicate(StreamHandle stream, StreamHandle& copy) override {
+        const int descriptor = fcntl(streams_.find(stream), F_DUPFD_CLOEXEC, kFirstOwnDescriptor);
+        if (descriptor == -1) {
+            return statusOf(errno);
+        }
+        copy = streams_.give(descriptor);
+        return kSuccess;
+    }
+
+    Status read(StreamHandle stream, Buffer& data) override {
+        const int descriptor = streams_.find(stream);
+        ssize_t count = -1;
+        do {
+            count = ::read(descriptor, data.data, data.capacity);
+        } while (count == -1 && errno == EINTR);
+        if (count == -1) {
+            return statusOf(errno);
+        }
+        data.size = static_cast<std::uint32_t>(count);
+        return count == 0 && data.capacity != 0 ? kBrokenPipe : kSuccess;
+    }
+
+    Status write(StreamHandle stream, std::string_view data) override {
+        const int descriptor = streams_.find(stream);
+        const WithoutPipeSignal guard;
+        while (!data.empty()) {
+            const ssize_t count = ::write(descriptor, data.data(), data.size());
+            if (count == -1 && errno != EINTR) {
+                return statusOf(errno);
+            }
+            data.remove_prefix(count == -1 ? 0 : static_cast<std::size_t>(count));
+        }
+        return kSuccess;
+    }
+
+    Status closeStream(StreamHandle stream) override {
+        const int descriptor = streams_.take(stream);
+        if (descriptor == -1) {
+            return kInvalidHandle;
+        }
+        close(descriptor);
+        return kSuccess;
+    }
+
+    Status startProcess(const ProcessStart& start, ProcessInformation& started) override {
+        for (const CommandReading& reading : commandReadings(start.commandLine)) {
+            for (const std::string& file : programFiles(reading.program, stateDirectory_)) {
+                if (!isProgram(file)) {
+                    continue;
+                }
+                const Status status = spawn(file, reading.program, reading.arguments, start, started);
+                if (!isNotFound(status)) {
+                    return status;
+                }
+            }
+        }
+        return kFileNotFound;
+    }
+
+    Status waitProcess(ProcessHandle process, std::uint32_t milliseconds) override {
+        Child* child = childOf(process);
+        if (child == nullptr) {
+            return kInvalidHandle;
+        }
+        if (milliseconds == kInfiniteWait) {
+            return takeEnding(*child, 0);
+        }
+        if (!child->ended && milliseconds != 0) {
+            waitWithin(child->id, milliseconds);
+        }
+        return takeEnding(*child, WNOHANG);
+    }
+
+    Status exitCode(ProcessHandle process, std::uint32_t& code) override {
+        Child* child = childOf(process);
+        if (child == nullptr) {
+            return kInvalidHandle;
+        }
+        const Status status = takeEnding(*child, WNOHANG);
+        if (status != kSuccess && status != kWaitTimedOut) {
+            return status;
+        }
+        code = child->exitCode;
+        return kSuccess;
+    }
+
+    Status closeProcess(ProcessHandle process) override {
+        Child* child = childOf(process);
+        if (child == nullptr) {
+            return kInvalidHandle;
+        }
+        if (takeEnding(*child, WNOHANG) == kWaitTimedOut) {
+            leaveToItself(child->id);
+        }
+        children_.erase(process);
+        return kSuccess;
+    }
+
+    Status shortPath(std::string_view, Buffer&) override { return kCallNotImplemented; }
+
+private:
+    struct Child {
+        pid_t id = 0;
+        bool ended = false;
+        std::uint32_t exitCode = kExitCodeRunning;
+    };
+
+    Child* childOf(ProcessHandle process) {
+        const auto found = children_.find(process);
+        return found != children_.end() ? &found->second : nullptr;
+    }
+
+    Status takeEnding(Child& child, int options) {
+        if (child.ended) {
+            return kSuccess;
+        }
+        int ending = 0;
+        const pid_t found = waitForChild(child.id, &ending, options);
+        if (found == 0) {
+            return kWaitTimedOut;
+        }
+        if (found == -1) {
+            return statusOf(errno);
+        }
+        child.ended = true;
+        child.exitCode =
+            static_cast<std::uint32_t>(WIFSIGNALED(ending) ? kSignalExitCode + WTERMSIG(ending) : WEXITSTATUS(ending));
+        return kSuccess;
+    }
+
+    Status spawn(const std::string& file, std::string_view program, std::string_view arguments,
+                 const ProcessStart& start, ProcessInformation& started) {
+        std::string directory;
+        if (!start.workingDirectory.empty()) {
+            directory = hostPath(start.workingDirectory, stateDirectory_);
+            struct stat found {};
+            if (directory.empty() || stat(directory.c_str(), &found) == -1 || !S_ISDIR(found.st_mode)) {
+                return kBadDirectory;
+            }
+        }
+        std::vector<std::string> words = splitArguments(arguments);
+        words.insert(words.begin(), std::string(program));
+        std::vector<char*> argv;
+        argv.reserve(words.size() + 1);
+        for (std::string& word : words) {
+            argv.push_back(word.data());
+        }
+        argv.push_back(nullptr);
+
+        SpawnPlan plan;
+        for (const auto& [stream, target] :
+             {std::pair{start.input, STDIN_FILENO}, {start.output, STDOUT_FILENO}, {start.error, STDERR_FILENO}}) {
+            if (stream == StreamHandle::none) {
+                plan.openNull(target, target == STDIN_FILENO ? O_RDONLY : O_WRONLY);
+            } else {
+                plan.give(streams_.find(stream), target);
+            }
+        }
+        pid_t id = 0;
+        const int error = plan.run(id, file.c_str(), directory, argv.data());
+        if (error != 0) {
+            return isNoProgram(error) ? kFileNotFound : statusOf(error);
+        }
+        const ProcessHandle process{++lastProcess_};
+        children_.emplace(process, Child{.id = id});
+        started = {process, ProcessHandle::none, static_cast<std::uint32_t>(id), static_cast<std::uint32_t>(id)};
+        return kSuccess;
+    }
+
+    std::string stateDirectory_;
+    std::array<StreamHandle, 2> slots_;
+    DescriptorTable<StreamHandle> streams_;
+    std::map<ProcessHandle, Child> children_;
+    std::uint64_t lastProcess_ = 0;
+};
+
 }  // namespace
+
+std::unique_ptr<IProcessHost> embeddedProcesses(std::string stateDirectory) {
+    return std::make_unique<EmbeddedProcessHost>(std::move(stateDirectory));
+}
 
 void settleInheritedState() {
     // Where it is ignored, children vanish with their exit codes.
@@ -227,202 +448,6 @@ void settleInheritedState() {
     if (opened > STDERR_FILENO) {
         close(opened);
     }
-}
-
-EmbeddedProcessHost::EmbeddedProcessHost(std::string stateDirectory)
-    : stateDirectory_(std::move(stateDirectory)), slots_{StreamHandle{1}, StreamHandle{2}}, streams_(2) {}
-
-Status EmbeddedProcessHost::getSlot(StandardSlot slot, StreamHandle& stream) {
-    stream = slots_[static_cast<std::size_t>(slot)];
-    return kSuccess;
-}
-
-Status EmbeddedProcessHost::setSlot(StandardSlot slot, StreamHandle stream) {
-    slots_[static_cast<std::size_t>(slot)] = stream;
-    return kSuccess;
-}
-
-Status EmbeddedProcessHost::createPipe(StreamHandle& readEnd, StreamHandle& writeEnd) {
-    // A child is given its ends by name: none of ours passes an exec by itself.
-    int ends[2];
-    if (pipe2(ends, O_CLOEXEC) == -1) {
-        return statusOf(errno);
-    }
-    const int reading = moveUp(ends[0]);
-    const int writing = moveUp(ends[1]);
-    if (reading == -1 || writing == -1) {
-        const Status status = statusOf(errno);
-        close(reading);
-        close(writing);
-        return status;
-    }
-    readEnd = streams_.give(reading);
-    writeEnd = streams_.give(writing);
-    return kSuccess;
-}
-
-Status EmbeddedProcessHost::duplicate(StreamHandle stream, StreamHandle& copy) {
-    const int descriptor = fcntl(streams_.find(stream), F_DUPFD_CLOEXEC, kFirstOwnDescriptor);
-    if (descriptor == -1) {
-        return statusOf(errno);
-    }
-    copy = streams_.give(descriptor);
-    return kSuccess;
-}
-
-Status EmbeddedProcessHost::read(StreamHandle stream, Buffer& data) {
-    const int descriptor = streams_.find(stream);
-    ssize_t count = -1;
-    do {
-        count = ::read(descriptor, data.data, data.capacity);
-    } while (count == -1 && errno == EINTR);
-    if (count == -1) {
-        return statusOf(errno);
-    }
-    data.size = static_cast<std::uint32_t>(count);
-    return count == 0 && data.capacity != 0 ? kBrokenPipe : kSuccess;
-}
-
-Status EmbeddedProcessHost::write(StreamHandle stream, std::string_view data) {
-    const int descriptor = streams_.find(stream);
-    const WithoutPipeSignal guard;
-    while (!data.empty()) {
-        const ssize_t count = ::write(descriptor, data.data(), data.size());
-        if (count == -1 && errno != EINTR) {
-            return statusOf(errno);
-        }
-        data.remove_prefix(count == -1 ? 0 : static_cast<std::size_t>(count));
-    }
-    return kSuccess;
-}
-
-Status EmbeddedProcessHost::closeStream(StreamHandle stream) {
-    const int descriptor = streams_.take(stream);
-    if (descriptor == -1) {
-        return kInvalidHandle;
-    }
-    close(descriptor);
-    return kSuccess;
-}
-
-Status EmbeddedProcessHost::startProcess(const ProcessStart& start, ProcessInformation& started) {
-    for (const CommandReading& reading : commandReadings(start.commandLine)) {
-        for (const std::string& file : programFiles(reading.program, stateDirectory_)) {
-            if (!isProgram(file)) {
-                continue;
-            }
-            const Status status = spawn(file, reading.program, reading.arguments, start, started);
-            if (!isNotFound(status)) {
-                return status;
-            }
-        }
-    }
-    return kFileNotFound;
-}
-
-Status EmbeddedProcessHost::spawn(const std::string& file, std::string_view program, std::string_view arguments,
-                                  const ProcessStart& start, ProcessInformation& started) {
-    std::string directory;
-    if (!start.workingDirectory.empty()) {
-        directory = hostPath(start.workingDirectory, stateDirectory_);
-        struct stat found {};
-        if (directory.empty() || stat(directory.c_str(), &found) == -1 || !S_ISDIR(found.st_mode)) {
-            return kBadDirectory;
-        }
-    }
-    std::vector<std::string> words = splitArguments(arguments);
-    words.insert(words.begin(), std::string(program));
-    std::vector<char*> argv;
-    argv.reserve(words.size() + 1);
-    for (std::string& word : words) {
-        argv.push_back(word.data());
-    }
-    argv.push_back(nullptr);
-
-    SpawnPlan plan;
-    for (const auto& [stream, target] :
-         {std::pair{start.input, STDIN_FILENO}, {start.output, STDOUT_FILENO}, {start.error, STDERR_FILENO}}) {
-        if (stream == StreamHandle::none) {
-            plan.openNull(target, target == STDIN_FILENO ? O_RDONLY : O_WRONLY);
-        } else {
-            plan.give(streams_.find(stream), target);
-        }
-    }
-    pid_t id = 0;
-    const int error = plan.run(id, file.c_str(), directory, argv.data());
-    if (error != 0) {
-        return isNoProgram(error) ? kFileNotFound : statusOf(error);
-    }
-    const ProcessHandle process{++lastProcess_};
-    children_.emplace(process, Child{.id = id});
-    started = {process, ProcessHandle::none, static_cast<std::uint32_t>(id), static_cast<std::uint32_t>(id)};
-    return kSuccess;
-}
-
-EmbeddedProcessHost::Child* EmbeddedProcessHost::childOf(ProcessHandle process) {
-    const auto found = children_.find(process);
-    return found != children_.end() ? &found->second : nullptr;
-}
-
-Status EmbeddedProcessHost::takeEnding(Child& child, int options) {
-    if (child.ended) {
-        return kSuccess;
-    }
-    int ending = 0;
-    const pid_t found = waitForChild(child.id, &ending, options);
-    if (found == 0) {
-        return kWaitTimedOut;
-    }
-    if (found == -1) {
-        return statusOf(errno);
-    }
-    child.ended = true;
-    child.exitCode =
-        static_cast<std::uint32_t>(WIFSIGNALED(ending) ? kSignalExitCode + WTERMSIG(ending) : WEXITSTATUS(ending));
-    return kSuccess;
-}
-
-Status EmbeddedProcessHost::waitProcess(ProcessHandle process, std::uint32_t milliseconds) {
-    Child* child = childOf(process);
-    if (child == nullptr) {
-        return kInvalidHandle;
-    }
-    if (milliseconds == kInfiniteWait) {
-        return takeEnding(*child, 0);
-    }
-    if (!child->ended && milliseconds != 0) {
-        waitWithin(child->id, milliseconds);
-    }
-    return takeEnding(*child, WNOHANG);
-}
-
-Status EmbeddedProcessHost::exitCode(ProcessHandle process, std::uint32_t& code) {
-    Child* child = childOf(process);
-    if (child == nullptr) {
-        return kInvalidHandle;
-    }
-    const Status status = takeEnding(*child, WNOHANG);
-    if (status != kSuccess && status != kWaitTimedOut) {
-        return status;
-    }
-    code = child->exitCode;
-    return kSuccess;
-}
-
-Status EmbeddedProcessHost::closeProcess(ProcessHandle process) {
-    Child* child = childOf(process);
-    if (child == nullptr) {
-        return kInvalidHandle;
-    }
-    if (takeEnding(*child, WNOHANG) == kWaitTimedOut) {
-        leaveToItself(child->id);
-    }
-    children_.erase(process);
-    return kSuccess;
-}
-
-Status EmbeddedProcessHost::shortPath(std::string_view, Buffer&) {
-    return kCallNotImplemented;
 }
 
 }  // namespace kz7

@@ -1,10 +1,14 @@
+#include "install/platform/embedded/ports.h"
+
 #include "install/platform/embedded/threads.h"
 
+#include <pthread.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <climits>
 #include <csignal>
+#include <map>
 
 namespace kz7 {
 namespace {
@@ -16,7 +20,72 @@ std::size_t usableStack(std::size_t bytes) {
     return (wanted + page - 1) / page * page;
 }
 
+// The thread port on POSIX.
+class EmbeddedThreads final : public IThreads {
+public:
+    Status startThread(std::unique_ptr<ThreadStart>& record, std::uint32_t stackBytes, std::uint32_t& id,
+                       ThreadHandle& thread) override {
+        pthread_attr_t attributes;
+        if (makeThreadAttributes(stackBytes, attributes) != 0) {
+            return kOutOfMemory;
+        }
+        const ThreadHandle handle{lastId_ + 1};
+        Thread& entry = threads_[handle];
+        const auto enter = [](void* given) -> void* {
+            ThreadStart::run(given);
+            return nullptr;
+        };
+        const int error = pthread_create(&entry.id, &attributes, enter, record.get());
+        pthread_attr_destroy(&attributes);
+        if (error != 0) {
+            threads_.erase(handle);
+            return kTooManyThreads;
+        }
+        static_cast<void>(record.release());
+        id = ++lastId_;
+        thread = handle;
+        return kSuccess;
+    }
+
+    Status waitThread(ThreadHandle thread) override {
+        const auto found = threads_.find(thread);
+        if (found == threads_.end()) {
+            return kInvalidHandle;
+        }
+        if (!found->second.joined && pthread_join(found->second.id, nullptr) != 0) {
+            return kInvalidHandle;
+        }
+        found->second.joined = true;
+        return kSuccess;
+    }
+
+    Status closeThread(ThreadHandle thread) override {
+        const auto found = threads_.find(thread);
+        if (found == threads_.end()) {
+            return kInvalidHandle;
+        }
+        if (!found->second.joined) {
+            pthread_detach(found->second.id);
+        }
+        threads_.erase(found);
+        return kSuccess;
+    }
+
+private:
+    struct Thread {
+        pthread_t id{};
+        bool joined = false;
+    };
+
+    std::map<ThreadHandle, Thread> threads_;
+    std::uint32_t lastId_ = 0;
+};
+
 }  // namespace
+
+std::unique_ptr<IThreads> embeddedThreads() {
+    return std::make_unique<EmbeddedThreads>();
+}
 
 int makeThreadAttributes(std::size_t stackBytes, pthread_attr_t& attributes) {
     int error = pthread_attr_init(&attributes);
@@ -33,54 +102,6 @@ int makeThreadAttributes(std::size_t stackBytes, pthread_attr_t& attributes) {
         pthread_attr_destroy(&attributes);
     }
     return error;
-}
-
-Status EmbeddedThreads::start(std::unique_ptr<ThreadStart>& record, std::uint32_t stackBytes, std::uint32_t& id,
-                              ThreadHandle& thread) {
-    pthread_attr_t attributes;
-    if (makeThreadAttributes(stackBytes, attributes) != 0) {
-        return kOutOfMemory;
-    }
-    const ThreadHandle handle{lastId_ + 1};
-    Thread& entry = threads_[handle];
-    const auto enter = [](void* given) -> void* {
-        ThreadStart::run(given);
-        return nullptr;
-    };
-    const int error = pthread_create(&entry.id, &attributes, enter, record.get());
-    pthread_attr_destroy(&attributes);
-    if (error != 0) {
-        threads_.erase(handle);
-        return kTooManyThreads;
-    }
-    static_cast<void>(record.release());
-    id = ++lastId_;
-    thread = handle;
-    return kSuccess;
-}
-
-Status EmbeddedThreads::wait(ThreadHandle thread) {
-    const auto found = threads_.find(thread);
-    if (found == threads_.end()) {
-        return kInvalidHandle;
-    }
-    if (!found->second.joined && pthread_join(found->second.id, nullptr) != 0) {
-        return kInvalidHandle;
-    }
-    found->second.joined = true;
-    return kSuccess;
-}
-
-Status EmbeddedThreads::close(ThreadHandle thread) {
-    const auto found = threads_.find(thread);
-    if (found == threads_.end()) {
-        return kInvalidHandle;
-    }
-    if (!found->second.joined) {
-        pthread_detach(found->second.id);
-    }
-    threads_.erase(found);
-    return kSuccess;
 }
 
 }  // namespace kz7

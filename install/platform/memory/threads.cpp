@@ -2,7 +2,7 @@
 
 namespace kz7 {
 
-Status MemoryThreads::start(std::unique_ptr<ThreadStart>& record, std::uint32_t, std::uint32_t& id,
+Status MemoryThreads::startThread(std::unique_ptr<ThreadStart>& record, std::uint32_t, std::uint32_t& id,
                             ThreadHandle& thread) {
     id = ++lastId_;
     thread = ThreadHandle{lastId_};
@@ -10,7 +10,7 @@ Status MemoryThreads::start(std::unique_ptr<ThreadStart>& record, std::uint32_t,
     return kSuccess;
 }
 
-Status MemoryThreads::wait(ThreadHandle thread) {
+Status MemoryThreads::waitThread(ThreadHandle thread) {
     const auto found = threads_.find(thread);
     if (found == threads_.end()) {
         return kInvalidHandle;
@@ -21,8 +21,8 @@ Status MemoryThreads::wait(ThreadHandle thread) {
     return kSuccess;
 }
 
-Status MemoryThreads::close(ThreadHandle thread) {
-    const Status status = wait(thread);
+Status MemoryThreads::closeThread(ThreadHandle thread) {
+    const Status status = waitThread(thread);
     threads_.erase(thread);
     return status;
 }

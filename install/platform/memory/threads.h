@@ -12,10 +12,10 @@ class MemoryThreads final : public IThreads {
 public:
     std::size_t openHandles() const { return threads_.size(); }
 
-    Status start(std::unique_ptr<ThreadStart>& record, std::uint32_t stackBytes, std::uint32_t& id,
-                 ThreadHandle& thread) override;
-    Status wait(ThreadHandle thread) override;
-    Status close(ThreadHandle thread) override;
+    Status startThread(std::unique_ptr<ThreadStart>& record, std::uint32_t stackBytes, std::uint32_t& id,
+                       ThreadHandle& thread) override;
+    Status waitThread(ThreadHandle thread) override;
+    Status closeThread(ThreadHandle thread) override;
 
 private:
     std::map<ThreadHandle, std::unique_ptr<ThreadStart>> threads_;  // null: has run

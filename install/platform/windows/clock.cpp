@@ -1,10 +1,10 @@
-#include "install/platform/windows/clock.h"
+#include "install/platform/windows/host_information.h"
 
 #include <ctime>
 
 namespace kz7 {
 
-Status WindowsClock::localTime(TimeText form, Buffer& text) {
+Status WindowsHost::localTime(TimeText form, Buffer& text) {
     const std::time_t now = std::time(nullptr);
     std::tm parts{};
     if (localtime_s(&parts, &now) != 0) {

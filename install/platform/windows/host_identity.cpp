@@ -1,11 +1,11 @@
-#include "install/platform/windows/host_identity.h"
+#include "install/platform/windows/host_information.h"
 
 #include <windows.h>
 #include <winternl.h>
 
 namespace kz7 {
 
-Status WindowsHostIdentity::operatingSystem(std::string& name, std::string& version) {
+Status WindowsHost::operatingSystem(std::string& name, std::string& version) {
     // The documented calls answer the version that the program says it was made for.
     using GetVersionCall = LONG(WINAPI*)(RTL_OSVERSIONINFOW*);
     const HMODULE system = GetModuleHandleA("ntdll.dll");

@@ -1,19 +1,17 @@
-#include "install/platform/windows/line_channel.h"
+#include "install/platform/windows/terminal.h"
 
 #include <fcntl.h>
 #include <io.h>
 
 #include <cstdio>
 
-#include "install/platform/standard_input.h"
-
 namespace kz7 {
 
-Status WindowsLineChannel::readLine(Buffer& line) {
+Status WindowsTerminal::readLine(Buffer& line) {
     return readStandardLine(line);
 }
 
-void WindowsLineChannel::keepLineFeeds(bool on) {
+void WindowsTerminal::keepLineFeeds(bool on) {
     std::fflush(stdout);
     if (on) {
         modeBefore_ = _setmode(_fileno(stdout), _O_BINARY);

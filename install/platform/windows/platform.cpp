@@ -7,14 +7,11 @@
 
 #include <cstdio>
 
-#include "install/platform/standard_console.h"
 #include "install/platform/windows/assembly_cache.h"
-#include "install/platform/windows/clock.h"
 #include "install/platform/windows/debug_output.h"
 #include "install/platform/windows/file_system.h"
-#include "install/platform/windows/host_identity.h"
+#include "install/platform/windows/host_information.h"
 #include "install/platform/windows/library_loader.h"
-#include "install/platform/windows/line_channel.h"
 #include "install/platform/windows/process_host.h"
 #include "install/platform/windows/registry.h"
 #include "install/platform/windows/services.h"
@@ -26,21 +23,11 @@ namespace {
 
 class WindowsPlatform final : public IPlatform {
 public:
-    WindowsPlatform() : debugOutput_(console_) {}
+    WindowsPlatform() {
+        ports_ = {&registry_, &services_,  console_.get(), &debugOutput_, &files_,   &processes_,
+                  &threads_,  &libraries_, &assemblies_,   &host_,        &terminal_};
+    }
 
-    IRegistryStore& registry() override { return registry_; }
-    IServiceManager& services() override { return services_; }
-    IConsole& console() override { return console_; }
-    IDebugOutput& debugOutput() override { return debugOutput_; }
-    IFileSystem& files() override { return files_; }
-    IProcessHost& processes() override { return processes_; }
-    IThreads& threads() override { return threads_; }
-    ILibraryLoader& libraries() override { return libraries_; }
-    IAssemblyCache& assemblies() override { return assemblies_; }
-    ILineChannel& lines() override { return lines_; }
-    IClock& clock() override { return clock_; }
-    ITerminal& terminal() override { return terminal_; }
-    IHostIdentity& identity() override { return identity_; }
     // The caller's own, so that nobody else can have put something in its place.
     Status ownFolder(std::string& path) override {
         char folder[MAX_PATH];
@@ -53,13 +40,11 @@ public:
         return files_.productPath(own, path);
     }
     std::string storeName() override { return "the registry of this machine"; }
-    std::string storeNote() override { return {}; }
     bool storeIsOwn() override { return false; }
-    bool storeFaultTold() override { return false; }
 
 private:
-    StandardConsole console_;
-    WindowsDebugOutput debugOutput_;
+    std::unique_ptr<IConsole> console_ = standardConsole();
+    WindowsDebugOutput debugOutput_{*console_};
     WindowsFileSystem files_;
     WindowsRegistry registry_;
     WindowsServiceManager services_;
@@ -67,10 +52,8 @@ private:
     WindowsThreads threads_;
     WindowsLibraryLoader libraries_;
     WindowsAssemblyCache assemblies_;
-    WindowsLineChannel lines_;
-    WindowsClock clock_;
+    WindowsHost host_;
     WindowsTerminal terminal_;
-    WindowsHostIdentity identity_;
 };
 
 }  // namespace

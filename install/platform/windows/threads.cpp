@@ -17,8 +17,8 @@ unsigned __stdcall enter(void* record) {
 
 }  // namespace
 
-Status WindowsThreads::start(std::unique_ptr<ThreadStart>& record, std::uint32_t stackBytes, std::uint32_t& id,
-                             ThreadHandle& thread) {
+Status WindowsThreads::startThread(std::unique_ptr<ThreadStart>& record, std::uint32_t stackBytes, std::uint32_t& id,
+                                   ThreadHandle& thread) {
     unsigned number = 0;
     const std::uintptr_t handle = _beginthreadex(nullptr, stackBytes, enter, record.get(), 0, &number);
     if (handle == 0) {
@@ -30,11 +30,11 @@ Status WindowsThreads::start(std::unique_ptr<ThreadStart>& record, std::uint32_t
     return kSuccess;
 }
 
-Status WindowsThreads::wait(ThreadHandle thread) {
+Status WindowsThreads::waitThread(ThreadHandle thread) {
     return WaitForSingleObject(native(thread), INFINITE) == WAIT_OBJECT_0 ? kSuccess : GetLastError();
 }
 
-Status WindowsThreads::close(ThreadHandle thread) {
+Status WindowsThreads::closeThread(ThreadHandle thread) {
     return CloseHandle(native(thread)) != FALSE ? kSuccess : GetLastError();
 }
 

@@ -7,10 +7,10 @@ namespace kz7 {
 
 class WindowsThreads final : public IThreads {
 public:
-    Status start(std::unique_ptr<ThreadStart>& record, std::uint32_t stackBytes, std::uint32_t& id,
+    Status startThread(std::unique_ptr<ThreadStart>& record, std::uint32_t stackBytes, std::uint32_t& id,
                  ThreadHandle& thread) override;
-    Status wait(ThreadHandle thread) override;
-    Status close(ThreadHandle thread) override;
+    Status waitThread(ThreadHandle thread) override;
+    Status closeThread(ThreadHandle thread) override;
 };
 
 }  // namespace kz7

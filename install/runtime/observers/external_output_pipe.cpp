@@ -11,7 +11,7 @@ constexpr std::size_t kFirstCapacity = 4;
 
 }  // namespace
 
-UREExternalOutputPipe::UREExternalOutputPipe(IConsole& console, ILineChannel& lines, IReportSink& sink)
+UREExternalOutputPipe::UREExternalOutputPipe(IConsole& console, ITerminal& lines, IReportSink& sink)
     : console_(console), lines_(lines), sink_(sink) {
     makeRoom(kFirstCapacity, "UREExternalOutputPipe::UREExternalOutputPipe");
 }

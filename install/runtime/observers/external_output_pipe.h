@@ -4,7 +4,7 @@
 #include <memory>
 
 #include "install/platform/console.h"
-#include "install/platform/line_channel.h"
+#include "install/platform/terminal.h"
 #include "install/runtime/observers/kz7iobs.h"
 #include "install/runtime/report_sink.h"
 
@@ -16,7 +16,7 @@ inline constexpr std::size_t kQueuedCharacters = 1024;  // of a queued message
 class UREExternalOutputPipe final : public UREExternalOutput {
 public:
     // Without memory for the queue, which is reported, everything that is queued is lost.
-    UREExternalOutputPipe(IConsole& console, ILineChannel& lines, IReportSink& sink);
+    UREExternalOutputPipe(IConsole& console, ITerminal& lines, IReportSink& sink);
 
     void writeMessage(const char* text) override;
     Status readResponse(char* buffer, std::uint32_t size) override;
@@ -31,7 +31,7 @@ private:
     bool makeRoom(std::size_t capacity, std::string_view function);
 
     IConsole& console_;
-    ILineChannel& lines_;
+    ITerminal& lines_;
     IReportSink& sink_;
     Messages queue_;
     std::size_t count_ = 0;

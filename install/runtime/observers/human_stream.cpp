@@ -40,7 +40,7 @@ std::string shownLines(std::string_view text) {
 UREExternalObserverHumanStream* UREExternalObserverHumanStream::getInstance(URE& ure) {
     if (theStream == nullptr) {
         std::unique_ptr<UREExternalOutput> output(new (std::nothrow)
-                                                      UREExternalOutputPipe(ure.ports.console, ure.ports.lines, ure));
+                                                      UREExternalOutputPipe(ure.ports.console, ure.ports.terminal, ure));
         if (output != nullptr) {
             theStream = new (std::nothrow) UREExternalObserverHumanStream(ure, std::move(output));
         }

@@ -117,7 +117,7 @@ Status URELogObserver::writeHeader(bool isEnd) {
         title.assign(withoutQuotes({room, std::min(length, sizeof room)}));
     }
     FixedBuffer<256> date;
-    if (ure_.ports.clock.localTime(TimeText::dateAndZone, date) == kSuccess) {
+    if (ure_.ports.host.localTime(TimeText::dateAndZone, date) == kSuccess) {
         title.append(date.view().substr(0, kMaxDate));
     }
     writeLine(title.view());
@@ -131,7 +131,7 @@ void URELogObserver::describeSystem() {
     std::string system = name;
     if (name.empty() && version.empty() && release.empty()) {
         std::string ownVersion;
-        ure_.ports.identity.operatingSystem(system, ownVersion);
+        ure_.ports.host.operatingSystem(system, ownVersion);
         systemVersion_.assign(ownVersion);
     } else {
         systemVersion_.assign(version + '.' + release);
@@ -229,7 +229,7 @@ std::string_view URELogObserver::prefixOf(const UREInfo& info, Buffer& time) {
         case kCodeWarning:
             return ure_.messages.pattern(kWarningPrefix);
         case kCodeReport:
-            if (stampsTime_ && ure_.ports.clock.localTime(TimeText::timeOfDay, time) == kSuccess) {
+            if (stampsTime_ && ure_.ports.host.localTime(TimeText::timeOfDay, time) == kSuccess) {
                 // Deliberate: no blank follows, before an error in words either; prefixes bring their own
                 // separator, the time has none.
                 return time.view();

@@ -19,7 +19,7 @@ UREExternalObserverMachineStream* theStream = nullptr;
 UREExternalObserverMachineStream* UREExternalObserverMachineStream::getInstance(URE& ure) {
     if (theStream == nullptr) {
         std::unique_ptr<UREExternalOutput> output(new (std::nothrow)
-                                                      UREExternalOutputPipe(ure.ports.console, ure.ports.lines, ure));
+                                                      UREExternalOutputPipe(ure.ports.console, ure.ports.terminal, ure));
         if (output != nullptr) {
             theStream = new (std::nothrow) UREExternalObserverMachineStream(ure, std::move(output));
         }
@@ -33,14 +33,14 @@ void UREExternalObserverMachineStream::release() {
 
 UREExternalObserverMachineStream::UREExternalObserverMachineStream(URE& ure, std::unique_ptr<UREExternalOutput> output)
     : UREExternalObserverStream(std::move(output)), ure_(ure) {
-    ure_.ports.lines.keepLineFeeds(true);
+    ure_.ports.terminal.keepLineFeeds(true);
     this->output().writeMessage(kInstallStartLine);
 }
 
 UREExternalObserverMachineStream::~UREExternalObserverMachineStream() {
     const URELogObserver* log = URELogObserver::getInstance(ure_);
     output().writeMessage(installEndLine(log != nullptr ? log->logFilePath() : std::string_view{}).c_str());
-    ure_.ports.lines.keepLineFeeds(false);
+    ure_.ports.terminal.keepLineFeeds(false);
     theStream = nullptr;
 }
 

@@ -1,4 +1,4 @@
-#include "install/platform/embedded/services.h"
+#include "install/platform/service_records.h"
 
 #include <algorithm>
 #include <array>
@@ -29,10 +29,7 @@ std::string terminated(std::string_view text) {
 
 }  // namespace
 
-EmbeddedServiceManager::EmbeddedServiceManager(IRegistryStore& registry, IFileSystem& files)
-    : registry_(registry), files_(files) {}
-
-ServiceHandle EmbeddedServiceManager::giveOut(std::string recordPath, std::uint32_t access) {
+ServiceHandle ServiceRecords::giveOut(std::string recordPath, std::uint32_t access) {
     std::size_t slot = 0;
     while (slot < open_.size() && open_[slot].used) {
         ++slot;
@@ -44,17 +41,17 @@ ServiceHandle EmbeddedServiceManager::giveOut(std::string recordPath, std::uint3
     return static_cast<ServiceHandle>(slot + 1);
 }
 
-EmbeddedServiceManager::Open* EmbeddedServiceManager::slotOf(ServiceHandle handle) {
+ServiceRecords::Open* ServiceRecords::slotOf(ServiceHandle handle) {
     const auto number = static_cast<std::size_t>(handle);
     return number == 0 || number > open_.size() || !open_[number - 1].used ? nullptr : &open_[number - 1];
 }
 
-Status EmbeddedServiceManager::managerOf(ServiceHandle handle) {
+Status ServiceRecords::managerOf(ServiceHandle handle) {
     const Open* open = slotOf(handle);
     return open == nullptr || !open->recordPath.empty() ? kInvalidHandle : kSuccess;
 }
 
-Status EmbeddedServiceManager::recordOf(ServiceHandle handle, std::uint32_t needed, OwnedKey& record) {
+Status ServiceRecords::recordOf(ServiceHandle handle, std::uint32_t needed, OwnedKey& record) {
     const Open* open = slotOf(handle);
     if (open == nullptr || open->recordPath.empty()) {
         return kInvalidHandle;
@@ -70,13 +67,13 @@ Status EmbeddedServiceManager::recordOf(ServiceHandle handle, std::uint32_t need
     return isNotFound(status) ? kServiceMarkedForDelete : status;
 }
 
-Status EmbeddedServiceManager::openManager(std::uint32_t access, ServiceHandle& manager) {
+Status ServiceRecords::openManager(std::uint32_t access, ServiceHandle& manager) {
     manager = giveOut({}, access);
     return kSuccess;
 }
 
-Status EmbeddedServiceManager::createService(ServiceHandle manager, const ServiceDefinition& definition,
-                                             ServiceHandle& service) {
+Status ServiceRecords::createService(ServiceHandle manager, const ServiceDefinition& definition,
+                                     ServiceHandle& service) {
     if (const Status status = managerOf(manager); status != kSuccess) {
         return status;
     }
@@ -122,8 +119,8 @@ Status EmbeddedServiceManager::createService(ServiceHandle manager, const Servic
     return status;
 }
 
-Status EmbeddedServiceManager::openService(ServiceHandle manager, std::string_view name, std::uint32_t access,
-                                           ServiceHandle& service) {
+Status ServiceRecords::openService(ServiceHandle manager, std::string_view name, std::uint32_t access,
+                                   ServiceHandle& service) {
     if (const Status status = managerOf(manager); status != kSuccess) {
         return status;
     }
@@ -140,7 +137,7 @@ Status EmbeddedServiceManager::openService(ServiceHandle manager, std::string_vi
     return kSuccess;
 }
 
-Status EmbeddedServiceManager::changeStartType(ServiceHandle service, ServiceStart start) {
+Status ServiceRecords::changeStartType(ServiceHandle service, ServiceStart start) {
     OwnedKey record(registry_);
     const Status status = recordOf(service, kServiceChangeConfig, record);
     return status != kSuccess
@@ -148,7 +145,7 @@ Status EmbeddedServiceManager::changeStartType(ServiceHandle service, ServiceSta
                : registry_.setValue(record.get(), kStart, ValueType::dword, bytesOf(static_cast<std::uint32_t>(start)));
 }
 
-Status EmbeddedServiceManager::state(KeyHandle record, ServiceState& state) {
+Status ServiceRecords::state(KeyHandle record, ServiceState& state) {
     FixedBuffer<4> number;
     const Status status = registry_.queryValue(record, kRunState, nullptr, number);
     if (status != kSuccess && !isNotFound(status) && status != kMoreData) {
@@ -162,7 +159,7 @@ Status EmbeddedServiceManager::state(KeyHandle record, ServiceState& state) {
 
 // Deliberate: no process is run, the start stands in the record alone; that is what the flows and administrators look
 // at.
-Status EmbeddedServiceManager::startService(ServiceHandle service) {
+Status ServiceRecords::startService(ServiceHandle service) {
     OwnedKey record(registry_);
     ServiceState now{};
     Status status = recordOf(service, kServiceStartRight, record);
@@ -185,7 +182,7 @@ Status EmbeddedServiceManager::startService(ServiceHandle service) {
                                                    bytesOf(static_cast<std::uint32_t>(ServiceState::running)));
 }
 
-Status EmbeddedServiceManager::stopService(ServiceHandle service) {
+Status ServiceRecords::stopService(ServiceHandle service) {
     OwnedKey record(registry_);
     ServiceState now{};
     Status status = recordOf(service, kServiceStop, record);
@@ -198,13 +195,13 @@ Status EmbeddedServiceManager::stopService(ServiceHandle service) {
     return now == ServiceState::running ? registry_.deleteValue(record.get(), kRunState) : kServiceNotActive;
 }
 
-Status EmbeddedServiceManager::queryState(ServiceHandle service, ServiceState& state) {
+Status ServiceRecords::queryState(ServiceHandle service, ServiceState& state) {
     OwnedKey record(registry_);
     const Status status = recordOf(service, kServiceQueryStatus, record);
     return status != kSuccess ? status : this->state(record.get(), state);
 }
 
-Status EmbeddedServiceManager::deleteRecord(const std::string& path) {
+Status ServiceRecords::deleteRecord(const std::string& path) {
     Status status = registry_.deleteKey(KeyHandle::localMachine, path, 0);
     while (status == kAccessDenied) {
         OwnedKey record(registry_);
@@ -223,7 +220,7 @@ Status EmbeddedServiceManager::deleteRecord(const std::string& path) {
     return status;
 }
 
-Status EmbeddedServiceManager::deleteService(ServiceHandle service) {
+Status ServiceRecords::deleteService(ServiceHandle service) {
     OwnedKey record(registry_);
     Status status = recordOf(service, kServiceDelete, record);
     if (status != kSuccess) {
@@ -239,13 +236,18 @@ Status EmbeddedServiceManager::deleteService(ServiceHandle service) {
     return status;
 }
 
-Status EmbeddedServiceManager::closeHandle(ServiceHandle handle) {
+Status ServiceRecords::closeHandle(ServiceHandle handle) {
     Open* open = slotOf(handle);
     if (open == nullptr) {
         return kInvalidHandle;
     }
     *open = {};
     return kSuccess;
+}
+
+std::size_t ServiceRecords::openHandles() const {
+    return static_cast<std::size_t>(
+        std::count_if(open_.begin(), open_.end(), [](const Open& open) { return open.used; }));
 }
 
 }  // namespace kz7

@@ -1,6 +1,4 @@
-#include "install/platform/clock.h"
-
-#include <ctime>
+#include "install/platform/host_information.h"
 
 namespace kz7 {
 

@@ -1,6 +1,5 @@
-// The service port as records in the registry, where the machine's own service manager keeps them, so that
-// a service is seen with the same tools as the rest. No process is started for a service: its run state is
-// a value of its record.
+// The service port as records in the registry, where the machine's own service manager keeps them, so that the same
+// tools show services and everything else. No process is started for a service: its run state is a value of its record.
 #pragma once
 
 #include <string>
@@ -12,10 +11,10 @@
 
 namespace kz7 {
 
-class EmbeddedServiceManager final : public IServiceManager {
+class ServiceRecords final : public IServiceManager {
 public:
     // Writes through the registry, in its transaction.
-    EmbeddedServiceManager(IRegistryStore& registry, IFileSystem& files);
+    ServiceRecords(IRegistryStore& registry, IFileSystem& files) : registry_(registry), files_(files) {}
 
     Status openManager(std::uint32_t access, ServiceHandle& manager) override;
     Status createService(ServiceHandle manager, const ServiceDefinition& definition, ServiceHandle& service) override;
@@ -27,6 +26,9 @@ public:
     Status queryState(ServiceHandle service, ServiceState& state) override;
     Status deleteService(ServiceHandle service) override;
     Status closeHandle(ServiceHandle handle) override;
+
+    // Handles that were given out and are not closed yet.
+    std::size_t openHandles() const;
 
 private:
     struct Open {

@@ -1,4 +1,4 @@
-#include "install/platform/standard_input.h"
+#include "install/platform/terminal.h"
 
 #include <cstdio>
 

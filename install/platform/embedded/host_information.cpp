@@ -1,0 +1,35 @@
+#include <sys/utsname.h>
+
+#include <ctime>
+
+#include "install/platform/embedded/ports.h"
+
+namespace kz7 {
+namespace {
+
+class EmbeddedHost final : public IHostInformation {
+public:
+    Status localTime(TimeText form, Buffer& text) override {
+        const std::time_t now = std::time(nullptr);
+        std::tm parts{};
+        return localtime_r(&now, &parts) == nullptr ? kGeneralFailure : giveTime(parts, form, text);
+    }
+
+    Status operatingSystem(std::string& name, std::string& version) override {
+        utsname system{};
+        if (uname(&system) == -1) {
+            return kGeneralFailure;
+        }
+        name = system.sysname;
+        version = system.release;
+        return kSuccess;
+    }
+};
+
+}  // namespace
+
+std::unique_ptr<IHostInformation> embeddedHost() {
+    return std::make_unique<EmbeddedHost>();
+}
+
+}  // namespace kz7

@@ -1,0 +1,39 @@
+// What sees every call of the ports that it is given to, and may fail some of them.
+#pragma once
+
+#include <functional>
+#include <string>
+#include <string_view>
+
+#include "install/platform/status.h"
+
+namespace kz7 {
+
+// One call of a port. The texts are valid during the observation only.
+struct PortCall {
+    std::string_view port;       // "registry"
+    std::string_view operation;  // "openKey"
+    Status status = kSuccess;    // the result; kSuccess for an operation without a status
+
+    // Composes the arguments as text. Outputs show what was written, "?" if the call failed.
+    const std::function<std::string()>& arguments;
+
+    // registry.openKey(0x80000002, "SOFTWARE", 131097, ?) = 2
+    std::string text() const {
+        return std::string(port) + '.' + std::string(operation) + '(' + arguments() + ") = " + std::to_string(status);
+    }
+};
+
+class ICallObserver {
+public:
+    virtual ~ICallObserver() = default;
+
+    // Before each call that returns a status. Any result but kSuccess becomes the result of the call, which is then
+    // not made. A close is made all the same, so that whatever stays open was left open by the caller of the port.
+    virtual Status before() { return kSuccess; }
+
+    // After each call, on the thread that made it.
+    virtual void after(const PortCall& call) = 0;
+};
+
+}  // namespace kz7

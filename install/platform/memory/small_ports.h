@@ -1,0 +1,141 @@
+// The small ports in memory. Tests set up and read their public members.
+#pragma once
+
+#include <algorithm>
+#include <map>
+#include <string>
+#include <vector>
+
+#include "install/platform/assembly_records.h"
+#include "install/platform/console.h"
+#include "install/platform/debug_output.h"
+#include "install/platform/host_information.h"
+#include "install/platform/library_loader.h"
+#include "install/platform/registry_path.h"
+#include "install/platform/terminal.h"
+
+namespace kz7 {
+
+class MemoryConsole final : public IConsole {
+public:
+    Status writeOutput(std::string_view text) override {
+        output += text;
+        both += text;
+        return kSuccess;
+    }
+    Status writeError(std::string_view text) override {
+        flush();
+        error += text;
+        both += text;
+        return kSuccess;
+    }
+    Status flush() override {
+        flushed = output.size();
+        return kSuccess;
+    }
+
+    std::string output;
+    std::string error;
+    std::string both;         // in the order of the calls
+    std::size_t flushed = 0;  // bytes of `output` that a child's output would follow
+};
+
+class MemoryDebugOutput final : public IDebugOutput {
+public:
+    void write(std::string_view text) override { messages.emplace_back(text); }
+
+    std::vector<std::string> messages;
+};
+
+// A clock that stands still.
+class MemoryHost final : public IHostInformation {
+public:
+    Status localTime(TimeText form, Buffer& text) override {
+        return giveName(form == TimeText::timeOfDay ? timeOfDay : dateAndZone, text);
+    }
+    Status operatingSystem(std::string& name, std::string& version) override {
+        name = "Memory";
+        version = "1.0";
+        return kSuccess;
+    }
+
+    std::string dateAndZone = "Tue Jan  2 03:04:05 2024 UTC";
+    std::string timeOfDay = "03:04:05";
+};
+
+class MemoryTerminal final : public ITerminal {
+public:
+    Status readLine(Buffer& line) override {
+        if (input.empty()) {
+            return kEndOfFile;
+        }
+        const std::size_t end = std::min(input.find('\n'), input.size());
+        std::string_view text(input.data(), end);
+        text.remove_suffix(text.ends_with('\r') ? 1 : 0);
+        line.size = static_cast<std::uint32_t>(text.copy(line.data, line.capacity));
+        input.erase(0, end + 1);
+        return kSuccess;
+    }
+    void keepLineFeeds(bool on) override { keepsLineFeeds = on; }
+    TerminalView look(TerminalStream) override { return view; }
+    void leaveInterruptsToOthers(bool on) override { leavesInterrupts = on; }
+
+    std::string input;  // what is left to read
+    TerminalView view;
+    bool keepsLineFeeds = false;
+    bool leavesInterrupts = false;
+};
+
+// Entry points of this program, under the path and the name that they are found by.
+class MemoryLibraryLoader final : public ILibraryLoader {
+public:
+    using Entries = std::map<std::string, LibraryFunction>;
+
+    Status load(std::string_view path, LibraryHandle& library) override {
+        const auto found = libraries.find(std::string(path));
+        if (found == libraries.end()) {
+            return kModuleNotFound;
+        }
+        library = static_cast<LibraryHandle>(++last_);
+        loaded.emplace(library, &found->second);
+        return kSuccess;
+    }
+    Status resolve(LibraryHandle library, std::string_view name, LibraryFunction& function) override {
+        const auto open = loaded.find(library);
+        if (open == loaded.end()) {
+            return kInvalidHandle;
+        }
+        const auto entry = open->second->find(std::string(name));
+        if (entry == open->second->end()) {
+            return kProcedureNotFound;
+        }
+        function = entry->second;
+        return kSuccess;
+    }
+    Status free(LibraryHandle library) override { return loaded.erase(library) == 1 ? kSuccess : kInvalidHandle; }
+
+    std::map<std::string, Entries> libraries;        // by path
+    std::map<LibraryHandle, const Entries*> loaded;  // and not freed yet
+
+private:
+    std::uint64_t last_ = 0;
+};
+
+// The records of a host without the framework.
+class MemoryAssemblyCache final : public IAssemblyCache {
+public:
+    explicit MemoryAssemblyCache(IRegistryStore& registry) : registry_(registry) {}
+
+    Status deregisterProviders(std::string_view level) override { return dropProviders(registry_, level); }
+    Status registerProviders(std::string_view location, std::string_view level,
+                             FrameworkGenerations generations) override {
+        return recordProviders(registry_, location, level, generations, files);
+    }
+
+    std::vector<std::string> files;  // the provider files of every location
+
+private:
+    IRegistryStore& registry_;
+};
+
+}  // namespace kz7
