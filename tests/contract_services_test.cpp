@@ -79,7 +79,7 @@ TEST_P(ServicesContract, AServiceIsMadeFoundRunAndDeleted) {
     EXPECT_EQ(create(service, kName, backend_->folder() + "\\absent.exe"), kSuccess) << "its name is free again";
     EXPECT_EQ(start(service), kFileNotFound);
     EXPECT_TRUE(becomes(service, ServiceState::stopped));
-    for (const std::string& name : {std::string(), std::string("a/b"), std::string("a\\b"), std::string(257, 's')}) {
+    for (const std::string& name : {std::string(), std::string("a/b"), std::string("a\\b"), std::string(256, 's')}) {
         EXPECT_EQ(create(second, name, backend_->program()), kInvalidName) << name;
         EXPECT_EQ(open(name, second), kInvalidName) << name;
     }

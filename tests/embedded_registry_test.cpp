@@ -2,8 +2,10 @@
 #include "install/platform/embedded/registry.h"
 
 #include <gtest/gtest.h>
+#include <sys/resource.h>
 #include <unistd.h>
 
+#include <csignal>
 #include <filesystem>
 
 #include "install/src/registry/registry_access.h"
@@ -79,12 +81,50 @@ TEST_F(EmbeddedStore, AFaultIsToldOnceAndAnswersUntilTheMark) {
     EXPECT_EQ(setText(registry, "K", "v", "1"), kSuccess) << "a new run starts over";
 }
 
-TEST_F(EmbeddedStore, TheCallersKeyIsMadeOnFirstUse) {
+TEST_F(EmbeddedStore, OnlyAWriteMakesTheCallersKey) {
     EmbeddedRegistry registry = open();
     OwnedKey key(registry);
-    ASSERT_EQ(registry.createKey(KeyHandle::currentUser, "Mine", {}, kKeyFull, key.receive()), kSuccess);
-    const std::string user = "[S-1-22-1-" + std::to_string(geteuid());
-    EXPECT_EQ(dumpRegistry(registry, KeyHandle::users), user + "] \n" + user + "\\Mine] \n");
+    FixedBuffer<16> room;
+    const std::string name = "S-1-22-1-" + std::to_string(geteuid());
+    for (int round = 0; round < 2; ++round) {
+        EXPECT_EQ(registry.openKey(KeyHandle::currentUser, {}, kKeyRead, key.receive()), kFileNotFound);
+        EXPECT_EQ(registry.openKey(KeyHandle::currentUser, "x", kKeyRead, key.receive()), kFileNotFound);
+        EXPECT_EQ(registry.queryValue(KeyHandle::currentUser, "v", nullptr, room), kFileNotFound);
+        EXPECT_EQ(registry.deleteValue(KeyHandle::currentUser, "v"), kFileNotFound);
+        EXPECT_EQ(registry.enumerateKey(KeyHandle::currentUser, 0, room, nullptr), kNoMoreItems);
+        EXPECT_EQ(registry.deleteKey(KeyHandle::currentUser, {}, 0), kFileNotFound);
+        EXPECT_EQ(dumpRegistry(registry, KeyHandle::users), "");
+        ASSERT_EQ(round == 0 ? registry.createKey(KeyHandle::currentUser, "Mine", {}, kKeyFull, key.receive())
+                             : registry.setValue(KeyHandle::currentUser, "v", ValueType::sz, {}),
+                  kSuccess);
+        EXPECT_EQ(dumpRegistry(registry, KeyHandle::users),
+                  round == 0 ? "[" + name + "] \n[" + name + "\\Mine] \n" : "[" + name + "] \n" + name + " : v = 1:\n");
+        EXPECT_EQ(registry.deleteKey(KeyHandle::currentUser, "Mine", 0), round == 0 ? kSuccess : kFileNotFound);
+        EXPECT_EQ(registry.deleteKey(KeyHandle::users, name, 0), kSuccess) << "by its other name";
+    }
+}
+
+TEST_F(EmbeddedStore, AHandleOfADroppedKeyNeverNamesAnotherWritersKey) {
+    EmbeddedRegistry mine = open();
+    OwnedKey kept(mine);
+    OwnedKey dropped(mine);
+    ASSERT_EQ(mine.createKey(kMachine, "Kept", {}, kKeyFull, kept.receive()), kSuccess);
+    ASSERT_EQ(mine.commit(), kSuccess);
+    ASSERT_EQ(mine.createKey(kMachine, "Dropped", {}, kKeyFull, dropped.receive()), kSuccess);
+    const std::string log = directory_.path() + "/state/registry.db-wal";
+    const rlimit full{std::filesystem::file_size(log), RLIM_INFINITY};
+    const rlimit usual{RLIM_INFINITY, RLIM_INFINITY};
+    std::signal(SIGXFSZ, SIG_IGN);
+    setrlimit(RLIMIT_FSIZE, &full);
+    EXPECT_EQ(mine.commit(), kDiskFull);
+    setrlimit(RLIMIT_FSIZE, &usual);
+    EmbeddedRegistry other = open();
+    ASSERT_EQ(setText(other, "Others", "v", "1"), kSuccess);
+    ASSERT_EQ(other.commit(), kSuccess);
+    EXPECT_EQ(mine.setValue(dropped.get(), "v", ValueType::sz, "mine"), kKeyDeleted);
+    EXPECT_EQ(mine.setValue(kept.get(), "v", ValueType::sz, {}), kSuccess);
+    EXPECT_EQ(mine.closeKey(dropped.get()), kSuccess);
+    dropped.leaveOpen();
 }
 
 TEST_F(EmbeddedStore, TheLogDoesNotGrowForEver) {

@@ -83,6 +83,50 @@ TEST(StoreFaults, AStoreThatStaysLockedOrIsOutOfReachIsTold) {
         << nowhere.error;
 }
 
+// What is below a service's key goes with it; the tree is as deep as no path and no stack is.
+TEST(DeepStores, AServiceWithADeepTreeOrACycleBelowIt) {
+    constexpr const char* kBelow =
+        "INSERT INTO key (parent, fold, name, class) SELECT id, 'A', 'A', '' FROM key WHERE fold = 'KZ7MGMTSVC_FIRST';"
+        "WITH RECURSIVE n (i) AS (VALUES (1) UNION ALL SELECT i + 1 FROM n WHERE i < 20000)"
+        " INSERT INTO key (parent, fold, name, class) SELECT (SELECT max(id) FROM key) + i - 1, 'A', 'A', '' FROM n";
+    constexpr const char* kCycle =
+        "UPDATE key SET parent = (SELECT id FROM key WHERE fold = 'KZ7MGMTSVC_FIRST') WHERE id = 1";
+    const StateDirectory state;
+    ASSERT_EQ(state.tool(kAddFirst).exitCode, 0);
+    const StateDirectory cyclic;
+    cyclic.copyFrom(state);
+    ASSERT_EQ(state.tool({"-removeKZ7Copy", "FIRST"}).exitCode, 0);
+    const std::string removed = state.dump();
+    ASSERT_EQ(state.tool(kAddFirst).exitCode, 0);
+    sqlite3_close(executeSql(state.file("registry.db"), kBelow));
+    const ProgramResult deep = state.tool({"-removeKZ7Copy", "FIRST"});
+    EXPECT_EQ(deep.exitCode, 0) << deep.error;
+    EXPECT_EQ(state.dump(), removed);
+
+    sqlite3_close(executeSql(cyclic.file("registry.db"), kCycle));
+    const ProgramResult result = cyclic.tool({"-removeKZ7Copy", "FIRST"});
+    EXPECT_EQ(result.exitCode, hostExitCode(kRegistryCorrupt));
+    EXPECT_NE(result.error.find("registry.db: the keys form a cycle\n"), std::string::npos) << result.error;
+}
+
+TEST(StateDirectories, WorkAtAnyLengthAndFromAnyDirectory) {
+    const StateDirectory state;
+    std::string path = state.path();
+    while (path.size() < 1000) {
+        path += "/" + std::string(100, 'd');
+    }
+    const std::string tool = "cd " + state.path() + " && exec " + programPath("kz7InstallReg");
+    // The programs that a migration starts run in another directory.
+    const ProgramOptions options{
+        {"KZ7_STATE_DIR=" + path.substr(state.path().size() + 1), "KZ7_SAMPLE_HOOK=test $KZ7_STATE_DIR = " + path}, {}};
+    for (const std::string command : {" -addKZ7Copy FIRST /first", " -dotnet " KZ7_SAMPLE}) {
+        const ProgramResult result = runProgram({"/bin/sh", "-c", tool + command}, options);
+        EXPECT_EQ(result.exitCode, 0) << command;
+        EXPECT_EQ(result.error, "") << command;
+    }
+    EXPECT_NE(StateDirectory::dumpOf(path), "");
+}
+
 class ScarceResources : public testing::Test {
 protected:
     void SetUp() override {
@@ -147,12 +191,12 @@ TEST_F(ScarceResources, MemoryAtEveryAllocation) {
 #if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
     GTEST_SKIP() << "a sanitizer's allocator lets no other be loaded before it";
 #endif
-    const std::string preloaded = "LD_PRELOAD=" + std::string(KZ7_FAILING_MALLOC);
+    const std::string preloaded = "LD_PRELOAD=" + std::string(KZ7_FAILING_CALLS);
     for (const char* forGood : {"KZ7_FAIL_FOR_GOOD=0", "KZ7_FAIL_FOR_GOOD=1"}) {
         bool through = false;
         for (int count = 1; count < 5000 && !through; ++count) {
-            const std::string row = "KZ7_FAIL_ALLOCATION=" + std::to_string(count);
-            through = adds(row, {{preloaded, row, forGood}, {}});
+            const std::string row = "KZ7_FAIL_AT=" + std::to_string(count);
+            through = adds(row, {{preloaded, "KZ7_FAIL_CALL=malloc", row, forGood}, {}});
         }
         EXPECT_TRUE(through) << forGood;
     }

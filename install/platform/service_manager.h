@@ -5,6 +5,7 @@
 #include <string_view>
 
 #include "install/platform/owned_handle.h"
+#include "install/platform/registry_store.h"
 #include "install/platform/status.h"
 
 namespace kz7 {
@@ -33,9 +34,9 @@ enum class ServiceState : std::uint32_t {
     running = 4,
 };
 
-inline constexpr std::size_t kMaxServiceName = 256;
+// Characters of a service's name. The service manager keeps a service as a key of that name, so the limit is a key's.
+inline constexpr std::size_t kMaxServiceName = kMaxKeyName;
 
-// What a store of our own takes for a service's name; on Windows the system judges it.
 constexpr bool isServiceName(std::string_view name) {
     return !name.empty() && name.size() <= kMaxServiceName && name.find_first_of("/\\") == std::string_view::npos;
 }
@@ -59,7 +60,7 @@ public:
 
     virtual Status openManager(std::uint32_t access, ServiceHandle& manager) = 0;
 
-    // kServiceExists: there is one of that name. kInvalidName: an empty name, one over 256 characters or with
+    // kServiceExists: there is one of that name. kInvalidName: an empty name, one over 255 characters or with
     // a slash of either kind. kServiceMarkedForDelete: one of that name was deleted, a handle of it is still
     // open. kDuplicateServiceName: its display name is taken, on a host that judges it.
     virtual Status createService(ServiceHandle manager, const ServiceDefinition& definition,

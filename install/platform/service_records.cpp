@@ -201,20 +201,20 @@ Status ServiceRecords::queryState(ServiceHandle service, ServiceState& state) {
     return status != kSuccess ? status : this->state(record.get(), state);
 }
 
+// By handles and without recursion: a tree of keys may be deeper than a path is long, or than the stack.
 Status ServiceRecords::deleteRecord(const std::string& path) {
-    Status status = registry_.deleteKey(KeyHandle::localMachine, path, 0);
-    while (status == kAccessDenied) {
-        OwnedKey record(registry_);
+    std::vector<OwnedKey> keys;
+    Status status =
+        registry_.openKey(KeyHandle::localMachine, path, kKeyEnumerateSubkeys, keys.emplace_back(registry_).receive());
+    while (status == kSuccess && !keys.empty()) {
+        const KeyHandle key = keys.back().get();
         FixedBuffer<kMaxKeyName + 1> below;
-        status = registry_.openKey(KeyHandle::localMachine, path, kKeyEnumerateSubkeys, record.receive());
+        status = registry_.enumerateKey(key, 0, below, nullptr);
         if (status == kSuccess) {
-            status = registry_.enumerateKey(record.get(), 0, below, nullptr);
-        }
-        if (status == kSuccess) {
-            status = deleteRecord(path + '\\' + std::string(below.view()));
-        }
-        if (status == kSuccess) {
-            status = registry_.deleteKey(KeyHandle::localMachine, path, 0);
+            status = registry_.openKey(key, below.view(), kKeyEnumerateSubkeys, keys.emplace_back(registry_).receive());
+        } else if (isEndOfItems(status)) {
+            status = registry_.deleteKey(key, {}, 0);
+            keys.pop_back();
         }
     }
     return status;

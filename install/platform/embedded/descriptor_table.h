@@ -2,11 +2,11 @@
 // descriptor that is closed could be anything next, the database too.
 #pragma once
 
-#include <unistd.h>
-
 #include <cstdint>
 #include <map>
 #include <mutex>
+
+#include "install/platform/embedded/descriptor.h"
 
 namespace kz7 {
 
@@ -16,18 +16,12 @@ class DescriptorTable {
 public:
     // Tokens up to that number stand for something else.
     explicit DescriptorTable(std::uint64_t taken = 0) : last_(taken) {}
-    ~DescriptorTable() {
-        for (const auto& [handle, descriptor] : open_) {
-            close(descriptor);
-        }
-    }
-    DescriptorTable(const DescriptorTable&) = delete;
-    DescriptorTable& operator=(const DescriptorTable&) = delete;
 
-    Handle give(int descriptor) {
+    Handle give(OwnedDescriptor descriptor) {
         const std::lock_guard<std::mutex> held(lock_);
-        const Handle handle{++last_};
-        open_.emplace(handle, descriptor);
+        const Handle handle{last_ + 1};
+        open_.emplace(handle, std::move(descriptor));
+        ++last_;
         return handle;
     }
 
@@ -35,23 +29,24 @@ public:
     int find(Handle handle) {
         const std::lock_guard<std::mutex> held(lock_);
         const auto found = open_.find(handle);
-        return found != open_.end() ? found->second : -1;
+        return found != open_.end() ? found->second.get() : -1;
     }
 
-    // The same for the last time: it is the caller's to close.
-    int take(Handle handle) {
+    // Takes it out of the table.
+    OwnedDescriptor take(Handle handle) {
         const std::lock_guard<std::mutex> held(lock_);
         const auto found = open_.find(handle);
-        const int descriptor = found != open_.end() ? found->second : -1;
-        if (descriptor != -1) {
+        OwnedDescriptor taken;
+        if (found != open_.end()) {
+            taken = std::move(found->second);
             open_.erase(found);
         }
-        return descriptor;
+        return taken;
     }
 
 private:
     std::mutex lock_;
-    std::map<Handle, int> open_;
+    std::map<Handle, OwnedDescriptor> open_;
     std::uint64_t last_;
 };
 

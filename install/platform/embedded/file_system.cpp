@@ -66,24 +66,26 @@ public:
 
     Status readFile(std::string_view path, std::string& content) override {
         const std::string host = hostPath(path, stateDirectory_);
-        const int descriptor = host.empty() ? -1 : open(host.c_str(), O_RDONLY | O_CLOEXEC);
-        if (descriptor == -1) {
-            return host.empty() ? kFileNotFound : statusOf(errno);
+        if (host.empty()) {
+            return kFileNotFound;
+        }
+        const OwnedDescriptor descriptor(open(host.c_str(), O_RDONLY | O_CLOEXEC));
+        if (!descriptor) {
+            return statusOf(errno);
         }
         std::string read;
         ssize_t count = 0;
         do {
             const std::size_t length = read.size();
             read.resize(length + kReadPiece);
-            count = ::read(descriptor, read.data() + length, kReadPiece);
+            count = ::read(descriptor.get(), read.data() + length, kReadPiece);
             read.resize(length + (count > 0 ? static_cast<std::size_t>(count) : 0));
         } while (count > 0 || (count == -1 && errno == EINTR));
-        const Status status = count == -1 ? statusOf(errno) : kSuccess;
-        close(descriptor);
-        if (status == kSuccess) {
-            content = std::move(read);
+        if (count == -1) {
+            return statusOf(errno);
         }
-        return status;
+        content = std::move(read);
+        return kSuccess;
     }
 
     Status openForAppend(std::string_view path, FileHandle& file) override {
@@ -92,17 +94,16 @@ public:
             return kFileNotFound;
         }
         // A link that somebody left in a folder open to all is not followed, a pipe without a reader not waited for.
-        const int descriptor =
-            open(host.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, kLogFileMode);
-        if (descriptor == -1) {
+        OwnedDescriptor descriptor(
+            open(host.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, kLogFileMode));
+        if (!descriptor) {
             return errno == ENOENT || errno == ENOTDIR ? kPathNotFound : statusOf(errno);
         }
         struct stat found {};
-        if (fstat(descriptor, &found) == -1 || !S_ISREG(found.st_mode)) {
-            close(descriptor);
+        if (fstat(descriptor.get(), &found) == -1 || !S_ISREG(found.st_mode)) {
             return kAccessDenied;
         }
-        file = files_.give(descriptor);
+        file = files_.give(std::move(descriptor));
         return kSuccess;
     }
 
@@ -119,7 +120,12 @@ public:
         return kSuccess;
     }
 
-    Status closeFile(FileHandle file) override { return close(files_.take(file)) == 0 ? kSuccess : statusOf(errno); }
+    Status closeFile(FileHandle file) override {
+        OwnedDescriptor taken = files_.take(file);
+        const int descriptor = taken.get();
+        taken.leaveOpen();  // closed here, since some file systems report a failed write only now
+        return close(descriptor) == 0 ? kSuccess : statusOf(errno);
+    }
 
     Status findFile(std::string_view pattern, std::string& name) override {
         const std::string host = hostPath(pattern, stateDirectory_);

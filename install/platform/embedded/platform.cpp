@@ -82,8 +82,8 @@ std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options) {
         std::signal(SIGXFSZ, SIG_IGN);
     }
     auto platform = std::make_unique<EmbeddedPlatform>(options);
-    if (options.ownProcess && !options.stateDirectory.empty()) {
-        // Programs that are started work on the same store.
+    if (options.ownProcess && !platform->directory().empty()) {
+        // Programs that are started work on the same store, from whatever directory.
         setenv("KZ7_STATE_DIR", platform->directory().c_str(), 1);
     }
     return platform;

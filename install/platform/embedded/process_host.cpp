@@ -52,16 +52,11 @@ Status statusOf(int error) {
     }
 }
 
-// Keeps a descriptor out of the three numbers that a child's streams are put on; -1 and none left on failure.
-int moveUp(int descriptor) {
-    if (descriptor >= kFirstOwnDescriptor) {
-        return descriptor;
-    }
-    const int moved = fcntl(descriptor, F_DUPFD_CLOEXEC, kFirstOwnDescriptor);
-    const int error = errno;
-    close(descriptor);
-    errno = error;
-    return moved;
+// Keeps a descriptor out of the three numbers that a child's streams are put on; none on failure.
+OwnedDescriptor moveUp(OwnedDescriptor descriptor) {
+    return descriptor.get() >= kFirstOwnDescriptor
+               ? std::move(descriptor)
+               : OwnedDescriptor(fcntl(descriptor.get(), F_DUPFD_CLOEXEC, kFirstOwnDescriptor));
 }
 
 // What says that a file is none that this host can execute.
@@ -242,25 +237,25 @@ public:
         if (pipe2(ends, O_CLOEXEC) == -1) {
             return statusOf(errno);
         }
-        const int reading = moveUp(ends[0]);
-        const int writing = moveUp(ends[1]);
-        if (reading == -1 || writing == -1) {
-            const Status status = statusOf(errno);
-            close(reading);
-            close(writing);
-            return status;
+        OwnedDescriptor first(ends[0]);
+        OwnedDescriptor second(ends[1]);
+        OwnedDescriptor reading = moveUp(std::move(first));
+        OwnedDescriptor writing = reading ? moveUp(std::move(second)) : OwnedDescriptor();
+        if (!writing) {
+            return statusOf(errno);
         }
-        readEnd = streams_.give(reading);
-        writeEnd = streams_.give(writing);
+        const StreamHandle given = streams_.give(std::move(reading));
+        writeEnd = streams_.give(std::move(writing));
+        readEnd = given;
         return kSuccess;
     }
 
     Status duplicate(StreamHandle stream, StreamHandle& copy) override {
-        const int descriptor = fcntl(streams_.find(stream), F_DUPFD_CLOEXEC, kFirstOwnDescriptor);
-        if (descriptor == -1) {
+        OwnedDescriptor descriptor(fcntl(streams_.find(stream), F_DUPFD_CLOEXEC, kFirstOwnDescriptor));
+        if (!descriptor) {
             return statusOf(errno);
         }
-        copy = streams_.give(descriptor);
+        copy = streams_.give(std::move(descriptor));
         return kSuccess;
     }
 
@@ -290,14 +285,7 @@ public:
         return kSuccess;
     }
 
-    Status closeStream(StreamHandle stream) override {
-        const int descriptor = streams_.take(stream);
-        if (descriptor == -1) {
-            return kInvalidHandle;
-        }
-        close(descriptor);
-        return kSuccess;
-    }
+    Status closeStream(StreamHandle stream) override { return streams_.take(stream) ? kSuccess : kInvalidHandle; }
 
     Status startProcess(const ProcessStart& start, ProcessInformation& started) override {
         for (const CommandReading& reading : commandReadings(start.commandLine)) {

@@ -12,7 +12,9 @@ namespace {
 
 constexpr std::int64_t kMachineId = 1;
 constexpr std::int64_t kUsersId = 2;
+constexpr std::int64_t kNoKey = -1;  // the caller's key while it does not exist: nothing is below it
 constexpr std::uint32_t kRoots = 3;  // the first slots of the open keys
+constexpr std::uint32_t kUserSlot = 2;
 constexpr std::int64_t kPageSize = 4096;
 constexpr std::int64_t kLogLimit = std::int64_t{256} * 1024;  // bytes of log that a run leaves to the next one
 
@@ -37,6 +39,10 @@ constexpr std::array kSql = {
 };
 // clang-format on
 
+std::string userName() {
+    return "S-1-22-1-" + std::to_string(geteuid());
+}
+
 }  // namespace
 
 enum class EmbeddedRegistry::Sql : std::size_t {
@@ -60,7 +66,7 @@ enum class EmbeddedRegistry::Sql : std::size_t {
 EmbeddedRegistry::EmbeddedRegistry(const std::string& directory, bool readOnly, FaultListener listener)
     : file_(directory), readOnly_(readOnly), listener_(std::move(listener)) {
     static_assert(kSql.size() == std::tuple_size_v<decltype(statements_)>);
-    for (const KeyId id : {kMachineId, kUsersId, KeyId{0}}) {
+    for (const KeyId id : {kMachineId, kUsersId, kNoKey}) {
         OpenKey& root = open_.emplace_back();
         root.used = true;
         root.access = kKeyFull;
@@ -126,13 +132,45 @@ void EmbeddedRegistry::endTransaction() {
     if (connection_ != nullptr && sqlite3_get_autocommit(connection_.get()) == 0) {
         execute(connection_.get(), "ROLLBACK");
     }
+    if (commitFailed_) {
+        commitFailed_ = !overwriteFailedCommit();
+    }
+    // What is left of a transaction that succeeded has no new keys. Those of another one give their ids to later keys,
+    // of other processes too.
+    for (OpenKey& open : open_) {
+        open.deleted = open.deleted || (firstNew_ != 0 && open.id >= firstNew_);
+    }
+    firstNew_ = 0;
     inTransaction_ = false;
+}
+
+// A commit that fails at its sync has already written its frames, and the next process to open the store would take
+// them from the log as a commit that succeeded. Another commit, which changes nothing, is written over the first of
+// them: each frame is checked with the sum of those before it, so none behind it counts any more. It must not sync
+// before it writes, since the sync is what fails. Good frames of earlier commits, a checkpoint and readers are not
+// touched: the log goes on behind the last published frame, as for any writer. A process that is killed between the two
+// commits leaves the failed one; nothing that could be written earlier would prevent it.
+bool EmbeddedRegistry::overwriteFailedCommit() {
+    sqlite3* const connection = connection_.get();
+    const bool overwritten = execute(connection, "PRAGMA synchronous = OFF; PRAGMA user_version = 1") == SQLITE_OK;
+    // Once more, to have it on the disk if that can be done.
+    execute(connection, "PRAGMA synchronous = FULL; PRAGMA user_version = 1");
+    return overwritten;
 }
 
 Status EmbeddedRegistry::commit() {
     if (fault_ == kSuccess && inTransaction_) {
-        if (const int result = execute(connection_.get(), "COMMIT"); result != SQLITE_OK) {
-            fail(result);
+        const int result = execute(connection_.get(), "COMMIT");
+        commitFailed_ = result != SQLITE_OK;
+        if (commitFailed_) {
+            StoreFault fault = file_.explain(connection_.get(), result);
+            endTransaction();
+            if (commitFailed_) {
+                fault.reason += "; the changes could not be taken back and may appear later";
+            }
+            fail(fault);
+        } else {
+            firstNew_ = 0;
         }
     }
     endTransaction();
@@ -213,16 +251,8 @@ Status EmbeddedRegistry::keyOf(KeyHandle handle, AccessMask needed, OpenKey*& op
         // Another process may have written since.
         found->keys = {};
         found->values = {};
-        if (handle == KeyHandle::currentUser) {
-            if (const Status status = currentUser(found->id); status != kSuccess) {
-                return status;
-            }
-        } else if (!found->deleted) {
-            const int result = query(Sql::keyExists).bind(found->id).step();
-            if (result != SQLITE_ROW && result != SQLITE_DONE) {
-                return fail(result);
-            }
-            found->deleted = result == SQLITE_DONE;
+        if (const Status status = lookUp(*found); status != kSuccess) {
+            return status;
         }
         found->checkedIn = transaction_;
     }
@@ -236,10 +266,33 @@ Status EmbeddedRegistry::keyOf(KeyHandle handle, AccessMask needed, OpenKey*& op
     return kSuccess;
 }
 
-Status EmbeddedRegistry::currentUser(KeyId& id) {
-    const std::string sid = "S-1-22-1-" + std::to_string(geteuid());
-    const Status status = child(kUsersId, sid, id);
-    return isNotFound(status) && !readOnly_ ? addChild(kUsersId, sid, sid, {}, id) : status;
+Status EmbeddedRegistry::lookUp(OpenKey& open) {
+    if (&open == &open_[kUserSlot]) {  // found by its name: it may not exist yet, or not any more
+        open.id = kNoKey;
+        open.deleted = false;
+        const Status status = child(kUsersId, userName(), open.id);
+        return isNotFound(status) ? kSuccess : status;
+    }
+    if (!open.deleted) {
+        const int result = query(Sql::keyExists).bind(open.id).step();
+        if (result != SQLITE_ROW && result != SQLITE_DONE) {
+            return fail(result);
+        }
+        open.deleted = result == SQLITE_DONE;
+    }
+    return kSuccess;
+}
+
+// Deliberate: only a write makes the caller's key; reading a setting must leave the store as it is.
+Status EmbeddedRegistry::makeUser(OpenKey& open) {
+    const std::string name = userName();
+    return open.id == kNoKey ? addChild(kUsersId, name, name, {}, open.id) : kSuccess;
+}
+
+// The roots are below no key. In a damaged store that has one there, walks of the tree would never end; other cycles
+// cannot be reached, since each key has one parent.
+Status EmbeddedRegistry::checkBelow(KeyId id) {
+    return id > kUsersId ? kSuccess : fail({kRegistryCorrupt, file_.path(), "the keys form a cycle"});
 }
 
 EmbeddedRegistry::KnownSubkey& EmbeddedRegistry::knownSlot(KeyId parent, std::string_view fold) {
@@ -266,6 +319,9 @@ Status EmbeddedRegistry::child(KeyId parent, std::string_view fold, KeyId& id) {
     if (result != SQLITE_ROW) {
         return result == SQLITE_DONE ? kFileNotFound : fail(result);
     }
+    if (const Status status = checkBelow(find.number(0)); status != kSuccess) {
+        return status;
+    }
     id = find.number(0);
     remember(parent, fold, id);
     return kSuccess;
@@ -278,6 +334,7 @@ Status EmbeddedRegistry::addChild(KeyId parent, std::string_view name, std::stri
         return fail(result);
     }
     id = sqlite3_last_insert_rowid(connection_.get());
+    firstNew_ = firstNew_ == 0 ? id : firstNew_;
     remember(parent, fold, id);
     subkeyAdded(parent, fold);
     // A new key has no values yet.
@@ -288,6 +345,9 @@ Status EmbeddedRegistry::addChild(KeyId parent, std::string_view name, std::stri
 void EmbeddedRegistry::subkeyAdded(KeyId parent, std::string_view fold) {
     if (childless_ == parent) {
         childless_ = 0;
+    }
+    if (parent == kUsersId) {
+        open_[kUserSlot].checkedIn = 0;  // may be found now
     }
     for (OpenKey& open : open_) {
         if (!open.used || open.id != parent) {
@@ -305,6 +365,9 @@ void EmbeddedRegistry::subkeyDeleted(const Found& gone) {
     knownSlot(gone.parent, gone.fold).transaction = 0;
     for (KnownPath& known : knownPaths_) {
         known.transaction = known.id == gone.id ? 0 : known.transaction;
+    }
+    if (gone.parent == kUsersId) {
+        open_[kUserSlot].checkedIn = 0;
     }
     for (OpenKey& open : open_) {
         open.deleted = open.deleted || open.id == gone.id;
@@ -331,6 +394,9 @@ Status EmbeddedRegistry::find(KeyHandle parent, std::string_view path, AccessMas
     if (const Status status = keyOf(parent, 0, base); status != kSuccess) {
         return status;
     }
+    if (const Status status = create ? makeUser(*base) : kSuccess; status != kSuccess) {
+        return status;
+    }
     found.id = base->id;
     const std::string plain = plainKeyPath(parent, path, access);
     std::string_view rest = plain;
@@ -347,7 +413,7 @@ Status EmbeddedRegistry::find(KeyHandle parent, std::string_view path, AccessMas
             return status;
         }
     }
-    return kSuccess;
+    return found.id == kNoKey ? kFileNotFound : kSuccess;
 }
 
 Status EmbeddedRegistry::openKey(KeyHandle parent, std::string_view path, AccessMask access, KeyHandle& key) {
@@ -433,6 +499,9 @@ Status EmbeddedRegistry::setValue(KeyHandle key, std::string_view name, ValueTyp
         return status;
     }
     std::int64_t place = 0;
+    if (status = makeUser(*open); status != kSuccess) {
+        return status;
+    }
     if (status = nextPlace(open->id, place); status != kSuccess) {
         return status;
     }
@@ -493,6 +562,9 @@ Status EmbeddedRegistry::readAhead(const OpenKey& open, std::uint32_t skip, std:
     Query next = query(Sql::nextKeys);
     int result = next.bind(open.id).bind(std::string_view(open.keys.fold)).bind(skip).step();
     for (; result == SQLITE_ROW; result = next.step()) {
+        if (const Status status = checkBelow(next.number(0)); status != kSuccess) {
+            return status;
+        }
         rows.push_back(
             {next.number(0), std::string(next.bytes(1)), std::string(next.bytes(2)), std::string(next.bytes(3))});
     }

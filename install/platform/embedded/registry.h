@@ -76,7 +76,7 @@ private:
         std::uint32_t generation = 0;  // how often the slot was given out
         AccessMask access = 0;
         KeyId id = 0;
-        std::uint64_t checkedIn = 0;  // the transaction that last saw the key exist
+        std::uint64_t checkedIn = 0;  // the transaction that last looked the key up
         KeyPlace keys;
         ValuePlace values;
     };
@@ -110,6 +110,7 @@ private:
     Status fail(int result);
     Status fail(const StoreFault& fault);
     void endTransaction();
+    bool overwriteFailedCommit();
     Query query(Sql which);
 
     OpenKey* slotOf(KeyHandle handle);
@@ -117,7 +118,8 @@ private:
     // The key behind a handle that has the rights needed. The pointer is good until the next key is given out.
     Status keyOf(KeyHandle handle, AccessMask needed, OpenKey*& open);
     Status keyForValue(KeyHandle key, AccessMask needed, std::string_view name, OpenKey*& open);
-    Status currentUser(KeyId& id);
+    Status lookUp(OpenKey& open);
+    Status makeUser(OpenKey& open);
     Status child(KeyId parent, std::string_view fold, KeyId& id);
     Status nextPlace(KeyId key, std::int64_t& place);
     Status addChild(KeyId parent, std::string_view name, std::string_view fold, std::string_view keyClass, KeyId& id);
@@ -127,6 +129,7 @@ private:
     void remember(KeyId parent, std::string_view fold, KeyId id);
     Status readAhead(const OpenKey& open, std::uint32_t skip, std::vector<Subkey>& rows);
     Status readAhead(const OpenKey& open, std::uint32_t skip, std::vector<ValueName>& rows);
+    Status checkBelow(KeyId id);
     void subkeyAdded(KeyId parent, std::string_view fold);
     void subkeyDeleted(const Found& gone);
 
@@ -138,7 +141,9 @@ private:
     std::array<Statement, 15> statements_;
     Status fault_ = kSuccess;  // met in this transaction; every operation answers it until the next mark
     bool inTransaction_ = false;
+    bool commitFailed_ = false;  // and may still be found in the log by the next process
     std::uint64_t transaction_ = 0;
+    KeyId firstNew_ = 0;  // the first key that this transaction made; ids ascend
     std::int64_t logPages_ = 0;
     std::vector<OpenKey> open_;  // the roots first
     std::vector<std::uint32_t> free_;

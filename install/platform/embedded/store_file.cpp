@@ -45,6 +45,21 @@ const char* fileSystemOfGivenNames() {
     return known ? system.zName : nullptr;
 }
 
+// The error number behind a failure; 0 when the system has none. SQLite passes it on for calls that open and read, but
+// keeps that of a failed sync with the file.
+int systemError(sqlite3* connection) {
+    int error = connection == nullptr ? 0 : sqlite3_system_errno(connection);
+    for (const int which : {SQLITE_FCNTL_JOURNAL_POINTER, SQLITE_FCNTL_FILE_POINTER}) {
+        sqlite3_file* file = nullptr;
+        if (error == 0 && connection != nullptr &&
+            sqlite3_file_control(connection, "main", which, &file) == SQLITE_OK && file != nullptr &&
+            file->pMethods != nullptr) {
+            file->pMethods->xFileControl(file, SQLITE_FCNTL_LAST_ERRNO, &error);
+        }
+    }
+    return error;
+}
+
 bool isTooLong(const std::string& directory) {
     const std::unique_ptr<char, void (*)(void*)> resolved(realpath(directory.c_str(), nullptr), std::free);
     return directory.size() > kLongestDirectory ||
@@ -217,13 +232,10 @@ StoreFault StoreFile::explain(sqlite3* connection, int result) const {
         case SQLITE_AUTH:
         case SQLITE_READONLY:
             return {kAccessDenied, path_, said};
-        case SQLITE_CANTOPEN: {
-            const int error = connection == nullptr ? 0 : sqlite3_system_errno(connection);
-            return error == 0 ? StoreFault{kCannotOpen, path_, said} : refused(kCannotOpen, path_, error);
-        }
         default: {
-            const int error = connection == nullptr ? 0 : sqlite3_system_errno(connection);
-            return error == 0 ? StoreFault{kRegistryIoFailed, path_, said} : refused(kRegistryIoFailed, path_, error);
+            const Status status = (result & 0xFF) == SQLITE_CANTOPEN ? kCannotOpen : kRegistryIoFailed;
+            const int error = systemError(connection);
+            return error == 0 ? StoreFault{status, path_, said} : refused(status, path_, error);
         }
     }
 }
