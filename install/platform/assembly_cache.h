@@ -20,13 +20,13 @@ class IAssemblyCache {
 public:
     virtual ~IAssemblyCache() = default;
 
-    // Takes the providers of that level out of the cache of every generation. None there, and the empty
-    // level, are success.
+    // Removes the providers of that level from the cache of every generation. Succeeds if there are none, and for
+    // the empty level.
     virtual Status deregisterProviders(std::string_view level) = 0;
 
-    // Places the location's providers in the caches asked for; `level` is what they are kept under where the
-    // files do not say it themselves. None to register is success. Any other status: not all of them were
-    // registered in all generations, for want of the framework as a rule; those that could be, are.
+    // Adds the location's providers to the caches of `generations`, under `level` if the files do not carry one
+    // themselves. Succeeds if there are none. On any other status some providers are missing in some generation,
+    // usually because the framework is not installed; the others are registered.
     virtual Status registerProviders(std::string_view location, std::string_view level,
                                      FrameworkGenerations generations) = 0;
 };

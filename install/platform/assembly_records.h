@@ -14,12 +14,12 @@ namespace kz7 {
 // Whether a file of a bin folder is a data provider.
 bool isProviderFile(std::string_view file);
 
-// Records every file for every generation asked for; the data is the file's path. Without files nothing is
-// made, not even the key.
+// Records every file for every generation in `generations`; the data is the file's path. Without files nothing is
+// created, not even the key.
 Status recordProviders(IRegistryStore& registry, std::string_view location, std::string_view level,
                        FrameworkGenerations generations, const std::vector<std::string>& files);
 
-// Deletes the records of that level; none, and the empty level, are success.
+// Deletes the records of that level. Succeeds if there are none, and for the empty level.
 Status dropProviders(IRegistryStore& registry, std::string_view level);
 
 }  // namespace kz7

@@ -9,11 +9,10 @@ class IDebugOutput {
 public:
     virtual ~IDebugOutput() = default;
 
-    // One message; it cannot fail. Where no debugger listens it is shown on standard error when
-    // KZ7_DEBUG=1 is set, and is silent otherwise.
+    // Sends one message; cannot fail. If KZ7_DEBUG=1 is set the message is also written to standard error.
     virtual void write(std::string_view text) = 0;
 
-    // False where it is known that nobody sees the messages: a caller with many need not compose them.
+    // False if nobody can see the messages, so that a caller with many of them need not compose them.
     virtual bool isHeard() const { return true; }
 };
 

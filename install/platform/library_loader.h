@@ -11,7 +11,7 @@ namespace kz7 {
 
 enum class LibraryHandle : std::uint64_t { none = 0 };
 
-// An entry point of whatever signature; the caller casts it to the one it knows.
+// An entry point of any signature; the caller casts it to the one it expects.
 using LibraryFunction = void (*)();
 
 // Outputs are written on success only. One thread.
@@ -19,12 +19,12 @@ class ILibraryLoader {
 public:
     virtual ~ILibraryLoader() = default;
 
-    // Loads the library and, from its own folder first, what it needs. Only an absolute path names one: the
-    // tool runs with every right, and nothing is taken from the folder it happens to be run in.
-    // kModuleNotFound: there is none, or the host cannot load it. The caller frees `library`.
+    // Loads the library and its dependencies, from the library's own folder first. Only an absolute path names a
+    // library: the tool runs with all rights and must load nothing from the current directory.
+    // kModuleNotFound: no library, or one that the host cannot load. The caller frees `library`.
     virtual Status load(std::string_view path, LibraryHandle& library) = 0;
 
-    // kProcedureNotFound: the library has no such entry point. `function` is good until the library is freed.
+    // kProcedureNotFound: the library has no such entry point. `function` is valid until the library is freed.
     virtual Status resolve(LibraryHandle library, std::string_view name, LibraryFunction& function) = 0;
 
     virtual Status free(LibraryHandle library) = 0;

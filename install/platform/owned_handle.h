@@ -1,4 +1,4 @@
-// One owner for every kind of port handle: closes what it holds on every path, moves, never copies.
+// The RAII owner of every kind of port handle. It moves and never copies.
 #pragma once
 
 #include <utility>
@@ -30,7 +30,7 @@ public:
     Handle get() const { return handle_; }
     explicit operator bool() const { return handle_ != Traits::kNone; }
 
-    // For an operation's output parameter; closes what was held before.
+    // For an output parameter; closes the held handle first.
     Handle& receive() {
         reset();
         return handle_;
@@ -42,8 +42,8 @@ public:
         }
     }
 
-    // Gives the handle up without closing it: it stays open to the end of the process. Only where the
-    // flow is meant to leave it open; the caller says why.
+    // Releases the handle without closing it: it stays open until the process ends. Only for a flow that leaves it
+    // open intentionally; the caller states the reason.
     void leaveOpen() { handle_ = Traits::kNone; }
 
 private:

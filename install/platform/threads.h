@@ -22,21 +22,21 @@ struct ThreadStart {
     }
 };
 
-// kInvalidHandle: a handle that is none or closed. One thread makes these calls.
+// kInvalidHandle: a closed handle or none. All calls come from one thread.
 class IThreads {
 public:
     virtual ~IThreads() = default;
 
-    // Starts a thread with a stack of `stackBytes` (0: the host's usual size), which takes no signals. The
-    // record is the new thread's on success and stays the caller's on failure. `id` tells the threads of this
-    // process apart. The caller closes `thread`.
+    // Starts a thread with a stack of `stackBytes` (0: the host's default) and all signals blocked. On success the
+    // new thread owns the record, on failure the caller does. `id` is unique in this process. The caller closes
+    // `thread`.
     virtual Status startThread(std::unique_ptr<ThreadStart>& record, std::uint32_t stackBytes, std::uint32_t& id,
                                ThreadHandle& thread) = 0;
 
-    // Waits until the thread has ended, any number of times; what it wrote is then seen.
+    // Waits until the thread has ended; its writes are then visible. May be called again.
     virtual Status waitThread(ThreadHandle thread) = 0;
 
-    // A thread that still runs, runs on.
+    // A thread that has not ended continues to run.
     virtual Status closeThread(ThreadHandle thread) = 0;
 };
 

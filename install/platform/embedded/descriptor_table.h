@@ -1,5 +1,5 @@
-// What the ports on POSIX give out instead of descriptors: tokens that are never used again. The number of a
-// descriptor that is closed could be anything next, the database too.
+// The handles that ports on POSIX return instead of descriptors: tokens that are never reused. The number of a closed
+// descriptor could next name any file, the database included.
 #pragma once
 
 #include <cstdint>
@@ -10,11 +10,11 @@
 
 namespace kz7 {
 
-// `Handle` is an enumeration of 64 bits. Used by any thread. It owns the descriptors that it holds.
+// `Handle` is a 64-bit enumeration. Thread-safe. Owns its descriptors.
 template <class Handle>
 class DescriptorTable {
 public:
-    // Tokens up to that number stand for something else.
+    // Tokens up to that number are reserved.
     explicit DescriptorTable(std::uint64_t taken = 0) : last_(taken) {}
 
     Handle give(OwnedDescriptor descriptor) {

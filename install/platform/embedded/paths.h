@@ -1,4 +1,4 @@
-// Where the product's paths lie on this host.
+// Maps product paths to host paths.
 #pragma once
 
 #include <string>
@@ -6,9 +6,9 @@
 
 namespace kz7 {
 
-// The host's path for one of the product's: `X:\a\b` lies in `<stateDirectory>/drive_x/a/b`, one that begins
-// with a separator is the host's own; backslashes separate in all of them. Empty for a path that names
-// nothing here: a relative one, an empty one, one that climbs out of a drive with "..", or one with a NUL.
+// `X:\a\b` maps to `<stateDirectory>/drive_x/a/b`; a path that begins with a separator is a host path. A backslash is a
+// separator in both. The result is empty for a path that names nothing: an empty or relative path, one that leaves a
+// drive through "..", or one with a NUL.
 std::string hostPath(std::string_view productPath, const std::string& stateDirectory);
 
 }  // namespace kz7
