@@ -150,7 +150,7 @@ void treeCopy(benchmark::State& state) {
     EmbeddedRegistry registry = openStore(scratch);
     for (auto step : state) {
         require(TreeCopy(registry).copy(KeyHandle::localMachine, "SOURCE", KeyHandle::localMachine, "TARGET", true) ==
-                1);
+                kSuccess);
     }
     state.SetItemsProcessed(state.range(1));
 }
@@ -197,7 +197,7 @@ void migrationThereAndBack(benchmark::State& state) {
     fill(scratch, static_cast<Shape>(state.range(0)), state.range(1));
     EmbeddedRegistry registry = openStore(scratch);
     require(TreeCopy(registry).copy(KeyHandle::localMachine, "SOURCE", KeyHandle::localMachine,
-                                    "SOFTWARE\\NVQ\\KZ7\\PROFILES", true) == 1 &&
+                                    "SOFTWARE\\NVQ\\KZ7\\PROFILES", true) == kSuccess &&
             deleteTree(registry, KeyHandle::localMachine, "SOURCE", 0, {}, {}) == kSuccess &&
             registry.commit() == kSuccess);
     const std::unique_ptr<IFileSystem> files = embeddedFiles(scratch.path());

@@ -17,16 +17,16 @@ TEST(RegistryAccess, ATreeCopyKeepsWhatIsThereUnlessToldAndEndsAtWhatDoesNotFit)
             machine.set(key, key[0] == 'F' ? "source" : "target", "kept");
         }
         const auto copy = [&] { return TreeCopy(machine.registry_).copy(kMachine, "From", kMachine, "To", overwrite); };
-        EXPECT_EQ(copy(), 1);
+        EXPECT_EQ(copy(), kSuccess);
         EXPECT_EQ(machine.values("To\\Sub"),
                   std::string("both=") + (overwrite ? "new" : "old") + "! source=kept! target=kept!");
         machine.set("From\\Large", "v", std::string(9'999, 'x'));
-        EXPECT_EQ(copy(), 1);
+        EXPECT_EQ(copy(), kSuccess);
         machine.set("From\\Large", "v", std::string(10'000, 'x'));
-        EXPECT_EQ(copy(), 0);
+        EXPECT_EQ(copy(), kMoreData);
         machine.set("From\\Sub", std::string(260, 'n'), "");
         machine.set("From\\Large", "v", "");
-        EXPECT_EQ(copy(), 0);
+        EXPECT_EQ(copy(), kMoreData);
     }
 }
 
@@ -57,6 +57,26 @@ TEST(RegistryAccess, ATreeDeletionSparesANameAndTheKeysAboveIt) {
             << row.why;
         EXPECT_EQ(machine.dump(), row.left == nullptr ? before : row.left) << row.why;
     }
+}
+
+TEST(RegistryAccess, ATreeDeletionReachesBelowThePathsThatFit) {
+    Machine machine;
+    machine.make("Beside");
+    OwnedKey key(machine.registry_);
+    machine.registry_.createKey(kMachine, "T", {}, kKeyFull, key.receive());
+    for (int level = 0; level < 20; ++level) {
+        for (const char* name : {"leaf", "spared"}) {
+            OwnedKey leaf(machine.registry_);
+            machine.registry_.createKey(key.get(), name, {}, kKeyFull, leaf.receive());
+        }
+        OwnedKey below(machine.registry_);
+        machine.registry_.createKey(key.get(), std::string(250, 'n'), {}, kKeyFull, below.receive());
+        key = std::move(below);
+    }
+    key.reset();
+    EXPECT_EQ(deleteTree(machine.registry_, kMachine, "T", 0, {}, "spared"), kAccessDenied);
+    EXPECT_EQ(deleteTree(machine.registry_, kMachine, "T", 0, {}, {}), kSuccess);
+    EXPECT_EQ(machine.dump(), "[Beside] \n");
 }
 
 TEST(RegistryAccess, ARefusalToReadAValueIsNoAbsence) {

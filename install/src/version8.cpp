@@ -40,8 +40,8 @@ constexpr std::array kLastDefault = {
 constexpr std::string_view kService = "KZ7MGMTSVC";
 
 void restoreBackup(IRegistryStore& registry, Report& report) {
-    if (TreeCopy(registry).copy(KeyHandle::localMachine, layout::kBackup, KeyHandle::localMachine, layout::kProduct,
-                                true) != 0) {
+    if (succeeded(TreeCopy(registry).copy(KeyHandle::localMachine, layout::kBackup, KeyHandle::localMachine,
+                                          layout::kProduct, true))) {
         deleteTree(registry, KeyHandle::localMachine, layout::kBackup, 0, {}, {});
     } else {
         report.error(kRestoreFailed, {layout::kBackup, layout::kProduct});
@@ -52,7 +52,7 @@ void restoreBackup(IRegistryStore& registry, Report& report) {
 Status writeDefaults(IRegistryStore& registry, Report& report, std::string_view location) {
     RowWriter writer(registry, report);
     Status status = writer.writeLayout(kDefaults, layout::kProduct, {}, location);
-    if (status == kSuccess) {
+    if (succeeded(status)) {
         status = writer.writeLayout(kLastDefault, layout::kProduct, {}, location);
         // Deliberate: the marker is a value, so sparing a subkey of its name spares nothing and the component
         // just written goes too. That is what makes a later migration take a new backup.
@@ -70,19 +70,21 @@ Status restoreVersion8(IRegistryStore& registry, IServiceManager& services, ICon
     restoreBackup(registry, report);
     const Status status = writeDefaults(registry, report, location);
 
+    // The success line comes before those of the service, and none of them may be printed before the commit.
     HeldConsole held;
     Report closing(held);
-    if (status == kSuccess) {
+    if (succeeded(status)) {
         closing.line(kDefaultsSet);
     } else {
-        closing.error(kDefaultsFailed);
-        closing.error(kLocationFailed);
+        report.error(kDefaultsFailed);
+        report.error(kLocationFailed);
     }
     switchOffService(services, closing, kService);
-    // Deliberate: a failed commit is the exit code, and the closing line is not told; the store has said why.
-    const Status kept = registry.commit();
-    held.release(console, kept == kSuccess);
-    return kept == kSuccess ? status : kept;
+    if (const Status committed = registry.commit(); !succeeded(committed)) {
+        return committed;
+    }
+    held.release(console);
+    return status;
 }
 
 }  // namespace kz7

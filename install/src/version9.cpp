@@ -36,15 +36,15 @@ bool isVersion9(IRegistryStore& registry) {
     OwnedKey components(registry);
     // Deliberate: the marker is looked for in the product's own components, while copies get it in theirs; so
     // every further migration takes a new backup over the old one.
-    return registry.openKey(KeyHandle::localMachine, layout::kComponents, kKeyQueryValue, components.receive()) ==
-               kSuccess &&
+    return succeeded(
+               registry.openKey(KeyHandle::localMachine, layout::kComponents, kKeyQueryValue, components.receive())) &&
            valueExists(registry, components.get(), layout::kVersion9Marker);
 }
 
 bool backUp(IRegistryStore& registry, Report& report) {
     report.line(kBackingUp);
-    if (TreeCopy(registry).copy(KeyHandle::localMachine, layout::kProduct, KeyHandle::localMachine, layout::kBackup,
-                                true) == 0) {
+    if (!succeeded(TreeCopy(registry).copy(KeyHandle::localMachine, layout::kProduct, KeyHandle::localMachine,
+                                           layout::kBackup, true))) {
         report.error(kBackupCopyFailed, {layout::kProduct, layout::kBackup});
         report.error(kBackupFailed);
         return false;
@@ -58,7 +58,7 @@ void copyProfile(IRegistryStore& registry, Report& report, std::string_view prof
                  const ErrorText& failed) {
     const std::string source = compose("%s\\%s", {layout::kBackup, profile});
     const std::string target = compose("%s\\%s\\%s", {layout::kCopies, kMigratedCopy, profile});
-    if (TreeCopy(registry).copy(KeyHandle::localMachine, source, KeyHandle::localMachine, target, false) != 0) {
+    if (succeeded(TreeCopy(registry).copy(KeyHandle::localMachine, source, KeyHandle::localMachine, target, false))) {
         report.line(copied);
     } else {
         report.error(failed);
@@ -80,16 +80,18 @@ void migrate(IRegistryStore& registry, IServiceManager& services, Report& report
         copyProfile(registry, report, "GLOBAL_PROFILE", kGlobalCopied, kGlobalFailed);
     }
     report.line(kCreating);
-    if (addCopy(registry, services, report, level, {kMigratedCopy, location, true}) != kSuccess) {
+    const CopyRequest request{kMigratedCopy, location, true};
+    if (!succeeded(addCopy(registry, services, report, level, request))) {
         report.error(kCopyFailed);
         return;
     }
+    reportAdded(report, request);
     if (!refresh) {
         copyProfile(registry, report, "PROFILES", kInstancesCopied, kInstancesFailed);
         copyProfile(registry, report, "DAS_PROFILES", kDasCopied, kDasFailed);
     }
     // The add has just made the service, so the start that is asked for here is not reached.
-    if (registerManagementService(registry, services, report, location, kMigratedCopy, true) == kSuccess) {
+    if (succeeded(registerManagementService(registry, services, report, location, kMigratedCopy, true))) {
         report.line(kConfigured);
     } else {
         report.bareError(kServiceFailed);

@@ -1,54 +1,82 @@
 #include "install/src/registry/registry_access.h"
 
+#include <utility>
+#include <vector>
+
 #include "install/src/registry/copy_name.h"
 
 namespace kz7 {
 namespace {
 
+constexpr std::size_t kMaxDepth = 1 << 16;  // levels below the first key; more are a cycle in a damaged store
+
+// Deletes a tree depth first. It holds a handle for each level, so that a subkey whose path does not fit can be reached
+// from the key above it. Iterative: the depth of a tree is input.
 class TreeDeletion {
 public:
     TreeDeletion(IRegistryStore& registry, KeyHandle root, AccessMask view, std::string_view copyName,
                  std::string_view spared)
         : registry_(registry), root_(root), view_(view), copyName_(copyName), spared_(spared) {}
 
-    // `path` is extended by every level below it and substituted again there, as it stands.
-    Status run(std::string& path) {
-        const std::string substituted = substituteCopyName(path, copyName_);
-        Status status = checkPathLength(substituted);
-        if (status != kSuccess) {
-            return status;
+    Status run(std::string_view path) {
+        Status status = open(path);
+        while (succeeded(status) && !levels_.empty()) {
+            Level& level = levels_.back();
+            status = registry_.enumerateKey(level.key.get(), level.index, name_, nullptr);
+            if (isEndOfItems(status)) {
+                status = deleteLast();
+            } else if (succeeded(status) && !spared_.empty() && spared_ == name_.view()) {
+                ++level.index;
+            } else if (succeeded(status)) {
+                status = open(name_.view());
+            }
         }
-        OwnedKey key(registry_);
-        status = registry_.openKey(root_, substituted, kKeyFull | view_, key.receive());
-        if (status != kSuccess) {
-            return status;
-        }
-        status = deleteSubkeys(key.get(), path);
-        key.reset();
-        return isEndOfItems(status) ? registry_.deleteKey(root_, substituted, view_) : status;
+        return status;
     }
 
 private:
-    // kNoMoreItems when none is left but the spared ones.
-    Status deleteSubkeys(KeyHandle key, std::string& path) {
-        const std::size_t length = path.size();
-        std::uint32_t index = 0;
-        for (;;) {
-            Status status = registry_.enumerateKey(key, index, name_, nullptr);
-            if (status != kSuccess) {
-                return status;
-            }
-            if (!spared_.empty() && spared_ == name_.view()) {
-                ++index;
-                continue;
-            }
-            path.append(1, '\\').append(name_.view());
-            status = run(path);
-            path.resize(length);
-            if (status != kSuccess) {
-                return status;
-            }
+    struct Level {
+        OwnedKey key;
+        KeyHandle parent;         // where `address` begins: the root, or the level above
+        std::string address;      // the substituted path, or the subkey's name if that path does not fit
+        std::size_t pathLength;   // of path_ without this level
+        std::uint32_t index = 0;  // of the subkeys to spare
+    };
+
+    // Opens the first key by its path, or a subkey of the last level.
+    Status open(std::string_view name) {
+        Level level{OwnedKey(registry_), root_, {}, path_.size()};
+        // Below a level whose path does not fit, none does.
+        if (levels_.empty() || levels_.back().parent == root_) {
+            path_.append(levels_.empty() ? "" : "\\").append(name);
+            level.address = substituteCopyName(path_, copyName_);
         }
+        const Status fits = level.address.empty() ? kFilenameExceedsRange : checkPathLength(level.address);
+        if (!succeeded(fits)) {
+            if (levels_.empty()) {
+                return fits;
+            }
+            level.parent = levels_.back().key.get();
+            level.address = name;
+        }
+        if (levels_.size() > kMaxDepth) {
+            return kRegistryCorrupt;
+        }
+        const Status status = registry_.openKey(level.parent, level.address, kKeyFull | view_, level.key.receive());
+        if (succeeded(status)) {
+            levels_.push_back(std::move(level));
+        }
+        return status;
+    }
+
+    // Deletes the key of the last level, which has no subkeys left but spared ones.
+    Status deleteLast() {
+        Level& level = levels_.back();
+        level.key.reset();
+        const Status status = registry_.deleteKey(level.parent, level.address, view_);
+        path_.resize(level.pathLength);
+        levels_.pop_back();
+        return status;
     }
 
     IRegistryStore& registry_;
@@ -56,6 +84,8 @@ private:
     AccessMask view_;
     std::string_view copyName_;
     std::string_view spared_;
+    std::string path_;  // unsubstituted, of the last level whose path fits
+    std::vector<Level> levels_;
     FixedBuffer<256> name_;
 };
 
@@ -69,15 +99,15 @@ Status checkPathLength(std::string_view path) {
 Status setText(IRegistryStore& registry, std::string_view path, std::string_view name, std::string_view data) {
     OwnedKey key(registry);
     Status status = checkPathLength(path);
-    if (status == kSuccess) {
+    if (succeeded(status)) {
         status = registry.createKey(KeyHandle::localMachine, path, {}, kKeyFull, key.receive());
     }
-    return status != kSuccess ? status : registry.setValue(key.get(), name, ValueType::sz, std::string(data) + '\0');
+    return succeeded(status) ? registry.setValue(key.get(), name, ValueType::sz, std::string(data) + '\0') : status;
 }
 
 Status queryText(IRegistryStore& registry, KeyHandle key, std::string_view name, Buffer& data) {
     const Status status = registry.queryValue(key, name, nullptr, data);
-    return status == kSuccess && data.text().size() == data.capacity ? kMoreData : status;
+    return succeeded(status) && data.text().size() == data.capacity ? kMoreData : status;
 }
 
 bool valueExists(IRegistryStore& registry, KeyHandle key, std::string_view name) {
@@ -85,8 +115,8 @@ bool valueExists(IRegistryStore& registry, KeyHandle key, std::string_view name)
     return !isNotFound(registry.queryValue(key, name, nullptr, probe));
 }
 
-int TreeCopy::copy(KeyHandle sourceRoot, std::string_view sourcePath, KeyHandle targetRoot, std::string_view targetPath,
-                   bool overwrite) {
+Status TreeCopy::copy(KeyHandle sourceRoot, std::string_view sourcePath, KeyHandle targetRoot,
+                      std::string_view targetPath, bool overwrite) {
     sourceRoot_ = sourceRoot;
     targetRoot_ = targetRoot;
     sourcePath_ = sourcePath;
@@ -94,52 +124,60 @@ int TreeCopy::copy(KeyHandle sourceRoot, std::string_view sourcePath, KeyHandle 
     return copyBelow(overwrite);
 }
 
-int TreeCopy::copyBelow(bool overwrite) {
+Status TreeCopy::copyBelow(bool overwrite) {
     OwnedKey source(registry_);
     OwnedKey target(registry_);
-    if (checkPathLength(sourcePath_) != kSuccess || checkPathLength(targetPath_) != kSuccess ||
-        registry_.openKey(sourceRoot_, sourcePath_, kKeyRead, source.receive()) != kSuccess ||
-        registry_.createKey(targetRoot_, targetPath_, {}, kKeyCopyTarget, target.receive()) != kSuccess) {
-        return 0;
+    Status status = checkPathLength(sourcePath_.size() > targetPath_.size() ? sourcePath_ : targetPath_);
+    if (succeeded(status)) {
+        status = registry_.openKey(sourceRoot_, sourcePath_, kKeyRead, source.receive());
     }
-    return copySubkeys(source.get(), target.get(), overwrite) && copyValues(source.get(), target.get(), overwrite);
+    if (succeeded(status)) {
+        status = registry_.createKey(targetRoot_, targetPath_, {}, kKeyCopyTarget, target.receive());
+    }
+    if (succeeded(status)) {
+        status = copySubkeys(source.get(), target.get(), overwrite);
+    }
+    return succeeded(status) ? copyValues(source.get(), target.get(), overwrite) : status;
 }
 
-int TreeCopy::copySubkeys(KeyHandle source, KeyHandle target, bool overwrite) {
+Status TreeCopy::copySubkeys(KeyHandle source, KeyHandle target, bool overwrite) {
     const std::size_t sourceLength = sourcePath_.size();
     const std::size_t targetLength = targetPath_.size();
     for (std::uint32_t index = 0;; ++index) {
-        const Status found = registry_.enumerateKey(source, index, name_, &class_);
-        if (found != kSuccess) {
-            return isEndOfItems(found);
+        Status status = registry_.enumerateKey(source, index, name_, &class_);
+        if (!succeeded(status)) {
+            return isEndOfItems(status) ? kSuccess : status;
         }
         OwnedKey made(registry_);
-        if (registry_.createKey(target, name_.view(), class_.view(), kKeyFull, made.receive()) != kSuccess) {
-            return 0;
+        status = registry_.createKey(target, name_.view(), class_.view(), kKeyFull, made.receive());
+        if (!succeeded(status)) {
+            return status;
         }
         made.reset();
         sourcePath_.append(1, '\\').append(name_.view());
         targetPath_.append(1, '\\').append(name_.view());
-        if (copyBelow(overwrite) == 0) {
-            return 0;
+        status = copyBelow(overwrite);
+        if (!succeeded(status)) {
+            return status;
         }
         sourcePath_.resize(sourceLength);
         targetPath_.resize(targetLength);
     }
 }
 
-int TreeCopy::copyValues(KeyHandle source, KeyHandle target, bool overwrite) {
+Status TreeCopy::copyValues(KeyHandle source, KeyHandle target, bool overwrite) {
     for (std::uint32_t index = 0;; ++index) {
         ValueType type{};
-        const Status found = registry_.enumerateValue(source, index, valueName_, &type, &data_);
-        if (found != kSuccess) {
-            return isEndOfItems(found);
+        Status status = registry_.enumerateValue(source, index, valueName_, &type, &data_);
+        if (!succeeded(status)) {
+            return isEndOfItems(status) ? kSuccess : status;
         }
         if (!overwrite && valueExists(registry_, target, valueName_.view())) {
             continue;
         }
-        if (registry_.setValue(target, valueName_.view(), type, data_.view()) != kSuccess) {
-            return 0;
+        status = registry_.setValue(target, valueName_.view(), type, data_.view());
+        if (!succeeded(status)) {
+            return status;
         }
     }
 }
@@ -149,8 +187,7 @@ Status deleteTree(IRegistryStore& registry, KeyHandle root, std::string_view pat
     if (path.empty()) {
         return kBadKey;
     }
-    std::string extended(path);
-    return TreeDeletion(registry, root, view, copyName, sparedSubkey).run(extended);
+    return TreeDeletion(registry, root, view, copyName, sparedSubkey).run(path);
 }
 
 }  // namespace kz7

@@ -27,15 +27,15 @@ class TreeCopy {
 public:
     explicit TreeCopy(IRegistryStore& registry) : registry_(registry) {}
 
-    // 1 on success, 0 on the first failure, which ends the copy: also a path over its 1,024 bytes, a name or
-    // value over the buffers, an enumeration that fails.
-    int copy(KeyHandle sourceRoot, std::string_view sourcePath, KeyHandle targetRoot, std::string_view targetPath,
-             bool overwrite);
+    // The first failure ends the copy and is its status: also a path over 1,023 bytes and a name or value that does not
+    // fit the buffers.
+    Status copy(KeyHandle sourceRoot, std::string_view sourcePath, KeyHandle targetRoot, std::string_view targetPath,
+                bool overwrite);
 
 private:
-    int copyBelow(bool overwrite);
-    int copySubkeys(KeyHandle source, KeyHandle target, bool overwrite);
-    int copyValues(KeyHandle source, KeyHandle target, bool overwrite);
+    Status copyBelow(bool overwrite);
+    Status copySubkeys(KeyHandle source, KeyHandle target, bool overwrite);
+    Status copyValues(KeyHandle source, KeyHandle target, bool overwrite);
 
     IRegistryStore& registry_;
     KeyHandle sourceRoot_ = KeyHandle::none;

@@ -16,7 +16,7 @@ constexpr ErrorText kWriteFailed{
 Status RowWriter::write(std::string_view path, std::string_view name, std::string_view data) {
     report_.line("Creating registry key %s under %s with value %s\n", {name, path, data});
     const Status status = setText(registry_, path, name, data);
-    if (status != kSuccess) {
+    if (!succeeded(status)) {
         report_.error(kWriteFailed, {name, path, data, status});
     }
     return status;
@@ -31,7 +31,7 @@ Status RowWriter::writeLayout(std::span<const LayoutRow> rows, std::string_view 
             path.append("\\").append(row.key);
         }
         status = write(substituteCopyName(path, copyName), row.name, row.data == kLocation ? location : row.data);
-        if (status != kSuccess) {
+        if (!succeeded(status)) {
             break;
         }
     }
