@@ -40,12 +40,12 @@ constexpr std::array kCopyRows = {
 
 // Gives a version name to the copy in both views and tells how each went.
 void setLevelAlias(IRegistryStore& registry, Report& report, std::string_view level, std::string_view copyName) {
-    if (setText(registry, layout::kCopies, level, copyName) == kSuccess) {
+    if (succeeded(setText(registry, layout::kCopies, level, copyName))) {
         report.line(kLevelSet, {level});
     } else {
         report.error(kLevelFailed);
     }
-    if (setText(registry, layout::kCopies32, level, copyName) == kSuccess) {
+    if (succeeded(setText(registry, layout::kCopies32, level, copyName))) {
         report.line(kLevel32Set, {level});
     } else {
         report.error(kLevel32Failed);
@@ -88,28 +88,24 @@ Status addCopy(IRegistryStore& registry, IServiceManager& services, Report& repo
     RowWriter writer(registry, report);
     const Status native = writer.writeLayout(kCopyRows, layout::kCopy, request.name, request.location);
     const Status other = writer.writeLayout(kCopyRows, layout::kCopy32, request.name, request.location);
-    Status status = native != kSuccess ? native : other;
-    if (status == kSuccess) {
+    Status status = succeeded(native) ? other : native;
+    if (succeeded(status)) {
         if (request.isV9) {
             nameByLevel(registry, report, level, request);
         }
         status = registerManagementService(registry, services, report, request.location, request.name, false);
-        if (status != kSuccess) {
+        if (!succeeded(status)) {
             report.line(kServiceFailed);
         }
     }
-    // As part of a migration the copy becomes visible with the rest of it.
-    // Deliberate: a failed commit counts as a failed write of the add; nothing of it is on disk, so it must not end
-    // as success.
-    if (const Status kept = request.isV9 ? kSuccess : registry.commit(); status == kSuccess) {
-        status = kept;
-    }
-    if (status != kSuccess) {
+    if (!succeeded(status)) {
         report.error(kAddFailed, {status});
-        return status;
     }
+    return status;
+}
+
+void reportAdded(Report& report, const CopyRequest& request) {
     report.line(kAdded, {request.name, request.location});
-    return kSuccess;
 }
 
 }  // namespace kz7

@@ -21,9 +21,11 @@ struct CopyRequest {
     bool isV9 = false;  // also names the copy as the default and by its level
 };
 
-// Returns the status of the step that failed; everything before it stays. The level is asked for with isV9
-// only. What was written is committed before the closing line; with isV9 that is left to the migration.
+// Returns the status of the step that failed, which is reported; everything before it stays. Queries the level with
+// isV9 only. The caller commits, and then prints the closing line with reportAdded().
 Status addCopy(IRegistryStore& registry, IServiceManager& services, Report& report, const LevelQuery& level,
                const CopyRequest& request);
+
+void reportAdded(Report& report, const CopyRequest& request);
 
 }  // namespace kz7

@@ -1,4 +1,4 @@
-// Keeps console lines back until what they tell about is on disk.
+// Holds console lines back until the changes that they report are committed.
 #pragma once
 
 #include <string>
@@ -21,13 +21,12 @@ public:
     }
     Status flush() override { return kSuccess; }
 
-    // Writes what was kept, each text to its stream, in order; drops what would have gone to standard output
-    // where it did not become true.
-    void release(IConsole& console, bool becameTrue) {
+    // Writes the held texts in order, each to its stream.
+    void release(IConsole& console) {
         for (const auto& [isError, text] : lines_) {
             if (isError) {
                 console.writeError(text);
-            } else if (becameTrue) {
+            } else {
                 console.writeOutput(text);
             }
         }

@@ -22,7 +22,7 @@ Status removeCopy(IRegistryStore& registry, IServiceManager& services, IDebugOut
     InstallCopyList copies(registry, debug, false, false);
     if (copies.findByName(copyName) == nullptr) {
         // A store that cannot be read is no answer to whether the copy is there.
-        if (const Status readable = registry.commit(); readable != kSuccess) {
+        if (const Status readable = registry.commit(); !succeeded(readable)) {
             return readable;
         }
         report.line(kNotFound, {std::string_view(copyName)});
@@ -33,16 +33,15 @@ Status removeCopy(IRegistryStore& registry, IServiceManager& services, IDebugOut
     if (copies.status() == 0 && copies.count() > 1) {
         deleteTree(registry, KeyHandle::localMachine, layout::kCopy, 0, copyName, {});
         const std::string copy = substituteCopyName(layout::kCopy, copyName);
-        if (checkPathLength(copy) == kSuccess) {
+        if (succeeded(checkPathLength(copy))) {
             registry.deleteKey(KeyHandle::localMachine, copy, 0);
         }
     } else {
         deleteTree(registry, KeyHandle::localMachine, layout::kProduct, 0, {}, {});
     }
     deleteServiceByName(services, managementServiceName(copyName).view());
-    // Deliberate: a failed commit is the exit code and nothing else; the store has told it on standard error.
-    if (const Status kept = registry.commit(); kept != kSuccess) {
-        return kept;
+    if (const Status committed = registry.commit(); !succeeded(committed)) {
+        return committed;
     }
     report.line(kRemoved, {std::string_view(copyName)});
     return kSuccess;

@@ -53,11 +53,7 @@ public:
             const std::string_view option = arguments[1];
             const bool withProviders = equalsIgnoreCase(option, "-addv9");
             if (withProviders || equalsIgnoreCase(option, "-addKZ7Copy")) {
-                const Status added =
-                    addCopy(platform_.registry(), platform_.services(), report_, {}, {arguments[2], arguments[3]});
-                // Deliberate: the copy's name is handed on where a location is expected, and what the add gave is
-                // dropped; the installer that still uses this option expects just that.
-                return withProviders ? registerProvidersOf(arguments[2]) : added;
+                return add({arguments[2], arguments[3]}, withProviders);
             }
         }
         // Deliberate: the usage names the two copy options only; the others are the installer's.
@@ -66,6 +62,19 @@ public:
     }
 
 private:
+    Status add(const CopyRequest& request, bool withProviders) {
+        const Status added = addCopy(platform_.registry(), platform_.services(), report_, {}, request);
+        if (const Status committed = platform_.registry().commit(); !succeeded(committed)) {
+            return committed;
+        }
+        if (succeeded(added)) {
+            reportAdded(report_, request);
+        }
+        // Deliberate: the registration gets the copy's name where it expects a location, and the result of the add is
+        // dropped; the installers that use "-addv9" expect both.
+        return withProviders ? registerProvidersOf(request.name) : added;
+    }
+
     std::string level(std::string_view location) {
         std::string text;
         queryLevel(platform_.libraries(), report_, location, text);

@@ -119,33 +119,46 @@ public:
         if (!succeeded(ports_.assemblies.deregisterProviders(level))) {
             report_.error(kNotDeregistered, {level});
         }
+        Status committed = kSuccess;
         if (succeeded(ports_.assemblies.registerProviders(location_, level, kFrameworkAll))) {
-            runCacheTool();
+            committed = runCacheTool();
         } else {
             report_.error(kNotInCache);
         }
         for (const ConfigurationProgram& program : kConfigurationPrograms) {
-            configure(program, level);
+            committed = succeeded(committed) ? configure(program, level) : committed;
+        }
+        if (!succeeded(committed)) {
+            return committed;
         }
         const Status rewritten = rewriteInstallCopiesProfile(ports_.registry, ports_.debug);
-        commit();
-        return succeeded(committed_) ? rewritten : committed_;
+        committed = ports_.registry.commit();
+        return succeeded(committed) ? rewritten : committed;
     }
 
 private:
-    void runCacheTool() {
+    // This and configure() return the status of the commit before their program: after a failed one nothing is
+    // started or printed.
+    Status runCacheTool() {
         const Command tool(compose(atRoot_ ? kCacheToolRoot : kCacheTool, {location_}));
         if (!succeeded(ports_.files.probe(tool.view()))) {
-            return;
+            return kSuccess;
         }
-        std::uint32_t exitCode = 0;  // the tool's own verdict is not asked for
+        if (const Status committed = ports_.registry.commit(); !succeeded(committed)) {
+            return committed;
+        }
+        std::uint32_t exitCode = 0;  // not judged
         const Status status = runProgram(Command(compose(kCacheToolRun, {tool.view(), location_})), exitCode);
         if (!succeeded(status)) {
             report_.error(kCacheToolFailed, {status});
         }
+        return kSuccess;
     }
 
-    void configure(const ConfigurationProgram& program, std::string_view level) {
+    Status configure(const ConfigurationProgram& program, std::string_view level) {
+        if (const Status committed = ports_.registry.commit(); !succeeded(committed)) {
+            return committed;
+        }
         Command command(
             compose(atRoot_ ? kConfigurationRoot : kConfiguration, {location_, program.name, level, location_}));
         command.append(program.lastArgument);
@@ -158,11 +171,11 @@ private:
             // Deliberate: what the program wrote is not shown; its error line has always stood alone.
             report_.error(program.refused, {exitCode});
         }
+        return kSuccess;
     }
 
-    // Runs a program to its end. It sees the registry as it is now, and its lines follow those told so far.
+    // Runs a program to its end. The flush puts its lines after those printed so far.
     Status runProgram(const Command& command, std::uint32_t& exitCode) {
-        commit();
         ports_.console.flush();
         QuietSink sink;
         InstallProcess process(ports_.processes, ports_.threads, sink, command.c_str());
@@ -171,16 +184,10 @@ private:
         return succeeded(executed) ? waited : executed;
     }
 
-    void commit() {
-        const Status status = ports_.registry.commit();
-        committed_ = succeeded(committed_) ? status : committed_;
-    }
-
     const ProviderPorts& ports_;
     Report report_;
     std::string_view location_;
     bool atRoot_;
-    Status committed_ = kSuccess;  // the first failure
 };
 
 }  // namespace

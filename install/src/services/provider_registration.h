@@ -33,8 +33,8 @@ struct ProviderPorts {
 // failure, which is reported, `level` stays as it was passed in.
 void queryLevel(ILibraryLoader& libraries, Report& report, std::string_view location, std::string& level);
 
-// The result is that of the alias rewrite; what comes before it is only reported. What was written is
-// committed before each program is started and at the end, and the first commit that failed is the result instead.
+// Returns the result of the alias rewrite; failures before it are only reported. Commits before each program is
+// started and at the end; a commit that fails ends the registration with its status.
 Status registerProviders(const ProviderPorts& ports, std::string_view location);
 
 }  // namespace kz7
