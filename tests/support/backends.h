@@ -69,6 +69,9 @@ HostPorts hostPorts(const std::string& place);
 std::string childProgram();
 extern const std::size_t kFloodMebibytes;
 
+// Whether a process of this host exits with a whole status, or with its low 8 bits.
+extern const bool kExitCodesAreWhole;
+
 void setSearchPath(const std::string& path);
 
 // For what a system shows only a moment later: that a thread, a child or a service has ended.

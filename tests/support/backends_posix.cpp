@@ -3,6 +3,7 @@
 namespace kz7::test {
 
 const std::size_t kFloodMebibytes = 100;
+const bool kExitCodesAreWhole = false;
 
 std::string childProgram() {
     return std::filesystem::read_symlink("/proc/self/exe").parent_path() / "kz7_child.exe";

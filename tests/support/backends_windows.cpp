@@ -5,6 +5,7 @@
 namespace kz7::test {
 
 const std::size_t kFloodMebibytes = 10;
+const bool kExitCodesAreWhole = true;
 
 std::string childProgram() {
     char path[MAX_PATH] = {};

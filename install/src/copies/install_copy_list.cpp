@@ -11,23 +11,22 @@
 namespace kz7 {
 
 InstallCopy::InstallCopy(IRegistryStore& registry, std::string_view copyName, bool view32, bool view64)
-    : copyName_(copyName), view32_(view32 ? kKeyView32 : 0), view64_(view64 ? kKeyView64 : 0) {
-    read(registry, copyName);
+    : name_(copyName),
+      copyName_(copyName),
+      version8_(equalsIgnoreCase(copyName, layout::kVersion8Copy)),
+      view32_(view32 ? kKeyView32 : 0),
+      view64_(view64 ? kKeyView64 : 0) {
+    read(registry);
 }
 
-void InstallCopy::read(IRegistryStore& registry, std::string_view copyName) {
-    version8_ = equalsIgnoreCase(copyName, layout::kVersion8Copy);
-    bool fits = keyPath_.assign(version8_ ? layout::kProduct : layout::kCopies);
-    if (!version8_) {
-        fits = fits && keyPath_.append("\\") && keyPath_.append(copyName);
-    }
+void InstallCopy::read(IRegistryStore& registry) {
+    const std::string base = version8_ ? std::string(layout::kProduct) : compose("%s\\%s", {layout::kCopies, name_});
+    keyPath_.assign(base);
     OwnedKey key(registry);
     FixedBuffer<256> path;
-    // A path that was cut would name another copy's key.
-    if (!fits ||
-        registry.openKey(KeyHandle::localMachine, keyPath(), kKeyQueryValue | view32_ | view64_, key.receive()) !=
-            kSuccess ||
-        queryText(registry, key.get(), layout::kPathName, path) != kSuccess) {
+    if (!succeeded(
+            registry.openKey(KeyHandle::localMachine, base, kKeyQueryValue | view32_ | view64_, key.receive())) ||
+        !succeeded(queryText(registry, key.get(), layout::kPathName, path))) {
         status_ = kUnreadable;
         return;
     }
@@ -38,26 +37,24 @@ void InstallCopy::read(IRegistryStore& registry, std::string_view copyName) {
     }
     installPath_.assign(kept);
 
-    const std::string base(keyPath());
-    perUser_ = registry.openKey(KeyHandle::localMachine, base + "\\Users", kKeyQueryValue, key.receive()) == kSuccess;
-    if (view32_ != 0 && registry.openKey(KeyHandle::localMachine, base + "\\Components", kKeyQueryValue | view32_,
-                                         key.receive()) != kSuccess) {
+    perUser_ = succeeded(registry.openKey(KeyHandle::localMachine, base + "\\Users", kKeyQueryValue, key.receive()));
+    if (view32_ != 0 && !succeeded(registry.openKey(KeyHandle::localMachine, base + "\\Components",
+                                                    kKeyQueryValue | view32_, key.receive()))) {
         status_ = kNoComponents;
     }
-    readComponents(registry);
+    readComponents(registry, base);
 }
 
-void InstallCopy::readComponents(IRegistryStore& registry) {
+void InstallCopy::readComponents(IRegistryStore& registry, const std::string& base) {
     OwnedKey key(registry);
     const KeyHandle root = perUser_ ? KeyHandle::currentUser : KeyHandle::localMachine;
     const AccessMask view = perUser_ ? view32_ : view32_ | view64_;
-    if (registry.openKey(root, compose("%s\\COMPONENTS", {keyPath()}), kKeyQueryValue | view, key.receive()) !=
-        kSuccess) {
+    if (!succeeded(registry.openKey(root, base + "\\COMPONENTS", kKeyQueryValue | view, key.receive()))) {
         return;
     }
     FixedBuffer<255> name;
     // An error ends the walk like its normal end: a name that fills the buffer would answer kMoreData for ever.
-    for (std::uint32_t index = 0; registry.enumerateValue(key.get(), index, name, nullptr, nullptr) == kSuccess;
+    for (std::uint32_t index = 0; succeeded(registry.enumerateValue(key.get(), index, name, nullptr, nullptr));
          ++index) {
         auto* kept = static_cast<char*>(std::malloc(name.size + 1));
         if (kept == nullptr) {
@@ -77,10 +74,11 @@ InstallCopyList::InstallCopyList(IRegistryStore& registry, IDebugOutput& debug, 
 bool InstallCopyList::hasVersion8(IRegistryStore& registry) const {
     OwnedKey key(registry);
     FixedBuffer<256> version;
-    return registry.openKey(KeyHandle::localMachine, layout::kCurrentVersion, kKeyQueryValue | view32_ | view64_,
-                            key.receive()) == kSuccess &&
-           queryText(registry, key.get(), "Version", version) == kSuccess &&
-           std::atoi(std::string(version.text()).c_str()) == 8;
+    return succeeded(registry.openKey(KeyHandle::localMachine, layout::kCurrentVersion,
+                                      kKeyQueryValue | view32_ | view64_, key.receive())) &&
+           succeeded(queryText(registry, key.get(), "Version", version)) &&
+           // Clamps a number that is too large; atoi() would wrap it around.
+           std::strtol(std::string(version.text()).c_str(), nullptr, 10) == 8;
 }
 
 void InstallCopyList::build(IRegistryStore& registry, IDebugOutput& debug) {
@@ -94,14 +92,14 @@ void InstallCopyList::build(IRegistryStore& registry, IDebugOutput& debug) {
         append(copy.release());
     }
     OwnedKey copies(registry);
-    if (registry.openKey(KeyHandle::localMachine, layout::kCopies,
-                         kKeyQueryValue | kKeyEnumerateSubkeys | view32_ | view64_, copies.receive()) != kSuccess) {
+    if (!succeeded(registry.openKey(KeyHandle::localMachine, layout::kCopies,
+                                    kKeyQueryValue | kKeyEnumerateSubkeys | view32_ | view64_, copies.receive()))) {
         return;
     }
     FixedBuffer<256> name;
     for (std::uint32_t index = 0;; ++index) {
         const Status found = registry.enumerateKey(copies.get(), index, name, nullptr);
-        if (found != kSuccess) {
+        if (!succeeded(found)) {
             status_ = isEndOfItems(found) ? status_ : 1;
             return;
         }
@@ -119,10 +117,10 @@ InstallCopy* InstallCopyList::findByName(const char* name) {
     if (name == nullptr) {
         return nullptr;
     }
-    const FixedText<65> searched{std::string_view(name)};
     saveCursor();
     InstallCopy* copy = first();
-    while (copy != nullptr && !equalsIgnoreCase(copy->copyName(), searched.view())) {
+    // By whole names: the first 64 characters of two copies may agree.
+    while (copy != nullptr && !equalsIgnoreCase(copy->name(), name)) {
         copy = next();
     }
     restoreCursor();

@@ -3,6 +3,7 @@
 #pragma once
 
 #include <cstdint>
+#include <string>
 #include <string_view>
 
 #include "install/platform/debug_output.h"
@@ -23,7 +24,8 @@ public:
     InstallCopy(IRegistryStore& registry, std::string_view copyName, bool view32, bool view64);
     virtual ~InstallCopy() = default;
 
-    std::string_view copyName() const { return copyName_.view(); }
+    std::string_view name() const { return name_; }
+    std::string_view copyName() const { return copyName_.view(); }  // cut to 64 characters
     std::string_view installPath() const { return installPath_.view(); }
     std::string_view keyPath() const { return keyPath_.view(); }
     bool isVersion8() const { return version8_; }
@@ -32,13 +34,14 @@ public:
     ILIST<char>& components() { return components_; }
 
 private:
-    void read(IRegistryStore& registry, std::string_view copyName);
-    void readComponents(IRegistryStore& registry);
+    void read(IRegistryStore& registry);
+    void readComponents(IRegistryStore& registry, const std::string& base);
 
+    std::string name_;
     FixedText<65> copyName_;
     FixedText<256> installPath_;
-    FixedText<256> keyPath_;
-    bool version8_ = false;
+    FixedText<256> keyPath_;  // for display; the key itself is opened by its whole path
+    bool version8_;
     bool perUser_ = false;
     AccessMask view32_;
     AccessMask view64_;
@@ -52,8 +55,8 @@ public:
     // debugger.
     InstallCopyList(IRegistryStore& registry, IDebugOutput& debug, bool view32, bool view64);
 
-    // The copy of that name without regard to case, the first 64 characters of both; null for none or a null
-    // name. A walk in progress stays where it is.
+    // The copy of that name, compared without regard to case; null for none or a null name. A walk in progress keeps
+    // its position.
     InstallCopy* findByName(const char* name);
 
     // 0 when the list was built completely, 1 when building failed part way.
