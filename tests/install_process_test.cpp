@@ -101,6 +101,10 @@ TEST_F(ScriptedProcess, TellsWhatWasNotExecutedWhatCouldNotBeAndWhatRunsOn) {
     EXPECT_EQ(ending(process, sink_), "5082 5082 ");
 
     host_.addProgram("t.exe", {.output = "dropped", .exitCode = 4, .runsOn = true});
+    process.setCommand(("t.exe " + std::string(772, 'a')).c_str());
+    process.execute(true, false);
+    EXPECT_EQ(ending(process, sink_), "5082 5082 ") << "a command line of 780 characters would be cut";
+    EXPECT_TRUE(host_.started.empty());
     process.setCommand("t.exe");
     EXPECT_EQ(ending(process, sink_), "5030 5030 ") << "another command is another run";
     process.execute(false, false);

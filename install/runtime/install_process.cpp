@@ -142,7 +142,7 @@ InstallProcess::InstallProcess(IProcessHost& host, IThreads& threads, IReportSin
       workingDirectory_(workingDirectory != nullptr ? std::make_unique<std::string>(workingDirectory) : nullptr),
       spare_(spare) {
     if (build(command) == kNoProgramType) {
-        commandLine_.assign(command);
+        setCommandLine(command);
     }
 }
 
@@ -155,7 +155,14 @@ std::string_view InstallProcess::lastMessage() {
 }
 
 Status InstallProcess::buildCommandLine(IProcessHost& host, CommandLine& commandLine, std::string_view command) {
-    commandLine.assign({});
+    std::string whole;
+    const Status status = wholeCommandLine(host, whole, command);
+    commandLine.assign(whole);
+    return status;
+}
+
+Status InstallProcess::wholeCommandLine(IProcessHost& host, std::string& commandLine, std::string_view command) {
+    commandLine.clear();
     for (const ProgramType& type : kProgramTypes) {
         const std::size_t found = findIgnoringCase(command, type.ending);
         if (found == std::string_view::npos) {
@@ -173,7 +180,7 @@ Status InstallProcess::buildCommandLine(IProcessHost& host, CommandLine& command
             FixedBuffer<kShortPathSize> shortened;
             // Deliberate: a leading quotation mark goes into the shortening, which then finds no such file
             // and leaves the text alone; the closing mark that follows makes it whole again.
-            if (host.shortPath(commandLine.view(), shortened) == kSuccess) {
+            if (host.shortPath(commandLine, shortened) == kSuccess) {
                 commandLine.assign(shortened.view());
             }
         }
@@ -185,20 +192,24 @@ Status InstallProcess::buildCommandLine(IProcessHost& host, CommandLine& command
 
 // The command line of the object: kNoProgramType leaves it empty.
 Status InstallProcess::build(const char* command) {
-    commandLine_.assign({});
+    setCommandLine({});
     if (command == nullptr) {
         return kSuccess;
     }
-    if (!wrapperMode_) {
+    std::string whole;
+    const Status status = wholeCommandLine(host_, whole, wrapperMode_ ? kWrapperProgram : std::string_view(command));
+    if (wrapperMode_) {
+        statement_.assign(command);
+        whole.append(wrapperSwitch_ ? " -a -v \"" : " -ec -v \"").append(command).append("\"");
+    } else {
         timeout_ = kInfiniteWait;
-        return buildCommandLine(host_, commandLine_, command);
     }
-    statement_.assign(command);
-    const Status status = buildCommandLine(host_, commandLine_, kWrapperProgram);
-    commandLine_.append(wrapperSwitch_ ? " -a -v \"" : " -ec -v \"");
-    commandLine_.append(statement_.view());
-    commandLine_.append("\"");
+    setCommandLine(whole);
     return status;
+}
+
+void InstallProcess::setCommandLine(std::string_view whole) {
+    commandLineCut_ = !commandLine_.assign(whole);
 }
 
 void InstallProcess::setCommand(const char* command) {
@@ -230,7 +241,8 @@ Status InstallProcess::run(bool wait) {
     const Status status = startReader(errorReadEnd, standardErrorText_, errorReader_);
     const ProcessStart start{commandLine_.view(), workingDirectory_ ? std::string_view(*workingDirectory_) : "",
                              outputWriteEnd_.get(), errorWriteEnd_.get()};
-    const Status created = host_.startProcess(start, process_);
+    // Deliberate: a command line that was cut is not run; it would do something else than what was asked for.
+    const Status created = commandLineCut_ ? kFilenameExceedsRange : host_.startProcess(start, process_);
     if (wait) {
         waitOrWake();
     }

@@ -52,8 +52,9 @@ public:
     Status execute(bool wait, bool trace);
 
     // Waits for the program and its readers. kNotExecuted; kExitCodeUnavailable: the program could not be
-    // started; `exitCode` is then that status too, so that it never reads as a success. After the timeout, in
-    // milliseconds, the readers are stopped, and the exit code is what the system tells of a running program.
+    // started, or its command line was cut; `exitCode` is then that status too, so that it never reads as a success.
+    // After the timeout, in milliseconds, the readers are stopped, and the exit code is what the system tells of a
+    // running program.
     Status waitForCompletion(std::uint32_t& exitCode, std::uint32_t timeout);
 
     // Copies what was captured, cut to `size` bytes with a terminator in the last one. kBufferTooSmall: the
@@ -83,7 +84,9 @@ private:
     struct Reader;
     using Collected = std::shared_ptr<CollectedText>;
 
+    static Status wholeCommandLine(IProcessHost& host, std::string& commandLine, std::string_view command);
     Status build(const char* command);
+    void setCommandLine(std::string_view whole);
     Status run(bool wait);
     Status openPipes(OwnedStream& outputEnd, OwnedStream& errorEnd);
     Status startReader(OwnedStream& readEnd, Collected& text, ThreadRecord& record);
@@ -102,6 +105,7 @@ private:
 
     CommandLine commandLine_;
     CommandLine statement_;
+    bool commandLineCut_ = false;
 
 protected:
     // What is reported in place of the exit code where the text is not empty.
