@@ -23,6 +23,11 @@ Status checkValueName(std::string_view name);
 // to its Wow6432Node, unless the path goes there already.
 std::string plainKeyPath(KeyHandle parent, std::string_view path, AccessMask access);
 
+// The rights of a handle on a store whose callers may do everything.
+constexpr AccessMask grantedAccess(AccessMask access) {
+    return (access & kKeyMaximumAllowed) == 0 ? access : access | kKeyFull;
+}
+
 // Gives a name to a lent buffer with its NUL: kMoreData when that does not fit.
 Status giveName(std::string_view name, Buffer& buffer);
 

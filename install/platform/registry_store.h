@@ -32,6 +32,7 @@ inline constexpr AccessMask kKeyCopyTarget       = 0x20007;
 inline constexpr AccessMask kKeyRead             = 0x20019;
 inline constexpr AccessMask kKeyReadSet          = 0x2001B;
 inline constexpr AccessMask kKeyFull             = 0xF003F;
+inline constexpr AccessMask kKeyMaximumAllowed   = 0x2000000;  // every right that the caller has on the key
 // clang-format on
 
 enum class ValueType : std::uint32_t {

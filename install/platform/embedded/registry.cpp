@@ -220,7 +220,7 @@ KeyHandle EmbeddedRegistry::giveOut(KeyId id, AccessMask access) {
     open_[slot] = OpenKey{};
     open_[slot].used = true;
     open_[slot].generation = generation;
-    open_[slot].access = access;
+    open_[slot].access = grantedAccess(access);
     open_[slot].id = id;
     open_[slot].checkedIn = transaction_;
     return static_cast<KeyHandle>(std::uint64_t{generation} << 32 | slot);

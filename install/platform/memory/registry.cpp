@@ -83,7 +83,7 @@ Status MemoryRegistry::find(KeyHandle parent, std::string_view path, AccessMask 
 
 KeyHandle MemoryRegistry::giveOut(NodePointer node, AccessMask access) {
     const auto handle = static_cast<KeyHandle>(++lastHandle_);
-    open_.emplace(handle, OpenKey{std::move(node), access});
+    open_.emplace(handle, OpenKey{std::move(node), grantedAccess(access)});
     return handle;
 }
 

@@ -183,7 +183,9 @@ Status WindowsRegistry::deleteKey(KeyHandle parent, std::string_view path, Acces
     if (const Status status = shorten(parent, path, view, false, base); status != kSuccess) {
         return status;
     }
-    return statusOf(RegDeleteKeyExA(native(parent), std::string(path).c_str(), view, 0));
+    const std::string named(path);
+    return statusOf(view == 0 ? RegDeleteKeyA(native(parent), named.c_str())
+                              : RegDeleteKeyExA(native(parent), named.c_str(), view, 0));
 }
 
 }  // namespace kz7

@@ -37,7 +37,7 @@ FilePath binPath(std::string_view location, std::string_view file) {
 Status createService(IServiceManager& services, Report& report, std::string_view location, std::string_view copyName) {
     OwnedService manager(services);
     Status status = services.openManager(kServiceManagerAllAccess, manager.receive());
-    if (status != kSuccess) {
+    if (!succeeded(status)) {
         report.error(kCreateManagerFailed, {status});
         return status;
     }
@@ -47,7 +47,7 @@ Status createService(IServiceManager& services, Report& report, std::string_view
     OwnedService service(services);
     status =
         services.createService(manager.get(), {name.view(), displayName.view(), program.view()}, service.receive());
-    if (status != kSuccess && status != kServiceExists) {
+    if (!succeeded(status) && status != kServiceExists) {
         report.error(kCreateFailed, {status});
     }
     return status;
@@ -55,20 +55,20 @@ Status createService(IServiceManager& services, Report& report, std::string_view
 
 Status registerEventSource(IRegistryStore& registry, Report& report, std::string_view location) {
     OwnedKey key(registry);
-    Status status = registry.createKey(KeyHandle::localMachine, kEventLogKey, {}, kKeyFull, key.receive());
-    if (status != kSuccess) {
+    Status status = registry.createKey(KeyHandle::localMachine, kEventLogKey, {}, kKeyMaximumAllowed, key.receive());
+    if (!succeeded(status)) {
         report.error(kEventLogKeyFailed, {status});
         return status;
     }
     std::string messageFile(binPath(location, "kz7wint64.dll").view());
     messageFile += '\0';
     status = registry.setValue(key.get(), "EventMessageFile", ValueType::expandSz, messageFile);
-    if (status != kSuccess) {
+    if (!succeeded(status)) {
         report.error(kMessageFileFailed, {status});
         return status;
     }
     status = registry.setValue(key.get(), "TypesSupported", ValueType::dword, std::string_view("\7\0\0\0", 4));
-    if (status != kSuccess) {
+    if (!succeeded(status)) {
         report.error(kTypesFailed, {status});
     }
     return status;
@@ -79,14 +79,14 @@ Status openWithStartType(IServiceManager& services, Report& report, std::string_
                          OwnedService& service) {
     OwnedService manager(services);
     Status status = services.openManager(kServiceManagerAllAccess, manager.receive());
-    if (status != kSuccess) {
+    if (!succeeded(status)) {
         report.error(kServiceManagerFailed, {status});
         return status;
     }
     status = services.openService(manager.get(), name, kServiceAllAccess, service.receive());
-    if (status != kSuccess) {
+    if (!succeeded(status)) {
         report.error(kServiceOpenFailed, {name, status});
-    } else if (const Status changed = services.changeStartType(service.get(), start); changed != kSuccess) {
+    } else if (const Status changed = services.changeStartType(service.get(), start); !succeeded(changed)) {
         report.error(kStartTypeFailed, {name, changed});
     }
     // Deliberate: the handles of a start or a switch-off stay open to the end of the process, which holds off
@@ -98,14 +98,14 @@ Status openWithStartType(IServiceManager& services, Report& report, std::string_
 Status startService(IServiceManager& services, Report& report, std::string_view name) {
     OwnedService service(services);
     Status status = openWithStartType(services, report, name, ServiceStart::automatic, service);
-    if (status != kSuccess) {
+    if (!succeeded(status)) {
         return status;
     }
     status = services.startService(service.get());
     if (status == kServiceAlreadyRunning) {
         status = kSuccess;
     }
-    if (status != kSuccess) {
+    if (!succeeded(status)) {
         report.error(kStartFailed, {name, status});
     }
     service.leaveOpen();
@@ -126,12 +126,12 @@ Status registerManagementService(IRegistryStore& registry, IServiceManager& serv
     if (status == kServiceExists) {
         return kSuccess;
     }
-    if (status == kSuccess) {
+    if (succeeded(status)) {
         status = registerEventSource(registry, report, location);
     }
-    if (status == kSuccess && start) {
+    if (succeeded(status) && start) {
         status = startService(services, report, managementServiceName(copyName).view());
-        if (status != kSuccess) {
+        if (!succeeded(status)) {
             report.line(kNotStarted);
         }
     }
@@ -140,14 +140,13 @@ Status registerManagementService(IRegistryStore& registry, IServiceManager& serv
 
 void switchOffService(IServiceManager& services, Report& report, std::string_view name) {
     OwnedService service(services);
-    if (openWithStartType(services, report, name, ServiceStart::demand, service) != kSuccess) {
+    if (!succeeded(openWithStartType(services, report, name, ServiceStart::demand, service))) {
         return;
     }
     // Deliberate: the platform's result of the stop is judged inverted; a stop that succeeds is told as
     // error 1, one that fails not at all. Logs of every switch-off so far read that way.
-    const std::uint32_t result = services.stopService(service.get()) == kSuccess ? 1 : 0;
-    if (result != 0) {
-        report.error(kStopFailed, {name, result});
+    if (succeeded(services.stopService(service.get()))) {
+        report.error(kStopFailed, {name, std::uint32_t{1}});
     }
     service.leaveOpen();
 }
@@ -156,10 +155,10 @@ Status deleteServiceByName(IServiceManager& services, std::string_view name) {
     OwnedService manager(services);
     OwnedService service(services);
     Status status = services.openManager(kServiceManagerAllAccess, manager.receive());
-    if (status == kSuccess) {
+    if (succeeded(status)) {
         status = services.openService(manager.get(), name, kServiceAllAccess, service.receive());
     }
-    if (status != kSuccess) {
+    if (!succeeded(status)) {
         return status == kServiceDoesNotExist ? kSuccess : status;
     }
     // One that does not run, or will not stop, is deleted all the same.
