@@ -1,7 +1,8 @@
 #include "install/platform/embedded/ports.h"
 
 #include <cstdlib>
-#include <string>
+
+#include "install/platform/shown_text.h"
 
 #include "install/platform/shown_text.h"
 

@@ -5,6 +5,8 @@
 #include <cstdlib>
 #include <string>
 
+#include "install/platform/shown_text.h"
+
 namespace kz7 {
 
 WindowsDebugOutput::WindowsDebugOutput(IConsole& console) : console_(console) {
@@ -15,7 +17,7 @@ WindowsDebugOutput::WindowsDebugOutput(IConsole& console) : console_(console) {
 void WindowsDebugOutput::write(std::string_view text) {
     OutputDebugStringA(std::string(text).c_str());
     if (shown_) {
-        console_.writeError("debug: " + std::string(text) + "\n");
+        console_.writeError("debug: " + shownText(text) + "\n");
     }
 }
 
