@@ -69,6 +69,21 @@ TEST_F(ProviderProgram, ErrorsStandBetweenTheLinesThatTheyBelongTo) {
     EXPECT_TRUE(both(" -v8 'C:\\KZ8'").output.starts_with("Creating version 8 registry\n" + kPrefix + "1466: "));
 }
 
+TEST_F(ProviderProgram, LostOutputAndHostileTextsAreOneLineEach) {
+    const auto both = [&](const std::string& command, const std::string& directory) {
+        return runProgram({"/bin/sh", "-c", programPath("kz7InstallReg") + command},
+                          {{"KZ7_STATE_DIR=" + directory}, {}});
+    };
+    const ProgramResult full = both(" -addKZ7Copy C 'C:\\c' >/dev/full", store_.path());
+    EXPECT_EQ(full.exitCode, 0);
+    EXPECT_EQ(full.error, "kz7InstallReg: cannot write standard output: error 112\n");
+    EXPECT_EQ(both(" -removeKZ7Copy NONE 2>&1 | true", store_.path()).error, "") << "a reader that is gone";
+    const std::string hostile = store_.file("\x1b[2J\xD8\x9C");
+    overwrite(hostile, "");
+    const ProgramResult escaped = both(" -removeKZ7Copy C", hostile);
+    EXPECT_NE(escaped.error.find("/\\x1b[2J\\u061c"), std::string::npos) << escaped.error;
+}
+
 TEST_F(ProviderProgram, NothingIsTakenFromTheCurrentFolder) {
     const std::string parent = store_.file("drive_c");
     const ProgramResult result = store_.tool({"-addv9", "KZ7", "C:\\KZ7"},
@@ -95,7 +110,9 @@ TEST_F(ProviderProgram, CopiesAreShownWithTheirServicesAndAliasesWithWhatIsWrong
         "\"vee\"\n\"" +
         std::string(100, 'x') +
         "\"=\"\"\n\"8.1\"=\"GONE\"\n\"8.3\"=\"GONE\"\n"
-        "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies]\n\"8.3\"=\"GONE\"\n"
+        "[HKEY_LOCAL_MACHINE\\SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies]\n\"8.3\"=\"GONE\"\n\"large\"=\"" +
+        std::string(1 << 20, 'x') +
+        "\"\n"
         "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies\\five\\CurrentVersion]\n"
         "\"Version\"=\"9\"\n\"Release\"=\"8\"\n\"Modification\"=\"0\"\n\"Fix Level\"=\"0.1\"\n"
         "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies\\vee\\CurrentVersion]\n"

@@ -8,7 +8,7 @@ namespace {
 
 class StandardConsole final : public IConsole {
 public:
-    Status writeOutput(std::string_view text) override { return write(stdout, text); }
+    Status writeOutput(std::string_view text) override { return noteOutput(write(stdout, text)); }
 
     Status writeError(std::string_view text) override {
         flush();
@@ -17,13 +17,20 @@ public:
         return std::fflush(stderr) == 0 ? status : kWriteFault;
     }
 
-    Status flush() override { return std::fflush(stdout) == 0 ? kSuccess : lastStatus(); }
+    Status flush() override { return noteOutput(std::fflush(stdout) == 0 ? kSuccess : lastStatus()); }
 
 private:
     static Status write(std::FILE* stream, std::string_view text) {
         return std::fwrite(text.data(), 1, text.size(), stream) == text.size() ? kSuccess : lastStatus();
     }
     static Status lastStatus() { return errno == EPIPE ? kPipeClosing : errno == ENOSPC ? kDiskFull : kWriteFault; }
+
+    Status noteOutput(Status status) {
+        output_ = succeeded(output_) ? status : output_;
+        return output_;
+    }
+
+    Status output_ = kSuccess;  // the first failure: text that was buffered before it is lost
 };
 
 }  // namespace

@@ -20,6 +20,7 @@ public:
     // Flushes standard output first, so that both in one file keep their order.
     virtual Status writeError(std::string_view text) = 0;
 
+    // The first failure of standard output so far, if any: kPipeClosing for a reader that is gone.
     virtual Status flush() = 0;
 };
 
