@@ -41,12 +41,19 @@ Status readValues(IRegistryStore& registry, std::string_view path, std::size_t v
     OwnedKey key(registry);
     Status status = registry.openKey(KeyHandle::localMachine, path, kKeyRead, key.receive());
     FixedBuffer<kMaxValueName + 1> name;
-    std::string room(1 << 20, '\0');
-    Buffer data(room.data(), static_cast<std::uint32_t>(room.size()));
+    std::string room(1 << 12, '\0');
     bool walked = true;
-    for (std::uint32_t index = 0;
-         succeeded(status) && succeeded(status = registry.enumerateValue(key.get(), index, name, nullptr, &data));
-         ++index) {
+    for (std::uint32_t index = 0; succeeded(status); ++index) {
+        Buffer data(room.data(), static_cast<std::uint32_t>(room.size()));
+        status = registry.enumerateValue(key.get(), index, name, nullptr, &data);
+        if (status == kMoreData && data.size > data.capacity) {
+            room.resize(data.size);
+            data = Buffer(room.data(), data.size);
+            status = registry.enumerateValue(key.get(), index, name, nullptr, &data);
+        }
+        if (!succeeded(status)) {
+            break;
+        }
         walked = walked && name.text().size() < kAliasNameRoom;
         AliasRow& row = rowOf(rows, name.text());
         row.names[view] = data.text();
