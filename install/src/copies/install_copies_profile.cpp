@@ -36,6 +36,58 @@ struct IgnoringCase {
 };
 using AliasesIgnoringCase = std::pmr::unordered_set<const Alias*, IgnoringCase, IgnoringCase>;
 
+// Computes the aliases of version texts that are added in descending order: the first copy that matches a prefix is the
+// highest.
+class AliasComputation {
+public:
+    AliasComputation(AliasMap& aliases, std::size_t versions) : aliases_(aliases) { matched_.reserve(versions); }
+
+    void add(std::string_view text, const std::string& name) {
+        const auto letter = static_cast<std::size_t>(std::find_if(text.begin(), text.end(), isLetter) - text.begin());
+        // Texts that begin with one prefix and a dot are adjacent: the greater text has added what both have.
+        const std::size_t shared = commonLength(text, greater_);
+        while (!open_.empty() && open_.back()->first.size() >= shared) {
+            open_.pop_back();
+        }
+        for (std::size_t end = open_.empty() ? 0 : open_.back()->first.size() + 1; end <= text.size(); ++end) {
+            end = std::min(text.find('.', end), text.size());
+            addPrefix(text.substr(0, end), end == text.size(), end > letter, name);
+        }
+        greater_ = text;
+    }
+
+    // Looks up the prefixes that only a copy spelled in other letters may match.
+    void finish() {
+        for (const auto& alias : unmatched_) {
+            if (const auto first = matched_.find(&*alias); first != matched_.end()) {
+                alias->second = (*first)->second;
+            }
+        }
+    }
+
+private:
+    void addPrefix(std::string_view prefix, bool isText, bool hasLetter, const std::string& name) {
+        const auto place = open_.empty() ? aliases_.begin() : std::next(open_.back());
+        const auto alias = aliases_.try_emplace(place, std::string(prefix));
+        open_.push_back(alias);
+        // Deliberate: the fourth prefix matches exactly that version only, so that a version of five components gets
+        // two empty aliases; a prefix that no copy matches is written all the same.
+        if ((open_.size() == kWholeVersion) == isText) {
+            const Alias* first = hasLetter ? *matched_.insert(&*alias).first : &*alias;
+            alias->second = first == &*alias ? name : first->second;
+        } else if (hasLetter) {
+            unmatched_.push_back(alias);
+        }
+    }
+
+    AliasMap& aliases_;
+    std::pmr::monotonic_buffer_resource room_;
+    AliasesIgnoringCase matched_{&room_};        // those with letters, in the spelling that was matched first
+    std::vector<AliasMap::iterator> unmatched_;  // that a copy spelled in other letters may match
+    std::vector<AliasMap::iterator> open_;       // the prefixes of the greater text
+    std::string_view greater_;
+};
+
 }  // namespace
 
 bool isAliasName(std::string_view name) {
@@ -119,43 +171,11 @@ Status InstallCopiesProfile::generateInstallCopiesList() {
 
 Status InstallCopiesProfile::generateProfileInfo() {
     profileInfo_.clear();
-    std::pmr::monotonic_buffer_resource room;
-    AliasesIgnoringCase answered(&room);  // those with letters, in the spelling that was answered first
-    answered.reserve(copiesByVersion_.size());
-    std::vector<AliasMap::iterator> unanswered;  // that a copy spelled in other letters may answer
-    std::vector<AliasMap::iterator> open;        // the prefixes of one text
-    std::string_view greater;
-    // From the greatest text down: the first copy that answers to a prefix is the highest.
+    AliasComputation computation(profileInfo_, copiesByVersion_.size());
     for (auto version = copiesByVersion_.rbegin(); version != copiesByVersion_.rend(); ++version) {
-        const std::string_view text = version->first;
-        const auto letter = static_cast<std::size_t>(std::find_if(text.begin(), text.end(), isLetter) - text.begin());
-        // What lies behind a prefix and a dot lies together: the greater text has answered to what both have.
-        const std::size_t shared = commonLength(text, greater);
-        while (!open.empty() && open.back()->first.size() >= shared) {
-            open.pop_back();
-        }
-        for (std::size_t end = open.empty() ? 0 : open.back()->first.size() + 1; end <= text.size(); ++end) {
-            end = std::min(text.find('.', end), text.size());
-            const auto place = open.empty() ? profileInfo_.begin() : std::next(open.back());
-            const auto alias = profileInfo_.try_emplace(place, std::string(text.substr(0, end)));
-            open.push_back(alias);
-            const bool hasLetter = end > letter;
-            // Deliberate: the fourth prefix is answered by exactly that version, so that one of five components gets
-            // two empty aliases; what finds nothing is written all the same.
-            if ((open.size() == kWholeVersion) == (end == text.size())) {
-                const Alias* first = hasLetter ? *answered.insert(&*alias).first : &*alias;
-                alias->second = first == &*alias ? version->second : first->second;
-            } else if (hasLetter) {
-                unanswered.push_back(alias);
-            }
-        }
-        greater = text;
+        computation.add(version->first, version->second);
     }
-    for (const auto& alias : unanswered) {
-        if (const auto first = answered.find(&*alias); first != answered.end()) {
-            alias->second = (*first)->second;
-        }
-    }
+    computation.finish();
     tellProfile();
     return kSuccess;
 }
