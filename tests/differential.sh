@@ -105,11 +105,15 @@ same 'a name that is the token'              -addKZ7Copy '$CurrentInstallationNa
 same 'a location that holds the token'       -addKZ7Copy TOKEN 'C:\$CurrentInstallationName$'
 same 'a name of 64 characters'               -addKZ7Copy "$(long 64)" 'C:\KZ7\64'
 same 'a name of 65, alike in 64'             -addKZ7Copy "$(long 65)" 'C:\KZ7\65'
+same 'removal of one alike in 64 only'       -removeKZ7Copy "$(long 66)"
 same 'removal of it'                         -removeKZ7Copy "$(long 65)"
 same 'a name of 255 characters'              -addKZ7Copy "$(long 255 k)" 'C:\KZ7\255'
+same 'a second one alike in 64'              -addKZ7Copy "$(long 254 k)" 'C:\KZ7\254'
+same 'removal of the first'                  -removeKZ7Copy "$(long 255 k)"
 same 'a name of 256 characters'              -addKZ7Copy "$(long 256 m)" 'C:\KZ7\256'
 same 'a path over 1,024 characters'          -addKZ7Copy "$(long 1000 p)" 'C:\KZ7\1000'
 same 'a location of 300 characters'          -addKZ7Copy LONG "C:\\$(long 300)"
+same 'a program that would be cut'           -dotnet "C:\\$(long 760)"
 same 'an empty location'                     -addKZ7Copy NOWHERE ''
 same 'an empty name'                         -addKZ7Copy '' 'C:\KZ7\empty'
 same 'removal of an empty name'              -removeKZ7Copy ''
