@@ -1,5 +1,5 @@
-// Where the product's keys lie. Paths are below HKEY_LOCAL_MACHINE; the 32-bit view is addressed by its
-// literal path, never by a view flag.
+// The paths of the product's keys below HKEY_LOCAL_MACHINE. The 32-bit view is addressed by its literal path, never by
+// a view flag.
 #pragma once
 
 #include <string_view>

@@ -8,8 +8,8 @@ namespace {
 constexpr std::string_view kCurrentName = "$CurrentInstallationName$";
 constexpr std::string_view kDefaultName = "$DefaultInstallationName$";
 
-// Deliberate: one buffer for the whole process; callers that pass no output of their own share it, and a
-// later call overwrites what an earlier one returned.
+// Deliberate: one buffer for the process; callers without an output of their own share it, and a later call overwrites
+// an earlier result.
 FixedText<kSubstitutedSize> sharedOutput;
 
 // Copies a text into a caller's buffer, cut to its size and terminated.
@@ -34,8 +34,8 @@ std::string substituteCopyName(std::string_view text, std::string_view copyName)
 
 const char* iSubstituteCopyName(const char* text, const char* copyName, std::uint32_t outputSize, char* output) {
     const std::string_view given = text;
-    // Deliberate: the room is judged before substituting, so a text that only its placeholder makes too long
-    // is refused; callers size their buffers by the template.
+    // Deliberate: the size is checked before the substitution, so that a text that is too long only because of its
+    // placeholder is refused; callers size their buffers by the template.
     if (outputSize != 0 && given.size() + 1 > outputSize) {
         return nullptr;
     }

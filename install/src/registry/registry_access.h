@@ -1,5 +1,5 @@
-// The registry layer that the flows share: single values, probes, and whole trees. Everything lies below
-// HKEY_LOCAL_MACHINE unless a root is named; a path may hold the copy-name placeholder.
+// Registry operations that the flows share: single values, probes and whole trees. Paths are below HKEY_LOCAL_MACHINE
+// unless a root is given.
 #pragma once
 
 #include <string>
@@ -9,20 +9,20 @@
 
 namespace kz7 {
 
-// kFilenameExceedsRange for a path that does not fit its 1,024 bytes: cut, it would name another key.
+// kFilenameExceedsRange for a path over 1,023 bytes: cut, it would name another key.
 Status checkPathLength(std::string_view path);
 
-// Stores a text with its terminator, creating the key and its parents. `path` is substituted already.
+// Stores a text with its terminating NUL, and creates the key and its parents. `path` has no placeholder left.
 Status setText(IRegistryStore& registry, std::string_view path, std::string_view name, std::string_view data);
 
-// Reads a value as the text up to its first NUL. kMoreData also when it fills `data` without any.
+// Reads a value as text up to its first NUL. kMoreData also for a value that fills `data` and has no NUL.
 Status queryText(IRegistryStore& registry, KeyHandle key, std::string_view name, Buffer& data);
 
-// Whether a value is there. Only kFileNotFound means absent: any other answer is somebody's value.
+// Whether a value exists. Only kFileNotFound means that it does not; any other status may hide a value.
 bool valueExists(IRegistryStore& registry, KeyHandle key, std::string_view name);
 
-// Copies everything below one key to another, key by key with names and classes, creating the target. With
-// `overwrite` off, values that the target already has are kept.
+// Copies everything below one key to another, with names and classes, and creates the target. Without `overwrite`,
+// values that the target already has are preserved.
 class TreeCopy {
 public:
     explicit TreeCopy(IRegistryStore& registry) : registry_(registry) {}
@@ -42,15 +42,16 @@ private:
     KeyHandle targetRoot_ = KeyHandle::none;
     std::string sourcePath_;
     std::string targetPath_;
-    // One set for the whole walk: a set for each level would overflow a small stack.
+    // Shared by all levels: a set of buffers for each level would overflow a small stack.
     FixedBuffer<260> name_;
     FixedBuffer<260> class_;
     FixedBuffer<260> valueName_;
     FixedBuffer<10000> data_;
 };
 
-// Deletes a key with everything below it, sparing every subkey named `sparedSubkey` (exact case) with the
-// keys above it. `view` is 0 or a view bit. Returns the status of the last step; kBadKey for an empty path.
+// Deletes a key and everything below it, except each subkey named `sparedSubkey` (compared with case) and the keys
+// above it. `path` may hold the copy-name placeholder; `view` is 0 or a view bit. Returns the status of the last step;
+// kBadKey for an empty path.
 Status deleteTree(IRegistryStore& registry, KeyHandle root, std::string_view path, AccessMask view,
                   std::string_view copyName, std::string_view sparedSubkey);
 

@@ -1,5 +1,5 @@
-// The tool's console lines: progress and success on standard output, errors on standard error behind a
-// prefix that names the line they have always been known by.
+// The tool's console lines: progress and success on standard output, errors on standard error with a prefix that holds
+// the line number that support knows the error by.
 #pragma once
 
 #include <cstdint>
@@ -11,7 +11,7 @@
 
 namespace kz7 {
 
-// An error line: the number that support knows it by, and its pattern.
+// An error line: its number and its pattern.
 struct ErrorText {
     std::uint32_t line;
     std::string_view pattern;

@@ -1,4 +1,4 @@
-// Writes registry values one row at a time and tells about each: the steps of every flow that lays out keys.
+// Writes the registry values of a layout row by row, and reports each.
 #pragma once
 
 #include <array>
@@ -10,11 +10,10 @@
 
 namespace kz7 {
 
-// Stands in a table for the location that the command was given.
+// The data of a row that holds the location from the command line.
 inline constexpr const char* kLocation = nullptr;
 
-// One text value of a layout. `key` is below the root that the flow writes under; the empty name is the
-// key's default value.
+// One text value of a layout. `key` is relative to the layout's root; the empty name is the key's default value.
 struct LayoutRow {
     std::string_view key;
     std::string_view name;
@@ -25,10 +24,10 @@ class RowWriter {
 public:
     RowWriter(IRegistryStore& registry, Report& report) : registry_(registry), report_(report) {}
 
-    // Announces and writes one value; a failure is reported and returned. `path` is substituted already.
+    // Prints and writes one value; a failure is reported and returned. `path` has no placeholder left.
     Status write(std::string_view path, std::string_view name, std::string_view data);
 
-    // Writes a layout under `root`, which may hold the copy-name placeholder, until a row fails.
+    // Writes the rows below `root`, which may hold the copy-name placeholder, up to the first that fails.
     Status writeLayout(std::span<const LayoutRow> rows, std::string_view root, std::string_view copyName,
                        std::string_view location);
 
