@@ -1,5 +1,5 @@
-// The framework's own owning, doubly linked list. A position in it survives the removal of the element it
-// stands on.
+// The framework's own doubly linked list, which owns its elements. Its cursor survives the removal of the element that
+// it is on.
 #pragma once
 
 #include <cstdint>
@@ -7,12 +7,12 @@
 
 namespace kz7 {
 
-// One node: owns its element and frees it through the element's virtual destructor.
+// One node. It owns its element and deletes it through the element's virtual destructor.
 template <typename T>
 struct INODE {
     explicit INODE(T* element) : data(element) {}
-    // Deliberate: a copy shares the element, and whichever node is destroyed first frees it; callers never
-    // destroy both.
+    // Deliberate: a copy shares the element, and the node that is destroyed first deletes it; callers never destroy
+    // both.
     INODE(const INODE&) = delete;
     INODE& operator=(const INODE& other) = default;
     ~INODE() { delete data; }
@@ -22,7 +22,7 @@ struct INODE {
     INODE* prev = nullptr;
 };
 
-// A plain character buffer from malloc.
+// A character buffer from malloc().
 template <>
 inline INODE<char>::~INODE() {
     std::free(data);
@@ -42,7 +42,7 @@ public:
         }
     }
 
-    // Puts an element at the end; the list owns it from here on. The first one becomes the position.
+    // Appends an element and takes ownership. The cursor moves to the first element of an empty list.
     void append(T* element) {
         auto* node = new INODE<T>(element);
         if (tail_ == nullptr) {
@@ -55,8 +55,8 @@ public:
         ++count_;
     }
 
-    // Destroys the element; nothing happens when no node holds it. Under a walk the next step lands on the
-    // element that followed it.
+    // Destroys the element; does nothing if no node holds it. The next step of a walk goes to the element that followed
+    // it.
     void remove(const T* element) {
         for (INODE<T>* node = head_; node != nullptr; node = node->next) {
             if (node->data == element) {
@@ -66,7 +66,7 @@ public:
         }
     }
 
-    // The first and the following elements of a walk; null past the last.
+    // Walks the list; null past the last element.
     T* first() {
         cursor_ = head_;
         return current();
@@ -79,7 +79,7 @@ public:
     std::uint32_t count() const { return count_; }
 
 protected:
-    // Keeps the position over a search that walks the list, and puts it back.
+    // Preserve the cursor of the caller's walk during a search.
     void saveCursor() { savedCursor_ = cursor_; }
     void restoreCursor() { cursor_ = savedCursor_; }
 

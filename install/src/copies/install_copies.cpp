@@ -18,7 +18,7 @@ InstallCopyInfo::InstallCopyInfo(RegistryValues& values, std::string_view name, 
     release_ = values.getValue(key, "Release");
     modification_ = values.getValue(key, "Modification");
     fixLevel_ = values.getValue(key, "Fix Level");
-    // Deliberate: before validity is judged, so that a copy without a fix level is as good as any.
+    // Deliberate: set before the copy is judged, so that a missing fix level never makes it invalid.
     if (fixLevel_.empty()) {
         fixLevel_.push_back('0');
     }

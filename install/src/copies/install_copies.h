@@ -1,5 +1,5 @@
-// The installed copies as the version aliases see them: the record of one copy, the list of all, and the
-// answer to "which copy is the highest of those whose version begins with this?".
+// The installed copies that the version aliases are computed from: the record of one copy, the list of all, and the
+// query for the copy with the highest version that begins with a prefix.
 #pragma once
 
 #include <map>
@@ -13,19 +13,19 @@
 
 namespace kz7 {
 
-// One copy. The version text joins its four fields with dots. Deliberate: texts, not numbers, are what orders copies,
-// 10.1.0.0 is below 9.7.0.0; the aliases on every machine were chosen so.
+// One copy. Its version text joins the four version fields with dots. Deliberate: copies are ordered by these texts,
+// not by numbers, so that 10.1.0.0 is below 9.7.0.0; existing aliases were chosen that way.
 class InstallCopyInfo {
 public:
     InstallCopyInfo() = default;
 
-    // Reads the copy below `copiesKey`. It never fails: what cannot be read stays empty.
+    // Reads the copy below `copiesKey`. Never fails: a field that cannot be read is empty.
     InstallCopyInfo(RegistryValues& values, std::string_view name, std::string_view copiesKey = layout::kCopies);
 
     const std::string& getName() const { return name_; }
     const std::string& getVersion() const { return versionText_; }
 
-    // Version, release and modification are there; a missing fix level counts as "0".
+    // Whether the copy has a version, a release and a modification; a missing fix level counts as "0".
     bool isValid() const { return valid_; }
 
 private:
@@ -40,19 +40,19 @@ private:
 
 using CopiesByName = std::map<std::string, InstallCopyInfo>;
 
-// Version text and name of every valid copy, ordered by the texts, whose bytes compare unsigned. One behind the other
-// in memory: the aliases are computed in one pass over them.
+// The version texts and names of the valid copies, ordered by the texts, whose bytes compare as unsigned. Contiguous in
+// memory, since the aliases are computed in one pass over them.
 using CopiesByVersion = std::vector<std::pair<std::string, std::string>>;
 
-// Reads the copies below the native view's key, in the order in which it lists them: of two copies with one
-// version text the later stays. kFailed when the key cannot be opened, both maps are then empty.
+// Reads the copies of the native view in registry order: of two copies with the same version text the later one is
+// kept. kFailed if the key cannot be opened; both containers are then empty.
 Status readInstallCopies(RegistryValues& values, CopiesByName& byName, CopiesByVersion& byVersion);
 
-// The name of the copy with the greatest version text that begins with `prefix` and a dot, or that is `exact`ly
-// `prefix`, without regard to case. Empty when there is none. One question is a walk over the copies.
+// The name of the copy with the greatest version text that begins with `prefix` and a dot, or with `exact` equals
+// `prefix`, without regard to case. Empty if no copy matches. Each call walks the copies.
 std::string highestVersionLeadingBy(const CopiesByVersion& copies, std::string_view prefix, bool exact);
 
-// How many bytes two texts have in common from their beginning.
+// The length in bytes of the longest common prefix.
 std::size_t commonLength(std::string_view left, std::string_view right);
 
 }  // namespace kz7

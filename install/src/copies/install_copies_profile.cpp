@@ -9,14 +9,14 @@
 namespace kz7 {
 namespace {
 
-constexpr std::size_t kWholeVersion = 4;  // components; any other prefix must go on behind a dot
+constexpr std::size_t kWholeVersion = 4;  // components; after any other prefix a dot must follow
 
 bool isLetter(char c) {
     return foldUpper(c) >= 'A' && foldUpper(c) <= 'Z';
 }
 
-// Aliases that are one but for the case of their letters. They lie apart in the order of version texts: every
-// lower-case letter is above every upper-case one.
+// Finds aliases that differ only in letter case. They are not adjacent in the order of version texts: every lower-case
+// letter is above every upper-case one.
 using Alias = AliasMap::value_type;
 struct IgnoringCase {
     std::size_t operator()(const Alias* alias) const {
@@ -32,7 +32,7 @@ struct IgnoringCase {
     bool operator()(const Alias* left, const Alias* right) const { return equalsIgnoreCase(left->first, right->first); }
 
     static constexpr std::size_t kPiece = sizeof(std::uint64_t);
-    static constexpr std::uint64_t kCaseBits = 0x2020202020202020U;  // what tells "A" from "a"
+    static constexpr std::uint64_t kCaseBits = 0x2020202020202020U;  // the bit in which "A" and "a" differ
 };
 using AliasesIgnoringCase = std::pmr::unordered_set<const Alias*, IgnoringCase, IgnoringCase>;
 
@@ -184,14 +184,14 @@ void InstallCopiesProfile::tellProfile() {
     if (!values_.isHeard()) {
         return;
     }
-    // Deliberate: once for each prefix, as it was answered, not for each copy that has it.
+    // Deliberate: once for each prefix, not for each copy that has it.
     for (const auto& [prefix, name] : profileInfo_) {
         if (name.empty()) {
             values_.tell("The highest version leading by '%s': ( none )", {prefix});
             values_.tell("Did not find corrsponding install name for '%s'", {prefix});
         } else {
-            // Deliberate: the quotation mark is never closed (and "corrsponding" stays); whoever searches traces knows
-            // the texts so.
+            // Deliberate: the quotation mark is never closed, and "corrsponding" is misspelled; people search traces
+            // for these texts.
             values_.tell("The highest version leading by '%s:%s--%s",
                          {prefix, copiesByName_.at(name).getVersion(), name});
         }

@@ -1,6 +1,6 @@
-// The version aliases: values directly under the key of the installed copies, named by a version prefix (9,
-// 9.7, 9.7.0, ...) and holding the name of the copy that answers to it, the highest that begins with it. The
-// rewrite computes them from the copies that are installed now and replaces the old ones in both views.
+// The version aliases: values directly below the key of the installed copies. The name of an alias is a version prefix
+// (9, 9.7, 9.7.0, ...), its data the name of the copy with the highest version that begins with it. The rewrite
+// computes the aliases from the installed copies and replaces the old ones in both views.
 #pragma once
 
 #include <cstdint>
@@ -15,30 +15,30 @@ namespace kz7 {
 
 using AliasMap = std::map<std::string, std::string>;  // version prefix or value name -> copy name
 
-// Whether a value of that name is an alias: it begins with a digit and "DEF" is nowhere in it.
+// Whether a value of that name is an alias: it begins with a digit and does not contain "DEF".
 bool isAliasName(std::string_view name);
 
-// Whether a prefix stands for one whole version, so that only a copy of exactly that version answers to it.
+// Whether a prefix is a whole version, which only a copy of exactly that version matches.
 bool isWholeVersion(std::string_view prefix);
 
-// A walk over aliases takes value names of fewer bytes.
+// Bytes of the name buffer of a walk over the aliases, with the terminator.
 inline constexpr std::uint32_t kAliasNameRoom = 100;
 
-// Names of the aliases that an open key holds, in its order. Deliberate: the walk ends at the first value name
-// that has 100 bytes or more; aliases listed behind it are left alone.
+// The names of the aliases of an open key, in registry order. Deliberate: the walk ends at the first value name of 100
+// bytes or more; aliases after it are left alone.
 std::vector<std::string> listAliases(IRegistryStore& registry, KeyHandle key);
 
-// Statuses are kSuccess or kFailed; what failed goes to the debugger output. An object may be run again.
+// Statuses are kSuccess or kFailed; failures are described on the debugger output. An object may be run again.
 class InstallCopiesProfile {
 public:
     InstallCopiesProfile(IRegistryStore& registry, IDebugOutput& debug, AccessMask readAccess = kKeyReadSet)
         : values_(registry, debug, readAccess) {}
 
-    // The whole rewrite. A failure before the first deletion changes nothing, one while deleting puts the
-    // old aliases back, one while writing leaves what could be written.
+    // The whole rewrite. A failure before the first deletion changes nothing; a failed deletion restores the old
+    // aliases; failed writes leave the aliases that could be written.
     Status run();
 
-    // Its steps. The maps that they fill stay filled until cleanup.
+    // The steps of run(). The maps that they fill stay filled until cleanup().
     Status backupOldProfile();
     Status generateInstallCopiesList();
     Status generateProfileInfo();
@@ -49,7 +49,7 @@ public:
     const CopiesByName& copiesByName() const { return copiesByName_; }
     const CopiesByVersion& copiesByVersion() const { return copiesByVersion_; }
 
-    // What the aliases should be. A prefix that no copy answers to has an empty name.
+    // The computed aliases. A prefix that no copy matches has an empty name.
     const AliasMap& profileInfo() const { return profileInfo_; }
 
 private:
@@ -68,7 +68,7 @@ private:
     AliasMap oldProfileWow_;
 };
 
-// The rewrite by itself.
+// Runs the rewrite once.
 Status rewriteInstallCopiesProfile(IRegistryStore& registry, IDebugOutput& debug);
 
 }  // namespace kz7

@@ -53,7 +53,7 @@ void InstallCopy::readComponents(IRegistryStore& registry, const std::string& ba
         return;
     }
     FixedBuffer<255> name;
-    // An error ends the walk like its normal end: a name that fills the buffer would answer kMoreData for ever.
+    // Any error ends the walk: a name that does not fit the buffer would return kMoreData for ever.
     for (std::uint32_t index = 0; succeeded(registry.enumerateValue(key.get(), index, name, nullptr, nullptr));
          ++index) {
         auto* kept = static_cast<char*>(std::malloc(name.size + 1));

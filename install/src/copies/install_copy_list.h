@@ -1,5 +1,5 @@
-// The installer runtime's list of the copies on this machine, in registry order, a version-8 installation
-// counted as a copy of its own. The removal of a copy reads it to decide how much to delete.
+// The installer runtime's list of the installed copies, in registry order. A version-8 installation counts as a copy.
+// The removal of a copy decides by it how much to delete.
 #pragma once
 
 #include <cstdint>
@@ -51,8 +51,8 @@ private:
 
 class InstallCopyList : public ILIST<InstallCopy> {
 public:
-    // Never fails outright: the status tells. Copies that cannot be read are left out and reported to the
-    // debugger.
+    // Never fails as a whole; see status(). Copies that cannot be read are left out and reported on the debugger
+    // output.
     InstallCopyList(IRegistryStore& registry, IDebugOutput& debug, bool view32, bool view64);
 
     // The copy of that name, compared without regard to case; null for none or a null name. A walk in progress keeps
@@ -62,7 +62,7 @@ public:
     // 0 when the list was built completely, 1 when building failed part way.
     std::uint32_t status() const { return status_; }
 
-    // The element that stands for a version-8 installation; null when there is none.
+    // The element of a version-8 installation, or null.
     const InstallCopy* version8Copy() const { return version8Copy_; }
 
 private:

@@ -1,4 +1,4 @@
-// The rest of the framework's class tree, kept thin: lists of installed products and of instances, and key objects.
+// The rest of the framework's class tree: lists of installed products and instances, and registry key objects.
 #pragma once
 
 #include <string>
@@ -37,7 +37,7 @@ private:
 
 class IKZ7INSTANCELIST : public ILIST<IKZ7INSTANCE> {};
 
-// One list for whoever shares it.
+// The list that callers share.
 class InstallCopyListSingleton : public InstallCopyList {
 public:
     using InstallCopyList::InstallCopyList;
@@ -59,7 +59,7 @@ private:
     Status status_;
 };
 
-// The same for a path with the placeholder of a copy's name.
+// The same for a path with the copy-name placeholder.
 class KZ7iCopyNameRegistry : public KZ7iRegistry {
 public:
     KZ7iCopyNameRegistry(IRegistryStore& registry, KeyHandle root, std::string_view path, std::string_view copyName)

@@ -22,7 +22,8 @@ std::string RegistryValues::query(std::string_view path, std::string_view name, 
     if (!succeeded(open(path, readAccess_, key))) {
         return {};
     }
-    // Deliberate: what does not fit reads as empty, in a backup of an alias too; nothing longer is an alias of ours.
+    // Deliberate: a value that does not fit reads as empty, in a backup of an alias as well; aliases name copies, whose
+    // names are shorter.
     FixedBuffer<kValueRoom> data;
     if (!succeeded(queryText(registry_, key.get(), name, data))) {
         tell(complaint, {path, name});
@@ -44,7 +45,7 @@ Status RegistryValues::setValue(std::string_view path, std::string_view name, st
     if (!succeeded(open(path, kKeyFull, key))) {
         return kFailed;
     }
-    // Deliberate: the bytes stored carry no terminating NUL; readers of the aliases know them so.
+    // Deliberate: stored without a terminating NUL; readers of the aliases expect that.
     return succeeded(registry_.setValue(key.get(), name, ValueType::sz, data)) ? kSuccess : kFailed;
 }
 

@@ -1,6 +1,5 @@
-// Single text values of the machine's registry, as the copy records and the alias rewrite read, write and
-// delete them. Every operation opens its key, does one thing and closes it; what went wrong is composed for
-// the debugger output alone.
+// Reads, writes and deletes single text values below HKEY_LOCAL_MACHINE for the copy records and the alias rewrite.
+// Each operation opens its key and closes it; failures are described on the debugger output only.
 #pragma once
 
 #include <initializer_list>
@@ -13,26 +12,25 @@
 
 namespace kz7 {
 
-// Key paths are plain paths below the machine's root. Statuses are kSuccess or kFailed.
+// Key paths hold no placeholder. Statuses are kSuccess or kFailed.
 class RegistryValues {
 public:
-    // `readAccess` is what keys are opened with to be read; who only looks needs less than the flows ask for.
+    // `readAccess` is the access for reading; kz7admin needs less than the flows ask for.
     RegistryValues(IRegistryStore& registry, IDebugOutput& debug, AccessMask readAccess = kKeyReadSet)
         : registry_(registry), debug_(debug), readAccess_(readAccess) {}
 
-    // The value's data up to the first NUL, whatever its type. Empty on any failure, and for 100 characters
-    // and more, so that a missing value and an empty one look alike. Both are one operation; they differ in
-    // what they tell the debugger.
+    // The value's data up to the first NUL, of any type. Empty on any failure and for 100 characters and more. The two
+    // differ in their debugger text only.
     std::string getValue(std::string_view path, std::string_view name);
     std::string readValue(std::string_view path, std::string_view name);
 
-    // Stores a string value in a key that exists.
+    // Stores a string value in an existing key.
     Status setValue(std::string_view path, std::string_view name, std::string_view data);
     Status deleteValue(std::string_view path, std::string_view name);
 
     bool isHeard() { return debug_.isHeard(); }
 
-    // Composes a message for the debugger output, if anybody sees it.
+    // Writes a message to the debugger output, if anybody reads it.
     void tell(std::string_view pattern, std::initializer_list<Insert> inserts = {}) {
         if (isHeard()) {
             debug_.write(compose(pattern, inserts));
