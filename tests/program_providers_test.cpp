@@ -122,36 +122,33 @@ TEST_F(ProviderProgram, CopiesAreShownWithTheirServicesAndAliasesWithWhatIsWrong
     ASSERT_EQ(store_.run("kz7admin", {"import", store_.file("more.reg")}).exitCode, 0);
 
     EXPECT_EQ(store_.run("kz7admin", {"copies"}).output,
-              "store " + storeLine +
-                  "\n"
-                  "NAME   VIEW    VERSION    VALID  LOCATION  SERVICE\n"
-                  "COPY1  native  9.7.800.0  yes    C:\\KZ7    KZ7MGMTSVC_COPY1 stopped\n"
-                  "COPY1  32-bit  9.7.800.0  yes    C:\\KZ7    KZ7MGMTSVC_COPY1 stopped\n"
-                  "five   native  9.8.0.0.1  yes    none      none\n"
-                  "half   native  ...0       no     C:\\h      none\n"
-                  "vee    native  v9.8.0.0   yes    none      none\n");
+              "NAME   VIEW    VERSION    VALID  LOCATION  SERVICE\n"
+              "COPY1  native  9.7.800.0  yes    C:\\KZ7    KZ7MGMTSVC_COPY1 stopped\n"
+              "COPY1  32-bit  9.7.800.0  yes    C:\\KZ7    KZ7MGMTSVC_COPY1 stopped\n"
+              "five   native  9.8.0.0.1  yes    none      none\n"
+              "half   native  ...0       no     C:\\h      none\n"
+              "vee    native  v9.8.0.0   yes    none      none\n");
     const std::string json = store_.run("kz7admin", {"copies", "--json"}).output;
     EXPECT_EQ(json.substr(0, json.find(",\n")),
               "{\"store\":\"" + storeLine +
                   "\",\"copies\":[\n{\"name\":\"COPY1\",\"view\":\"native\",\"version\":\"9.7.800.0\",\"valid\":true,"
                   "\"location\":\"C:\\\\KZ7\",\"service\":\"KZ7MGMTSVC_COPY1\",\"state\":\"stopped\"}");
     EXPECT_EQ(store_.run("kz7admin", {"aliases", "9.8"}).output,
-              "store " + storeLine +
-                  "\n"
-                  "PREFIX     NATIVE  32-BIT  SHOULD BE  WHY\n"
-                  "9.8        -       -       five       9.8.0.0.1 is the highest that begins with it\n"
-                  "9.8.0      COPY1   -       five       9.8.0.0.1 is the highest that begins with it\n"
-                  "9.8.0.0    -       -       (empty)    no copy has exactly this version; written empty\n"
-                  "9.8.0.0.1  -       -       (empty)    no version goes on behind it; written empty\n");
+              "PREFIX     NATIVE  32-BIT  SHOULD BE  WHY\n"
+              "9.8        -       -       five       9.8.0.0.1 is the highest that begins with it\n"
+              "9.8.0      COPY1   -       five       9.8.0.0.1 is the highest that begins with it\n"
+              "9.8.0.0    -       -       (empty)    no copy has exactly this version; written empty\n"
+              "9.8.0.0.1  -       -       (empty)    no version goes on behind it; written empty\n");
     EXPECT_NE(store_.run("kz7admin", {"aliases", "v9"}).output.find("v9        vee     -       vee        v9.8.0.0 is"),
               std::string::npos)
         << "a due alias that does not look like one";
     const std::string gone = "no copy has such a version; the next rewrite ";
     const std::string ended = ": a value name of 100 bytes or more ends its walk\n";
     EXPECT_EQ(store_.run("kz7admin", {"aliases", "8"}).output,
-              "store " + storeLine + "\nPREFIX  NATIVE  32-BIT  SHOULD BE  WHY\n" +     //
-                  "8.1     GONE    -       -          " + gone + "leaves it" + ended +  //
-                  "8.2     GONE    -       -          " + gone + "deletes it\n" +       //
+              "PREFIX  NATIVE  32-BIT  SHOULD BE  WHY\n"
+              "8.1     GONE    -       -          " +
+                  gone + "leaves it" + ended +                                     //
+                  "8.2     GONE    -       -          " + gone + "deletes it\n" +  //
                   "8.3     GONE    GONE    -          " + gone + "deletes it from the 32-bit view only" + ended);
     const StateDirectory native;
     overwrite(store_.file("more.reg"), text.substr(0, text.find("[HKEY_LOCAL_MACHINE\\SOFTWARE\\Wow")));
