@@ -120,7 +120,8 @@ TEST_F(Configuration, ParametersAreSetByTheCommandProcessor) {
                   "MAXDARI=7, instance INST\n0: 3 set, 0 not set");
     machine.processes_.addProgram(kProcessor, {.output = "out of range", .exitCode = 7});
     EXPECT_EQ(commit("INST", {{"DIAGLEVEL", "9"}}),
-              "Note: setDBMUsingProcess, step 30: error 5030: exit code 7\nNote: The program wrote: out of range\n" +
+              "Note: setDBMUsingProcess, step 30: error 5030: exit code 7\nNote: Output of setDBMUsingProcess: out of "
+              "range\n" +
                   fails + "9, instance INST, error 5057\n0: 0 set, 1 not set");
     EXPECT_EQ(machine.processes_.started,
               (std::vector<std::string>{command + "DFTDBPATH \"a b%PATH%%d\"", command + "DIAGLEVEL \"3\"",

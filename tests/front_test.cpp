@@ -70,6 +70,7 @@ TEST(FrontScreen, BarsFitTheirColumns) {
     // clang-format off
     const struct { FrontScreen::Bar bar; std::uint32_t columns; const char* line; } rows[] = {
         {{"Installing", 50, "Copying files"}, 79,  "Installing   [##############..............]  50% Copying files"},
+        {{"Installing", 50, "Copying files", "0:35, 1:10 left"}, 79, "Installing   [##############..............]  50% 0:35, 1:10 left Copying files"},
         {{"Installing", 100, "done"},         200, "Installing   [########################################] 100% done"},
         {{"Installing", 30, "Copying files"}, 30,  "Installing 30%: Copying files"},
         {{"Undoing", -1, "taken back"},       15,  "Undoing      ta"},
@@ -79,6 +80,27 @@ TEST(FrontScreen, BarsFitTheirColumns) {
     // clang-format on
     for (const auto& row : rows) {
         EXPECT_EQ(barLine(row.bar, row.columns), row.line) << row.columns;
+    }
+}
+
+TEST(Front, EstimatesByAnnouncedTimesThenByMeasuredOnes) {
+    FrontProgress progress;
+    progress.takeIds({"1", "2", "3"});
+    progress.takeTimes({"30", "10", "20"});
+    // clang-format off
+    const struct { std::int32_t started; std::int32_t ended; std::uint64_t now; std::uint64_t left; } rows[] = {
+        {1, 0, 0,  60}, {0, 0, 5, 55}, {0, 0, 40, 30},  // a task that is overdue takes nothing from the others
+        {0, 1, 60, 60}, {2, 0, 60, 60}, {0, 0, 70, 50}, {3, 2, 80, 40}, {0, 3, 120, 0},
+    };
+    // clang-format on
+    for (const auto& row : rows) {
+        if (row.ended != 0) {
+            progress.endTask(row.ended, row.now);
+        }
+        if (row.started != 0) {
+            progress.startTask(row.started, row.now);
+        }
+        EXPECT_EQ(progress.secondsLeft(row.now), row.left) << row.now;
     }
 }
 

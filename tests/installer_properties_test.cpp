@@ -18,11 +18,11 @@ protected:
     InstallerProperties() { machine.openLog(); }
 
     // A value of a user's key, or of the caller's, as somebody saved it.
-    void save(const std::string& user, std::string_view bytes) {
+    void save(const std::string& user, std::string_view bytes, const char* name = "P") {
         OwnedKey key(machine.registry_);
         const KeyHandle root = user.empty() ? KeyHandle::currentUser : KeyHandle::users;
         machine.registry_.createKey(root, user.empty() ? kKey : user + "\\" + kKey, {}, kKeyFull, key.receive());
-        EXPECT_EQ(machine.registry_.setValue(key.get(), "P", ValueType::sz, bytes), kSuccess);
+        EXPECT_EQ(machine.registry_.setValue(key.get(), name, ValueType::sz, bytes), kSuccess);
     }
 
     RuntimeMachine machine{true};
@@ -35,6 +35,7 @@ TEST_F(InstallerProperties, AreReadFromTheInstallerOrFromWhatWasSaved) {
     const struct {
         const char* why; bool deferred; const char* sid; const char* savedFor; std::string_view saved;
         const char* installers; std::uint32_t room; Status status; const char* text; std::uint32_t size;
+        const char* name = "P";
     } rows[] = {
         {"immediate: the installer's, its size without the NUL",   false, "",       nullptr, ""sv,      "live", 1024, kSuccess, "live", 4},
         {"immediate: what was saved is not looked at",             false, "",       "",      "old\0"sv, "live", 5,    kSuccess, "live", 4},
@@ -46,19 +47,21 @@ TEST_F(InstallerProperties, AreReadFromTheInstallerOrFromWhatWasSaved) {
         {"deferred: saved empty reads empty",                      true,  "",       "",      "\0"sv,    "live", 1024, kSuccess, "", 1},
         {"deferred: saved does not fit, the installer is asked",   true,  "",       "",      "old\0"sv, "",     3,    kSuccess, "", 0},
         {"deferred: saved by somebody without a NUL is terminated", true, "",       "",      "old"sv,   "",     4,    kSuccess, "old", 3},
+        {"deferred: what the installer has is never the saved one", true, "",     "",      "old\0"sv, "live", 1024, kSuccess, "live", 4, "CustomActionData"},
+        {"deferred: which counts where the installer has none",    true,  "",       "",      "old\0"sv, "",     1024, kSuccess, "old", 4, "CustomActionData"},
         {"deferred: and is none where the NUL does not fit",       true,  "",       "",      "old"sv,   "",     3,    kSuccess, "", 0},
     };
     // clang-format on
     for (const auto& row : rows) {
         SCOPED_TRACE(row.why);
-        machine.session.properties = {{"P", row.installers}, {"UserSID", row.sid}};
+        machine.session.properties = {{row.name, row.installers}, {"UserSID", row.sid}};
         machine.session.isScheduled = row.deferred;
         if (row.savedFor != nullptr) {
-            save(row.savedFor, row.saved);
+            save(row.savedFor, row.saved, row.name);
         }
         std::string room(row.room + 8, '#');
         std::uint32_t size = row.room;
-        EXPECT_EQ(iMsiGetProperty(at, "P", room.data(), &size), row.status);
+        EXPECT_EQ(iMsiGetProperty(at, row.name, room.data(), &size), row.status);
         EXPECT_EQ(size, row.size);
         if (row.status == kSuccess) {
             EXPECT_STREQ(room.c_str(), row.text);
@@ -93,20 +96,24 @@ TEST_F(InstallerProperties, EverythingThatDeferredActionsNeedIsSaved) {
     properties = {
         {"UserSID", "S-1-5"},        {"Z_LAST", "z"},   {"A_FIRST", "a"},       {"LONGEST", longest},
         {"TOO_LONG", longest + "m"}, {"REMOVE", "ALL"}, {"DLFM_PWD", "secret"}, {"HUGE", std::string(100000, 'h')}};
+    properties["PROD"] = "PROD_DOCE";
     machine.session.tableRows = {"Z_LAST", "A_FIRST", "", "LONGEST", "TOO_LONG", "HUGE", "UNSET"};
     machine.session.features = {{"ADMIN_SERVER.bin", {FeatureState::local, FeatureState::absent}},
                                 {"LDAP.bin", {FeatureState::absent, FeatureState::local}},
                                 {"VS_DOT_NET.bin", {FeatureState::absent, FeatureState::absent}},
                                 {"BASE_CLIENT.bin", {FeatureState::local, FeatureState::source}}};
     machine.session.actions["ResolveSource"] = [&] { properties["SOURCEDIR"] = "D:\\"; };
-    machine.engine.takeResponses({{"PROD", "PROD_DOCE"}, {"prod", "PROD_DOCE"}, {"FILE", "C:\\p"}, {"EMPTY", ""}});
+    machine.engine.takeResponses({{"PROD", "PROD_ESE"}, {"prod", "PROD_ESE"}, {"FILE", "C:\\p"}, {"EMPTY", ""}});
     save("S-1-5", "of an earlier installation");
     const std::string log = machine.logged([&] { EXPECT_EQ(iSavePropertiesForDeferred(at), kSuccess); });
     EXPECT_TRUE(
         log.starts_with("Note: iMsiGetProperty: UserSID, status 0\n"
+                        "Note: iMsiGetProperty: PROD, status 0\n"
                         "Note: iMsiSetProperty: BASE_CLIENT_BIN_SELECTED, status 0\n"
                         "Note: iMsiGetProperty: TOO_LONG, status 234\n"))
         << log;
+    EXPECT_NE(log.find("Note: MsiDoAction: ResolveSource, status 0\nNote: iMsiGetProperty: SOURCEDIR, status 0\n"),
+              std::string::npos);
     EXPECT_EQ(log.find("secret"), std::string::npos) << "values stay out of the log";
     EXPECT_EQ(properties["BASE_CLIENT_BIN_SELECTED"], "Y");
     EXPECT_EQ(properties["SOURCEDIR"], "D:\\");
@@ -117,7 +124,7 @@ TEST_F(InstallerProperties, EverythingThatDeferredActionsNeedIsSaved) {
         const std::string line = key + " : " + name + " = 1:" + value + "\\x00\n";
         expected += expected.find(line) == std::string::npos ? line : "";
     };
-    expected = key + " : P = 1:of an earlier installation\n";
+    // What an earlier installation saved is gone.
     for (const char* name : {"Z_LAST", "A_FIRST", "LONGEST", "UNSET"}) {
         add(name, properties[name]);
     }

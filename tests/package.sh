@@ -30,8 +30,11 @@ retype() {
 cp "$programs/kz7actions64.dll" "$programs/kz7_probe.dll" .
 echo installed >file.txt
 wixl -a x64 -D FILE=file.txt -D ACTIONS=kz7actions64.dll -D PROBE=kz7_probe.dll -o package.msi "$source"
-retype 1 Save ProbeChange                                   # at once
-retype 51 SetDebugProp TellImmediate TellProbe{RolledBack,Rollback,Deferred,Commit,Committed}
+retype 1 Save ProbeChange FailEarly DeleteAt{Cancel,Failure}   # at once
+for exit in Cancel,-2 Failure,-3; do
+    msibuild package.msi -q "UPDATE InstallExecuteSequence SET Sequence=${exit#*,} WHERE Action='DeleteAt${exit%,*}'"
+done
+retype 51 SetDebugProp SetRollbackDeletes TellImmediate TellProbe{RolledBack,Rollback,Deferred,Commit,Committed}
 retype 3073 ProbeDeferred Fail                              # deferred
 retype 3329 ProbeRollback DeleteAtRollback ProbeRolledBack  # in a rollback
 retype 3585 ProbeCommit DeleteAtCommit ProbeCommitted       # at the end
@@ -69,8 +72,14 @@ changed=(DEBUG_PROP TABLE_PUBLIC TablePrivate KZ7_COPY_NAME MIGRATION_FILES_PATH
     NotSaved BASE_CLIENT_BIN_SELECTED)
 before=('of the immediate phase' 'of the table' '100% of the table' COPY1 "$(long 1023)" "$(long 1024)" '' '')
 
+named_files() {
+    note iMsiGetProperty KZ7_MESSAGES 0
+    note iMsiGetProperty RSP_FILE_PATH 0
+}
+
 immediate_actions() { # the feature BASE_CLIENT.bin selected: Y or N
     note iMsiGetProperty UserSID 0
+    note iMsiGetProperty PROD 0
     note iMsiSetProperty BASE_CLIENT_BIN_SELECTED 0
     note iMsiGetProperty INI_FILES_PATH 234 # too long to be saved
     probe immediate 'substituted: InstalledCopies\\COPY1'
@@ -106,8 +115,13 @@ deferred_actions() { # kind of action, the feature selected; as saved: REMOVE, s
     saved "$1" PROP_RSP_PROD ''
 }
 
-deleted() { # kind of action
+delete() {
+    note iMsiGetProperty KZ7_MESSAGES 0
     note iMsiGetProperty UserSID 0
+}
+
+deleted() { # kind of action
+    delete
     probe "$1" 'opening the key: status 2'
     given "$1" DEBUG_PROP new
 }
@@ -137,9 +151,11 @@ printf '%s\r\n' '* of a user' 'PROD = PROD_ESE' 'KZ7.PASSWORD = "two  words "' '
 printf '%s\r\n' 'LEVEL = 8' 'no keyword' >bad_responses
 good=RSP_FILE_PATH=$(windows_path "$folder/responses")
 bad=RSP_FILE_PATH=$(windows_path "$folder/bad_responses")
+bad_path="RSP_FILE_PATH: ${bad#*=}"
 
 {
     outcome 1603
+    named_files
     immediate_actions Y
     deferred_actions deferred Y '' SELECTED 'two  words '
     deferred_actions rollback Y '' SELECTED 'two  words '
@@ -147,7 +163,15 @@ bad=RSP_FILE_PATH=$(windows_path "$folder/bad_responses")
 } >expected
 same 'a deferred action fails: it is rolled back' /i package.msi "$good" FAIL=1
 {
+    outcome 1603
+    named_files
+    immediate_actions Y
+    delete
+} >expected
+same 'an immediate action fails: there is nothing to roll back' /i package.msi "$good" FAIL=early
+{
     outcome 0 client.txt odbc.txt
+    named_files
     immediate_actions Y
     deferred_actions deferred Y '' SELECTED 'two  words '
     committed
@@ -155,7 +179,9 @@ same 'a deferred action fails: it is rolled back' /i package.msi "$good" FAIL=1
 same 'an installation, after one that was rolled back' /i package.msi "$good"
 {
     outcome 0
-    echo "ERROR: ureReadRspFile, step 2: error 13: there is no '=' in it"
+    named_files
+    echo "ERROR: ureReadRspFile, step 20: error 13: $bad_path: there is no '=' in it (line 2)"
+    note iMsiGetProperty KZ7_DEFAULT_LANG 0
     immediate_actions N
     deferred_actions deferred N ALL DESELECTED ''
     committed

@@ -2,6 +2,7 @@
 // nothing is left over.
 #include <fcntl.h>
 #include <gtest/gtest.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -112,15 +113,27 @@ TEST_F(PosixProcess, AChildBeginsCleanWhateverItsParentHas) {
     inFork([&] {
         std::signal(SIGPIPE, SIG_IGN);
         std::signal(SIGTERM, SIG_IGN);
+        std::signal(SIGHUP, SIG_IGN);
         sigset_t all;
         sigfillset(&all);
         sigprocmask(SIG_BLOCK, &all, nullptr);
         open("/etc/passwd", O_RDONLY);
         dup2(1, 900);
         EXPECT_EQ(told("/bin/ls /proc/self/fd"), "0 0 0\n1\n2\n3\n") << "3 is its own";
-        // All but the two that the C library keeps for itself.
-        const std::string none = "\"Sig(Blk|Ign):.0{7}[01][08]0{7}$\"";
-        EXPECT_EQ(told("/bin/grep -cE " + none + " /proc/self/status"), "0 0 2\n");
+        // SIGHUP stays ignored; the C library keeps two signals for itself.
+        const std::string clean = "\"Sig(Blk:.0{7}[01][08]0{7}|Ign:.0{7}[01][08]0{6}1)$\"";
+        EXPECT_EQ(told("/bin/grep -cE " + clean + " /proc/self/status"), "0 0 2\n");
+    });
+}
+
+TEST_F(PosixProcess, WaitsWithALimitWhenNoDescriptorIsFree) {
+    inFork([&] {
+        ProcessInformation child;
+        ASSERT_EQ(host_->startProcess({"/bin/sleep 0.2", {}, StreamHandle::none, StreamHandle::none}, child), kSuccess);
+        const rlimit full{3, 3};
+        setrlimit(RLIMIT_NOFILE, &full);
+        EXPECT_EQ(host_->waitProcess(child.process, 1), kWaitTimedOut);
+        EXPECT_EQ(host_->waitProcess(child.process, 60'000), kSuccess);
     });
 }
 

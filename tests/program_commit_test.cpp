@@ -103,7 +103,7 @@ TEST_F(CommitProgram, ReportsWhatTheProcessorDoes) {
     const std::string set = "parameter set: DIAGLEVEL=3";
     // clang-format off
     const struct { const char* why; std::string variable; int exitCode; std::string log; } rows[] = {
-        {"it fails",                      "KZ7_SAMPLE_EXIT=7", 1, "error 5030: exit code 7\nNote: The program wrote: "},
+        {"it fails",                      "KZ7_SAMPLE_EXIT=7", 1, "error 5030: exit code 7\nNote: Output of setDBMUsingProcess: "},
         {"it sees what was set, and writes", "KZ7_SAMPLE_HOOK=\"$KZ7_ADMIN\" tree | grep -q KZ7ACCOUNT && \"$KZ7_TOOL\" -addKZ7Copy C2 'C:\\c2' >&2", 0, set},
         {"it floods its output",          "KZ7_SAMPLE_HOOK=head -c 104857600 /dev/zero | tr '\\0' x", 0, set},
         {"it leaves somebody behind",     "KZ7_SAMPLE_HOOK=f=$KZ7_STATE_DIR/pipe; mkfifo $f; (cat $f & echo late >$f &)", 0, set},

@@ -124,6 +124,36 @@ TEST_F(RuntimeProgram, FrontShowsARunAndAnswersIt) {
     EXPECT_NE(aborted.output.find("Undoing: done\n"), std::string::npos);
 }
 
+// The end of a program ends its question, though an answer could still come.
+TEST_F(RuntimeProgram, FrontEndsWithAProgramThatAskedAndEnded) {
+    overwrite(path("script"), "#!/bin/sh\necho 'MESSAGE QUERY CDPATH :: Where? :: '; exit 4\n");
+    std::filesystem::permissions(path("script"), std::filesystem::perms::owner_all);
+    const auto silent = [] {
+        int ends[2];
+        if (pipe(ends) == 0) {
+            dup2(ends[0], 0);
+        }
+    };
+    const ProgramResult result =
+        store_.run("kz7admin", {"front", "--", path("script")}, {.environment = {}, .inChild = silent});
+    EXPECT_EQ(result.exitCode, 4);
+    EXPECT_EQ(result.output, "Where?\nAnswer, or ABORT: \n");
+}
+
+TEST_F(RuntimeProgram, TheExampleSurvivesAnyAllocationThatFails) {
+#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+    GTEST_SKIP() << "a sanitizer's allocator lets no other be loaded before it";
+#endif
+    for (int number = 1; number < 150; ++number) {
+        const ProgramResult result = install({.environment = {"LD_PRELOAD=" KZ7_FAILING_CALLS, "KZ7_FAIL_CALL=malloc",
+                                                              "KZ7_FAIL_AT=" + std::to_string(number)},
+                                              .inChild = {}});
+        EXPECT_TRUE(result.exitCode == 0 || result.exitCode == 14) << number << ": " << result.exitCode;
+        EXPECT_TRUE(result.exitCode != 0 || result.output.find("\nMESSAGE INFO INSTALLEND :: ") != std::string::npos)
+            << number << result.output;
+    }
+}
+
 TEST_F(RuntimeProgram, FrontTakesWhateverAProgramDoes) {
     std::string bars;
     std::string complaints;

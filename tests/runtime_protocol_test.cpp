@@ -2,29 +2,12 @@
 #include <gtest/gtest.h>
 
 #include <array>
-#include <new>
 
 #include "install/runtime/observers/display_observer.h"
 #include "install/runtime/observers/external_output_pipe.h"
 #include "install/runtime/observers/protocol_lines.h"
+#include "tests/support/failing_new.h"
 #include "tests/support/runtime_machine.h"
-
-namespace kz7::test {
-
-static int allocationsUntilFailure = -1;  // of those that answer null; below 0 none fails
-
-}  // namespace kz7::test
-
-void* operator new[](std::size_t size, const std::nothrow_t&) noexcept {
-    if (kz7::test::allocationsUntilFailure >= 0 && kz7::test::allocationsUntilFailure-- == 0) {
-        return nullptr;
-    }
-    try {
-        return ::operator new[](size);
-    } catch (const std::bad_alloc&) {
-        return nullptr;
-    }
-}
 
 namespace kz7::test {
 namespace {
@@ -120,7 +103,7 @@ TEST(MachineStream, TellsAWholeRunToTheByte) {
         "PROGRESS TASK START :: CONFIGURATION :: 5 :: 11 :: 100% of the configuration\n"
         "MESSAGE QUERY CDPATH :: Go on? :: yes\n\n"
         "MESSAGE ERROR GENERAL :: Copier::configure, step 20: error 5030: The program was not run, or it failed.\n"
-        "MESSAGE ERROR GENERAL :: The program wrote: SQL0000\nMESSAGE ERROR GENERAL :: other\n"
+        "MESSAGE ERROR GENERAL :: Output of setDBMUsingProcess: SQL0000\nMESSAGE ERROR GENERAL :: other\n"
         "MESSAGE INFO UNDOSTART\nMESSAGE INFO UNDOEND\n"
         "PROGRESS TASK START :: INSTALLATION :: 4294967295 :: -1 :: a   :: %s%n%\n"
         "PROGRESS TASK END :: CONFIGURATION :: 5 :: a\n"
@@ -151,12 +134,12 @@ TEST(Pipe, AnAllocationThatFailsIsReportedAndLosesOneLine) {
         machine.openLog();
         std::string told;
         const std::string log = machine.logged([&] {
-            allocationsUntilFailure = row.failing;
+            failAllocation(row.failing);
             UREExternalOutputPipe pipe(machine.console_, machine.terminal_, machine.engine);
             for (int line = 0; line < 5; ++line) {
                 told += pipe.addQueueMessage("x") == kSuccess ? 'x' : '-';
             }
-            allocationsUntilFailure = -1;
+            endFailingAllocations();
             pipe.addQueueMessage("y");
             pipe.flushQueue();
         });
@@ -205,7 +188,9 @@ TEST(HumanStream, IsReadableAndAsWideAsTheTerminal) {
 TEST(DisplayObserver, ShowsInfosInTheInstaller) {
     RuntimeMachine machine(true);
     URE& engine = machine.engine;
-    UREDisplayObserverWI display(engine, machine.session);
+    machine.openLog();
+    const Installation at{machine.session, machine.registry_, engine};
+    UREDisplayObserverWI display(at);
     engine.registerObserver(display);
     std::string& language = machine.session.properties["KZ7_DEFAULT_LANG"];
     std::string answer = "unchanged";
@@ -225,6 +210,7 @@ TEST(DisplayObserver, ShowsInfosInTheInstaller) {
     language = "ar_AA";
     machine.say(0x04000100, "it failed");
     engine.unregisterObserver(display);
+    EXPECT_TRUE(machine.logText().ends_with("Note: iMsiGetProperty: KZ7_DEFAULT_LANG, status 0\n"));
     EXPECT_EQ(machine.shownInSession(),
               "8000000||KZ7CustomAction|Copying [Secret]\n"
               "9000000|[1]|one file\n"

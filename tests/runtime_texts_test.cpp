@@ -70,6 +70,8 @@ TEST(MessageCatalogue, GivesOwnTextsAndThoseOfAFile) {
     EXPECT_EQ(textOf(catalogue, 5058, {"A", "1", "I"}), "Database-manager parameter set: A=1, instance I");
     EXPECT_EQ(textOf(catalogue, 5512, {"A", "%s"}), "Registry variable set: A=%s ");
     EXPECT_EQ(textOf(catalogue, 1, {}), "status 5011");
+    EXPECT_EQ(catalogue.plainText(5003), "An argument is missing.");
+    EXPECT_EQ(catalogue.plainText(5057), "") << "nothing fills its placeholders";
 
     ResponseFault fault;
     ASSERT_EQ(

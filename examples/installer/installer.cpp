@@ -1,7 +1,8 @@
-// An installer program, for a front end to drive: announces its tasks, tells of each, asks where its medium is, keeps a
-// log, setup.log, in the folder of the programs' own. Answered ABORT, it undoes what it did and ends with 1; else it
-// ends with the exit code that it is given, or 0.
+// An installer program for a front end to drive: announces its tasks, reports the progress of each, asks for its medium
+// and keeps a log, setup.log, in the folder that belongs to the programs. On the answer ABORT it undoes its work and
+// exits with 1; else it exits with the code that it is given, or 0. 14: memory ran out.
 #include <cstdlib>
+#include <new>
 #include <string>
 
 #include "install/platform/platform.h"
@@ -34,23 +35,34 @@ int install(URE& engine, int exitCode) {
     return exitCode;
 }
 
-}  // namespace
-}  // namespace kz7
-
-int main(int argc, char** argv) {
-    using namespace kz7;
+// Throws std::bad_alloc when memory runs out before the installation begins.
+int runInstaller(int exitCode) {
     const auto platform = hostPlatform({.program = "kz7_installer"});
     URE engine(portsOf(*platform));
     engine.mode = kModeInstall;
     const ObserversEnd end;
     URELogObserver* log = URELogObserver::getInstance(engine);
+    UREExternalObserverMachineStream* stream = UREExternalObserverMachineStream::getInstance(engine);
     std::string folder;
-    if (platform->ownFolder(folder) == kSuccess) {
+    if (log != nullptr && platform->ownFolder(folder) == kSuccess) {
         log->setLogFile(folder + "\\setup.log");
     }
-    engine.registerObserver(*log, Takes::everything);
-    engine.registerObserver(*UREExternalObserverMachineStream::getInstance(engine));
-    const int exitCode = install(engine, argc > 1 ? std::atoi(argv[1]) : 0);
+    if (log == nullptr || stream == nullptr || engine.registerObserver(*log, Takes::everything) != kSuccess ||
+        engine.registerObserver(*stream) != kSuccess) {
+        throw std::bad_alloc();
+    }
+    const int result = install(engine, exitCode);
     log->writeHeader(true);
-    return exitCode;
+    return result;
+}
+
+}  // namespace
+}  // namespace kz7
+
+int main(int argc, char** argv) {
+    try {
+        return kz7::runInstaller(argc > 1 ? std::atoi(argv[1]) : 0);
+    } catch (const std::bad_alloc&) {
+        return kz7::hostExitCode(kz7::kOutOfMemory);
+    }
 }

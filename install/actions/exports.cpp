@@ -7,6 +7,7 @@
 #include "install/platform/installer_session.h"
 #include "install/platform/platform.h"
 #include "install/runtime/installer_properties.h"
+#include "install/runtime/observers/display_observer.h"
 #include "install/runtime/observers/observers_end.h"
 #include "install/runtime/runtime_ports.h"
 #include "install/src/registry/copy_name.h"
@@ -15,6 +16,7 @@ namespace kz7 {
 namespace {
 
 constexpr char kResponseFile[] = "RSP_FILE_PATH";
+constexpr char kMessageFile[] = "KZ7_MESSAGES";
 
 // One call: this machine, the installation, and an engine whose log is the installer's.
 class ActionCall {
@@ -23,42 +25,48 @@ public:
         : platform_(hostPlatform({.program = "kz7actions64", .ownProcess = false})),
           session_(hostInstallerSession(installation)),
           engine_(portsOf(*platform_, session_.get())),
-          at_{*session_, platform_->registry(), engine_} {
+          at_{*session_, platform_->registry(), engine_},
+          display_(at_) {
+        // Without memory for an observer the action does its work unobserved.
         if (URELogObserver* log = URELogObserver::getInstance(engine_); log != nullptr) {
             engine_.registerObserver(*log, Takes::everything);
         }
+        engine_.registerObserver(display_);
     }
 
     const Installation& at() const { return at_; }
 
-    // The end of an action that changed the registry.
-    Status ended(Status status) {
+    void readMessages() { readNamedFile(kMessageFile, &URE::readMessages); }
+    void readResponses() { readNamedFile(kResponseFile, &URE::readResponses); }
+
+    // Runs the work of an action that changes the registry, as a task with that description.
+    Status runTask(std::uint32_t description, Status (*work)(const Installation&)) {
+        constexpr std::int32_t kTask = 1;
+        const std::string_view text = engine_.messages.plainText(description);
+        engine_.startTask(0, kTask, true, text);
+        const Status status = work(at_);
+        engine_.endTask(kTask, true, text);
         const Status kept = platform_->registry().commit();
         return status != kSuccess ? status : kept;
     }
 
-    // A response file that cannot be read is reported, and none is in use then.
-    void readResponses() {
+private:
+    // Reads a file that a property names. The installer is asked, not the saved values: the user can write those.
+    void readNamedFile(const char* property, Status (URE::*read)(std::string_view, std::string_view)) {
         FixedBuffer<kPropertySize> path;
-        if (session_->getProperty(kResponseFile, path) != kSuccess || path.text().empty()) {
-            return;
-        }
-        std::vector<ResponseKeyword> keywords;
-        ResponseFault fault;
-        const Status status = ureReadRspFile(platform_->files(), path.text(), keywords, fault);
-        if (status == kSuccess) {
-            engine_.takeResponses(std::move(keywords));
-        } else {
-            engine_.report(kCodeError, "ureReadRspFile", fault.line, status, fault.reason);
+        const Status status = session_->getProperty(property, path);
+        traceProperty(at_, "iMsiGetProperty", property, status);
+        if (status == kSuccess && !path.text().empty()) {
+            (engine_.*read)(property, path.text());
         }
     }
 
-private:
     std::unique_ptr<IPlatform> platform_;
     std::unique_ptr<IInstallerSession> session_;
     URE engine_;
     ObserversEnd observersEnd_;
     Installation at_;
+    UREDisplayObserverWI display_;
 };
 
 // Nothing is thrown into the installer.
@@ -68,7 +76,7 @@ std::uint32_t call(std::uint32_t installation, Work work) {
         ActionCall action(installation);
         return work(action);
     } catch (const std::bad_alloc&) {
-        return kOutOfMemory;
+        return kNoMemory;
     } catch (...) {
         return kGeneralFailure;
     }
@@ -83,14 +91,17 @@ extern "C" {
 
 std::uint32_t iSavePropertiesForDeferred(std::uint32_t installation) {
     return kz7::call(installation, [](ActionCall& action) {
+        action.readMessages();
         action.readResponses();
-        return action.ended(kz7::iSavePropertiesForDeferred(action.at()));
+        return action.runTask(kz7::kSavingMessage, kz7::iSavePropertiesForDeferred);
     });
 }
 
 std::uint32_t iDeleteSavedProperties(std::uint32_t installation) {
-    return kz7::call(installation,
-                     [](ActionCall& action) { return action.ended(kz7::iDeleteSavedProperties(action.at())); });
+    return kz7::call(installation, [](ActionCall& action) {
+        action.readMessages();
+        return action.runTask(kz7::kDeletingMessage, kz7::iDeleteSavedProperties);
+    });
 }
 
 std::uint32_t iMsiGetProperty(std::uint32_t installation, const char* name, char* buffer, std::uint32_t* size) {
@@ -111,7 +122,7 @@ std::uint32_t iMsiSetProperty(std::uint32_t installation, const char* name, cons
 
 const char* iSubstituteCopyName(const char* text, const char* copyName, std::uint32_t outputSize, char* output) {
     try {
-        return text != nullptr ? kz7::iSubstituteCopyName(text, copyName, outputSize, output) : nullptr;
+        return kz7::iSubstituteCopyName(text, copyName, outputSize, output);
     } catch (...) {
         return nullptr;
     }

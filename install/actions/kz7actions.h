@@ -11,17 +11,28 @@
 extern "C" {
 #endif
 
-/* Custom action, immediate: saves what deferred actions will need where iMsiGetProperty() finds it. The property
- * RSP_FILE_PATH, where it is set, names the response file in use. 6045: not in an immediate action. */
+/* Custom action, immediate: deletes the values that an earlier installation saved, then saves those that deferred
+ * actions will need where iMsiGetProperty() finds them. The properties RSP_FILE_PATH and KZ7_MESSAGES, if they are set,
+ * name the response file and a file with the texts of another language. 6045: not in an immediate action.
+ *
+ * Secrets are among the saved values, in a key of the user who installs: schedule iDeleteSavedProperties as a commit
+ * action, as a rollback action, and as an immediate action for each failing exit, with the sequence numbers -2
+ * (cancelled) and -3 (failed): an installation that fails before its deferred phase runs no rollback action. The exit
+ * may come before the rollback: if rollback actions read saved values, set a property just before InstallFinalize and
+ * let the failing exits delete only without it. With rollback switched off (RollbackDisabled) neither rollback nor
+ * commit actions run: the failing exits delete in any case, and the sequence number -1 (success) needs the action as
+ * well. */
 uint32_t iSavePropertiesForDeferred(uint32_t installation);
 
-/* Custom action of any kind: deletes what was saved. */
+/* Custom action of any kind: deletes the saved values. */
 uint32_t iDeleteSavedProperties(uint32_t installation);
 
-/* Reads a property in immediate and deferred actions alike. `size` is the buffer's in bytes, and afterwards the
- * value's: without its NUL where the installer gave it, with it where it was saved. 234: the buffer is too small, and
- * `size` a hint, which may be twice what is needed; 1,024 bytes are enough for what was saved. 5021, 87: an argument is
- * missing, in an immediate and in a deferred action. */
+/* Reads a property in immediate and deferred actions alike. In a deferred action UserSID, CustomActionData and
+ * ProductCode are the installer's; a saved value counts only if the installer has none. Every other value comes from a
+ * key that the user can write: never use one as the path of a file to run or load. `size` is the buffer's in bytes, and
+ * afterwards the value's: without its NUL where the installer gave it, with it where it was saved. 234: the buffer is
+ * too small, and `size` a hint, which may be twice what is needed; 1,024 bytes are enough for what was saved. 5021, 87:
+ * an argument is missing, in an immediate and in a deferred action. */
 uint32_t iMsiGetProperty(uint32_t installation, const char* name, char* buffer, uint32_t* size);
 
 /* Sets a property; null or an empty text unsets it. */
@@ -29,7 +40,8 @@ uint32_t iMsiSetProperty(uint32_t installation, const char* name, const char* va
 
 /* Puts a copy's name in place of "$CurrentInstallationName$", or else of "$DefaultInstallationName$". With a size the
  * result goes to `output`; with 0 to a buffer of the library, which the next call overwrites. Returns `text` itself
- * where nothing was replaced; null where `text` does not fit into `output_size`. */
+ * where nothing was replaced; null where `text` does not fit into `output_size`, or `text` or a needed `output` is
+ * null. */
 const char* iSubstituteCopyName(const char* text, const char* copy_name, uint32_t output_size, char* output);
 
 #ifdef __cplusplus

@@ -74,7 +74,13 @@ ConfigurationOutcome runConfiguration(IPlatform& platform, ConfigurationRequest 
     engine.mode = kModeConfigure;
     engine.installationPath = std::move(request.location);
     engine.takeResponses(std::move(request.responses));
+    // Before the log begins, for its header. A bad file is read again afterwards: only then is its error seen.
+    const bool isBad =
+        !request.messageFile.empty() && engine.readMessages(kMessagesVariable, request.messageFile) != kSuccess;
     const Observers observers(engine, request.logFile, request.machine);
+    if (isBad) {
+        engine.readMessages(kMessagesVariable, request.messageFile);
+    }
 
     ConfigurationTarget target;
     target.instance.assign(request.instance);

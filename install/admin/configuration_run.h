@@ -11,13 +11,17 @@
 
 namespace kz7 {
 
+// The environment variable that names a file with the texts of another language.
+inline constexpr const char* kMessagesVariable = "KZ7_MESSAGES";
+
 struct ConfigurationRequest {
     std::string copy;
     std::string location;  // of the copy, one of the product's paths
     std::string instance;  // at most 8 characters; empty: all of the copy
     std::vector<ResponseKeyword> responses;
-    std::string logFile;   // one of the product's paths
-    bool machine = false;  // speaks the progress protocol
+    std::string logFile;      // one of the product's paths
+    std::string messageFile;  // the same; empty: the built-in texts
+    bool machine = false;     // speaks the progress protocol
 };
 
 struct ConfigurationOutcome {

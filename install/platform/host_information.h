@@ -14,6 +14,14 @@ enum class TimeText {
     timeOfDay,    // "%H:%M:%S"
 };
 
+// What "uname", "uname -v" and "uname -r" print on a POSIX host, each on one line. Version and release together are the
+// version number on Windows: "10" and "0.19045".
+struct OperatingSystem {
+    std::string name;
+    std::string version;
+    std::string release;
+};
+
 class IHostInformation {
 public:
     virtual ~IHostInformation() = default;
@@ -21,8 +29,8 @@ public:
     // The time now, without a NUL. kMoreData: the text and a NUL do not fit.
     virtual Status localTime(TimeText form, Buffer& text) = 0;
 
-    // The operating system's own name and version, on one line each.
-    virtual Status operatingSystem(std::string& name, std::string& version) = 0;
+    // Asks the system itself and starts no program. `system` is written on success only.
+    virtual Status operatingSystem(OperatingSystem& system) = 0;
 };
 
 // Formats a time, for the implementations. kMoreData as above.

@@ -36,6 +36,7 @@ inline constexpr Status kMoreData                = 234;
 inline constexpr Status kWaitTimedOut            = 258;   // what is waited for has not ended
 inline constexpr Status kNoMoreItems             = 259;
 inline constexpr Status kBadDirectory            = 267;   // a program's working directory is none
+inline constexpr Status kOperationAborted        = 995;   // another thread ended the operation
 inline constexpr Status kBadKey                  = 1010;
 inline constexpr Status kCannotOpen              = 1011;  // the store cannot be opened or made
 inline constexpr Status kRegistryCorrupt         = 1015;

@@ -4,7 +4,7 @@
 
 namespace kz7 {
 
-Status readStandardLine(Buffer& line) {
+Status readLineOf(const std::function<int()>& next, Buffer& line) {
     std::uint32_t length = 0;  // of what fits
     bool any = false;
     bool carriageReturn = false;  // read and not yet known to be part of the line
@@ -13,8 +13,8 @@ Status readStandardLine(Buffer& line) {
             line.data[length++] = c;
         }
     };
-    int c = std::getc(stdin);
-    for (; c != EOF && c != '\n'; c = std::getc(stdin)) {
+    int c = next();
+    for (; c != EOF && c != '\n'; c = next()) {
         if (carriageReturn) {
             keep('\r');
         }

@@ -3,6 +3,7 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 
 #include "install/platform/buffer.h"
 #include "install/platform/status.h"
@@ -24,8 +25,11 @@ public:
 
     // Reads one line of standard input without its line end; a carriage return before it belongs to the line end.
     // What does not fit is read and dropped, so that it never passes for a line of its own. kEndOfFile: nothing is
-    // left.
+    // left. kOperationAborted: endReading() was called.
     virtual Status readLine(Buffer& line) = 0;
+
+    // Ends a readLine() that waits on another thread; every later one ends at once.
+    virtual void endReading() = 0;
 
     // While on, a line feed on standard output is written as that one byte on every host.
     virtual void keepLineFeeds(bool on) = 0;
@@ -37,7 +41,7 @@ public:
     virtual void leaveInterruptsToOthers(bool on) = 0;
 };
 
-// ITerminal::readLine() on the C library's standard input, for the implementations.
-Status readStandardLine(Buffer& line);
+// ITerminal::readLine() for the implementations. `next` gives the next byte, or EOF.
+Status readLineOf(const std::function<int()>& next, Buffer& line);
 
 }  // namespace kz7

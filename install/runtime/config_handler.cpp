@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "install/runtime/guarded.h"
 #include "install/runtime/install_process.h"
 
 namespace kz7 {
@@ -19,15 +20,17 @@ std::size_t rowOf(const Table& table, std::string_view name) {
         table.begin());
 }
 
-// Whether the table has the name.
+// `missing`: the table has no such name.
 template <typename Table, typename Values>
-bool record(const Table& table, Values& values, std::string_view name, std::string_view value) {
-    const std::size_t row = rowOf(table, name);
-    if (row == table.size()) {
-        return false;
-    }
-    values[row] = value;
-    return true;
+Status record(const Table& table, Values& values, std::string_view name, std::string_view value, Status missing) {
+    return guarded([&] {
+        const std::size_t row = rowOf(table, name);
+        if (row == table.size()) {
+            return missing;
+        }
+        values[row] = std::string(value);
+        return kSuccess;
+    });
 }
 
 // A value stands in quotation marks at the end of a command line: it must not be able to leave them.
@@ -46,11 +49,11 @@ std::string withoutBackslash(std::string folder) {
 }  // namespace
 
 Status KZ7CfgHandler::recordVariable(std::string_view name, std::string_view value) {
-    return record(kRegistryVariables, variables_, name, value) ? kSuccess : kUnknownVariable;
+    return record(kRegistryVariables, variables_, name, value, kUnknownVariable);
 }
 
 Status KZ7CfgHandler::recordParameter(std::string_view name, std::string_view value) {
-    return record(kDatabaseManagerParameters, parameters_, name, value) ? kSuccess : kMissingItem;
+    return record(kDatabaseManagerParameters, parameters_, name, value, kMissingItem);
 }
 
 void KZ7CfgHandler::tellSet(Status message, std::initializer_list<Insert> inserts) {
@@ -98,7 +101,7 @@ Status KZ7CfgHandler::setVariable(const RegistryVariable& variable, const std::s
 }
 
 Status KZ7CfgHandler::getVariable(std::string_view name, std::string& value) {
-    return readVariable(name, profileName(), value);
+    return guarded([&] { return readVariable(name, profileName(), value); });
 }
 
 Status KZ7CfgHandler::readVariable(std::string_view name, std::string_view profile, std::string& value) {
@@ -121,6 +124,10 @@ Status KZ7CfgHandler::readVariable(std::string_view name, std::string_view profi
 }
 
 Status KZ7CfgHandler::set_dbm_parameter(const char* instance, std::uint32_t identifier, std::string_view value) {
+    return guarded([&] { return set(instance, identifier, value); });
+}
+
+Status KZ7CfgHandler::set(const char* instance, std::uint32_t identifier, std::string_view value) {
     std::string folder = ure_.installationPath;
     if (folder.empty()) {
         ure_.trace(kTraceError, "KZ7CfgHandler::set_dbm_parameter", 10, kNoSystemFile, {});
@@ -135,6 +142,10 @@ Status KZ7CfgHandler::set_dbm_parameter(const char* instance, std::uint32_t iden
 }
 
 Status KZ7CfgHandler::commitDBMCfg(std::string_view instance) {
+    return guarded([&] { return commitParameters(instance); });
+}
+
+Status KZ7CfgHandler::commitParameters(std::string_view instance) {
     if (ure_.installationPath.empty()) {
         return kSuccess;
     }
@@ -146,7 +157,7 @@ Status KZ7CfgHandler::commitDBMCfg(std::string_view instance) {
         const DatabaseManagerParameter& parameter = kDatabaseManagerParameters[row];
         const std::string& value = *parameters_[row];
         bool ran = false;
-        const Status status = setParameter(instance, parameter.identifier, value, folder, ran);
+        const Status status = guarded([&] { return setParameter(instance, parameter.identifier, value, folder, ran); });
         if (ran && followUp_) {
             followUp_();
         }

@@ -27,6 +27,7 @@ struct ConfigurationTarget {
     bool isInstance() const { return !instance.empty() && !profile.empty(); }
 };
 
+// No exception leaves an operation; kNoMemory: memory ran out, and the object stays usable.
 class KZ7CfgHandler {
 public:
     // The engine, which knows where the copy lies, and the profile registry outlive it.
@@ -44,7 +45,7 @@ public:
     // Sets what was recorded of variables. The last failure's code, or success.
     Status commitProfileReg();
 
-    // Sets what was recorded of parameters, for an instance; always success.
+    // Sets what was recorded of parameters, for an instance. Success whatever becomes of each.
     Status commitDBMCfg(std::string_view instance);
 
     // Sets one parameter at once; null for the instance is the global profile. A run that fails is traced and
@@ -64,6 +65,8 @@ private:
 
     std::string_view profileName() const { return target_.isInstance() ? target_.profile.view() : kGlobalProfile; }
     Status setVariable(const RegistryVariable& variable, const std::string& value);
+    Status set(const char* instance, std::uint32_t identifier, std::string_view value);
+    Status commitParameters(std::string_view instance);
     Status readVariable(std::string_view name, std::string_view profile, std::string& value);
     Status setParameter(std::string_view instance, std::uint32_t identifier, std::string_view value,
                         const std::string& folder, bool& ran);

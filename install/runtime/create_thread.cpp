@@ -2,6 +2,8 @@
 
 #include <new>
 
+#include "install/runtime/guarded.h"
+
 namespace kz7 {
 
 Status ureCreateThread(IThreads& threads, IReportSink& sink, void (*function)(void*), void* argument,
@@ -17,9 +19,10 @@ Status ureCreateThread(IThreads& threads, IReportSink& sink, void (*function)(vo
     if (start == nullptr) {
         return failed(kNoMemory, 20, kOutOfMemory);
     }
-    const Status status = threads.startThread(start, record->stackSize, record->id, record->handle);
+    const Status status =
+        guarded([&] { return threads.startThread(start, record->stackSize, record->id, record->handle); });
     if (status != kSuccess) {
-        return failed(kThreadStartFailed, 30, status);
+        return failed(status == kNoMemory ? kNoMemory : kThreadStartFailed, 30, status);
     }
     return kSuccess;
 }

@@ -5,6 +5,8 @@
 #include <cstring>
 #include <new>
 
+#include "install/runtime/guarded.h"
+
 namespace kz7 {
 namespace {
 
@@ -131,17 +133,19 @@ struct InstallProcess::Reader {
 };
 
 InstallProcess::InstallProcess(IProcessHost& host, IThreads& threads, IReportSink& sink, const char* command,
-                               const char* workingDirectory, bool wrapperMode, bool wrapperSwitch, bool spare)
+                               const char* workingDirectory, bool wrapperMode, bool wrapperSwitch, bool)
     : host_(host),
       threads_(threads),
       sink_(sink),
       wrapperSwitch_(wrapperSwitch),
       errorWriteEnd_(host),
       outputWriteEnd_(host),
-      wrapperMode_(wrapperMode),
-      workingDirectory_(workingDirectory != nullptr ? std::make_unique<std::string>(workingDirectory) : nullptr),
-      spare_(spare) {
-    if (build(command) == kNoProgramType) {
+      wrapperMode_(wrapperMode) {
+    built_ = guarded([&] {
+        workingDirectory_ = workingDirectory != nullptr ? workingDirectory : "";
+        return build(command);
+    });
+    if (built_ == kNoProgramType) {
         setCommandLine(command);
     }
 }
@@ -156,8 +160,8 @@ std::string_view InstallProcess::lastMessage() {
 
 Status InstallProcess::buildCommandLine(IProcessHost& host, CommandLine& commandLine, std::string_view command) {
     std::string whole;
-    const Status status = wholeCommandLine(host, whole, command);
-    commandLine.assign(whole);
+    const Status status = guarded([&] { return wholeCommandLine(host, whole, command); });
+    commandLine.assign(status == kSuccess ? std::string_view(whole) : std::string_view{});
     return status;
 }
 
@@ -212,9 +216,10 @@ void InstallProcess::setCommandLine(std::string_view whole) {
     commandLineCut_ = !commandLine_.assign(whole);
 }
 
-void InstallProcess::setCommand(const char* command) {
+Status InstallProcess::setCommand(const char* command) {
     giveUpRun();
-    build(command);
+    built_ = guarded([&] { return build(command); });
+    return built_;
 }
 
 Status InstallProcess::execute(bool wait, bool trace) {
@@ -222,8 +227,15 @@ Status InstallProcess::execute(bool wait, bool trace) {
     if (trace) {
         sink_.trace(kTraceError, "InstallProcess::execute", 10, kSuccess, commandLine_.view());
     }
+    if (built_ == kNoMemory) {
+        return kNoMemory;
+    }
     const SlotsRestored restored(host_);
-    return run(wait);
+    const Status status = guarded([&] { return run(wait); });
+    if (!executed_) {
+        giveUpRun();
+    }
+    return status;
 }
 
 Status InstallProcess::run(bool wait) {
@@ -239,9 +251,8 @@ Status InstallProcess::run(bool wait) {
     // without reader is a closed pipe to the program.
     startReader(outputReadEnd, standardOutputText_, outputReader_);
     const Status status = startReader(errorReadEnd, standardErrorText_, errorReader_);
-    const ProcessStart start{commandLine_.view(), workingDirectory_ ? std::string_view(*workingDirectory_) : "",
-                             outputWriteEnd_.get(), errorWriteEnd_.get()};
-    // Deliberate: a command line that was cut is not run; it would do something else than what was asked for.
+    const ProcessStart start{commandLine_.view(), workingDirectory_, outputWriteEnd_.get(), errorWriteEnd_.get()};
+    // Deliberate: a truncated command line is not run; it would do something else than the command.
     const Status created = commandLineCut_ ? kFilenameExceedsRange : host_.startProcess(start, process_);
     if (wait) {
         waitOrWake();

@@ -2,7 +2,6 @@
 // starts it hidden with its output captured, waits, and hands the captured output out or posts it.
 #pragma once
 
-#include <array>
 #include <atomic>
 #include <cstdint>
 #include <memory>
@@ -34,10 +33,11 @@ class InstallProcess {
 public:
     // `command` may be null, which leaves nothing to run; `workingDirectory` null is this process's own.
     // `wrapperMode` runs the command as a statement of the product's command processor, with the first or the
-    // second of its option texts by `wrapperSwitch`. The ports and the sink outlive the object.
+    // second of its option texts by `wrapperSwitch`; the last argument has no effect. The ports and the sink outlive
+    // the object. Without memory for the command, `execute` returns kNoMemory.
     InstallProcess(IProcessHost& host, IThreads& threads, IReportSink& sink, const char* command,
                    const char* workingDirectory = nullptr, bool wrapperMode = false, bool wrapperSwitch = false,
-                   bool spare = false);
+                   bool = false);
 
     // Wakes and joins both readers. A program that still runs is neither killed nor waited for. Where a
     // program that has ended left its pipes to another, the readers are waited for until that one ends.
@@ -48,7 +48,7 @@ public:
     // Starts the program; with `wait`, returns once it has ended or the timeout passed, which is infinite
     // unless an earlier wait set another or an earlier program could not be started. Returns the status of starting the
     // reader of standard error and nothing else: whether the program runs is for the wait to say. An earlier run of the
-    // object is given up.
+    // object is given up. kNoMemory: nothing runs.
     Status execute(bool wait, bool trace);
 
     // Waits for the program and its readers. kNotExecuted; kExitCodeUnavailable: the program could not be
@@ -68,8 +68,8 @@ public:
     void postStandardOutput(std::string_view source, std::uint32_t flags);
     void postStandardError(std::string_view source, std::uint32_t flags);
 
-    // Gives the object another command to run; one without a known program type leaves nothing to run.
-    void setCommand(const char* command);
+    // Gives the object another command to run. kNoProgramType, kNoMemory: it then has nothing to run.
+    Status setCommand(const char* command);
 
     // The command line of a command, or kNoProgramType and an empty one.
     static Status buildCommandLine(IProcessHost& host, CommandLine& commandLine, std::string_view command);
@@ -112,11 +112,9 @@ protected:
     FixedText<256> messageText_;
 
 private:
-    [[maybe_unused]] std::array<char, 16> reservedText_{};
     Collected standardErrorText_;
     Collected standardOutputText_;
     bool wrapperSwitch_;
-    [[maybe_unused]] void* reservedPointer_ = nullptr;
 
 protected:
     std::int32_t resultCode_ = 0;
@@ -128,13 +126,11 @@ private:
     OwnedStream outputWriteEnd_;
     std::shared_ptr<std::atomic<bool>> stop_;
     ProcessInformation process_;
-    [[maybe_unused]] bool wrapperEnvironment_ = false;  // no runtime here offers that environment
-    [[maybe_unused]] bool secondEnvironment_ = false;
     std::uint32_t timeout_ = kInfiniteWait;  // milliseconds
     bool executed_ = false;
     bool wrapperMode_;
-    std::unique_ptr<std::string> workingDirectory_;
-    [[maybe_unused]] bool spare_;
+    std::string workingDirectory_;  // empty: this process's own
+    Status built_ = kSuccess;       // of the command line
 };
 
 }  // namespace kz7

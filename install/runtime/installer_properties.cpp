@@ -1,8 +1,10 @@
 #include "install/runtime/installer_properties.h"
 
+#include <algorithm>
 #include <array>
 #include <string>
 
+#include "install/runtime/guarded.h"
 #include "install/runtime/saved_property_names.h"
 #include "install/src/registry/copy_name.h"
 #include "install/src/registry/registry_access.h"
@@ -14,6 +16,7 @@ constexpr std::string_view kSavedProperties = "SOFTWARE\\NVQ\\KZ7\\TEMP\\PROPERT
 constexpr std::string_view kTableQuery = "SELECT `Property` FROM `Property` ORDER BY `Property`";
 constexpr char kUserSid[] = "UserSID";
 constexpr char kSourceFolder[] = "SOURCEDIR";
+constexpr std::string_view kResolveSource = "ResolveSource";
 constexpr char kBaseClientSelected[] = "BASE_CLIENT_BIN_SELECTED";
 constexpr std::string_view kBaseClient = "BASE_CLIENT.bin";
 constexpr std::string_view kDocumentationProduct = "PROD_DOCE";
@@ -40,7 +43,7 @@ Status readFromInstaller(IInstallerSession& session, const char* name, char* buf
     return status;
 }
 
-// The root of the user who installs. One that is not known or does not open is, without a word, the caller.
+// The root of the user who installs; silently that of the caller when the user is not known or the root does not open.
 class UserRoot {
 public:
     UserRoot(IRegistryStore& registry, std::string_view sid) : opened_(registry) {
@@ -98,11 +101,18 @@ private:
 // The key that properties are saved in.
 class SavedProperties {
 public:
-    explicit SavedProperties(const Installation& at) : at_(at), key_(at.registry) {
-        const UserRoot root = rootOfUser(at);
-        const Status status = at.registry.createKey(root.key(), kSavedProperties, {}, kKeyFull, key_.receive());
-        if (status != kSuccess) {
+    // Values of an earlier installation, secrets among them, must not be read in this one.
+    explicit SavedProperties(const Installation& at) : at_(at), root_(rootOfUser(at)), key_(at.registry) {
+        const Status status = deleteTree(at.registry, root_.key(), kSavedProperties, 0, {}, {});
+        if (status != kSuccess && !isNotFound(status)) {
             at.ure.trace(kTraceError, "iSavePropertiesForDeferred", 20, status, kSavedProperties);
+        }
+    }
+
+    void open() {
+        const Status status = at_.registry.createKey(root_.key(), kSavedProperties, {}, kKeyFull, key_.receive());
+        if (status != kSuccess) {
+            at_.ure.trace(kTraceError, "iSavePropertiesForDeferred", 30, status, kSavedProperties);
         }
     }
 
@@ -159,15 +169,13 @@ private:
         const PropertyValue value(at_, name);
         if (name == std::string_view(kSourceFolder) && value.status == kSuccess && value.text().empty() &&
             at_.ure.productAbbreviation == kDocumentationProduct) {
-            at_.session.doAction("ResolveSource");
-            saveValue(name, PropertyValue(at_, name));
-        } else {
-            saveValue(name, value);
-        }
-    }
-
-    void saveValue(const char* name, const PropertyValue& value) {
-        if (value.status == kSuccess) {
+            traceProperty(at_, "MsiDoAction", kResolveSource, at_.session.doAction(kResolveSource));
+            const PropertyValue resolved(at_, name);
+            traceProperty(at_, "iMsiGetProperty", name, resolved.status);
+            if (resolved.status == kSuccess) {
+                write(name, resolved.text());
+            }
+        } else if (value.status == kSuccess) {
             write(name, value.text());
         } else {
             traceProperty(at_, "iMsiGetProperty", name, value.status);
@@ -187,48 +195,75 @@ private:
     }
 
     const Installation& at_;
+    UserRoot root_;
     OwnedKey key_;
 };
 
-}  // namespace
+bool isReadableWhenScheduled(std::string_view name) {
+    return std::find(kReadableWhenScheduled.begin(), kReadableWhenScheduled.end(), name) !=
+           kReadableWhenScheduled.end();
+}
 
-Status iMsiGetProperty(const Installation& at, const char* name, char* buffer, std::uint32_t* size) {
+// A value as it was saved. Any status but success: none that fits.
+Status readSaved(const Installation& at, const char* name, char* buffer, std::uint32_t* size) {
+    FixedBuffer<kPropertySize> sid;
+    const bool known = at.session.getProperty(kUserSid, sid) == kSuccess;
+    const UserRoot root(at.registry, known ? sid.text() : std::string_view{});
+    // Deliberate: the path of the key passes through the process-wide buffer of the copy-name substitution; callers
+    // that still read an earlier result there find this path.
+    overwriteSharedOutput(kSavedProperties);
+    OwnedKey key(at.registry);
+    Buffer saved(buffer, *size);
+    Status status = at.registry.openKey(root.key(), kSavedProperties, kKeyFull, key.receive());
+    if (status == kSuccess) {
+        status = queryText(at.registry, key.get(), name, saved);
+    }
+    if (status == kSuccess) {
+        // Deliberate: here the size counts the terminator, as the registry does; the installer's does not.
+        *size = saved.size;
+        if (saved.size < saved.capacity) {
+            buffer[saved.size] = '\0';
+        }
+    }
+    return status;
+}
+
+Status readProperty(const Installation& at, const char* name, char* buffer, std::uint32_t* size) {
     if (!isDeferred(at.session)) {
         return name == nullptr || buffer == nullptr ? kMissingItem : readFromInstaller(at.session, name, buffer, size);
     }
     if (name == nullptr || buffer == nullptr || size == nullptr) {
         return kInvalidParameter;
     }
-    FixedBuffer<kPropertySize> sid;
-    const bool known = at.session.getProperty(kUserSid, sid) == kSuccess;
-    const UserRoot root(at.registry, known ? sid.text() : std::string_view{});
-    // Deliberate: the path of the key passes through the process-wide buffer of the copy-name substitution; whoever
-    // still reads an earlier result there finds this path.
-    overwriteSharedOutput(kSavedProperties);
-    OwnedKey key(at.registry);
-    Buffer saved(buffer, *size);
-    if (at.registry.openKey(root.key(), kSavedProperties, kKeyFull, key.receive()) == kSuccess &&
-        queryText(at.registry, key.get(), name, saved) == kSuccess) {
-        // Deliberate: here the size counts the terminator, as the registry does; the installer's does not.
-        *size = saved.size;
-        if (saved.size < saved.capacity) {
-            buffer[saved.size] = '\0';
+    const std::uint32_t room = *size;
+    if (isReadableWhenScheduled(name)) {
+        // The user can write the saved values: a planted UserSID would lead a deletion to another user's key.
+        const Status status = readFromInstaller(at.session, name, buffer, size);
+        if (status != kSuccess || *size != 0) {
+            return status;
         }
-        return kSuccess;
+        *size = room;
     }
-    return readFromInstaller(at.session, name, buffer, size);
+    return readSaved(at, name, buffer, size) == kSuccess ? kSuccess : readFromInstaller(at.session, name, buffer, size);
 }
 
-Status iMsiSetProperty(const Installation& at, const char* name, const char* value) {
-    return name == nullptr ? kInvalidParameter : at.session.setProperty(name, value != nullptr ? value : "");
+// The installation's own name of the product counts more than that of a response file.
+void takeProduct(const Installation& at) {
+    const PropertyValue product(at, kProductKeyword);
+    traceProperty(at, "iMsiGetProperty", kProductKeyword, product.status);
+    if (!product.text().empty()) {
+        at.ure.productAbbreviation = product.text();
+    }
 }
 
-Status iSavePropertiesForDeferred(const Installation& at) {
+Status saveProperties(const Installation& at) {
     OwnedSessionHandle database(at.session);
     if (at.session.activeDatabase(database.receive()) != kSuccess) {
         at.ure.trace(kTraceError, "iSavePropertiesForDeferred", 10, kNoInstallationDatabase, {});
         return kNoInstallationDatabase;
     }
+    SavedProperties saved(at);
+    takeProduct(at);
     OwnedSessionHandle view(at.session);
     Status status = at.session.openView(database.get(), kTableQuery, view.receive());
     if (status == kSuccess) {
@@ -237,7 +272,7 @@ Status iSavePropertiesForDeferred(const Installation& at) {
     if (status != kSuccess) {
         return status;
     }
-    SavedProperties saved(at);
+    saved.open();
     const char* selected = FeatureRequest(at.session, kBaseClient).isSelected ? "Y" : "N";
     traceProperty(at, "iMsiSetProperty", kBaseClientSelected, iMsiSetProperty(at, kBaseClientSelected, selected));
     status = saved.saveTable(view.get());
@@ -247,10 +282,28 @@ Status iSavePropertiesForDeferred(const Installation& at) {
     return status;
 }
 
+}  // namespace
+
+Status iMsiGetProperty(const Installation& at, const char* name, char* buffer, std::uint32_t* size) {
+    return guarded([&] { return readProperty(at, name, buffer, size); });
+}
+
+Status iMsiSetProperty(const Installation& at, const char* name, const char* value) {
+    return guarded([&] {
+        return name == nullptr ? kInvalidParameter : at.session.setProperty(name, value != nullptr ? value : "");
+    });
+}
+
+Status iSavePropertiesForDeferred(const Installation& at) {
+    return guarded([&] { return saveProperties(at); });
+}
+
 Status iDeleteSavedProperties(const Installation& at) {
-    const UserRoot root = rootOfUser(at);
-    const Status status = deleteTree(at.registry, root.key(), kSavedProperties, 0, {}, {});
-    return isNotFound(status) ? kSuccess : status;
+    return guarded([&] {
+        const UserRoot root = rootOfUser(at);
+        const Status status = deleteTree(at.registry, root.key(), kSavedProperties, 0, {}, {});
+        return isNotFound(status) ? kSuccess : status;
+    });
 }
 
 void traceProperty(const Installation& at, std::string_view operation, std::string_view name, Status status) {

@@ -4,6 +4,8 @@
 #include <array>
 #include <charconv>
 
+#include "install/runtime/guarded.h"
+
 namespace kz7 {
 namespace {
 
@@ -15,8 +17,8 @@ struct Row {
 // Prefixes and titles are joined to what follows without a blank of their own.
 // clang-format off
 constexpr std::array kTexts = {
-    Row{ 997, "The program wrote: %s"},
-    Row{ 999, "The program wrote to its error output: %s"},
+    Row{ 997, "Output of %s: %s"},
+    Row{ 999, "Error output of %s: %s"},
     Row{2000, "Installation started: "},
     Row{2001, "Installation ended: "},
     Row{2002, "WARNING: "},
@@ -39,6 +41,8 @@ constexpr std::array kTexts = {
     Row{2035, "%s [%s] (ABORT to stop): "},
     Row{2036, "%s"},
     Row{2037, "The installation medium was not found. Where is it?"},
+    Row{2040, "Saving the installer properties"},
+    Row{2041, "Deleting the saved installer properties"},
     Row{2100, "Update started: "},
     Row{2101, "Update ended: "},
     Row{2200, "Removal started: "},
@@ -101,6 +105,14 @@ bool parseNumber(std::string_view name, std::uint32_t& number) {
 }  // namespace
 
 Status MessageCatalogue::load(std::string_view file, ResponseFault& fault) {
+    const Status status = guarded([&] { return loadLines(file, fault); });
+    if (status == kNoMemory) {
+        fault = {0, kNoMemoryReason};
+    }
+    return status;
+}
+
+Status MessageCatalogue::loadLines(std::string_view file, ResponseFault& fault) {
     std::vector<ResponseKeyword> rows;
     const Status status = parseResponseFile(file, rows, fault);
     if (status != kSuccess) {
@@ -128,6 +140,11 @@ std::string_view MessageCatalogue::pattern(std::uint32_t number) const {
         return found->second;
     }
     return ownText(number);
+}
+
+std::string_view MessageCatalogue::plainText(std::uint32_t number) const {
+    const std::string_view text = pattern(number);
+    return placeholders(text).empty() ? text : std::string_view{};
 }
 
 Status MessageCatalogue::copyText(std::uint32_t number, std::span<const Insert> inserts, char* room, std::size_t size,

@@ -36,25 +36,30 @@ inline constexpr std::uint32_t kErrorMessage          = 2034;  // text
 inline constexpr std::uint32_t kQuestionMessage       = 2035;  // text, default value
 inline constexpr std::uint32_t kTextMessage           = 2036;  // text
 inline constexpr std::uint32_t kMediumNeededMessage   = 2037;
+inline constexpr std::uint32_t kSavingMessage         = 2040;
+inline constexpr std::uint32_t kDeletingMessage       = 2041;
 // clang-format on
 
 class MessageCatalogue {
 public:
-    // Takes over the texts of a catalogue file: the lines of a response file, a number or GENERIC_DLG_TITLE
-    // as the name. A text has the placeholders of the one it replaces, in their order. On kInvalidData nothing
-    // is taken over and `fault` says why.
+    // Reads the texts of a catalogue file, which replace the built-in ones: the lines of a response file, with a number
+    // or GENERIC_DLG_TITLE as the name. A text has the placeholders of the one it replaces, in the same order. On
+    // failure, kInvalidData or kNoMemory, the texts stay as they are and `fault` has the reason.
     Status load(std::string_view file, ResponseFault& fault);
 
     // The text with its inserts, as UREInfo::copyText() gives it.
     Status copyText(std::uint32_t number, std::span<const Insert> inserts, char* room, std::size_t size,
                     std::size_t& length) const;
 
-    bool has(std::uint32_t number) const { return pattern(number).data() != nullptr; }
-
-    // As it stands, for texts without placeholders; empty for a missing one.
+    // The text with its placeholders; empty for a missing one.
     std::string_view pattern(std::uint32_t number) const;
 
+    // The text if it has no placeholders; else empty.
+    std::string_view plainText(std::uint32_t number) const;
+
 private:
+    Status loadLines(std::string_view file, ResponseFault& fault);
+
     std::map<std::uint32_t, std::string> loaded_;
 };
 

@@ -1,5 +1,6 @@
 #include "install/runtime/profile_registry.h"
 
+#include "install/runtime/guarded.h"
 #include "install/src/registry/copy_layout.h"
 #include "install/src/registry/copy_name.h"
 #include "install/src/registry/registry_access.h"
@@ -27,7 +28,9 @@ std::string ProfileRegistry::keyOf(std::string_view instance) const {
 }
 
 Status ProfileRegistry::set(std::string_view instance, std::string_view variable, std::string_view value) {
-    return value.empty() ? remove(keyOf(instance), variable) : write(profileOf(instance), variable, value);
+    return guarded([&] {
+        return value.empty() ? remove(keyOf(instance), variable) : write(profileOf(instance), variable, value);
+    });
 }
 
 // Below the open key of the copy: one that is removed meanwhile does not come back.
@@ -51,7 +54,15 @@ Status ProfileRegistry::remove(const std::string& path, std::string_view variabl
     return named(status != kSuccess ? status : registry_.deleteValue(key.get(), variable));
 }
 
+Status ProfileRegistry::settle() {
+    return guarded([&] { return registry_.commit(); });
+}
+
 Status ProfileRegistry::get(std::string_view instance, std::string_view variable, std::string& value) {
+    return guarded([&] { return read(instance, variable, value); });
+}
+
+Status ProfileRegistry::read(std::string_view instance, std::string_view variable, std::string& value) {
     OwnedKey key(registry_);
     FixedBuffer<kVariableSize> data;
     Status status = registry_.openKey(KeyHandle::localMachine, keyOf(instance), kKeyQueryValue, key.receive());

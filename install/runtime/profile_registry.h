@@ -10,7 +10,7 @@ namespace kz7 {
 
 inline constexpr std::string_view kGlobalProfile = "KZ7GLOBALPF";  // the instance name that stands for all of a copy
 
-// The store outlives it. Changes wait for settle().
+// The store outlives it. Changes wait for settle(). No exception leaves an operation; kNoMemory: memory ran out.
 class ProfileRegistry {
 public:
     ProfileRegistry(IRegistryStore& registry, std::string_view copyName);
@@ -20,13 +20,14 @@ public:
 
     // Ends what the store holds for this writer alone: others, a program that is started too, see what was set and
     // may write.
-    Status settle() { return registry_.commit(); }
+    Status settle();
 
     // kVariableNotThere: it is not set; kMoreData: it is longer than any variable can be.
     Status get(std::string_view instance, std::string_view variable, std::string& value);
 
 private:
     Status write(const std::string& profile, std::string_view variable, std::string_view value);
+    Status read(std::string_view instance, std::string_view variable, std::string& value);
     Status remove(const std::string& key, std::string_view variable);
     std::string keyOf(std::string_view instance) const;
 

@@ -24,7 +24,7 @@ public:
     // An error report, for the log and the front end.
     virtual void error(std::uint32_t code, std::string_view function, std::uint32_t probe, Status value) = 0;
 
-    // Message `number` of the catalogue with one insert, for every observer.
+    // Message `number` of the catalogue, for every observer; its inserts are the source and the text.
     virtual void post(std::uint32_t number, std::uint32_t flags, std::string_view source, std::string_view insert) = 0;
 };
 

@@ -2,6 +2,8 @@
 
 #include <algorithm>
 
+#include "install/runtime/guarded.h"
+
 namespace kz7 {
 namespace {
 
@@ -56,9 +58,7 @@ const char* parseLine(std::string_view line, ResponseKeyword& keyword) {
     return parseValue(trimmed(line.substr(equals + 1)), keyword.value);
 }
 
-}  // namespace
-
-Status parseResponseFile(std::string_view file, std::vector<ResponseKeyword>& keywords, ResponseFault& fault) {
+Status parseLines(std::string_view file, std::vector<ResponseKeyword>& keywords, ResponseFault& fault) {
     std::vector<ResponseKeyword> found;
     file.remove_prefix(file.starts_with(kUtf8Mark) ? kUtf8Mark.size() : 0);
     for (std::uint32_t number = 1; !file.empty(); ++number) {
@@ -82,12 +82,22 @@ Status parseResponseFile(std::string_view file, std::vector<ResponseKeyword>& ke
     return kSuccess;
 }
 
+}  // namespace
+
+Status parseResponseFile(std::string_view file, std::vector<ResponseKeyword>& keywords, ResponseFault& fault) {
+    const Status status = guarded([&] { return parseLines(file, keywords, fault); });
+    if (status == kNoMemory) {
+        fault = {0, kNoMemoryReason};
+    }
+    return status;
+}
+
 Status ureReadRspFile(IFileSystem& files, std::string_view path, std::vector<ResponseKeyword>& keywords,
                       ResponseFault& fault) {
     std::string file;
-    const Status status = files.readFile(path, file);
+    const Status status = guarded([&] { return files.readFile(path, file); });
     if (status != kSuccess) {
-        fault = {0, "it cannot be read"};
+        fault = {0, kUnreadableReason};
         return status;
     }
     return parseResponseFile(file, keywords, fault);

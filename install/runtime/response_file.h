@@ -19,15 +19,18 @@ struct ResponseKeyword {
 };
 
 struct ResponseFault {
-    std::uint32_t line = 0;
+    std::uint32_t line = 0;  // 0: the file as a whole
     std::string_view reason;
 };
 
-// All keywords in file order, one that comes twice too. kInvalidData: `fault` names the first bad line, and
-// nothing is given.
+inline constexpr std::string_view kUnreadableReason = "it cannot be read";
+inline constexpr std::string_view kNoMemoryReason = "there is not enough memory";
+
+// All keywords in file order, repeated ones too. On failure, kInvalidData or kNoMemory, `fault` has the first bad line
+// and its reason, and `keywords` stays as it is.
 Status parseResponseFile(std::string_view file, std::vector<ResponseKeyword>& keywords, ResponseFault& fault);
 
-// The same for a file; whatever else went wrong with it is its own status and line 0.
+// The same for a file. A file that cannot be read gives the file system's status.
 Status ureReadRspFile(IFileSystem& files, std::string_view path, std::vector<ResponseKeyword>& keywords,
                       ResponseFault& fault);
 

@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <array>
 
+#include "install/runtime/guarded.h"
+
 namespace kz7 {
 namespace {
 
@@ -12,17 +14,56 @@ constexpr Status kLastOwnStatus = 6100;
 
 }  // namespace
 
-void URE::takeResponses(std::vector<ResponseKeyword> keywords) {
-    responses = std::move(keywords);
-    for (const ResponseKeyword& keyword : responses) {
-        if (equalsIgnoreCase(keyword.name, kProductKeyword)) {
-            productAbbreviation = keyword.value;
+Status URE::takeResponses(std::vector<ResponseKeyword> keywords) {
+    return guarded([&] {
+        for (const ResponseKeyword& keyword : keywords) {
+            if (equalsIgnoreCase(keyword.name, kProductKeyword)) {
+                productAbbreviation = keyword.value;
+            }
         }
-    }
+        responses = std::move(keywords);
+        return kSuccess;
+    });
 }
 
-void URE::registerObserver(IObserver& observer, Takes takes) {
-    observers_.push_back({&observer, takes});
+Status URE::readResponses(std::string_view setting, std::string_view path) {
+    std::vector<ResponseKeyword> keywords;
+    ResponseFault fault;
+    const Status status = ureReadRspFile(ports.files, path, keywords, fault);
+    if (status != kSuccess) {
+        reportFile("ureReadRspFile", setting, path, status, fault);
+        return status;
+    }
+    return takeResponses(std::move(keywords));
+}
+
+Status URE::readMessages(std::string_view setting, std::string_view path) {
+    std::string file;
+    ResponseFault fault{0, kUnreadableReason};
+    Status status = guarded([&] { return ports.files.readFile(path, file); });
+    if (status == kSuccess) {
+        status = messages.load(file, fault);
+    }
+    if (status != kSuccess) {
+        reportFile("MessageCatalogue::load", setting, path, status, fault);
+    }
+    return status;
+}
+
+void URE::reportFile(std::string_view function, std::string_view setting, std::string_view path, Status status,
+                     const ResponseFault& fault) {
+    char room[kMessageSize];
+    const std::array<Insert, 4> inserts = {setting, path, fault.reason, fault.line};
+    const std::size_t length =
+        composeInto(room, sizeof room, fault.line == 0 ? "%s: %s: %s" : "%s: %s: %s (line %u)", inserts);
+    report(kCodeError, function, fault.line == 0 ? 10 : 20, status, {room, std::min(length, sizeof room)});
+}
+
+Status URE::registerObserver(IObserver& observer, Takes takes) {
+    return guarded([&] {
+        observers_.push_back({&observer, takes});
+        return kSuccess;
+    });
 }
 
 void URE::unregisterObserver(IObserver& observer) {
@@ -30,14 +71,14 @@ void URE::unregisterObserver(IObserver& observer) {
 }
 
 void URE::handOut(UREBaseInfo& info, bool isTrace) {
-    // By index: an observer may cause infos of its own meanwhile.
+    // By index: an observer may register or unregister observers meanwhile.
     for (std::size_t i = 0; i < observers_.size(); ++i) {
         const Registered each = observers_[i];
         if (each.isCalled || (isTrace && each.takes != Takes::everything)) {
             continue;
         }
         observers_[i].isCalled = true;
-        each.observer->update(info);
+        guarded([&] { return each.observer->update(info); });
         if (i < observers_.size() && observers_[i].observer == each.observer) {
             observers_[i].isCalled = false;
         }
@@ -46,7 +87,10 @@ void URE::handOut(UREBaseInfo& info, bool isTrace) {
 
 void URE::raiseProgress(UREProgressInfo info) {
     if (progressObserver_ != nullptr) {
-        progressObserver_->progress(kCustomActionName, info);
+        guarded([&] {
+            progressObserver_->progress(kCustomActionName, info);
+            return kSuccess;
+        });
     }
     handOut(info, false);
 }
@@ -79,16 +123,19 @@ UREInfo::Response URE::ask(std::uint32_t number, std::uint32_t textNumber, std::
     UREInfo info(messages, kClassQuestion << 16 | number, textNumber, inserts);
     info.ask(defaultValue);
     handOut(info, false);
-    if (info.response() == UREInfo::Response::answered) {
-        answer = info.answer();
-    }
-    return info.response();
+    const Status kept = guarded([&] {
+        if (info.response() == UREInfo::Response::answered) {
+            answer = info.answer();
+        }
+        return kSuccess;
+    });
+    return kept == kSuccess ? info.response() : UREInfo::Response::none;
 }
 
 void URE::raiseReport(std::uint32_t code, std::string_view function, std::uint32_t probe, Status value,
                       std::string_view text, bool isTrace) {
     if (text.empty() && value >= kFirstOwnStatus && value <= kLastOwnStatus) {
-        text = messages.pattern(value);
+        text = messages.plainText(value);
     }
     const std::array<Insert, 4> with = {function, probe, value, text};
     const std::array<Insert, 3> without = {function, probe, text};
@@ -114,7 +161,7 @@ void URE::error(std::uint32_t code, std::string_view function, std::uint32_t pro
 }
 
 void URE::post(std::uint32_t number, std::uint32_t flags, std::string_view source, std::string_view insert) {
-    const std::array<Insert, 2> inserts = {insert, source};
+    const std::array<Insert, 2> inserts = {source, insert};
     message(flags, number, inserts);
 }
 

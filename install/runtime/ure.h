@@ -31,7 +31,7 @@ inline constexpr std::uint32_t kModeRemove    = 0x04;
 inline constexpr std::uint32_t kModeConfigure = 0x10;
 // clang-format on
 
-inline constexpr std::string_view kProductKeyword = "PROD";  // of a response file
+inline constexpr char kProductKeyword[] = "PROD";  // of a response file, and the installer property of that name
 
 // They outlive the engine.
 struct RuntimePorts {
@@ -47,7 +47,8 @@ struct RuntimePorts {
 // What an observer takes. Traces go to the log alone: a success is never told to a front end as an error.
 enum class Takes { everything, allButTraces };
 
-// One thread.
+// No exception leaves an operation. Statuses are kSuccess or kNoMemory, with the object unchanged, unless stated
+// otherwise. One thread.
 class URE final : public IObservable, public IReportSink {
 public:
     explicit URE(const RuntimePorts& runtimePorts) : ports(runtimePorts) {}
@@ -59,12 +60,17 @@ public:
     std::string installationPath;
     std::vector<ResponseKeyword> responses;  // of the response file, in its order; empty without one
 
-    // Keeps what a response file says, its kProductKeyword as the product's abbreviation too.
-    void takeResponses(std::vector<ResponseKeyword> keywords);
+    // Keeps the keywords of a response file; its kProductKeyword is the product's abbreviation.
+    Status takeResponses(std::vector<ResponseKeyword> keywords);
 
-    // Each is called while it is registered; the caller unregisters it before it goes. What an observer causes
-    // while it is being called does not reach it: it never reports into itself.
-    void registerObserver(IObserver& observer, Takes takes = Takes::allButTraces);
+    // Read the response file or the message catalogue at `path`. A file that cannot be read or has a bad line is
+    // reported with `setting`, the property or variable that names it, and changes nothing. The reader's status.
+    Status readResponses(std::string_view setting, std::string_view path);
+    Status readMessages(std::string_view setting, std::string_view path);
+
+    // Each is called while it is registered; the caller unregisters it before it is destroyed. Infos that an observer
+    // raises while it is being called do not reach it, and what it throws is dropped.
+    Status registerObserver(IObserver& observer, Takes takes = Takes::allButTraces);
     void unregisterObserver(IObserver& observer);
 
     // Null: none. It gets the progress of tasks besides the observers.
@@ -80,8 +86,8 @@ public:
     void message(std::uint32_t code, std::uint32_t textNumber, std::span<const Insert> inserts);
     void traceMessage(std::uint32_t textNumber, std::span<const Insert> inserts);
 
-    // Asks question `number`; `answer` is what the user answered, and unchanged for any other response. The
-    // caller decides what an unanswered question means.
+    // Asks question `number`; `answer` is what the user answered, and unchanged for any other response. An answer that
+    // no memory is left for is no response. The caller decides what an unanswered question means.
     UREInfo::Response ask(std::uint32_t number, std::uint32_t textNumber, std::span<const Insert> inserts,
                           std::string_view defaultValue, std::string& answer);
 
@@ -103,6 +109,8 @@ private:
 
     void handOut(UREBaseInfo& info, bool isTrace);
     void raiseProgress(UREProgressInfo info);
+    void reportFile(std::string_view function, std::string_view setting, std::string_view path, Status status,
+                    const ResponseFault& fault);
     void raiseReport(std::uint32_t code, std::string_view function, std::uint32_t probe, Status value,
                      std::string_view text, bool isTrace);
 

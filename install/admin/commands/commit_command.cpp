@@ -2,6 +2,7 @@
 
 #include <CLI/CLI.hpp>
 #include <algorithm>
+#include <cstdlib>
 
 #include "install/admin/configuration_run.h"
 #include "install/admin/copy_location.h"
@@ -80,6 +81,18 @@ Answer findLog(Admin& admin, const Words& words, ConfigurationRequest& request) 
                : admin.fault(compose("%s: the log cannot be written: error %u", {shownText(shown), status}));
 }
 
+// A relative path begins at the current directory, as that of a response file does.
+Answer findMessages(Admin& admin, const Words&, ConfigurationRequest& request) {
+    const char* const path = std::getenv(kMessagesVariable);
+    if (path == nullptr || *path == '\0') {
+        return kAnswerYes;
+    }
+    const Status status = admin.platform().files().productPath(path, request.messageFile);
+    return status == kSuccess
+               ? kAnswerYes
+               : admin.fault(compose("%s: %s: not a path: error %u", {kMessagesVariable, shownText(path), status}));
+}
+
 Answer commit(Admin& admin, const Words& words) {
     if (words.instance.size() > kMaxInstanceName || !isOneName(words.instance)) {
         return admin.open(true) ? admin.fault(compose("%s: an instance name has at most %u characters and no separator",
@@ -92,7 +105,7 @@ Answer commit(Admin& admin, const Words& words) {
     ConfigurationRequest request;
     request.instance = words.instance;
     request.machine = words.machine;
-    for (const auto step : {readResponses, findCopy, findLog}) {
+    for (const auto step : {readResponses, findCopy, findLog, findMessages}) {
         if (const Answer answer = step(admin, words, request); answer != kAnswerYes) {
             return answer;
         }

@@ -1,8 +1,9 @@
 #include "install/admin/front/front.h"
 
 #include <algorithm>
-#include <array>
+#include <atomic>
 #include <charconv>
+#include <chrono>
 #include <functional>
 #include <numeric>
 
@@ -14,10 +15,11 @@ namespace {
 
 constexpr std::uint64_t kMaxTime = 1'000'000'000;  // of a task; what is longer counts as that
 constexpr std::uint32_t kMaxAnswer = 1000;         // characters
+constexpr std::uint32_t kTick = 1000;              // milliseconds between two looks at the time
 constexpr std::string_view kAbort = "ABORT";
 
-// The end of a program's output, written behind it once the program has ended: what it has started may hold
-// the pipe open for as long as it runs.
+// Marks the end of a program's output, written after it once the program has ended: programs that it has started may
+// keep the pipe open.
 constexpr char kEndText[] = "\0kz7admin front: the program has ended";
 constexpr std::string_view kEndLine{kEndText, sizeof kEndText - 1};
 
@@ -130,8 +132,30 @@ void FrontProgress::completePhase() {
     }
 }
 
-void FrontProgress::endTask(std::int32_t task) {
-    ended_.insert(task);
+void FrontProgress::startTask(std::int32_t task, std::uint64_t now) {
+    running_ = task;
+    runningSince_ = now;
+}
+
+void FrontProgress::endTask(std::int32_t task, std::uint64_t now) {
+    if (ended_.insert(task).second && task == running_) {
+        measuredSeconds_ += now - runningSince_;
+        measuredWeight_ += weight(task);
+    }
+    running_ = -1;
+}
+
+std::uint64_t FrontProgress::secondsLeft(std::uint64_t now) const {
+    const auto seconds = [this](std::uint64_t weight) {
+        return measuredSeconds_ == 0 || measuredWeight_ == 0 ? weight : weight * measuredSeconds_ / measuredWeight_;
+    };
+    std::uint64_t later = 0;
+    for (const auto& [task, time] : weights_) {
+        later += ended_.contains(task) || task == running_ ? 0 : time;
+    }
+    const std::uint64_t whole = seconds(weight(running_));
+    const std::uint64_t passed = running_ == -1 ? 0 : now - runningSince_;
+    return seconds(later) + (whole > passed ? whole - passed : 0);
 }
 
 std::uint64_t FrontProgress::weight(std::int32_t task) const {
@@ -165,9 +189,30 @@ void FrontView::enter(Phase phase) {
     }
 }
 
+// Minutes and seconds: "12:05".
+std::string FrontView::timeText() const {
+    const auto shown = [](std::uint64_t seconds) {
+        const std::string rest = std::to_string(seconds % 60);
+        return std::to_string(seconds / 60) + (rest.size() == 1 ? ":0" : ":") + rest;
+    };
+    if (now_ == 0) {
+        return {};
+    }
+    const std::uint64_t left = phase_ == Phase::undoing ? 0 : progress_.secondsLeft(now_);
+    return shown(now_) + (left == 0 ? "" : ", " + shown(left) + " left");
+}
+
 void FrontView::showBar(std::string_view text) {
     static constexpr std::string_view kNames[] = {"", "Installing", "Configuring", "Undoing"};
-    screen_.showBar({kNames[static_cast<int>(phase_)], phase_ == Phase::undoing ? -1 : progress_.percent(), text});
+    const std::string time = timeText();
+    screen_.showBar(
+        {kNames[static_cast<int>(phase_)], phase_ == Phase::undoing ? -1 : progress_.percent(), text, time});
+}
+
+void FrontView::tick(std::uint64_t seconds) {
+    const std::lock_guard<std::mutex> held(lock_);
+    now_ = seconds;
+    screen_.showTime(timeText());
 }
 
 // A phase that is over is whole, whatever share of the tasks it turned out to have.
@@ -180,15 +225,30 @@ void FrontView::completeBar() {
 
 void FrontView::takeLine(std::string_view line, const Answerer& answer) {
     const ProtocolEvent event = readProtocolLine(line);
+    if (event.kind == EventKind::query) {
+        ask(event.text, event.proposal, answer);
+        return;
+    }
+    const std::lock_guard<std::mutex> held(lock_);
+    takeEvent(event);
+}
+
+void FrontView::showTask(const ProtocolEvent& event) {
+    enter(event.isInstallation ? Phase::installing : Phase::configuring);
+    if (event.kind == EventKind::taskStart) {
+        progress_.startTask(event.task, now_);
+        showBar(event.text);
+    } else {
+        progress_.endTask(event.task, now_);
+        showBar(std::string(event.text) + ", done");
+    }
+}
+
+void FrontView::takeEvent(const ProtocolEvent& event) {
     switch (event.kind) {
         case EventKind::taskStart:
-            enter(event.isInstallation ? Phase::installing : Phase::configuring);
-            showBar(event.text);
-            break;
         case EventKind::taskEnd:
-            enter(event.isInstallation ? Phase::installing : Phase::configuring);
-            progress_.endTask(event.task);
-            showBar(std::string(event.text) + ", done");
+            showTask(event);
             break;
         case EventKind::taskIds:
             progress_.takeIds(event.fields);
@@ -206,9 +266,6 @@ void FrontView::takeLine(std::string_view line, const Answerer& answer) {
         case EventKind::error:
             screen_.showFailure("error: " + std::string(event.text));
             break;
-        case EventKind::query:
-            ask(event.text, event.proposal, answer);
-            break;
         case EventKind::installEnd:
             logFile_ = event.text;
             break;
@@ -217,6 +274,7 @@ void FrontView::takeLine(std::string_view line, const Answerer& answer) {
             break;
         case EventKind::installStart:
         case EventKind::taskCount:
+        case EventKind::query:
         case EventKind::nothing:
             break;
     }
@@ -226,9 +284,12 @@ void FrontView::ask(std::string_view text, std::string_view proposal, const Answ
     screen_.showQuestion(text, proposal.empty() ? std::string("Answer, or ABORT: ")
                                                 : "Answer, or ABORT [" + std::string(proposal) + "]: ");
     FixedBuffer<kMaxAnswer> line;
-    isAsking_ = true;
-    const bool answered = ports_.terminal.readLine(line) == kSuccess;
-    isAsking_ = false;
+    const Status status = ports_.terminal.readLine(line);
+    if (status == kOperationAborted) {
+        screen_.showAnswer("");  // the program has ended: no answer reaches it
+        return;
+    }
+    const bool answered = status == kSuccess;
     const std::string_view typed = line.text().empty() ? proposal : line.text();
     const bool aborts = !answered || equalsIgnoreCase(line.text(), kAbort);
     // What a person types at a terminal is on the screen already.
@@ -253,45 +314,87 @@ void FrontView::end(std::string_view program, std::uint32_t exitCode) {
     }
 }
 
+namespace {
+
+// One run of a program: its pipes, the readers of its streams, and the display.
+class FrontRun {
+public:
+    explicit FrontRun(const FrontPorts& ports)
+        : ports_(ports),
+          screen_(ports.console, ports.terminal),
+          view_(ports, screen_),
+          answersRead_(ports.processes),
+          answersWrite_(ports.processes),
+          output_(ports, [this](std::string_view line) { takeLine(line); }),
+          error_(ports, [this](std::string_view line) { screen_.showErrorLine(line); }),
+          program_{ports.processes, {}} {
+        ports_.terminal.leaveInterruptsToOthers(true);
+    }
+    FrontRun(const FrontRun&) = delete;
+    FrontRun& operator=(const FrontRun&) = delete;
+    ~FrontRun() { ports_.terminal.leaveInterruptsToOthers(false); }
+
+    Status start(const std::vector<std::string>& command) {
+        Status status = openAnswers(ports_.processes, answersRead_, answersWrite_);
+        if (status == kSuccess) {
+            status = output_.open();
+        }
+        if (status == kSuccess) {
+            status = error_.open();
+        }
+        if (status == kSuccess) {
+            const std::string commandLine = joinArguments(command);
+            status = ports_.processes.startProcess(
+                {commandLine, {}, output_.writeEnd(), error_.writeEnd(), answersRead_.get()}, program_.information);
+        }
+        answersRead_.reset();
+        if (status == kSuccess) {
+            status = output_.start();
+        }
+        return status == kSuccess ? error_.start() : status;
+    }
+
+    Status finish(const std::string& name, std::uint32_t& exitCode) {
+        waitForEnd();
+        // A question of a program that has ended has no use, and its reader waits for the answer.
+        ports_.terminal.endReading();
+        output_.finish();
+        error_.finish();
+        const Status status = ports_.processes.exitCode(program_.information.process, exitCode);
+        view_.end(name, exitCode);
+        return status;
+    }
+
+private:
+    void takeLine(std::string_view line) {
+        view_.takeLine(line, [this](std::string_view answer) { ports_.processes.write(answersWrite_.get(), answer); });
+    }
+
+    void waitForEnd() {
+        using Clock = std::chrono::steady_clock;
+        const auto begin = Clock::now();
+        while (ports_.processes.waitProcess(program_.information.process, kTick) == kWaitTimedOut) {
+            const auto passed = std::chrono::duration_cast<std::chrono::seconds>(Clock::now() - begin);
+            view_.tick(static_cast<std::uint64_t>(passed.count()));
+        }
+    }
+
+    const FrontPorts& ports_;
+    FrontScreen screen_;
+    FrontView view_;
+    OwnedStream answersRead_;
+    OwnedStream answersWrite_;
+    StreamReader output_;
+    StreamReader error_;
+    OwnedProcess program_;
+};
+
+}  // namespace
+
 Status runFront(const FrontPorts& ports, const std::vector<std::string>& command, std::uint32_t& exitCode) {
-    FrontScreen screen(ports.console, ports.terminal);
-    FrontView view(ports, screen);
-    OwnedStream answersRead(ports.processes);
-    OwnedStream answersWrite(ports.processes);
-    StreamReader output(ports, [&](std::string_view line) {
-        view.takeLine(line, [&](std::string_view answer) { ports.processes.write(answersWrite.get(), answer); });
-    });
-    StreamReader error(ports, [&](std::string_view line) { screen.showErrorLine(line); });
-    for (const Status status : {openAnswers(ports.processes, answersRead, answersWrite), output.open(), error.open()}) {
-        if (status != kSuccess) {
-            return status;
-        }
-    }
-    const std::string commandLine = joinArguments(command);
-    OwnedProcess program{ports.processes, {}};
-    ports.terminal.leaveInterruptsToOthers(true);
-    Status status = ports.processes.startProcess(
-        {commandLine, {}, output.writeEnd(), error.writeEnd(), answersRead.get()}, program.information);
-    answersRead.reset();
-    if (status == kSuccess) {
-        status = output.start();
-    }
-    if (status == kSuccess) {
-        status = error.start();
-    }
-    if (status == kSuccess) {
-        ports.processes.waitProcess(program.information.process, kInfiniteWait);
-        if (view.isAsking()) {
-            screen.showAnswer("");
-            screen.showErrorLine("The program has ended; press Enter.");
-        }
-        output.finish();
-        error.finish();
-        status = ports.processes.exitCode(program.information.process, exitCode);
-        view.end(command.front(), exitCode);
-    }
-    ports.terminal.leaveInterruptsToOthers(false);
-    return status;
+    FrontRun run(ports);
+    const Status status = run.start(command);
+    return status == kSuccess ? run.finish(command.front(), exitCode) : status;
 }
 
 }  // namespace kz7

@@ -2,9 +2,9 @@
 // protocol, its questions are asked at the prompt.
 #pragma once
 
-#include <atomic>
 #include <cstdint>
 #include <map>
+#include <mutex>
 #include <set>
 #include <string>
 #include <string_view>
@@ -24,14 +24,19 @@ public:
     void takeIds(const std::vector<std::string_view>& fields);
     void takeTimes(const std::vector<std::string_view>& fields);
 
-    // What is done so far belongs to earlier phases.
+    // What is done so far belongs to earlier phases. `now` is in seconds, from any origin.
     void beginPhase();
-    void endTask(std::int32_t task);
+    void startTask(std::int32_t task, std::uint64_t now);
+    void endTask(std::int32_t task, std::uint64_t now);
     void completePhase();
 
     // Of the phase, which is taken to be all that is left; it never goes back in a phase. Below 0: no task was
     // announced.
     int percent();
+
+    // Estimated seconds until all announced tasks have ended; 0: unknown, or overdue. An announced time counts as
+    // seconds until tasks have ended; from then on the times are shares that are scaled by what those tasks took.
+    std::uint64_t secondsLeft(std::uint64_t now) const;
 
 private:
     std::uint64_t weight(std::int32_t task) const;
@@ -41,6 +46,10 @@ private:
     std::set<std::int32_t> ended_;
     std::set<std::int32_t> endedBefore_;
     int shown_ = -1;
+    std::int32_t running_ = -1;
+    std::uint64_t runningSince_ = 0;
+    std::uint64_t measuredSeconds_ = 0;  // of tasks that have ended
+    std::uint64_t measuredWeight_ = 0;
 };
 
 struct FrontPorts {
@@ -51,7 +60,8 @@ struct FrontPorts {
     IConsole& console;
 };
 
-// Takes the program's lines and shows what they tell; `answer` gets the line that answers a question.
+// Takes the program's lines and shows what they report; `answer` gets the line that answers a question. Lines come from
+// one thread, ticks from any.
 class FrontView {
 public:
     FrontView(const FrontPorts& ports, FrontScreen& screen) : ports_(ports), screen_(screen) {}
@@ -62,14 +72,18 @@ public:
     // The last lines of the run.
     void end(std::string_view program, std::uint32_t exitCode);
 
-    bool isAsking() const { return isAsking_; }
+    // Shows the time that has passed since the program began, in seconds.
+    void tick(std::uint64_t seconds);
 
 private:
     enum class Phase { none, installing, configuring, undoing };
 
     void enter(Phase phase);
     void showBar(std::string_view text);
+    void showTask(const ProtocolEvent& event);
     void completeBar();
+    std::string timeText() const;
+    void takeEvent(const ProtocolEvent& event);
     void ask(std::string_view text, std::string_view proposal, const Answerer& answer);
 
     const FrontPorts& ports_;
@@ -77,7 +91,8 @@ private:
     FrontProgress progress_;
     Phase phase_ = Phase::none;
     std::string logFile_;
-    std::atomic<bool> isAsking_ = false;
+    std::uint64_t now_ = 0;
+    std::mutex lock_;  // not held while an answer is awaited
 };
 
 // Runs a program to its end. `exitCode` is the program's; any status but kSuccess: it was not started.

@@ -50,8 +50,9 @@ std::string plainLine(const FrontScreen::Bar& bar) {
 std::string barLine(const FrontScreen::Bar& bar, std::uint32_t columns) {
     std::string line = cutToColumns(bar.phase, kPhaseColumns - 1);
     line.resize(kPhaseColumns, ' ');
+    const std::string text = std::string(bar.time) + (bar.time.empty() ? "" : " ") + std::string(bar.text);
     if (bar.percent < 0) {
-        return cutToColumns(line.append(bar.text), columns);
+        return cutToColumns(line.append(text), columns);
     }
     if (columns < kPhaseColumns + kMinBar + 2 + kPercentColumns) {
         return cutToColumns(plainLine(bar), columns);
@@ -63,7 +64,7 @@ std::string barLine(const FrontScreen::Bar& bar, std::uint32_t columns) {
     line += '[' + std::string(filled, '#') + std::string(width - filled, '.') + ']';
     const std::string number = std::to_string(percent) + '%';
     line += std::string(kPercentColumns - 1 - number.size(), ' ') + number + ' ';
-    line += cutToColumns(bar.text, rest - width);
+    line += cutToColumns(text, rest - width);
     return line;
 }
 
@@ -72,6 +73,7 @@ void FrontScreen::showBar(const Bar& bar) {
     phase_ = shownText(bar.phase);
     barText_ = shownText(bar.text);
     percent_ = bar.percent;
+    time_ = bar.time;
     if (draws()) {
         draw();
         return;
@@ -84,9 +86,17 @@ void FrontScreen::draw() {
     // The last column stays free: some terminals go to the next line there.
     const std::uint32_t columns = terminal_.look(TerminalStream::output).columns;
     console_.writeOutput(kWipeLine);
-    console_.writeOutput(barLine({phase_, percent_, barText_}, columns > 1 ? columns - 1 : 1));
+    console_.writeOutput(barLine({phase_, percent_, barText_, time_}, columns > 1 ? columns - 1 : 1));
     console_.flush();
     hasBar_ = true;
+}
+
+void FrontScreen::showTime(std::string_view time) {
+    const std::lock_guard<std::mutex> held(lock_);
+    if (hasBar_) {
+        time_ = time;
+        draw();
+    }
 }
 
 void FrontScreen::wipe() {

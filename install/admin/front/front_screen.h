@@ -1,5 +1,5 @@
-// What a person sees of an installer program: on a terminal one bar for each phase, drawn again and again on
-// its line, with all other lines above it; elsewhere plain lines.
+// The display of an installer program's progress: on a terminal one bar for each phase, redrawn in place, with all
+// other lines above it; elsewhere plain lines.
 #pragma once
 
 #include <mutex>
@@ -18,12 +18,16 @@ public:
 
     struct Bar {
         std::string_view phase;
-        int percent = -1;  // below 0: nobody knows
+        int percent = -1;  // below 0: unknown
         std::string_view text;
+        std::string_view time = {};  // elapsed and left; in drawn bars only
     };
 
-    // Begins a bar, or draws the one on the screen again. Without a terminal it is a line.
+    // Begins a bar, or redraws the current one. Without a terminal it is a line.
     void showBar(const Bar& bar);
+
+    // Redraws the current bar with another time.
+    void showTime(std::string_view time);
 
     // Leaves the bar where it stands: the next one begins below.
     void leaveBar();
@@ -49,6 +53,7 @@ private:
     std::mutex lock_;
     std::string phase_;
     std::string barText_;
+    std::string time_;
     int percent_ = -1;
     bool hasBar_ = false;
 };

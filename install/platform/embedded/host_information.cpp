@@ -15,13 +15,12 @@ public:
         return localtime_r(&now, &parts) == nullptr ? kGeneralFailure : giveTime(parts, form, text);
     }
 
-    Status operatingSystem(std::string& name, std::string& version) override {
-        utsname system{};
-        if (uname(&system) == -1) {
+    Status operatingSystem(OperatingSystem& system) override {
+        utsname found{};
+        if (uname(&found) == -1) {
             return kGeneralFailure;
         }
-        name = system.sysname;
-        version = system.release;
+        system = {found.sysname, found.version, found.release};
         return kSuccess;
     }
 };

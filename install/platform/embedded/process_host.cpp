@@ -32,6 +32,7 @@ namespace kz7 {
 namespace {
 
 constexpr int kFirstOwnDescriptor = STDERR_FILENO + 1;
+constexpr int kPollInterval = 20;     // milliseconds
 constexpr int kSignalExitCode = 128;  // a child ended by signal n has the exit code 128 + n
 constexpr std::string_view kUsualSearchPath = "/usr/local/bin:/usr/bin:/bin";  // where PATH is not set
 
@@ -120,8 +121,12 @@ private:
     bool wasPending_ = false;
 };
 
-// How a child begins: descriptors 0 to 2 as told and no others, no signal blocked, ignored or caught. It is not
-// forked: a fork would cost by the memory that this process has in use.
+// Signals that stay ignored in a child where this process ignores them: "nohup" and shells that start a program in the
+// background ask for that. Every other signal begins with its default action.
+constexpr int kInheritedIgnores[] = {SIGHUP, SIGINT, SIGQUIT};
+
+// How a child begins: descriptors 0 to 2 as given and no others, no signal blocked or caught. posix_spawn() in place of
+// fork(), whose cost grows with the memory that this process has in use.
 class SpawnPlan {
 public:
     SpawnPlan() {
@@ -151,6 +156,12 @@ public:
         sigemptyset(&signals);
         note(posix_spawnattr_setsigmask(&attributes_, &signals));
         sigfillset(&signals);
+        for (const int signal : kInheritedIgnores) {
+            struct sigaction action {};
+            if (sigaction(signal, nullptr, &action) == 0 && action.sa_handler == SIG_IGN) {
+                sigdelset(&signals, signal);
+            }
+        }
         note(posix_spawnattr_setsigdefault(&attributes_, &signals));
         note(posix_spawnattr_setflags(&attributes_, POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF));
         return error_ != 0 ? error_ : posix_spawn(&id, file, &actions_, &attributes_, argv, environ);
@@ -177,28 +188,30 @@ pid_t waitForChild(pid_t id, int* ending, int options) {
     return found;
 }
 
-// Waits for the end of a child, but no longer than that; its exit code is still to be taken.
+bool hasEnded(pid_t id) {
+    siginfo_t ended{};
+    return waitid(P_PID, static_cast<id_t>(id), &ended, WEXITED | WNOHANG | WNOWAIT) == -1 || ended.si_pid != 0;
+}
+
+// Waits until a child has ended or the time is over. The exit code remains to be collected.
 void waitWithin(pid_t id, std::uint32_t milliseconds) {
     using Clock = std::chrono::steady_clock;
     const auto deadline = Clock::now() + std::chrono::milliseconds(milliseconds);
-    pollfd watched{static_cast<int>(syscall(SYS_pidfd_open, id, 0)), POLLIN, 0};
-    if (watched.fd == -1) {
-        return;
-    }
-    int ready = -1;
-    do {
+    const OwnedDescriptor child(static_cast<int>(syscall(SYS_pidfd_open, id, 0)));
+    // Without a free descriptor, or on a kernel without the call, the child is asked for at short intervals.
+    const std::int64_t longest = child ? INT_MAX : kPollInterval;
+    pollfd watched{child.get(), POLLIN, 0};  // poll() ignores -1
+    while (!hasEnded(id) && Clock::now() < deadline) {
         const auto left = std::chrono::ceil<std::chrono::milliseconds>(deadline - Clock::now()).count();
-        ready = poll(&watched, 1, static_cast<int>(std::clamp<std::int64_t>(left, 0, INT_MAX)));
-    } while ((ready == -1 && errno == EINTR) || (ready == 0 && Clock::now() < deadline));
-    close(watched.fd);
+        poll(&watched, 1, static_cast<int>(std::clamp<std::int64_t>(left, 0, longest)));
+    }
 }
 
-// Takes the ending of a child that nobody asks about any more, so that it does not stay a zombie. A thread of
-// its own waits for one that runs on; it holds nothing of ours and ends with the child or with this process.
-void leaveToItself(pid_t id) {
-    const auto take = [](void* given) -> void* {
-        const std::unique_ptr<pid_t> child(static_cast<pid_t*>(given));
-        waitForChild(*child, nullptr, 0);
+// Collects the exit code of a child that no caller asks about any more, so that it does not stay a zombie. A thread of
+// its own waits for a child that still runs; it ends with the child or with this process.
+void collectLater(pid_t id) {
+    const auto collect = [](void* child) -> void* {
+        waitForChild(static_cast<pid_t>(reinterpret_cast<std::intptr_t>(child)), nullptr, 0);
         return nullptr;
     };
     pthread_attr_t attributes;
@@ -206,11 +219,9 @@ void leaveToItself(pid_t id) {
         return;
     }
     pthread_attr_setdetachstate(&attributes, PTHREAD_CREATE_DETACHED);
-    auto child = std::make_unique<pid_t>(id);
     pthread_t thread{};
-    if (pthread_create(&thread, &attributes, take, child.get()) == 0) {
-        static_cast<void>(child.release());
-    }
+    // The number itself is the argument: this also runs when memory is exhausted.
+    pthread_create(&thread, &attributes, collect, reinterpret_cast<void*>(static_cast<std::intptr_t>(id)));
     pthread_attr_destroy(&attributes);
 }
 
@@ -237,16 +248,15 @@ public:
         if (pipe2(ends, O_CLOEXEC) == -1) {
             return statusOf(errno);
         }
-        OwnedDescriptor first(ends[0]);
-        OwnedDescriptor second(ends[1]);
-        OwnedDescriptor reading = moveUp(std::move(first));
-        OwnedDescriptor writing = reading ? moveUp(std::move(second)) : OwnedDescriptor();
-        if (!writing) {
+        OwnedDescriptor lowReading(ends[0]);
+        OwnedDescriptor lowWriting(ends[1]);
+        OwnedDescriptor reading = moveUp(std::move(lowReading));
+        OwnedDescriptor writing = moveUp(std::move(lowWriting));
+        if (!reading || !writing) {
             return statusOf(errno);
         }
-        const StreamHandle given = streams_.give(std::move(reading));
+        readEnd = streams_.give(std::move(reading));
         writeEnd = streams_.give(std::move(writing));
-        readEnd = given;
         return kSuccess;
     }
 
@@ -335,7 +345,7 @@ public:
             return kInvalidHandle;
         }
         if (takeEnding(*child, WNOHANG) == kWaitTimedOut) {
-            leaveToItself(child->id);
+            collectLater(child->id);
         }
         children_.erase(process);
         return kSuccess;
@@ -401,14 +411,16 @@ private:
                 plan.give(streams_.find(stream), target);
             }
         }
-        pid_t id = 0;
-        const int error = plan.run(id, file.c_str(), directory, argv.data());
+        // The entry comes first: a child that runs is never without one.
+        const ProcessHandle process{++lastProcess_};
+        Child& child = children_[process];
+        const int error = plan.run(child.id, file.c_str(), directory, argv.data());
         if (error != 0) {
+            children_.erase(process);
             return isNoProgram(error) ? kFileNotFound : statusOf(error);
         }
-        const ProcessHandle process{++lastProcess_};
-        children_.emplace(process, Child{.id = id});
-        started = {process, ProcessHandle::none, static_cast<std::uint32_t>(id), static_cast<std::uint32_t>(id)};
+        const auto id = static_cast<std::uint32_t>(child.id);
+        started = {process, ProcessHandle::none, id, id};
         return kSuccess;
     }
 

@@ -1,7 +1,12 @@
+#include <poll.h>
 #include <sys/ioctl.h>
 #include <unistd.h>
 
+#include <array>
+#include <atomic>
+#include <cerrno>
 #include <csignal>
+#include <cstdio>
 #include <cstdlib>
 #include <string_view>
 
@@ -11,6 +16,7 @@ namespace kz7 {
 namespace {
 
 constexpr std::uint32_t kUsualColumns = 80;
+constexpr int kPollInterval = 100;  // milliseconds between two looks at endReading()
 
 std::string_view environment(const char* name) {
     const char* value = std::getenv(name);
@@ -19,9 +25,14 @@ std::string_view environment(const char* name) {
 
 class EmbeddedTerminal final : public ITerminal {
 public:
-    Status readLine(Buffer& line) override { return readStandardLine(line); }
+    Status readLine(Buffer& line) override {
+        const Status status = readLineOf([this] { return nextByte(); }, line);
+        return ended_ ? kOperationAborted : status;
+    }
 
-    // Line feeds are one byte here in any case.
+    void endReading() override { ended_ = true; }
+
+    // A line feed is one byte on POSIX.
     void keepLineFeeds(bool) override {}
 
     TerminalView look(TerminalStream stream) override {
@@ -41,13 +52,42 @@ public:
         return view;
     }
 
-    // Caught rather than ignored: an ignored signal stays ignored in the programs that this one starts.
+    // A handler in place of SIG_IGN: an ignored signal would stay ignored in the programs that this one starts.
     void leaveInterruptsToOthers(bool on) override {
         struct sigaction action {};
+        sigaction(SIGINT, nullptr, &action);
+        if (action.sa_handler == SIG_IGN) {
+            return;
+        }
+        action = {};
         action.sa_handler = on ? [](int) {} : SIG_DFL;
         action.sa_flags = SA_RESTART;
         sigaction(SIGINT, &action, nullptr);
     }
+
+private:
+    int nextByte() {
+        pollfd input{STDIN_FILENO, POLLIN, 0};
+        while (at_ == end_) {
+            int ready = 0;
+            while (!ended_ && ready <= 0) {
+                ready = poll(&input, 1, kPollInterval);
+            }
+            const ssize_t count = ended_ ? 0 : read(STDIN_FILENO, bytes_.data(), bytes_.size());
+            if (count == 0 || (count == -1 && errno != EINTR && errno != EAGAIN)) {
+                return EOF;
+            }
+            at_ = 0;
+            end_ = count > 0 ? static_cast<std::size_t>(count) : 0;
+        }
+        return bytes_[at_++];
+    }
+
+    // Not the C library's buffer: poll() must know whether a read would wait.
+    std::array<unsigned char, 4096> bytes_;
+    std::size_t at_ = 0;
+    std::size_t end_ = 0;
+    std::atomic<bool> ended_ = false;
 };
 
 }  // namespace

@@ -112,9 +112,9 @@ KZ7_INTERCEPTED(InterceptedLibraries, ILibraryLoader, "libraries",
 KZ7_INTERCEPTED(InterceptedAssemblies, IAssemblyCache, "assemblies",
     KZ7_1(deregisterProviders) KZ7_3(registerProviders))
 KZ7_INTERCEPTED(InterceptedHost, IHostInformation, "host",
-    KZ7_2(localTime) KZ7_2(operatingSystem))
+    KZ7_2(localTime) KZ7_1(operatingSystem))
 KZ7_INTERCEPTED(InterceptedTerminal, ITerminal, "terminal",
-    KZ7_1(readLine) KZ7_1(keepLineFeeds) KZ7_1(look) KZ7_1(leaveInterruptsToOthers))
+    KZ7_1(readLine) KZ7_0(endReading) KZ7_1(keepLineFeeds) KZ7_1(look) KZ7_1(leaveInterruptsToOthers))
 KZ7_INTERCEPTED(InterceptedSession, IInstallerSession, "session",
     KZ7_2(runMode) KZ7_2(getProperty) KZ7_2(setProperty) KZ7_3(featureState) KZ7_1(doAction) KZ7_1(activeDatabase)
     KZ7_3(openView) KZ7_1(executeView) KZ7_2(fetchRecord) KZ7_3(recordString) KZ7_2(createRecord)

@@ -53,12 +53,12 @@ public:
     Status localTime(TimeText form, Buffer& text) override {
         return giveName(form == TimeText::timeOfDay ? timeOfDay : dateAndZone, text);
     }
-    Status operatingSystem(std::string& name, std::string& version) override {
-        name = "Memory";
-        version = "1.0";
+    Status operatingSystem(OperatingSystem& system) override {
+        system = installed;
         return kSuccess;
     }
 
+    OperatingSystem installed{"Memory", "1", "0"};
     std::string dateAndZone = "Tue Jan  2 03:04:05 2024 UTC";
     std::string timeOfDay = "03:04:05";
 };
@@ -76,6 +76,7 @@ public:
         input.erase(0, end + 1);
         return kSuccess;
     }
+    void endReading() override {}  // no read waits
     void keepLineFeeds(bool on) override { keepsLineFeeds = on; }
     TerminalView look(TerminalStream) override { return view; }
     void leaveInterruptsToOthers(bool on) override { leavesInterrupts = on; }

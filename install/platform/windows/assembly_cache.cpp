@@ -159,16 +159,16 @@ std::vector<std::wstring> providerFiles(std::string_view location) {
         return files;
     }
     WIN32_FIND_DATAA found;
-    const HANDLE search = FindFirstFileA((folder + "kz7nmp*.dll").c_str(), &found);
-    if (search == INVALID_HANDLE_VALUE) {
+    const HANDLE opened = FindFirstFileA((folder + "kz7nmp*.dll").c_str(), &found);
+    if (opened == INVALID_HANDLE_VALUE) {
         return files;
     }
+    const std::unique_ptr<void, decltype(&FindClose)> search(opened, FindClose);
     do {
         if ((found.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) == 0) {
             files.push_back(wide(folder + found.cFileName));
         }
-    } while (FindNextFileA(search, &found) != 0);
-    FindClose(search);
+    } while (FindNextFileA(search.get(), &found) != 0);
     return files;
 }
 

@@ -5,20 +5,19 @@
 
 namespace kz7 {
 
-Status WindowsHost::operatingSystem(std::string& name, std::string& version) {
-    // The documented calls answer the version that the program says it was made for.
+Status WindowsHost::operatingSystem(OperatingSystem& system) {
+    // The documented calls return the version that the program claims to support in its manifest.
     using GetVersionCall = LONG(WINAPI*)(RTL_OSVERSIONINFOW*);
-    const HMODULE system = GetModuleHandleA("ntdll.dll");
+    const HMODULE library = GetModuleHandleA("ntdll.dll");
     const auto getVersion =
-        reinterpret_cast<GetVersionCall>(reinterpret_cast<void*>(GetProcAddress(system, "RtlGetVersion")));
+        reinterpret_cast<GetVersionCall>(reinterpret_cast<void*>(GetProcAddress(library, "RtlGetVersion")));
     RTL_OSVERSIONINFOW information{};
     information.dwOSVersionInfoSize = sizeof information;
     if (getVersion == nullptr || getVersion(&information) != 0) {
         return kGeneralFailure;
     }
-    name = "Windows";
-    version = std::to_string(information.dwMajorVersion) + '.' + std::to_string(information.dwMinorVersion) + '.' +
-              std::to_string(information.dwBuildNumber);
+    system = {"Windows", std::to_string(information.dwMajorVersion),
+              std::to_string(information.dwMinorVersion) + '.' + std::to_string(information.dwBuildNumber)};
     return kSuccess;
 }
 

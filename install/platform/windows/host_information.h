@@ -8,7 +8,7 @@ namespace kz7 {
 class WindowsHost final : public IHostInformation {
 public:
     Status localTime(TimeText form, Buffer& text) override;
-    Status operatingSystem(std::string& name, std::string& version) override;
+    Status operatingSystem(OperatingSystem& system) override;
 };
 
 }  // namespace kz7

@@ -2,13 +2,31 @@
 
 #include <fcntl.h>
 #include <io.h>
+#include <windows.h>
 
 #include <cstdio>
 
 namespace kz7 {
 
 Status WindowsTerminal::readLine(Buffer& line) {
-    return readStandardLine(line);
+    reader_ = GetCurrentThreadId();
+    const Status status = ended_ ? kOperationAborted : readLineOf([] { return std::getc(stdin); }, line);
+    reader_ = 0;
+    return ended_ ? kOperationAborted : status;
+}
+
+void WindowsTerminal::endReading() {
+    constexpr int kAttempts = 50;
+    constexpr DWORD kInterval = 20;  // milliseconds
+    ended_ = true;
+    // The reader may not wait yet at the first attempt.
+    for (int attempt = 0; attempt < kAttempts && reader_ != 0; ++attempt) {
+        if (const HANDLE reader = OpenThread(THREAD_TERMINATE, FALSE, reader_); reader != nullptr) {
+            CancelSynchronousIo(reader);
+            CloseHandle(reader);
+        }
+        Sleep(kInterval);
+    }
 }
 
 void WindowsTerminal::keepLineFeeds(bool on) {

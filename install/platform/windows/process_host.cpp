@@ -30,20 +30,35 @@ DWORD slotNumber(StandardSlot slot) {
     return slot == StandardSlot::output ? STD_OUTPUT_HANDLE : STD_ERROR_HANDLE;
 }
 
-// The folders of a search path that lie at one place, wherever this process stands.
-std::wstring absoluteFolders(const std::wstring& path) {
+// Takes the next folder off a search path. In quotation marks a folder may hold a semicolon; the marks are not part of
+// its name.
+std::wstring takeFolder(std::wstring_view& path) {
+    std::wstring folder;
+    std::size_t at = 0;
+    for (bool isQuoted = false; at < path.size() && (isQuoted || path[at] != L';'); ++at) {
+        if (path[at] == L'"') {
+            isQuoted = !isQuoted;
+        } else {
+            folder += path[at];
+        }
+    }
+    path.remove_prefix(std::min(at + 1, path.size()));
+    return folder;
+}
+
+// The absolute folders of a search path. A folder with a semicolon in its name is left out: the system's search splits
+// it.
+std::wstring absoluteFolders(std::wstring_view path) {
     std::wstring kept;
-    for (std::size_t at = 0; at < path.size();) {
-        const std::size_t end = std::min(path.find(L';', at), path.size());
-        const std::wstring folder = path.substr(at, end - at);
+    while (!path.empty()) {
+        const std::wstring folder = takeFolder(path);
         std::string begin;
         for (const wchar_t c : folder.substr(0, 3)) {
             begin += c < 0x80 ? static_cast<char>(c) : '?';
         }
-        if (isAbsolutePath(begin)) {
+        if (isAbsolutePath(begin) && folder.find(L';') == std::wstring::npos) {
             kept += folder + L';';
         }
-        at = end + 1;
     }
     return kept;
 }

@@ -1,13 +1,14 @@
 #include "install/runtime/observers/display_observer.h"
 
-#include <new>
+#include <algorithm>
 
+#include "install/runtime/guarded.h"
 #include "install/runtime/session_text.h"
 
 namespace kz7 {
 namespace {
 
-constexpr std::string_view kLanguageProperty = "KZ7_DEFAULT_LANG";
+constexpr char kLanguageProperty[] = "KZ7_DEFAULT_LANG";
 constexpr std::string_view kRightToLeftLanguages[] = {"ar_AA", "iw_IL"};
 
 constexpr std::string_view kBoxLayout = "[1]\n\n[2]";  // the title, the text
@@ -16,12 +17,10 @@ constexpr std::string_view kLineLayout = "[1]";
 }  // namespace
 
 Status UREDisplayObserverWI::update(UREBaseInfo& info) {
-    try {
+    return guarded([&] {
         return info.getInfoType() == InfoType::progress ? showProgress(static_cast<const UREProgressInfo&>(info))
                                                         : showMessage(static_cast<UREInfo&>(info));
-    } catch (const std::bad_alloc&) {
-        return kNoMemory;
-    }
+    });
 }
 
 Status UREDisplayObserverWI::showProgress(const UREProgressInfo& info) {
@@ -41,7 +40,7 @@ Status UREDisplayObserverWI::showMessage(UREInfo& info) {
     }
     FixedText<kMessageSize> text;
     info.copyText(text);
-    const std::string_view title = ure_.messages.pattern(kGenericDialogTitle);
+    const std::string_view title = at_.ure.messages.pattern(kGenericDialogTitle);
     std::int32_t answer = 0;
     if (info.isQuestion()) {
         const Status status = show(kSessionUser | kBoxOkCancel | kBoxQuestionIcon | boxDirection(),
@@ -66,32 +65,31 @@ Status UREDisplayObserverWI::showMessage(UREInfo& info) {
 
 // Boxes of languages that are written from right to left are laid out so.
 std::uint32_t UREDisplayObserverWI::boxDirection() {
-    FixedBuffer<kMessageSize> language;
-    if (session_.getProperty(kLanguageProperty, language) == kSuccess) {
-        for (const std::string_view each : kRightToLeftLanguages) {
-            if (language.text() == each) {
-                return kBoxRightAligned | kBoxRightToLeft;
-            }
-        }
-    }
-    return 0;
+    char language[kPropertySize] = {};
+    std::uint32_t size = sizeof language;
+    const Status status = iMsiGetProperty(at_, kLanguageProperty, language, &size);
+    traceProperty(at_, "iMsiGetProperty", kLanguageProperty, status);
+    const bool isRightToLeft =
+        status == kSuccess && std::find(std::begin(kRightToLeftLanguages), std::end(kRightToLeftLanguages),
+                                        std::string_view(language)) != std::end(kRightToLeftLanguages);
+    return isRightToLeft ? kBoxRightAligned | kBoxRightToLeft : 0;
 }
 
 Status UREDisplayObserverWI::show(std::uint32_t kind, std::initializer_list<std::string_view> fields,
                                   std::string_view layout, std::int32_t& answer) {
-    OwnedSessionHandle record(session_);
-    Status status = session_.createRecord(static_cast<std::uint32_t>(fields.size()), record.receive());
+    OwnedSessionHandle record(at_.session);
+    Status status = at_.session.createRecord(static_cast<std::uint32_t>(fields.size()), record.receive());
     if (status == kSuccess && !layout.empty()) {
-        status = session_.setRecordString(record.get(), 0, layout);
+        status = at_.session.setRecordString(record.get(), 0, layout);
     }
     std::uint32_t field = 0;
     for (const std::string_view text : fields) {
         ++field;
         if (status == kSuccess) {
-            status = session_.setRecordString(record.get(), field, escapedForSession(text));
+            status = at_.session.setRecordString(record.get(), field, escapedForSession(text));
         }
     }
-    return status == kSuccess ? session_.processMessage(kind, record.get(), answer) : status;
+    return status == kSuccess ? at_.session.processMessage(kind, record.get(), answer) : status;
 }
 
 }  // namespace kz7

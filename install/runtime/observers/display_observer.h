@@ -2,16 +2,15 @@
 // questions in boxes.
 #pragma once
 
-#include "install/platform/installer_session.h"
+#include "install/runtime/installer_properties.h"
 #include "install/runtime/observers/kz7iobs.h"
-#include "install/runtime/ure.h"
 
 namespace kz7 {
 
-// Boxes open only where the installer shows any. The engine and the session outlive it.
+// Boxes open only where the installer shows any. The installation outlives it.
 class UREDisplayObserverWI final : public IObserver {
 public:
-    UREDisplayObserverWI(URE& ure, IInstallerSession& session) : ure_(ure), session_(session) {}
+    explicit UREDisplayObserverWI(const Installation& at) : at_(at) {}
 
     // The session's status, or kFailed for an info that is not shown.
     Status update(UREBaseInfo& info) override;
@@ -23,8 +22,7 @@ private:
                 std::int32_t& answer);
     std::uint32_t boxDirection();
 
-    URE& ure_;
-    IInstallerSession& session_;
+    const Installation& at_;
 };
 
 }  // namespace kz7

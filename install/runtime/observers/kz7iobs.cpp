@@ -2,6 +2,8 @@
 
 #include <utility>
 
+#include "install/runtime/guarded.h"
+
 namespace kz7 {
 
 UREExternalObserverStream::UREExternalObserverStream(std::unique_ptr<UREExternalOutput> output)
@@ -11,14 +13,14 @@ UREExternalObserverStream::~UREExternalObserverStream() = default;
 
 Status UREExternalObserverStream::update(UREBaseInfo& info) {
     if (info.getInfoType() == InfoType::progress) {
-        const Status handled = handleProgress(static_cast<UREProgressInfo&>(info));
+        const Status handled = guarded([&] { return handleProgress(static_cast<UREProgressInfo&>(info)); });
         if (handled == kSuccess) {
             output_->flushQueue();
         }
         return handled;
     }
     auto& message = static_cast<UREInfo&>(info);
-    const Status handled = handleMessage(message);
+    const Status handled = guarded([&] { return handleMessage(message); });
     if (handled == kSuccess) {
         output_->flushQueue();
         if (message.isQuestion()) {

@@ -4,7 +4,7 @@
 #include <array>
 #include <new>
 
-#include "install/runtime/install_process.h"
+#include "install/runtime/guarded.h"
 #include "install/runtime/session_text.h"
 
 namespace kz7 {
@@ -30,8 +30,9 @@ std::string_view withoutQuotes(std::string_view text) {
     return text.size() >= 2 && text.front() == '"' && text.back() == '"' ? text.substr(1, text.size() - 2) : text;
 }
 
-std::string_view withoutLineEnd(std::string_view text) {
-    return text.substr(0, text.find_last_not_of("\r\n") + 1);
+// A text of the system as the log shows it.
+std::string_view shownSystemText(std::string_view text) {
+    return withoutQuotes(text.substr(0, kMaxSystemText));
 }
 
 }  // namespace
@@ -61,15 +62,25 @@ const char* URELogObserver::componentLogPath(char* buffer) const {
     return buffer;
 }
 
-void URELogObserver::setLogFile(std::string_view path) {
+Status URELogObserver::setLogFile(std::string_view path) {
+    const Status status = guarded([&] { return openLog(path); });
+    if (status == kNoMemory) {
+        ure_.error(kCodeError, "URELogObserver::setLogFile", 20, kNoMemory);
+    }
+    return status;
+}
+
+Status URELogObserver::openLog(std::string_view path) {
     const std::string_view folder = path.substr(0, path.find_last_of('\\') + 1);
     FixedBuffer<kPathSize> shortened;
     file_.reset();
-    shortPathFailed_ = shortFolder(folder, shortened) != kSuccess;
-    if (shortPathFailed_) {
-        // Deliberate: nothing is reported and only plain notes are written from here on; installers depend on
-        // a log that cannot be kept not standing in their way.
-        return;
+    shortPathFailed_ = false;
+    const Status found = shortFolder(folder, shortened);
+    if (found != kSuccess) {
+        // Deliberate: nothing is reported and only plain notes are written from here on; a log that cannot be kept must
+        // not stop an installer.
+        shortPathFailed_ = true;
+        return found;
     }
     componentLogPath_.assign(shortened.view());
     componentLogPath_.append(kLogFileName);
@@ -80,12 +91,9 @@ void URELogObserver::setLogFile(std::string_view path) {
         ure_.error(kCodeError, "URELogObserver::setLogFile", 10, opened);
     }
     writeHeader(false);
-    try {
-        describeSystem();
-        lookForClusterLog(folder);
-    } catch (const std::bad_alloc&) {
-        ure_.error(kCodeError, "URELogObserver::setLogFile", 20, kNoMemory);
-    }
+    describeSystem();
+    lookForClusterLog(folder);
+    return opened;
 }
 
 Status URELogObserver::shortFolder(std::string_view folder, Buffer& shortened) {
@@ -117,40 +125,22 @@ Status URELogObserver::writeHeader(bool isEnd) {
         title.assign(withoutQuotes({room, std::min(length, sizeof room)}));
     }
     FixedBuffer<256> date;
-    if (ure_.ports.host.localTime(TimeText::dateAndZone, date) == kSuccess) {
+    if (guarded([&] { return ure_.ports.host.localTime(TimeText::dateAndZone, date); }) == kSuccess) {
         title.append(date.view().substr(0, kMaxDate));
     }
     writeLine(title.view());
     return writeLine(kSeparator);
 }
 
+// A system that cannot be identified leaves all three texts empty.
 void URELogObserver::describeSystem() {
-    const std::string name = systemText("uname");
-    const std::string version = systemText("uname -v");
-    const std::string release = systemText("uname -r");
-    std::string system = name;
-    if (name.empty() && version.empty() && release.empty()) {
-        std::string ownVersion;
-        ure_.ports.host.operatingSystem(system, ownVersion);
-        systemVersion_.assign(ownVersion);
-    } else {
-        systemVersion_.assign(version + '.' + release);
-    }
-    systemName_.assign(system);
+    OperatingSystem system;
+    ure_.ports.host.operatingSystem(system);
+    systemName_.assign(shownSystemText(system.name));
+    systemVersion_.assign(shownSystemText(system.version));
+    systemVersion_.append(".");
+    systemVersion_.append(shownSystemText(system.release));
     writeLine(compose("%s %s", {systemName_.view(), systemVersion_.view()}));
-}
-
-// Empty where the program does not run, or fails.
-std::string URELogObserver::systemText(const char* command) {
-    InstallProcess process(ure_.ports.processes, ure_.ports.threads, ure_, command);
-    process.execute(true, false);
-    std::uint32_t exitCode = 0;
-    if (process.waitForCompletion(exitCode, kInfiniteWait) != kSuccess || exitCode != 0) {
-        return {};
-    }
-    char text[kMaxSystemText + 1];
-    process.copyStandardOutput(text, sizeof text);
-    return std::string(withoutQuotes(withoutLineEnd(text)));
 }
 
 void URELogObserver::lookForClusterLog(std::string_view folder) {
@@ -167,12 +157,10 @@ void URELogObserver::writeFunction(std::string_view text) {
 }
 
 Status URELogObserver::writeLine(std::string_view text) {
-    try {
+    return guarded([&] {
         line_.assign(text);
         return writeKeptLine();
-    } catch (const std::bad_alloc&) {
-        return kNoMemory;
-    }
+    });
 }
 
 Status URELogObserver::writeKeptLine() {
@@ -208,16 +196,14 @@ Status URELogObserver::writeToSession(std::string_view text) {
 }
 
 Status URELogObserver::update(UREBaseInfo& info) {
-    try {
+    return guarded([&] {
         if (info.getInfoType() == InfoType::message) {
             return writeInfo(static_cast<const UREInfo&>(info));
         }
         FixedText<kMessageSize> description;
         static_cast<const UREProgressInfo&>(info).copyDescription(description);
         return description.empty() || shortPathFailed_ ? kSuccess : writeLine(description.view());
-    } catch (const std::bad_alloc&) {
-        return kNoMemory;
-    }
+    });
 }
 
 std::string_view URELogObserver::prefixOf(const UREInfo& info, Buffer& time) {

@@ -22,10 +22,10 @@ public:
     static URELogObserver* getInstance(URE& ure);
     static void release();
 
-    // Keeps the path, opens the file for writing at its end, and writes the header and what the machine runs.
+    // Keeps the path, opens the file for writing at its end, and writes the header and the operating system.
     // A path whose folder has no short form opens nothing and reports nothing; from then on only plain notes
-    // are written. A file that cannot be opened is reported.
-    void setLogFile(std::string_view path);
+    // are written. A file that cannot be opened is reported. Success, or why no file is in use.
+    Status setLogFile(std::string_view path);
 
     // Opens or closes the run in the log. Results as writeLine(), also those of a missing title text.
     Status writeHeader(bool isEnd);
@@ -50,10 +50,10 @@ private:
     explicit URELogObserver(URE& ure) : ure_(ure), file_(ure.ports.files) {}
     ~URELogObserver() override;
 
+    Status openLog(std::string_view path);
     Status shortFolder(std::string_view folder, Buffer& shortened);
     void describeSystem();
     void lookForClusterLog(std::string_view folder);
-    std::string systemText(const char* command);
     Status writeKeptLine();
     Status writeToSession(std::string_view text);
     Status writeInfo(const UREInfo& info);

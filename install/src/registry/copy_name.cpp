@@ -33,6 +33,9 @@ std::string substituteCopyName(std::string_view text, std::string_view copyName)
 }
 
 const char* iSubstituteCopyName(const char* text, const char* copyName, std::uint32_t outputSize, char* output) {
+    if (text == nullptr || (outputSize != 0 && output == nullptr)) {
+        return nullptr;
+    }
     const std::string_view given = text;
     // Deliberate: the size is checked before the substitution, so that a text that is too long only because of its
     // placeholder is refused; callers size their buffers by the template.
