@@ -12,7 +12,7 @@ constexpr std::string_view kProfileFolderVariable = "KZ7INSTPROF";
 constexpr std::string_view kSystemFile = "kz7systm";
 constexpr std::string_view kCommand = "%s\\bin\\kz7cmd.exe /c kz7 update dbm config using %s";
 
-// The row of a table that a name stands in; the table's size where it stands in none.
+// The row of a name in a table; the size of the table if it has no such name.
 template <typename Table>
 std::size_t rowOf(const Table& table, std::string_view name) {
     return static_cast<std::size_t>(
@@ -33,7 +33,7 @@ Status record(const Table& table, Values& values, std::string_view name, std::st
     });
 }
 
-// A value stands in quotation marks at the end of a command line: it must not be able to leave them.
+// Whether a value, in quotation marks at the end of a command line, cannot end the quotation.
 bool staysQuoted(std::string_view value) {
     return !value.ends_with('\\') && std::none_of(value.begin(), value.end(),
                                                   [](char c) { return c == '"' || (c >= 0 && c < ' ') || c == 0x7F; });
@@ -87,7 +87,7 @@ Status KZ7CfgHandler::commitProfileReg() {
     return last;
 }
 
-// The number of the message that says why it was not set, or success.
+// Success, or the number of the message with the reason.
 Status KZ7CfgHandler::setVariable(const RegistryVariable& variable, const std::string& value) {
     const bool isInstance = target_.isInstance();
     if ((variable.scope & (isInstance ? kInstanceScope : kGlobalScope)) == 0) {
@@ -109,8 +109,7 @@ Status KZ7CfgHandler::readVariable(std::string_view name, std::string_view profi
     if (row == kRegistryVariables.size()) {
         return kUnknownVariable;
     }
-    // Deliberate: what was read once is the answer for every profile that is asked for later; a handler serves one
-    // instance.
+    // Deliberate: the first value that was read is returned for every other profile too; a handler serves one instance.
     if (!read_[row]) {
         std::string found;
         const Status status = profile_.get(profile, kRegistryVariables[row].name, found);
@@ -133,8 +132,8 @@ Status KZ7CfgHandler::set(const char* instance, std::uint32_t identifier, std::s
         ure_.trace(kTraceError, "KZ7CfgHandler::set_dbm_parameter", 10, kNoSystemFile, {});
         return kSuccess;
     }
-    // Deliberate: the folder ends in a backslash and the command adds another; command processors have always been
-    // started so from here.
+    // Deliberate: the folder ends in a backslash and the command adds another; command lines are compared with those of
+    // older logs.
     folder = withoutBackslash(std::move(folder)) + '\\';
     bool ran = false;
     const Status status = setParameter(instance != nullptr ? instance : "", identifier, value, folder, ran);
@@ -170,7 +169,7 @@ Status KZ7CfgHandler::commitParameters(std::string_view instance) {
     return kSuccess;
 }
 
-// `folder` is the copy's. `ran` tells whether the command processor was called, however that ended.
+// `folder` is the copy's. `ran`: the command processor was called, with or without success.
 Status KZ7CfgHandler::setParameter(std::string_view instance, std::uint32_t identifier, std::string_view value,
                                    const std::string& folder, bool& ran) {
     std::string profiles;
@@ -184,8 +183,8 @@ Status KZ7CfgHandler::setParameter(std::string_view instance, std::uint32_t iden
         ure_.trace(kTraceError, "KZ7CfgHandler::set_dbm_parameter", 20, kNoSystemFile, instance);
         return kNoSystemFile;
     }
-    // Deliberate: some identifiers stand twice, and the command processor is always told the first name; it knows
-    // both as one parameter.
+    // Deliberate: of two names with one identifier the command processor gets the first; it knows both as one
+    // parameter.
     const auto* parameter = std::find_if(kDatabaseManagerParameters.begin(), kDatabaseManagerParameters.end(),
                                          [&](const auto& row) { return row.identifier == identifier; });
     if (parameter == kDatabaseManagerParameters.end()) {
@@ -202,7 +201,7 @@ Status KZ7CfgHandler::runProcessor(const std::string& folder, std::string_view p
     const std::string directory = compose("%s\\bin", {folder});
     InstallProcess process(ure_.ports.processes, ure_.ports.threads, ure_, command.c_str(), directory.c_str());
     if (!staysQuoted(value) || !process.commandLine().ends_with(quoted)) {
-        // A command line that was cut would set another value.
+        // A truncated command line would set another value.
         ure_.trace(kTraceError, kFunction, 10, kParameterNotSet, parameter);
         return kParameterNotSet;
     }

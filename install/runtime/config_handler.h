@@ -1,6 +1,6 @@
 // Applies the configuration that an installer collected to an installed copy: variables of its profile registry, and
-// parameters of an instance's database manager, which the copy's command processor sets. Values are recorded first
-// and committed together; what becomes of each is reported, and no failure stops the others.
+// parameters of an instance's database manager, which the copy's command processor sets. Values are recorded first and
+// committed together; the outcome of each is reported, and no failure stops the others.
 #pragma once
 
 #include <array>
@@ -17,9 +17,9 @@
 
 namespace kz7 {
 
-inline constexpr std::size_t kMaxInstanceName = 8;  // characters; what is longer is cut
+inline constexpr std::size_t kMaxInstanceName = 8;  // characters; longer names are truncated
 
-// Whose configuration it is. Both names are given, or it is that of all of a copy.
+// The target of a configuration: an instance if both names are set, else the whole copy.
 struct ConfigurationTarget {
     FixedText<kMaxInstanceName + 1> instance;
     FixedText<kMaxInstanceName + 1> profile;  // the instance's in the profile registry
@@ -34,29 +34,29 @@ public:
     KZ7CfgHandler(URE& ure, ProfileRegistry& profile, const ConfigurationTarget& target)
         : ure_(ure), profile_(profile), target_(target) {}
 
-    // Records a value, in place of an earlier one; an empty one removes the variable. Names compare without case.
-    // kUnknownVariable, kMissingItem: there is no variable, no parameter of that name.
+    // Record a value, which replaces an earlier one; an empty value removes the variable. Names compare without case.
+    // kUnknownVariable: no such variable; kMissingItem: no such parameter.
     Status recordVariable(std::string_view name, std::string_view value);
     Status recordParameter(std::string_view name, std::string_view value);
 
     // Called after each program run of commitDBMCfg().
     void setFollowUp(std::function<void()> followUp) { followUp_ = std::move(followUp); }
 
-    // Sets what was recorded of variables. The last failure's code, or success.
+    // Sets the recorded variables. The code of the last failure, or success.
     Status commitProfileReg();
 
-    // Sets what was recorded of parameters, for an instance. Success whatever becomes of each.
+    // Sets the recorded parameters of an instance. Success even if some were not set.
     Status commitDBMCfg(std::string_view instance);
 
-    // Sets one parameter at once; null for the instance is the global profile. A run that fails is traced and
-    // success. kNoSystemFile: the instance has no profile folder or no system file, or nothing has that identifier;
-    // kParameterNotSet: a value that no command can hold.
+    // Sets one parameter at once; a null instance is the global profile. A command processor that fails is traced and
+    // counts as success. kNoSystemFile: the instance has no profile folder or no system file, or no parameter has that
+    // identifier; kParameterNotSet: the value cannot be part of a command.
     Status set_dbm_parameter(const char* instance, std::uint32_t identifier, std::string_view value);
 
-    // A variable of the target as it was first read. kUnknownVariable, or the profile registry's status.
+    // A variable of the target with the value of its first read. kUnknownVariable, or the profile registry's status.
     Status getVariable(std::string_view name, std::string& value);
 
-    // How many variables and parameters could not be set so far.
+    // The numbers of variables and parameters that could not be set, and that were set, so far.
     std::uint32_t failures() const { return failures_; }
     std::uint32_t successes() const { return successes_; }
 

@@ -203,7 +203,7 @@ inline constexpr std::array kRegistryVariables = {
     RegistryVariable{"KZ7_DOCPORT",                        0x10},
 };
 
-// Some identifiers stand twice: the first name is the one that the product's command processor is told.
+// Some identifiers have two names: the product's command processor gets the first.
 inline constexpr std::array kDatabaseManagerParameters = {
     DatabaseManagerParameter{"AGENTPRI",            26},
     DatabaseManagerParameter{"AGENT_STACK_SZ",      61},

@@ -1,4 +1,4 @@
-// What the installer runtime tells its observers: tasks that start or end, and messages, questions among them.
+// Infos that the installer runtime hands to its observers: tasks that start or end, and messages, including questions.
 #pragma once
 
 #include <array>
@@ -13,7 +13,7 @@ namespace kz7 {
 
 class MessageCatalogue;
 
-inline constexpr std::size_t kMessageSize = 1024;  // bytes of a text that is copied out, with its terminator
+inline constexpr std::size_t kMessageSize = 1024;  // bytes of a copied text with its terminator
 
 // clang-format off
 inline constexpr std::uint32_t kClassInformation = 0x0100;  // the high 16 bits of a message code
@@ -43,9 +43,9 @@ protected:
 
 enum class ProgressKind : std::uint16_t { start = 0x200, end = 0x400 };
 
-inline constexpr std::int32_t kUndoTask = 3577;  // not a task: the roll-back of what was done
+inline constexpr std::int32_t kUndoTask = 3577;  // not a task: the roll-back
 
-// A task that starts or ends. Texts of an info stay their giver's and are read while it is handed around.
+// A task that starts or ends. Infos do not own their texts, which are valid until the last observer returns.
 class UREProgressInfo final : public UREBaseInfo {
 public:
     UREProgressInfo(ProgressKind kind, std::uint64_t startValue, std::int32_t task, bool installation,
@@ -59,10 +59,10 @@ public:
     std::uint64_t startValue() const { return kind_ == ProgressKind::start ? startValue_ : ~std::uint64_t{0}; }
     std::int32_t task() const { return task_; }
 
-    // Else a task of configuration.
+    // False: a configuration task.
     bool isInstallation() const { return installation_; }
 
-    // Cut to the room.
+    // Truncated to the size of `text`.
     void copyDescription(FixedText<kMessageSize>& text) const { text.assign(description_); }
 
 private:
@@ -73,13 +73,13 @@ private:
     std::string_view description_;
 };
 
-// A message: a code, whose high and low 16 bits are its class and its number in that class, and a text, found
-// by a number of its own in the catalogue and completed with inserts.
+// A message: a code, whose high 16 bits are its class and whose low 16 bits its number in that class, and a text of the
+// catalogue with inserts. The text has a number of its own.
 class UREInfo final : public UREBaseInfo {
 public:
     static constexpr std::size_t kMaxInserts = 4;
 
-    // Inserts beyond kMaxInserts are left out.
+    // Inserts beyond kMaxInserts are ignored.
     UREInfo(const MessageCatalogue& catalogue, std::uint32_t code, std::uint32_t textNumber,
             std::span<const Insert> inserts);
 
@@ -88,20 +88,20 @@ public:
     std::uint32_t messageClass() const { return code_ >> 16; }
     std::uint32_t number() const { return code_ & 0xFFFF; }
 
-    // The text into `size` bytes, cut, without a terminator; `length` is that of the whole. kBufferTooSmall:
-    // it was cut. kNoInstallerSession: the catalogue has no such text.
+    // Copies the text, truncated to `size` bytes and without a terminator; `length` is that of the whole text.
+    // kBufferTooSmall: it was truncated. kNoInstallerSession: the catalogue has no such text.
     Status copyText(char* room, std::size_t size, std::size_t& length) const;
 
-    // The same for whoever shows it in one piece; a missing text is replaced by one that names the code.
+    // The same into a fixed text. A missing text is replaced by one that names the code.
     void copyText(FixedText<kMessageSize>& text) const;
 
-    // The text that stands in for a missing one.
+    // Copies the text that replaces a missing one.
     void copyMissingText(FixedText<kMessageSize>& text) const;
 
-    // Identifiers and times of the tasks to come, of a message with kCodeTaskList.
+    // The task list of a message with kCodeTaskList; empty for any other message.
     std::string_view taskList() const;
 
-    // Makes a question of it, with the answer that is proposed.
+    // Makes the message a question with a proposed answer.
     void ask(std::string_view defaultValue) {
         queryFlag_ = 1;
         default_ = defaultValue;

@@ -26,7 +26,7 @@ constexpr ProgramType kProgramTypes[] = {  // in the order of the search, not by
 };
 // clang-format on
 
-// Every wait leaves the message text of its process here.
+// The message text of the last process that was waited for.
 FixedText<256> lastMessageText;
 
 std::size_t findIgnoringCase(std::string_view text, std::string_view part) {
@@ -37,7 +37,7 @@ std::size_t findIgnoringCase(std::string_view text, std::string_view part) {
 
 }  // namespace
 
-// What a reader has collected: its own until it was joined.
+// The text that a reader has collected; only the reader's until it was joined.
 class InstallProcess::CollectedText {
 public:
     CollectedText() = default;
@@ -45,7 +45,7 @@ public:
     CollectedText(const CollectedText&) = delete;
     CollectedText& operator=(const CollectedText&) = delete;
 
-    // False when there is no memory; the text so far stays.
+    // False: no memory; the text so far is kept.
     bool begin() { return grow(kFirstCapacity); }
 
     bool append(std::string_view piece) {
@@ -66,7 +66,7 @@ public:
 
 private:
     bool grow(std::size_t capacity) {
-        // A text that fills its capacity is terminated one past it.
+        // The terminator of a text that fills its capacity needs one byte more.
         void* room = std::realloc(room_, capacity + 1);
         if (room == nullptr) {
             return false;
@@ -81,7 +81,7 @@ private:
     std::size_t length_ = 0;
 };
 
-// Puts the standard handles back, however a run ends.
+// Restores the standard handles at the end of a run.
 class SlotsRestored {
 public:
     explicit SlotsRestored(IProcessHost& host) : host_(host) {
@@ -91,9 +91,9 @@ public:
     SlotsRestored(const SlotsRestored&) = delete;
     SlotsRestored& operator=(const SlotsRestored&) = delete;
     ~SlotsRestored() {
-        // Deliberate: both go back through the output slot, so that it ends with the old standard error and the
-        // error slot still names a closed pipe; what inspects the slots afterwards knows them so. Nothing may
-        // write through a slot, close it or test it.
+        // Deliberate: both are restored through the output slot, which ends with the old standard error, and the error
+        // slot still names a closed pipe; programs that inspect the slots afterwards depend on it. Nothing may write
+        // through a slot, close it or test it.
         host_.setSlot(StandardSlot::output, output_);
         host_.setSlot(StandardSlot::output, error_);
     }
@@ -104,8 +104,8 @@ private:
     StreamHandle error_ = StreamHandle::none;
 };
 
-// A reader thread's argument, which it frees. The reader ends by closing its read end, so that neither a
-// waking byte nor the program can wait for a reader that is gone.
+// The argument of a reader thread, which frees it. A reader ends by closing its read end, so that no writer waits for a
+// reader that has ended.
 struct InstallProcess::Reader {
     IProcessHost& host;
     OwnedStream readEnd;
@@ -123,10 +123,10 @@ struct InstallProcess::Reader {
     void collect() {
         FixedBuffer<kPieceSize> piece;
         bool kept = true;
-        // Deliberate: a read of 0 bytes ends the reader, and what is read in the pass that sees the stop flag
-        // is dropped, the waking bytes among it; callers know captured texts this way.
+        // Deliberate: a read of 0 bytes ends the reader, and the bytes of the read that sees the stop flag are dropped,
+        // because the waking bytes are among them.
         while (host.read(readEnd.get(), piece) == kSuccess && piece.size != 0 && !stop->load()) {
-            // Out of memory, the rest is read and dropped: the program's own result stays true.
+            // Without memory the rest is read and dropped, so that the program can end normally.
             kept = kept && text->append(piece.view());
         }
     }
@@ -194,7 +194,7 @@ Status InstallProcess::wholeCommandLine(IProcessHost& host, std::string& command
     return kNoProgramType;
 }
 
-// The command line of the object: kNoProgramType leaves it empty.
+// Builds the command line of the object; kNoProgramType leaves it empty.
 Status InstallProcess::build(const char* command) {
     setCommandLine({});
     if (command == nullptr) {
@@ -242,13 +242,13 @@ Status InstallProcess::run(bool wait) {
     OwnedStream outputReadEnd(host_);
     OwnedStream errorReadEnd(host_);
     if (openPipes(outputReadEnd, errorReadEnd) != kSuccess) {
-        // Deliberate: not reported here; the wait that follows tells that nothing was executed.
+        // Deliberate: not reported here; the wait that follows returns kNotExecuted.
         closeWriteEnds();
         return kSuccess;
     }
     stop_ = std::make_shared<std::atomic<bool>>(false);
-    // Deliberate: only the second start is the result, and the program is started whatever it is; a stream
-    // without reader is a closed pipe to the program.
+    // Deliberate: only the second start is the result, and the program is started in any case; a stream without a
+    // reader is a closed pipe to the program.
     startReader(outputReadEnd, standardOutputText_, outputReader_);
     const Status status = startReader(errorReadEnd, standardErrorText_, errorReader_);
     const ProcessStart start{commandLine_.view(), workingDirectory_, outputWriteEnd_.get(), errorWriteEnd_.get()};
@@ -257,7 +257,7 @@ Status InstallProcess::run(bool wait) {
     if (wait) {
         waitOrWake();
     }
-    // Deliberate: set for a program that could not be started too; the wait then tells that it has no exit code.
+    // Deliberate: also set for a program that could not be started; the wait then returns kExitCodeUnavailable.
     executed_ = true;
     if (created != kSuccess) {
         timeout_ = 0;
@@ -303,9 +303,9 @@ Status InstallProcess::startReader(OwnedStream& readEnd, Collected& text, Thread
     return status;
 }
 
-// Waits for the program up to the timeout; readers of one that did not end are stopped.
-// Deliberate: the program itself is not killed, and what it has started keeps a reader that nobody stopped waiting; an
-// installer must not cut off a configuration half-way.
+// Waits for the program up to the timeout and stops the readers of one that did not end.
+// Deliberate: the program itself is not killed, and programs that it has started keep its readers waiting; an installer
+// must not interrupt a configuration.
 void InstallProcess::waitOrWake() {
     if (host_.waitProcess(process_.process, timeout_) != kSuccess) {
         wakeReaders();
@@ -349,7 +349,7 @@ Status InstallProcess::waitForCompletion(std::uint32_t& exitCode, std::uint32_t 
     return status == kSuccess ? kSuccess : kExitCodeUnavailable;
 }
 
-// True when the reader has ended, or there is none: what it collected may be read.
+// True if the reader has ended or was never started: its text may then be read.
 bool InstallProcess::joinReader(ThreadRecord& record) {
     if (record.handle == ThreadHandle::none) {
         return true;
@@ -370,8 +370,8 @@ Status InstallProcess::copyOut(const Collected& text, ThreadRecord& record, char
     if (size != 0) {
         buffer[all.substr(0, size - 1).copy(buffer, size - 1)] = '\0';
     }
-    // Deliberate: a buffer of exactly the text's length loses its last character to the terminator and gives
-    // kBufferTooSmall; callers know the answer.
+    // Deliberate: in a buffer of exactly the text's length the terminator replaces the last character, and the result
+    // is kBufferTooSmall; callers expect it.
     return all.data() == nullptr || all.size() < size ? kSuccess : kBufferTooSmall;
 }
 
@@ -406,13 +406,13 @@ void InstallProcess::post(std::uint32_t number, std::string_view text, std::stri
     }
 }
 
-// Ends what an earlier run left: no reader of it writes into the object any more.
+// Releases the resources of an earlier run; none of its readers uses the object afterwards.
 void InstallProcess::giveUpRun() {
     wakeReaders();
     closeWriteEnds();
     for (ThreadRecord* record : {&outputReader_, &errorReader_}) {
         if (!joinReader(*record)) {
-            // It has its text to itself.
+            // A reader that could not be joined shares ownership of its text.
             threads_.closeThread(record->handle);
         }
         *record = {};

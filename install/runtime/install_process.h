@@ -1,5 +1,5 @@
-// Runs one command for the installer runtime: turns it into a command line that starts the right program,
-// starts it hidden with its output captured, waits, and hands the captured output out or posts it.
+// Runs one command for the installer runtime: builds its command line, starts the program hidden with its output
+// captured, waits for it, and copies or posts the captured output.
 #pragma once
 
 #include <atomic>
@@ -27,8 +27,8 @@ using CommandLine = FixedText<kCommandLineSize>;
 // `execute` exchanges the process-wide standard handles, so no two threads execute at once, and one object
 // belongs to one thread. The two readers share the captured texts and the stop flag only.
 //
-// Whoever writes to the console flushes it before `execute`: the program's own lines may follow at once.
-// Whoever keeps a store open commits it before: the program reads it.
+// Callers flush the console before `execute`, so that the program's lines come after theirs, and commit an open store,
+// so that the program reads what was written.
 class InstallProcess {
 public:
     // `command` may be null, which leaves nothing to run; `workingDirectory` null is this process's own.
@@ -39,31 +39,31 @@ public:
                    const char* workingDirectory = nullptr, bool wrapperMode = false, bool wrapperSwitch = false,
                    bool = false);
 
-    // Wakes and joins both readers. A program that still runs is neither killed nor waited for. Where a
-    // program that has ended left its pipes to another, the readers are waited for until that one ends.
+    // Wakes and joins both readers. A program that still runs is neither killed nor waited for. If a program that has
+    // ended left its pipes to a child of its own, this waits until that child ends.
     ~InstallProcess();
     InstallProcess(const InstallProcess&) = delete;
     InstallProcess& operator=(const InstallProcess&) = delete;
 
     // Starts the program; with `wait`, returns once it has ended or the timeout passed, which is infinite
     // unless an earlier wait set another or an earlier program could not be started. Returns the status of starting the
-    // reader of standard error and nothing else: whether the program runs is for the wait to say. An earlier run of the
+    // reader of standard error only; the wait reports whether the program ran. An earlier run of the
     // object is given up. kNoMemory: nothing runs.
     Status execute(bool wait, bool trace);
 
     // Waits for the program and its readers. kNotExecuted; kExitCodeUnavailable: the program could not be
-    // started, or its command line was cut; `exitCode` is then that status too, so that it never reads as a success.
-    // After the timeout, in milliseconds, the readers are stopped, and the exit code is what the system tells of a
-    // running program.
+    // started, or its command line was truncated; `exitCode` is then that status too, so that it never reads as a
+    // success. After the timeout, in milliseconds, the readers are stopped, and the exit code is what the system
+    // returns for a running program.
     Status waitForCompletion(std::uint32_t& exitCode, std::uint32_t timeout);
 
-    // Copies what was captured, cut to `size` bytes with a terminator in the last one. kBufferTooSmall: the
+    // Copies the captured text, truncated to `size` bytes with its terminator. kBufferTooSmall: the
     // text with its terminator does not fit. Captured texts end at their first NUL.
     Status copyStandardOutput(char* buffer, std::size_t size);
     Status copyStandardError(char* buffer, std::size_t size);
     std::size_t standardOutputLength();
 
-    // Posts what was captured and is not empty.
+    // Post each captured text that is not empty.
     void postOutput(std::string_view source, std::uint32_t flags);
     void postStandardOutput(std::string_view source, std::uint32_t flags);
     void postStandardError(std::string_view source, std::uint32_t flags);
@@ -76,7 +76,7 @@ public:
 
     std::string_view commandLine() const { return commandLine_.view(); }
 
-    // The message text of the process that was waited for last.
+    // The message text of the last process that was waited for.
     static std::string_view lastMessage();
 
 private:
@@ -108,7 +108,7 @@ private:
     bool commandLineCut_ = false;
 
 protected:
-    // What is reported in place of the exit code where the text is not empty.
+    // If the text is not empty, the wait returns resultCode_ in place of the exit code.
     FixedText<256> messageText_;
 
 private:

@@ -80,7 +80,7 @@ UserRoot rootOfUser(const Installation& at) {
     return {at.registry, sid.text()};
 }
 
-// What an installation does with a feature; one that it does not know has neither.
+// What an installation does with a feature; an unknown feature is neither removed nor selected.
 struct FeatureRequest {
     FeatureRequest(IInstallerSession& session, std::string_view feature) {
         FeatureState installed = FeatureState::unknown;
@@ -116,7 +116,7 @@ public:
         }
     }
 
-    // The rows of an executed view; what ended them but their end.
+    // Saves the rows of an executed view. The status that ended them early, or success.
     Status saveTable(SessionHandle view) {
         for (;;) {
             OwnedSessionHandle record(at_.session);
@@ -154,7 +154,7 @@ public:
     }
 
 private:
-    // The name in a row of the table; empty when it cannot be read.
+    // The name in a row of the table; empty if it cannot be read.
     std::string nameIn(SessionHandle record) {
         Buffer none(nullptr, 0);
         if (at_.session.recordString(record, 1, none) != kMoreData) {

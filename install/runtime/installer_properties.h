@@ -1,6 +1,6 @@
-// Installer properties for immediate and deferred custom actions alike. The installer keeps almost all of them from
-// deferred actions, so an immediate one saves what they will need in the registry of the installing user, where
-// reading looks first; what was saved is deleted when the work is done.
+// Installer properties for immediate and deferred custom actions. The installer hides almost all properties from
+// deferred actions, so an immediate action saves those that they will need in the registry of the installing user,
+// where deferred reads look first; the saved values are deleted when the work is done.
 #pragma once
 
 #include <cstdint>
@@ -11,7 +11,7 @@
 
 namespace kz7 {
 
-inline constexpr std::size_t kPropertySize = 1024;  // bytes of a property's value with its NUL, wherever it is kept
+inline constexpr std::size_t kPropertySize = 1024;  // bytes of a property's value with its NUL
 
 // The running installation, its user's registry, and the engine that its traces go to. No exception leaves the
 // operations below; kNoMemory: memory ran out.
@@ -38,10 +38,10 @@ Status iMsiSetProperty(const Installation& at, const char* name, const char* val
 // kNoInstallationDatabase, or the first failure of the installer in giving the table.
 Status iSavePropertiesForDeferred(const Installation& at);
 
-// Deletes what was saved; nothing saved is success.
+// Deletes the saved values; succeeds if none exist.
 Status iDeleteSavedProperties(const Installation& at);
 
-// Follows a read or write of a property for a purpose of its own: the log names operation, property and status.
+// Traces the operation, property and status of a read or write for a named purpose.
 void traceProperty(const Installation& at, std::string_view operation, std::string_view name, Status status);
 
 }  // namespace kz7

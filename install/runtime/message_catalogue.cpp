@@ -14,7 +14,7 @@ struct Row {
     std::string_view text;
 };
 
-// Prefixes and titles are joined to what follows without a blank of their own.
+// Prefixes and titles end in the blank that separates them from the rest of the line.
 // clang-format off
 constexpr std::array kTexts = {
     Row{ 997, "Output of %s: %s"},

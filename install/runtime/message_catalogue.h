@@ -1,5 +1,4 @@
-// The texts of the installer runtime by number: English ones of its own, and those of a file for another
-// language over them.
+// The texts of the installer runtime by number: built-in English texts, which a file may replace for another language.
 #pragma once
 
 #include <cstdint>
@@ -15,7 +14,7 @@
 namespace kz7 {
 
 // clang-format off
-inline constexpr std::uint32_t kHeaderTitles          = 2000;  // the trailer's is 1 more; 100 more for each kind of run
+inline constexpr std::uint32_t kHeaderTitles          = 2000;  // + 1 for the trailer; + 100 for each further kind of run
 inline constexpr std::uint32_t kWarningPrefix         = 2002;
 inline constexpr std::uint32_t kNotePrefix            = 2003;
 inline constexpr std::uint32_t kErrorPrefix           = 2004;
@@ -27,7 +26,7 @@ inline constexpr std::uint32_t kReportBothMessage     = 2013;  // function, prob
 inline constexpr std::uint32_t kTaskListMessage       = 2007;  // the list
 inline constexpr std::uint32_t kPropertyMessage       = 2014;  // operation, property, status
 inline constexpr std::uint32_t kUnknownNameMessage    = 2015;  // name, line of the response file
-inline constexpr std::uint32_t kGenericDialogTitle    = 2020;  // the name GENERIC_DLG_TITLE stands for this number
+inline constexpr std::uint32_t kGenericDialogTitle    = 2020;  // named GENERIC_DLG_TITLE in catalogue files
 inline constexpr std::uint32_t kTaskStartMessage      = 2030;  // description
 inline constexpr std::uint32_t kTaskEndMessage        = 2031;  // description
 inline constexpr std::uint32_t kUndoStartMessage      = 2032;
@@ -47,7 +46,7 @@ public:
     // failure, kInvalidData or kNoMemory, the texts stay as they are and `fault` has the reason.
     Status load(std::string_view file, ResponseFault& fault);
 
-    // The text with its inserts, as UREInfo::copyText() gives it.
+    // Copies the text with its inserts. Results as for UREInfo::copyText().
     Status copyText(std::uint32_t number, std::span<const Insert> inserts, char* room, std::size_t size,
                     std::size_t& length) const;
 

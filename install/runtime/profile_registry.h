@@ -8,7 +8,7 @@
 
 namespace kz7 {
 
-inline constexpr std::string_view kGlobalProfile = "KZ7GLOBALPF";  // the instance name that stands for all of a copy
+inline constexpr std::string_view kGlobalProfile = "KZ7GLOBALPF";  // the instance name of the whole copy
 
 // The store outlives it. Changes wait for settle(). No exception leaves an operation; kNoMemory: memory ran out.
 class ProfileRegistry {
@@ -18,8 +18,7 @@ public:
     // Sets a variable of a copy that has a key; the empty value removes it. kVariableNotThere: there is none to remove.
     Status set(std::string_view instance, std::string_view variable, std::string_view value);
 
-    // Ends what the store holds for this writer alone: others, a program that is started too, see what was set and
-    // may write.
+    // Commits: other programs, including ones that are started now, see the changes and can write.
     Status settle();
 
     // kVariableNotThere: it is not set; kMoreData: it is longer than any variable can be.

@@ -1,5 +1,5 @@
-// Where the runtime's parts send what they have to say about their work; the runtime engine hands it on to
-// its observers. Parts that run without an engine get `QuietSink`.
+// The interface through which the parts of the runtime report; the engine passes the reports to its observers. Code
+// that runs without an engine uses `QuietSink`.
 #pragma once
 
 #include <cstdint>
@@ -12,12 +12,12 @@ namespace kz7 {
 inline constexpr std::uint32_t kTraceError = 0x4000001;  // the code of every trace
 
 // `function` is the qualified name of the reporting function ("InstallProcess::execute"), `probe` the step
-// in it (10, 20, ...). No operation fails; texts are the callee's only for the call. One thread.
+// in it (10, 20, ...). No operation fails; texts need to be valid during the call only. One thread.
 class IReportSink {
 public:
     virtual ~IReportSink() = default;
 
-    // A record for the log alone.
+    // A record for the log only.
     virtual void trace(std::uint32_t code, std::string_view function, std::uint32_t probe, Status value,
                        std::string_view text) = 0;
 

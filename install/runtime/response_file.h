@@ -1,5 +1,5 @@
-// Response files: what an unattended installation is told, as lines NAME = value. Lines that begin with '*' or
-// ';' are comments. A value in quotation marks keeps its blanks, a doubled mark in it stands for one.
+// Response files: the input of an unattended installation, as lines NAME = value. Lines that begin with '*' or ';' are
+// comments. A value in quotation marks keeps its blanks; a doubled quotation mark in it is one quotation mark.
 #pragma once
 
 #include <cstdint>

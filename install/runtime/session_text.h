@@ -6,8 +6,8 @@
 
 namespace kz7 {
 
-// The text so that the installer shows it as it is: it would put the value of a property, a password too, in
-// place of every "[Name]".
+// Escapes the text so that the installer shows it unchanged. It would replace every "[Name]" with the value of that
+// property, which may be a password.
 std::string escapedForSession(std::string_view text);
 
 }  // namespace kz7

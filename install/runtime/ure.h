@@ -1,5 +1,4 @@
-// The runtime engine: what a run of the installer is about, the texts it speaks in, and the observers that it
-// hands every info to, in turn.
+// The runtime engine: the state of one installer run, its message texts, and the observers that get every info in turn.
 #pragma once
 
 #include <cstdint>
@@ -23,7 +22,7 @@
 
 namespace kz7 {
 
-// What the run does. The first of these bits that is set, in this order, names it in the log.
+// The kind of run. The log is titled by the first of these bits that is set, in this order.
 // clang-format off
 inline constexpr std::uint32_t kModeInstall   = 0x01;
 inline constexpr std::uint32_t kModeUpdate    = 0x02;
@@ -33,7 +32,7 @@ inline constexpr std::uint32_t kModeConfigure = 0x10;
 
 inline constexpr char kProductKeyword[] = "PROD";  // of a response file, and the installer property of that name
 
-// They outlive the engine.
+// The ports outlive the engine.
 struct RuntimePorts {
     IFileSystem& files;
     IProcessHost& processes;
@@ -41,10 +40,10 @@ struct RuntimePorts {
     IConsole& console;
     ITerminal& terminal;
     IHostInformation& host;
-    IInstallerSession* session = nullptr;  // null: there is none
+    IInstallerSession* session = nullptr;  // null: no installer session
 };
 
-// What an observer takes. Traces go to the log alone: a success is never told to a front end as an error.
+// Which infos an observer gets. Only the log gets traces: a success must not reach a front end as an error.
 enum class Takes { everything, allButTraces };
 
 // No exception leaves an operation. Statuses are kSuccess or kNoMemory, with the object unchanged, unless stated
@@ -73,16 +72,16 @@ public:
     Status registerObserver(IObserver& observer, Takes takes = Takes::allButTraces);
     void unregisterObserver(IObserver& observer);
 
-    // Null: none. It gets the progress of tasks besides the observers.
+    // Gets the progress of tasks in addition to the observers. Null: no such observer.
     void setProgressObserver(IProgressObserver* observer) { progressObserver_ = observer; }
 
     void startTask(std::uint64_t startValue, std::int32_t task, bool installation, std::string_view description);
     void endTask(std::int32_t task, bool installation, std::string_view description);
 
-    // Entries of identifier and time: "10,30;11,45".
+    // `taskList` has entries of identifier and time: "10,30;11,45".
     void announceTasks(std::string_view taskList);
 
-    // Text `textNumber` of the catalogue.
+    // Raises text `textNumber` of the catalogue as a message or as a trace.
     void message(std::uint32_t code, std::uint32_t textNumber, std::span<const Insert> inserts);
     void traceMessage(std::uint32_t textNumber, std::span<const Insert> inserts);
 

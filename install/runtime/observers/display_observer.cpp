@@ -30,7 +30,7 @@ Status UREDisplayObserverWI::showProgress(const UREProgressInfo& info) {
     FixedText<kMessageSize> description;
     info.copyDescription(description);
     std::int32_t answer = 0;
-    // An action start names the action, says what it does, and lays out its data lines.
+    // The fields of an action start: name, description, template of its data lines.
     return show(kSessionActionStart, {kCustomActionName, description.view()}, {}, answer);
 }
 
@@ -63,7 +63,7 @@ Status UREDisplayObserverWI::showMessage(UREInfo& info) {
     }
 }
 
-// Boxes of languages that are written from right to left are laid out so.
+// Right-to-left layout for languages that are written that way.
 std::uint32_t UREDisplayObserverWI::boxDirection() {
     char language[kPropertySize] = {};
     std::uint32_t size = sizeof language;

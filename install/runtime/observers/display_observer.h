@@ -1,5 +1,5 @@
-// Shows infos in the installer's own user interface: tasks as actions, messages beneath them, errors and
-// questions in boxes.
+// Shows infos in the installer's user interface: tasks as actions, messages as their details, errors and questions in
+// message boxes.
 #pragma once
 
 #include "install/runtime/installer_properties.h"
@@ -7,7 +7,7 @@
 
 namespace kz7 {
 
-// Boxes open only where the installer shows any. The installation outlives it.
+// Boxes open only if the installer shows a user interface. The installation outlives the object.
 class UREDisplayObserverWI final : public IObserver {
 public:
     explicit UREDisplayObserverWI(const Installation& at) : at_(at) {}

@@ -16,8 +16,8 @@ UREExternalOutputPipe::UREExternalOutputPipe(IConsole& console, ITerminal& lines
     makeRoom(kFirstCapacity, "UREExternalOutputPipe::UREExternalOutputPipe");
 }
 
-// Deliberate: "%%" becomes one percent sign in all that is written, text of others included; the texts were
-// always printed as formats, and front ends know it. Nothing is a format to the C library.
+// Deliberate: "%%" becomes one percent sign in every text, foreign texts included; the texts were always printed as
+// formats, and front ends expect it. No text is a format of the C library.
 void UREExternalOutputPipe::writeMessage(const char* text) {
     std::string_view rest = text == nullptr ? std::string_view{} : text;
     while (!rest.empty()) {

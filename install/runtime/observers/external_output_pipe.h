@@ -1,4 +1,4 @@
-// The output of a stream: the process's standard output, with a queue before it, and its standard input.
+// A stream on the process's standard output, with a queue, and standard input.
 #pragma once
 
 #include <memory>
@@ -12,10 +12,10 @@ namespace kz7 {
 
 inline constexpr std::size_t kQueuedCharacters = 1024;  // of a queued message
 
-// The queue grows and never shrinks. A reader that is gone takes nothing and stops nothing.
+// The queue grows and never shrinks. Writing to a pipe without a reader succeeds and has no effect.
 class UREExternalOutputPipe final : public UREExternalOutput {
 public:
-    // Without memory for the queue, which is reported, everything that is queued is lost.
+    // Without memory for the queue, which is reported, queued texts are lost.
     UREExternalOutputPipe(IConsole& console, ITerminal& lines, IReportSink& sink);
 
     void writeMessage(const char* text) override;

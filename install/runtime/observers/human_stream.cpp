@@ -15,12 +15,12 @@ constexpr std::string_view kAbort = "ABORT";
 
 UREExternalObserverHumanStream* theStream = nullptr;
 
-// Most texts: nothing in them needs a look.
+// True for most texts: nothing in them needs to be escaped.
 bool isPlain(std::string_view text) {
     return std::all_of(text.begin(), text.end(), [](char c) { return (c >= ' ' && c <= '~') || c == '\n'; });
 }
 
-// A text for people: what it holds does not steer the terminal, but its line ends stay.
+// Escapes control characters but keeps line ends.
 std::string shownLines(std::string_view text) {
     std::string shown;
     for (;;) {
@@ -39,8 +39,8 @@ std::string shownLines(std::string_view text) {
 
 UREExternalObserverHumanStream* UREExternalObserverHumanStream::getInstance(URE& ure) {
     if (theStream == nullptr) {
-        std::unique_ptr<UREExternalOutput> output(new (std::nothrow)
-                                                      UREExternalOutputPipe(ure.ports.console, ure.ports.terminal, ure));
+        std::unique_ptr<UREExternalOutput> output(
+            new (std::nothrow) UREExternalOutputPipe(ure.ports.console, ure.ports.terminal, ure));
         if (output != nullptr) {
             theStream = new (std::nothrow) UREExternalObserverHumanStream(ure, std::move(output));
         }

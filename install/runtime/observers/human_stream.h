@@ -1,5 +1,5 @@
-// The stream for a person: readable texts of the catalogue on standard output, errors on standard error, as
-// wide as the terminal.
+// The stream for people: texts of the catalogue on standard output and errors on standard error, wrapped to the width
+// of the terminal.
 #pragma once
 
 #include <string>
@@ -10,17 +10,17 @@
 
 namespace kz7 {
 
-// At most one per process, like the machine stream; a run has the one or the other.
+// At most one per process, as is the machine stream; a run uses one of the two.
 class UREExternalObserverHumanStream final : public UREExternalObserverStream {
 public:
-    // Makes it on the first request. Null: no memory.
+    // Creates it on the first call. Null: no memory.
     static UREExternalObserverHumanStream* getInstance(URE& ure);
     static void release();
 
     Status handleProgress(UREProgressInfo& info) override;
     Status handleMessage(UREInfo& info) override;
 
-    // An empty line is the answer that is proposed, ABORT aborts, anything else is the answer.
+    // An empty line accepts the proposed answer, ABORT aborts, any other line is the answer.
     void handleQuery(UREInfo& info) override;
 
 private:

@@ -13,14 +13,14 @@ namespace {
 constexpr std::size_t kMaxTitle = 44;       // characters
 constexpr std::size_t kMaxDate = 42;        // characters
 constexpr std::size_t kMaxSystemText = 79;  // characters
-constexpr std::size_t kTextStep = 256;      // bytes that the room for a text grows by
-constexpr std::size_t kKeptRoom = 1 << 16;  // bytes of room that outlive a line
+constexpr std::size_t kTextStep = 256;      // bytes by which the buffer of a text grows
+constexpr std::size_t kKeptRoom = 1 << 16;  // bytes of capacity kept after a line
 constexpr std::uint32_t kPrefixMask = 0x4000103;
 
 constexpr std::string_view kSeparator = "============================================================";
 static_assert(kSeparator.size() == 60);
 
-// The kinds of run in the order in which they are looked for; each has its titles 100 numbers on.
+// The kinds of run in the order of the test; the title numbers of each are 100 above those of the one before.
 constexpr std::array kRuns = {kModeInstall, kModeUpdate, kModeRemove, kModeConfigure};
 
 URELogObserver* theLog = nullptr;
@@ -101,7 +101,7 @@ Status URELogObserver::shortFolder(std::string_view folder, Buffer& shortened) {
     if (status != kCallNotImplemented) {
         return status;
     }
-    // A host without short paths leaves a folder that is there as it is.
+    // On a host without short paths an existing folder is its own short form.
     if (folder.empty() || folder.size() >= shortened.capacity) {
         return kBadPathname;
     }
@@ -167,7 +167,7 @@ Status URELogObserver::writeKeptLine() {
     if (!file_) {
         return writeToSession(line_);
     }
-    // A write goes out whole or is told short: there is nothing to flush.
+    // The port does not buffer: there is nothing to flush.
     line_ += '\n';
     std::uint32_t written = 0;
     ure_.ports.files.write(file_.get(), line_, written);
@@ -175,8 +175,7 @@ Status URELogObserver::writeKeptLine() {
     if (line_.capacity() > kKeptRoom) {
         std::string().swap(line_);
     }
-    // Deliberate: what was taken of a line that did not go out whole is returned as a count; callers tell it from a
-    // status by where it comes from.
+    // Deliberate: the result of a short write is its count; callers know from the operation that it is not a status.
     return whole ? kSuccess : written != 0 ? written : kFailed;
 }
 
@@ -185,7 +184,7 @@ Status URELogObserver::writeToSession(std::string_view text) {
     if (session == nullptr) {
         return kNoInstallerSession;
     }
-    // What the session answers changes nothing: there is nowhere else to write it.
+    // The session's results are ignored: no other place could take the line.
     OwnedSessionHandle record(*session);
     if (session->createRecord(1, record.receive()) == kSuccess) {
         std::int32_t answer = 0;
@@ -216,8 +215,7 @@ std::string_view URELogObserver::prefixOf(const UREInfo& info, Buffer& time) {
             return ure_.messages.pattern(kWarningPrefix);
         case kCodeReport:
             if (stampsTime_ && ure_.ports.host.localTime(TimeText::timeOfDay, time) == kSuccess) {
-                // Deliberate: no blank follows, before an error in words either; prefixes bring their own
-                // separator, the time has none.
+                // Deliberate: no blank follows the time; only prefixes end in a separator.
                 return time.view();
             }
             return {};
@@ -238,7 +236,7 @@ Status URELogObserver::writeInfo(const UREInfo& info) {
     for (std::size_t room = kTextStep; status == kBufferTooSmall;) {
         line_.resize(prefix + room);
         status = info.copyText(line_.data() + prefix, room, length);
-        // The lookup tells what is missing: the steps up to there are taken at once.
+        // The lookup returns the needed length: all steps up to it are taken at once.
         room += std::max<std::size_t>(1, (std::max(length, room) - room + kTextStep - 1) / kTextStep) * kTextStep;
     }
     if (status == kNoInstallerSession) {

@@ -1,4 +1,4 @@
-// The log of a run: every info as a line, in a file or, without one, in the installer session's own log.
+// The log of a run: every info as a line, in a file or, without a file, in the installer session's log.
 #pragma once
 
 #include <cstdint>
@@ -18,7 +18,7 @@ inline constexpr std::size_t kPathSize = 261;  // bytes of a file path with its 
 // file is open. The engine outlives it.
 class URELogObserver final : public IObserver {
 public:
-    // Makes it on the first request. Null: no memory.
+    // Creates it on the first call. Null: no memory.
     static URELogObserver* getInstance(URE& ure);
     static void release();
 
@@ -27,14 +27,14 @@ public:
     // are written. A file that cannot be opened is reported. Success, or why no file is in use.
     Status setLogFile(std::string_view path);
 
-    // Opens or closes the run in the log. Results as writeLine(), also those of a missing title text.
+    // Writes the header or the trailer of the run. Results as writeLine(); also the status of a missing title text.
     Status writeHeader(bool isEnd);
 
-    // kNoInstallerSession: there is neither a file nor a session. In file mode, the characters written where
-    // they are fewer than the line has, kFailed where none were.
+    // kNoInstallerSession: neither a file nor a session is available. In file mode, after a short write, the number of
+    // characters written, or kFailed if it is 0.
     Status writeLine(std::string_view text);
 
-    // An error report with the time in front.
+    // Reports an error; its line begins with the time.
     void writeFunction(std::string_view text);
 
     Status update(UREBaseInfo& info) override;
@@ -42,8 +42,8 @@ public:
     // The path as the caller gave it; empty before setLogFile().
     std::string_view logFilePath() const { return logFilePath_.view(); }
 
-    // The file of that folder's short form with kLogFileName, copied into `buffer` of kPathSize bytes, or with
-    // null into one of the process's; returns that buffer.
+    // Copies the path of kLogFileName in the short form of the log's folder into `buffer` of kPathSize bytes, or with
+    // null into a static buffer. Returns that buffer.
     const char* componentLogPath(char* buffer) const;
 
 private:
@@ -66,8 +66,8 @@ private:
     FixedText<kPathSize> logFilePath_;
     FixedText<kPathSize> systemName_;
     FixedText<kPathSize> systemVersion_;
-    OwnedFile file_;    // while it is open, lines go there
-    std::string line_;  // room that is kept from line to line
+    OwnedFile file_;    // file mode while it is open
+    std::string line_;  // keeps its capacity from line to line
 };
 
 }  // namespace kz7

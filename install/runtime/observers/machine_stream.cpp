@@ -18,8 +18,8 @@ UREExternalObserverMachineStream* theStream = nullptr;
 
 UREExternalObserverMachineStream* UREExternalObserverMachineStream::getInstance(URE& ure) {
     if (theStream == nullptr) {
-        std::unique_ptr<UREExternalOutput> output(new (std::nothrow)
-                                                      UREExternalOutputPipe(ure.ports.console, ure.ports.terminal, ure));
+        std::unique_ptr<UREExternalOutput> output(
+            new (std::nothrow) UREExternalOutputPipe(ure.ports.console, ure.ports.terminal, ure));
         if (output != nullptr) {
             theStream = new (std::nothrow) UREExternalObserverMachineStream(ure, std::move(output));
         }
@@ -58,7 +58,7 @@ Status UREExternalObserverMachineStream::handleMessage(UREInfo& info) {
     if (info.isQuestion()) {
         info.copyText(text);
         const Status told = info.number() == kMediumQuestion ? output().addQueueMessage(kMediumNotFoundLine) : kSuccess;
-        // Deliberate: every question is told as one for the path of the medium; front ends know no other.
+        // Deliberate: every question is written as one for the path of the medium; front ends know no other.
         const Status asked = output().addQueueMessage(queryLine(text.view(), info.defaultValue()).c_str());
         return told == kSuccess ? asked : told;
     }
@@ -90,8 +90,8 @@ void UREExternalObserverMachineStream::handleQuery(UREInfo& info) {
             info.setResponse(nullptr);
             break;
         case AnswerLine::response:
-            // Deliberate: the text of an answer is not passed on, the asker learns only that there is one;
-            // front ends may send anything after the colon.
+            // Deliberate: the text of an answer is not passed on, only that the user answered; front ends may send
+            // anything after the colon.
             info.setResponse("");
             break;
         case AnswerLine::ignored:

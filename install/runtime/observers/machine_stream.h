@@ -7,14 +7,14 @@
 
 namespace kz7 {
 
-// There is at most one per process; its life brackets the protocol. The engine outlives it, and whoever
-// registered it with the engine unregisters it before it ends.
+// At most one per process; its creation and destruction write the first and the last line of the protocol. The engine
+// outlives it; callers that register it unregister it before it is destroyed.
 class UREExternalObserverMachineStream final : public UREExternalObserverStream {
 public:
-    // Makes it on the first request, which tells the front end that the run begins. Null: no memory.
+    // Creates it on the first call and writes INSTALLSTART. Null: no memory.
     static UREExternalObserverMachineStream* getInstance(URE& ure);
 
-    // Ends it, if there is one: the front end is told the log file. The log lives longer.
+    // Destroys it, if it exists, and writes INSTALLEND with the path of the log, which must still exist.
     static void release();
 
     Status handleProgress(UREProgressInfo& info) override;

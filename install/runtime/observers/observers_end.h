@@ -1,5 +1,4 @@
-// The end of the process's observers, whichever of them there are: with the object, which goes before the engine that
-// they observe.
+// Destroys the process's observers, if they exist, at the end of a scope. Declare it after the engine.
 #pragma once
 
 #include "install/runtime/observers/human_stream.h"
@@ -13,7 +12,7 @@ struct ObserversEnd {
     ObserversEnd(const ObserversEnd&) = delete;
     ObserversEnd& operator=(const ObserversEnd&) = delete;
     ~ObserversEnd() {
-        // The last line of a front end names the log.
+        // Before the log: the last line for a front end has its path.
         UREExternalObserverMachineStream::release();
         UREExternalObserverHumanStream::release();
         URELogObserver::release();

@@ -50,7 +50,7 @@ ProtocolLine lineOf(std::string_view pattern, std::initializer_list<Insert> inse
     return line;
 }
 
-// Takes the next entry off a list; false when none is left.
+// Removes the next entry from a list; false if the list is empty.
 bool takeTask(std::string_view& list, TaskField& identifier, TaskField& time) {
     if (list.empty()) {
         return false;
@@ -126,7 +126,7 @@ AnswerLine parseAnswer(std::string_view line) {
     if (!line.starts_with(kResponseAnswer)) {
         return AnswerLine::ignored;
     }
-    // Fields stand between runs of colons; the keyword begins the first.
+    // Runs of colons separate the fields; the first begins with the keyword.
     const std::size_t colon = std::min(line.find(':'), line.size());
     const bool answered = line.find_first_not_of(':', colon) != std::string_view::npos;
     return answered ? AnswerLine::response : AnswerLine::ignored;

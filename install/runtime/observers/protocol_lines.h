@@ -1,5 +1,5 @@
-// The lines that the machine stream tells a front end, and the answers that it takes: text in, text out.
-// docs/protocol.md is their grammar.
+// The lines that the machine stream writes to a front end, and the answers that it reads, as pure functions.
+// docs/protocol.md has the grammar.
 #pragma once
 
 #include <string_view>
@@ -9,8 +9,8 @@
 
 namespace kz7 {
 
-// At most 1,023 characters with the line feed: what is too long loses text, never its line feed. A line end
-// in a text is written as a blank.
+// At most 1,023 characters with the line feed: a longer line loses text, never the line feed. A line end in a text is
+// written as a blank.
 using ProtocolLine = FixedText<kMessageSize>;
 
 inline constexpr const char* kInstallStartLine = "MESSAGE INFO INSTALLSTART\n";
@@ -23,7 +23,7 @@ ProtocolLine queryLine(std::string_view text, std::string_view defaultValue);
 ProtocolLine errorLine(std::string_view text);
 ProtocolLine installEndLine(std::string_view logFile);
 
-// The lines of a task list. The second and third end without a line feed: it is told apart.
+// The lines of a task list. The second and third have no line feed: it is written separately.
 struct TaskListLines {
     ProtocolLine count;
     FixedText<kQueuedCharacters + 1> identifiers;
