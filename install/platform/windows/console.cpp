@@ -40,15 +40,13 @@ Status writeToConsole(std::FILE* stream, HANDLE console, std::string_view text) 
 
 Status WindowsConsole::writeOutput(std::string_view text) {
     const HANDLE console = consoleOf(stdout);
-    return console != nullptr ? writeToConsole(stdout, console, text)
-                              : streams_->writeOutput(narrowFromText(text));
+    return console != nullptr ? writeToConsole(stdout, console, text) : streams_->writeOutput(narrowFromText(text));
 }
 
 Status WindowsConsole::writeError(std::string_view text) {
     flush();
     const HANDLE console = consoleOf(stderr);
-    return console != nullptr ? writeToConsole(stderr, console, text)
-                              : streams_->writeError(narrowFromText(text));
+    return console != nullptr ? writeToConsole(stderr, console, text) : streams_->writeError(narrowFromText(text));
 }
 
 Status WindowsConsole::writeDocument(std::string_view text) {

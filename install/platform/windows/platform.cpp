@@ -26,8 +26,8 @@ namespace {
 class WindowsPlatform final : public IPlatform {
 public:
     WindowsPlatform() {
-        ports_ = {&registry_, &services_,  &console_, &debugOutput_, &files_,   &processes_,
-                  &threads_,  &libraries_, &assemblies_,   &host_,        &terminal_};
+        ports_ = {&registry_, &services_,  &console_,    &debugOutput_, &files_,   &processes_,
+                  &threads_,  &libraries_, &assemblies_, &host_,        &terminal_};
     }
 
     // The caller's own, so that nobody else can have put something in its place.
