@@ -27,8 +27,8 @@ class TreeCopy {
 public:
     explicit TreeCopy(IRegistryStore& registry) : registry_(registry) {}
 
-    // The first failure ends the copy and is its status: also a path over 1,023 characters and a name or value that does not
-    // fit the buffers.
+    // The first failure ends the copy and is its status: also a path over 1,023 characters and a name or value that
+    // does not fit the buffers.
     Status copy(KeyHandle sourceRoot, std::string_view sourcePath, KeyHandle targetRoot, std::string_view targetPath,
                 bool overwrite);
 
