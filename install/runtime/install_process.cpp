@@ -403,7 +403,13 @@ void InstallProcess::postStandardError(std::string_view source, std::uint32_t fl
 
 void InstallProcess::post(std::uint32_t number, std::string_view text, std::string_view source, std::uint32_t flags) {
     if (!text.empty()) {
-        sink_.post(number, flags | kPostedByProcess, source, textFromNarrow(text));
+        const Status status = guarded([&] {
+            sink_.post(number, flags | kPostedByProcess, source, textFromNarrow(text));
+            return kSuccess;
+        });
+        if (status != kSuccess) {
+            sink_.trace(kTraceError, "InstallProcess::post", 10, status, {});
+        }
     }
 }
 
