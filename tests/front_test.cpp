@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "install/admin/front/front.h"
+#include "install/platform/command_line.h"
 #include "tests/support/machine.h"
 
 namespace kz7::test {
@@ -64,6 +65,25 @@ TEST(Front, ShowsAnyLine) {
     }
     runLines(machine, lines);
     EXPECT_EQ(machine.console_.both, shown + "Configuring 100%: done\nThe log is \\var\\a :: b.log\nDone.\n");
+}
+
+TEST(Front, GivesABatchFileNothingThatItsInterpreterActsUpon) {
+    // clang-format off
+    const struct { std::vector<std::string> words; bool passed; } rows[] = {
+        {{"x.bat", "plain", "a & b", "^<>|()!", "C:\\KZ7\\"},  true},
+        {{"x.bat", "a\" & echo INJECTED & rem \""},          false},
+        {{"x.exe", "a\" & echo INJECTED & rem \"%PATH%\n"},   true},
+        {{"C:\\a b\\X.Cmd", "%PATH:~0,3%"},                   false},
+        {{"x.cmd. .", "two\r\nlines"},                        false},
+        {{"C:\\%PATH%\\x.bat"},                               false},
+        {{"x.bat", std::string("\0", 1)},                     false},
+        {{".bat", "\x7F"},                                    false},
+        {{"bat", "%"},                                        true},
+    };
+    // clang-format on
+    for (const auto& row : rows) {
+        EXPECT_EQ(canPassWords(row.words), row.passed) << joinArguments(row.words);
+    }
 }
 
 TEST(FrontScreen, BarsFitTheirColumns) {

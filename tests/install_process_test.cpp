@@ -213,6 +213,19 @@ TEST_F(RealProcess, CapturesWhatProgramsWriteAndHowTheyEndAndRestoresBothSlotsTh
     }
 }
 
+TEST_F(RealProcess, AProgramInheritsItsStreamsAndNothingElse) {
+    Gate gate;
+    OwnedStream reading(*host_);
+    OwnedStream writing(*host_);
+    ASSERT_EQ(host_->createPipe(reading.receive(), writing.receive()), kSuccess);
+    InstallProcess process = make("gate " + gate.name() + " 0");
+    process.execute(false, false);
+    reading.reset();
+    EXPECT_EQ(host_->write(writing.get(), "x"), kPipeClosing) << "nobody reads: it has no read end";
+    gate.open();
+    EXPECT_EQ(ending(process, sink_), "0 0  and after");
+}
+
 TEST_F(RealProcess, ATimeoutStopsTheReadersAndLeavesTheProgram) {
     for (const std::uint32_t timeout : {0U, 1U, 20U}) {
         Gate gate;

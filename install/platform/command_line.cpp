@@ -1,5 +1,9 @@
 #include "install/platform/command_line.h"
 
+#include <algorithm>
+
+#include "install/platform/text.h"
+
 namespace kz7 {
 namespace {
 
@@ -99,6 +103,17 @@ std::string joinArguments(const std::vector<std::string>& words) {
         line += '"';
     }
     return line;
+}
+
+bool canPassWords(const std::vector<std::string>& words) {
+    // The system passes over blanks and dots at the end of a file's name.
+    const std::string_view program(words.front());
+    const std::string_view file = program.substr(0, program.find_last_not_of(". ") + 1);
+    const std::string_view ending = file.substr(file.size() - std::min<std::size_t>(file.size(), 4));
+    const auto isActedUpon = [](char c) { return c == '"' || c == '%' || (c >= 0 && c < ' ') || c == 0x7F; };
+    return (!equalsIgnoreCase(ending, ".bat") && !equalsIgnoreCase(ending, ".cmd")) ||
+           std::none_of(words.begin(), words.end(),
+                        [&](const std::string& word) { return std::any_of(word.begin(), word.end(), isActedUpon); });
 }
 
 bool isBareName(std::string_view program) {

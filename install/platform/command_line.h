@@ -25,6 +25,10 @@ std::vector<std::string> splitArguments(std::string_view arguments);
 // The command line that splits into these words, the program first.
 std::string joinArguments(const std::vector<std::string>& words);
 
+// Whether these words reach the program as they are. A batch file is run by a command interpreter, which acts upon
+// quotation marks, percent signs, line ends and other control characters before the file sees them.
+bool canPassWords(const std::vector<std::string>& words);
+
 // A name without folder or drive, to be searched for.
 bool isBareName(std::string_view program);
 

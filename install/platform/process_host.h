@@ -66,7 +66,7 @@ public:
 
     virtual Status closeStream(StreamHandle stream) = 0;
 
-    // Starts a program, hidden, with this process's environment and the streams.
+    // Starts a program, hidden, with this process's environment and the streams; it inherits no other handle.
     // A program path with blanks and no quotes is looked for piece by piece. kFileNotFound: no such program;
     // also, where the host has no drives, one it cannot execute. kBadDirectory: no such working directory.
     virtual Status startProcess(const ProcessStart& start, ProcessInformation& started) = 0;

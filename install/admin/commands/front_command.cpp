@@ -16,6 +16,11 @@ Answer runProgram(Admin& admin, const std::vector<std::string>& command) {
     if (!admin.open(true)) {
         return kAnswerFault;
     }
+    if (!canPassWords(command)) {
+        admin.tell(shownText(command.front()) +
+                   ": a batch file is given no argument with a quotation mark, a percent sign or a control character");
+        return static_cast<Answer>(kNotStarted);
+    }
     IPlatform& platform = admin.platform();
     const FrontPorts ports{platform.processes(), platform.threads(), platform.files(), platform.terminal(),
                            platform.console()};

@@ -3,6 +3,7 @@
 #include <windows.h>
 
 #include <algorithm>
+#include <initializer_list>
 #include <string>
 #include <vector>
 
@@ -122,6 +123,46 @@ bool hangsOnCurrentFolder(const std::vector<CommandReading>& readings) {
     return false;
 }
 
+// The handles that a program gets: the streams it is given, and no other that happens to be inheritable. What this
+// process was given by others would stay open for as long as the program, or one that it starts, runs.
+class InheritedHandles {
+public:
+    explicit InheritedHandles(std::initializer_list<StreamHandle> streams) {
+        for (const StreamHandle stream : streams) {
+            if (stream != StreamHandle::none &&
+                std::find(handles_.begin(), handles_.end(), native(stream)) == handles_.end()) {
+                handles_.push_back(native(stream));
+            }
+        }
+        SIZE_T size = 0;
+        InitializeProcThreadAttributeList(nullptr, 1, 0, &size);
+        room_.resize(size);
+        status_ = judged(InitializeProcThreadAttributeList(list(), 1, 0, &size));
+        isMade_ = status_ == kSuccess;
+        if (isMade_ && !handles_.empty()) {
+            status_ = judged(UpdateProcThreadAttribute(list(), 0, PROC_THREAD_ATTRIBUTE_HANDLE_LIST, handles_.data(),
+                                                       handles_.size() * sizeof(HANDLE), nullptr, nullptr));
+        }
+    }
+    ~InheritedHandles() {
+        if (isMade_) {
+            DeleteProcThreadAttributeList(list());
+        }
+    }
+    InheritedHandles(const InheritedHandles&) = delete;
+    InheritedHandles& operator=(const InheritedHandles&) = delete;
+
+    Status status() const { return status_; }
+    bool any() const { return !handles_.empty(); }
+    LPPROC_THREAD_ATTRIBUTE_LIST list() { return reinterpret_cast<LPPROC_THREAD_ATTRIBUTE_LIST>(room_.data()); }
+
+private:
+    std::vector<HANDLE> handles_;
+    std::vector<char> room_;
+    Status status_ = kSuccess;
+    bool isMade_ = false;
+};
+
 }  // namespace
 
 Status WindowsProcessHost::getSlot(StandardSlot slot, StreamHandle& stream) {
@@ -187,18 +228,24 @@ Status WindowsProcessHost::startProcess(const ProcessStart& start, ProcessInform
     if (!directory.empty() && !isAbsolutePath(directory)) {
         return kBadDirectory;
     }
-    STARTUPINFOW startup{};
-    startup.cb = sizeof startup;
-    startup.dwFlags = STARTF_USESTDHANDLES | STARTF_USESHOWWINDOW;
-    startup.wShowWindow = SW_HIDE;
-    startup.hStdInput = native(start.input);
-    startup.hStdOutput = native(start.output);
-    startup.hStdError = native(start.error);
+    InheritedHandles inherited({start.output, start.error, start.input});
+    if (inherited.status() != kSuccess) {
+        return inherited.status();
+    }
+    STARTUPINFOEXW startup{};
+    startup.StartupInfo.cb = sizeof startup;
+    startup.StartupInfo.dwFlags = STARTF_USESTDHANDLES | STARTF_USESHOWWINDOW;
+    startup.StartupInfo.wShowWindow = SW_HIDE;
+    startup.StartupInfo.hStdInput = native(start.input);
+    startup.StartupInfo.hStdOutput = native(start.output);
+    startup.StartupInfo.hStdError = native(start.error);
+    startup.lpAttributeList = inherited.list();
     WideText commandLine(start.commandLine);  // the call writes into it
     PROCESS_INFORMATION information{};
     const Status status = judged(CreateProcessW(
-        nullptr, commandLine.data(), nullptr, nullptr, TRUE, NORMAL_PRIORITY_CLASS | CREATE_UNICODE_ENVIRONMENT,
-        search.environment(), directory.empty() ? nullptr : WideText(directory).c_str(), &startup, &information));
+        nullptr, commandLine.data(), nullptr, nullptr, inherited.any() ? TRUE : FALSE,
+        NORMAL_PRIORITY_CLASS | CREATE_UNICODE_ENVIRONMENT | EXTENDED_STARTUPINFO_PRESENT, search.environment(),
+        directory.empty() ? nullptr : WideText(directory).c_str(), &startup.StartupInfo, &information));
     if (status == kSuccess) {
         started = {portHandle<ProcessHandle>(information.hProcess), portHandle<ProcessHandle>(information.hThread),
                    information.dwProcessId, information.dwThreadId};

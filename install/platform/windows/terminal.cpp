@@ -15,6 +15,13 @@ BOOL WINAPI leaveIt(DWORD event) {
 
 }  // namespace
 
+// The console outlives this program, and its next one may know nothing of such sequences.
+WindowsTerminal::~WindowsTerminal() {
+    for (const Changed& changed : changed_) {
+        SetConsoleMode(changed.console, changed.mode);
+    }
+}
+
 TerminalView WindowsTerminal::look(TerminalStream stream) {
     // The streams' own handles: a standard-handle slot may name something else by now.
     std::FILE* const file = stream == TerminalStream::input    ? stdin
@@ -27,7 +34,14 @@ TerminalView WindowsTerminal::look(TerminalStream stream) {
     CONSOLE_SCREEN_BUFFER_INFO screen{};
     if (view.terminal && GetConsoleScreenBufferInfo(handle, &screen) != FALSE) {
         view.columns = static_cast<std::uint32_t>(screen.srWindow.Right - screen.srWindow.Left + 1);
-        view.redraws = SetConsoleMode(handle, mode | ENABLE_VIRTUAL_TERMINAL_PROCESSING) != FALSE;
+        view.redraws = (mode & ENABLE_VIRTUAL_TERMINAL_PROCESSING) != 0;
+        if (!view.redraws) {
+            changed_.reserve(changed_.size() + 1);
+            view.redraws = SetConsoleMode(handle, mode | ENABLE_VIRTUAL_TERMINAL_PROCESSING) != FALSE;
+        }
+        if (view.redraws && (mode & ENABLE_VIRTUAL_TERMINAL_PROCESSING) == 0) {
+            changed_.push_back({handle, mode});
+        }
         const char* noColour = std::getenv("NO_COLOR");
         view.colours = view.redraws && (noColour == nullptr || *noColour == '\0');
     }
