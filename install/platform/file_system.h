@@ -27,7 +27,8 @@ public:
     virtual Status readFile(std::string_view path, std::string& content) = 0;
 
     // Opens a file for writing at its end; creates a missing one that others can read. The caller closes it.
-    // kPathNotFound: its folder is missing. kAccessDenied: also for a link and anything else that is not a file.
+    // kPathNotFound: its folder is missing. kAccessDenied: also for a link, a file with several names and anything else
+    // that is not a file; on Windows also if a folder of the path is a link.
     virtual Status openForAppend(std::string_view path, FileHandle& file) = 0;
 
     // Writes at the end, unbuffered. `written` is the number of bytes written, on a failure too; a success may write

@@ -100,7 +100,7 @@ public:
             return errno == ENOENT || errno == ENOTDIR ? kPathNotFound : statusOf(errno);
         }
         struct stat found {};
-        if (fstat(descriptor.get(), &found) == -1 || !S_ISREG(found.st_mode)) {
+        if (fstat(descriptor.get(), &found) == -1 || !S_ISREG(found.st_mode) || found.st_nlink != 1) {
             return kAccessDenied;
         }
         file = files_.give(std::move(descriptor));

@@ -10,6 +10,7 @@
 #include <string>
 #include <vector>
 
+#include "install/platform/windows/native_handle.h"
 #include "install/platform/windows/paths.h"
 #include "install/platform/windows/wide_text.h"
 
@@ -151,11 +152,10 @@ std::vector<std::wstring> providerFiles(std::string_view location) {
         return files;
     }
     WIN32_FIND_DATAW found;
-    const HANDLE opened = FindFirstFileW(WideText(folder + "kz7nmp*.dll").c_str(), &found);
-    if (opened == INVALID_HANDLE_VALUE) {
+    const FileSearch search = ownedSearch(FindFirstFileW(WideText(folder + "kz7nmp*.dll").c_str(), &found));
+    if (!search) {
         return files;
     }
-    const std::unique_ptr<void, decltype(&FindClose)> search(opened, FindClose);
     do {
         if ((found.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) == 0) {
             files.push_back(WideText(folder).c_str() + std::wstring(found.cFileName));

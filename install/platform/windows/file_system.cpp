@@ -6,6 +6,7 @@
 #include <cerrno>
 #include <string>
 
+#include "install/platform/windows/native_handle.h"
 #include "install/platform/windows/paths.h"
 #include "install/platform/windows/wide_text.h"
 
@@ -13,6 +14,7 @@ namespace kz7 {
 namespace {
 
 constexpr std::size_t kReadPiece = 64 * 1024;
+constexpr DWORD kWithoutOurRights = SECURITY_SQOS_PRESENT | SECURITY_IDENTIFICATION;
 
 HANDLE native(FileHandle file) {
     return reinterpret_cast<HANDLE>(static_cast<std::uintptr_t>(file));
@@ -20,6 +22,31 @@ HANDLE native(FileHandle file) {
 
 bool namesNothing(std::string_view path) {
     return !isAbsolutePath(path) || path.find('\0') != std::string_view::npos;
+}
+
+std::string wholePath(std::string_view path) {
+    const WideText given(path);
+    return textOf([&](wchar_t* room, DWORD size) { return GetFullPathNameW(given.c_str(), size, room, nullptr); });
+}
+
+// Whether an open file or folder is in the place that its path names: no folder on the way is a link.
+bool liesAt(HANDLE file, std::string_view path) {
+    const auto withoutSeparator = [](std::string_view text) { return text.substr(0, text.find_last_not_of('\\') + 1); };
+    std::string place = textOf([&](wchar_t* room, DWORD size) {
+        return GetFinalPathNameByHandleW(file, room, size, FILE_NAME_NORMALIZED | VOLUME_NAME_DOS);
+    });
+    if (place.starts_with(R"(\\?\UNC\)")) {
+        place.replace(0, 8, R"(\\)");
+    } else {
+        place.erase(0, 4);  // of `\\?\C:\...`
+    }
+    // The path may have short names.
+    const WideText given(path);
+    const std::string asked =
+        textOf([&](wchar_t* room, DWORD size) { return GetLongPathNameW(given.c_str(), room, size); });
+    const WideText left(withoutSeparator(place));
+    const WideText right(withoutSeparator(asked));
+    return left.size() != 0 && CompareStringOrdinal(left.c_str(), -1, right.c_str(), -1, TRUE) == CSTR_EQUAL;
 }
 
 }  // namespace
@@ -39,47 +66,61 @@ Status WindowsFileSystem::readFile(std::string_view path, std::string& content) 
     if (namesNothing(path)) {
         return kFileNotFound;
     }
-    const HANDLE file = CreateFileW(WideText(path).c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr,
-                                    OPEN_EXISTING, FILE_ATTRIBUTE_NORMAL, nullptr);
-    if (file == INVALID_HANDLE_VALUE) {
+    // Others may have chosen the path. The server of a pipe of that name can identify this program, not act with its
+    // rights.
+    const NativeHandle file =
+        ownedFile(CreateFileW(WideText(path).c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr,
+                              OPEN_EXISTING, FILE_ATTRIBUTE_NORMAL | kWithoutOurRights, nullptr));
+    if (!file) {
         return GetLastError() == ERROR_PATH_NOT_FOUND ? kFileNotFound : GetLastError();
     }
     std::string read;
     DWORD count = 0;
-    Status status = kSuccess;
     do {
         const std::size_t length = read.size();
         read.resize(length + kReadPiece);
-        if (ReadFile(file, read.data() + length, kReadPiece, &count, nullptr) == FALSE) {
-            status = GetLastError();
-            count = 0;
+        if (ReadFile(file.get(), read.data() + length, kReadPiece, &count, nullptr) == FALSE) {
+            return GetLastError();
         }
         read.resize(length + count);
     } while (count != 0);
-    CloseHandle(file);
-    if (status == kSuccess) {
-        content = std::move(read);
-    }
-    return status;
+    content = std::move(read);
+    return kSuccess;
 }
 
 Status WindowsFileSystem::openForAppend(std::string_view path, FileHandle& file) {
     if (namesNothing(path)) {
         return kFileNotFound;
     }
-    const HANDLE opened =
-        CreateFileW(WideText(path).c_str(), FILE_APPEND_DATA, FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr, OPEN_ALWAYS,
-                    FILE_ATTRIBUTE_NORMAL | FILE_FLAG_OPEN_REPARSE_POINT, nullptr);
-    if (opened == INVALID_HANDLE_VALUE) {
+    const std::string whole = wholePath(path);
+    if (whole.starts_with(R"(\\.\)")) {
+        return kAccessDenied;
+    }
+    // The folder first, and held in its place: nothing is made where a link leads.
+    const std::string folderPath = whole.substr(0, whole.find_last_of('\\') + 1);
+    const NativeHandle folder =
+        ownedFile(CreateFileW(WideText(folderPath).c_str(), FILE_READ_ATTRIBUTES, FILE_SHARE_READ | FILE_SHARE_WRITE,
+                              nullptr, OPEN_EXISTING, FILE_FLAG_BACKUP_SEMANTICS | kWithoutOurRights, nullptr));
+    if (!folder) {
+        return GetLastError() == ERROR_FILE_NOT_FOUND ? kPathNotFound : GetLastError();
+    }
+    if (!liesAt(folder.get(), folderPath)) {
+        return kAccessDenied;
+    }
+    NativeHandle opened = ownedFile(
+        CreateFileW(WideText(whole).c_str(), FILE_APPEND_DATA, FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr, OPEN_ALWAYS,
+                    FILE_ATTRIBUTE_NORMAL | FILE_FLAG_OPEN_REPARSE_POINT | kWithoutOurRights, nullptr));
+    if (!opened) {
         return GetLastError();
     }
     BY_HANDLE_FILE_INFORMATION information{};
-    if (GetFileInformationByHandle(opened, &information) != FALSE &&
-        (information.dwFileAttributes & FILE_ATTRIBUTE_REPARSE_POINT) != 0) {
-        CloseHandle(opened);
+    if (GetFileType(opened.get()) != FILE_TYPE_DISK ||
+        GetFileInformationByHandle(opened.get(), &information) == FALSE ||
+        (information.dwFileAttributes & (FILE_ATTRIBUTE_REPARSE_POINT | FILE_ATTRIBUTE_DIRECTORY)) != 0 ||
+        information.nNumberOfLinks != 1 || !liesAt(opened.get(), whole)) {
         return kAccessDenied;
     }
-    file = FileHandle{reinterpret_cast<std::uintptr_t>(opened)};
+    file = FileHandle{reinterpret_cast<std::uintptr_t>(opened.release())};
     return kSuccess;
 }
 
@@ -100,8 +141,8 @@ Status WindowsFileSystem::findFile(std::string_view pattern, std::string& name) 
     }
     const std::string_view names = pattern.substr(pattern.find_last_of("\\/:") + 1);
     WIN32_FIND_DATAW found{};
-    const HANDLE search = FindFirstFileW(WideText(pattern).c_str(), &found);
-    if (search == INVALID_HANDLE_VALUE) {
+    const FileSearch search = ownedSearch(FindFirstFileW(WideText(pattern).c_str(), &found));
+    if (!search) {
         return GetLastError() == ERROR_PATH_NOT_FOUND ? kFileNotFound : GetLastError();
     }
     // The system's '?' also stands for no character at all.
@@ -111,8 +152,7 @@ Status WindowsFileSystem::findFile(std::string_view pattern, std::string& name) 
         if (fitsPattern(each, names) && (first.empty() || each < first)) {
             first = each;
         }
-    } while (FindNextFileW(search, &found) != FALSE);
-    FindClose(search);
+    } while (FindNextFileW(search.get(), &found) != FALSE);
     if (first.empty()) {
         return kFileNotFound;
     }
@@ -121,9 +161,7 @@ Status WindowsFileSystem::findFile(std::string_view pattern, std::string& name) 
 }
 
 Status WindowsFileSystem::productPath(std::string_view hostPath, std::string& path) {
-    const WideText given(hostPath);
-    std::string whole =
-        textOf([&](wchar_t* room, DWORD size) { return GetFullPathNameW(given.c_str(), size, room, nullptr); });
+    std::string whole = wholePath(hostPath);
     if (namesNothing(whole)) {
         return kInvalidName;
     }
