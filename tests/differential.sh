@@ -137,5 +137,55 @@ same 'a second copy of version 9'            -addv9 'C:\sample' 'C:\sample'
 same 'to version 9 once more'                -v9 'C:\sample'
 same 'and back'                              -v8 'C:\KZ8'
 
+# Two at once, on Windows only, where no transaction keeps them apart: they leave what one after the other would have.
+tool() { wine "$windows/kz7InstallReg.exe" "$@" >/dev/null 2>&1 || true; }
+left() { wine "$windows/kz7admin.exe" export 2>/dev/null | tr -d '\r'; }
+fresh() {
+    tool -removeKZ7Copy RACE
+    tool -removeKZ7Copy LAST
+    {
+        echo REGEDIT4
+        printf '[-HKEY_LOCAL_MACHINE\\SOFTWARE\\%s]\n' 'NVQ\KZ7' 'Wow6432Node\NVQ\KZ7'
+        printf '[HKEY_LOCAL_MACHINE\\SOFTWARE\\%sNVQ\\KZ7\\InstalledCopies]\n"7.7"="GONE"\n' '' 'Wow6432Node\'
+    } | wine "$windows/kz7admin.exe" import - >/dev/null
+    tool "${before[@]}"
+}
+at_once() { # why; `before`, `one` and `two` are commands; the services that they make are those of RACE and LAST
+    local round
+    fresh && tool "${one[@]}" && tool "${two[@]}" && left >one_first
+    fresh && tool "${two[@]}" && tool "${one[@]}" && left >two_first
+    for ((round = 0; round < ${KZ7_ROUNDS:-8}; round++)); do
+        rows=$((rows + 1))
+        fresh
+        tool "${one[@]}" &
+        local first=$!
+        tool "${two[@]}" &
+        wait $first $!
+        left >both
+        if ! cmp -s both one_first && ! cmp -s both two_first; then
+            echo "FAILED: $1, round $round"
+            diff -u one_first both || true
+            failed=$((failed + 1))
+        fi
+    done
+}
+before=(-addKZ7Copy LAST 'C:\KZ7') one=(-addKZ7Copy RACE 'C:\one') two=(-addKZ7Copy RACE 'C:\two')
+at_once 'two adds of one name'
+two=(-removeKZ7Copy LAST)
+at_once 'an add and the removal of the last copy'
+before=(-addKZ7Copy LAST 'C:\KZ7') one=(-dotnet 'C:\sample') two=(-dotnet 'C:\sample')
+at_once 'two registrations of providers'
+
+# A log that a folder leads elsewhere.
+mkdir "$WINEPREFIX/drive_c/elsewhere"
+ln -s elsewhere "$WINEPREFIX/drive_c/link"
+printf '' >responses
+rows=$((rows + 1))
+if wine "$windows/kz7admin.exe" commit --copy LAST --response-file responses --log 'C:\link\run.log' >/dev/null 2>&1 ||
+    [ -e "$WINEPREFIX/drive_c/elsewhere/run.log" ]; then
+    echo 'FAILED: a log behind a link to a folder was written'
+    failed=$((failed + 1))
+fi
+
 echo "differential: $rows commands, $failed differ"
 [ "$failed" -eq 0 ]

@@ -1,6 +1,8 @@
 // A service that does nothing but run until it is told to stop.
 #include <windows.h>
 
+#include <string>
+
 static SERVICE_STATUS_HANDLE told;
 static HANDLE stopAsked;
 
@@ -18,11 +20,16 @@ static void WINAPI control(DWORD code) {
     }
 }
 
-static void WINAPI run(DWORD, char**) {
+static void WINAPI run(DWORD, char** arguments) {
     stopAsked = CreateEventA(nullptr, TRUE, FALSE, nullptr);
     told = RegisterServiceCtrlHandlerA("", control);
     tell(SERVICE_RUNNING);
     WaitForSingleObject(stopAsked, INFINITE);
+    // A test that makes an event of the service's name decides when it has ended.
+    if (HANDLE gate = OpenEventA(SYNCHRONIZE, FALSE, (std::string("Global\\") + arguments[0]).c_str())) {
+        tell(SERVICE_STOP_PENDING);
+        WaitForSingleObject(gate, INFINITE);
+    }
     tell(SERVICE_STOPPED);
 }
 

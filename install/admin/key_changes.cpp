@@ -12,7 +12,8 @@ Status deleteKeys(IRegistryStore& registry, const KeyName& name) {
     std::vector<Level> levels;
     const auto enter = [&](KeyHandle parent, std::string path) {
         Level level{OwnedKey(registry), std::move(path)};
-        const Status status = registry.openKey(parent, level.name, kKeyEnumerateSubkeys, level.key.receive());
+        const Status status =
+            registry.openKey(parent, level.name, kKeyEnumerateSubkeys | kKeyOpenLink, level.key.receive());
         if (status == kSuccess) {
             levels.push_back(std::move(level));
         }

@@ -54,7 +54,7 @@ public:
     Status key(KeyHandle parent, std::string_view path, OwnedKey& key, std::vector<KeyValue>& values,
                std::vector<Subkey>& subkeys) {
         values.clear();
-        Status status = registry_.openKey(parent, path, kKeyWalk, key.receive());
+        Status status = registry_.openKey(parent, path, kKeyWalk | kKeyOpenLink, key.receive());
         if (status == kSuccess) {
             status = this->values(key.get(), values);
         }
@@ -135,7 +135,7 @@ bool isBareRoot(const KeyRecord& record) {
 
 Status findKey(IRegistryStore& registry, const KeyName& name, KeyStart& start) {
     OwnedKey key(registry);
-    Status status = registry.openKey(name.root, name.path, kKeyWalk, key.receive());
+    Status status = registry.openKey(name.root, name.path, kKeyWalk | kKeyOpenLink, key.receive());
     std::vector<KeyStart> found;
     if (status == kSuccess && !name.path.empty()) {
         status = addMatches(registry, name.root, name.path, false, found);

@@ -45,8 +45,8 @@ Status findKey(IRegistryStore& registry, const KeyName& name, KeyStart& start);
 // machine's registry. None is success.
 Status findEverything(IRegistryStore& registry, bool storeIsOwn, std::vector<KeyStart>& starts);
 
-// The key and all below it, however deep. kFileNotFound: it is not there. A key that is deleted during the walk is left
-// out.
+// The key and all below it, however deep; a link is a key of its own and is not followed. kFileNotFound: it is not
+// there. A key that is deleted during the walk is left out.
 Status walkKeys(IRegistryStore& registry, const KeyStart& start, const KeyVisitor& visit);
 
 }  // namespace kz7

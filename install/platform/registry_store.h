@@ -33,6 +33,8 @@ inline constexpr AccessMask kKeyRead             = 0x20019;
 inline constexpr AccessMask kKeyReadSet          = 0x2001B;
 inline constexpr AccessMask kKeyFull             = 0xF003F;
 inline constexpr AccessMask kKeyMaximumAllowed   = 0x2000000;  // every right that the caller has on the key
+inline constexpr AccessMask kKeyOpenLink         = 0x4000000;  // opens a link itself, not the key that it leads to
+inline constexpr AccessMask kKeyRefuseLink       = 0x8000000;  // kAccessDenied for a link
 // clang-format on
 
 enum class ValueType : std::uint32_t {
@@ -55,6 +57,7 @@ inline constexpr std::uint32_t kMaxValueName = 16383;  // characters of a value 
 // Paths are texts below a key, parts separated by backslashes; the empty path is the key itself.
 // Names keep their case and compare without it (ASCII). Subkeys enumerate in the order of their
 // upper-cased names, values in the order they were first set; the first spelling of a name is kept.
+// On Windows a key may be a link to another; paths follow it unless the access for their last name says otherwise.
 // Outputs are written on success only, but for Buffer::size, which kMoreData fills.
 //
 // Common results: kFileNotFound no such key or value; kAccessDenied a right that the handle was not
@@ -95,7 +98,7 @@ public:
     virtual Status enumerateValue(KeyHandle key, std::uint32_t index, Buffer& name, ValueType* type, Buffer* data) = 0;
 
     // Deletes a key and its values. kAccessDenied: it has subkeys. `view` is 0 or one of the view bits.
-    // Handles that are open on it stay and answer kKeyDeleted.
+    // Of a link, the link itself is deleted. Handles that are open on it stay and answer kKeyDeleted.
     virtual Status deleteKey(KeyHandle parent, std::string_view path, AccessMask view) = 0;
 
     // A mark of the flow: what was done since the last one is now to be seen by others, and whole. Success

@@ -51,6 +51,7 @@ struct ServiceDefinition {
     std::uint32_t type = kServiceOwnProcess;
     ServiceStart start = ServiceStart::automatic;
     std::uint32_t errorControl = kServiceErrorNormal;
+    std::uint32_t deletionWait = 0;  // milliseconds that a pending deletion of that name is waited for
 };
 
 // Every handle given out is the caller's to close. Outputs are written on success only. Service names
@@ -63,8 +64,9 @@ public:
     virtual Status openManager(std::uint32_t access, ServiceHandle& manager) = 0;
 
     // kServiceExists: there is one of that name. kInvalidName: an empty name, one over 255 characters or with
-    // a slash of either kind. kServiceMarkedForDelete: one of that name was deleted, a handle of it is still
-    // open. kDuplicateServiceName: its display name is taken, on a host that judges it.
+    // a slash of either kind. kServiceMarkedForDelete: one of that name was deleted, it still runs or a handle of
+    // it is still open, also at the end of `deletionWait`. kDuplicateServiceName: its display name is taken, on a host
+    // that judges it.
     virtual Status createService(ServiceHandle manager, const ServiceDefinition& definition,
                                  ServiceHandle& service) = 0;
 
@@ -79,8 +81,11 @@ public:
 
     // Sends the stop control. kSuccess when the control was taken, which the platform's call reports as a
     // non-zero result: whoever judges that raw result sees 1 for success and 0 for failure.
-    // kServiceNotActive when it does not run.
+    // kServiceNotActive when it does not run; kServiceTakesNoControl while it is starting or stopping.
     virtual Status stopService(ServiceHandle service) = 0;
+
+    // Waits until the service has stopped. kWaitTimedOut: it has not.
+    virtual Status waitForStop(ServiceHandle service, std::uint32_t milliseconds) = 0;
 
     virtual Status queryState(ServiceHandle service, ServiceState& state) = 0;
 

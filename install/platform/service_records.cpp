@@ -195,6 +195,13 @@ Status ServiceRecords::stopService(ServiceHandle service) {
     return now == ServiceState::running ? registry_.deleteValue(record.get(), kRunState) : kServiceNotActive;
 }
 
+// No service here changes its state by itself.
+Status ServiceRecords::waitForStop(ServiceHandle service, std::uint32_t) {
+    ServiceState now{};
+    const Status status = queryState(service, now);
+    return status != kSuccess || now == ServiceState::stopped ? status : kWaitTimedOut;
+}
+
 Status ServiceRecords::queryState(ServiceHandle service, ServiceState& state) {
     OwnedKey record(registry_);
     const Status status = recordOf(service, kServiceQueryStatus, record);

@@ -23,6 +23,7 @@ public:
     Status changeStartType(ServiceHandle service, ServiceStart start) override;
     Status startService(ServiceHandle service) override;
     Status stopService(ServiceHandle service) override;
+    Status waitForStop(ServiceHandle service, std::uint32_t milliseconds) override;
     Status queryState(ServiceHandle service, ServiceState& state) override;
     Status deleteService(ServiceHandle service) override;
     Status closeHandle(ServiceHandle handle) override;

@@ -45,6 +45,7 @@ inline constexpr Status kNotRegistryFile         = 1017;
 inline constexpr Status kKeyDeleted              = 1018;  // the key behind a handle is gone or marked for deletion
 inline constexpr Status kServiceAlreadyRunning   = 1056;
 inline constexpr Status kServiceDoesNotExist     = 1060;
+inline constexpr Status kServiceTakesNoControl   = 1061;  // it is starting or stopping
 inline constexpr Status kServiceNotActive        = 1062;
 inline constexpr Status kServiceMarkedForDelete  = 1072;
 inline constexpr Status kServiceExists           = 1073;

@@ -25,7 +25,10 @@ namespace {
 
 class WindowsPlatform final : public IPlatform {
 public:
-    WindowsPlatform() {
+    explicit WindowsPlatform(const PlatformOptions& options)
+        : program_(options.program),
+          // A library in an installer changes only what the user's own key holds.
+          lock_(options.ownProcess && !options.readOnly, [this] { tellBusy(); }) {
         ports_ = {&registry_, &services_,  &console_,    &debugOutput_, &files_,   &processes_,
                   &threads_,  &libraries_, &assemblies_, &host_,        &terminal_};
     }
@@ -43,13 +46,25 @@ public:
     }
     std::string storeName() override { return "the registry of this machine"; }
     bool storeIsOwn() override { return false; }
+    bool storeFaultTold() override { return faultTold_; }
 
 private:
+    void tellBusy() {
+        if (!faultTold_) {
+            console_.writeError(program_ +
+                                ": %ProgramData%\\KZ7\\lock: stayed locked by another program for 5 seconds\n");
+        }
+        faultTold_ = true;
+    }
+
+    std::string program_;
+    bool faultTold_ = false;
     WindowsConsole console_;
     WindowsDebugOutput debugOutput_{console_};
     WindowsFileSystem files_;
-    WindowsRegistry registry_;
-    WindowsServiceManager services_;
+    ChangeLock lock_;
+    WindowsRegistry registry_{lock_};
+    WindowsServiceManager services_{lock_};
     WindowsProcessHost processes_;
     WindowsThreads threads_;
     WindowsLibraryLoader libraries_;
@@ -69,7 +84,7 @@ std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options) {
         _setmode(_fileno(stdin), _O_BINARY);
         _setmode(_fileno(stdout), _O_BINARY);
     }
-    return std::make_unique<WindowsPlatform>();
+    return std::make_unique<WindowsPlatform>(options);
 }
 
 int hostExitCode(Status status) {

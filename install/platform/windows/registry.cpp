@@ -1,6 +1,7 @@
 #include "install/platform/windows/registry.h"
 
 #include <windows.h>
+#include <winternl.h>
 
 #include <algorithm>
 #include <string>
@@ -8,8 +9,17 @@
 #include "install/platform/registry_path.h"
 #include "install/platform/windows/wide_text.h"
 
+extern "C" NTSTATUS NTAPI NtDeleteKey(HANDLE key);
+
 namespace kz7 {
 namespace {
+
+// A key that was opened as a link is.
+bool isLink(HKEY key) {
+    DWORD type = 0;
+    return RegQueryValueExW(key, L"SymbolicLinkValue", nullptr, &type, nullptr, nullptr) == ERROR_SUCCESS &&
+           type == REG_LINK;
+}
 
 bool isRoot(KeyHandle key) {
     return key == KeyHandle::currentUser || key == KeyHandle::localMachine || key == KeyHandle::users;
@@ -28,6 +38,7 @@ Status statusOf(LSTATUS result) {
     return static_cast<Status>(result);
 }
 
+constexpr AccessMask kLinkBits = kKeyOpenLink | kKeyRefuseLink;
 constexpr AccessMask kViewBits = kKeyView64 | kKeyView32;
 
 // A call makes 32 keys at most; a path of so many names, or bytes, goes to the call in pieces.
@@ -54,8 +65,12 @@ std::size_t lastCut(std::string_view path) {
 
 Status WindowsRegistry::shorten(KeyHandle& parent, std::string_view& path, AccessMask view, bool create,
                                 OwnedKey& base) {
-    if (const Status status = checkKeyPath(path); status != kSuccess) {
-        return status;
+    Status held = lock_.hold();
+    if (held == kSuccess) {
+        held = checkKeyPath(path);
+    }
+    if (held != kSuccess) {
+        return held;
     }
     for (std::size_t cut = 0; (cut = lastCut(path)) != 0;) {
         const std::string_view first = path.substr(0, cut);
@@ -79,7 +94,13 @@ Status WindowsRegistry::openKey(KeyHandle parent, std::string_view path, AccessM
         return status;
     }
     HKEY opened = nullptr;
-    const Status status = statusOf(RegOpenKeyExW(native(parent), WideText(path).c_str(), 0, access, &opened));
+    const Status status =
+        statusOf(RegOpenKeyExW(native(parent), WideText(path).c_str(),
+                               (access & kLinkBits) != 0 ? REG_OPTION_OPEN_LINK : 0, access & ~kLinkBits, &opened));
+    if (status == kSuccess && (access & kKeyRefuseLink) != 0 && isLink(opened)) {
+        RegCloseKey(opened);
+        return kAccessDenied;
+    }
     if (status == kSuccess) {
         key = fromNative(opened);
     }
@@ -92,11 +113,18 @@ Status WindowsRegistry::createKey(KeyHandle parent, std::string_view path, std::
     if (const Status status = shorten(parent, path, access, true, base); status != kSuccess) {
         return status;
     }
+    if ((access & kKeyRefuseLink) != 0) {
+        OwnedKey existing(*this);
+        const AccessMask look = kKeyQueryValue | kKeyRefuseLink | (access & kViewBits);
+        if (openKey(parent, path, look, existing.receive()) == kAccessDenied) {
+            return kAccessDenied;
+        }
+    }
     HKEY made = nullptr;
     WideText named(keyClass);
     const Status status =
         statusOf(RegCreateKeyExW(native(parent), WideText(path).c_str(), 0, keyClass.empty() ? nullptr : named.data(),
-                                 REG_OPTION_NON_VOLATILE, access, nullptr, &made, nullptr));
+                                 REG_OPTION_NON_VOLATILE, access & ~kLinkBits, nullptr, &made, nullptr));
     if (status == kSuccess) {
         key = fromNative(made);
     }
@@ -215,9 +243,16 @@ Status WindowsRegistry::deleteKey(KeyHandle parent, std::string_view path, Acces
     if (const Status status = shorten(parent, path, view, false, base); status != kSuccess) {
         return status;
     }
-    const WideText named(path);
-    return statusOf(view == 0 ? RegDeleteKeyW(native(parent), named.c_str())
-                              : RegDeleteKeyExW(native(parent), named.c_str(), view, 0));
+    // The usual call would follow a link and delete what it leads to.
+    HKEY opened = nullptr;
+    const Status status = statusOf(RegOpenKeyExW(native(parent), WideText(path).c_str(), REG_OPTION_OPEN_LINK,
+                                                 DELETE | (view & kViewBits), &opened));
+    if (status != kSuccess) {
+        return status;
+    }
+    const NTSTATUS deleted = NtDeleteKey(opened);
+    RegCloseKey(opened);
+    return RtlNtStatusToDosError(deleted);
 }
 
 }  // namespace kz7

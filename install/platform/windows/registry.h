@@ -5,11 +5,14 @@
 #include <vector>
 
 #include "install/platform/registry_store.h"
+#include "install/platform/windows/change_lock.h"
 
 namespace kz7 {
 
 class WindowsRegistry final : public IRegistryStore {
 public:
+    explicit WindowsRegistry(ChangeLock& lock) : lock_(lock) {}
+
     Status openKey(KeyHandle parent, std::string_view path, AccessMask access, KeyHandle& key) override;
     Status createKey(KeyHandle parent, std::string_view path, std::string_view keyClass, AccessMask access,
                      KeyHandle& key) override;
@@ -21,8 +24,8 @@ public:
     Status enumerateValue(KeyHandle key, std::uint32_t index, Buffer& name, ValueType* type, Buffer* data) override;
     Status deleteKey(KeyHandle parent, std::string_view path, AccessMask view) override;
 
-    // Every call is seen by others at once.
-    Status commit() override { return kSuccess; }
+    // Every call is seen by others at once: nothing is left to be done but to let them have their turn.
+    Status commit() override { return lock_.release(); }
 
 private:
     // Follows the first names of a path that is too long for one call, so that the rest below `parent` is not.
@@ -35,6 +38,7 @@ private:
 
     static constexpr std::uint32_t kNameRoom = 32767;  // characters
     static constexpr std::size_t kFirstRoom = 4096;    // bytes
+    ChangeLock& lock_;
     std::array<wchar_t, kNameRoom> name_;
     std::array<wchar_t, kNameRoom> class_;
     std::vector<unsigned char> room_ = std::vector<unsigned char>(kFirstRoom);

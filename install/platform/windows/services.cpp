@@ -11,6 +11,8 @@ SC_HANDLE native(ServiceHandle handle) {
     return reinterpret_cast<SC_HANDLE>(static_cast<std::uint64_t>(handle));
 }
 
+constexpr DWORD kPoll = 20;  // milliseconds between two looks at what is waited for
+
 // The status of a call that gives a handle.
 Status opened(SC_HANDLE made, ServiceHandle& handle) {
     if (made == nullptr) {
@@ -27,6 +29,9 @@ Status done(BOOL result) {
 }  // namespace
 
 Status WindowsServiceManager::openManager(std::uint32_t access, ServiceHandle& manager) {
+    if (const Status status = lock_.hold(); status != kSuccess) {
+        return status;
+    }
     return opened(OpenSCManagerW(nullptr, nullptr, access), manager);
 }
 
@@ -35,11 +40,21 @@ Status WindowsServiceManager::createService(ServiceHandle manager, const Service
     if (!isServiceName(definition.name)) {
         return kInvalidName;
     }
-    return opened(CreateServiceW(native(manager), WideText(definition.name).c_str(),
-                                 WideText(definition.displayName).c_str(), kServiceAllAccess, definition.type,
-                                 static_cast<DWORD>(definition.start), definition.errorControl,
-                                 WideText(definition.programPath).c_str(), nullptr, nullptr, nullptr, nullptr, nullptr),
-                  service);
+    const WideText name(definition.name);
+    const WideText displayName(definition.displayName);
+    const WideText program(definition.programPath);
+    const ULONGLONG begin = GetTickCount64();
+    for (;;) {
+        const Status status =
+            opened(CreateServiceW(native(manager), name.c_str(), displayName.c_str(), kServiceAllAccess,
+                                  definition.type, static_cast<DWORD>(definition.start), definition.errorControl,
+                                  program.c_str(), nullptr, nullptr, nullptr, nullptr, nullptr),
+                   service);
+        if (status != kServiceMarkedForDelete || GetTickCount64() - begin >= definition.deletionWait) {
+            return status;
+        }
+        Sleep(kPoll);
+    }
 }
 
 Status WindowsServiceManager::openService(ServiceHandle manager, std::string_view name, std::uint32_t access,
@@ -62,6 +77,21 @@ Status WindowsServiceManager::startService(ServiceHandle service) {
 Status WindowsServiceManager::stopService(ServiceHandle service) {
     SERVICE_STATUS answered{};
     return done(ControlService(native(service), SERVICE_CONTROL_STOP, &answered));
+}
+
+Status WindowsServiceManager::waitForStop(ServiceHandle service, std::uint32_t milliseconds) {
+    const ULONGLONG begin = GetTickCount64();
+    for (;;) {
+        ServiceState state{};
+        const Status status = queryState(service, state);
+        if (status != kSuccess || state == ServiceState::stopped) {
+            return status;
+        }
+        if (GetTickCount64() - begin >= milliseconds) {
+            return kWaitTimedOut;
+        }
+        Sleep(kPoll);
+    }
 }
 
 Status WindowsServiceManager::queryState(ServiceHandle service, ServiceState& state) {

@@ -2,11 +2,14 @@
 #pragma once
 
 #include "install/platform/service_manager.h"
+#include "install/platform/windows/change_lock.h"
 
 namespace kz7 {
 
 class WindowsServiceManager final : public IServiceManager {
 public:
+    explicit WindowsServiceManager(ChangeLock& lock) : lock_(lock) {}
+
     Status openManager(std::uint32_t access, ServiceHandle& manager) override;
     Status createService(ServiceHandle manager, const ServiceDefinition& definition, ServiceHandle& service) override;
     Status openService(ServiceHandle manager, std::string_view name, std::uint32_t access,
@@ -14,9 +17,13 @@ public:
     Status changeStartType(ServiceHandle service, ServiceStart start) override;
     Status startService(ServiceHandle service) override;
     Status stopService(ServiceHandle service) override;
+    Status waitForStop(ServiceHandle service, std::uint32_t milliseconds) override;
     Status queryState(ServiceHandle service, ServiceState& state) override;
     Status deleteService(ServiceHandle service) override;
     Status closeHandle(ServiceHandle handle) override;
+
+private:
+    ChangeLock& lock_;
 };
 
 }  // namespace kz7

@@ -6,6 +6,8 @@
 #include <memory_resource>
 #include <unordered_set>
 
+#include "install/src/registry/registry_access.h"
+
 namespace kz7 {
 namespace {
 
@@ -214,12 +216,20 @@ Status InstallCopiesProfile::deleteAliases(std::string_view path, bool& allDelet
         return kFailed;
     }
     for (const std::string& name : names) {
-        if (!succeeded(values_.deleteValue(path, name))) {
+        if (!succeeded(values_.deleteValue(path, name)) && !isGone(path, name)) {
             values_.tell("Failed to delete value name: %s\\%s", {path, name});
             allDeleted = false;
         }
     }
     return kSuccess;
+}
+
+// Somebody else may have deleted an alias since it was listed.
+bool InstallCopiesProfile::isGone(std::string_view path, std::string_view name) {
+    IRegistryStore& registry = values_.registry();
+    OwnedKey key(registry);
+    return succeeded(registry.openKey(KeyHandle::localMachine, path, kKeyQueryValue, key.receive())) &&
+           !valueExists(registry, key.get(), name);
 }
 
 void InstallCopiesProfile::restoreOldProfile() {

@@ -56,6 +56,7 @@ private:
     Status rewrite();
     Status listAliases(std::string_view path, std::vector<std::string>& names);
     Status backup(std::string_view path, AliasMap& profile);
+    bool isGone(std::string_view path, std::string_view name);
     Status deleteAliases(std::string_view path, bool& allDeleted);
     Status writeProfile();
     void tellProfile();

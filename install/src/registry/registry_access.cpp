@@ -62,7 +62,8 @@ private:
         if (levels_.size() > kMaxDepth) {
             return kRegistryCorrupt;
         }
-        const Status status = registry_.openKey(level.parent, level.address, kKeyFull | view_, level.key.receive());
+        const Status status =
+            registry_.openKey(level.parent, level.address, kKeyFull | kKeyOpenLink | view_, level.key.receive());
         if (succeeded(status)) {
             levels_.push_back(std::move(level));
         }
@@ -134,10 +135,10 @@ Status TreeCopy::copyBelow(bool overwrite) {
     OwnedKey target(registry_);
     Status status = checkPathLength(sourcePath_.size() > targetPath_.size() ? sourcePath_ : targetPath_);
     if (succeeded(status)) {
-        status = registry_.openKey(sourceRoot_, sourcePath_, kKeyRead, source.receive());
+        status = registry_.openKey(sourceRoot_, sourcePath_, kKeyRead | kKeyRefuseLink, source.receive());
     }
     if (succeeded(status)) {
-        status = registry_.createKey(targetRoot_, targetPath_, {}, kKeyCopyTarget, target.receive());
+        status = registry_.createKey(targetRoot_, targetPath_, {}, kKeyCopyTarget | kKeyRefuseLink, target.receive());
     }
     if (succeeded(status)) {
         status = copySubkeys(source.get(), target.get(), overwrite);
@@ -154,7 +155,7 @@ Status TreeCopy::copySubkeys(KeyHandle source, KeyHandle target, bool overwrite)
             return isEndOfItems(status) ? kSuccess : status;
         }
         OwnedKey made(registry_);
-        status = registry_.createKey(target, name_.view(), class_.view(), kKeyFull, made.receive());
+        status = registry_.createKey(target, name_.view(), class_.view(), kKeyFull | kKeyRefuseLink, made.receive());
         if (!succeeded(status)) {
             return status;
         }

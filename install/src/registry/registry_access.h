@@ -27,8 +27,8 @@ class TreeCopy {
 public:
     explicit TreeCopy(IRegistryStore& registry) : registry_(registry) {}
 
-    // The first failure ends the copy and is its status: also a path over 1,023 characters and a name or value that
-    // does not fit the buffers.
+    // The first failure ends the copy and is its status: also a path over 1,023 characters, a name or value that does
+    // not fit the buffers, and a link instead of a key.
     Status copy(KeyHandle sourceRoot, std::string_view sourcePath, KeyHandle targetRoot, std::string_view targetPath,
                 bool overwrite);
 
@@ -50,8 +50,8 @@ private:
 };
 
 // Deletes a key and everything below it, except each subkey named `sparedSubkey` (compared with case) and the keys
-// above it. `path` may hold the copy-name placeholder; `view` is 0 or a view bit. Returns the status of the last step;
-// kBadKey for an empty path.
+// above it. Of a link, the link itself is deleted. `path` may hold the copy-name placeholder; `view` is 0 or a view
+// bit. Returns the status of the last step; kBadKey for an empty path.
 Status deleteTree(IRegistryStore& registry, KeyHandle root, std::string_view path, AccessMask view,
                   std::string_view copyName, std::string_view sparedSubkey);
 

@@ -5,6 +5,8 @@
 namespace kz7 {
 namespace {
 
+constexpr std::uint32_t kServiceWait = 30'000;  // milliseconds that one which ends or is being deleted gets
+
 // clang-format off
 constexpr ErrorText kServiceManagerFailed  {1510, "Failed open the SCM - error code %d\n"};
 constexpr ErrorText kServiceOpenFailed     {1523, "Failed open the Service %s - error code %d\n"};
@@ -45,8 +47,12 @@ Status createService(IServiceManager& services, Report& report, std::string_view
     const FixedText<1024> displayName(compose("KZ7 Management Service (%s)", {copyName}));
     const FilePath program = binPath(location, "kz7mgmtsvc.exe");
     OwnedService service(services);
-    status =
-        services.createService(manager.get(), {name.view(), displayName.view(), program.view()}, service.receive());
+    // One that was just removed may still be ending.
+    const ServiceDefinition definition{.name = name.view(),
+                                       .displayName = displayName.view(),
+                                       .programPath = program.view(),
+                                       .deletionWait = kServiceWait};
+    status = services.createService(manager.get(), definition, service.receive());
     if (!succeeded(status) && status != kServiceExists) {
         report.error(kCreateFailed, {status});
     }
@@ -161,8 +167,12 @@ Status deleteServiceByName(IServiceManager& services, std::string_view name) {
     if (!succeeded(status)) {
         return status == kServiceDoesNotExist ? kSuccess : status;
     }
-    // One that does not run, or will not stop, is deleted all the same.
-    services.stopService(service.get());
+    // While it runs on, it could not be created again. One that does not run, or will not stop, is deleted all the
+    // same.
+    const Status stopped = services.stopService(service.get());
+    if (stopped == kSuccess || stopped == kServiceTakesNoControl) {
+        services.waitForStop(service.get(), kServiceWait);
+    }
     return services.deleteService(service.get());
 }
 
