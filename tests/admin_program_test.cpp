@@ -3,6 +3,7 @@
 #include <sqlite3.h>
 
 #include <sys/resource.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -114,6 +115,9 @@ TEST_F(AdminProgram, AnswersNoAndTellsFaults) {
         {{},                      2, "", told("no command is given (see --help)")},
         {{"rubbish"},             2, "", told("The following argument was not expected: rubbish (see --help)")},
         {{"export", "--json", "--utf16"}, 2, "", told("--utf16 excludes --json (see --help)")},
+        {{"tree", "--store="},    2, "", told("--store: the name is empty (see --help)")},
+        {{"copies", "--store", "/dev/null"},  2, "", told("/dev/null: Not a directory")},
+        {{"aliases", "--store", "/none/such"}, 2, "", told("/none/such: No such file or directory")},
         {{"import"},              2, "", told("FILE is required (see --help)")},
     };
     // clang-format on
@@ -124,6 +128,24 @@ TEST_F(AdminProgram, AnswersNoAndTellsFaults) {
         EXPECT_EQ(result.error, row.error);
     }
     EXPECT_NE(access(missing.c_str(), F_OK), 0) << "nothing of all this makes a store";
+}
+
+TEST_F(AdminProgram, ReadsAStoreWhoseDirectoryItMayNotWrite) {
+    ASSERT_EQ(store_.tool({"-addKZ7Copy", "COPY1", "C:\\KZ7"}).exitCode, 0);
+    const std::string whole = admin({"export"}).output;
+    for (const char* const name : {"", "registry.db", "registry.db-wal", "registry.db-shm"}) {
+        ASSERT_EQ(chmod(store_.file(name).c_str(), 0555), 0);
+    }
+    const auto asOther = [] { return setuid(geteuid() == 0 ? 65534 : geteuid()) == 0 ? void() : _exit(99); };
+    for (const char* const missing : {"-none", "-shm", "-wal"}) {
+        unlink(store_.file("registry.db"s + missing).c_str());
+        const ProgramResult result = admin({"export"}, {.environment = {}, .inChild = asOther});
+        EXPECT_EQ(result.exitCode, 0) << missing << result.error;
+        EXPECT_EQ(result.output == whole, missing != "-wal"s) << missing;
+    }
+    ASSERT_EQ(chmod(store_.file("registry.db").c_str(), 0), 0);
+    EXPECT_EQ(admin({"tree"}, {.environment = {}, .inChild = asOther}).error,
+              told(store_.file("registry.db") + ": Permission denied"));
 }
 
 TEST_F(AdminProgram, ReportsKeysThatAreListedAndCannotBeRead) {

@@ -104,9 +104,7 @@ Status EmbeddedRegistry::begin() {
         return fault_;
     }
     if (connection_ == nullptr) {
-        const StoreFault fault = !readOnly_       ? file_.openForWriting(connection_)
-                                 : file_.exists() ? file_.open(connection_)
-                                                  : file_.openEmpty(connection_);
+        const StoreFault fault = readOnly_ ? file_.openForReading(connection_) : file_.openForWriting(connection_);
         if (fault.status != kSuccess) {
             return fail(fault);
         }
