@@ -5,6 +5,7 @@
 #include <sstream>
 
 #include "install/admin/commands/aliases_command.h"
+#include "install/admin/commands/backup_command.h"
 #include "install/admin/commands/commit_command.h"
 #include "install/admin/commands/copies_command.h"
 #include "install/admin/commands/export_command.h"
@@ -41,6 +42,7 @@ int run(int argc, char** argv) {
     program.require_subcommand(0, 1);
     program.fallthrough();
     addAliasesCommand(program, admin);
+    addBackupCommand(program, admin);
     addCommitCommand(program, admin);
     addCopiesCommand(program, admin);
     addExportCommand(program, admin);

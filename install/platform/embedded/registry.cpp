@@ -175,6 +175,29 @@ Status EmbeddedRegistry::commit() {
     return std::exchange(fault_, kSuccess);
 }
 
+Status EmbeddedRegistry::image(std::string& bytes) {
+    if (!file_.exists()) {
+        return kFileNotFound;
+    }
+    if (const Status status = begin(); status != kSuccess) {
+        return status;
+    }
+    // Not serialized directly: that would turn pages that cannot be read into zeros.
+    Connection memory;
+    const int result = copyToMemory(connection_.get(), memory);
+    if (result != SQLITE_OK) {
+        return fail(result);
+    }
+    sqlite3_int64 size = 0;
+    const std::unique_ptr<unsigned char, void (*)(void*)> content(sqlite3_serialize(memory.get(), "main", &size, 0),
+                                                                  sqlite3_free);
+    if (content == nullptr) {
+        return fail(SQLITE_NOMEM);
+    }
+    bytes.assign(reinterpret_cast<const char*>(content.get()), static_cast<std::size_t>(size));
+    return kSuccess;
+}
+
 Query EmbeddedRegistry::query(Sql which) {
     Statement& owner = statements_[static_cast<std::size_t>(which)];
     int result = SQLITE_OK;

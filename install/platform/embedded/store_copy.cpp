@@ -26,18 +26,6 @@ std::array<std::int64_t, 4> stampOf(const std::string& path) {
                                              found.st_mtim.tv_sec, found.st_mtim.tv_nsec};
 }
 
-bool writeAll(int file, const char* bytes, ssize_t count) {
-    while (count > 0) {
-        const ssize_t written = write(file, bytes, static_cast<std::size_t>(count));
-        if (written < 0 && errno != EINTR) {
-            return false;
-        }
-        bytes += written < 0 ? 0 : written;
-        count -= written < 0 ? 0 : written;
-    }
-    return true;
-}
-
 // 0 or an error number.
 int copyFile(const std::string& from, const std::string& to) {
     const OwnedDescriptor source(open(from.c_str(), O_RDONLY | O_CLOEXEC));
@@ -52,7 +40,8 @@ int copyFile(const std::string& from, const std::string& to) {
         if (count == 0) {
             return 0;
         }
-        if ((count < 0 && errno != EINTR) || !writeAll(target.get(), piece.data(), count)) {
+        if (count < 0 ? errno != EINTR
+                      : !writeAll(target.get(), {piece.data(), static_cast<std::size_t>(count)})) {
             return errno;
         }
     }

@@ -7,6 +7,7 @@
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
+#include <filesystem>
 #include <memory>
 
 #include "install/platform/embedded/store_copy.h"
@@ -82,6 +83,22 @@ bool StoreFile::exists() const {
     return access(path_.c_str(), F_OK) == 0 || (errno != ENOENT && errno != ENOTDIR);
 }
 
+bool StoreFile::isPart(const std::string& path) const {
+    namespace fs = std::filesystem;
+    std::error_code ignored;
+    const fs::path asked = fs::absolute(path, ignored);
+    // A store that is a link has the other files next to the file that it leads to.
+    for (const fs::path& store : {fs::path(path_), fs::weakly_canonical(path_, ignored)}) {
+        const std::string name = store.filename().string();
+        const std::string other = asked.filename().string();
+        if ((other == name || other.starts_with(name + '-')) &&
+            fs::equivalent(asked.parent_path(), store.parent_path(), ignored)) {
+            return true;
+        }
+    }
+    return false;
+}
+
 StoreFault StoreFile::refused(Status status, const std::string& file, int error) const {
     if (error == EACCES || error == EPERM || error == EROFS) {
         status = kAccessDenied;
@@ -138,19 +155,8 @@ StoreFault StoreFile::openCopy(Connection& connection) const {
     if (StoreFault fault = checkVersion(opened, result); fault.status != kSuccess) {
         return fault;
     }
-    sqlite3* memory = nullptr;
-    sqlite3_open_v2(":memory:", &memory, SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX, nullptr);
-    Connection owned(memory);
-    if (sqlite3_backup* const backup = sqlite3_backup_init(memory, "main", opened, "main"); backup != nullptr) {
-        sqlite3_backup_step(backup, -1);
-        sqlite3_backup_finish(backup);
-    }
-    result = sqlite3_errcode(memory);
-    if (result != SQLITE_OK) {
-        return explain(memory, result);
-    }
-    connection = std::move(owned);
-    return {};
+    result = copyToMemory(opened, connection);
+    return result == SQLITE_OK ? StoreFault{} : explain(opened, result);
 }
 
 // Several processes may make the store at once: one of them holds the lock of the directory and builds it under

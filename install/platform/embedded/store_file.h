@@ -23,6 +23,9 @@ public:
     const std::string& path() const { return path_; }
     bool exists() const;
 
+    // Whether a host path names the store, its log or another file that SQLite keeps next to it.
+    bool isPart(const std::string& path) const;
+
     // Makes the state directory (mode 0700) and the store when they are missing, and opens it as a writer.
     StoreFault openForWriting(Connection& connection);
 
