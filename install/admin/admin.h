@@ -34,6 +34,9 @@ public:
     IPlatform& platform() { return *platform_; }
     IRegistryStore& registry() { return platform_->registry(); }
 
+    // What standard output is.
+    TerminalView output() { return platform_->terminal().look(TerminalStream::output); }
+
     // Shows the named key with all below it, or without a name all there is to show, between a head and a
     // tail: `append` adds what a key looks like, also one that cannot be read, which is told. By pages it goes out
     // while it is read and others may write in between.

@@ -137,7 +137,7 @@ Answer showAliases(Admin& admin, const std::string& asked) {
     if (table.size() == 1) {
         return admin.no(shownText(admin.platform().storeName()) + ": there is no such alias and none is due");
     }
-    return admin.show(tableText(table));
+    return admin.show(tableText(table, admin.output().columns));
 }
 
 }  // namespace

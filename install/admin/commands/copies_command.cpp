@@ -98,7 +98,7 @@ Answer readCopies(Admin& admin, CopyRows& rows) {
     return admin.platform().storeFaultTold() ? kAnswerFault : kAnswerYes;
 }
 
-std::string copiesText(const CopyRows& copies) {
+std::string copiesText(const CopyRows& copies, std::uint32_t columns) {
     std::vector<TableRow> table = {{"NAME", "VIEW", "VERSION", "VALID", "LOCATION", "SERVICE"}};
     for (const auto& [fold, row] : copies) {
         for (std::size_t view = 0; view < kViews.size(); ++view) {
@@ -110,7 +110,7 @@ std::string copiesText(const CopyRows& copies) {
             }
         }
     }
-    return tableText(table);
+    return tableText(table, columns);
 }
 
 void appendMember(const char* name, std::string_view narrow, std::string& json) {
@@ -158,7 +158,7 @@ Answer showCopies(Admin& admin, bool json) {
     const std::string store = admin.platform().storeName();
     const Answer shown = admin.show(json             ? copiesJson(copies, store)
                                     : copies.empty() ? std::string{}
-                                                     : copiesText(copies));
+                                                     : copiesText(copies, admin.output().columns));
     return shown != kAnswerYes || !copies.empty() ? shown : admin.no(shownText(store) + ": there is no installed copy");
 }
 

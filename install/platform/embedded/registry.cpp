@@ -176,11 +176,11 @@ Status EmbeddedRegistry::commit() {
 }
 
 Status EmbeddedRegistry::image(std::string& bytes) {
-    if (!file_.exists()) {
-        return kFileNotFound;
-    }
     if (const Status status = begin(); status != kSuccess) {
         return status;
+    }
+    if (!file_.exists()) {
+        return kFileNotFound;
     }
     // Not serialized directly: that would turn pages that cannot be read into zeros.
     Connection memory;
