@@ -74,7 +74,7 @@ TEST_F(AdminProgram, ShowsForReadingAndForPrograms) {
     @ REG_SZ "a\b"
     "\x0a" REG_SZ "\x1b\xe9\u202e)"
                            "\xC3\xA9"
-                           R"(" (without its end)
+                           R"(" (no NUL terminator)
     "d" REG_DWORD 255 (0xff)
     "m" REG_MULTI_SZ "a" "b" ""
     "q" REG_QWORD 4294967296 (0x100000000)
@@ -104,15 +104,15 @@ TEST_F(AdminProgram, AnswersNoAndTellsFaults) {
     const std::string unnamable = "HKU\\" + std::string(256, 'x');
     // clang-format off
     const struct { std::vector<std::string> arguments; int exitCode; std::string output; std::string error; } rows[] = {
-        {{"tree"},                1, "", told(missing + ": there is nothing to show")},
-        {{"export"},              1, kHead, storeTold() + told(missing + ": there is nothing to show")},
-        {{"export", "HKU\\x\n"},  1, "", told("HKEY_USERS\\x\\x0a: there is no such key")},
-        {{"tree", "HKCU"},        1, "", told("HKEY_CURRENT_USER: there is no such key")},
-        {{"tree", unnamable},     2, "", told("HKEY_USERS" + unnamable.substr(3) + ": no key can be named so")},
+        {{"tree"},                1, "", told("nothing to show: " + missing)},
+        {{"export"},              1, kHead, storeTold() + told("nothing to show: " + missing)},
+        {{"export", "HKU\\x\n"},  1, "", told("no such key: HKEY_USERS\\x\\x0a")},
+        {{"tree", "HKCU"},        1, "", told("no such key: HKEY_CURRENT_USER")},
+        {{"tree", unnamable},     2, "", told("invalid key name: HKEY_USERS" + unnamable.substr(3))},
         {{"import", bad},         2, "", told(bad + ":5: the line is no key, no value and no comment")},
         {{"import", store_.path()}, 2, "", told(store_.path() + ": Is a directory")},
         {{"import", "/none/such"},  2, "", told("/none/such: No such file or directory")},
-        {{},                      2, "", told("no command is given (see --help)")},
+        {{},                      2, "", told("no command (see --help)")},
         {{"rubbish"},             2, "", told("The following argument was not expected: rubbish (see --help)")},
         {{"export", "--json", "--utf16"}, 2, "", told("--utf16 excludes --json (see --help)")},
         {{"tree", "--store="},    2, "", told("--store: the name is empty (see --help)")},
@@ -154,7 +154,7 @@ TEST_F(AdminProgram, ReportsKeysThatAreListedAndCannotBeRead) {
     ASSERT_EQ(sqlite3_open(store_.file("registry.db").c_str(), &store), SQLITE_OK);
     EXPECT_EQ(sqlite3_exec(store, "UPDATE key SET fold = 'AX' WHERE name = 'a'", nullptr, nullptr, nullptr), SQLITE_OK);
     sqlite3_close(store);
-    const std::string line = "HKEY_LOCAL_MACHINE\\a: is listed but cannot be read: error 2";
+    const std::string line = "cannot read key: HKEY_LOCAL_MACHINE\\a: error 2";
     const std::string json = R"({"key":"HKEY_LOCAL_MACHINE\\a","class":"","values":[],"error":2},)";
     for (const auto& [command, shown] : {std::pair{Arguments{"tree"}, "  a (cannot be read: error 2)\n  b\n"s},
                                          {{"export"}, kHead + "\n[HKEY_LOCAL_MACHINE\\b]\n"s},
@@ -191,8 +191,7 @@ TEST_F(AdminProgram, KeepsAStoreThatItCannotChange) {
         const ProgramResult result = runProgram({"/bin/bash", "-c", programPath("kz7admin") + " " + command},
                                                 {{"KZ7_STATE_DIR=" + store_.path()}, {}});
         EXPECT_EQ(result.exitCode, exitCode) << command;
-        EXPECT_EQ(result.error,
-                  storeTold() + (exitCode == 0 ? "" : told("standard output cannot be written: "s + said)));
+        EXPECT_EQ(result.error, storeTold() + (exitCode == 0 ? "" : told("cannot write: standard output: "s + said)));
     }
 
     overwrite(store_.file("registry.db"), "rubbish");

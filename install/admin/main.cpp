@@ -58,7 +58,7 @@ int run(int argc, char** argv) {
         return kAnswerFault;
     }
     if (admin.answer == nullptr) {
-        std::fputs("kz7admin: no command is given (see --help)\n", stderr);
+        std::fputs("kz7admin: no command (see --help)\n", stderr);
         return kAnswerFault;
     }
     return admin.answer();

@@ -81,7 +81,7 @@ std::string why(const AliasRow& row, std::string_view missingView) {
     if (!row.should) {
         std::string reason = "no copy has such a version; the next rewrite ";
         if (!missingView.empty()) {
-            return reason.append("leaves it: there is no key of the copies in the ").append(missingView) + " view";
+            return reason.append("leaves it: the copies' key is missing from the ").append(missingView) + " view";
         }
         const auto stays = [&](std::size_t view) { return row.names[view] && !row.deletable[view]; };
         if (!stays(0) && !stays(1)) {
@@ -93,8 +93,7 @@ std::string why(const AliasRow& row, std::string_view missingView) {
         return reason + ": a value name of 100 bytes or more ends its walk";
     }
     if (row.version.empty()) {
-        return row.exact ? "no copy has exactly this version; written empty"
-                         : "no version goes on behind it; written empty";
+        return row.exact ? "no copy has exactly this version; written empty" : "no version continues it; written empty";
     }
     return shownText(row.version) + (row.exact ? " is this version" : " is the highest that begins with it");
 }
@@ -120,7 +119,7 @@ Answer showAliases(Admin& admin, const std::string& asked) {
         if (isNotFound(status)) {
             missingView = view == 0 ? "native" : "32-bit";
         } else if (!succeeded(status)) {
-            return admin.storeFault("the aliases cannot be read", status);
+            return admin.storeFault("cannot read aliases", status);
         }
     }
     computeAliases(admin, rows);
@@ -135,7 +134,7 @@ Answer showAliases(Admin& admin, const std::string& asked) {
         }
     }
     if (table.size() == 1) {
-        return admin.no(shownText(admin.platform().storeName()) + ": there is no such alias and none is due");
+        return admin.no("no such alias: " + shownText(admin.platform().storeName()));
     }
     return admin.show(tableText(table, admin.output().columns));
 }

@@ -38,7 +38,7 @@ Answer readKeys(Admin& admin, std::string& content) {
         return admin.storeFault("cannot read keys: " + admin.platform().storeName(), status);
     }
     content = std::string(kUtf16Mark) + utf16FileText(text);
-    return starts.empty() ? admin.no(admin.platform().storeName() + ": there is nothing to back up") : kAnswerYes;
+    return starts.empty() ? admin.no("nothing to back up: " + admin.platform().storeName()) : kAnswerYes;
 }
 
 Answer readStore(Admin& admin, std::string& content) {
@@ -47,9 +47,9 @@ Answer readStore(Admin& admin, std::string& content) {
     }
     const Status status = admin.platform().storeImage(content);
     if (isNotFound(status)) {
-        return admin.no(shownText(admin.platform().storeName()) + ": there is nothing to back up");
+        return admin.no("nothing to back up: " + shownText(admin.platform().storeName()));
     }
-    return status == kSuccess ? kAnswerYes : admin.storeFault("cannot read the store", status);
+    return status == kSuccess ? kAnswerYes : admin.storeFault("cannot read store", status);
 }
 
 std::string reasonOf(Status status) {

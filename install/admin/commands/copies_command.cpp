@@ -84,7 +84,7 @@ std::string stateOf(IServiceManager& services, ServiceHandle manager, const std:
 Answer readCopies(Admin& admin, CopyRows& rows) {
     for (std::size_t view = 0; view < kViews.size(); ++view) {
         if (const Status status = readView(admin, view, rows); !succeeded(status)) {
-            return admin.storeFault("the copies cannot be read", status);
+            return admin.storeFault("cannot read copies", status);
         }
     }
     IServiceManager& services = admin.platform().services();
@@ -159,7 +159,7 @@ Answer showCopies(Admin& admin, bool json) {
     const Answer shown = admin.show(json             ? copiesJson(copies, store)
                                     : copies.empty() ? std::string{}
                                                      : copiesText(copies, admin.output().columns));
-    return shown != kAnswerYes || !copies.empty() ? shown : admin.no(shownText(store) + ": there is no installed copy");
+    return shown != kAnswerYes || !copies.empty() ? shown : admin.no("no installed copy: " + shownText(store));
 }
 
 }  // namespace

@@ -26,11 +26,10 @@ Answer runProgram(Admin& admin, const std::vector<std::string>& command) {
     }
     const std::string program = shownText(command.front());
     if (isNotFound(status)) {
-        admin.tell(program + (isBareName(command.front())
-                                  ? ": there is no such program"
-                                  : ": there is no such program; its path must be a whole one, from the root"));
+        const char* const hint = isBareName(command.front()) ? "" : " (needs an absolute path)";
+        admin.tell("no such program: " + program + hint);
     } else {
-        admin.tell(compose("%s: cannot be run: error %u", {program, status}));
+        admin.tell(compose("cannot run program: %s: error %u", {program, status}));
     }
     return static_cast<Answer>(kNotStarted);
 }

@@ -23,7 +23,7 @@ std::string shownTexts(std::string_view data) {
         const std::size_t end = data.find('\0');
         shown += " \"" + shownText(data.substr(0, end)) + '"';
         if (end == std::string_view::npos) {
-            return shown + " (without its end)";
+            return shown + " (no NUL terminator)";
         }
         data.remove_prefix(end + 1);
     }

@@ -128,8 +128,8 @@ Status WindowsFileSystem::writeFile(std::string_view path, std::string_view cont
         return kGeneralFailure;
     }
     OwnedFile file(*this);
-    file.receive() = FileHandle{reinterpret_cast<std::uintptr_t>(CreateFileA(
-        unfinished.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_NEW, FILE_ATTRIBUTE_NORMAL, nullptr))};
+    file.receive() = FileHandle{reinterpret_cast<std::uintptr_t>(
+        CreateFileA(unfinished.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_NEW, FILE_ATTRIBUTE_NORMAL, nullptr))};
     if (native(file.get()) == INVALID_HANDLE_VALUE) {
         file.receive() = FileHandle::none;
         return GetLastError();
