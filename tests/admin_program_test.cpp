@@ -7,6 +7,11 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <chrono>
+#include <filesystem>
+#include <functional>
+#include <future>
+#include <set>
 
 #include "tests/support/state_directory.h"
 
@@ -146,6 +151,99 @@ TEST_F(AdminProgram, ReadsAStoreWhoseDirectoryItMayNotWrite) {
     ASSERT_EQ(chmod(store_.file("registry.db").c_str(), 0), 0);
     EXPECT_EQ(admin({"tree"}, {.environment = {}, .inChild = asOther}).error,
               told(store_.file("registry.db") + ": Permission denied"));
+}
+
+TEST_F(AdminProgram, BacksUpWholeRunsWhileOthersWrite) {
+    const auto add = [](const StateDirectory& to, int copy) {
+        return to.tool({"-addKZ7Copy", "COPY" + std::to_string(copy), "C:\\KZ7"}).exitCode;
+    };
+    constexpr int kCopies = 12;
+    const StateDirectory replay;
+    std::set<std::string> states;
+    for (int copy = 0; copy < kCopies; ++copy) {
+        ASSERT_EQ(add(replay, copy), 0);
+        states.insert(replay.dump());
+    }
+    ASSERT_EQ(add(store_, 0), 0);
+    auto writer = std::async(std::launch::async, [&] {
+        int failed = 0;
+        for (int copy = 1; copy < kCopies; ++copy) {
+            failed += add(store_, copy);
+        }
+        return failed;
+    });
+    const StateDirectory restored;
+    for (bool writes = true; writes;) {
+        writes = writer.wait_for(std::chrono::seconds(0)) != std::future_status::ready;
+        const ProgramResult result = admin({"backup", "--force", restored.file("registry.db")});
+        ASSERT_EQ(result.exitCode, 0) << result.error;
+        EXPECT_EQ(restored.integrity(), "ok");
+        EXPECT_TRUE(states.contains(restored.dump()));
+    }
+    EXPECT_EQ(writer.get(), 0);
+    EXPECT_EQ(admin({"export", "--store", restored.path()}).output, admin({"export"}).output);
+    struct stat found {};
+    ASSERT_EQ(stat(restored.file("registry.db").c_str(), &found), 0);
+    EXPECT_EQ(found.st_mode & 0777U, 0600U);
+}
+
+TEST_F(AdminProgram, BackupReplacesNothingThatItShouldNot) {
+    EXPECT_EQ(admin({"backup", files_.path() + "/none"}).error,
+              told("nothing to back up: " + store_.file("registry.db")));
+    std::string big = kHead + "[HKLM\\big]\n"s;
+    for (int value = 0; value < 200; ++value) {
+        big += "\"" + std::to_string(value) + "\"=\"" + std::string(1000, 'x') + "\"\n";
+    }
+    ASSERT_EQ(admin({"import", file(big)}).exitCode, 0);
+    const std::string before = store_.dump();
+    const std::string link = files_.path() + "/link";
+    const std::string old = file("old");
+    ASSERT_EQ(symlink(old.c_str(), link.c_str()), 0);
+    const auto small = [] {
+        const rlimit limit{1 << 16, 1 << 16};
+        setrlimit(RLIMIT_FSIZE, &limit);
+    };
+    // clang-format off
+    const struct { std::string target; bool force; std::string reason; std::function<void()> inChild; } rows[] = {
+        {old,                             false, "file exists (--force replaces it)", {}},
+        {old,                             true,  "no space left on device",           small},
+        {link,                            true,  "not a regular file",                {}},
+        {"/dev/null",                     true,  "not a regular file",                {}},
+        {files_.path() + "/",             true,  "not a regular file",                {}},
+        {files_.path() + "/none/x",       false, "no such directory",                 {}},
+        {store_.path() + "/registry.db",  true,  "part of the store itself",          {}},
+        {store_.path() + "/./registry.db-wal", true, "part of the store itself",      {}},
+    };
+    // clang-format on
+    for (const auto& row : rows) {
+        const Arguments words = {"backup", row.target, row.force ? "--force" : "--store=" + store_.path()};
+        const ProgramResult result = admin(words, {{}, row.inChild});
+        EXPECT_EQ(result.exitCode, 2) << row.target;
+        EXPECT_EQ(result.error, told("cannot write backup: " + row.target + ": " + row.reason));
+        EXPECT_EQ(result.output, "");
+        EXPECT_EQ(contents(old), "old") << row.target;
+        EXPECT_EQ(store_.dump(), before) << row.target;
+    }
+    const std::filesystem::directory_iterator left(files_.path());
+    EXPECT_EQ(std::distance(begin(left), end(left)), 2) << "no temporary file";
+}
+
+TEST_F(AdminProgram, FitsItsTerminalAndNeverSteersIt) {
+    ASSERT_EQ(store_.tool({"-addKZ7Copy", "\xE6\x9D\xB1\xE4\xBA\xAC", "C:\\Program Files\\KZ7"}).exitCode, 0);
+    ASSERT_EQ(store_.tool({"-addKZ7Copy", "PLAIN", "C:\\KZ7"}).exitCode, 0);
+    ASSERT_EQ(admin({"import", file(kHead + "[HKLM\\a\xC2\x9B]\n"s)}).exitCode, 0);
+    const auto onTerminal = [this](const std::string& columns, const std::string& command) {
+        const std::string line =
+            "stty -opost cols 80; " + columns + ' ' + programPath("kz7admin") + ' ' + command + " 2>/dev/null";
+        return runProgram({"/usr/bin/script", "-qec", line, "/dev/null"}, {{"KZ7_STATE_DIR=" + store_.path()}, {}});
+    };
+    EXPECT_EQ(onTerminal("", "copies").output, R"(TODO)");
+    const ProgramResult narrow = onTerminal("COLUMNS=40", "copies");
+    EXPECT_EQ(narrow.output.substr(0, narrow.output.find("\n\n")), R"(TODO)");
+    EXPECT_EQ(admin({"copies"}).output, R"(TODO)") << "nothing is wrapped in a pipe";
+    EXPECT_NE(onTerminal("", "export 'HKLM\\a\xC2\x9B'").output.find("[HKEY_LOCAL_MACHINE\\a\\u009b]\n"),
+              std::string::npos);
+    EXPECT_EQ(onTerminal("", "export --utf16").exitCode, 2);
 }
 
 TEST_F(AdminProgram, ReportsKeysThatAreListedAndCannotBeRead) {

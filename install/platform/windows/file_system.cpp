@@ -40,6 +40,15 @@ std::string randomName(std::string_view folder) {
     return name;
 }
 
+Status checkTarget(const std::string& path, bool replace) {
+    const DWORD found = GetFileAttributesA(path.c_str());
+    if (found == INVALID_FILE_ATTRIBUTES) {
+        return kSuccess;
+    }
+    constexpr DWORD kNotAFile = FILE_ATTRIBUTE_DIRECTORY | FILE_ATTRIBUTE_DEVICE | FILE_ATTRIBUTE_REPARSE_POINT;
+    return (found & kNotAFile) != 0 ? kBadPathname : replace ? kSuccess : kFileExists;
+}
+
 }  // namespace
 
 Status WindowsFileSystem::probe(std::string_view path) {
@@ -118,29 +127,23 @@ Status WindowsFileSystem::writeFile(std::string_view path, std::string_view cont
     if (namesNothing(path) || target.ends_with('\\') || target.ends_with('/')) {
         return kBadPathname;
     }
-    if (const DWORD found = GetFileAttributesA(target.c_str()); found != INVALID_FILE_ATTRIBUTES) {
-        constexpr DWORD kNotAFile = FILE_ATTRIBUTE_DIRECTORY | FILE_ATTRIBUTE_DEVICE | FILE_ATTRIBUTE_REPARSE_POINT;
-        if ((found & kNotAFile) != 0 || !replace) {
-            return (found & kNotAFile) != 0 ? kBadPathname : kFileExists;
-        }
+    if (const Status status = checkTarget(target, replace); status != kSuccess || unfinished.empty()) {
+        return status != kSuccess ? status : kGeneralFailure;
     }
-    if (unfinished.empty()) {
-        return kGeneralFailure;
-    }
-    OwnedFile file(*this);
-    file.receive() = FileHandle{reinterpret_cast<std::uintptr_t>(
-        CreateFileA(unfinished.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_NEW, FILE_ATTRIBUTE_NORMAL, nullptr))};
-    if (native(file.get()) == INVALID_HANDLE_VALUE) {
-        file.receive() = FileHandle::none;
+    const HANDLE opened =
+        CreateFileA(unfinished.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_NEW, FILE_ATTRIBUTE_NORMAL, nullptr);
+    if (opened == INVALID_HANDLE_VALUE) {
         return GetLastError();
     }
+    OwnedFile file(*this);
+    file.receive() = FileHandle{reinterpret_cast<std::uintptr_t>(opened)};
     Status status = kSuccess;
     while (status == kSuccess && !content.empty()) {
         std::uint32_t written = 0;
         status = write(file.get(), content.substr(0, kWritePiece), written);
         content.remove_prefix(written);
     }
-    if (status == kSuccess && FlushFileBuffers(native(file.get())) == FALSE) {
+    if (status == kSuccess && FlushFileBuffers(opened) == FALSE) {
         status = GetLastError();
     }
     file.reset();
