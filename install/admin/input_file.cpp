@@ -9,7 +9,7 @@
 namespace kz7 {
 namespace {
 
-// 0 or the error of the call that failed.
+// 0 or an error number.
 int readInput(const std::string& path, std::string& bytes) {
     std::FILE* file = path == "-" ? stdin : std::fopen(path.c_str(), "rb");
     if (file == nullptr) {

@@ -24,7 +24,7 @@ struct Words {
     bool machine = false;
 };
 
-// Whether a name is one part of a path, of the registry's and of the host's.
+// Whether a name is one component of registry paths and of host paths.
 bool isOneName(const std::string& name) {
     return name != "." && name != ".." &&
            std::none_of(name.begin(), name.end(), [](char c) { return c == '\\' || c == '/' || (c >= 0 && c < ' '); });
@@ -58,7 +58,7 @@ Answer findCopy(Admin& admin, const Words& words, ConfigurationRequest& request)
     return request.location.empty() ? admin.fault("copy has no location: " + shown) : kAnswerYes;
 }
 
-// The log must open before anything is done.
+// Fails before anything is set if the log cannot be opened.
 Answer findLog(Admin& admin, const Words& words, ConfigurationRequest& request) {
     IFileSystem& files = admin.platform().files();
     Status status = kSuccess;
@@ -115,7 +115,7 @@ Answer commit(Admin& admin, const Words& words) {
         return admin.storeFault("cannot save changes: " + shownText(words.copy), outcome.kept);
     }
     if (!words.machine) {
-        // Text that is lost is told; what was set is set.
+        // A failure is reported and does not change the exit status: the values are set.
         admin.write(compose("%s: %u set, %u not set; the log is %s\n",
                             {shownText(words.copy), outcome.set, outcome.notSet, shownText(log)}));
     }

@@ -10,7 +10,7 @@
 namespace kz7 {
 namespace {
 
-constexpr int kNotStarted = 127;  // as shells have it; all other codes are the program's
+constexpr int kNotStarted = 127;  // as in shells; all other codes are the program's
 
 Answer runProgram(Admin& admin, const std::vector<std::string>& command) {
     if (!admin.open(true)) {

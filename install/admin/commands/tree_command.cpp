@@ -16,7 +16,7 @@ std::string hexNumber(std::uint64_t number) {
     return text;
 }
 
-// Each text of the data in quotation marks; a terminator ends a text, and one that is missing is told.
+// The NUL-terminated texts of the data in quotation marks; notes a missing terminator.
 std::string shownTexts(std::string_view data) {
     std::string shown;
     while (!data.empty()) {
