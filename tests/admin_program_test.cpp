@@ -237,10 +237,21 @@ TEST_F(AdminProgram, FitsItsTerminalAndNeverSteersIt) {
             "stty -opost cols 80; " + columns + ' ' + programPath("kz7admin") + ' ' + command + " 2>/dev/null";
         return runProgram({"/usr/bin/script", "-qec", line, "/dev/null"}, {{"KZ7_STATE_DIR=" + store_.path()}, {}});
     };
-    EXPECT_EQ(onTerminal("", "copies").output, R"(TODO)");
-    const ProgramResult narrow = onTerminal("COLUMNS=40", "copies");
-    EXPECT_EQ(narrow.output.substr(0, narrow.output.find("\n\n")), R"(TODO)");
-    EXPECT_EQ(admin({"copies"}).output, R"(TODO)") << "nothing is wrapped in a pipe";
+    const std::string table = R"(NAME   VIEW    VERSION    VALID  LOCATION              SERVICE
+PLAIN  native  9.7.800.0  yes    C:\KZ7                KZ7MGMTSVC_PLAIN stopped
+PLAIN  32-bit  9.7.800.0  yes    C:\KZ7                KZ7MGMTSVC_PLAIN stopped
+東京   native  9.7.800.0  yes    C:\Program Files\KZ7  KZ7MGMTSVC_東京 stopped
+東京   32-bit  9.7.800.0  yes    C:\Program Files\KZ7  KZ7MGMTSVC_東京 stopped
+)";
+    EXPECT_EQ(onTerminal("", "copies").output, table);
+    EXPECT_EQ(admin({"copies"}, {{"COLUMNS=40"}, {}}).output, table) << "nothing is wrapped in a pipe";
+    const std::string list = onTerminal("COLUMNS=40", "copies").output;
+    EXPECT_EQ(list.substr(0, list.find("\n\n")), R"(NAME      PLAIN
+VIEW      native
+VERSION   9.7.800.0
+VALID     yes
+LOCATION  C:\KZ7
+SERVICE   KZ7MGMTSVC_PLAIN stopped)");
     EXPECT_NE(onTerminal("", "export 'HKLM\\a\xC2\x9B'").output.find("[HKEY_LOCAL_MACHINE\\a\\u009b]\n"),
               std::string::npos);
     EXPECT_EQ(onTerminal("", "export --utf16").exitCode, 2);
