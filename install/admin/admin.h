@@ -36,14 +36,17 @@ public:
 
     // Shows the named key with all below it, or without a name all there is to show, between a head and a
     // tail: `append` adds what a key looks like, also one that cannot be read, which is told. By pages it goes out
-    // while it is read and others may write in between.
+    // while it is read and others may write in between; a snapshot is a document.
     using Appender = std::function<void(const KeyRecord&, std::string&)>;
     enum class Reading { snapshot, pages };
     Answer showKeys(const std::string& key, std::string text, const Appender& append, std::string_view tail,
                     Reading reading);
 
+    // Text for people, or what programs read: UTF-8 or bytes on every host.
+    enum class Form { text, document };
+
     // Writes to standard output; the store it comes from is told on standard error, once.
-    Answer show(std::string_view text);
+    Answer show(std::string_view text, Form form = Form::text);
 
     // Which store was opened, and what to know about that.
     std::string storeLine();
@@ -58,7 +61,7 @@ public:
 
     // Writes to standard output; a fault is told. A reader that is gone wants no more, which is no fault. A store that
     // is open for reading is not held meanwhile.
-    Answer write(std::string_view text);
+    Answer write(std::string_view text, Form form = Form::text);
 
 private:
     Answer selectKeys(const std::string& key, std::vector<KeyStart>& starts);

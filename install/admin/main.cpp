@@ -10,9 +10,16 @@
 #include "install/admin/commands/front_command.h"
 #include "install/admin/commands/import_command.h"
 #include "install/admin/commands/tree_command.h"
+#include "install/platform/encoding.h"
+#include "install/platform/program.h"
 
 namespace kz7 {
 namespace {
+
+// Before there are ports, or without them.
+void tellFault(const std::string& reason) {
+    std::fputs(narrowFromText("kz7admin: " + reason + '\n').c_str(), stderr);
+}
 
 int run(int argc, char** argv) {
     Admin admin;
@@ -32,7 +39,7 @@ int run(int argc, char** argv) {
     } catch (const CLI::Success& help) {
         return program.exit(help);
     } catch (const CLI::ParseError& error) {
-        std::fprintf(stderr, "kz7admin: %s (see --help)\n", shownText(error.what()).c_str());
+        tellFault(shownText(error.what()) + " (see --help)");
         return kAnswerFault;
     }
     if (admin.answer == nullptr) {
@@ -45,14 +52,14 @@ int run(int argc, char** argv) {
 }  // namespace
 }  // namespace kz7
 
-int main(int argc, char** argv) {
+int kz7::programMain(int argc, char** argv) {
     // What was not committed is dropped with the platform.
     try {
-        return kz7::run(argc, argv);
+        return run(argc, argv);
     } catch (const std::bad_alloc&) {
         std::fputs("kz7admin: out of memory\n", stderr);
     } catch (const std::exception& error) {
-        std::fprintf(stderr, "kz7admin: %s\n", kz7::shownText(error.what()).c_str());
+        tellFault(shownText(error.what()));
     }
-    return kz7::kAnswerFault;
+    return kAnswerFault;
 }

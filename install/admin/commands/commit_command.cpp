@@ -68,7 +68,7 @@ Answer findLog(Admin& admin, const Words& words, ConfigurationRequest& request) 
     } else {
         status = files.productPath(words.logFile, request.logFile);
     }
-    if (status == kSuccess && request.logFile.size() >= kPathSize) {
+    if (status == kSuccess && !fitsCharacters(request.logFile, kPathSize - 1)) {
         status = kFilenameExceedsRange;
     }
     OwnedFile log(files);
@@ -94,7 +94,7 @@ Answer findMessages(Admin& admin, const Words&, ConfigurationRequest& request) {
 }
 
 Answer commit(Admin& admin, const Words& words) {
-    if (words.instance.size() > kMaxInstanceName || !isOneName(words.instance)) {
+    if (!fitsCharacters(words.instance, kMaxInstanceName) || !isOneName(words.instance)) {
         return admin.open(true) ? admin.fault(compose("%s: an instance name has at most %u characters and no separator",
                                                       {shownText(words.instance), std::uint32_t{kMaxInstanceName}}))
                                 : kAnswerFault;

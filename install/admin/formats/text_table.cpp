@@ -2,15 +2,15 @@
 
 #include <algorithm>
 
-#include "install/platform/encoding.h"
+#include "install/platform/text.h"
 
 namespace kz7 {
 namespace {
 
 constexpr std::size_t kGap = 2;
 
-std::size_t widthOf(const std::string& narrow) {
-    return utf16FromNarrow(narrow).size();
+std::size_t widthOf(const std::string& text) {
+    return textLength(text);
 }
 
 }  // namespace
