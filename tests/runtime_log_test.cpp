@@ -46,7 +46,7 @@ TEST(LogFile, HoldsARunToTheByte) {
                                      kLine60);
     EXPECT_TRUE(machine.processes_.started.empty());
     EXPECT_EQ(log.logFilePath(), "C:\\Setup Logs\\setup.log");
-    char path[kPathSize];
+    char path[kPathBytes];
     EXPECT_EQ(log.componentLogPath(path), path);
     EXPECT_STREQ(path, "C:\\SetupLogs\\kz7msi.log");
     EXPECT_STREQ(log.componentLogPath(nullptr), path);

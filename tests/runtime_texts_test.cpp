@@ -3,6 +3,7 @@
 
 #include <string>
 
+#include "install/platform/encoding.h"
 #include "install/platform/memory/file_system.h"
 #include "install/runtime/message_catalogue.h"
 #include "install/runtime/response_file.h"
@@ -20,7 +21,7 @@ std::string shown(const std::vector<ResponseKeyword>& keywords) {
 
 TEST(ResponseFile, GivesNamesAndValuesInFileOrderOrTheFirstBadLine) {
     // clang-format off
-    const struct { const char* why; std::string file; const char* keywords; } rows[] = {
+    const struct { const char* why; std::string file; std::string keywords; } rows[] = {
         {"pairs in their order",            "B = 1\nA=2\nB =3\n",                      "B<1>A<2>B<3>"},
         {"comments and empty lines",        "* one = 1\n\n ; two = 2\n  \t\nA = 1",    "A<1>"},
         {"carriage returns",                "A = 1\r\n\r\nB = 2\r\n",                  "A<1>B<2>"},
@@ -31,7 +32,7 @@ TEST(ResponseFile, GivesNamesAndValuesInFileOrderOrTheFirstBadLine) {
         {"doubled quotes",                  "A = \"say \"\"x\"\"\"",                   "A<say \"x\">"},
         {"quotes inside are text",          "A = x \"y\"",                             "A<x \"y\">"},
         {"more equals signs",               "A = b=c",                                 "A<b=c>"},
-        {"dots, digits, other letters",     "KZ7.PASSWORD_1 = \xE4",                   "KZ7.PASSWORD_1<\xE4>"},
+        {"dots, digits, other letters",     "KZ7.PASSWORD_1 = \xE4",                   "KZ7.PASSWORD_1<" + textFromNarrow("\xE4") + ">"},
         {"no pair",                         "A = 1\n\nword\nB\n",                      "3: there is no '=' in it"},
         {"no name",                         "* x\n = 1",                               "2: there is no name before the '='"},
         {"a blank in a name",               "A B = 1",                                 "1: a name has letters, digits, '_' and '.' only"},

@@ -1,9 +1,12 @@
 // The custom actions. Each call builds what it needs and leaves nothing behind: the installer loads the library anew
 // for every action, other libraries keep it.
+#include <algorithm>
+#include <cstring>
 #include <memory>
 #include <new>
 
 #include "install/actions/kz7actions.h"
+#include "install/platform/encoding.h"
 #include "install/platform/installer_session.h"
 #include "install/platform/platform.h"
 #include "install/runtime/installer_properties.h"
@@ -17,6 +20,7 @@ namespace {
 
 constexpr char kResponseFile[] = "RSP_FILE_PATH";
 constexpr char kMessageFile[] = "KZ7_MESSAGES";
+constexpr std::uint32_t kMostCharacters = 1 << 20;  // of a value that is read
 
 // One call: this machine, the installation, and an engine whose log is the installer's.
 class ActionCall {
@@ -53,7 +57,7 @@ public:
 private:
     // Reads a file that a property names. The installer is asked, not the saved values: the user can write those.
     void readNamedFile(const char* property, Status (URE::*read)(std::string_view, std::string_view)) {
-        FixedBuffer<kPropertySize> path;
+        TextBuffer<kPropertySize> path;
         const Status status = session_->getProperty(property, path);
         traceProperty(at_, "iMsiGetProperty", property, status);
         if (status == kSuccess && !path.text().empty()) {
@@ -82,10 +86,76 @@ std::uint32_t call(std::uint32_t installation, Work work) {
     }
 }
 
+// An argument of a caller, whose texts are in the active code page; a null one stays null.
+class Argument {
+public:
+    explicit Argument(const char* narrow) : isNull_(narrow == nullptr), text_(textFromNarrow(isNull_ ? "" : narrow)) {}
+
+    const char* get() const { return isNull_ ? nullptr : text_.c_str(); }
+    const std::string& text() const { return text_; }
+
+private:
+    bool isNull_;
+    std::string text_;
+};
+
+// Copies a text into a caller's buffer, cut to its size and terminated.
+void copyOut(std::string_view narrow, std::uint32_t size, char* output) {
+    output[narrow.copy(output, size - 1)] = '\0';
+}
+
+// Reads a property into a caller's buffer: the code page decides whether it fits and what its size is.
+Status readNarrow(const Installation& at, const char* name, char* buffer, std::uint32_t& size) {
+    const std::uint32_t characters = std::min(size, kMostCharacters);
+    std::string room(std::size_t{kBytesOfCharacter} * characters, '\0');
+    Buffer value(room.data(), static_cast<std::uint32_t>(room.size()), characters);
+    Status status = readProperty(at, name, value);
+    if (status != kSuccess) {
+        size = status == kMoreData ? value.size : size;
+        return status;
+    }
+    std::string narrow = narrowFromText(value.view());
+    if (narrow.size() + (narrow.ends_with('\0') ? 0 : 1) > size) {
+        // Only where a character has two bytes: what is saved does not fit, so that the installer is asked.
+        Buffer none(room.data(), 1);
+        status = readProperty(at, name, none);
+        if (status != kSuccess) {
+            size = static_cast<std::uint32_t>(narrow.size());
+            return status;
+        }
+        narrow.clear();
+    }
+    size = static_cast<std::uint32_t>(narrow.size());
+    narrow.copy(buffer, narrow.size());
+    if (!narrow.ends_with('\0')) {
+        buffer[narrow.size()] = '\0';
+    }
+    return kSuccess;
+}
+
+// As the runtime's: sizes are those of the code page, and a text without a change is the caller's own.
+const char* substituteNarrow(const char* text, const Argument& copyName, std::uint32_t outputSize, char* output) {
+    static std::string shared;
+    if (outputSize != 0 && (output == nullptr || std::strlen(text) + 1 > outputSize)) {
+        return nullptr;
+    }
+    const Argument given(text);
+    const char* substituted = iSubstituteCopyName(given.get(), copyName.get(), 0, nullptr);
+    const bool same = substituted == given.get();
+    const std::string narrow = same ? text : narrowFromText(substituted);
+    if (outputSize != 0) {
+        copyOut(narrow, outputSize, output);
+    } else if (!same) {
+        shared = narrow;
+    }
+    return same ? text : outputSize != 0 ? output : shared.c_str();
+}
+
 }  // namespace
 }  // namespace kz7
 
 using kz7::ActionCall;
+using kz7::Argument;
 
 extern "C" {
 
@@ -106,23 +176,27 @@ std::uint32_t iDeleteSavedProperties(std::uint32_t installation) {
 
 std::uint32_t iMsiGetProperty(std::uint32_t installation, const char* name, char* buffer, std::uint32_t* size) {
     return kz7::call(installation, [&](ActionCall& action) {
-        const kz7::Status status = kz7::iMsiGetProperty(action.at(), name, buffer, size);
-        kz7::traceProperty(action.at(), "iMsiGetProperty", name != nullptr ? name : "", status);
+        const Argument named(name);
+        const bool isWhole = name != nullptr && buffer != nullptr && size != nullptr;
+        const kz7::Status status = isWhole ? kz7::readNarrow(action.at(), named.get(), buffer, *size)
+                                           : kz7::iMsiGetProperty(action.at(), named.get(), buffer, size);
+        kz7::traceProperty(action.at(), "iMsiGetProperty", named.text(), status);
         return status;
     });
 }
 
 std::uint32_t iMsiSetProperty(std::uint32_t installation, const char* name, const char* value) {
     return kz7::call(installation, [&](ActionCall& action) {
-        const kz7::Status status = kz7::iMsiSetProperty(action.at(), name, value);
-        kz7::traceProperty(action.at(), "iMsiSetProperty", name != nullptr ? name : "", status);
+        const Argument named(name);
+        const kz7::Status status = kz7::iMsiSetProperty(action.at(), named.get(), Argument(value).get());
+        kz7::traceProperty(action.at(), "iMsiSetProperty", named.text(), status);
         return status;
     });
 }
 
 const char* iSubstituteCopyName(const char* text, const char* copyName, std::uint32_t outputSize, char* output) {
     try {
-        return kz7::iSubstituteCopyName(text, copyName, outputSize, output);
+        return text != nullptr ? kz7::substituteNarrow(text, Argument(copyName), outputSize, output) : nullptr;
     } catch (...) {
         return nullptr;
     }

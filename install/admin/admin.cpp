@@ -79,18 +79,18 @@ Answer Admin::showKeys(const std::string& key, std::string text, const Appender&
             return storeFault("cannot read key: " + shownText(fullKeyName(start.name)), status);
         }
     }
-    written = show(text.append(tail));
+    written = show(text.append(tail), reading == Reading::snapshot ? Form::document : Form::text);
     if (written == kAnswerYes && outcome == kAnswerNo) {
         tell("nothing to show: " + shownText(platform_->storeName()));
     }
     return written != kAnswerYes ? written : outcome;
 }
 
-Answer Admin::show(std::string_view text) {
+Answer Admin::show(std::string_view text, Form form) {
     if (!text.empty() && !std::exchange(storeTold_, true)) {
         tell(storeLine());
     }
-    return write(text);
+    return write(text, form);
 }
 
 std::string Admin::storeLine() {
@@ -122,12 +122,15 @@ Answer Admin::storeFault(std::string_view what, Status status) {
     return kAnswerFault;
 }
 
-Answer Admin::write(std::string_view text) {
+Answer Admin::write(std::string_view text, Form form) {
     if (readOnly_) {
         registry().commit();
     }
     IConsole& console = platform_->console();
-    Status status = readerGone_ ? kPipeClosing : console.writeOutput(text);
+    Status status = kPipeClosing;
+    if (!readerGone_) {
+        status = form == Form::document ? console.writeDocument(text) : console.writeOutput(text);
+    }
     if (status == kSuccess) {
         status = console.flush();
     }

@@ -39,14 +39,17 @@ public:
 
     // Writes a key and its subkeys, or without a name everything, between a head and a tail. `append` formats a key,
     // also one that cannot be read, which is reported. Pages are written while the store is read, and other programs
-    // may write in between.
+    // may write in between; a snapshot is a document.
     using Appender = std::function<void(const KeyRecord&, std::string&)>;
     enum class Reading { snapshot, pages };
     Answer showKeys(const std::string& key, std::string text, const Appender& append, std::string_view tail,
                     Reading reading);
 
+    // Text for people, or a document for programs: UTF-8 or bytes on every host.
+    enum class Form { text, document };
+
     // Writes to standard output; names the store on standard error before the first text.
-    Answer show(std::string_view text);
+    Answer show(std::string_view text, Form form = Form::text);
 
     // The name of the open store, with its note.
     std::string storeLine();
@@ -61,7 +64,7 @@ public:
 
     // Writes to standard output and reports a failure. Succeeds if the reader has closed the pipe. Ends a read
     // transaction first, so that a slow reader blocks no checkpoint.
-    Answer write(std::string_view text);
+    Answer write(std::string_view text, Form form = Form::text);
 
 private:
     Answer selectKeys(const std::string& key, std::vector<KeyStart>& starts);

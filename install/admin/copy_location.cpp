@@ -7,7 +7,7 @@ namespace kz7 {
 
 std::string locationOf(IRegistryStore& registry, const std::string& copyPath) {
     OwnedKey key(registry);
-    FixedBuffer<10000> location;
+    TextBuffer<10000> location;
     const bool read = registry.openKey(KeyHandle::localMachine, copyPath, kKeyRead, key.receive()) == kSuccess &&
                       queryText(registry, key.get(), layout::kPathName, location) == kSuccess;
     return read ? std::string(location.text()) : std::string{};

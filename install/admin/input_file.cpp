@@ -4,6 +4,7 @@
 #include <cstdio>
 #include <cstring>
 
+#include "install/platform/program.h"
 #include "install/platform/text.h"
 
 namespace kz7 {
@@ -11,7 +12,7 @@ namespace {
 
 // 0 or an error number.
 int readInput(const std::string& path, std::string& bytes) {
-    std::FILE* file = path == "-" ? stdin : std::fopen(path.c_str(), "rb");
+    std::FILE* file = path == "-" ? stdin : openInput(path.c_str());
     if (file == nullptr) {
         return errno;
     }

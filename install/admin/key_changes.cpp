@@ -18,7 +18,7 @@ Status deleteKeys(IRegistryStore& registry, const KeyName& name) {
         }
         return status;
     };
-    FixedBuffer<4 * (kMaxKeyName + 1)> subkey;
+    TextBuffer<kMaxKeyName + 1> subkey;
     Status status = enter(name.root, name.path);
     while (status == kSuccess && !levels.empty()) {
         status = registry.enumerateKey(levels.back().key.get(), 0, subkey, nullptr);

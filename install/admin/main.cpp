@@ -13,6 +13,8 @@
 #include "install/admin/commands/import_command.h"
 #include "install/admin/commands/tree_command.h"
 #include "install/platform/console.h"
+#include "install/platform/encoding.h"
+#include "install/platform/program.h"
 
 namespace kz7 {
 namespace {
@@ -31,6 +33,11 @@ Answer showHelp(const CLI::App& program, const CLI::Success& help) {
     const auto console = standardConsole();
     const bool written = console->writeOutput(text.str()) == kSuccess && console->flush() == kSuccess;
     return written ? kAnswerYes : kAnswerFault;
+}
+
+// Before there are ports, or without them.
+void tellFault(const std::string& reason) {
+    std::fputs(narrowFromText("kz7admin: " + reason + '\n').c_str(), stderr);
 }
 
 int run(int argc, char** argv) {
@@ -54,7 +61,7 @@ int run(int argc, char** argv) {
     } catch (const CLI::Success& help) {
         return showHelp(program, help);
     } catch (const CLI::ParseError& error) {
-        std::fprintf(stderr, "kz7admin: %s (see --help)\n", shownText(error.what()).c_str());
+        tellFault(shownText(error.what()) + " (see --help)");
         return kAnswerFault;
     }
     if (admin.answer == nullptr) {
@@ -67,14 +74,14 @@ int run(int argc, char** argv) {
 }  // namespace
 }  // namespace kz7
 
-int main(int argc, char** argv) {
+int kz7::programMain(int argc, char** argv) {
     // What was not committed is dropped with the platform.
     try {
-        return kz7::run(argc, argv);
+        return run(argc, argv);
     } catch (const std::bad_alloc&) {
         std::fputs("kz7admin: out of memory\n", stderr);
     } catch (const std::exception& error) {
-        std::fprintf(stderr, "kz7admin: %s\n", kz7::shownText(error.what()).c_str());
+        tellFault(shownText(error.what()));
     }
-    return kz7::kAnswerFault;
+    return kAnswerFault;
 }

@@ -58,7 +58,7 @@ Status dropProviders(IRegistryStore& registry, std::string_view level) {
         return isNotFound(status) ? kSuccess : status;
     }
     std::vector<std::string> names;
-    FixedBuffer<kRecordNameRoom> name;
+    TextBuffer<kRecordNameRoom> name;
     const std::string levelText = recordLevel(level);
     std::uint32_t index = 0;
     while (succeeded(status = registry.enumerateValue(key.get(), index, name, nullptr, nullptr))) {

@@ -6,31 +6,49 @@
 #include <cstdint>
 #include <string_view>
 
+#include "install/platform/text.h"
+
 namespace kz7 {
 
-// Room lent to an operation, and how much of it was filled.
+// Room lent to an operation, and how much of it was filled. A text must fit by its characters (UTF-16 units, its NUL
+// included), other data by its bytes; both limits are one number.
 struct Buffer {
-    Buffer(char* room, std::uint32_t bytes) : data(room), capacity(bytes) {}
+    Buffer(char* room, std::uint32_t bytes) : Buffer(room, bytes, bytes) {}
+    Buffer(char* room, std::uint32_t bytes, std::uint32_t most) : data(room), capacity(bytes), limit(most) {}
 
-    // What was filled in; after kMoreData nothing, since `size` then tells the room that was missing.
-    std::string_view view() const { return {data, size <= capacity ? size : 0}; }
+    // What was filled in; nothing after kMoreData, since `size` then is the room that was missing.
+    std::string_view view() const { return {data, refused || size > capacity ? 0 : size}; }
 
     // The filled bytes up to the first NUL.
     std::string_view text() const { return view().substr(0, view().find('\0')); }
 
     char* data;
-    std::uint32_t capacity;  // bytes; a name's terminating NUL must fit too
+    std::uint32_t capacity;  // bytes
+    std::uint32_t limit;     // characters of a text, bytes of other data
     std::uint32_t size = 0;  // bytes filled, a name without its NUL; after kMoreData the bytes needed
+    bool refused = false;    // by the limit
 };
 
-template <std::uint32_t Capacity>
+// Room for that many bytes, texts included.
+template <std::uint32_t Bytes>
 struct FixedBuffer : Buffer {
-    FixedBuffer() : Buffer(nullptr, Capacity) { data = room_.data(); }
+    FixedBuffer() : Buffer(nullptr, Bytes) { data = room_.data(); }
     FixedBuffer(const FixedBuffer&) = delete;
     FixedBuffer& operator=(const FixedBuffer&) = delete;
 
 private:
-    std::array<char, Capacity> room_{};
+    std::array<char, Bytes> room_{};
+};
+
+// Room for a text of that many characters with its NUL, or for as many bytes of other data.
+template <std::uint32_t Characters>
+struct TextBuffer : Buffer {
+    TextBuffer() : Buffer(nullptr, kBytesOfCharacter * Characters, Characters) { data = room_.data(); }
+    TextBuffer(const TextBuffer&) = delete;
+    TextBuffer& operator=(const TextBuffer&) = delete;
+
+private:
+    std::array<char, kBytesOfCharacter * Characters> room_{};
 };
 
 }  // namespace kz7

@@ -1,5 +1,7 @@
-// Text outside this machine's narrow encoding: UTF-8 and UTF-16, as files and other programs hold it. Both
-// forms may hold lone surrogates, in UTF-8 as three bytes; they carry what has no character of its own.
+// Conversions of text: UTF-8, UTF-16, the text of the ports, and the narrow encoding of the machine.
+//
+// The text of the ports is UTF-8 on every host. An unpaired surrogate is its three bytes. UTF-8 and UTF-16 may hold
+// unpaired surrogates everywhere here.
 #pragma once
 
 #include <cstddef>
@@ -12,7 +14,12 @@ constexpr bool isSurrogate(char32_t character) {
     return character >= 0xD800 && character <= 0xDFFF;
 }
 
-// Takes one character or lone surrogate off a text that is not empty.
+// A byte that is no character is the surrogate U+DC00 + byte in UTF-16.
+constexpr bool isByteSurrogate(char32_t character) {
+    return character >= 0xDC80 && character <= 0xDCFF;
+}
+
+// Takes one character or unpaired surrogate off a text that is not empty.
 char32_t takeUtf16(std::u16string_view& text);
 
 // The same for UTF-8; false, with nothing taken, where the text does not begin with a character.
@@ -25,12 +32,20 @@ void appendUtf8(std::string& text, char32_t character);
 bool utf16FromUtf8(std::string_view utf8, std::u16string& utf16);
 std::string utf8FromUtf16(std::u16string_view utf16);
 
-// The machine's narrow text, the one that the ports take and give. A byte that is no character becomes the
-// lone surrogate U+DC00 + byte where the narrow encoding leaves such bytes.
-std::u16string utf16FromNarrow(std::string_view narrow);
+// The text of the ports in UTF-16. A byte that is no character becomes the surrogate U+DC00 + byte. A text that came
+// from textFromUtf16() gives the same UTF-16 again.
+std::u16string utf16FromText(std::string_view text);
 
-// The way back, exact for everything that came from there. False where the narrow encoding has no form for a
-// character.
-bool narrowFromUtf16(std::u16string_view utf16, std::string& narrow);
+// The way back. The surrogates of bytes are the bytes themselves on the embedded store, whose texts may be any bytes;
+// on Windows they are three bytes as all others.
+std::string textFromUtf16(std::u16string_view utf16);
+
+// The narrow encoding, in which other programs read and write texts: the active code page on Windows, the text of the
+// ports itself elsewhere. Bytes that the code page cannot give back become surrogates of bytes, so that
+// narrowFromText(textFromNarrow(bytes)) is always `bytes`.
+std::string textFromNarrow(std::string_view narrow);
+
+// Characters that the code page lacks come out as its closest ones.
+std::string narrowFromText(std::string_view text);
 
 }  // namespace kz7

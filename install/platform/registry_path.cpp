@@ -25,7 +25,7 @@ Status checkKeyPath(std::string_view path) {
     }
     std::string_view name;
     while (takeName(path, name)) {
-        if (name.size() > kMaxKeyName) {
+        if (!fitsCharacters(name, kMaxKeyName)) {
             return kInvalidParameter;
         }
     }
@@ -33,7 +33,8 @@ Status checkKeyPath(std::string_view path) {
 }
 
 Status checkValueName(std::string_view name) {
-    return name.size() > kMaxValueName || name.find('\0') != std::string_view::npos ? kInvalidParameter : kSuccess;
+    return !fitsCharacters(name, kMaxValueName) || name.find('\0') != std::string_view::npos ? kInvalidParameter
+                                                                                             : kSuccess;
 }
 
 std::string plainKeyPath(KeyHandle parent, std::string_view path, AccessMask access) {
@@ -54,7 +55,8 @@ std::string plainKeyPath(KeyHandle parent, std::string_view path, AccessMask acc
 }
 
 Status giveName(std::string_view name, Buffer& buffer) {
-    if (name.size() >= buffer.capacity) {
+    buffer.refused = name.size() >= buffer.capacity || !fitsCharacters(name, buffer.limit - 1);
+    if (buffer.refused) {
         buffer.size = static_cast<std::uint32_t>(name.size() + 1);
         return kMoreData;
     }
@@ -64,12 +66,14 @@ Status giveName(std::string_view name, Buffer& buffer) {
     return kSuccess;
 }
 
-Status giveBytes(std::string_view bytes, Buffer& buffer) {
-    buffer.size = static_cast<std::uint32_t>(bytes.size());
-    if (bytes.size() > buffer.capacity) {
+Status giveData(ValueType type, std::string_view data, Buffer& buffer) {
+    buffer.size = static_cast<std::uint32_t>(data.size());
+    buffer.refused = data.size() > buffer.capacity ||
+                     !(isTextType(type) ? fitsCharacters(data, buffer.limit) : data.size() <= buffer.limit);
+    if (buffer.refused) {
         return kMoreData;
     }
-    bytes.copy(buffer.data, bytes.size());
+    data.copy(buffer.data, data.size());
     return kSuccess;
 }
 

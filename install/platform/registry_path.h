@@ -31,7 +31,7 @@ constexpr AccessMask grantedAccess(AccessMask access) {
 // Gives a name to a lent buffer with its NUL: kMoreData when that does not fit.
 Status giveName(std::string_view name, Buffer& buffer);
 
-// Gives bytes to a lent buffer: kMoreData with the size needed when they do not fit.
-Status giveBytes(std::string_view bytes, Buffer& buffer);
+// Gives data to a lent buffer: kMoreData with the bytes needed when they do not fit.
+Status giveData(ValueType type, std::string_view data, Buffer& buffer);
 
 }  // namespace kz7

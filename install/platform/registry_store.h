@@ -45,10 +45,14 @@ enum class ValueType : std::uint32_t {
     qword = 11,
 };
 
+constexpr bool isTextType(ValueType type) {
+    return type == ValueType::sz || type == ValueType::expandSz || type == ValueType::multiSz;
+}
+
 inline constexpr std::uint32_t kMaxKeyName = 255;      // characters of one key name
 inline constexpr std::uint32_t kMaxValueName = 16383;  // characters of a value name
 
-// Paths are narrow texts below a key, parts separated by backslashes; the empty path is the key itself.
+// Paths are texts below a key, parts separated by backslashes; the empty path is the key itself.
 // Names keep their case and compare without it (ASCII). Subkeys enumerate in the order of their
 // upper-cased names, values in the order they were first set; the first spelling of a name is kept.
 // Outputs are written on success only, but for Buffer::size, which kMoreData fills.

@@ -7,6 +7,7 @@
 #include "install/platform/owned_handle.h"
 #include "install/platform/registry_store.h"
 #include "install/platform/status.h"
+#include "install/platform/text.h"
 
 namespace kz7 {
 
@@ -37,8 +38,9 @@ enum class ServiceState : std::uint32_t {
 // Characters of a service's name. The service manager keeps a service as a key of that name, so the limit is a key's.
 inline constexpr std::size_t kMaxServiceName = kMaxKeyName;
 
-constexpr bool isServiceName(std::string_view name) {
-    return !name.empty() && name.size() <= kMaxServiceName && name.find_first_of("/\\") == std::string_view::npos;
+inline bool isServiceName(std::string_view name) {
+    return !name.empty() && fitsCharacters(name, kMaxServiceName) &&
+           name.find_first_of("/\\") == std::string_view::npos;
 }
 
 // A service that runs as LocalSystem in a process of its own, without load order group or dependencies.

@@ -172,7 +172,7 @@ Status ServiceRecords::startService(ServiceHandle service) {
     if (now == ServiceState::running) {
         return kServiceAlreadyRunning;
     }
-    FixedBuffer<1024> program;
+    TextBuffer<1024> program;
     status = registry_.queryValue(record.get(), kImagePath, nullptr, program);
     if (status == kSuccess) {
         status = files_.probe(program.text());
@@ -208,7 +208,7 @@ Status ServiceRecords::deleteRecord(const std::string& path) {
         registry_.openKey(KeyHandle::localMachine, path, kKeyEnumerateSubkeys, keys.emplace_back(registry_).receive());
     while (status == kSuccess && !keys.empty()) {
         const KeyHandle key = keys.back().get();
-        FixedBuffer<kMaxKeyName + 1> below;
+        TextBuffer<kMaxKeyName + 1> below;
         status = registry_.enumerateKey(key, 0, below, nullptr);
         if (status == kSuccess) {
             status = registry_.openKey(key, below.view(), kKeyEnumerateSubkeys, keys.emplace_back(registry_).receive());

@@ -7,15 +7,16 @@ namespace {
 
 bool steersTerminal(char32_t character) {
     return character < 0x20 || (character >= 0x7F && character < 0xA0) || isSurrogate(character) ||
-           character == 0x061C || character == 0x200E || character == 0x200F || (character >= 0x2028 && character <= 0x202E) ||
-           (character >= 0x2066 && character <= 0x2069) || character == 0xFEFF;
+           character == 0x061C || character == 0x200E || character == 0x200F ||
+           (character >= 0x2028 && character <= 0x202E) || (character >= 0x2066 && character <= 0x2069) ||
+           character == 0xFEFF;
 }
 
 }  // namespace
 
-std::string shownText(std::string_view narrow) {
+std::string shownText(std::string_view foreign) {
     static constexpr char kDigits[] = "0123456789abcdef";
-    const std::u16string utf16 = utf16FromNarrow(narrow);
+    const std::u16string utf16 = utf16FromText(foreign);
     std::u16string shown;
     for (std::u16string_view rest = utf16; !rest.empty();) {
         const char32_t character = takeUtf16(rest);
@@ -30,9 +31,7 @@ std::string shownText(std::string_view narrow) {
             shown += static_cast<char16_t>(kDigits[character >> shift & 15]);
         }
     }
-    std::string text;
-    narrowFromUtf16(shown, text);
-    return text;
+    return textFromUtf16(shown);
 }
 
 }  // namespace kz7

@@ -7,6 +7,6 @@
 namespace kz7 {
 
 // Foreign text for a line of ours: control characters, and what turns the direction of writing, are escaped.
-std::string shownText(std::string_view narrow);
+std::string shownText(std::string_view foreign);
 
 }  // namespace kz7

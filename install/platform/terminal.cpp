@@ -27,7 +27,7 @@ Status readLineOf(const std::function<int()>& next, Buffer& line) {
     if (c == EOF && !any) {
         return kEndOfFile;
     }
-    line.size = length;
+    line.size = static_cast<std::uint32_t>(cutText({line.data, length}, line.limit).size());
     return kSuccess;
 }
 

@@ -58,7 +58,36 @@ bool isIn(std::span<const CharacterRange> ranges, char32_t character) {
     });
 }
 
+// Takes a character off a text that is not empty; the result is its units.
+std::size_t takeCharacter(std::string_view& text) {
+    char32_t character = 0;
+    if (static_cast<unsigned char>(text.front()) < 0x80 || !takeUtf8(text, character)) {
+        text.remove_prefix(1);
+    }
+    return character < 0x10000 ? 1 : 2;
+}
+
 }  // namespace
+
+std::size_t textLength(std::string_view text) {
+    std::size_t length = 0;
+    while (!text.empty()) {
+        length += takeCharacter(text);
+    }
+    return length;
+}
+
+std::string_view cutText(std::string_view text, std::size_t limit) {
+    if (text.size() <= limit) {
+        return text;
+    }
+    std::string_view rest = text;
+    std::string_view next = text;
+    for (std::size_t length = 0; !next.empty() && (length += takeCharacter(next)) <= limit;) {
+        rest = next;
+    }
+    return text.substr(0, text.size() - rest.size());
+}
 
 std::string foldUpper(std::string_view text) {
     std::string folded(text);

@@ -1,5 +1,5 @@
-// Narrow text as the whole system handles it: case folds in ASCII only, fixed buffers cut and always
-// terminate, and only the system's own message texts are ever patterns.
+// Text as the whole system handles it: UTF-8 whose limits count UTF-16 units, the characters of Windows. Case folds in
+// ASCII only, fixed buffers cut and always terminate, and only the system's own message texts are ever patterns.
 #pragma once
 
 #include <cstdint>
@@ -21,7 +21,22 @@ std::string foldUpper(std::string_view text);
 
 bool equalsIgnoreCase(std::string_view left, std::string_view right);
 
-// A text kept in `Size` bytes, its terminator included. What does not fit is cut; the terminator never is.
+// Bytes of a character in UTF-8 at most; one of two units has four bytes.
+inline constexpr std::uint32_t kBytesOfCharacter = 3;
+
+// The characters of a text. A byte that is part of none counts as one.
+std::size_t textLength(std::string_view text);
+
+// Whether a text has at most that many characters.
+inline bool fitsCharacters(std::string_view text, std::size_t limit) {
+    return text.size() <= limit || textLength(text) <= limit;
+}
+
+// The text up to that many characters; one of two units is taken whole or not at all.
+std::string_view cutText(std::string_view text, std::size_t limit);
+
+// A text kept in room for `Size` characters, its terminator included. What does not fit is cut; the terminator never
+// is.
 template <std::size_t Size>
 class FixedText {
 public:
@@ -41,14 +56,15 @@ public:
         return append(text);
     }
     bool append(std::string_view text) {
-        const std::size_t room = Size - 1 - length_;
-        const std::size_t taken = text.size() < room ? text.size() : room;
-        if (taken != 0) {
-            std::memmove(room_ + length_, text.data(), taken);
+        // Only a long text is worth counting.
+        const std::string_view taken =
+            length_ + text.size() < Size ? text : cutText(text, Size - 1 - textLength(view()));
+        if (!taken.empty()) {
+            std::memmove(room_ + length_, taken.data(), taken.size());
         }
-        length_ += taken;
+        length_ += taken.size();
         room_[length_] = '\0';
-        return taken == text.size();
+        return taken.size() == text.size();
     }
 
     std::string_view view() const { return {room_, length_}; }
@@ -56,8 +72,8 @@ public:
     bool empty() const { return length_ == 0; }
 
 private:
-    char room_[Size];  // written up to the terminator; lines are made of these
-    std::size_t length_ = 0;
+    char room_[kBytesOfCharacter * (Size - 1) + 1];  // written up to the terminator; lines are made of these
+    std::size_t length_ = 0;                         // bytes
 };
 
 // Takes a character off a text that is not empty and returns the columns that it takes on a terminal: 0 for a combining

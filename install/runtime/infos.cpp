@@ -18,7 +18,7 @@ Status UREInfo::copyText(char* room, std::size_t size, std::size_t& length) cons
 }
 
 void UREInfo::copyText(FixedText<kMessageSize>& text) const {
-    char room[kMessageSize];
+    char room[kBytesOfCharacter * kMessageSize];
     std::size_t length = 0;
     if (copyText(room, sizeof room, length) == kNoInstallerSession) {
         copyMissingText(text);
@@ -31,7 +31,7 @@ void UREInfo::copyMissingText(FixedText<kMessageSize>& text) const {
     char code[16];
     std::snprintf(code, sizeof code, "0x%07x", static_cast<unsigned>(code_));
     const Insert insert = std::string_view(code);
-    char room[kMessageSize];
+    char room[kBytesOfCharacter * kMessageSize];
     std::size_t length = 0;
     catalogue_.copyText(kMissingTextMessage, {&insert, 1}, room, sizeof room, length);
     text.assign({room, std::min(length, sizeof room)});

@@ -13,7 +13,7 @@ namespace kz7 {
 
 class MessageCatalogue;
 
-inline constexpr std::size_t kMessageSize = 1024;  // bytes of a copied text with its terminator
+inline constexpr std::size_t kMessageSize = 1024;  // characters of a copied text with its terminator
 
 // clang-format off
 inline constexpr std::uint32_t kClassInformation = 0x0100;  // the high 16 bits of a message code

@@ -5,6 +5,7 @@
 #include <cstring>
 #include <new>
 
+#include "install/platform/encoding.h"
 #include "install/runtime/guarded.h"
 
 namespace kz7 {
@@ -12,7 +13,7 @@ namespace {
 
 constexpr std::size_t kFirstCapacity = 1024;   // bytes of captured text before the first doubling
 constexpr std::uint32_t kPieceSize = 512;      // bytes of one read from a pipe
-constexpr std::uint32_t kShortPathSize = 261;  // bytes of a short path with its terminator
+constexpr std::uint32_t kShortPathSize = 261;  // characters of a short path with its terminator
 constexpr std::string_view kWakingBytes("\0\0\0", 3);
 constexpr std::string_view kWrapperProgram = "kz7.exe";
 
@@ -181,7 +182,7 @@ Status InstallProcess::wholeCommandLine(IProcessHost& host, std::string& command
             rest.remove_prefix(rest.starts_with('"') ? 1 : 0);
         } else {
             commandLine.append(program);
-            FixedBuffer<kShortPathSize> shortened;
+            TextBuffer<kShortPathSize> shortened;
             // Deliberate: a leading quotation mark goes into the shortening, which then finds no such file
             // and leaves the text alone; the closing mark that follows makes it whole again.
             if (host.shortPath(commandLine, shortened) == kSuccess) {
@@ -402,7 +403,7 @@ void InstallProcess::postStandardError(std::string_view source, std::uint32_t fl
 
 void InstallProcess::post(std::uint32_t number, std::string_view text, std::string_view source, std::uint32_t flags) {
     if (!text.empty()) {
-        sink_.post(number, flags | kPostedByProcess, source, text);
+        sink_.post(number, flags | kPostedByProcess, source, textFromNarrow(text));
     }
 }
 

@@ -31,18 +31,6 @@ bool isDeferred(IInstallerSession& session) {
            (session.runMode(RunMode::rollback, isOn) == kSuccess && isOn);
 }
 
-Status readFromInstaller(IInstallerSession& session, const char* name, char* buffer, std::uint32_t* size) {
-    if (size == nullptr) {
-        return kInvalidParameter;
-    }
-    Buffer value(buffer, *size);
-    const Status status = session.getProperty(name, value);
-    if (status == kSuccess || status == kMoreData) {
-        *size = value.size;
-    }
-    return status;
-}
-
 // The root of the user who installs; silently that of the caller when the user is not known or the root does not open.
 class UserRoot {
 public:
@@ -59,19 +47,13 @@ private:
 };
 
 // A property's value as iMsiGetProperty() reads it.
-class PropertyValue {
-public:
-    PropertyValue(const Installation& at, const char* name) {
-        std::uint32_t size = kPropertySize;
-        status = iMsiGetProperty(at, name, room_.data(), &size);
-    }
+struct PropertyValue {
+    PropertyValue(const Installation& at, const char* name) : status(readProperty(at, name, room)) {}
 
-    std::string_view text() const { return status == kSuccess ? room_.data() : std::string_view{}; }
+    std::string_view text() const { return status == kSuccess ? room.text() : std::string_view{}; }
 
+    TextBuffer<kPropertySize> room;
     Status status;
-
-private:
-    std::array<char, kPropertySize> room_{};
 };
 
 UserRoot rootOfUser(const Installation& at) {
@@ -186,7 +168,7 @@ private:
         if (!key_) {
             return;
         }
-        const Status status = value.size() < kPropertySize
+        const Status status = fitsCharacters(value, kPropertySize - 1)
                                   ? at_.registry.setValue(key_.get(), name, ValueType::sz, std::string(value) + '\0')
                                   : kMoreData;
         if (status != kSuccess) {
@@ -205,46 +187,50 @@ bool isReadableWhenScheduled(std::string_view name) {
 }
 
 // A value as it was saved. Any status but success: none that fits.
-Status readSaved(const Installation& at, const char* name, char* buffer, std::uint32_t* size) {
-    FixedBuffer<kPropertySize> sid;
+Status readSaved(const Installation& at, const char* name, Buffer& value) {
+    TextBuffer<kPropertySize> sid;
     const bool known = at.session.getProperty(kUserSid, sid) == kSuccess;
     const UserRoot root(at.registry, known ? sid.text() : std::string_view{});
     // Deliberate: the path of the key passes through the process-wide buffer of the copy-name substitution; callers
     // that still read an earlier result there find this path.
     overwriteSharedOutput(kSavedProperties);
     OwnedKey key(at.registry);
-    Buffer saved(buffer, *size);
     Status status = at.registry.openKey(root.key(), kSavedProperties, kKeyFull, key.receive());
     if (status == kSuccess) {
-        status = queryText(at.registry, key.get(), name, saved);
+        status = queryText(at.registry, key.get(), name, value);
     }
-    if (status == kSuccess) {
-        // Deliberate: here the size counts the terminator, as the registry does; the installer's does not.
-        *size = saved.size;
-        if (saved.size < saved.capacity) {
-            buffer[saved.size] = '\0';
-        }
+    if (status == kSuccess && value.size < value.capacity) {
+        value.data[value.size] = '\0';
     }
     return status;
 }
 
-Status readProperty(const Installation& at, const char* name, char* buffer, std::uint32_t* size) {
+Status readValue(const Installation& at, const char* name, Buffer& value) {
     if (!isDeferred(at.session)) {
-        return name == nullptr || buffer == nullptr ? kMissingItem : readFromInstaller(at.session, name, buffer, size);
+        return at.session.getProperty(name, value);
     }
-    if (name == nullptr || buffer == nullptr || size == nullptr) {
-        return kInvalidParameter;
-    }
-    const std::uint32_t room = *size;
     if (isReadableWhenScheduled(name)) {
         // The user can write the saved values: a planted UserSID would lead a deletion to another user's key.
-        const Status status = readFromInstaller(at.session, name, buffer, size);
-        if (status != kSuccess || *size != 0) {
+        const Status status = at.session.getProperty(name, value);
+        if (status != kSuccess || value.size != 0) {
             return status;
         }
-        *size = room;
     }
-    return readSaved(at, name, buffer, size) == kSuccess ? kSuccess : readFromInstaller(at.session, name, buffer, size);
+    return readSaved(at, name, value) == kSuccess ? kSuccess : at.session.getProperty(name, value);
+}
+
+Status readInto(const Installation& at, const char* name, char* buffer, std::uint32_t* size) {
+    const bool isNamed = name != nullptr && buffer != nullptr;
+    if (!isNamed || size == nullptr) {
+        return !isNamed && !isDeferred(at.session) ? kMissingItem : kInvalidParameter;
+    }
+    Buffer value(buffer, *size);
+    const Status status = readValue(at, name, value);
+    if (status == kSuccess || status == kMoreData) {
+        // Deliberate: the size of a saved value counts the terminator, as the registry does; the installer's does not.
+        *size = value.size;
+    }
+    return status;
 }
 
 // The installation's own name of the product counts more than that of a response file.
@@ -285,7 +271,11 @@ Status saveProperties(const Installation& at) {
 }  // namespace
 
 Status iMsiGetProperty(const Installation& at, const char* name, char* buffer, std::uint32_t* size) {
-    return guarded([&] { return readProperty(at, name, buffer, size); });
+    return guarded([&] { return readInto(at, name, buffer, size); });
+}
+
+Status readProperty(const Installation& at, const char* name, Buffer& value) {
+    return guarded([&] { return readValue(at, name, value); });
 }
 
 Status iMsiSetProperty(const Installation& at, const char* name, const char* value) {

@@ -11,7 +11,7 @@
 
 namespace kz7 {
 
-inline constexpr std::size_t kPropertySize = 1024;  // bytes of a property's value with its NUL
+inline constexpr std::size_t kPropertySize = 1024;  // characters of a property's value with its NUL
 
 // The running installation, its user's registry, and the engine that its traces go to. No exception leaves the
 // operations below; kNoMemory: memory ran out.
@@ -20,6 +20,9 @@ struct Installation {
     IRegistryStore& registry;
     URE& ure;
 };
+
+// Reads a property into a buffer that may count characters; as below, but name and room are given.
+Status readProperty(const Installation& at, const char* name, Buffer& value);
 
 // Reads a property into `size` bytes. A deferred action reads the saved value first, but kReadableWhenScheduled first
 // from the installer: the user can write the saved values. On success the value is terminated and `size` is what it
@@ -33,7 +36,7 @@ Status iMsiSetProperty(const Installation& at, const char* name, const char* val
 
 // Deletes what an earlier installation saved, then saves the properties of the installation's table, those of
 // kSavedPropertyNames, the states of some features and the keywords of the response file; values that cannot be read or
-// have kPropertySize bytes and more are left out. The engine's product abbreviation becomes that of the property
+// have kPropertySize characters and more are left out. The engine's product abbreviation becomes that of the property
 // kProductKeyword, if it is set.
 // kNoInstallationDatabase, or the first failure of the installer in giving the table.
 Status iSavePropertiesForDeferred(const Installation& at);

@@ -8,7 +8,7 @@
 namespace kz7 {
 namespace {
 
-constexpr std::uint32_t kVariableSize = 10000;  // bytes of a value with its NUL
+constexpr std::uint32_t kVariableSize = 10000;  // characters of a value with its NUL
 
 Status named(Status status) {
     return isNotFound(status) ? kVariableNotThere : status;
@@ -64,7 +64,7 @@ Status ProfileRegistry::get(std::string_view instance, std::string_view variable
 
 Status ProfileRegistry::read(std::string_view instance, std::string_view variable, std::string& value) {
     OwnedKey key(registry_);
-    FixedBuffer<kVariableSize> data;
+    TextBuffer<kVariableSize> data;
     Status status = registry_.openKey(KeyHandle::localMachine, keyOf(instance), kKeyQueryValue, key.receive());
     if (status == kSuccess) {
         status = queryText(registry_, key.get(), variable, data);

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "install/platform/encoding.h"
 #include "install/runtime/guarded.h"
 
 namespace kz7 {
@@ -61,6 +62,8 @@ const char* parseLine(std::string_view line, ResponseKeyword& keyword) {
 Status parseLines(std::string_view file, std::vector<ResponseKeyword>& keywords, ResponseFault& fault) {
     std::vector<ResponseKeyword> found;
     file.remove_prefix(file.starts_with(kUtf8Mark) ? kUtf8Mark.size() : 0);
+    const std::string text = textFromNarrow(file);
+    file = text;
     for (std::uint32_t number = 1; !file.empty(); ++number) {
         const std::size_t end = std::min(file.find('\n'), file.size());
         std::string_view line = file.substr(0, end);

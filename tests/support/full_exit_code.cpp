@@ -7,11 +7,11 @@
 #include <cstdio>
 
 int main() {
-    STARTUPINFOA startup{};
+    STARTUPINFOW startup{};
     startup.cb = sizeof startup;
     PROCESS_INFORMATION started{};
     DWORD code = 0;
-    if (!CreateProcessA(nullptr, PathGetArgsA(GetCommandLineA()), nullptr, nullptr, TRUE, 0, nullptr, nullptr, &startup,
+    if (!CreateProcessW(nullptr, PathGetArgsW(GetCommandLineW()), nullptr, nullptr, TRUE, 0, nullptr, nullptr, &startup,
                         &started) ||
         WaitForSingleObject(started.hProcess, INFINITE) != WAIT_OBJECT_0 ||
         !GetExitCodeProcess(started.hProcess, &code)) {

@@ -40,7 +40,7 @@ AliasRow& rowOf(AliasRows& rows, std::string_view prefix) {
 Status readValues(IRegistryStore& registry, std::string_view path, std::size_t view, AliasRows& rows) {
     OwnedKey key(registry);
     Status status = registry.openKey(KeyHandle::localMachine, path, kKeyRead, key.receive());
-    FixedBuffer<kMaxValueName + 1> name;
+    TextBuffer<kMaxValueName + 1> name;
     std::string room(1 << 12, '\0');
     bool walked = true;
     for (std::uint32_t index = 0; succeeded(status); ++index) {
@@ -54,7 +54,7 @@ Status readValues(IRegistryStore& registry, std::string_view path, std::size_t v
         if (!succeeded(status)) {
             break;
         }
-        walked = walked && name.text().size() < kAliasNameRoom;
+        walked = walked && fitsCharacters(name.text(), kAliasNameRoom - 1);
         AliasRow& row = rowOf(rows, name.text());
         row.names[view] = data.text();
         row.deletable[view] = walked;

@@ -68,7 +68,7 @@ Answer findLog(Admin& admin, const Words& words, ConfigurationRequest& request) 
     } else {
         status = files.productPath(words.logFile, request.logFile);
     }
-    if (status == kSuccess && request.logFile.size() >= kPathSize) {
+    if (status == kSuccess && !fitsCharacters(request.logFile, kPathSize - 1)) {
         status = kFilenameExceedsRange;
     }
     OwnedFile log(files);
@@ -93,7 +93,7 @@ Answer findMessages(Admin& admin, const Words&, ConfigurationRequest& request) {
 }
 
 Answer commit(Admin& admin, const Words& words) {
-    if (words.instance.size() > kMaxInstanceName || !isOneName(words.instance)) {
+    if (!fitsCharacters(words.instance, kMaxInstanceName) || !isOneName(words.instance)) {
         return admin.open(true) ? admin.fault(compose("invalid instance name: %s: at most %u characters, no separators",
                                                       {shownText(words.instance), std::uint32_t{kMaxInstanceName}}))
                                 : kAnswerFault;

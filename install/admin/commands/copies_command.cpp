@@ -43,7 +43,7 @@ Status readView(Admin& admin, std::size_t view, CopyRows& rows) {
     RegistryValues values(registry, admin.platform().debugOutput(), kKeyRead);
     OwnedKey key(registry);
     Status status = registry.openKey(KeyHandle::localMachine, copies, kKeyRead, key.receive());
-    FixedBuffer<kMaxKeyName + 1> name;
+    TextBuffer<kMaxKeyName + 1> name;
     for (std::uint32_t index = 0;
          succeeded(status) && succeeded(status = registry.enumerateKey(key.get(), index, name, nullptr)); ++index) {
         CopyRow& row = rows[foldUpper(name.text())];
@@ -113,11 +113,11 @@ std::string copiesText(const CopyRows& copies, std::uint32_t columns) {
     return tableText(table, columns);
 }
 
-void appendMember(const char* name, std::string_view narrow, std::string& json) {
+void appendMember(const char* name, std::string_view text, std::string& json) {
     json += ",\"";
     json += name;
     json += "\":";
-    appendJsonText(narrow, json);
+    appendJsonText(text, json);
 }
 
 std::string copiesJson(const CopyRows& copies, const std::string& store) {
@@ -158,7 +158,8 @@ Answer showCopies(Admin& admin, bool json) {
     const std::string store = admin.platform().storeName();
     const Answer shown = admin.show(json             ? copiesJson(copies, store)
                                     : copies.empty() ? std::string{}
-                                                     : copiesText(copies, admin.output().columns));
+                                                     : copiesText(copies, admin.output().columns),
+                                    json ? Admin::Form::document : Admin::Form::text);
     return shown != kAnswerYes || !copies.empty() ? shown : admin.no("no installed copy: " + shownText(store));
 }
 

@@ -4,9 +4,9 @@
 
 namespace kz7 {
 
-void appendJsonText(std::string_view narrow, std::string& json) {
+void appendJsonText(std::string_view text, std::string& json) {
     static constexpr char kDigits[] = "0123456789abcdef";
-    const std::u16string utf16 = utf16FromNarrow(narrow);
+    const std::u16string utf16 = utf16FromText(text);
     json += '"';
     for (std::u16string_view rest = utf16; !rest.empty();) {
         const char32_t character = takeUtf16(rest);

@@ -7,7 +7,7 @@
 
 namespace kz7 {
 
-// A text of the machine's narrow encoding, in quotation marks.
-void appendJsonText(std::string_view narrow, std::string& json);
+// A text in quotation marks.
+void appendJsonText(std::string_view text, std::string& json);
 
 }  // namespace kz7

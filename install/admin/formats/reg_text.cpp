@@ -18,20 +18,24 @@ constexpr std::string_view kBlanks = " \t";
 constexpr std::size_t kBytesOfLine = 24;
 constexpr char32_t kEscaped = 0xDC00;
 
-bool isTextType(ValueType type) {
-    return type == ValueType::sz || type == ValueType::expandSz || type == ValueType::multiSz;
-}
-
 bool isControl(char32_t character) {
     return character < 0x20 || (character >= 0x7F && character < 0xA0);
 }
 
+// Whether a character in a name is one that control characters travel as, or marks one that stands for itself.
+bool isEscape(char32_t character) {
+    return character >= kEscaped && character < kEscaped + 0x80;
+}
+
 // UTF-8 without ASCII's control characters, which would end a line or steer a terminal.
-std::string nameText(std::string_view narrow) {
-    const std::u16string utf16 = utf16FromNarrow(narrow);
+std::string nameText(std::string_view name) {
+    const std::u16string utf16 = utf16FromText(name);
     std::string text;
     for (std::u16string_view rest = utf16; !rest.empty();) {
         const char32_t character = takeUtf16(rest);
+        if (isEscape(character)) {
+            appendUtf8(text, kEscaped);
+        }
         appendUtf8(text, character < 0x20 || character == 0x7F ? kEscaped + character : character);
     }
     return text;
@@ -53,7 +57,7 @@ bool isPlainText(const KeyValue& value, std::string& utf8) {
     if (value.type != ValueType::sz || value.data.empty() || value.data.back() != '\0') {
         return false;
     }
-    const std::u16string utf16 = utf16FromNarrow(std::string_view(value.data).substr(0, value.data.size() - 1));
+    const std::u16string utf16 = utf16FromText(std::string_view(value.data).substr(0, value.data.size() - 1));
     for (std::u16string_view rest = utf16; !rest.empty();) {
         const char32_t character = takeUtf16(rest);
         if (isControl(character) || isSurrogate(character)) {
@@ -115,7 +119,7 @@ void appendData(const KeyValue& value, std::string& text) {
         return;
     }
     appendHexType(value.type, text);
-    const std::string bytes = isTextType(value.type) ? utf16Bytes(utf16FromNarrow(value.data)) : value.data;
+    const std::string bytes = isTextType(value.type) ? utf16Bytes(utf16FromText(value.data)) : value.data;
     for (std::size_t at = 0; at < bytes.size(); ++at) {
         if (at != 0) {
             text += at % kBytesOfLine == 0 ? ",\\\n  " : ",";
@@ -157,7 +161,7 @@ private:
             text_ = utf8FromUtf16(utf16FromBytes(file));
             whole = file.size() % 2 == 0;
         } else if (file.starts_with(kOldHeader)) {
-            text_ = utf8FromUtf16(utf16FromNarrow(file));
+            text_ = utf8FromUtf16(utf16FromText(textFromNarrow(file)));
         } else {
             text_ = file.substr(file.starts_with(kUtf8Mark) ? kUtf8Mark.size() : 0);
         }
@@ -226,13 +230,18 @@ private:
 
     bool ended() { return atEnd() || fail("there is more on the line than its value"); }
 
-    // The machine's text, with the control characters that travelled as lone surrogates.
-    bool narrow(std::string_view utf8, std::string& text) {
+    // The text of the ports, with the control characters that travelled as surrogates.
+    static std::string plain(std::string_view utf8) {
         std::u16string utf16;
-        for (char32_t character = 0; takeUtf8(utf8, character);) {
-            appendUtf16(utf16, character >= kEscaped && character < kEscaped + 0x80 ? character - kEscaped : character);
+        bool literal = false;
+        for (char32_t character = 0; takeUtf8(utf8, character); literal = !literal && character == kEscaped) {
+            if (!isEscape(character)) {
+                appendUtf16(utf16, character);
+            } else if (literal || character != kEscaped) {
+                appendUtf16(utf16, literal ? character : character - kEscaped);
+            }
         }
-        return narrowFromUtf16(utf16, text) || fail("there is a character that this machine's encoding lacks");
+        return textFromUtf16(utf16);
     }
 
     // A text in quotation marks that the line begins with.
@@ -241,7 +250,8 @@ private:
         for (line_.remove_prefix(1); !line_.empty(); line_.remove_prefix(1)) {
             if (line_.front() == '"') {
                 line_.remove_prefix(1);
-                return narrow(utf8, text);
+                text = plain(utf8);
+                return true;
             }
             if (line_.front() == '\\') {
                 line_.remove_prefix(1);
@@ -263,10 +273,7 @@ private:
         KeyChange change;
         change.line = number_;
         change.remove = take("-");
-        std::string name;
-        if (!narrow(line_, name)) {
-            return false;
-        }
+        const std::string name = plain(line_);
         if (!parseKeyName(name, change.name)) {
             return fail("the key is in none of HKEY_LOCAL_MACHINE, HKEY_USERS and HKEY_CURRENT_USER");
         }
@@ -351,7 +358,7 @@ private:
         } else if (!take("hex:")) {
             return fail("the data is no text, no dword and no hex list");
         }
-        return bytes(change.data) && (!isTextType(change.type) || narrowHex_ || hexText(change.data));
+        return bytes(change.data) && (!isTextType(change.type) || hexText(change.data));
     }
 
     // A list of bytes, continued on the next line after a backslash.
@@ -382,11 +389,15 @@ private:
     }
 
     bool hexText(std::string& data) {
+        if (narrowHex_) {
+            data = textFromNarrow(data);
+            return true;
+        }
         if (data.size() % 2 != 0) {
             return fail("a text is pairs of bytes");
         }
-        return narrowFromUtf16(utf16FromBytes(data), data) ||
-               fail("there is a character that this machine's encoding lacks");
+        data = textFromUtf16(utf16FromBytes(data));
+        return true;
     }
 
     std::vector<KeyChange>& changes_;

@@ -8,6 +8,7 @@
 #include <numeric>
 
 #include "install/platform/command_line.h"
+#include "install/platform/encoding.h"
 #include "install/platform/text.h"
 
 namespace kz7 {
@@ -64,7 +65,7 @@ private:
         const auto takeLine = [&](std::string_view line) {
             hasEnded = hasEnded || (isEnding_ && line == kEndLine);
             if (!hasEnded && !line.empty()) {
-                take_(line);
+                take_(textFromNarrow(line));
             }
         };
         FixedBuffer<4096> piece;
@@ -283,7 +284,7 @@ void FrontView::takeEvent(const ProtocolEvent& event) {
 void FrontView::ask(std::string_view text, std::string_view proposal, const Answerer& answer) {
     screen_.showQuestion(text, proposal.empty() ? std::string("Answer, or ABORT: ")
                                                 : "Answer, or ABORT [" + std::string(proposal) + "]: ");
-    FixedBuffer<kMaxAnswer> line;
+    TextBuffer<kMaxAnswer> line;
     const Status status = ports_.terminal.readLine(line);
     if (status == kOperationAborted) {
         screen_.showAnswer("");  // the program has ended: no answer reaches it
@@ -367,7 +368,9 @@ public:
 
 private:
     void takeLine(std::string_view line) {
-        view_.takeLine(line, [this](std::string_view answer) { ports_.processes.write(answersWrite_.get(), answer); });
+        view_.takeLine(line, [this](std::string_view answer) {
+            ports_.processes.write(answersWrite_.get(), narrowFromText(answer));
+        });
     }
 
     void waitForEnd() {

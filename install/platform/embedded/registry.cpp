@@ -490,9 +490,10 @@ Status EmbeddedRegistry::queryValue(KeyHandle key, std::string_view name, ValueT
     if (result != SQLITE_ROW) {
         return result == SQLITE_DONE ? kFileNotFound : fail(result);
     }
-    status = giveBytes(get.bytes(1), data);
+    const auto found = static_cast<ValueType>(get.number(0));
+    status = giveData(found, get.bytes(1), data);
     if (status == kSuccess && type != nullptr) {
-        *type = static_cast<ValueType>(get.number(0));
+        *type = found;
     }
     return status;
 }
@@ -672,9 +673,10 @@ Status EmbeddedRegistry::enumerateValue(KeyHandle key, std::uint32_t index, Buff
     }
     values = {index, next.number(0), {}, 0};
     const Status named = giveName(next.bytes(1), name);
-    const Status given = giveBytes(next.bytes(3), *data);
+    const auto found = static_cast<ValueType>(next.number(2));
+    const Status given = giveData(found, next.bytes(3), *data);
     if (named == kSuccess && given == kSuccess && type != nullptr) {
-        *type = static_cast<ValueType>(next.number(2));
+        *type = found;
     }
     return named != kSuccess ? named : given;
 }

@@ -98,7 +98,7 @@ KZ7_INTERCEPTED(InterceptedServices, IServiceManager, "services",
     KZ7_2(openManager) KZ7_3(createService) KZ7_4(openService) KZ7_2(changeStartType) KZ7_1(startService)
     KZ7_1(stopService) KZ7_2(queryState) KZ7_1(deleteService) KZ7_1(closeHandle))
 KZ7_INTERCEPTED(InterceptedConsole, IConsole, "console",
-    KZ7_1(writeOutput) KZ7_1(writeError) KZ7_0(flush))
+    KZ7_1(writeOutput) KZ7_1(writeError) KZ7_1(writeDocument) KZ7_0(flush))
 KZ7_INTERCEPTED(InterceptedFiles, IFileSystem, "files",
     KZ7_1(probe) KZ7_2(readFile) KZ7_3(writeFile) KZ7_2(openForAppend) KZ7_3(write) KZ7_1(closeFile) KZ7_2(findFile) KZ7_2(productPath)
     KZ7_1(shownPath))

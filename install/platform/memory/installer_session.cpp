@@ -2,6 +2,8 @@
 
 #include <algorithm>
 
+#include "install/platform/registry_path.h"
+
 namespace kz7 {
 
 namespace {
@@ -12,13 +14,9 @@ constexpr std::size_t kBeforeExecution = static_cast<std::size_t>(-1);
 // A text with its NUL where it fits; else its size times a factor.
 Status giveText(std::string_view text, Buffer& room, std::uint32_t hintFactor) {
     const auto length = static_cast<std::uint32_t>(text.size());
-    if (length >= room.capacity) {
-        room.size = length * hintFactor;
-        return kMoreData;
-    }
-    room.data[text.copy(room.data, length)] = '\0';
-    room.size = length;
-    return kSuccess;
+    const Status status = giveName(text, room);
+    room.size = status == kMoreData ? length * hintFactor : length;
+    return status;
 }
 
 }  // namespace

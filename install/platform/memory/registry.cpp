@@ -135,7 +135,7 @@ Status MemoryRegistry::queryValue(KeyHandle key, std::string_view name, ValueTyp
     if (found == node->byName.end()) {
         return kFileNotFound;
     }
-    const Status status = giveBytes(found->second.data, data);
+    const Status status = giveData(found->second.type, found->second.data, data);
     if (status == kSuccess && type != nullptr) {
         *type = found->second.type;
     }
@@ -198,7 +198,7 @@ Status MemoryRegistry::enumerateValue(KeyHandle key, std::uint32_t index, Buffer
     }
     const Value& value = *node->inOrder[index];
     const Status named = giveName(value.name, name);
-    const Status given = data == nullptr ? kSuccess : giveBytes(value.data, *data);
+    const Status given = data == nullptr ? kSuccess : giveData(value.type, value.data, *data);
     if (named == kSuccess && given == kSuccess && type != nullptr) {
         *type = value.type;
     }

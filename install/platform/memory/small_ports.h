@@ -72,7 +72,7 @@ public:
         const std::size_t end = std::min(input.find('\n'), input.size());
         std::string_view text(input.data(), end);
         text.remove_suffix(text.ends_with('\r') ? 1 : 0);
-        line.size = static_cast<std::uint32_t>(text.copy(line.data, line.capacity));
+        line.size = static_cast<std::uint32_t>(cutText(text, line.limit).copy(line.data, line.capacity));
         input.erase(0, end + 1);
         return kSuccess;
     }

@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "install/platform/windows/paths.h"
+#include "install/platform/windows/wide_text.h"
 
 namespace kz7 {
 namespace {
@@ -56,14 +57,13 @@ private:
 class Fusion {
 public:
     explicit Fusion(const Generation& generation) {
-        char windows[MAX_PATH] = {};
-        const UINT length = GetSystemWindowsDirectoryA(windows, MAX_PATH);
-        if (length == 0 || length >= MAX_PATH) {
+        const std::string windows =
+            textOf([](wchar_t* room, DWORD size) { return GetSystemWindowsDirectoryW(room, size); });
+        if (windows.empty()) {
             return;
         }
-        const std::string path =
-            std::string(windows) + "\\Microsoft.NET\\Framework64\\" + generation.folder + "\\fusion.dll";
-        library_ = LoadLibraryExA(path.c_str(), nullptr, LOAD_WITH_ALTERED_SEARCH_PATH);
+        const std::string path = windows + "\\Microsoft.NET\\Framework64\\" + generation.folder + "\\fusion.dll";
+        library_ = LoadLibraryExW(WideText(path).c_str(), nullptr, LOAD_WITH_ALTERED_SEARCH_PATH);
     }
     Fusion(const Fusion&) = delete;
     Fusion& operator=(const Fusion&) = delete;
@@ -101,14 +101,6 @@ private:
 
     HMODULE library_ = nullptr;
 };
-
-std::wstring wide(std::string_view text) {
-    const int size = static_cast<int>(text.size());
-    std::wstring result(text.size(), L'\0');
-    result.resize(static_cast<std::size_t>(
-        MultiByteToWideChar(CP_ACP, 0, text.data(), size, result.data(), static_cast<int>(result.size()))));
-    return result;
-}
 
 // Whether a cached assembly is a provider of that level: version 9.1.0.x is of the level 9.1.0.
 bool isProvider(IAssemblyName& assembly, const std::wstring& level) {
@@ -158,17 +150,17 @@ std::vector<std::wstring> providerFiles(std::string_view location) {
     if (!isAbsolutePath(folder)) {
         return files;
     }
-    WIN32_FIND_DATAA found;
-    const HANDLE opened = FindFirstFileA((folder + "kz7nmp*.dll").c_str(), &found);
+    WIN32_FIND_DATAW found;
+    const HANDLE opened = FindFirstFileW(WideText(folder + "kz7nmp*.dll").c_str(), &found);
     if (opened == INVALID_HANDLE_VALUE) {
         return files;
     }
     const std::unique_ptr<void, decltype(&FindClose)> search(opened, FindClose);
     do {
         if ((found.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) == 0) {
-            files.push_back(wide(folder + found.cFileName));
+            files.push_back(WideText(folder).c_str() + std::wstring(found.cFileName));
         }
-    } while (FindNextFileA(search.get(), &found) != 0);
+    } while (FindNextFileW(search.get(), &found) != 0);
     return files;
 }
 
@@ -195,7 +187,7 @@ Status WindowsAssemblyCache::deregisterProviders(std::string_view level) {
         ComPointer<::IAssemblyCache> cache;
         std::vector<std::wstring> names;
         keepFirst(result, fusion.openCache(cache));
-        keepFirst(result, listProviders(fusion, wide(level), names));
+        keepFirst(result, listProviders(fusion, WideText(level).c_str(), names));
         for (const std::wstring& name : names) {
             keepFirst(result, cache == nullptr ? kSuccess : uninstall(*cache, name));
         }

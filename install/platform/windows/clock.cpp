@@ -2,6 +2,9 @@
 
 #include <ctime>
 
+#include "install/platform/encoding.h"
+#include "install/platform/registry_path.h"
+
 namespace kz7 {
 
 Status WindowsHost::localTime(TimeText form, Buffer& text) {
@@ -10,7 +13,11 @@ Status WindowsHost::localTime(TimeText form, Buffer& text) {
     if (localtime_s(&parts, &now) != 0) {
         return kGeneralFailure;
     }
-    return giveTime(parts, form, text);
+    char room[256];
+    Buffer narrow(room, sizeof room);
+    const Status status = giveTime(parts, form, narrow);
+    // The time zone has a name in the language of the machine.
+    return status == kSuccess ? giveName(textFromNarrow(narrow.view()), text) : status;
 }
 
 }  // namespace kz7

@@ -6,6 +6,7 @@
 #include <string>
 
 #include "install/platform/shown_text.h"
+#include "install/platform/windows/wide_text.h"
 
 namespace kz7 {
 
@@ -15,7 +16,7 @@ WindowsDebugOutput::WindowsDebugOutput(IConsole& console) : console_(console) {
 }
 
 void WindowsDebugOutput::write(std::string_view text) {
-    OutputDebugStringA(std::string(text).c_str());
+    OutputDebugStringW(WideText(text).c_str());
     if (shown_) {
         console_.writeError("debug: " + shownText(text) + "\n");
     }

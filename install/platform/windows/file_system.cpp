@@ -9,6 +9,7 @@
 #include <string>
 
 #include "install/platform/windows/paths.h"
+#include "install/platform/windows/wide_text.h"
 
 namespace kz7 {
 namespace {
@@ -41,7 +42,7 @@ std::string randomName(std::string_view folder) {
 }
 
 Status checkTarget(const std::string& path, bool replace) {
-    const DWORD found = GetFileAttributesA(path.c_str());
+    const DWORD found = GetFileAttributesW(WideText(path).c_str());
     if (found == INVALID_FILE_ATTRIBUTES) {
         return kSuccess;
     }
@@ -56,7 +57,7 @@ Status WindowsFileSystem::probe(std::string_view path) {
     if (namesNothing(path)) {
         return kFileNotFound;
     }
-    if (_access(std::string(path).c_str(), 0) == 0) {
+    if (_waccess(WideText(path).c_str(), 0) == 0) {
         return kSuccess;
     }
     return errno == EACCES ? kAccessDenied : kFileNotFound;
@@ -66,8 +67,8 @@ Status WindowsFileSystem::readFile(std::string_view path, std::string& content) 
     if (namesNothing(path)) {
         return kFileNotFound;
     }
-    const HANDLE file = CreateFileA(std::string(path).c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_WRITE,
-                                    nullptr, OPEN_EXISTING, FILE_ATTRIBUTE_NORMAL, nullptr);
+    const HANDLE file = CreateFileW(WideText(path).c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr,
+                                    OPEN_EXISTING, FILE_ATTRIBUTE_NORMAL, nullptr);
     if (file == INVALID_HANDLE_VALUE) {
         return GetLastError() == ERROR_PATH_NOT_FOUND ? kFileNotFound : GetLastError();
     }
@@ -95,8 +96,8 @@ Status WindowsFileSystem::openForAppend(std::string_view path, FileHandle& file)
         return kFileNotFound;
     }
     const HANDLE opened =
-        CreateFileA(std::string(path).c_str(), FILE_APPEND_DATA, FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr,
-                    OPEN_ALWAYS, FILE_ATTRIBUTE_NORMAL | FILE_FLAG_OPEN_REPARSE_POINT, nullptr);
+        CreateFileW(WideText(path).c_str(), FILE_APPEND_DATA, FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr, OPEN_ALWAYS,
+                    FILE_ATTRIBUTE_NORMAL | FILE_FLAG_OPEN_REPARSE_POINT, nullptr);
     if (opened == INVALID_HANDLE_VALUE) {
         return GetLastError();
     }
@@ -130,8 +131,8 @@ Status WindowsFileSystem::writeFile(std::string_view path, std::string_view cont
     if (const Status status = checkTarget(target, replace); status != kSuccess || unfinished.empty()) {
         return status != kSuccess ? status : kGeneralFailure;
     }
-    const HANDLE opened =
-        CreateFileA(unfinished.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_NEW, FILE_ATTRIBUTE_NORMAL, nullptr);
+    const HANDLE opened = CreateFileW(WideText(unfinished).c_str(), GENERIC_WRITE, 0, nullptr, CREATE_NEW,
+                                      FILE_ATTRIBUTE_NORMAL, nullptr);
     if (opened == INVALID_HANDLE_VALUE) {
         return GetLastError();
     }
@@ -148,11 +149,11 @@ Status WindowsFileSystem::writeFile(std::string_view path, std::string_view cont
     }
     file.reset();
     const DWORD how = MOVEFILE_WRITE_THROUGH | (replace ? DWORD{MOVEFILE_REPLACE_EXISTING} : 0);
-    if (status == kSuccess && MoveFileExA(unfinished.c_str(), target.c_str(), how) == FALSE) {
+    if (status == kSuccess && MoveFileExW(WideText(unfinished).c_str(), WideText(target).c_str(), how) == FALSE) {
         status = GetLastError() == ERROR_ALREADY_EXISTS ? kFileExists : GetLastError();
     }
     if (status != kSuccess) {
-        DeleteFileA(unfinished.c_str());
+        DeleteFileW(WideText(unfinished).c_str());
     }
     return status;
 }
@@ -162,18 +163,19 @@ Status WindowsFileSystem::findFile(std::string_view pattern, std::string& name) 
         return kFileNotFound;
     }
     const std::string_view names = pattern.substr(pattern.find_last_of("\\/:") + 1);
-    WIN32_FIND_DATAA found{};
-    const HANDLE search = FindFirstFileA(std::string(pattern).c_str(), &found);
+    WIN32_FIND_DATAW found{};
+    const HANDLE search = FindFirstFileW(WideText(pattern).c_str(), &found);
     if (search == INVALID_HANDLE_VALUE) {
         return GetLastError() == ERROR_PATH_NOT_FOUND ? kFileNotFound : GetLastError();
     }
     // The system's '?' also stands for no character at all.
     std::string first;
     do {
-        if (fitsPattern(found.cFileName, names) && (first.empty() || found.cFileName < first)) {
-            first = found.cFileName;
+        const std::string each = textFromWide(found.cFileName);
+        if (fitsPattern(each, names) && (first.empty() || each < first)) {
+            first = each;
         }
-    } while (FindNextFileA(search, &found) != FALSE);
+    } while (FindNextFileW(search, &found) != FALSE);
     FindClose(search);
     if (first.empty()) {
         return kFileNotFound;
@@ -183,10 +185,9 @@ Status WindowsFileSystem::findFile(std::string_view pattern, std::string& name) 
 }
 
 Status WindowsFileSystem::productPath(std::string_view hostPath, std::string& path) {
-    const std::string given(hostPath);
-    std::string whole(GetFullPathNameA(given.c_str(), 0, nullptr, nullptr), '\0');
-    const DWORD length = GetFullPathNameA(given.c_str(), static_cast<DWORD>(whole.size()), whole.data(), nullptr);
-    whole.resize(length < whole.size() ? length : 0);
+    const WideText given(hostPath);
+    std::string whole =
+        textOf([&](wchar_t* room, DWORD size) { return GetFullPathNameW(given.c_str(), size, room, nullptr); });
     if (namesNothing(whole)) {
         return kInvalidName;
     }

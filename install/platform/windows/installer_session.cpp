@@ -5,10 +5,16 @@
 #include <msi.h>
 #include <msiquery.h>
 
+#include <algorithm>
 #include <string>
+
+#include "install/platform/registry_path.h"
+#include "install/platform/windows/wide_text.h"
 
 namespace kz7 {
 namespace {
+
+constexpr std::size_t kFirstRoom = 1024;
 
 MSIHANDLE native(SessionHandle handle) {
     return static_cast<MSIHANDLE>(handle);
@@ -23,6 +29,24 @@ Status giveHandle(MSIHANDLE given, Status none, SessionHandle& handle) {
     return kSuccess;
 }
 
+// The text of a call that fills a room of a size, both in characters, or gives the size that is missing; that may be
+// twice the true one.
+template <typename Call>
+Status readText(Buffer& text, Call call) {
+    std::wstring room(kFirstRoom, L'\0');
+    for (;;) {
+        auto size = static_cast<DWORD>(room.size());
+        const UINT status = call(room.data(), &size);
+        if (status == ERROR_SUCCESS) {
+            return giveName(textFromWide(std::wstring_view(room).substr(0, size)), text);
+        }
+        if (status != ERROR_MORE_DATA) {
+            return status;
+        }
+        room.resize(std::max<std::size_t>(2 * room.size(), std::size_t{size} + 1));
+    }
+}
+
 }  // namespace
 
 Status WindowsInstallerSession::runMode(RunMode mode, bool& isOn) {
@@ -31,23 +55,20 @@ Status WindowsInstallerSession::runMode(RunMode mode, bool& isOn) {
 }
 
 Status WindowsInstallerSession::getProperty(std::string_view name, Buffer& value) {
-    DWORD length = value.capacity;
-    const UINT status = MsiGetPropertyA(installation_, std::string(name).c_str(), value.data, &length);
-    if (status == ERROR_SUCCESS || status == ERROR_MORE_DATA) {
-        value.size = length;
-    }
-    return status;
+    const WideText wide(name);
+    return readText(
+        value, [&](wchar_t* room, DWORD* size) { return MsiGetPropertyW(installation_, wide.c_str(), room, size); });
 }
 
 Status WindowsInstallerSession::setProperty(std::string_view name, std::string_view value) {
-    return MsiSetPropertyA(installation_, std::string(name).c_str(), std::string(value).c_str());
+    return MsiSetPropertyW(installation_, WideText(name).c_str(), WideText(value).c_str());
 }
 
 Status WindowsInstallerSession::featureState(std::string_view feature, FeatureState& installed,
                                              FeatureState& requested) {
     INSTALLSTATE is = INSTALLSTATE_UNKNOWN;
     INSTALLSTATE toBe = INSTALLSTATE_UNKNOWN;
-    const UINT status = MsiGetFeatureStateA(installation_, std::string(feature).c_str(), &is, &toBe);
+    const UINT status = MsiGetFeatureStateW(installation_, WideText(feature).c_str(), &is, &toBe);
     if (status == ERROR_SUCCESS) {
         installed = static_cast<FeatureState>(is);
         requested = static_cast<FeatureState>(toBe);
@@ -56,7 +77,7 @@ Status WindowsInstallerSession::featureState(std::string_view feature, FeatureSt
 }
 
 Status WindowsInstallerSession::doAction(std::string_view name) {
-    return MsiDoActionA(installation_, std::string(name).c_str());
+    return MsiDoActionW(installation_, WideText(name).c_str());
 }
 
 Status WindowsInstallerSession::activeDatabase(SessionHandle& database) {
@@ -65,7 +86,7 @@ Status WindowsInstallerSession::activeDatabase(SessionHandle& database) {
 
 Status WindowsInstallerSession::openView(SessionHandle database, std::string_view query, SessionHandle& view) {
     MSIHANDLE opened = 0;
-    const UINT status = MsiDatabaseOpenViewA(native(database), std::string(query).c_str(), &opened);
+    const UINT status = MsiDatabaseOpenViewW(native(database), WideText(query).c_str(), &opened);
     return status != ERROR_SUCCESS ? status : giveHandle(opened, kInvalidHandle, view);
 }
 
@@ -80,14 +101,8 @@ Status WindowsInstallerSession::fetchRecord(SessionHandle view, SessionHandle& r
 }
 
 Status WindowsInstallerSession::recordString(SessionHandle record, std::uint32_t field, Buffer& text) {
-    DWORD length = text.capacity;
-    // Without a buffer the installer takes any room to be enough.
-    char none = '\0';
-    const UINT status = MsiRecordGetStringA(native(record), field, text.data != nullptr ? text.data : &none, &length);
-    if (status == ERROR_SUCCESS || status == ERROR_MORE_DATA) {
-        text.size = length;
-    }
-    return status;
+    return readText(text,
+                    [&](wchar_t* room, DWORD* size) { return MsiRecordGetStringW(native(record), field, room, size); });
 }
 
 Status WindowsInstallerSession::createRecord(std::uint32_t fields, SessionHandle& record) {
@@ -95,7 +110,7 @@ Status WindowsInstallerSession::createRecord(std::uint32_t fields, SessionHandle
 }
 
 Status WindowsInstallerSession::setRecordString(SessionHandle record, std::uint32_t field, std::string_view text) {
-    return MsiRecordSetStringA(native(record), field, std::string(text).c_str());
+    return MsiRecordSetStringW(native(record), field, WideText(text).c_str());
 }
 
 Status WindowsInstallerSession::processMessage(std::uint32_t kind, SessionHandle record, std::int32_t& answer) {

@@ -6,6 +6,7 @@
 #include <string>
 
 #include "install/platform/windows/paths.h"
+#include "install/platform/windows/wide_text.h"
 
 namespace kz7 {
 namespace {
@@ -26,7 +27,7 @@ Status WindowsLibraryLoader::load(std::string_view path, LibraryHandle& library)
     if (!isAbsolutePath(path)) {
         return kModuleNotFound;
     }
-    const HMODULE module = LoadLibraryExA(std::string(path).c_str(), nullptr, LOAD_WITH_ALTERED_SEARCH_PATH);
+    const HMODULE module = LoadLibraryExW(WideText(path).c_str(), nullptr, LOAD_WITH_ALTERED_SEARCH_PATH);
     if (module == nullptr) {
         return kModuleNotFound;
     }

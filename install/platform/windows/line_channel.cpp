@@ -5,13 +5,22 @@
 #include <windows.h>
 
 #include <cstdio>
+#include <string>
+
+#include "install/platform/encoding.h"
 
 namespace kz7 {
 
 Status WindowsTerminal::readLine(Buffer& line) {
     reader_ = GetCurrentThreadId();
-    const Status status = ended_ ? kOperationAborted : readLineOf([] { return std::getc(stdin); }, line);
+    std::string room(line.capacity, '\0');
+    Buffer narrow(room.data(), line.capacity, line.limit);
+    const Status status = ended_ ? kOperationAborted : readLineOf([] { return std::getc(stdin); }, narrow);
     reader_ = 0;
+    if (status == kSuccess) {
+        const std::string text = textFromNarrow(narrow.view());
+        line.size = static_cast<std::uint32_t>(cutText(text, line.limit).copy(line.data, line.capacity));
+    }
     return ended_ ? kOperationAborted : status;
 }
 

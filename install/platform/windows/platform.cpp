@@ -8,6 +8,7 @@
 #include <cstdio>
 
 #include "install/platform/windows/assembly_cache.h"
+#include "install/platform/windows/console.h"
 #include "install/platform/windows/debug_output.h"
 #include "install/platform/windows/file_system.h"
 #include "install/platform/windows/host_information.h"
@@ -17,6 +18,7 @@
 #include "install/platform/windows/services.h"
 #include "install/platform/windows/terminal.h"
 #include "install/platform/windows/threads.h"
+#include "install/platform/windows/wide_text.h"
 
 namespace kz7 {
 namespace {
@@ -24,17 +26,17 @@ namespace {
 class WindowsPlatform final : public IPlatform {
 public:
     WindowsPlatform() {
-        ports_ = {&registry_, &services_,  console_.get(), &debugOutput_, &files_,   &processes_,
-                  &threads_,  &libraries_, &assemblies_,   &host_,        &terminal_};
+        ports_ = {&registry_, &services_,  &console_,    &debugOutput_, &files_,   &processes_,
+                  &threads_,  &libraries_, &assemblies_, &host_,        &terminal_};
     }
 
     // The caller's own, so that nobody else can have put something in its place.
     Status ownFolder(std::string& path) override {
-        char folder[MAX_PATH];
-        const DWORD length = GetEnvironmentVariableA("LOCALAPPDATA", folder, sizeof folder);
-        const std::string own = std::string(folder, length < sizeof folder ? length : 0) + "\\KZ7";
-        if (length == 0 ||
-            (CreateDirectoryA(own.c_str(), nullptr) == FALSE && GetLastError() != ERROR_ALREADY_EXISTS)) {
+        const std::string folder =
+            textOf([](wchar_t* room, DWORD size) { return GetEnvironmentVariableW(L"LOCALAPPDATA", room, size); });
+        const std::string own = folder + "\\KZ7";
+        if (folder.empty() ||
+            (CreateDirectoryW(WideText(own).c_str(), nullptr) == FALSE && GetLastError() != ERROR_ALREADY_EXISTS)) {
             return kPathNotFound;
         }
         return files_.productPath(own, path);
@@ -43,8 +45,8 @@ public:
     bool storeIsOwn() override { return false; }
 
 private:
-    std::unique_ptr<IConsole> console_ = standardConsole();
-    WindowsDebugOutput debugOutput_{*console_};
+    WindowsConsole console_;
+    WindowsDebugOutput debugOutput_{console_};
     WindowsFileSystem files_;
     WindowsRegistry registry_;
     WindowsServiceManager services_;
@@ -61,7 +63,7 @@ private:
 std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options) {
     if (options.ownProcess) {
         // Libraries that the system loads for itself are not taken from the current folder either.
-        SetDllDirectoryA("");
+        SetDllDirectoryW(L"");
     }
     if (options.plainStreams) {
         _setmode(_fileno(stdin), _O_BINARY);

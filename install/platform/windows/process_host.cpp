@@ -7,7 +7,9 @@
 #include <vector>
 
 #include "install/platform/command_line.h"
+#include "install/platform/registry_path.h"
 #include "install/platform/windows/paths.h"
+#include "install/platform/windows/wide_text.h"
 
 namespace kz7 {
 namespace {
@@ -52,11 +54,7 @@ std::wstring absoluteFolders(std::wstring_view path) {
     std::wstring kept;
     while (!path.empty()) {
         const std::wstring folder = takeFolder(path);
-        std::string begin;
-        for (const wchar_t c : folder.substr(0, 3)) {
-            begin += c < 0x80 ? static_cast<char>(c) : '?';
-        }
-        if (isAbsolutePath(begin) && folder.find(L';') == std::wstring::npos) {
+        if (isAbsolutePath(textFromWide(folder.substr(0, 3))) && folder.find(L';') == std::wstring::npos) {
             kept += folder + L';';
         }
     }
@@ -100,18 +98,14 @@ private:
 
 // Whether the system finds the program by its bare name: beside this program, in its own folders or along the path.
 bool isFoundByName(std::string_view program) {
-    char folder[MAX_PATH] = {};
-    std::string folders;
-    GetModuleFileNameA(nullptr, folder, MAX_PATH);
-    folders.append(folder, std::string_view(folder).find_last_of('\\'));
-    for (const auto systemFolder : {GetSystemDirectoryA, GetWindowsDirectoryA}) {
-        systemFolder(folder, MAX_PATH);
-        folders.append(";").append(folder);
+    const std::string own = textOf([](wchar_t* room, DWORD size) { return GetModuleFileNameW(nullptr, room, size); });
+    std::string folders = own.substr(0, own.find_last_of('\\'));
+    for (const auto systemFolder : {GetSystemDirectoryW, GetWindowsDirectoryW}) {
+        folders.append(";").append(textOf(systemFolder));
     }
-    std::string path(GetEnvironmentVariableA("PATH", nullptr, 0), '\0');
-    path.resize(GetEnvironmentVariableA("PATH", path.data(), static_cast<DWORD>(path.size())));
-    folders.append(";").append(path);
-    return SearchPathA(folders.c_str(), std::string(program).c_str(), ".exe", 0, nullptr, nullptr) != 0;
+    folders.append(";").append(
+        textOf([](wchar_t* room, DWORD size) { return GetEnvironmentVariableW(L"PATH", room, size); }));
+    return SearchPathW(WideText(folders).c_str(), WideText(program).c_str(), L".exe", 0, nullptr, nullptr) != 0;
 }
 
 // Whether the reading that the system would settle for hangs on the current folder or drive. It takes the first of
@@ -193,18 +187,18 @@ Status WindowsProcessHost::startProcess(const ProcessStart& start, ProcessInform
     if (!directory.empty() && !isAbsolutePath(directory)) {
         return kBadDirectory;
     }
-    STARTUPINFOA startup{};
+    STARTUPINFOW startup{};
     startup.cb = sizeof startup;
     startup.dwFlags = STARTF_USESTDHANDLES | STARTF_USESHOWWINDOW;
     startup.wShowWindow = SW_HIDE;
     startup.hStdInput = native(start.input);
     startup.hStdOutput = native(start.output);
     startup.hStdError = native(start.error);
-    std::string commandLine(start.commandLine);  // the call writes into it
+    WideText commandLine(start.commandLine);  // the call writes into it
     PROCESS_INFORMATION information{};
-    const Status status = judged(CreateProcessA(
+    const Status status = judged(CreateProcessW(
         nullptr, commandLine.data(), nullptr, nullptr, TRUE, NORMAL_PRIORITY_CLASS | CREATE_UNICODE_ENVIRONMENT,
-        search.environment(), directory.empty() ? nullptr : directory.c_str(), &startup, &information));
+        search.environment(), directory.empty() ? nullptr : WideText(directory).c_str(), &startup, &information));
     if (status == kSuccess) {
         started = {portHandle<ProcessHandle>(information.hProcess), portHandle<ProcessHandle>(information.hThread),
                    information.dwProcessId, information.dwThreadId};
@@ -237,13 +231,14 @@ Status WindowsProcessHost::closeProcess(ProcessHandle process) {
 }
 
 Status WindowsProcessHost::shortPath(std::string_view path, Buffer& shortened) {
-    const std::string text(path);
-    const DWORD length = GetShortPathNameA(text.c_str(), shortened.data, shortened.capacity);
-    if (length == 0) {
-        return GetLastError();
-    }
-    shortened.size = length;
-    return length < shortened.capacity ? kSuccess : kMoreData;
+    const WideText wide(path);
+    DWORD error = kSuccess;
+    const std::string found = textOf([&](wchar_t* room, DWORD size) {
+        const DWORD length = GetShortPathNameW(wide.c_str(), room, size);
+        error = length == 0 ? GetLastError() : kSuccess;
+        return length;
+    });
+    return error != kSuccess ? error : giveName(found, shortened);
 }
 
 }  // namespace kz7

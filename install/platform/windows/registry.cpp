@@ -6,6 +6,7 @@
 #include <string>
 
 #include "install/platform/registry_path.h"
+#include "install/platform/windows/wide_text.h"
 
 namespace kz7 {
 namespace {
@@ -29,25 +30,24 @@ Status statusOf(LSTATUS result) {
 
 constexpr AccessMask kViewBits = kKeyView64 | kKeyView32;
 
-// The narrow calls put a path into a room of 261 characters for each thread; more answers kMoreData.
-constexpr std::size_t kCallPath = 260;
+// A call makes 32 keys at most; a path of so many names, or bytes, goes to the call in pieces.
+constexpr std::size_t kCallNames = 32;
+constexpr std::size_t kCallBytes = 1024;
 
-// The last separator that leaves a path short enough for a call; it is no second half of a character.
+// The last separator that leaves a path short enough for a call; 0 where all of it is, or no separator does.
 std::size_t lastCut(std::string_view path) {
     std::size_t cut = 0;
-    for (std::size_t at = 0; at <= kCallPath; at += IsDBCSLeadByte(static_cast<BYTE>(path[at])) ? 2 : 1) {
+    std::size_t names = 0;
+    for (std::size_t at = 0; at < path.size(); ++at) {
+        if (at == kCallBytes || names == kCallNames) {
+            return cut;
+        }
         if (path[at] == '\\') {
             cut = at;
+            ++names;
         }
     }
-    return cut;
-}
-
-// Where a call writes bytes. A buffer of no capacity still has an address: without one the call would take the
-// question for the size alone and succeed.
-BYTE* addressOf(Buffer& buffer) {
-    static BYTE nowhere;
-    return buffer.capacity == 0 ? &nowhere : reinterpret_cast<BYTE*>(buffer.data);
+    return 0;
 }
 
 }  // namespace
@@ -57,11 +57,7 @@ Status WindowsRegistry::shorten(KeyHandle& parent, std::string_view& path, Acces
     if (const Status status = checkKeyPath(path); status != kSuccess) {
         return status;
     }
-    while (path.size() > kCallPath) {
-        const std::size_t cut = lastCut(path);
-        if (cut == 0) {
-            return kInvalidParameter;
-        }
+    for (std::size_t cut = 0; (cut = lastCut(path)) != 0;) {
         const std::string_view first = path.substr(0, cut);
         const AccessMask access = MAXIMUM_ALLOWED | (view & kViewBits);
         OwnedKey next(*this);
@@ -83,7 +79,7 @@ Status WindowsRegistry::openKey(KeyHandle parent, std::string_view path, AccessM
         return status;
     }
     HKEY opened = nullptr;
-    const Status status = statusOf(RegOpenKeyExA(native(parent), std::string(path).c_str(), 0, access, &opened));
+    const Status status = statusOf(RegOpenKeyExW(native(parent), WideText(path).c_str(), 0, access, &opened));
     if (status == kSuccess) {
         key = fromNative(opened);
     }
@@ -97,9 +93,9 @@ Status WindowsRegistry::createKey(KeyHandle parent, std::string_view path, std::
         return status;
     }
     HKEY made = nullptr;
-    std::string named(keyClass);
+    WideText named(keyClass);
     const Status status =
-        statusOf(RegCreateKeyExA(native(parent), std::string(path).c_str(), 0, named.empty() ? nullptr : named.data(),
+        statusOf(RegCreateKeyExW(native(parent), WideText(path).c_str(), 0, keyClass.empty() ? nullptr : named.data(),
                                  REG_OPTION_NON_VOLATILE, access, nullptr, &made, nullptr));
     if (status == kSuccess) {
         key = fromNative(made);
@@ -115,15 +111,38 @@ Status WindowsRegistry::queryValue(KeyHandle key, std::string_view name, ValueTy
     if (const Status status = checkValueName(name); status != kSuccess) {
         return status;
     }
+    const WideText wide(name);
     DWORD found = 0;
-    DWORD size = data.capacity;
-    const Status status =
-        statusOf(RegQueryValueExA(native(key), std::string(name).c_str(), nullptr, &found, addressOf(data), &size));
-    if (status == kSuccess || status == kMoreData) {
-        data.size = size;
+    DWORD size = 0;
+    const Status status = readData(
+        [&] { return RegQueryValueExW(native(key), wide.c_str(), nullptr, &found, room_.data(), &size); }, size);
+    return status == kSuccess ? giveValue(found, size, type, data) : status;
+}
+
+// Reads data into room of our own, whatever room was lent: only from all of a text is its size in UTF-8 known.
+template <typename Call>
+Status WindowsRegistry::readData(Call call, DWORD& size) {
+    for (;;) {
+        size = static_cast<DWORD>(room_.size());
+        const Status status = statusOf(call());
+        if (status != kMoreData) {
+            return status;
+        }
+        room_.resize(std::max<std::size_t>(2 * room_.size(), size));
     }
+}
+
+Status WindowsRegistry::giveValue(std::uint32_t nativeType, std::uint32_t size, ValueType* type, Buffer& data) {
+    const auto found = static_cast<ValueType>(nativeType);
+    const std::string_view bytes(reinterpret_cast<const char*>(room_.data()), size);
+    // Half a character at the end of a text of odd length is left out.
+    const Status status =
+        isTextType(found)
+            ? giveData(found, textFromWide({reinterpret_cast<const wchar_t*>(bytes.data()), size / sizeof(wchar_t)}),
+                       data)
+            : giveData(found, bytes, data);
     if (status == kSuccess && type != nullptr) {
-        *type = static_cast<ValueType>(found);
+        *type = found;
     }
     return status;
 }
@@ -132,50 +151,63 @@ Status WindowsRegistry::setValue(KeyHandle key, std::string_view name, ValueType
     if (const Status status = checkValueName(name); status != kSuccess) {
         return status;
     }
+    std::string bytes(data);
+    if (isTextType(type)) {
+        const std::u16string text = utf16FromText(data);
+        bytes.assign(reinterpret_cast<const char*>(text.data()), text.size() * sizeof(char16_t));
+    }
+    const auto size = static_cast<DWORD>(bytes.size());
     // The call stores a NUL that it finds behind a text without one: here it finds none.
-    const std::string guarded = std::string(data) + '\1';
-    return statusOf(RegSetValueExA(native(key), std::string(name).c_str(), 0, static_cast<DWORD>(type),
-                                   reinterpret_cast<const BYTE*>(guarded.data()), static_cast<DWORD>(data.size())));
+    bytes += "\1\1";
+    return statusOf(RegSetValueExW(native(key), WideText(name).c_str(), 0, static_cast<DWORD>(type),
+                                   reinterpret_cast<const BYTE*>(bytes.data()), size));
 }
 
 Status WindowsRegistry::deleteValue(KeyHandle key, std::string_view name) {
     if (const Status status = checkValueName(name); status != kSuccess) {
         return status;
     }
-    return statusOf(RegDeleteValueA(native(key), std::string(name).c_str()));
+    return statusOf(RegDeleteValueW(native(key), WideText(name).c_str()));
 }
 
 // Names are read into room of our own: the calls do not tell how much room a lent one lacks.
 Status WindowsRegistry::enumerateKey(KeyHandle key, std::uint32_t index, Buffer& name, Buffer* keyClass) {
     DWORD nameSize = kNameRoom;
     DWORD classSize = kNameRoom;
-    const Status status = statusOf(RegEnumKeyExA(native(key), index, name_.data(), &nameSize, nullptr,
+    const Status status = statusOf(RegEnumKeyExW(native(key), index, name_.data(), &nameSize, nullptr,
                                                  keyClass == nullptr ? nullptr : class_.data(),
                                                  keyClass == nullptr ? nullptr : &classSize, nullptr));
     if (status != kSuccess) {
         return status;
     }
-    const Status named = giveName({name_.data(), nameSize}, name);
-    const Status classed = keyClass == nullptr ? kSuccess : giveName({class_.data(), classSize}, *keyClass);
+    const Status named = giveName(textFromWide({name_.data(), nameSize}), name);
+    const Status classed =
+        keyClass == nullptr ? kSuccess : giveName(textFromWide({class_.data(), classSize}), *keyClass);
     return named != kSuccess ? named : classed;
 }
 
 Status WindowsRegistry::enumerateValue(KeyHandle key, std::uint32_t index, Buffer& name, ValueType* type,
                                        Buffer* data) {
     DWORD found = 0;
-    DWORD nameSize = kNameRoom;
-    DWORD size = data == nullptr ? 0 : data->capacity;
-    const Status read =
-        statusOf(RegEnumValueA(native(key), index, name_.data(), &nameSize, nullptr, &found,
-                               data == nullptr ? nullptr : addressOf(*data), data == nullptr ? nullptr : &size));
-    if (data != nullptr && (read == kSuccess || read == kMoreData)) {
-        data->size = size;
+    DWORD nameSize = 0;
+    DWORD size = 0;
+    const Status read = readData(
+        [&] {
+            nameSize = kNameRoom;
+            return RegEnumValueW(native(key), index, name_.data(), &nameSize, nullptr, &found,
+                                 data == nullptr ? nullptr : room_.data(), data == nullptr ? nullptr : &size);
+        },
+        size);
+    if (read != kSuccess) {
+        return read;
     }
-    const Status status = read == kSuccess ? giveName({name_.data(), nameSize}, name) : read;
-    if (status == kSuccess && type != nullptr) {
+    ValueType given{};
+    const Status status = data == nullptr ? kSuccess : giveValue(found, size, &given, *data);
+    const Status named = status == kSuccess ? giveName(textFromWide({name_.data(), nameSize}), name) : status;
+    if (named == kSuccess && type != nullptr) {
         *type = static_cast<ValueType>(found);
     }
-    return status;
+    return named;
 }
 
 Status WindowsRegistry::deleteKey(KeyHandle parent, std::string_view path, AccessMask view) {
@@ -183,9 +215,9 @@ Status WindowsRegistry::deleteKey(KeyHandle parent, std::string_view path, Acces
     if (const Status status = shorten(parent, path, view, false, base); status != kSuccess) {
         return status;
     }
-    const std::string named(path);
-    return statusOf(view == 0 ? RegDeleteKeyA(native(parent), named.c_str())
-                              : RegDeleteKeyExA(native(parent), named.c_str(), view, 0));
+    const WideText named(path);
+    return statusOf(view == 0 ? RegDeleteKeyW(native(parent), named.c_str())
+                              : RegDeleteKeyExW(native(parent), named.c_str(), view, 0));
 }
 
 }  // namespace kz7

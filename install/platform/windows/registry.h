@@ -1,7 +1,8 @@
-// The registry port on the Windows registry, narrow calls.
+// The registry port on the Windows registry. Texts are UTF-16 there, names and data of the text types alike.
 #pragma once
 
 #include <array>
+#include <vector>
 
 #include "install/platform/registry_store.h"
 
@@ -28,10 +29,15 @@ private:
     // `base` owns the key where it then starts.
     Status shorten(KeyHandle& parent, std::string_view& path, AccessMask view, bool create, OwnedKey& base);
 
-    // The calls count the room for a name in 16 bits, doubled.
-    static constexpr std::uint32_t kNameRoom = 32767;
-    std::array<char, kNameRoom> name_;
-    std::array<char, kNameRoom> class_;
+    template <typename Call>
+    Status readData(Call call, unsigned long& size);
+    Status giveValue(std::uint32_t nativeType, std::uint32_t size, ValueType* type, Buffer& data);
+
+    static constexpr std::uint32_t kNameRoom = 32767;  // characters
+    static constexpr std::size_t kFirstRoom = 4096;    // bytes
+    std::array<wchar_t, kNameRoom> name_;
+    std::array<wchar_t, kNameRoom> class_;
+    std::vector<unsigned char> room_ = std::vector<unsigned char>(kFirstRoom);
 };
 
 }  // namespace kz7

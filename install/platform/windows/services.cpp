@@ -2,7 +2,7 @@
 
 #include <windows.h>
 
-#include <string>
+#include "install/platform/windows/wide_text.h"
 
 namespace kz7 {
 namespace {
@@ -27,7 +27,7 @@ Status done(BOOL result) {
 }  // namespace
 
 Status WindowsServiceManager::openManager(std::uint32_t access, ServiceHandle& manager) {
-    return opened(OpenSCManagerA(nullptr, nullptr, access), manager);
+    return opened(OpenSCManagerW(nullptr, nullptr, access), manager);
 }
 
 Status WindowsServiceManager::createService(ServiceHandle manager, const ServiceDefinition& definition,
@@ -35,12 +35,11 @@ Status WindowsServiceManager::createService(ServiceHandle manager, const Service
     if (!isServiceName(definition.name)) {
         return kInvalidName;
     }
-    return opened(
-        CreateServiceA(native(manager), std::string(definition.name).c_str(),
-                       std::string(definition.displayName).c_str(), kServiceAllAccess, definition.type,
-                       static_cast<DWORD>(definition.start), definition.errorControl,
-                       std::string(definition.programPath).c_str(), nullptr, nullptr, nullptr, nullptr, nullptr),
-        service);
+    return opened(CreateServiceW(native(manager), WideText(definition.name).c_str(),
+                                 WideText(definition.displayName).c_str(), kServiceAllAccess, definition.type,
+                                 static_cast<DWORD>(definition.start), definition.errorControl,
+                                 WideText(definition.programPath).c_str(), nullptr, nullptr, nullptr, nullptr, nullptr),
+                  service);
 }
 
 Status WindowsServiceManager::openService(ServiceHandle manager, std::string_view name, std::uint32_t access,
@@ -48,16 +47,16 @@ Status WindowsServiceManager::openService(ServiceHandle manager, std::string_vie
     if (!isServiceName(name)) {
         return kInvalidName;
     }
-    return opened(OpenServiceA(native(manager), std::string(name).c_str(), access), service);
+    return opened(OpenServiceW(native(manager), WideText(name).c_str(), access), service);
 }
 
 Status WindowsServiceManager::changeStartType(ServiceHandle service, ServiceStart start) {
-    return done(ChangeServiceConfigA(native(service), SERVICE_NO_CHANGE, static_cast<DWORD>(start), SERVICE_NO_CHANGE,
+    return done(ChangeServiceConfigW(native(service), SERVICE_NO_CHANGE, static_cast<DWORD>(start), SERVICE_NO_CHANGE,
                                      nullptr, nullptr, nullptr, nullptr, nullptr, nullptr, nullptr));
 }
 
 Status WindowsServiceManager::startService(ServiceHandle service) {
-    return done(StartServiceA(native(service), 0, nullptr));
+    return done(StartServiceW(native(service), 0, nullptr));
 }
 
 Status WindowsServiceManager::stopService(ServiceHandle service) {

@@ -1,4 +1,4 @@
-// The service port on the Windows service manager, narrow calls.
+// The service port on the Windows service manager.
 #pragma once
 
 #include "install/platform/service_manager.h"

@@ -8,7 +8,7 @@ namespace kz7 {
 class WindowsThreads final : public IThreads {
 public:
     Status startThread(std::unique_ptr<ThreadStart>& record, std::uint32_t stackBytes, std::uint32_t& id,
-                 ThreadHandle& thread) override;
+                       ThreadHandle& thread) override;
     Status waitThread(ThreadHandle thread) override;
     Status closeThread(ThreadHandle thread) override;
 };

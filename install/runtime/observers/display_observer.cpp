@@ -65,13 +65,12 @@ Status UREDisplayObserverWI::showMessage(UREInfo& info) {
 
 // Right-to-left layout for languages that are written that way.
 std::uint32_t UREDisplayObserverWI::boxDirection() {
-    char language[kPropertySize] = {};
-    std::uint32_t size = sizeof language;
-    const Status status = iMsiGetProperty(at_, kLanguageProperty, language, &size);
+    TextBuffer<kPropertySize> language;
+    const Status status = readProperty(at_, kLanguageProperty, language);
     traceProperty(at_, "iMsiGetProperty", kLanguageProperty, status);
     const bool isRightToLeft =
         status == kSuccess && std::find(std::begin(kRightToLeftLanguages), std::end(kRightToLeftLanguages),
-                                        std::string_view(language)) != std::end(kRightToLeftLanguages);
+                                        language.text()) != std::end(kRightToLeftLanguages);
     return isRightToLeft ? kBoxRightAligned | kBoxRightToLeft : 0;
 }
 

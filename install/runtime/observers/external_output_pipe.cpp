@@ -33,7 +33,7 @@ Status UREExternalOutputPipe::readResponse(char* buffer, std::uint32_t size) {
     if (size == 0) {
         return kFailed;
     }
-    Buffer line(buffer, size - 1);
+    Buffer line(buffer, size - 1, std::min<std::uint32_t>(size - 1, kMessageSize - 1));
     const Status status = lines_.readLine(line);
     buffer[status == kSuccess ? line.size : 0] = '\0';
     return status == kSuccess ? kSuccess : kFailed;
@@ -45,7 +45,8 @@ bool UREExternalOutputPipe::makeRoom(std::size_t capacity, std::string_view func
     if (grown != nullptr) {
         probe = 20;
         std::size_t made = capacity_;
-        while (made < capacity && (grown[made] = Message(new (std::nothrow) char[kQueuedCharacters + 1])) != nullptr) {
+        while (made < capacity &&
+               (grown[made] = Message(new (std::nothrow) char[kBytesOfCharacter * kQueuedCharacters + 1])) != nullptr) {
             ++made;
         }
         if (made == capacity) {
@@ -68,7 +69,8 @@ Status UREExternalOutputPipe::addQueueMessage(const char* text) {
         return kFailed;
     }
     char* room = queue_[count_].get();
-    room[message.copy(room, kQueuedCharacters)] = '\0';
+    const std::string_view kept = cutText(message, kQueuedCharacters);
+    room[kept.copy(room, kept.size())] = '\0';
     ++count_;
     return kSuccess;
 }

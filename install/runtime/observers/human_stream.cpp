@@ -62,10 +62,10 @@ UREExternalObserverHumanStream::~UREExternalObserverHumanStream() {
 std::vector<std::string> UREExternalObserverHumanStream::linesOf(std::uint32_t textNumber, std::string_view text,
                                                                  std::string_view second, TerminalStream stream) {
     const std::array<Insert, 2> inserts = {text, second};
-    char room[2 * kMessageSize];
+    char room[kBytesOfCharacter * 2 * kMessageSize];
     std::size_t length = 0;
     ure_.messages.copyText(textNumber, inserts, room, sizeof room, length);
-    std::string_view rest(room, std::min(length, sizeof room));
+    std::string_view rest = cutText({room, std::min(length, sizeof room)}, 2 * kMessageSize);
     std::string shown;
     if (!isPlain(rest)) {
         shown = shownLines(rest);
@@ -74,7 +74,7 @@ std::vector<std::string> UREExternalObserverHumanStream::linesOf(std::uint32_t t
     const std::uint32_t columns = ure_.ports.terminal.look(stream).columns;
     std::vector<std::string> lines;
     while (!rest.empty()) {
-        lines.emplace_back(takeWrappedLine(rest, columns).substr(0, kMessageSize - 2));
+        lines.emplace_back(cutText(takeWrappedLine(rest, columns), kMessageSize - 2));
     }
     return lines;
 }
@@ -132,7 +132,7 @@ Status UREExternalObserverHumanStream::handleMessage(UREInfo& info) {
 }
 
 void UREExternalObserverHumanStream::handleQuery(UREInfo& info) {
-    char line[kMessageSize];
+    char line[kBytesOfCharacter * kMessageSize];
     if (output().readResponse(line, sizeof line) != kSuccess) {
         return;
     }

@@ -4,6 +4,8 @@
 #include <array>
 #include <new>
 
+#include "install/platform/encoding.h"
+#include "install/platform/registry_path.h"
 #include "install/runtime/guarded.h"
 #include "install/runtime/session_text.h"
 
@@ -58,7 +60,7 @@ const char* URELogObserver::componentLogPath(char* buffer) const {
         return sharedLogPath.c_str();
     }
     const std::string_view path = componentLogPath_.view();
-    buffer[path.copy(buffer, kPathSize - 1)] = '\0';
+    buffer[path.copy(buffer, path.size())] = '\0';
     return buffer;
 }
 
@@ -72,7 +74,7 @@ Status URELogObserver::setLogFile(std::string_view path) {
 
 Status URELogObserver::openLog(std::string_view path) {
     const std::string_view folder = path.substr(0, path.find_last_of('\\') + 1);
-    FixedBuffer<kPathSize> shortened;
+    TextBuffer<kPathSize> shortened;
     file_.reset();
     shortPathFailed_ = false;
     const Status found = shortFolder(folder, shortened);
@@ -102,10 +104,9 @@ Status URELogObserver::shortFolder(std::string_view folder, Buffer& shortened) {
         return status;
     }
     // On a host without short paths an existing folder is its own short form.
-    if (folder.empty() || folder.size() >= shortened.capacity) {
+    if (folder.empty() || giveName(folder, shortened) != kSuccess) {
         return kBadPathname;
     }
-    shortened.size = static_cast<std::uint32_t>(folder.copy(shortened.data, shortened.capacity));
     return ure_.ports.files.probe(folder);
 }
 
@@ -115,18 +116,18 @@ Status URELogObserver::writeHeader(bool isEnd) {
     const auto* run =
         std::find_if(kRuns.begin(), kRuns.end(), [&](std::uint32_t bit) { return (ure_.mode & bit) != 0; });
     if (run != kRuns.end()) {
-        char room[kMaxTitle];
+        char room[kBytesOfCharacter * kMaxTitle];
         std::size_t length = 0;
         const auto number = kHeaderTitles + static_cast<std::uint32_t>(100 * (run - kRuns.begin())) + (isEnd ? 1 : 0);
         const Status status = ure_.messages.copyText(number, {}, room, sizeof room, length);
         if (status != kSuccess && status != kBufferTooSmall) {
             return status;
         }
-        title.assign(withoutQuotes({room, std::min(length, sizeof room)}));
+        title.assign(withoutQuotes(cutText({room, std::min(length, sizeof room)}, kMaxTitle)));
     }
-    FixedBuffer<256> date;
+    TextBuffer<256> date;
     if (guarded([&] { return ure_.ports.host.localTime(TimeText::dateAndZone, date); }) == kSuccess) {
-        title.append(date.view().substr(0, kMaxDate));
+        title.append(cutText(date.view(), kMaxDate));
     }
     writeLine(title.view());
     return writeLine(kSeparator);
@@ -169,9 +170,10 @@ Status URELogObserver::writeKeptLine() {
     }
     // The port does not buffer: there is nothing to flush.
     line_ += '\n';
+    const std::string narrow = narrowFromText(line_);
     std::uint32_t written = 0;
-    ure_.ports.files.write(file_.get(), line_, written);
-    const bool whole = written == line_.size();
+    ure_.ports.files.write(file_.get(), narrow, written);
+    const bool whole = written == narrow.size();
     if (line_.capacity() > kKeptRoom) {
         std::string().swap(line_);
     }

@@ -12,7 +12,8 @@
 namespace kz7 {
 
 inline constexpr std::string_view kLogFileName = "kz7msi.log";
-inline constexpr std::size_t kPathSize = 261;  // bytes of a file path with its terminator
+inline constexpr std::size_t kPathSize = 261;  // characters of a file path with its terminator
+inline constexpr std::size_t kPathBytes = kBytesOfCharacter * kPathSize;
 
 // One per process. Register it with Takes::everything, after setLogFile(). Lines go to the session until a
 // file is open. The engine outlives it.
@@ -42,7 +43,7 @@ public:
     // The path as the caller gave it; empty before setLogFile().
     std::string_view logFilePath() const { return logFilePath_.view(); }
 
-    // Copies the path of kLogFileName in the short form of the log's folder into `buffer` of kPathSize bytes, or with
+    // Copies the path of kLogFileName in the short form of the log's folder into `buffer` of kPathBytes, or with
     // null into a static buffer. Returns that buffer.
     const char* componentLogPath(char* buffer) const;
 

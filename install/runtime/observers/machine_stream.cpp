@@ -81,7 +81,7 @@ Status UREExternalObserverMachineStream::queueTaskList(std::string_view list) {
 }
 
 void UREExternalObserverMachineStream::handleQuery(UREInfo& info) {
-    char line[kMessageSize];
+    char line[kBytesOfCharacter * kMessageSize];
     if (output().readResponse(line, sizeof line) != kSuccess) {
         return;
     }

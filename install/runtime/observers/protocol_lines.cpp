@@ -41,11 +41,12 @@ std::string_view upToNul(std::string_view text) {
 }
 
 ProtocolLine lineOf(std::string_view pattern, std::initializer_list<Insert> inserts) {
-    char room[kMessageSize - 2];  // the line feed and the terminator follow
+    char room[kBytesOfCharacter * kMessageSize];
     const std::size_t whole = composeInto(room, sizeof room, pattern, {inserts.begin(), inserts.size()});
     const std::size_t length = std::min(whole, sizeof room);
     keepOnOneLine(room, length);
-    ProtocolLine line(upToNul({room, length}));
+    // The line feed and the terminator follow.
+    ProtocolLine line(upToNul(cutText({room, length}, kMessageSize - 2)));
     line.append("\n");
     return line;
 }
@@ -87,7 +88,7 @@ bool progressLine(const UREProgressInfo& info, ProtocolLine& line) {
 }
 
 ProtocolLine queryLine(std::string_view text, std::string_view defaultValue) {
-    return lineOf(kQuery, {upToNul(text), upToNul(defaultValue).substr(0, kMessageSize - 1)});
+    return lineOf(kQuery, {upToNul(text), cutText(upToNul(defaultValue), kMessageSize - 1)});
 }
 
 ProtocolLine errorLine(std::string_view text) {
@@ -99,8 +100,8 @@ ProtocolLine installEndLine(std::string_view logFile) {
 }
 
 TaskListLines taskListLines(std::string_view list) {
-    char room[kMaxTaskList];
-    const std::size_t length = list.copy(room, sizeof room);
+    char room[kBytesOfCharacter * kMaxTaskList];
+    const std::size_t length = cutText(list, kMaxTaskList).copy(room, sizeof room);
     keepOnOneLine(room, length);
     std::string_view rest = upToNul({room, length});
     TaskListLines lines;

@@ -7,7 +7,7 @@
 namespace kz7 {
 namespace {
 
-constexpr std::uint32_t kCopyNameRoom = 256;  // bytes, the terminator included
+constexpr std::uint32_t kCopyNameRoom = 256;  // characters, the terminator included
 
 }  // namespace
 
@@ -35,7 +35,7 @@ Status readInstallCopies(RegistryValues& values, CopiesByName& byName, CopiesByV
         values.tell("Failed to open the registry key:%s", {layout::kCopies});
         return kFailed;
     }
-    FixedBuffer<kCopyNameRoom> name;
+    TextBuffer<kCopyNameRoom> name;
     for (std::uint32_t index = 0; succeeded(registry.enumerateKey(key.get(), index, name, nullptr)); ++index) {
         const InstallCopyInfo& copy =
             byName.insert_or_assign(std::string(name.text()), InstallCopyInfo(values, name.text())).first->second;

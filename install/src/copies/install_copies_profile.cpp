@@ -100,7 +100,7 @@ bool isWholeVersion(std::string_view prefix) {
 
 std::vector<std::string> listAliases(IRegistryStore& registry, KeyHandle key) {
     std::vector<std::string> names;
-    FixedBuffer<kAliasNameRoom> name;
+    TextBuffer<kAliasNameRoom> name;
     for (std::uint32_t index = 0; succeeded(registry.enumerateValue(key, index, name, nullptr, nullptr)); ++index) {
         if (isAliasName(name.text())) {
             names.emplace_back(name.text());

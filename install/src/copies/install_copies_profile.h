@@ -21,11 +21,11 @@ bool isAliasName(std::string_view name);
 // Whether a prefix is a whole version, which only a copy of exactly that version matches.
 bool isWholeVersion(std::string_view prefix);
 
-// Bytes of the name buffer of a walk over the aliases, with the terminator.
+// Characters of the name buffer of a walk over the aliases, with the terminator.
 inline constexpr std::uint32_t kAliasNameRoom = 100;
 
 // The names of the aliases of an open key, in registry order. Deliberate: the walk ends at the first value name of 100
-// bytes or more; aliases after it are left alone.
+// characters or more; aliases after it are left alone.
 std::vector<std::string> listAliases(IRegistryStore& registry, KeyHandle key);
 
 // Statuses are kSuccess or kFailed; failures are described on the debugger output. An object may be run again.

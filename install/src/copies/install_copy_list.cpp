@@ -23,7 +23,7 @@ void InstallCopy::read(IRegistryStore& registry) {
     const std::string base = version8_ ? std::string(layout::kProduct) : compose("%s\\%s", {layout::kCopies, name_});
     keyPath_.assign(base);
     OwnedKey key(registry);
-    FixedBuffer<256> path;
+    TextBuffer<256> path;
     if (!succeeded(
             registry.openKey(KeyHandle::localMachine, base, kKeyQueryValue | view32_ | view64_, key.receive())) ||
         !succeeded(queryText(registry, key.get(), layout::kPathName, path))) {
@@ -52,7 +52,7 @@ void InstallCopy::readComponents(IRegistryStore& registry, const std::string& ba
     if (!succeeded(registry.openKey(root, base + "\\COMPONENTS", kKeyQueryValue | view, key.receive()))) {
         return;
     }
-    FixedBuffer<255> name;
+    TextBuffer<255> name;
     // Any error ends the walk: a name that does not fit the buffer would return kMoreData for ever.
     for (std::uint32_t index = 0; succeeded(registry.enumerateValue(key.get(), index, name, nullptr, nullptr));
          ++index) {
@@ -73,7 +73,7 @@ InstallCopyList::InstallCopyList(IRegistryStore& registry, IDebugOutput& debug, 
 
 bool InstallCopyList::hasVersion8(IRegistryStore& registry) const {
     OwnedKey key(registry);
-    FixedBuffer<256> version;
+    TextBuffer<256> version;
     return succeeded(registry.openKey(KeyHandle::localMachine, layout::kCurrentVersion,
                                       kKeyQueryValue | view32_ | view64_, key.receive())) &&
            succeeded(queryText(registry, key.get(), "Version", version)) &&
@@ -96,7 +96,7 @@ void InstallCopyList::build(IRegistryStore& registry, IDebugOutput& debug) {
                                     kKeyQueryValue | kKeyEnumerateSubkeys | view32_ | view64_, copies.receive()))) {
         return;
     }
-    FixedBuffer<256> name;
+    TextBuffer<256> name;
     for (std::uint32_t index = 0;; ++index) {
         const Status found = registry.enumerateKey(copies.get(), index, name, nullptr);
         if (!succeeded(found)) {

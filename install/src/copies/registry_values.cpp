@@ -5,7 +5,7 @@
 namespace kz7 {
 namespace {
 
-constexpr std::uint32_t kValueRoom = 100;  // bytes, the terminator included
+constexpr std::uint32_t kValueRoom = 100;  // characters, the terminator included
 
 }  // namespace
 
@@ -24,7 +24,7 @@ std::string RegistryValues::query(std::string_view path, std::string_view name, 
     }
     // Deliberate: a value that does not fit reads as empty, in a backup of an alias as well; aliases name copies, whose
     // names are shorter.
-    FixedBuffer<kValueRoom> data;
+    TextBuffer<kValueRoom> data;
     if (!succeeded(queryText(registry_, key.get(), name, data))) {
         tell(complaint, {path, name});
         return {};

@@ -1,5 +1,7 @@
 #include "install/src/registry/copy_name.h"
 
+#include <algorithm>
+
 #include "install/platform/text.h"
 
 namespace kz7 {
@@ -12,10 +14,18 @@ constexpr std::string_view kDefaultName = "$DefaultInstallationName$";
 // an earlier result.
 FixedText<kSubstitutedSize> sharedOutput;
 
+// Whether a byte is none that a character begins with.
+bool isWithinCharacter(char c) {
+    return (static_cast<unsigned char>(c) & 0xC0) == 0x80;
+}
+
 // Copies a text into a caller's buffer, cut to its size and terminated.
 void copyOut(std::string_view text, std::uint32_t size, char* output) {
-    const std::size_t taken = text.substr(0, size - 1).copy(output, size - 1);
-    output[taken] = '\0';
+    std::size_t taken = std::min<std::size_t>(text.size(), size - 1);
+    while (taken < text.size() && taken != 0 && isWithinCharacter(text[taken])) {
+        --taken;
+    }
+    output[text.copy(output, taken)] = '\0';
 }
 
 }  // namespace

@@ -8,7 +8,7 @@
 
 namespace kz7 {
 
-inline constexpr std::size_t kSubstitutedSize = 1024;  // bytes of a substituted text with its terminator
+inline constexpr std::size_t kSubstitutedSize = 1024;  // characters of a substituted text with its terminator
 
 // Replaces every "$CurrentInstallationName$" of `text` by the name, or every "$DefaultInstallationName$" if the text
 // has none of the first. Inserted names are not searched again; an empty name leaves the text unchanged. The result is

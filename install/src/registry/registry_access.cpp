@@ -86,14 +86,14 @@ private:
     std::string_view spared_;
     std::string path_;  // unsubstituted, of the last level whose path fits
     std::vector<Level> levels_;
-    FixedBuffer<256> name_;
+    TextBuffer<256> name_;
 };
 
 }  // namespace
 
 // Deliberate: a path that does not fit fails the operation; cut, it would name another key.
 Status checkPathLength(std::string_view path) {
-    return path.size() < kSubstitutedSize ? kSuccess : kFilenameExceedsRange;
+    return fitsCharacters(path, kSubstitutedSize - 1) ? kSuccess : kFilenameExceedsRange;
 }
 
 Status setText(IRegistryStore& registry, std::string_view path, std::string_view name, std::string_view data) {
@@ -106,8 +106,13 @@ Status setText(IRegistryStore& registry, std::string_view path, std::string_view
 }
 
 Status queryText(IRegistryStore& registry, KeyHandle key, std::string_view name, Buffer& data) {
-    const Status status = registry.queryValue(key, name, nullptr, data);
-    return succeeded(status) && data.text().size() == data.capacity ? kMoreData : status;
+    ValueType type{};
+    const Status status = registry.queryValue(key, name, &type, data);
+    if (!succeeded(status) || data.text().size() != data.size) {
+        return status;
+    }
+    const bool isFull = isTextType(type) ? !fitsCharacters(data.view(), data.limit - 1) : data.size == data.limit;
+    return isFull ? kMoreData : kSuccess;
 }
 
 bool valueExists(IRegistryStore& registry, KeyHandle key, std::string_view name) {

@@ -9,7 +9,7 @@
 
 namespace kz7 {
 
-// kFilenameExceedsRange for a path over 1,023 bytes: cut, it would name another key.
+// kFilenameExceedsRange for a path over 1,023 characters: cut, it would name another key.
 Status checkPathLength(std::string_view path);
 
 // Stores a text with its terminating NUL, and creates the key and its parents. `path` has no placeholder left.
@@ -27,8 +27,8 @@ class TreeCopy {
 public:
     explicit TreeCopy(IRegistryStore& registry) : registry_(registry) {}
 
-    // The first failure ends the copy and is its status: also a path over 1,023 bytes and a name or value that does not
-    // fit the buffers.
+    // The first failure ends the copy and is its status: also a path over 1,023 characters and a name or value that
+    // does not fit the buffers.
     Status copy(KeyHandle sourceRoot, std::string_view sourcePath, KeyHandle targetRoot, std::string_view targetPath,
                 bool overwrite);
 
@@ -43,10 +43,10 @@ private:
     std::string sourcePath_;
     std::string targetPath_;
     // Shared by all levels: a set of buffers for each level would overflow a small stack.
-    FixedBuffer<260> name_;
-    FixedBuffer<260> class_;
-    FixedBuffer<260> valueName_;
-    FixedBuffer<10000> data_;
+    TextBuffer<260> name_;
+    TextBuffer<260> class_;
+    TextBuffer<260> valueName_;
+    TextBuffer<10000> data_;
 };
 
 // Deletes a key and everything below it, except each subkey named `sparedSubkey` (compared with case) and the keys

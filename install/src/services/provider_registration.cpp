@@ -4,6 +4,7 @@
 #include <array>
 #include <cstring>
 
+#include "install/platform/encoding.h"
 #include "install/platform/text.h"
 #include "install/runtime/install_process.h"
 #include "install/src/copies/install_copies_profile.h"
@@ -88,7 +89,8 @@ bool askLevel(LevelEntry entry, std::string& level) {
         return false;
     }
     text.remove_prefix(kLevelPrefix.size());
-    level = shortenedLevel(text);
+    // The library is a program of its own, in the narrow encoding.
+    level = shortenedLevel(textFromNarrow(text));
     return true;
 }
 

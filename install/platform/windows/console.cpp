@@ -1,0 +1,57 @@
+#include "install/platform/windows/console.h"
+
+#include <io.h>
+#include <windows.h>
+
+#include <algorithm>
+#include <cstdio>
+
+#include "install/platform/windows/wide_text.h"
+
+namespace kz7 {
+namespace {
+
+constexpr std::size_t kPiece = 8192;  // characters of one call
+
+// The handle of a stream that people look at; null for any other.
+HANDLE consoleOf(std::FILE* stream) {
+    if (_isatty(_fileno(stream)) == 0) {
+        return nullptr;
+    }
+    const auto handle = reinterpret_cast<HANDLE>(_get_osfhandle(_fileno(stream)));
+    DWORD mode = 0;
+    return GetConsoleMode(handle, &mode) != FALSE ? handle : nullptr;
+}
+
+Status writeToConsole(std::FILE* stream, HANDLE console, std::string_view text) {
+    std::fflush(stream);
+    const WideText wide(text);
+    for (std::size_t at = 0; at < wide.size(); at += kPiece) {
+        const auto length = static_cast<DWORD>(std::min(wide.size() - at, kPiece));
+        DWORD written = 0;
+        if (WriteConsoleW(console, wide.c_str() + at, length, &written, nullptr) == FALSE) {
+            return kWriteFault;
+        }
+    }
+    return kSuccess;
+}
+
+}  // namespace
+
+Status WindowsConsole::writeOutput(std::string_view text) {
+    const HANDLE console = consoleOf(stdout);
+    return console != nullptr ? writeToConsole(stdout, console, text) : streams_->writeOutput(narrowFromText(text));
+}
+
+Status WindowsConsole::writeError(std::string_view text) {
+    flush();
+    const HANDLE console = consoleOf(stderr);
+    return console != nullptr ? writeToConsole(stderr, console, text) : streams_->writeError(narrowFromText(text));
+}
+
+Status WindowsConsole::writeDocument(std::string_view text) {
+    const HANDLE console = consoleOf(stdout);
+    return console != nullptr ? writeToConsole(stdout, console, text) : streams_->writeOutput(text);
+}
+
+}  // namespace kz7

@@ -1,0 +1,36 @@
+#include "install/platform/program.h"
+
+#include <windows.h>
+
+#include <new>
+#include <vector>
+
+#include "install/platform/windows/wide_text.h"
+
+namespace kz7 {
+
+std::FILE* openInput(const char* path) {
+    return _wfopen(WideText(path).c_str(), L"rb");
+}
+
+}  // namespace kz7
+
+// The wide vector of the C runtime: CommandLineToArgvW() splits `"a""b" c` otherwise, and the narrow vector is split
+// after other quotation marks have become ASCII's.
+int wmain(int argc, wchar_t** argv) {
+    try {
+        std::vector<std::string> words;
+        for (int i = 0; i < argc; ++i) {
+            words.push_back(kz7::textFromWide(argv[i]));
+        }
+        std::vector<char*> vector;
+        for (std::string& word : words) {
+            vector.push_back(word.data());
+        }
+        vector.push_back(nullptr);
+        return kz7::programMain(argc, vector.data());
+    } catch (const std::bad_alloc&) {
+        std::fputs("out of memory\n", stderr);
+        return ERROR_OUTOFMEMORY;
+    }
+}
