@@ -279,7 +279,8 @@ private:
                 bind(value_, version, field);
                 require(sqlite3_step(value_) == SQLITE_ROW, "a value is missing");
                 joined += joined.empty() ? "" : ".";
-                joined += text(value_, 0).c_str();
+                // The stored text ends with a NUL, which c_str() cuts off.
+                joined += text(value_, 0).c_str();  // NOLINT(readability-redundant-string-cstr)
                 sqlite3_reset(value_);
             }
             copies.insert_or_assign(std::move(joined), text(children_, 0));

@@ -1,4 +1,4 @@
-# Cross-builds for Windows x64 with mingw-w64; Wine runs the programs.
+# Toolchain of the cross build for Windows x64: mingw-w64 compiles, Wine runs the programs.
 set(CMAKE_SYSTEM_NAME Windows)
 set(CMAKE_SYSTEM_PROCESSOR x86_64)
 set(CMAKE_C_COMPILER x86_64-w64-mingw32-gcc-posix)

@@ -1,4 +1,5 @@
-// What a fuzzer is made of: `tryInput`, which checks one input and ends the process where a check does not hold.
+// The entry point of a fuzzer. The one source that includes this header defines `tryInput`, which checks one input and
+// aborts the process if a check fails.
 #pragma once
 
 #include <cstdint>
@@ -8,6 +9,7 @@
 
 void tryInput(std::string_view input);
 
+// NOLINTNEXTLINE(misc-definitions-in-headers)
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
     tryInput({reinterpret_cast<const char*>(data), size});
     return 0;

@@ -3,9 +3,15 @@
 #include <sqlite3.h>
 
 #include <sys/resource.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <chrono>
+#include <filesystem>
+#include <functional>
+#include <future>
+#include <set>
 
 #include "tests/support/state_directory.h"
 
@@ -73,7 +79,7 @@ TEST_F(AdminProgram, ShowsForReadingAndForPrograms) {
     @ REG_SZ "a\b"
     "\x0a" REG_SZ "\x1b\xe9\u202e)"
                            "\xC3\xA9"
-                           R"(" (without its end)
+                           R"(" (no NUL terminator)
     "d" REG_DWORD 255 (0xff)
     "m" REG_MULTI_SZ "a" "b" ""
     "q" REG_QWORD 4294967296 (0x100000000)
@@ -103,17 +109,20 @@ TEST_F(AdminProgram, AnswersNoAndTellsFaults) {
     const std::string unnamable = "HKU\\" + std::string(256, 'x');
     // clang-format off
     const struct { std::vector<std::string> arguments; int exitCode; std::string output; std::string error; } rows[] = {
-        {{"tree"},                1, "", told(missing + ": there is nothing to show")},
-        {{"export"},              1, kHead, storeTold() + told(missing + ": there is nothing to show")},
-        {{"export", "HKU\\x\n"},  1, "", told("HKEY_USERS\\x\\x0a: there is no such key")},
-        {{"tree", "HKCU"},        1, "", told("HKEY_CURRENT_USER: there is no such key")},
-        {{"tree", unnamable},     2, "", told("HKEY_USERS" + unnamable.substr(3) + ": no key can be named so")},
+        {{"tree"},                1, "", told("nothing to show: " + missing)},
+        {{"export"},              1, kHead, storeTold() + told("nothing to show: " + missing)},
+        {{"export", "HKU\\x\n"},  1, "", told("no such key: HKEY_USERS\\x\\x0a")},
+        {{"tree", "HKCU"},        1, "", told("no such key: HKEY_CURRENT_USER")},
+        {{"tree", unnamable},     2, "", told("invalid key name: HKEY_USERS" + unnamable.substr(3))},
         {{"import", bad},         2, "", told(bad + ":5: the line is no key, no value and no comment")},
         {{"import", store_.path()}, 2, "", told(store_.path() + ": Is a directory")},
         {{"import", "/none/such"},  2, "", told("/none/such: No such file or directory")},
-        {{},                      2, "", told("no command is given (see --help)")},
+        {{},                      2, "", told("no command (see --help)")},
         {{"rubbish"},             2, "", told("The following argument was not expected: rubbish (see --help)")},
         {{"export", "--json", "--utf16"}, 2, "", told("--utf16 excludes --json (see --help)")},
+        {{"tree", "--store="},    2, "", told("--store: 1 required TEXT missing (see --help)")},
+        {{"copies", "--store", "/dev/null"},  2, "", told("/dev/null: Not a directory")},
+        {{"aliases", "--store", "/none/such"}, 2, "", told("/none/such: No such file or directory")},
         {{"import"},              2, "", told("FILE is required (see --help)")},
     };
     // clang-format on
@@ -126,13 +135,136 @@ TEST_F(AdminProgram, AnswersNoAndTellsFaults) {
     EXPECT_NE(access(missing.c_str(), F_OK), 0) << "nothing of all this makes a store";
 }
 
+TEST_F(AdminProgram, ReadsAStoreWhoseDirectoryItMayNotWrite) {
+    ASSERT_EQ(store_.tool({"-addKZ7Copy", "COPY1", "C:\\KZ7"}).exitCode, 0);
+    const std::string whole = admin({"export"}).output;
+    for (const char* const name : {"", "registry.db", "registry.db-wal", "registry.db-shm"}) {
+        ASSERT_EQ(chmod(store_.file(name).c_str(), 0555), 0);
+    }
+    const auto asOther = [] { return setuid(geteuid() == 0 ? 65534 : geteuid()) == 0 ? void() : _exit(99); };
+    for (const char* const missing : {"-none", "-shm", "-wal"}) {
+        unlink(store_.file("registry.db"s + missing).c_str());
+        const ProgramResult result = admin({"export"}, {.environment = {}, .inChild = asOther});
+        // All of this store is still in its log.
+        EXPECT_EQ(result.exitCode, missing == "-wal"s ? 1 : 0) << missing << result.error;
+        EXPECT_EQ(result.output == whole, missing != "-wal"s) << missing;
+    }
+    ASSERT_EQ(chmod(store_.file("registry.db").c_str(), 0), 0);
+    EXPECT_EQ(admin({"tree"}, {.environment = {}, .inChild = asOther}).error,
+              told(store_.file("registry.db") + ": Permission denied"));
+}
+
+TEST_F(AdminProgram, BacksUpWholeRunsWhileOthersWrite) {
+    const auto add = [](const StateDirectory& to, int copy) {
+        return to.tool({"-addKZ7Copy", "COPY" + std::to_string(copy), "C:\\KZ7"}).exitCode;
+    };
+    constexpr int kCopies = 12;
+    const StateDirectory replay;
+    std::set<std::string> states;
+    for (int copy = 0; copy < kCopies; ++copy) {
+        ASSERT_EQ(add(replay, copy), 0);
+        states.insert(replay.dump());
+    }
+    ASSERT_EQ(add(store_, 0), 0);
+    auto writer = std::async(std::launch::async, [&] {
+        int failed = 0;
+        for (int copy = 1; copy < kCopies; ++copy) {
+            failed += add(store_, copy);
+        }
+        return failed;
+    });
+    const StateDirectory restored;
+    for (bool writes = true; writes;) {
+        writes = writer.wait_for(std::chrono::seconds(0)) != std::future_status::ready;
+        const ProgramResult result = admin({"backup", "--force", restored.file("registry.db")});
+        ASSERT_EQ(result.exitCode, 0) << result.error;
+        EXPECT_EQ(restored.integrity(), "ok");
+        EXPECT_TRUE(states.contains(restored.dump()));
+    }
+    EXPECT_EQ(writer.get(), 0);
+    EXPECT_EQ(admin({"export", "--store", restored.path()}).output, admin({"export"}).output);
+    struct stat found {};
+    ASSERT_EQ(stat(restored.file("registry.db").c_str(), &found), 0);
+    EXPECT_EQ(found.st_mode & 0777U, 0600U);
+}
+
+TEST_F(AdminProgram, BackupReplacesNothingThatItShouldNot) {
+    EXPECT_EQ(admin({"backup", files_.path() + "/none"}).error,
+              told("nothing to back up: " + store_.file("registry.db")));
+    std::string big = kHead + "[HKLM\\big]\n"s;
+    for (int value = 0; value < 200; ++value) {
+        big += "\"" + std::to_string(value) + "\"=\"" + std::string(1000, 'x') + "\"\n";
+    }
+    ASSERT_EQ(admin({"import", file(big)}).exitCode, 0);
+    const std::string before = store_.dump();
+    const std::string link = files_.path() + "/link";
+    const std::string old = file("old");
+    ASSERT_EQ(symlink(old.c_str(), link.c_str()), 0);
+    const auto small = [] {
+        const rlimit limit{1 << 16, 1 << 16};
+        setrlimit(RLIMIT_FSIZE, &limit);
+    };
+    // clang-format off
+    const struct { std::string target; bool force; std::string reason; std::function<void()> inChild; } rows[] = {
+        {old,                             false, "file exists (--force replaces it)", {}},
+        {old,                             true,  "no space left on device",           small},
+        {link,                            true,  "not a regular file",                {}},
+        {"/dev/null",                     true,  "not a regular file",                {}},
+        {files_.path() + "/",             true,  "not a regular file",                {}},
+        {files_.path() + "/none/x",       false, "no such directory",                 {}},
+        {store_.path() + "/registry.db",  true,  "part of the store itself",          {}},
+        {store_.path() + "/./registry.db-wal", true, "part of the store itself",      {}},
+    };
+    // clang-format on
+    for (const auto& row : rows) {
+        const Arguments words = {"backup", row.target, row.force ? "--force" : "--store=" + store_.path()};
+        const ProgramResult result = admin(words, {{}, row.inChild});
+        EXPECT_EQ(result.exitCode, 2) << row.target;
+        EXPECT_EQ(result.error, told("cannot write backup: " + row.target + ": " + row.reason));
+        EXPECT_EQ(result.output, "");
+        EXPECT_EQ(contents(old), "old") << row.target;
+        EXPECT_EQ(store_.dump(), before) << row.target;
+    }
+    const std::filesystem::directory_iterator left(files_.path());
+    EXPECT_EQ(std::distance(begin(left), end(left)), 2) << "no temporary file";
+}
+
+TEST_F(AdminProgram, FitsItsTerminalAndNeverSteersIt) {
+    ASSERT_EQ(store_.tool({"-addKZ7Copy", "\xE6\x9D\xB1\xE4\xBA\xAC", "C:\\Program Files\\KZ7"}).exitCode, 0);
+    ASSERT_EQ(store_.tool({"-addKZ7Copy", "PLAIN", "C:\\KZ7"}).exitCode, 0);
+    ASSERT_EQ(admin({"import", file(kHead + "[HKLM\\a\xC2\x9B]\n"s)}).exitCode, 0);
+    const auto onTerminal = [this](const std::string& columns, const std::string& command) {
+        const std::string line =
+            "stty -opost cols 80; " + columns + ' ' + programPath("kz7admin") + ' ' + command + " 2>/dev/null";
+        return runProgram({"/usr/bin/script", "-qec", line, "/dev/null"}, {{"KZ7_STATE_DIR=" + store_.path()}, {}});
+    };
+    const std::string table = R"(NAME   VIEW    VERSION    VALID  LOCATION              SERVICE
+PLAIN  native  9.7.800.0  yes    C:\KZ7                KZ7MGMTSVC_PLAIN stopped
+PLAIN  32-bit  9.7.800.0  yes    C:\KZ7                KZ7MGMTSVC_PLAIN stopped
+東京   native  9.7.800.0  yes    C:\Program Files\KZ7  KZ7MGMTSVC_東京 stopped
+東京   32-bit  9.7.800.0  yes    C:\Program Files\KZ7  KZ7MGMTSVC_東京 stopped
+)";
+    EXPECT_EQ(onTerminal("", "copies").output, table);
+    EXPECT_EQ(admin({"copies"}, {{"COLUMNS=40"}, {}}).output, table) << "nothing is wrapped in a pipe";
+    const std::string list = onTerminal("COLUMNS=40", "copies").output;
+    EXPECT_EQ(list.substr(0, list.find("\n\n")), R"(NAME      PLAIN
+VIEW      native
+VERSION   9.7.800.0
+VALID     yes
+LOCATION  C:\KZ7
+SERVICE   KZ7MGMTSVC_PLAIN stopped)");
+    EXPECT_NE(onTerminal("", "export 'HKLM\\a\xC2\x9B'").output.find("[HKEY_LOCAL_MACHINE\\a\\u009b]\n"),
+              std::string::npos);
+    EXPECT_EQ(onTerminal("", "export --utf16").exitCode, 2);
+}
+
 TEST_F(AdminProgram, ReportsKeysThatAreListedAndCannotBeRead) {
     ASSERT_EQ(admin({"import", file(kHead + "[HKLM\\a]\n[HKLM\\b]\n"s)}).exitCode, 0);
     sqlite3* store = nullptr;
     ASSERT_EQ(sqlite3_open(store_.file("registry.db").c_str(), &store), SQLITE_OK);
     EXPECT_EQ(sqlite3_exec(store, "UPDATE key SET fold = 'AX' WHERE name = 'a'", nullptr, nullptr, nullptr), SQLITE_OK);
     sqlite3_close(store);
-    const std::string line = "HKEY_LOCAL_MACHINE\\a: is listed but cannot be read: error 2";
+    const std::string line = "cannot read key: HKEY_LOCAL_MACHINE\\a: error 2";
     const std::string json = R"({"key":"HKEY_LOCAL_MACHINE\\a","class":"","values":[],"error":2},)";
     for (const auto& [command, shown] : {std::pair{Arguments{"tree"}, "  a (cannot be read: error 2)\n  b\n"s},
                                          {{"export"}, kHead + "\n[HKEY_LOCAL_MACHINE\\b]\n"s},
@@ -169,8 +301,7 @@ TEST_F(AdminProgram, KeepsAStoreThatItCannotChange) {
         const ProgramResult result = runProgram({"/bin/bash", "-c", programPath("kz7admin") + " " + command},
                                                 {{"KZ7_STATE_DIR=" + store_.path()}, {}});
         EXPECT_EQ(result.exitCode, exitCode) << command;
-        EXPECT_EQ(result.error,
-                  storeTold() + (exitCode == 0 ? "" : told("standard output cannot be written: "s + said)));
+        EXPECT_EQ(result.error, storeTold() + (exitCode == 0 ? "" : told("cannot write: standard output: "s + said)));
     }
 
     overwrite(store_.file("registry.db"), "rubbish");

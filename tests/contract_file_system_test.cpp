@@ -83,6 +83,28 @@ TEST_P(FileSystemContract, FilesAreWrittenAtTheirEndAndReadWhole) {
     EXPECT_EQ(files_.closeFile(FileHandle::none), kInvalidHandle);
 }
 
+TEST_P(FileSystemContract, WholeFilesAreWrittenAndReplaced) {
+    const std::string path = folder_ + "whole";
+    // clang-format off
+    const struct { const char* why; std::string path; std::string content; bool replace; Status status; } rows[] = {
+        {"a new file",        path,                    std::string(100'000, 'x'), false, kSuccess},
+        {"an existing file",  path,                    "lost",                    false, kFileExists},
+        {"its replacement",   path,                    "new\n",                  true,  kSuccess},
+        {"a folder",          backend_->folder(),      "lost",                    true,  kBadPathname},
+        {"no name",           folder_,                 "lost",                    true,  kBadPathname},
+        {"a missing folder",  folder_ + "none\\file", "lost",                    false, kPathNotFound},
+        {"relative",          "whole",                 "lost",                    false, kBadPathname},
+    };
+    // clang-format on
+    for (const auto& row : rows) {
+        EXPECT_EQ(files_.writeFile(row.path, row.content, row.replace), row.status) << row.why;
+        std::string content;
+        EXPECT_EQ(files_.readFile(path, content), kSuccess);
+        EXPECT_NE(content, "lost") << row.why;
+        EXPECT_EQ(content == row.content, row.status == kSuccess) << row.why;
+    }
+}
+
 TEST_P(FileSystemContract, TheFirstFileThatFitsAPatternIsFound) {
     for (const char* name : {"text_b.cat", "text_A.cat", "text.cat", "text_aa.cat"}) {
         OwnedFile file(files_);

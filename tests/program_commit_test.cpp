@@ -56,7 +56,7 @@ TEST_F(CommitProgram, SetsWhatAResponseFileSays) {
                                           {{"KZ7_STATE_DIR=" + store_.path()}, {}});
     EXPECT_EQ(lost.exitCode, 1) << "exits by what was set";
     EXPECT_TRUE(lost.error.starts_with("Error: ") &&
-                lost.error.ends_with("\nkz7admin: standard output cannot be written: error 29\n"))
+                lost.error.ends_with("\nkz7admin: cannot write: standard output: error 29\n"))
         << lost.error;
 
     const ProgramResult machine = store_.run(
@@ -77,13 +77,13 @@ TEST_F(CommitProgram, TellsWhyItCannotBegin) {
     const std::string good = responses(kGood);
     // clang-format off
     const struct { const char* why; std::string copy; std::string responses; std::vector<std::string> more; std::string told; } rows[] = {
-        {"no such copy",        "C2",              good, {}, "C2: there is no such copy (see kz7admin copies)"},
-        {"no copy's name",      "COPY1\\PROFILES", good, {}, "COPY1\\PROFILES: there is no such copy (see kz7admin copies)"},
+        {"no such copy",        "C2",              good, {}, "no such copy: C2 (see kz7admin copies)"},
+        {"no copy's name",      "COPY1\\PROFILES", good, {}, "no such copy: COPY1\\PROFILES (see kz7admin copies)"},
         {"no response file",    "COPY1", "/nowhere", {}, "/nowhere: No such file or directory"},
-        {"a long instance",     "COPY1", good, {"--instance", "INSTANCE9"}, "INSTANCE9: an instance name has at most 8 characters and no separator"},
-        {"another folder",      "COPY1", good, {"--instance", ".."}, "..: an instance name has at most 8 characters and no separator"},
-        {"no folder for a log", "COPY1", good, {"--log", "/nowhere/l"}, "/nowhere/l: the log cannot be written: error 3"},
-        {"a pipe for a log",    "COPY1", good, {"--log", pipe}, pipe + ": the log cannot be written: error 5"},
+        {"a long instance",     "COPY1", good, {"--instance", "INSTANCE9"}, "invalid instance name: INSTANCE9: at most 8 characters, no separators"},
+        {"another folder",      "COPY1", good, {"--instance", ".."}, "invalid instance name: ..: at most 8 characters, no separators"},
+        {"no folder for a log", "COPY1", good, {"--log", "/nowhere/l"}, "cannot write log: /nowhere/l: error 3"},
+        {"a pipe for a log",    "COPY1", good, {"--log", pipe}, "cannot write log: " + pipe + ": error 5"},
     };
     // clang-format on
     for (const auto& row : rows) {

@@ -100,7 +100,7 @@ TEST_F(ProviderProgram, CopiesAreShownWithTheirServicesAndAliasesWithWhatIsWrong
     const std::string storeLine = store_.file("registry.db");
     const ProgramResult none = store_.run("kz7admin", {"copies"});
     EXPECT_EQ(none.exitCode, 1);
-    EXPECT_EQ(none.error, "kz7admin: " + storeLine + ": there is no installed copy\n");
+    EXPECT_EQ(none.error, "kz7admin: no installed copy: " + storeLine + "\n");
     EXPECT_EQ(store_.run("kz7admin", {"aliases"}).exitCode, 1);
 
     store_.tool({"-addKZ7Copy", "COPY1", "C:\\KZ7"});
@@ -138,7 +138,7 @@ TEST_F(ProviderProgram, CopiesAreShownWithTheirServicesAndAliasesWithWhatIsWrong
               "9.8        -       -       five       9.8.0.0.1 is the highest that begins with it\n"
               "9.8.0      COPY1   -       five       9.8.0.0.1 is the highest that begins with it\n"
               "9.8.0.0    -       -       (empty)    no copy has exactly this version; written empty\n"
-              "9.8.0.0.1  -       -       (empty)    no version goes on behind it; written empty\n");
+              "9.8.0.0.1  -       -       (empty)    no version continues it; written empty\n");
     EXPECT_NE(store_.run("kz7admin", {"aliases", "v9"}).output.find("v9        vee     -       vee        v9.8.0.0 is"),
               std::string::npos)
         << "a due alias that does not look like one";
@@ -153,7 +153,7 @@ TEST_F(ProviderProgram, CopiesAreShownWithTheirServicesAndAliasesWithWhatIsWrong
     const StateDirectory native;
     overwrite(store_.file("more.reg"), text.substr(0, text.find("[HKEY_LOCAL_MACHINE\\SOFTWARE\\Wow")));
     ASSERT_EQ(native.run("kz7admin", {"import", store_.file("more.reg")}).exitCode, 0);
-    EXPECT_NE(native.run("kz7admin", {"aliases", "8.2"}).output.find(gone + "leaves it: there is no key of the copies"),
+    EXPECT_NE(native.run("kz7admin", {"aliases", "8.2"}).output.find(gone + "leaves it: the copies' key is missing"),
               std::string::npos);
 }
 

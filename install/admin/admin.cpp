@@ -20,7 +20,7 @@ bool Admin::open(bool readOnly) {
                               .readOnly = readOnly,
                               .plainStreams = true});
     if (!storeDirectory.empty() && !platform_->storeIsOwn()) {
-        fault("--store: the store of this machine is its registry, in no directory");
+        fault("cannot open store: --store: the store of this machine is its registry");
         return false;
     }
     return true;
@@ -29,20 +29,20 @@ bool Admin::open(bool readOnly) {
 Answer Admin::selectKeys(const std::string& key, std::vector<KeyStart>& starts) {
     if (key.empty()) {
         const Status status = findEverything(registry(), platform_->storeIsOwn(), starts);
-        return status == kSuccess ? kAnswerYes : storeFault("the registry cannot be read", status);
+        return status == kSuccess ? kAnswerYes : storeFault("cannot read registry", status);
     }
     const KeyName name = typedKeyName(key);
     const std::string shown = shownText(fullKeyName(name));
     if (checkKeyPath(name.path) != kSuccess) {
-        return fault(shown + ": no key can be named so");
+        return fault("invalid key name: " + shown);
     }
     KeyStart start;
     const Status status = findKey(registry(), name, start);
     if (isNotFound(status)) {
-        return no(shown + ": there is no such key");
+        return no("no such key: " + shown);
     }
     starts.push_back(std::move(start));
-    return status == kSuccess ? kAnswerYes : storeFault(shown + ": cannot be read", status);
+    return status == kSuccess ? kAnswerYes : storeFault("cannot read key: " + shown, status);
 }
 
 Answer Admin::showKeys(const std::string& key, std::string text, const Appender& append, std::string_view tail,
@@ -58,7 +58,7 @@ Answer Admin::showKeys(const std::string& key, std::string text, const Appender&
             if (platform_->storeFaultTold()) {
                 return record.status;
             }
-            outcome = storeFault(shownText(record.name) + ": is listed but cannot be read", record.status);
+            outcome = storeFault("cannot read key: " + shownText(record.name), record.status);
         } else if (isBareRoot(record) && !record.hasSubkeys) {
             return kSuccess;
         }
@@ -76,12 +76,12 @@ Answer Admin::showKeys(const std::string& key, std::string text, const Appender&
             return written;
         }
         if (status != kSuccess) {
-            return storeFault(shownText(fullKeyName(start.name)) + ": cannot be read", status);
+            return storeFault("cannot read key: " + shownText(fullKeyName(start.name)), status);
         }
     }
     written = show(text.append(tail), reading == Reading::snapshot ? Form::document : Form::text);
     if (written == kAnswerYes && outcome == kAnswerNo) {
-        tell(shownText(platform_->storeName()) + ": there is nothing to show");
+        tell("nothing to show: " + shownText(platform_->storeName()));
     }
     return written != kAnswerYes ? written : outcome;
 }
@@ -136,7 +136,7 @@ Answer Admin::write(std::string_view text, Form form) {
     }
     readerGone_ = status == kPipeClosing;
     return status == kSuccess || readerGone_ ? kAnswerYes
-                                             : fault(compose("standard output cannot be written: error %u", {status}));
+                                             : fault(compose("cannot write: standard output: error %u", {status}));
 }
 
 }  // namespace kz7

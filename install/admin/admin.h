@@ -1,5 +1,5 @@
-// What the subcommands of kz7admin share: the options of the program, the store that they open, and how they
-// answer. A subcommand has a file pair of its own with one function that adds it to the program.
+// The state that the subcommands of kz7admin share: the program's options, the open store and the output. Each
+// subcommand is a pair of files with one function that adds it to the program.
 #pragma once
 
 #include <functional>
@@ -14,41 +14,44 @@
 
 namespace kz7 {
 
-// What a subcommand exits with.
+// The exit status of a subcommand.
 enum Answer : int {
     kAnswerYes = 0,
-    kAnswerNo = 1,     // what was asked for is not there
-    kAnswerFault = 2,  // a store or a file that cannot be used, a command line that cannot be understood
+    kAnswerNo = 1,     // the result is empty, or a part of the work failed
+    kAnswerFault = 2,  // an unusable store, file or command line
 };
 
 class Admin {
 public:
     std::string storeDirectory;      // empty: the usual one
-    std::function<Answer()> answer;  // what the subcommand that was given does
+    std::function<Answer()> answer;  // runs the chosen subcommand
 
-    // Opens the ports once, for reading or also for writing. False, and told: this machine has no store of
-    // another place.
+    // Opens the ports, once. False, with a message: a store directory was given, and this machine's store is its
+    // registry.
     bool open(bool readOnly);
 
-    // Those that were opened.
+    // Only after open().
     IPlatform& platform() { return *platform_; }
     IRegistryStore& registry() { return platform_->registry(); }
 
-    // Shows the named key with all below it, or without a name all there is to show, between a head and a
-    // tail: `append` adds what a key looks like, also one that cannot be read, which is told. By pages it goes out
-    // while it is read and others may write in between; a snapshot is a document.
+    // What standard output is.
+    TerminalView output() { return platform_->terminal().look(TerminalStream::output); }
+
+    // Writes a key and its subkeys, or without a name everything, between a head and a tail. `append` formats a key,
+    // also one that cannot be read, which is reported. Pages are written while the store is read, and other programs
+    // may write in between; a snapshot is a document.
     using Appender = std::function<void(const KeyRecord&, std::string&)>;
     enum class Reading { snapshot, pages };
     Answer showKeys(const std::string& key, std::string text, const Appender& append, std::string_view tail,
                     Reading reading);
 
-    // Text for people, or what programs read: UTF-8 or bytes on every host.
+    // Text for people, or a document for programs: UTF-8 or bytes on every host.
     enum class Form { text, document };
 
-    // Writes to standard output; the store it comes from is told on standard error, once.
+    // Writes to standard output; names the store on standard error before the first text.
     Answer show(std::string_view text, Form form = Form::text);
 
-    // Which store was opened, and what to know about that.
+    // The name of the open store, with its note.
     std::string storeLine();
 
     // One line on standard error.
@@ -56,11 +59,11 @@ public:
     Answer no(std::string_view message);
     Answer fault(std::string_view message);
 
-    // The same for a status of the store, unless the store has told its fault already.
+    // The same with a status, unless the platform has reported a fault of the store.
     Answer storeFault(std::string_view what, Status status);
 
-    // Writes to standard output; a fault is told. A reader that is gone wants no more, which is no fault. A store that
-    // is open for reading is not held meanwhile.
+    // Writes to standard output and reports a failure. Succeeds if the reader has closed the pipe. Ends a read
+    // transaction first, so that a slow reader blocks no checkpoint.
     Answer write(std::string_view text, Form form = Form::text);
 
 private:

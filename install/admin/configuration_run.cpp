@@ -9,7 +9,7 @@ namespace {
 
 constexpr std::int32_t kVariablesTask = 1;
 constexpr std::int32_t kParametersTask = 2;
-constexpr std::string_view kTasks = "1,10;2,90";  // with the share of the time that each takes
+constexpr std::string_view kTasks = "1,10;2,90";  // with their shares of the time
 constexpr std::uint64_t kParametersStart = 10;
 
 // The log and the stream of one run.
@@ -49,7 +49,7 @@ private:
     UREExternalObserverStream* stream_ = nullptr;
 };
 
-// How many of the names nothing has; each is reported.
+// Records the names of the response file and reports those that are unknown; returns their number.
 std::uint32_t record(URE& engine, KZ7CfgHandler& handler) {
     std::uint32_t unknown = 0;
     for (const ResponseKeyword& keyword : engine.responses) {
@@ -68,7 +68,7 @@ std::uint32_t record(URE& engine, KZ7CfgHandler& handler) {
 
 ConfigurationOutcome runConfiguration(IPlatform& platform, ConfigurationRequest request) {
     ProfileRegistry profile(platform.registry(), request.copy);
-    // What was looked up so far keeps nobody waiting while the log begins.
+    // Ends the transaction of the lookups: others can write while the log is opened.
     profile.settle();
     URE engine(portsOf(platform));
     engine.mode = kModeConfigure;

@@ -1,5 +1,5 @@
-// A run of the installer runtime that sets what a response file says for a copy: progress and errors for a person or a
-// front end, everything in a log.
+// Sets the variables and parameters of a response file for a copy. Progress and errors are written for a user or a
+// front end, and all steps to a log.
 #pragma once
 
 #include <cstdint>

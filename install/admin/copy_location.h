@@ -7,7 +7,7 @@
 
 namespace kz7 {
 
-// The location that a copy's key holds, that key given by its path; empty where it cannot be read.
+// The location in the copy's key of that path; empty if it cannot be read.
 std::string locationOf(IRegistryStore& registry, const std::string& copyPath);
 
 }  // namespace kz7

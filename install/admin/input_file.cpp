@@ -10,7 +10,7 @@
 namespace kz7 {
 namespace {
 
-// 0 or the error of the call that failed.
+// 0 or an error number.
 int readInput(const std::string& path, std::string& bytes) {
     std::FILE* file = path == "-" ? stdin : openInput(path.c_str());
     if (file == nullptr) {

@@ -1,4 +1,4 @@
-// A file that a person names on the command line; "-" is standard input. What is wrong with it is told.
+// A file named on the command line; "-" is standard input. Errors are reported here.
 #pragma once
 
 #include <cstdint>
@@ -13,14 +13,14 @@ class InputFile {
 public:
     InputFile(Admin& admin, const std::string& path);
 
-    // The whole of it into bytes().
+    // Reads the whole file into bytes().
     Answer read();
     const std::string& bytes() const { return bytes_; }
 
-    // A line of it, counted from 1, that is none.
+    // Reports an error in a line, counted from 1.
     Answer badLine(std::uint32_t line, std::string_view reason);
 
-    // Its name for people.
+    // The name as messages show it.
     const std::string& shown() const { return shown_; }
 
 private:

@@ -3,7 +3,7 @@
 namespace kz7 {
 namespace {
 
-// Downwards along the first subkeys and back, so that neither depth nor width costs more than the keys do.
+// Descends along the first subkeys without recursion: the cost is linear in the number of keys at any depth.
 Status deleteKeys(IRegistryStore& registry, const KeyName& name) {
     struct Level {
         OwnedKey key;

@@ -1,4 +1,4 @@
-// What an import does, as a list that is made whole before the first of it is done.
+// The changes that an import makes. The list is complete before the first change is applied.
 #pragma once
 
 #include <cstdint>
@@ -10,24 +10,24 @@
 namespace kz7 {
 
 struct ValueChange {
-    std::uint32_t line = 0;  // of the file that asks for it
+    std::uint32_t line = 0;  // in the imported file
     std::string name;
     bool remove = false;
     ValueType type = ValueType::none;
     std::string data;
 };
 
-// Makes a key with its missing parents and changes its values in order, or deletes it with all below it.
+// Creates a key with its missing parents and changes its values in order, or deletes it with its subkeys.
 struct KeyChange {
     std::uint32_t line = 0;
     KeyName name;
-    std::string keyClass;  // given to a key that is made
+    std::string keyClass;  // of a key that is created
     bool remove = false;
     std::vector<ValueChange> values;
 };
 
-// Does all of it without a commit; what is to be deleted and is not there is no failure. On a failure `line`
-// is the one that asked for what failed, and what came before it is done.
+// Applies the changes without a commit; succeeds if an item to delete does not exist. On failure `line` is the line of
+// the change that failed; those before it are applied.
 Status applyChanges(IRegistryStore& registry, const std::vector<KeyChange>& changes, std::uint32_t& line);
 
 }  // namespace kz7

@@ -1,5 +1,4 @@
-// Names of keys as people and files write them, with their root in front, and what the programs of the product
-// keep in a registry that is not theirs alone.
+// Key names with their root, as users and files write them, and the product's keys in a machine's registry.
 #pragma once
 
 #include <array>
@@ -16,18 +15,18 @@ struct KeyName {
     std::string path;
 };
 
-// Takes "HKEY_LOCAL_MACHINE\a\b" or "HKLM\a\b" apart, and so for the users' and the caller's root; case does
-// not matter. False when the text begins with no root.
+// Splits "HKEY_LOCAL_MACHINE\a\b" or "HKLM\a\b", and the same for HKEY_USERS and HKEY_CURRENT_USER; ignores case.
+// False if the text does not begin with a root.
 bool parseKeyName(std::string_view text, KeyName& name);
 
-// The same for what a person types: without a root it lies below HKEY_LOCAL_MACHINE, and only separators
-// between names count, a run of them as one.
+// The same for a name from the command line: the default root is HKEY_LOCAL_MACHINE, and leading, trailing and repeated
+// separators are ignored.
 KeyName typedKeyName(std::string_view text);
 
-// With the root's full name.
+// The name with the root's full name.
 std::string fullKeyName(const KeyName& name);
 
-// Below HKEY_LOCAL_MACHINE. One that ends in '*' stands for every key whose name begins so.
+// Below HKEY_LOCAL_MACHINE. A trailing '*' matches every key whose name begins with the text before it.
 // clang-format off
 inline constexpr std::array<std::string_view, 6> kProductKeys = {
     "SOFTWARE\\NVQ\\KZ7",

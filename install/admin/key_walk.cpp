@@ -30,7 +30,7 @@ void sortByName(std::vector<Named>& items) {
     }
 }
 
-// One set of room serves a whole walk; it grows with the data and classes that it meets.
+// Keeps its buffers for a whole walk; they grow with the data and classes that it reads.
 class Reader {
 public:
     explicit Reader(IRegistryStore& registry) : registry_(registry) {}
@@ -50,7 +50,7 @@ public:
         });
     }
 
-    // Opens a key and reads what is in it.
+    // Opens a key and reads its values and the names of its subkeys.
     Status key(KeyHandle parent, std::string_view path, OwnedKey& key, std::vector<KeyValue>& values,
                std::vector<Subkey>& subkeys) {
         values.clear();
@@ -61,7 +61,7 @@ public:
         return status == kSuccess ? this->subkeys(key.get(), subkeys) : status;
     }
 
-    // Whether a key still lists a subkey that could not be read. False when the key itself is deleted.
+    // Whether a key still lists a subkey that could not be read. False if the key itself is deleted.
     bool isListed(KeyHandle parent, std::string_view name) {
         std::vector<Subkey> listed;
         const Status status = subkeys(parent, listed);
@@ -98,8 +98,7 @@ private:
     std::string data_ = std::string(4096, '\0');
 };
 
-// The keys that a path stands for, the last name in the store's spelling; kFileNotFound where not even their
-// parent is there.
+// The keys that a path matches, the last name in the store's spelling. kFileNotFound: their parent does not exist.
 Status addMatches(IRegistryStore& registry, KeyHandle root, std::string_view path, bool prefix,
                   std::vector<KeyStart>& starts) {
     const std::size_t cut = path.find_last_of('\\') + 1;
@@ -124,7 +123,7 @@ struct Level {
     OwnedKey key;
     std::vector<Subkey> subkeys;
     std::size_t next = 0;
-    std::size_t nameSize = 0;  // of the key's own full name
+    std::size_t nameSize = 0;  // of the key's full name
 };
 
 }  // namespace
@@ -141,7 +140,7 @@ Status findKey(IRegistryStore& registry, const KeyName& name, KeyStart& start) {
         status = addMatches(registry, name.root, name.path, false, found);
     }
     if (status == kSuccess) {
-        // None where the host folds more letters than we do.
+        // Not found where the host folds more letters than ASCII.
         start = found.empty() ? KeyStart{name, {}} : std::move(found.front());
     }
     return status;

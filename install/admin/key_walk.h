@@ -1,5 +1,5 @@
-// Reading trees of keys, in an order that does not hang on the store: keys by their upper-cased names, a key
-// before what is below it; values with the default one first, then by their upper-cased names.
+// Walks trees of keys in an order that does not depend on the store: keys by their upper-cased names, a key before its
+// subkeys; values by their upper-cased names, the default value first.
 #pragma once
 
 #include <functional>
@@ -17,36 +17,36 @@ struct KeyValue {
 };
 
 struct KeyRecord {
-    std::string name;       // with its root in front
+    std::string name;       // with its root
     std::size_t depth = 0;  // below the key that the walk began at
     std::string keyClass;
     bool hasSubkeys = false;
     std::vector<KeyValue> values;
-    Status status = kSuccess;  // else the key is listed but cannot be read, and nothing below it is visited
+    Status status = kSuccess;  // else the key is listed but cannot be read; its subkeys are skipped
 };
 
-// A root without values of its own: it is always there and tells nothing.
+// A root without values, which every store has.
 bool isBareRoot(const KeyRecord& record);
 
-// Anything but kSuccess ends the walk with that status.
+// Any other status than kSuccess ends the walk with that status.
 using KeyVisitor = std::function<Status(const KeyRecord&)>;
 
-// Where a walk begins: one key, its own name spelled as the store spells it and its parents' as they were
-// asked for, and its class.
+// The key at which a walk begins, and its class. The last name is spelled as in the store, its parents as the caller
+// spelled them.
 struct KeyStart {
     KeyName name;
     std::string keyClass;
 };
 
-// kFileNotFound: it is not there.
+// kFileNotFound: the key does not exist.
 Status findKey(IRegistryStore& registry, const KeyName& name, KeyStart& start);
 
-// What there is to show where no key is named: all of a store of our own, else what the product keeps in the
-// machine's registry. None is success.
+// The keys to show by default: the roots of an embedded store, else the product's keys in the machine's registry.
+// Succeeds if none exists.
 Status findEverything(IRegistryStore& registry, bool storeIsOwn, std::vector<KeyStart>& starts);
 
-// The key and all below it, however deep; a link is a key of its own and is not followed. kFileNotFound: it is not
-// there. A key that is deleted during the walk is left out.
+// Visits the key and its subkeys at any depth; a link is visited as a key of its own and is not followed. kFileNotFound:
+// the key does not exist. Skips keys that are deleted during the walk.
 Status walkKeys(IRegistryStore& registry, const KeyStart& start, const KeyVisitor& visit);
 
 }  // namespace kz7

@@ -2,19 +2,38 @@
 #include <cstdio>
 #include <exception>
 #include <new>
+#include <sstream>
 
 #include "install/admin/commands/aliases_command.h"
+#include "install/admin/commands/backup_command.h"
 #include "install/admin/commands/commit_command.h"
 #include "install/admin/commands/copies_command.h"
 #include "install/admin/commands/export_command.h"
 #include "install/admin/commands/front_command.h"
 #include "install/admin/commands/import_command.h"
 #include "install/admin/commands/tree_command.h"
+#include "install/platform/console.h"
 #include "install/platform/encoding.h"
 #include "install/platform/program.h"
 
 namespace kz7 {
 namespace {
+
+constexpr const char* kFooter =
+    "The usual state directory is $KZ7_STATE_DIR; else /var/lib/kz7 for root; else $XDG_STATE_HOME/kz7 or\n"
+    "~/.local/state/kz7. On Windows the store is the registry of the machine.\n"
+    "\n"
+    "Exit codes: 0 done; 1 no: not there, nothing to show, or something was not set; 2 fault: a store, file, key or\n"
+    "output that cannot be used, or a wrong command line. front exits as its program does.\n";
+
+// What help prints is output like any other.
+Answer showHelp(const CLI::App& program, const CLI::Success& help) {
+    std::ostringstream text;
+    program.exit(help, text, text);
+    const auto console = standardConsole();
+    const bool written = console->writeOutput(text.str()) == kSuccess && console->flush() == kSuccess;
+    return written ? kAnswerYes : kAnswerFault;
+}
 
 // Before there are ports, or without them.
 void tellFault(const std::string& reason) {
@@ -24,10 +43,13 @@ void tellFault(const std::string& reason) {
 int run(int argc, char** argv) {
     Admin admin;
     CLI::App program("Looks at what kz7InstallReg wrote and moves it", "kz7admin");
-    program.add_option("--store", admin.storeDirectory, "The state directory to use instead of the usual one");
+    program.add_option("--store", admin.storeDirectory, "The state directory to use instead of the usual one")
+        ->check(CLI::Validator([](const std::string& text) { return text.empty() ? "the name is empty" : ""; }, {}));
+    program.footer(kFooter);
     program.require_subcommand(0, 1);
     program.fallthrough();
     addAliasesCommand(program, admin);
+    addBackupCommand(program, admin);
     addCommitCommand(program, admin);
     addCopiesCommand(program, admin);
     addExportCommand(program, admin);
@@ -37,13 +59,13 @@ int run(int argc, char** argv) {
     try {
         program.parse(argc, argv);
     } catch (const CLI::Success& help) {
-        return program.exit(help);
+        return showHelp(program, help);
     } catch (const CLI::ParseError& error) {
         tellFault(shownText(error.what()) + " (see --help)");
         return kAnswerFault;
     }
     if (admin.answer == nullptr) {
-        std::fputs("kz7admin: no command is given (see --help)\n", stderr);
+        std::fputs("kz7admin: no command (see --help)\n", stderr);
         return kAnswerFault;
     }
     return admin.answer();

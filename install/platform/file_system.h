@@ -37,6 +37,12 @@ public:
 
     virtual Status closeFile(FileHandle file) = 0;
 
+    // Writes a whole file under a temporary name in the same folder, syncs it and renames it: the path names the old or
+    // the new content at any time. A new file belongs to its owner alone where the host has file modes. kFileExists:
+    // the path exists and `replace` is false. kPathNotFound: the folder is missing. kBadPathname: the path is empty, or
+    // names a link, a folder or a device.
+    virtual Status writeFile(std::string_view path, std::string_view content, bool replace) = 0;
+
     // Finds the first file, in name order, that matches a pattern: a path in whose last name '?' stands for any one
     // character. `name` is without the folder. kFileNotFound: none.
     virtual Status findFile(std::string_view pattern, std::string& name) = 0;

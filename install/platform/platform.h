@@ -74,6 +74,13 @@ public:
     // Whether a fault of the store was reported on standard error, so that its status needs no further line.
     virtual bool storeFaultTold() { return false; }
 
+    // The content of a file that holds the whole store as it is at one moment, also while others write.
+    // kFileNotFound: no store exists. kCallNotImplemented: the store is not the programs' own.
+    virtual Status storeImage(std::string&) { return kCallNotImplemented; }
+
+    // Whether a path, as users of this host write it, names one of the store's files.
+    virtual bool isStoreFile(const std::string&) { return false; }
+
 protected:
     Ports ports_;
 };

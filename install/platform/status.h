@@ -20,6 +20,7 @@ inline constexpr Status kOutOfMemory             = 14;
 inline constexpr Status kWriteFault              = 29;    // a stream does not take what is written
 inline constexpr Status kGeneralFailure          = 31;    // a device or resource failed in a way that has no number
 inline constexpr Status kEndOfFile               = 38;    // nothing is left to read
+inline constexpr Status kFileExists              = 80;
 inline constexpr Status kInvalidParameter        = 87;
 inline constexpr Status kBrokenPipe              = 109;   // every write end of a pipe that is read is closed
 inline constexpr Status kDiskFull                = 112;

@@ -16,7 +16,7 @@ struct TerminalView {
     bool terminal = false;      // else a file, a pipe or nothing
     bool redraws = false;       // a terminal on which a line can be drawn again
     bool colours = false;       // and colours are welcome
-    std::uint32_t columns = 0;  // of a terminal
+    std::uint32_t columns = 0;  // of a terminal; on POSIX $COLUMNS overrules its size
 };
 
 class ITerminal {

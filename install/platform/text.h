@@ -76,12 +76,11 @@ private:
     std::size_t length_ = 0;                         // bytes
 };
 
-// Columns that a character takes on a terminal whose first byte in UTF-8 this is, 0 for its other bytes.
-// Characters from the far end of the alphabet are mostly wide; taken too wide, a line just ends early.
-constexpr std::uint32_t columnsOf(char c) {
-    const auto byte = static_cast<unsigned char>(c);
-    return (byte & 0xC0) == 0x80 ? 0 : byte >= 0xE1 ? 2 : 1;
-}
+// Takes a character off a text that is not empty and returns the columns that it takes on a terminal: 0 for a combining
+// mark, 2 for a wide character of East Asia and for most emoji. A byte that is part of no character takes one.
+std::uint32_t takeColumns(std::string_view& text);
+
+std::uint32_t columnsOf(std::string_view text);
 
 // Takes the next line of at most `columns` columns off a text, broken at a blank where there is one; 0 columns
 // break nothing.

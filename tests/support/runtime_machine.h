@@ -17,7 +17,7 @@
 
 namespace kz7::test {
 
-// The process-wide observers of a test go with it, and nothing may then be open.
+// Its end releases the process-wide observers; nothing may be open after that.
 class RuntimeMachine : public MemoryPlatform {
 public:
     explicit RuntimeMachine(bool withSession = false) : engine(portsOf(*this, withSession ? &session : nullptr)) {
@@ -25,7 +25,7 @@ public:
         files_.add(std::string(kFolder) + "readme");
     }
     ~RuntimeMachine() override {
-        ObserversEnd{};
+        { const ObserversEnd end; }
         EXPECT_EQ(files_.openFiles() + processes_.openHandles() + session.openHandles(), 0U);
         EXPECT_EQ(registry_.openHandles(), 0U);
     }

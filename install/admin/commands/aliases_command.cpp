@@ -14,15 +14,15 @@ namespace kz7 {
 namespace {
 
 struct AliasRow {
-    std::string prefix;                               // as it is or would be spelled
-    std::array<std::optional<std::string>, 2> names;  // the copy that each view names
-    std::array<bool, 2> deletable = {};               // in each view; the rewrite's own walk gets to it
-    std::optional<std::string> should;                // none: the next rewrite deletes it where it gets to it
+    std::string prefix;                               // as stored, or as a rewrite would write it
+    std::array<std::optional<std::string>, 2> names;  // the copy that the alias names in each view
+    std::array<bool, 2> deletable = {};               // in each view: the rewrite's walk reaches it
+    std::optional<std::string> should;                // none: the next rewrite deletes it where its walk reaches it
     std::string version;                              // of the copy it should name
     bool exact = false;
 };
 
-// The names compare as the registry compares them, ordered as the rewrite orders them.
+// Compares as the registry does and orders as the rewrite does.
 struct ByPrefix {
     bool operator()(const std::string& left, const std::string& right) const {
         return foldUpper(left) < foldUpper(right);
@@ -36,7 +36,7 @@ AliasRow& rowOf(AliasRows& rows, std::string_view prefix) {
     return row;
 }
 
-// The values of one view, also those that the rewrite's own walk does not get to. kFileNotFound: it has no copies' key.
+// The values of one view, also those that the rewrite's walk does not reach. kFileNotFound: no copies' key exists.
 Status readValues(IRegistryStore& registry, std::string_view path, std::size_t view, AliasRows& rows) {
     OwnedKey key(registry);
     Status status = registry.openKey(KeyHandle::localMachine, path, kKeyRead, key.receive());
@@ -62,7 +62,7 @@ Status readValues(IRegistryStore& registry, std::string_view path, std::size_t v
     return isEndOfItems(status) ? kSuccess : status;
 }
 
-// What the rewrite would write; without the copies' key there is nothing.
+// The aliases that a rewrite would write; none if the copies' key is missing.
 void computeAliases(Admin& admin, AliasRows& rows) {
     InstallCopiesProfile profile(admin.registry(), admin.platform().debugOutput(), kKeyRead);
     if (profile.generateInstallCopiesList() != kSuccess || profile.generateProfileInfo() != kSuccess) {
@@ -81,7 +81,7 @@ std::string why(const AliasRow& row, std::string_view missingView) {
     if (!row.should) {
         std::string reason = "no copy has such a version; the next rewrite ";
         if (!missingView.empty()) {
-            return reason.append("leaves it: there is no key of the copies in the ").append(missingView) + " view";
+            return reason.append("leaves it: the copies' key is missing from the ").append(missingView) + " view";
         }
         const auto stays = [&](std::size_t view) { return row.names[view] && !row.deletable[view]; };
         if (!stays(0) && !stays(1)) {
@@ -93,8 +93,7 @@ std::string why(const AliasRow& row, std::string_view missingView) {
         return reason + ": a value name of 100 bytes or more ends its walk";
     }
     if (row.version.empty()) {
-        return row.exact ? "no copy has exactly this version; written empty"
-                         : "no version goes on behind it; written empty";
+        return row.exact ? "no copy has exactly this version; written empty" : "no version continues it; written empty";
     }
     return shownText(row.version) + (row.exact ? " is this version" : " is the highest that begins with it");
 }
@@ -120,7 +119,7 @@ Answer showAliases(Admin& admin, const std::string& asked) {
         if (isNotFound(status)) {
             missingView = view == 0 ? "native" : "32-bit";
         } else if (!succeeded(status)) {
-            return admin.storeFault("the aliases cannot be read", status);
+            return admin.storeFault("cannot read aliases", status);
         }
     }
     computeAliases(admin, rows);
@@ -135,9 +134,9 @@ Answer showAliases(Admin& admin, const std::string& asked) {
         }
     }
     if (table.size() == 1) {
-        return admin.no(shownText(admin.platform().storeName()) + ": there is no such alias and none is due");
+        return admin.no("no such alias: " + shownText(admin.platform().storeName()));
     }
-    return admin.show(tableText(table));
+    return admin.show(tableText(table, admin.output().columns));
 }
 
 }  // namespace

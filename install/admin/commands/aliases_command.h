@@ -1,4 +1,4 @@
-// kz7admin aliases: which copy each version prefix names, which it should name, and why.
+// kz7admin aliases: the copy that each version prefix names, the one that it should name, and why.
 #pragma once
 
 #include "install/admin/admin.h"

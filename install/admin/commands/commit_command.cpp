@@ -24,7 +24,7 @@ struct Words {
     bool machine = false;
 };
 
-// Whether a name is one part of a path, of the registry's and of the host's.
+// Whether a name is one component of registry paths and of host paths.
 bool isOneName(const std::string& name) {
     return name != "." && name != ".." &&
            std::none_of(name.begin(), name.end(), [](char c) { return c == '\\' || c == '/' || (c >= 0 && c < ' '); });
@@ -48,17 +48,17 @@ Answer findCopy(Admin& admin, const Words& words, ConfigurationRequest& request)
                               ? kFileNotFound
                               : admin.registry().openKey(KeyHandle::localMachine, path, kKeyRead, key.receive());
     if (isNotFound(status)) {
-        return admin.fault(shown + ": there is no such copy (see kz7admin copies)");
+        return admin.fault("no such copy: " + shown + " (see kz7admin copies)");
     }
     if (status != kSuccess) {
-        return admin.storeFault(shown + ": cannot be read", status);
+        return admin.storeFault("cannot read copy: " + shown, status);
     }
     request.copy = words.copy;
     request.location = locationOf(admin.registry(), path);
-    return request.location.empty() ? admin.fault(shown + ": the copy has no location") : kAnswerYes;
+    return request.location.empty() ? admin.fault("copy has no location: " + shown) : kAnswerYes;
 }
 
-// The log must open before anything is done.
+// Fails before anything is set if the log cannot be opened.
 Answer findLog(Admin& admin, const Words& words, ConfigurationRequest& request) {
     IFileSystem& files = admin.platform().files();
     Status status = kSuccess;
@@ -76,9 +76,8 @@ Answer findLog(Admin& admin, const Words& words, ConfigurationRequest& request) 
         status = files.openForAppend(request.logFile, log.receive());
     }
     const std::string shown = words.logFile.empty() ? files.shownPath(request.logFile) : words.logFile;
-    return status == kSuccess
-               ? kAnswerYes
-               : admin.fault(compose("%s: the log cannot be written: error %u", {shownText(shown), status}));
+    return status == kSuccess ? kAnswerYes
+                              : admin.fault(compose("cannot write log: %s: error %u", {shownText(shown), status}));
 }
 
 // A relative path begins at the current directory, as that of a response file does.
@@ -95,7 +94,7 @@ Answer findMessages(Admin& admin, const Words&, ConfigurationRequest& request) {
 
 Answer commit(Admin& admin, const Words& words) {
     if (!fitsCharacters(words.instance, kMaxInstanceName) || !isOneName(words.instance)) {
-        return admin.open(true) ? admin.fault(compose("%s: an instance name has at most %u characters and no separator",
+        return admin.open(true) ? admin.fault(compose("invalid instance name: %s: at most %u characters, no separators",
                                                       {shownText(words.instance), std::uint32_t{kMaxInstanceName}}))
                                 : kAnswerFault;
     }
@@ -113,10 +112,10 @@ Answer commit(Admin& admin, const Words& words) {
     const std::string log = admin.platform().files().shownPath(request.logFile);
     const ConfigurationOutcome outcome = runConfiguration(admin.platform(), std::move(request));
     if (outcome.kept != kSuccess) {
-        return admin.storeFault(shownText(words.copy) + ": what was set cannot be kept", outcome.kept);
+        return admin.storeFault("cannot save changes: " + shownText(words.copy), outcome.kept);
     }
     if (!words.machine) {
-        // Text that is lost is told; what was set is set.
+        // A failure is reported and does not change the exit status: the values are set.
         admin.write(compose("%s: %u set, %u not set; the log is %s\n",
                             {shownText(words.copy), outcome.set, outcome.notSet, shownText(log)}));
     }

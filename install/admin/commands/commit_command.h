@@ -1,4 +1,4 @@
-// kz7admin commit: configuration of a response file, set for an installed copy.
+// kz7admin commit: sets the configuration in a response file for an installed copy.
 #pragma once
 
 #include "install/admin/admin.h"

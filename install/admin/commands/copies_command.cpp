@@ -84,7 +84,7 @@ std::string stateOf(IServiceManager& services, ServiceHandle manager, const std:
 Answer readCopies(Admin& admin, CopyRows& rows) {
     for (std::size_t view = 0; view < kViews.size(); ++view) {
         if (const Status status = readView(admin, view, rows); !succeeded(status)) {
-            return admin.storeFault("the copies cannot be read", status);
+            return admin.storeFault("cannot read copies", status);
         }
     }
     IServiceManager& services = admin.platform().services();
@@ -98,7 +98,7 @@ Answer readCopies(Admin& admin, CopyRows& rows) {
     return admin.platform().storeFaultTold() ? kAnswerFault : kAnswerYes;
 }
 
-std::string copiesText(const CopyRows& copies) {
+std::string copiesText(const CopyRows& copies, std::uint32_t columns) {
     std::vector<TableRow> table = {{"NAME", "VIEW", "VERSION", "VALID", "LOCATION", "SERVICE"}};
     for (const auto& [fold, row] : copies) {
         for (std::size_t view = 0; view < kViews.size(); ++view) {
@@ -110,7 +110,7 @@ std::string copiesText(const CopyRows& copies) {
             }
         }
     }
-    return tableText(table);
+    return tableText(table, columns);
 }
 
 void appendMember(const char* name, std::string_view text, std::string& json) {
@@ -158,9 +158,9 @@ Answer showCopies(Admin& admin, bool json) {
     const std::string store = admin.platform().storeName();
     const Answer shown = admin.show(json             ? copiesJson(copies, store)
                                     : copies.empty() ? std::string{}
-                                                     : copiesText(copies),
+                                                     : copiesText(copies, admin.output().columns),
                                     json ? Admin::Form::document : Admin::Form::text);
-    return shown != kAnswerYes || !copies.empty() ? shown : admin.no(shownText(store) + ": there is no installed copy");
+    return shown != kAnswerYes || !copies.empty() ? shown : admin.no("no installed copy: " + shownText(store));
 }
 
 }  // namespace

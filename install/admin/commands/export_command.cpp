@@ -55,9 +55,22 @@ void appendJsonKey(const KeyRecord& key, std::string& json) {
     json += '}';
 }
 
+// Lines for a terminal. What is escaped here is not read back by an import.
+std::string shownLines(std::string_view text) {
+    std::string shown;
+    for (std::size_t end = 0; (end = text.find('\n')) != std::string_view::npos; text.remove_prefix(end + 1)) {
+        shown += shownText(text.substr(0, end)) + '\n';
+    }
+    return shown;
+}
+
 Answer exportKeys(Admin& admin, const ExportOptions& options) {
     if (!admin.open(true)) {
         return kAnswerFault;
+    }
+    const bool isTerminal = admin.output().terminal;
+    if (isTerminal && options.utf16) {
+        return admin.fault("cannot write UTF-16: standard output: is a terminal (redirect it to a file)");
     }
     std::string separator = "\n";
     if (options.json) {
@@ -82,7 +95,7 @@ Answer exportKeys(Admin& admin, const ExportOptions& options) {
             }
             std::string shown;
             appendRegText(key, shown);
-            text += options.utf16 ? utf16FileText(shown) : shown;
+            text += options.utf16 ? utf16FileText(shown) : isTerminal ? shownLines(shown) : shown;
         },
         {}, Admin::Reading::snapshot);
 }

@@ -10,7 +10,7 @@
 namespace kz7 {
 namespace {
 
-constexpr int kNotStarted = 127;  // as shells have it; all other codes are the program's
+constexpr int kNotStarted = 127;  // as in shells; all other codes are the program's
 
 Answer runProgram(Admin& admin, const std::vector<std::string>& command) {
     if (!admin.open(true)) {
@@ -31,11 +31,10 @@ Answer runProgram(Admin& admin, const std::vector<std::string>& command) {
     }
     const std::string program = shownText(command.front());
     if (isNotFound(status)) {
-        admin.tell(program + (isBareName(command.front())
-                                  ? ": there is no such program"
-                                  : ": there is no such program; its path must be a whole one, from the root"));
+        const char* const hint = isBareName(command.front()) ? "" : " (needs an absolute path)";
+        admin.tell("no such program: " + program + hint);
     } else {
-        admin.tell(compose("%s: cannot be run: error %u", {program, status}));
+        admin.tell(compose("cannot run program: %s: error %u", {program, status}));
     }
     return static_cast<Answer>(kNotStarted);
 }

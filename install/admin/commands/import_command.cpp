@@ -25,11 +25,11 @@ Answer importFile(Admin& admin, const std::string& path) {
     std::uint32_t line = 0;
     Status status = applyChanges(admin.registry(), changes, line);
     if (status != kSuccess) {
-        return admin.storeFault(compose("%s:%u: this cannot be done", {file.shown(), line}), status);
+        return admin.storeFault(compose("cannot apply: %s:%u", {file.shown(), line}), status);
     }
     status = admin.registry().commit();
     if (status != kSuccess) {
-        return admin.storeFault(file.shown() + ": what it asks for cannot be kept", status);
+        return admin.storeFault("cannot save changes: " + file.shown(), status);
     }
     std::size_t values = 0;
     for (const KeyChange& change : changes) {

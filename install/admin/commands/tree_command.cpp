@@ -16,14 +16,14 @@ std::string hexNumber(std::uint64_t number) {
     return text;
 }
 
-// Each text of the data in quotation marks; a terminator ends a text, and one that is missing is told.
+// The NUL-terminated texts of the data in quotation marks; notes a missing terminator.
 std::string shownTexts(std::string_view data) {
     std::string shown;
     while (!data.empty()) {
         const std::size_t end = data.find('\0');
         shown += " \"" + shownText(data.substr(0, end)) + '"';
         if (end == std::string_view::npos) {
-            return shown + " (without its end)";
+            return shown + " (no NUL terminator)";
         }
         data.remove_prefix(end + 1);
     }

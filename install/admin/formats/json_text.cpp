@@ -10,7 +10,7 @@ void appendJsonText(std::string_view text, std::string& json) {
     json += '"';
     for (std::u16string_view rest = utf16; !rest.empty();) {
         const char32_t character = takeUtf16(rest);
-        if (character < 0x20 || character == 0x7F || isSurrogate(character)) {
+        if (character < 0x20 || (character >= 0x7F && character < 0xA0) || isSurrogate(character)) {
             json += "\\u";
             for (int shift = 12; shift >= 0; shift -= 4) {
                 json += kDigits[character >> shift & 15];

@@ -1,9 +1,8 @@
-// Registry-editor text, version 5: the form in which keys leave a store and enter another. Both ways are pure:
-// text in, records or changes out, in time and room linear in their input.
+// Registry-editor text, version 5, in which keys move between stores. Time and memory are linear in the input.
 //
-// A round trip is exact in every byte. What plain text cannot hold travels so: a byte that is no character as
-// the lone surrogate U+DC00 + byte, control characters of names likewise, a text that is not one line with one
-// terminator as hex(1), and the class of a key as a comment line that other editors pass over.
+// A round trip preserves every byte. A byte that is not part of a character is written as the lone surrogate
+// U+DC00 + byte, as are control characters in names; a text that is not one line with one terminator as hex(1); the
+// class of a key as a comment, which other editors ignore.
 #pragma once
 
 #include <cstdint>
@@ -16,12 +15,11 @@
 
 namespace kz7 {
 
-// The first line of a file, and what each key adds to it; UTF-8, lines end in LF.
+// The first line of a file and the lines of a key: UTF-8 with LF.
 std::string regTextHeader();
 void appendRegText(const KeyRecord& key, std::string& text);
 
-// Such text as Windows' own editor stores it: UTF-16LE, lines end in CR LF. The mark of byte order is the
-// caller's to put first.
+// Converts such text to the form of Windows' own editor: UTF-16LE with CR LF. The caller writes the byte order mark.
 inline constexpr std::string_view kUtf16Mark = "\xFF\xFE";
 std::string utf16FileText(std::string_view text);
 

@@ -1,6 +1,7 @@
-// Rows of texts in columns that line up, for reading.
+// Tables for reading: rows of text in aligned columns.
 #pragma once
 
+#include <cstdint>
 #include <string>
 #include <vector>
 
@@ -8,7 +9,9 @@ namespace kz7 {
 
 using TableRow = std::vector<std::string>;
 
-// A line for each row, all of the first one's length; columns are as wide as their widest text.
-std::string tableText(const std::vector<TableRow>& rows);
+// All rows have the length of the first one, which holds the headings. `columns` is the width of the terminal; 0: no
+// limit. Cells of wide columns are wrapped to fit it. If that does not suffice, each row is a list of its headings and
+// cells.
+std::string tableText(const std::vector<TableRow>& rows, std::uint32_t columns);
 
 }  // namespace kz7

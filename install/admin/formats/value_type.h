@@ -1,4 +1,4 @@
-// The names that people know the types of values by.
+// Names and numbers of typed values.
 #pragma once
 
 #include <string_view>
@@ -7,10 +7,10 @@
 
 namespace kz7 {
 
-// Empty for a number without a name.
+// "REG_SZ" and so on; empty for an unknown type.
 std::string_view typeName(ValueType type);
 
-// The number that the bytes of a 4-byte dword or an 8-byte qword stand for; false for all others.
+// The number in a dword of 4 bytes or a qword of 8 bytes; false for all other data.
 bool numberOf(ValueType type, std::string_view data, std::uint64_t& number);
 
 }  // namespace kz7

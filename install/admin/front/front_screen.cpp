@@ -28,13 +28,12 @@ std::string wrapped(std::string_view text, std::uint32_t columns) {
 }
 
 std::string cutToColumns(std::string_view text, std::uint32_t columns) {
+    std::string_view rest = text;
     std::uint32_t used = 0;
-    std::size_t end = 0;
-    while (end < text.size() && used + columnsOf(text[end]) <= columns) {
-        used += columnsOf(text[end]);
-        ++end;
+    for (std::string_view next = text; !next.empty() && (used += takeColumns(next)) <= columns;) {
+        rest = next;
     }
-    return std::string(text.substr(0, end));
+    return std::string(text.substr(0, text.size() - rest.size()));
 }
 
 std::string plainLine(const FrontScreen::Bar& bar) {

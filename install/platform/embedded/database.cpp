@@ -54,4 +54,24 @@ int queryNumber(sqlite3* connection, const char* sql, std::int64_t& number) {
     return SQLITE_OK;
 }
 
+int copyToMemory(sqlite3* source, Connection& memory) {
+    sqlite3* opened = nullptr;
+    int result = sqlite3_open_v2(":memory:", &opened, SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX, nullptr);
+    Connection owned(opened);
+    if (result != SQLITE_OK) {
+        return result;
+    }
+    sqlite3_backup* const backup = sqlite3_backup_init(opened, "main", source, "main");
+    if (backup == nullptr) {
+        return sqlite3_errcode(opened);
+    }
+    result = sqlite3_backup_step(backup, -1);
+    const int finished = sqlite3_backup_finish(backup);
+    if (result != SQLITE_DONE) {
+        return finished == SQLITE_OK ? result : finished;
+    }
+    memory = std::move(owned);
+    return SQLITE_OK;
+}
+
 }  // namespace kz7

@@ -55,4 +55,8 @@ int execute(sqlite3* connection, const char* sql);
 // The first column of the statement's first row, as a number.
 int queryNumber(sqlite3* connection, const char* sql, std::int64_t& number);
 
+// Copies a whole database, as the source's transaction sees it, into a new one in memory. An error belongs to the
+// source.
+int copyToMemory(sqlite3* source, Connection& memory);
+
 }  // namespace kz7

@@ -4,6 +4,7 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <string_view>
 
 #include "install/platform/owned_handle.h"
 
@@ -30,5 +31,17 @@ public:
         receive() = descriptor;
     }
 };
+
+// False: errno is the reason, and a part may have been written.
+inline bool writeAll(int descriptor, std::string_view bytes) {
+    while (!bytes.empty()) {
+        const ssize_t written = ::write(descriptor, bytes.data(), bytes.size());
+        if (written == -1 && errno != EINTR) {
+            return false;
+        }
+        bytes.remove_prefix(written == -1 ? 0 : static_cast<std::size_t>(written));
+    }
+    return true;
+}
 
 }  // namespace kz7

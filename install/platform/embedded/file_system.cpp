@@ -13,6 +13,7 @@
 
 #include "install/platform/embedded/descriptor_table.h"
 #include "install/platform/embedded/paths.h"
+#include "install/platform/embedded/store_directory.h"
 
 namespace kz7 {
 namespace {
@@ -32,6 +33,8 @@ Status statusOf(int error) {
         case ENOENT:
         case ENOTDIR:
             return kFileNotFound;
+        case EEXIST:
+            return kFileExists;
         case EMFILE:
         case ENFILE:
             return kTooManyOpenFiles;
@@ -46,6 +49,27 @@ Status statusOf(int error) {
         default:
             return kGeneralFailure;
     }
+}
+
+// Makes a new file for its owner alone. 0 or an error number.
+int writeNewFile(int folder, const std::string& name, std::string_view content) {
+    const OwnedDescriptor file(
+        openat(folder, name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
+    return file && writeAll(file.get(), content) && fsync(file.get()) == 0 ? 0 : errno;
+}
+
+// Renames a file in its folder. 0 or an error number.
+int publish(int folder, const std::string& from, const std::string& to, bool replace) {
+    const char* const source = from.c_str();
+    const char* const target = to.c_str();
+    if (replace) {
+        return renameat(folder, source, folder, target) == 0 ? 0 : errno;
+    }
+    if (renameat2(folder, source, folder, target, RENAME_NOREPLACE) == 0) {
+        return 0;
+    }
+    // Network file systems know no such rename. The caller removes the first name.
+    return errno == EINVAL && linkat(folder, source, folder, target, 0) == 0 ? 0 : errno;
 }
 
 // The file-system port on POSIX: product paths are led into the state directory.
@@ -125,6 +149,38 @@ public:
         const int descriptor = taken.get();
         taken.leaveOpen();  // closed here, since some file systems report a failed write only now
         return close(descriptor) == 0 ? kSuccess : statusOf(errno);
+    }
+
+    Status writeFile(std::string_view path, std::string_view content, bool replace) override {
+        const std::string host = hostPath(path, stateDirectory_);
+        const std::size_t cut = host.find_last_of('/') + 1;
+        const std::string name = host.substr(cut);
+        if (cut == 0 || name.empty()) {
+            return kBadPathname;
+        }
+        const OwnedDescriptor folder(open(host.substr(0, cut).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+        if (!folder) {
+            return errno == ENOENT || errno == ENOTDIR ? kPathNotFound : statusOf(errno);
+        }
+        struct stat found {};
+        if (fstatat(folder.get(), name.c_str(), &found, AT_SYMLINK_NOFOLLOW) == 0 &&
+            (!S_ISREG(found.st_mode) || !replace)) {
+            return S_ISREG(found.st_mode) ? kFileExists : kBadPathname;
+        }
+        std::string unfinished;
+        if (!randomName(".kz7-", unfinished)) {
+            return statusOf(errno);
+        }
+        int error = writeNewFile(folder.get(), unfinished, content);
+        if (error == 0) {
+            error = publish(folder.get(), unfinished, name, replace);
+        }
+        // Without effect after a rename.
+        unlinkat(folder.get(), unfinished.c_str(), 0);
+        if (error == 0 && fsync(folder.get()) != 0) {
+            error = errno;
+        }
+        return error == 0 ? kSuccess : statusOf(error);
     }
 
     Status findFile(std::string_view pattern, std::string& name) override {

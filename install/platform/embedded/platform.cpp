@@ -48,6 +48,9 @@ public:
     std::string storeName() override { return registry_.path(); }
     bool storeFaultTold() override { return faultTold_; }
 
+    Status storeImage(std::string& image) override { return registry_.image(image); }
+    bool isStoreFile(const std::string& path) override { return registry_.isFile(path); }
+
     std::string storeNote() override {
         const std::string machine(kMachineStateDirectory);
         const bool hidden = access((machine + "/registry.db").c_str(), R_OK) != 0 && errno == EACCES;

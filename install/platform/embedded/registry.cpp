@@ -104,9 +104,7 @@ Status EmbeddedRegistry::begin() {
         return fault_;
     }
     if (connection_ == nullptr) {
-        const StoreFault fault = !readOnly_       ? file_.openForWriting(connection_)
-                                 : file_.exists() ? file_.open(connection_)
-                                                  : file_.openEmpty(connection_);
+        const StoreFault fault = readOnly_ ? file_.openForReading(connection_) : file_.openForWriting(connection_);
         if (fault.status != kSuccess) {
             return fail(fault);
         }
@@ -175,6 +173,29 @@ Status EmbeddedRegistry::commit() {
     }
     endTransaction();
     return std::exchange(fault_, kSuccess);
+}
+
+Status EmbeddedRegistry::image(std::string& bytes) {
+    if (const Status status = begin(); status != kSuccess) {
+        return status;
+    }
+    if (!file_.exists()) {
+        return kFileNotFound;
+    }
+    // Not serialized directly: that would turn pages that cannot be read into zeros.
+    Connection memory;
+    const int result = copyToMemory(connection_.get(), memory);
+    if (result != SQLITE_OK) {
+        return fail(result);
+    }
+    sqlite3_int64 size = 0;
+    const std::unique_ptr<unsigned char, void (*)(void*)> content(sqlite3_serialize(memory.get(), "main", &size, 0),
+                                                                  sqlite3_free);
+    if (content == nullptr) {
+        return fail(SQLITE_NOMEM);
+    }
+    bytes.assign(reinterpret_cast<const char*>(content.get()), static_cast<std::size_t>(size));
+    return kSuccess;
 }
 
 Query EmbeddedRegistry::query(Sql which) {

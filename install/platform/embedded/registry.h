@@ -28,6 +28,10 @@ public:
     ~EmbeddedRegistry() override;
 
     const std::string& path() const { return file_.path(); }
+    bool isFile(const std::string& path) const { return file_.isPart(path); }
+
+    // The content of a file with the whole store, in this transaction. kFileNotFound: no store exists.
+    Status image(std::string& bytes);
 
     Status openKey(KeyHandle parent, std::string_view path, AccessMask access, KeyHandle& key) override;
     Status createKey(KeyHandle parent, std::string_view path, std::string_view keyClass, AccessMask access,

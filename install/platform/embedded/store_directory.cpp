@@ -101,17 +101,21 @@ int lockFolder(const std::string& path, int milliseconds, OwnedDescriptor& folde
     return 0;
 }
 
-bool unfinishedStoreName(std::string& name) {
+bool randomName(const std::string& prefix, std::string& name) {
     std::array<unsigned char, kNoiseSize> noise{};
     if (getrandom(noise.data(), noise.size(), 0) != static_cast<ssize_t>(noise.size())) {
         return false;
     }
-    name = unfinishedPrefix();
+    name = prefix;
     for (const unsigned char byte : noise) {
         name += kDigits[byte >> 4];
         name += kDigits[byte & 15];
     }
     return true;
+}
+
+bool unfinishedStoreName(std::string& name) {
+    return randomName(unfinishedPrefix(), name);
 }
 
 void removeUnfinishedStores(const std::string& path) {

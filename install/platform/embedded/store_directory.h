@@ -22,7 +22,8 @@ int makeFolder(const std::string& path);
 // dies. EWOULDBLOCK: another process held the lock all the time.
 int lockFolder(const std::string& path, int milliseconds, OwnedDescriptor& folder);
 
-// A name for a store that is being built, which nobody can guess. False when the system has no randomness.
+// Names for files that are being built: a prefix and random digits. False: errno is the reason.
+bool randomName(const std::string& prefix, std::string& name);
 bool unfinishedStoreName(std::string& name);
 
 // Removes what builders of a store have left in a directory. The caller holds its lock, so all of them are dead.

@@ -7,7 +7,10 @@
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
+#include <filesystem>
 #include <memory>
+
+#include "install/platform/embedded/store_copy.h"
 
 namespace kz7 {
 namespace {
@@ -66,6 +69,11 @@ bool isTooLong(const std::string& directory) {
            (resolved != nullptr && std::strlen(resolved.get()) > kLongestDirectory);
 }
 
+bool isReadableFile(const std::string& path) {
+    struct stat found {};
+    return stat(path.c_str(), &found) == 0 && S_ISREG(found.st_mode) && access(path.c_str(), R_OK) == 0;
+}
+
 }  // namespace
 
 StoreFile::StoreFile(std::string directory) : directory_(std::move(directory)), path_(directory_ + '/' + kStoreName) {}
@@ -73,6 +81,22 @@ StoreFile::StoreFile(std::string directory) : directory_(std::move(directory)), 
 bool StoreFile::exists() const {
     // Only a definite "not there" is one: a folder that may not be searched is an error of the open.
     return access(path_.c_str(), F_OK) == 0 || (errno != ENOENT && errno != ENOTDIR);
+}
+
+bool StoreFile::isPart(const std::string& path) const {
+    namespace fs = std::filesystem;
+    std::error_code ignored;
+    const fs::path asked = fs::absolute(path, ignored);
+    // A store that is a link has the other files next to the file that it leads to.
+    for (const fs::path& store : {fs::path(path_), fs::weakly_canonical(path_, ignored)}) {
+        const std::string name = store.filename().string();
+        const std::string other = asked.filename().string();
+        if ((other == name || other.starts_with(name + '-')) &&
+            fs::equivalent(asked.parent_path(), store.parent_path(), ignored)) {
+            return true;
+        }
+    }
+    return false;
 }
 
 StoreFault StoreFile::refused(Status status, const std::string& file, int error) const {
@@ -94,7 +118,45 @@ StoreFault StoreFile::openForWriting(Connection& connection) {
             return fault;
         }
     }
-    return open(connection);
+    return open(SQLITE_OPEN_READWRITE, connection);
+}
+
+StoreFault StoreFile::openForReading(Connection& connection) {
+    StoreFault fault = checkDirectory();
+    if (fault.status != kSuccess || !exists()) {
+        return fault.status != kSuccess ? fault : openEmpty(connection);
+    }
+    fault = open(SQLITE_OPEN_READONLY, connection);
+    // A log is read through a shared-memory file, which cannot always be made.
+    const bool refused = fault.status == kCannotOpen || fault.status == kAccessDenied;
+    return refused && isReadableFile(path_) ? openCopy(connection) : fault;
+}
+
+StoreFault StoreFile::checkDirectory() const {
+    if (directory_.empty()) {
+        return {kCannotOpen, "state directory", "neither KZ7_STATE_DIR nor HOME is set"};
+    }
+    struct stat found {};
+    if (stat(directory_.c_str(), &found) != 0) {
+        return refused(kCannotOpen, directory_, errno);
+    }
+    return S_ISDIR(found.st_mode) ? StoreFault{} : refused(kCannotOpen, directory_, ENOTDIR);
+}
+
+// Into memory, so that the copy's files are gone at once.
+StoreFault StoreFile::openCopy(Connection& connection) const {
+    StoreCopy copy;
+    if (const int error = copy.make(path_); error != 0) {
+        return refused(kCannotOpen, path_ + ": cannot make a private copy", error);
+    }
+    sqlite3* opened = nullptr;
+    int result = sqlite3_open_v2(copy.path().c_str(), &opened, SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX, nullptr);
+    const Connection source(opened);
+    if (StoreFault fault = checkVersion(opened, result); fault.status != kSuccess) {
+        return fault;
+    }
+    result = copyToMemory(opened, connection);
+    return result == SQLITE_OK ? StoreFault{} : explain(opened, result);
 }
 
 // Several processes may make the store at once: one of them holds the lock of the directory and builds it under
@@ -102,7 +164,7 @@ StoreFault StoreFile::openForWriting(Connection& connection) {
 // (Switching a shared new file to a write-ahead log instead fails whatever the busy timeout.)
 StoreFault StoreFile::make() {
     if (directory_.empty()) {
-        return {kCannotOpen, "state directory", "neither KZ7_STATE_DIR nor HOME is set"};
+        return checkDirectory();
     }
     if (const int error = makeFolder(directory_); error != 0) {
         return refused(kCannotOpen, directory_, error);
@@ -136,7 +198,7 @@ StoreFault StoreFile::build(const OwnedDescriptor& folder) {
         return refused(kCannotOpen, directory_ + '/' + name, errno);
     }
     Connection connection;
-    int result = connect(name, connection);
+    int result = connect(name, SQLITE_OPEN_READWRITE, connection);
     // The schema first: a small file in rollback mode is written once, the switch then only marks its header.
     for (const char* sql :
          {"PRAGMA page_size = 4096; PRAGMA synchronous = OFF; BEGIN", kSchema, "COMMIT", "PRAGMA journal_mode = WAL"}) {
@@ -156,7 +218,7 @@ StoreFault StoreFile::build(const OwnedDescriptor& folder) {
     return {};
 }
 
-int StoreFile::connect(const std::string& name, Connection& connection) {
+int StoreFile::connect(const std::string& name, int flags, Connection& connection) {
     std::string path = directory_ + '/' + name;
     const char* system = nullptr;
     if (isTooLong(directory_)) {
@@ -167,16 +229,15 @@ int StoreFile::connect(const std::string& name, Connection& connection) {
         system = fileSystemOfGivenNames();
     }
     sqlite3* opened = nullptr;
-    const int result = sqlite3_open_v2(path.c_str(), &opened, SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX, system);
+    const int result = sqlite3_open_v2(path.c_str(), &opened, flags | SQLITE_OPEN_NOMUTEX, system);
     connection.reset(opened);
     return result;
 }
 
-StoreFault StoreFile::open(Connection& connection) {
+StoreFault StoreFile::open(int flags, Connection& connection) {
     Connection owned;
-    int result = connect(kStoreName, owned);
+    int result = connect(kStoreName, flags, owned);
     sqlite3* const opened = owned.get();
-    std::int64_t version = 0;
     if (result == SQLITE_OK) {
         sqlite3_extended_result_codes(opened, 1);
         sqlite3_busy_timeout(opened, kBusyTimeout);
@@ -184,11 +245,21 @@ StoreFault StoreFile::open(Connection& connection) {
         sqlite3_db_config(opened, SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 1, nullptr);
         result = execute(opened, "PRAGMA synchronous = FULL; PRAGMA wal_autocheckpoint = 0");
     }
+    StoreFault fault = checkVersion(opened, result);
+    if (fault.status == kSuccess) {
+        connection = std::move(owned);
+    }
+    return fault;
+}
+
+// `result` is that of opening the connection.
+StoreFault StoreFile::checkVersion(sqlite3* connection, int result) const {
+    std::int64_t version = 0;
     if (result == SQLITE_OK) {
-        result = queryNumber(opened, "PRAGMA user_version", version);
+        result = queryNumber(connection, "PRAGMA user_version", version);
     }
     if (result != SQLITE_OK) {
-        return explain(opened, result);
+        return explain(connection, result);
     }
     if (version > kSchemaVersion) {
         return {kRevisionMismatch, path_, "was written by a newer version of this program"};
@@ -196,7 +267,6 @@ StoreFault StoreFile::open(Connection& connection) {
     if (version < kSchemaVersion) {
         return {kNotRegistryFile, path_, "is not a registry store"};
     }
-    connection = std::move(owned);
     return {};
 }
 

@@ -23,23 +23,29 @@ public:
     const std::string& path() const { return path_; }
     bool exists() const;
 
+    // Whether a host path names the store, its log or another file that SQLite keeps next to it.
+    bool isPart(const std::string& path) const;
+
     // Makes the state directory (mode 0700) and the store when they are missing, and opens it as a writer.
     StoreFault openForWriting(Connection& connection);
 
-    // Opens a store that exists. A connection must be closed before this object goes.
-    StoreFault open(Connection& connection);
-
-    // An empty store in memory, for reading where there is none.
-    StoreFault openEmpty(Connection& connection) const;
+    // Opens the store for reading, also where this process may not write; one in an existing directory that has none
+    // reads as empty. A connection must be closed before this object goes.
+    StoreFault openForReading(Connection& connection);
 
     // What a failed SQLite call on this store means.
     StoreFault explain(sqlite3* connection, int result) const;
 
 private:
+    StoreFault checkDirectory() const;
+    StoreFault open(int flags, Connection& connection);
+    StoreFault openCopy(Connection& connection) const;
+    StoreFault openEmpty(Connection& connection) const;
+    StoreFault checkVersion(sqlite3* connection, int result) const;
     StoreFault make();
     StoreFault build(const OwnedDescriptor& folder);
     // Opens the file of that name in the state directory; the connection is there on failure too, for its message.
-    int connect(const std::string& name, Connection& connection);
+    int connect(const std::string& name, int flags, Connection& connection);
     StoreFault refused(Status status, const std::string& file, int error) const;
     StoreFault stayedLocked() const;
 

@@ -5,6 +5,7 @@
 #include <array>
 #include <atomic>
 #include <cerrno>
+#include <charconv>
 #include <csignal>
 #include <cstdio>
 #include <cstdlib>
@@ -21,6 +22,17 @@ constexpr int kPollInterval = 100;  // milliseconds between two looks at endRead
 std::string_view environment(const char* name) {
     const char* value = std::getenv(name);
     return value == nullptr ? std::string_view{} : value;
+}
+
+// $COLUMNS, which users set to overrule the terminal; else the width of its window.
+std::uint32_t columnsOf(int descriptor) {
+    const std::string_view named = environment("COLUMNS");
+    std::uint32_t columns = 0;
+    if (std::from_chars(named.data(), named.data() + named.size(), columns).ec == std::errc{} && columns != 0) {
+        return columns;
+    }
+    winsize size{};
+    return ioctl(descriptor, TIOCGWINSZ, &size) == 0 && size.ws_col != 0 ? size.ws_col : kUsualColumns;
 }
 
 class EmbeddedTerminal final : public ITerminal {
@@ -42,9 +54,7 @@ public:
         TerminalView view;
         view.terminal = isatty(descriptor) == 1;
         if (view.terminal) {
-            winsize size{};
-            const bool known = ioctl(descriptor, TIOCGWINSZ, &size) == 0 && size.ws_col != 0;
-            view.columns = known ? size.ws_col : kUsualColumns;
+            view.columns = columnsOf(descriptor);
             const std::string_view kind = environment("TERM");
             view.redraws = !kind.empty() && kind != "dumb";
             view.colours = view.redraws && environment("NO_COLOR").empty();

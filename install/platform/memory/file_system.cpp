@@ -82,6 +82,24 @@ Status MemoryFileSystem::closeFile(FileHandle file) {
     return open_.erase(file) != 0 ? kSuccess : kInvalidHandle;
 }
 
+Status MemoryFileSystem::writeFile(std::string_view path, std::string_view content, bool replace) {
+    if (const auto found = files_.find(keyOf(path)); found != files_.end()) {
+        if (found->second->isFolder || !replace) {
+            return found->second->isFolder ? kBadPathname : kFileExists;
+        }
+    }
+    if (content.size() > room) {
+        return kDiskFull;
+    }
+    OwnedFile file(*this);
+    const Status status = openForAppend(path, file.receive());
+    if (status == kSuccess) {
+        open_.at(file.get())->content = content;
+        room -= content.size();
+    }
+    return status == kFileNotFound ? kBadPathname : status;
+}
+
 Status MemoryFileSystem::findFile(std::string_view pattern, std::string& name) {
     const std::string key = keyOf(pattern);
     for (const auto& [path, file] : files_) {

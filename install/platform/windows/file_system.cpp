@@ -1,9 +1,11 @@
+#define _CRT_RAND_S
 #include "install/platform/windows/file_system.h"
 
 #include <io.h>
 #include <windows.h>
 
 #include <cerrno>
+#include <cstdlib>
 #include <string>
 
 #include "install/platform/windows/native_handle.h"
@@ -15,6 +17,7 @@ namespace {
 
 constexpr std::size_t kReadPiece = 64 * 1024;
 constexpr DWORD kWithoutOurRights = SECURITY_SQOS_PRESENT | SECURITY_IDENTIFICATION;
+constexpr std::size_t kWritePiece = 1 << 30;
 
 HANDLE native(FileHandle file) {
     return reinterpret_cast<HANDLE>(static_cast<std::uintptr_t>(file));
@@ -47,6 +50,31 @@ bool liesAt(HANDLE file, std::string_view path) {
     const WideText left(withoutSeparator(place));
     const WideText right(withoutSeparator(asked));
     return left.size() != 0 && CompareStringOrdinal(left.c_str(), -1, right.c_str(), -1, TRUE) == CSTR_EQUAL;
+}
+
+// A name for a new file in a folder; empty when the system has no randomness.
+std::string randomName(std::string_view folder) {
+    static constexpr char kDigits[] = "0123456789abcdef";
+    std::string name = std::string(folder) + ".kz7-";
+    for (int word = 0; word < 4; ++word) {
+        unsigned noise = 0;
+        if (rand_s(&noise) != 0) {
+            return {};
+        }
+        for (int shift = 28; shift >= 0; shift -= 4) {
+            name += kDigits[noise >> shift & 15];
+        }
+    }
+    return name;
+}
+
+Status checkTarget(const std::string& path, bool replace) {
+    const DWORD found = GetFileAttributesW(WideText(path).c_str());
+    if (found == INVALID_FILE_ATTRIBUTES) {
+        return kSuccess;
+    }
+    constexpr DWORD kNotAFile = FILE_ATTRIBUTE_DIRECTORY | FILE_ATTRIBUTE_DEVICE | FILE_ATTRIBUTE_REPARSE_POINT;
+    return (found & kNotAFile) != 0 ? kBadPathname : replace ? kSuccess : kFileExists;
 }
 
 }  // namespace
@@ -133,6 +161,42 @@ Status WindowsFileSystem::write(FileHandle file, std::string_view data, std::uin
 
 Status WindowsFileSystem::closeFile(FileHandle file) {
     return CloseHandle(native(file)) != FALSE ? kSuccess : GetLastError();
+}
+
+Status WindowsFileSystem::writeFile(std::string_view path, std::string_view content, bool replace) {
+    const std::string target(path);
+    const std::string unfinished = randomName(path.substr(0, path.find_last_of("\\/") + 1));
+    if (namesNothing(path) || target.ends_with('\\') || target.ends_with('/')) {
+        return kBadPathname;
+    }
+    if (const Status status = checkTarget(target, replace); status != kSuccess || unfinished.empty()) {
+        return status != kSuccess ? status : kGeneralFailure;
+    }
+    const HANDLE opened = CreateFileW(WideText(unfinished).c_str(), GENERIC_WRITE, 0, nullptr, CREATE_NEW,
+                                      FILE_ATTRIBUTE_NORMAL, nullptr);
+    if (opened == INVALID_HANDLE_VALUE) {
+        return GetLastError();
+    }
+    OwnedFile file(*this);
+    file.receive() = FileHandle{reinterpret_cast<std::uintptr_t>(opened)};
+    Status status = kSuccess;
+    while (status == kSuccess && !content.empty()) {
+        std::uint32_t written = 0;
+        status = write(file.get(), content.substr(0, kWritePiece), written);
+        content.remove_prefix(written);
+    }
+    if (status == kSuccess && FlushFileBuffers(opened) == FALSE) {
+        status = GetLastError();
+    }
+    file.reset();
+    const DWORD how = MOVEFILE_WRITE_THROUGH | (replace ? DWORD{MOVEFILE_REPLACE_EXISTING} : 0);
+    if (status == kSuccess && MoveFileExW(WideText(unfinished).c_str(), WideText(target).c_str(), how) == FALSE) {
+        status = GetLastError() == ERROR_ALREADY_EXISTS ? kFileExists : GetLastError();
+    }
+    if (status != kSuccess) {
+        DeleteFileW(WideText(unfinished).c_str());
+    }
+    return status;
 }
 
 Status WindowsFileSystem::findFile(std::string_view pattern, std::string& name) {

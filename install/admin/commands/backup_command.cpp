@@ -1,0 +1,105 @@
+#include "install/admin/commands/backup_command.h"
+
+#include <CLI/CLI.hpp>
+#include <array>
+#include <memory>
+
+#include "install/admin/formats/reg_text.h"
+#include "install/platform/text.h"
+
+namespace kz7 {
+namespace {
+
+struct BackupOptions {
+    std::string file;
+    bool force = false;
+};
+
+Answer fail(Admin& admin, const BackupOptions& options, std::string_view reason) {
+    return admin.fault(compose("cannot write backup: %s: %s", {shownText(options.file), reason}));
+}
+
+// The product's keys in the registry of a machine, as its own editor reads them. A key that cannot be read fails the
+// backup.
+Answer readKeys(Admin& admin, std::string& content) {
+    std::vector<KeyStart> starts;
+    Status status = findEverything(admin.registry(), false, starts);
+    std::string text = regTextHeader();
+    const auto append = [&text](const KeyRecord& key) {
+        if (key.status == kSuccess) {
+            appendRegText(key, text);
+        }
+        return key.status;
+    };
+    for (auto start = starts.begin(); status == kSuccess && start != starts.end(); ++start) {
+        status = walkKeys(admin.registry(), *start, append);
+    }
+    if (status != kSuccess) {
+        return admin.storeFault("cannot read keys: " + admin.platform().storeName(), status);
+    }
+    content = std::string(kUtf16Mark) + utf16FileText(text);
+    return starts.empty() ? admin.no("nothing to back up: " + admin.platform().storeName()) : kAnswerYes;
+}
+
+Answer readStore(Admin& admin, std::string& content) {
+    if (!admin.platform().storeIsOwn()) {
+        return readKeys(admin, content);
+    }
+    const Status status = admin.platform().storeImage(content);
+    if (isNotFound(status)) {
+        return admin.no("nothing to back up: " + shownText(admin.platform().storeName()));
+    }
+    return status == kSuccess ? kAnswerYes : admin.storeFault("cannot read store", status);
+}
+
+std::string reasonOf(Status status) {
+    // clang-format off
+    static constexpr std::array<std::pair<Status, std::string_view>, 5> kReasons = {{
+        {kFileExists,   "file exists (--force replaces it)"},
+        {kPathNotFound, "no such directory"},
+        {kBadPathname,  "not a regular file"},
+        {kAccessDenied, "permission denied"},
+        {kDiskFull,     "no space left on device"},
+    }};
+    // clang-format on
+    for (const auto& [number, reason] : kReasons) {
+        if (number == status) {
+            return std::string(reason);
+        }
+    }
+    return compose("error %u", {status});
+}
+
+Answer backUp(Admin& admin, const BackupOptions& options) {
+    if (!admin.open(true)) {
+        return kAnswerFault;
+    }
+    IFileSystem& files = admin.platform().files();
+    std::string path;
+    if (const Status status = files.productPath(options.file, path); status != kSuccess) {
+        return fail(admin, options, reasonOf(status));
+    }
+    if (admin.platform().isStoreFile(options.file)) {
+        return fail(admin, options, "part of the store itself");
+    }
+    std::string content;
+    if (const Answer read = readStore(admin, content); read != kAnswerYes) {
+        return read;
+    }
+    if (const Status status = files.writeFile(path, content, options.force); status != kSuccess) {
+        return fail(admin, options, reasonOf(status));
+    }
+    return admin.write(compose("backed up %s to %s\n", {admin.storeLine(), shownText(options.file)}));
+}
+
+}  // namespace
+
+void addBackupCommand(CLI::App& program, Admin& admin) {
+    auto* command = program.add_subcommand("backup", "Write the whole store to one file");
+    auto options = std::make_shared<BackupOptions>();
+    command->add_option("FILE", options->file, "The file to make")->required();
+    command->add_flag("--force", options->force, "Replace an existing file");
+    command->callback([&admin, options] { admin.answer = [&admin, options] { return backUp(admin, *options); }; });
+}
+
+}  // namespace kz7

@@ -1,0 +1,81 @@
+#include "install/platform/embedded/store_copy.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+
+#include <array>
+#include <cerrno>
+#include <cstdlib>
+#include <filesystem>
+#include <vector>
+
+#include "install/platform/embedded/descriptor.h"
+
+namespace kz7 {
+namespace {
+
+constexpr int kTries = 20;
+constexpr const char* kLogSuffix = "-wal";
+
+// Changes with every write to a file; all zero where there is none.
+std::array<std::int64_t, 4> stampOf(const std::string& path) {
+    struct stat found {};
+    return stat(path.c_str(), &found) != 0
+               ? std::array<std::int64_t, 4>{}
+               : std::array<std::int64_t, 4>{static_cast<std::int64_t>(found.st_ino), found.st_size,
+                                             found.st_mtim.tv_sec, found.st_mtim.tv_nsec};
+}
+
+// 0 or an error number.
+int copyFile(const std::string& from, const std::string& to) {
+    const OwnedDescriptor source(open(from.c_str(), O_RDONLY | O_CLOEXEC));
+    const OwnedDescriptor target(source ? open(to.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_NOFOLLOW | O_CLOEXEC, 0600)
+                                        : -1);
+    if (!target) {
+        return errno;
+    }
+    std::vector<char> piece(std::size_t{1} << 16);
+    for (;;) {
+        const ssize_t count = read(source.get(), piece.data(), piece.size());
+        if (count == 0) {
+            return 0;
+        }
+        if (count < 0 ? errno != EINTR : !writeAll(target.get(), {piece.data(), static_cast<std::size_t>(count)})) {
+            return errno;
+        }
+    }
+}
+
+}  // namespace
+
+StoreCopy::~StoreCopy() {
+    std::error_code ignored;
+    if (!folder_.empty()) {
+        std::filesystem::remove_all(folder_, ignored);
+    }
+}
+
+int StoreCopy::make(const std::string& store) {
+    const char* named = std::getenv("TMPDIR");
+    std::string folder = std::string(named == nullptr || *named == '\0' ? "/tmp" : named) + "/kz7-XXXXXX";
+    if (mkdtemp(folder.data()) == nullptr) {
+        return errno;
+    }
+    folder_ = folder;
+    for (int tries = 0; tries < kTries; ++tries) {
+        // A checkpoint moves pages from the log to the store: both copies must be of one moment.
+        const std::array before = {stampOf(store), stampOf(store + kLogSuffix)};
+        std::remove((path() + kLogSuffix).c_str());
+        int error = copyFile(store, path());
+        if (error == 0 && before[1] != stampOf({})) {
+            error = copyFile(store + kLogSuffix, path() + kLogSuffix);
+        }
+        const bool same = before == std::array{stampOf(store), stampOf(store + kLogSuffix)};
+        if (same || (error != 0 && error != ENOENT)) {
+            return error;
+        }
+    }
+    return EAGAIN;
+}
+
+}  // namespace kz7

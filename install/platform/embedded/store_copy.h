@@ -1,0 +1,26 @@
+// A private copy of a store, for reading where SQLite cannot keep its shared-memory file next to the original.
+#pragma once
+
+#include <string>
+
+namespace kz7 {
+
+// The copy lasts as long as the object.
+class StoreCopy {
+public:
+    StoreCopy() = default;
+    StoreCopy(const StoreCopy&) = delete;
+    StoreCopy& operator=(const StoreCopy&) = delete;
+    ~StoreCopy();
+
+    // Copies a store and its log, as they are at one moment, to a directory of its own below $TMPDIR or /tmp. 0 or an
+    // error number; EAGAIN: others kept changing the files.
+    int make(const std::string& store);
+
+    std::string path() const { return folder_ + "/copy"; }
+
+private:
+    std::string folder_;
+};
+
+}  // namespace kz7
