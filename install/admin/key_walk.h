@@ -45,8 +45,8 @@ Status findKey(IRegistryStore& registry, const KeyName& name, KeyStart& start);
 // Succeeds if none exists.
 Status findEverything(IRegistryStore& registry, bool storeIsOwn, std::vector<KeyStart>& starts);
 
-// Visits the key and its subkeys at any depth; a link is visited as a key of its own and is not followed. kFileNotFound:
-// the key does not exist. Skips keys that are deleted during the walk.
+// Visits the key and its subkeys at any depth; a link is visited as a key of its own and is not followed.
+// kFileNotFound: the key does not exist. Skips keys that are deleted during the walk.
 Status walkKeys(IRegistryStore& registry, const KeyStart& start, const KeyVisitor& visit);
 
 }  // namespace kz7
