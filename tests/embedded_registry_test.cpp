@@ -7,6 +7,7 @@
 
 #include <csignal>
 #include <filesystem>
+#include <utility>
 
 #include "install/src/registry/registry_access.h"
 #include "tests/support/registry_dump.h"
@@ -54,11 +55,16 @@ TEST_F(EmbeddedStore, AHandleOutlivesAMarkAndSeesWhatOthersDid) {
 }
 
 TEST_F(EmbeddedStore, ReadingMakesNothingAndTakesNoLock) {
-    EmbeddedRegistry none = open(true);
     KeyHandle key{};
+    EXPECT_EQ(open(true).openKey(kMachine, "x", kKeyRead, key), kCannotOpen) << "the directory does not exist";
+    EXPECT_TRUE(std::filesystem::is_empty(directory_.path()));
+    EXPECT_EQ(std::exchange(faults_, {}), "No such file or directory");
+
+    std::filesystem::create_directory(directory_.path() + "/state");
+    EmbeddedRegistry none = open(true);
     EXPECT_EQ(dumpRegistry(none), "");
     EXPECT_EQ(none.openKey(KeyHandle::currentUser, "x", kKeyRead, key), kFileNotFound);
-    EXPECT_TRUE(std::filesystem::is_empty(directory_.path()));
+    EXPECT_TRUE(std::filesystem::is_empty(directory_.path() + "/state"));
 
     EmbeddedRegistry writer = open();
     ASSERT_EQ(setText(writer, "K", "v", "1"), kSuccess);

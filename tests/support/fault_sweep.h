@@ -38,9 +38,9 @@ inline std::uint64_t sweepFaults(bool forGood, const std::function<void(FaultyMa
         machine.faults_ = FaultCounter(call, forGood, kFault);
         const Status status = flow(machine);
         const std::string failed = machine.faults_.failed();
-        row.emplace(__FILE__, __LINE__,
-                    "call " + std::to_string(call) + ", " + machine.faults_.failedCall() +
-                        (forGood ? " for good" : ""));
+        row.emplace(
+            __FILE__, __LINE__,
+            "call " + std::to_string(call) + ", " + machine.faults_.failedCall() + (forGood ? " for good" : ""));
         check(machine, status);
         if (failed.empty()) {
             return machine.faults_.calls();

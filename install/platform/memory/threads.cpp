@@ -3,7 +3,7 @@
 namespace kz7 {
 
 Status MemoryThreads::startThread(std::unique_ptr<ThreadStart>& record, std::uint32_t, std::uint32_t& id,
-                            ThreadHandle& thread) {
+                                  ThreadHandle& thread) {
     id = ++lastId_;
     thread = ThreadHandle{lastId_};
     threads_.emplace(thread, std::move(record));
