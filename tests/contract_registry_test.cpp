@@ -279,8 +279,9 @@ TEST_P(RegistryContract, WhatDoesNotFitIsToldWithItsSize) {
 TEST_P(RegistryContract, NamesHoldAnythingButASeparatorAndANul) {
     const std::string longest(kMaxValueName, 'v');
     const std::string wide = repeated(250);
-    for (const std::string name : {"with blanks", " leading", "trailing ", "..", "100%d%s%%", "quote\"s'", "a/b?*<>|:",
-                                   "\xC3\xA9\xC3\xB1", "[x]=y;z", "tab\tfeed\n", "\xF0\x9F\x98\x80", "\xED\xA0\x80x\xED\xB0\x80", "back\\slash", wide.c_str(), longest.c_str()}) {
+    for (const std::string name : {"with blanks", " leading", "trailing ", "..", "100%d%s%%", "quote\"s'",
+                                   "a/b?*<>|:", "\xC3\xA9\xC3\xB1", "[x]=y;z", "tab\tfeed\n", "\xF0\x9F\x98\x80",
+                                   "\xED\xA0\x80x\xED\xB0\x80", "back\\slash", wide.c_str(), longest.c_str()}) {
         if (name != longest && name.find('\\') == std::string::npos) {
             EXPECT_EQ(make(name), kSuccess) << name;
             EXPECT_EQ(names(true), name);
