@@ -181,6 +181,15 @@ TEST_P(RegistryContract, OperationsAnswerByTheStateOfTheirHandle) {
     }
 }
 
+// A character of three bytes in UTF-8, one unit in UTF-16, so many times.
+std::string repeated(std::size_t times) {
+    std::string text;
+    while (times-- > 0) {
+        text += "\xE8\xA1\xA8";
+    }
+    return text;
+}
+
 TEST_P(RegistryContract, PathsAreReadAlike) {
     ASSERT_EQ(make("A\\B\\C"), kSuccess);
     const std::string longest(kMaxKeyName, 'k');
@@ -193,6 +202,8 @@ TEST_P(RegistryContract, PathsAreReadAlike) {
         {"the longest name, missing", longest,                      kFileNotFound},
         {"a name too long",           longest + "k",                kInvalidParameter},
         {"deep down, too long",       "A\\" + longest + "k" + "\\C", kInvalidParameter},
+        {"255 of three bytes",        repeated(255),              kFileNotFound},
+        {"256 of three bytes",        repeated(256),              kInvalidParameter},
         {"a NUL",                     std::string("A\0B", 3),       kInvalidParameter},
     };
     // clang-format on
@@ -220,6 +231,7 @@ TEST_P(RegistryContract, ValuesKeepEveryByte) {
         {"100,000 bytes",          ValueType::binary,          std::string(100'000, '\xFF')},
         {"a text of a path",       ValueType::expandSz,        std::string("%PATH%\\\xC3\xA9\0", 10)},
         {"a text without its end", ValueType::sz,              "text"},
+        {"other scripts, two units, unpaired surrogates", ValueType::multiSz, repeated(250) + "\xF0\x9F\x98\x80\xED\xA0\x80x\xED\xB0\x80"},
         {"texts",                  ValueType::multiSz,         std::string("one\0two\0\0", 9)},
         {"an unknown type",        static_cast<ValueType>(77), "bytes"},
     };
@@ -266,8 +278,10 @@ TEST_P(RegistryContract, WhatDoesNotFitIsToldWithItsSize) {
 
 TEST_P(RegistryContract, NamesHoldAnythingButASeparatorAndANul) {
     const std::string longest(kMaxValueName, 'v');
-    for (const std::string name : {"with blanks", " leading", "trailing ", "..", "100%d%s%%", "quote\"s'", "a/b?*<>|:",
-                                   "\xC3\xA9\xC3\xB1", "[x]=y;z", "tab\tfeed\n", "back\\slash", longest.c_str()}) {
+    const std::string wide = repeated(250);
+    for (const std::string name : {"with blanks", " leading", "trailing ", "..", "100%d%s%%", "quote\"s'",
+                                   "a/b?*<>|:", "\xC3\xA9\xC3\xB1", "[x]=y;z", "tab\tfeed\n", "\xF0\x9F\x98\x80",
+                                   "\xED\xA0\x80x\xED\xB0\x80", "back\\slash", wide.c_str(), longest.c_str()}) {
         if (name != longest && name.find('\\') == std::string::npos) {
             EXPECT_EQ(make(name), kSuccess) << name;
             EXPECT_EQ(names(true), name);

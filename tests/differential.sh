@@ -25,6 +25,8 @@ wine_differences=(
 on_linux() {
     local code=0
     "$linux/kz7InstallReg" "$@" >output 2>error || code=$?
+    # Windows writes a question mark for each unit that its code page lacks.
+    perl -CSD -i -pe 's/[^\0-\xff]/ord $& > 0xffff ? "??" : "?"/ge' output error
     show "$code" "$("$linux/kz7admin" export 2>/dev/null | readable)"
 }
 
@@ -42,9 +44,9 @@ on_windows() {
 
 # Expandable texts as text; only what the product writes, without the keys above it.
 readable() {
-    perl -CSD -0777 -pe '
+    perl -MEncode -CSD -0777 -pe '
         s/\\\n\s+//g;
-        s{=hex\(2\):([0-9a-f,]*)}{"=expand:" . join "", map { $_ ? chr : "\\0" } unpack "v*", pack "H*", $1 =~ tr/,//dr}ge' |
+        s{=hex\(2\):([0-9a-f,]*)}{"=expand:" . decode("UTF-16LE", pack "H*", $1 =~ tr/,//dr) =~ s/\0/\\0/gr}ge' |
         awk '/^\[/ { shown = /\\NVQ\\KZ7|\\Services\\KZ7|\\Application\\KZ7/ } shown'
 }
 
@@ -97,6 +99,11 @@ same 'a name with wildcards'                 -addKZ7Copy '*?' '*'
 same 'a name with quotation marks'           -addKZ7Copy 'say "hi" \"' 'C:\"quoted"\'
 same 'a name that is not ASCII'              -addKZ7Copy 'Zoë ÄÖ' 'C:\Straße'
 same 'its removal'                           -removeKZ7Copy 'Zoë ÄÖ'
+same 'a name in another script'              -addKZ7Copy 'データ' 'D:\データ表\😀'
+same 'its removal'                           -removeKZ7Copy 'データ'
+same 'it comes back, elsewhere'              -addKZ7Copy 'データ' "D:\\$(long 200 | sed 's/n/Ж/g')"
+same 'a name of 86 characters, 258 bytes'    -addKZ7Copy "$(long 86 | sed 's/n/あ/g')" 'D:\Привет мир'
+same 'a name of half the width'              -addKZ7Copy 'ﾆﾎﾝ' 'C:\KZ7\"quoted"'
 same 'a name with a separator'               -addKZ7Copy 'A\B' 'C:\KZ7\ab'
 same 'a name with the other separator'       -addKZ7Copy 'A/B' 'C:\KZ7\ab'
 same 'a name that begins with a separator'   -addKZ7Copy '\A' 'C:\KZ7\a'

@@ -143,7 +143,7 @@ TEST_F(ProviderProgram, CopiesAreShownWithTheirServicesAndAliasesWithWhatIsWrong
               std::string::npos)
         << "a due alias that does not look like one";
     const std::string gone = "no copy has such a version; the next rewrite ";
-    const std::string ended = ": a value name of 100 bytes or more ends its walk\n";
+    const std::string ended = ": a value name of 100 characters or more ends its walk\n";
     EXPECT_EQ(store_.run("kz7admin", {"aliases", "8"}).output,
               "PREFIX  NATIVE  32-BIT  SHOULD BE  WHY\n"
               "8.1     GONE    -       -          " +

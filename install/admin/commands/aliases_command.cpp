@@ -90,7 +90,7 @@ std::string why(const AliasRow& row, std::string_view missingView) {
         reason += row.deletable[0]   ? "deletes it from the native view only"
                   : row.deletable[1] ? "deletes it from the 32-bit view only"
                                      : "leaves it";
-        return reason + ": a value name of 100 bytes or more ends its walk";
+        return reason + ": a value name of 100 characters or more ends its walk";
     }
     if (row.version.empty()) {
         return row.exact ? "no copy has exactly this version; written empty" : "no version continues it; written empty";
