@@ -48,7 +48,7 @@ struct TextBuffer : Buffer {
     TextBuffer& operator=(const TextBuffer&) = delete;
 
 private:
-    std::array<char, kBytesOfCharacter * Characters> room_{};
+    std::array<char, std::size_t{kBytesOfCharacter} * Characters> room_{};
 };
 
 }  // namespace kz7

@@ -24,7 +24,7 @@ bool endFailingAllocations() {
 
 }  // namespace kz7::test
 
-// The other forms of new, those that return null too, call this one.
+// The array forms call this one.
 void* operator new(std::size_t size) {
     hasFailed = hasFailed || allocationsLeft == 0;
     void* const block = allocationsLeft == 0 ? nullptr : std::malloc(size == 0 ? 1 : size);
@@ -33,6 +33,15 @@ void* operator new(std::size_t size) {
         throw std::bad_alloc();
     }
     return block;
+}
+
+// A sanitizer has its own of this form, whose memory the deletes below may not free.
+void* operator new(std::size_t size, const std::nothrow_t&) noexcept {
+    try {
+        return operator new(size);
+    } catch (const std::bad_alloc&) {
+        return nullptr;
+    }
 }
 
 void operator delete(void* block) noexcept {

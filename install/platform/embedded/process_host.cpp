@@ -221,6 +221,7 @@ void collectLater(pid_t id) {
     pthread_attr_setdetachstate(&attributes, PTHREAD_CREATE_DETACHED);
     pthread_t thread{};
     // The number itself is the argument: this also runs when memory is exhausted.
+    // NOLINTNEXTLINE(performance-no-int-to-ptr)
     pthread_create(&thread, &attributes, collect, reinterpret_cast<void*>(static_cast<std::intptr_t>(id)));
     pthread_attr_destroy(&attributes);
 }

@@ -62,7 +62,7 @@ UREExternalObserverHumanStream::~UREExternalObserverHumanStream() {
 std::vector<std::string> UREExternalObserverHumanStream::linesOf(std::uint32_t textNumber, std::string_view text,
                                                                  std::string_view second, TerminalStream stream) {
     const std::array<Insert, 2> inserts = {text, second};
-    char room[kBytesOfCharacter * 2 * kMessageSize];
+    char room[std::size_t{kBytesOfCharacter} * 2 * kMessageSize];
     std::size_t length = 0;
     ure_.messages.copyText(textNumber, inserts, room, sizeof room, length);
     std::string_view rest = cutText({room, std::min(length, sizeof room)}, 2 * kMessageSize);
