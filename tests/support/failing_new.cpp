@@ -24,7 +24,7 @@ bool endFailingAllocations() {
 
 }  // namespace kz7::test
 
-// The array forms call this one.
+// Every form is replaced: a sanitizer has its own of each, which would fail nothing.
 void* operator new(std::size_t size) {
     hasFailed = hasFailed || allocationsLeft == 0;
     void* const block = allocationsLeft == 0 ? nullptr : std::malloc(size == 0 ? 1 : size);
@@ -35,7 +35,6 @@ void* operator new(std::size_t size) {
     return block;
 }
 
-// A sanitizer has its own of this form, whose memory the deletes below may not free.
 void* operator new(std::size_t size, const std::nothrow_t&) noexcept {
     try {
         return operator new(size);
@@ -44,10 +43,26 @@ void* operator new(std::size_t size, const std::nothrow_t&) noexcept {
     }
 }
 
+void* operator new[](std::size_t size) {
+    return operator new(size);
+}
+
+void* operator new[](std::size_t size, const std::nothrow_t& tag) noexcept {
+    return operator new(size, tag);
+}
+
 void operator delete(void* block) noexcept {
     std::free(block);
 }
 
 void operator delete(void* block, std::size_t) noexcept {
+    std::free(block);
+}
+
+void operator delete[](void* block) noexcept {
+    std::free(block);
+}
+
+void operator delete[](void* block, std::size_t) noexcept {
     std::free(block);
 }
