@@ -155,6 +155,8 @@ TEST(RegText, ReadsWhatPeopleWriteOrNamesTheBadLine) {
          "\n[HKEY_USERS\\a]\n;class=\"c\"\n\n[HKEY_USERS\\b]\n\"x\"=\"\"\n", "a class only behind its key"},
         {"[HKU\\_]\n[HKU\\b]\n[HKU\\C]\n[HKU\\a]\n\"_\"=hex:\n\"C\"=hex:\n\"b\"=hex:\n@=hex:\n",
          "\n[HKEY_USERS\\a]\n@=hex:\n\"b\"=hex:\n\"C\"=hex:\n\"_\"=hex:\n\n[HKEY_USERS\\b]\n\n[HKEY_USERS\\C]\n\n[HKEY_USERS\\_]\n", "it is sorted"},
+        {"[HKU\\a]\n\"x\"=hex(1):41,00,42\n\"y\"=hex(7):41\n", "\n[HKEY_USERS\\a]\n\"x\"=hex(1):41,00,42\n\"y\"=hex(7):41\n",
+         "texts that end within a unit"},
         {"[HKU\\a]\n;class of my own\n", "\n[HKEY_USERS\\a]\n", "a comment that only looks like a class"},
     };
     const std::string key = headed("[HKLM\\a]\n");
@@ -182,7 +184,6 @@ TEST(RegText, ReadsWhatPeopleWriteOrNamesTheBadLine) {
         {key + "\"x\"=hex:0g\n",                          "3: a list of bytes is pairs of hexadecimal digits with commas between them"},
         {key + "\"x\"=hex:00,\\\n 11,\n",                 "4: the list ends in a comma"},
         {key + "\"x\"=hex:00,\\",                         "3: the file ends within a value"},
-        {key + "\"x\"=hex(1):41,00,42\n",                 "3: a text is pairs of bytes"},
     };
     // clang-format on
     for (const auto& row : rows) {

@@ -234,6 +234,8 @@ TEST_P(RegistryContract, ValuesKeepEveryByte) {
         {"other scripts, two units, unpaired surrogates", ValueType::multiSz, repeated(250) + "\xF0\x9F\x98\x80\xED\xA0\x80x\xED\xB0\x80"},
         {"texts",                  ValueType::multiSz,         std::string("one\0two\0\0", 9)},
         {"an unknown type",        static_cast<ValueType>(77), "bytes"},
+        {"a text and half a unit", oddText(ValueType::sz),     std::string("a\0b", 3)},
+        {"half a unit",            oddText(ValueType::multiSz), "a"},
     };
     // clang-format on
     for (const auto& row : rows) {
@@ -244,8 +246,10 @@ TEST_P(RegistryContract, ValuesKeepEveryByte) {
                              : registry_.queryValue(at_, "v", &type, room_),
                       kSuccess)
                 << row.why;
-            EXPECT_EQ(type, row.type) << row.why;
-            EXPECT_TRUE(room_.view() == row.data) << row.why << ": " << room_.size << " bytes";
+            const bool isCut = !listed && row.type != plainType(row.type);
+            EXPECT_EQ(type, isCut ? plainType(row.type) : row.type) << row.why;
+            EXPECT_TRUE(room_.view() == (isCut ? row.data.substr(0, row.data.size() / 2) : row.data))
+                << row.why << ": " << room_.size << " bytes";
         }
     }
 }

@@ -94,4 +94,24 @@ std::string utf8FromUtf16(std::u16string_view utf16) {
     return utf8;
 }
 
+std::string bytesFromUtf16(std::u16string_view utf16) {
+    std::string bytes;
+    bytes.reserve(2 * utf16.size());
+    for (const char16_t unit : utf16) {
+        bytes += static_cast<char>(unit & 0xFF);
+        bytes += static_cast<char>(unit >> 8);
+    }
+    return bytes;
+}
+
+std::u16string utf16FromBytes(std::string_view bytes) {
+    std::u16string utf16;
+    utf16.reserve(bytes.size() / 2);
+    for (std::size_t at = 0; at + 1 < bytes.size(); at += 2) {
+        utf16 += static_cast<char16_t>(static_cast<unsigned char>(bytes[at]) | static_cast<unsigned char>(bytes[at + 1])
+                                                                                   << 8);
+    }
+    return utf16;
+}
+
 }  // namespace kz7

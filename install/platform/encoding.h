@@ -32,6 +32,10 @@ void appendUtf8(std::string& text, char32_t character);
 bool utf16FromUtf8(std::string_view utf8, std::u16string& utf16);
 std::string utf8FromUtf16(std::u16string_view utf16);
 
+// UTF-16 as bytes, the low byte of a unit first. Half a unit at the end is left out.
+std::u16string utf16FromBytes(std::string_view bytes);
+std::string bytesFromUtf16(std::u16string_view utf16);
+
 // The text of the ports in UTF-16. A byte that is no character becomes the surrogate U+DC00 + byte. A text that came
 // from textFromUtf16() gives the same UTF-16 again.
 std::u16string utf16FromText(std::string_view text);

@@ -1,5 +1,6 @@
 #include "install/platform/registry_path.h"
 
+#include "install/platform/encoding.h"
 #include "install/platform/text.h"
 
 namespace kz7 {
@@ -75,6 +76,15 @@ Status giveData(ValueType type, std::string_view data, Buffer& buffer) {
     }
     data.copy(buffer.data, data.size());
     return kSuccess;
+}
+
+Status giveQueried(ValueType stored, std::string_view data, ValueType* type, Buffer& buffer) {
+    const ValueType plain = plainType(stored);
+    const Status status = giveData(plain, plain == stored ? data : textFromUtf16(utf16FromBytes(data)), buffer);
+    if (status == kSuccess && type != nullptr) {
+        *type = plain;
+    }
+    return status;
 }
 
 }  // namespace kz7

@@ -34,4 +34,7 @@ Status giveName(std::string_view name, Buffer& buffer);
 // Gives data to a lent buffer: kMoreData with the bytes needed when they do not fit.
 Status giveData(ValueType type, std::string_view data, Buffer& buffer);
 
+// The same for the answer to a query, which gets whole units of an odd text. `type` is set on success, unless null.
+Status giveQueried(ValueType stored, std::string_view data, ValueType* type, Buffer& buffer);
+
 }  // namespace kz7

@@ -37,7 +37,7 @@ inline constexpr AccessMask kKeyOpenLink         = 0x4000000;  // opens a link i
 inline constexpr AccessMask kKeyRefuseLink       = 0x8000000;  // kAccessDenied for a link
 // clang-format on
 
-enum class ValueType : std::uint32_t {
+enum class ValueType : std::uint64_t {
     none = 0,
     sz = 1,
     expandSz = 2,
@@ -49,6 +49,17 @@ enum class ValueType : std::uint32_t {
 
 constexpr bool isTextType(ValueType type) {
     return type == ValueType::sz || type == ValueType::expandSz || type == ValueType::multiSz;
+}
+
+// The type of a text that ends within a UTF-16 unit; its data are the bytes of its UTF-16 form. Only a registry of
+// UTF-16 texts makes such values, other stores keep them. The number is none that a registry can hold.
+constexpr ValueType oddText(ValueType text) {
+    return ValueType{static_cast<std::uint64_t>(text) | std::uint64_t{1} << 32};
+}
+
+// The type as registries number it.
+constexpr ValueType plainType(ValueType type) {
+    return ValueType{static_cast<std::uint32_t>(type)};
 }
 
 inline constexpr std::uint32_t kMaxKeyName = 255;      // characters of one key name
@@ -79,8 +90,8 @@ public:
     // kInvalidHandle for one that is not open; closing a root does nothing.
     virtual Status closeKey(KeyHandle key) = 0;
 
-    // Reads a value's type (where asked for) and its bytes as stored. kMoreData: `data` is too small, its
-    // size tells the bytes needed and its content is not to be read.
+    // Reads a value's type (where asked for) and its bytes as stored; of an odd text, the whole units as any other
+    // text. kMoreData: `data` is too small, its size tells the bytes needed and its content is not to be read.
     virtual Status queryValue(KeyHandle key, std::string_view name, ValueType* type, Buffer& data) = 0;
 
     // Stores exactly the bytes given. The empty name is the key's default value.
@@ -92,7 +103,8 @@ public:
     // past the last; kMoreData when the name or the class with its NUL does not fit.
     virtual Status enumerateKey(KeyHandle key, std::uint32_t index, Buffer& name, Buffer* keyClass) = 0;
 
-    // The index-th value's name, NUL-terminated; its type and bytes where `type` and `data` are given.
+    // The index-th value's name, NUL-terminated; its type and bytes, also those of an odd text, where `type` and `data`
+    // are given.
     // kNoMoreItems past the last; kMoreData when the name with its NUL or the data does not fit, `data`
     // then tells the bytes needed.
     virtual Status enumerateValue(KeyHandle key, std::uint32_t index, Buffer& name, ValueType* type, Buffer* data) = 0;

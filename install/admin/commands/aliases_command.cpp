@@ -45,11 +45,14 @@ Status readValues(IRegistryStore& registry, std::string_view path, std::size_t v
     bool walked = true;
     for (std::uint32_t index = 0; succeeded(status); ++index) {
         Buffer data(room.data(), static_cast<std::uint32_t>(room.size()));
-        status = registry.enumerateValue(key.get(), index, name, nullptr, &data);
+        status = registry.enumerateValue(key.get(), index, name, nullptr, nullptr);
+        if (succeeded(status)) {
+            status = registry.queryValue(key.get(), name.view(), nullptr, data);
+        }
         if (status == kMoreData && data.size > data.capacity) {
             room.resize(data.size);
             data = Buffer(room.data(), data.size);
-            status = registry.enumerateValue(key.get(), index, name, nullptr, &data);
+            status = registry.queryValue(key.get(), name.view(), nullptr, data);
         }
         if (!succeeded(status)) {
             break;

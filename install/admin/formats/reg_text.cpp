@@ -68,26 +68,6 @@ bool isPlainText(const KeyValue& value, std::string& utf8) {
     return true;
 }
 
-std::string utf16Bytes(std::u16string_view utf16) {
-    std::string bytes;
-    bytes.reserve(2 * utf16.size());
-    for (const char16_t unit : utf16) {
-        bytes += static_cast<char>(unit & 0xFF);
-        bytes += static_cast<char>(unit >> 8);
-    }
-    return bytes;
-}
-
-std::u16string utf16FromBytes(std::string_view bytes) {
-    std::u16string utf16;
-    utf16.reserve(bytes.size() / 2);
-    for (std::size_t at = 0; at + 1 < bytes.size(); at += 2) {
-        utf16 += static_cast<char16_t>(static_cast<unsigned char>(bytes[at]) | static_cast<unsigned char>(bytes[at + 1])
-                                                                                   << 8);
-    }
-    return utf16;
-}
-
 void appendHex(std::uint32_t number, int digits, std::string& text) {
     static constexpr char kDigits[] = "0123456789abcdef";
     while (digits-- > 0) {
@@ -119,7 +99,7 @@ void appendData(const KeyValue& value, std::string& text) {
         return;
     }
     appendHexType(value.type, text);
-    const std::string bytes = isTextType(value.type) ? utf16Bytes(utf16FromText(value.data)) : value.data;
+    const std::string bytes = isTextType(value.type) ? bytesFromUtf16(utf16FromText(value.data)) : value.data;
     for (std::size_t at = 0; at < bytes.size(); ++at) {
         if (at != 0) {
             text += at % kBytesOfLine == 0 ? ",\\\n  " : ",";
@@ -358,7 +338,13 @@ private:
         } else if (!take("hex:")) {
             return fail("the data is no text, no dword and no hex list");
         }
-        return bytes(change.data) && (!isTextType(change.type) || hexText(change.data));
+        if (!bytes(change.data)) {
+            return false;
+        }
+        if (isTextType(change.type)) {
+            hexText(change.type, change.data);
+        }
+        return true;
     }
 
     // A list of bytes, continued on the next line after a backslash.
@@ -388,16 +374,14 @@ private:
         }
     }
 
-    bool hexText(std::string& data) {
+    void hexText(ValueType& type, std::string& data) const {
         if (narrowHex_) {
             data = textFromNarrow(data);
-            return true;
+        } else if (data.size() % 2 != 0) {
+            type = oddText(type);
+        } else {
+            data = textFromUtf16(utf16FromBytes(data));
         }
-        if (data.size() % 2 != 0) {
-            return fail("a text is pairs of bytes");
-        }
-        data = textFromUtf16(utf16FromBytes(data));
-        return true;
     }
 
     std::vector<KeyChange>& changes_;
@@ -443,7 +427,7 @@ std::string utf16FileText(std::string_view text) {
     }
     std::u16string utf16;
     utf16FromUtf8(lines, utf16);
-    return utf16Bytes(utf16);
+    return bytesFromUtf16(utf16);
 }
 
 bool parseRegText(std::string_view file, std::vector<KeyChange>& changes, TextFault& fault) {

@@ -12,7 +12,7 @@ std::string_view typeName(ValueType type) {
         "REG_RESOURCE_REQUIREMENTS_LIST", "REG_QWORD",
     };
     // clang-format on
-    const auto number = static_cast<std::size_t>(type);
+    const auto number = static_cast<std::size_t>(plainType(type));
     return number < kNames.size() ? kNames[number] : std::string_view{};
 }
 

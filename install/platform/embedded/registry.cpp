@@ -490,12 +490,7 @@ Status EmbeddedRegistry::queryValue(KeyHandle key, std::string_view name, ValueT
     if (result != SQLITE_ROW) {
         return result == SQLITE_DONE ? kFileNotFound : fail(result);
     }
-    const auto found = static_cast<ValueType>(get.number(0));
-    status = giveData(found, get.bytes(1), data);
-    if (status == kSuccess && type != nullptr) {
-        *type = found;
-    }
-    return status;
+    return giveQueried(static_cast<ValueType>(get.number(0)), get.bytes(1), type, data);
 }
 
 Status EmbeddedRegistry::nextPlace(KeyId key, std::int64_t& place) {

@@ -135,11 +135,7 @@ Status MemoryRegistry::queryValue(KeyHandle key, std::string_view name, ValueTyp
     if (found == node->byName.end()) {
         return kFileNotFound;
     }
-    const Status status = giveData(found->second.type, found->second.data, data);
-    if (status == kSuccess && type != nullptr) {
-        *type = found->second.type;
-    }
-    return status;
+    return giveQueried(found->second.type, found->second.data, type, data);
 }
 
 Status MemoryRegistry::setValue(KeyHandle key, std::string_view name, ValueType type, std::string_view data) {

@@ -1,4 +1,4 @@
-#include "install/platform/windows/assembly_cache.h"
+#include "install/platform/windows/ports.h"
 
 #include <windows.h>
 
@@ -152,7 +152,7 @@ std::vector<std::wstring> providerFiles(std::string_view location) {
         return files;
     }
     WIN32_FIND_DATAW found;
-    const FileSearch search = ownedSearch(FindFirstFileW(WideText(folder + "kz7nmp*.dll").c_str(), &found));
+    const FileSearch search = owned<FileSearch>(FindFirstFileW(WideText(folder + "kz7nmp*.dll").c_str(), &found));
     if (!search) {
         return files;
     }
@@ -171,53 +171,61 @@ void keepFirst(Status& first, Status status) {
     }
 }
 
+// Through the interface of each framework. A framework that is not installed has no cache: nothing is deregistered, and
+// registering fails.
+class WindowsAssemblyCache final : public IAssemblyCache {
+public:
+    Status deregisterProviders(std::string_view level) override {
+        if (level.empty()) {
+            return kSuccess;
+        }
+        const Apartment apartment;
+        Status result = kSuccess;
+        for (const Generation& generation : kGenerations) {
+            const Fusion fusion(generation);
+            if (!fusion) {
+                continue;
+            }
+            ComPointer<::IAssemblyCache> cache;
+            std::vector<std::wstring> names;
+            keepFirst(result, fusion.openCache(cache));
+            keepFirst(result, listProviders(fusion, WideText(level).c_str(), names));
+            for (const std::wstring& name : names) {
+                keepFirst(result, cache == nullptr ? kSuccess : uninstall(*cache, name));
+            }
+        }
+        return result;
+    }
+
+    Status registerProviders(std::string_view location, std::string_view, FrameworkGenerations generations) override {
+        const std::vector<std::wstring> files = providerFiles(location);
+        if (files.empty()) {
+            return kSuccess;
+        }
+        const Apartment apartment;
+        Status result = kSuccess;
+        for (const Generation& generation : kGenerations) {
+            if ((generations & generation.bit) == 0) {
+                continue;
+            }
+            const Fusion fusion(generation);
+            ComPointer<::IAssemblyCache> cache;
+            if (const Status opened = fusion ? fusion.openCache(cache) : kModuleNotFound; !succeeded(opened)) {
+                keepFirst(result, opened);
+                continue;
+            }
+            for (const std::wstring& file : files) {
+                keepFirst(result, statusOf(cache->InstallAssembly(0, file.c_str(), nullptr)));
+            }
+        }
+        return result;
+    }
+};
+
 }  // namespace
 
-Status WindowsAssemblyCache::deregisterProviders(std::string_view level) {
-    if (level.empty()) {
-        return kSuccess;
-    }
-    const Apartment apartment;
-    Status result = kSuccess;
-    for (const Generation& generation : kGenerations) {
-        const Fusion fusion(generation);
-        if (!fusion) {
-            continue;
-        }
-        ComPointer<::IAssemblyCache> cache;
-        std::vector<std::wstring> names;
-        keepFirst(result, fusion.openCache(cache));
-        keepFirst(result, listProviders(fusion, WideText(level).c_str(), names));
-        for (const std::wstring& name : names) {
-            keepFirst(result, cache == nullptr ? kSuccess : uninstall(*cache, name));
-        }
-    }
-    return result;
-}
-
-Status WindowsAssemblyCache::registerProviders(std::string_view location, std::string_view,
-                                               FrameworkGenerations generations) {
-    const std::vector<std::wstring> files = providerFiles(location);
-    if (files.empty()) {
-        return kSuccess;
-    }
-    const Apartment apartment;
-    Status result = kSuccess;
-    for (const Generation& generation : kGenerations) {
-        if ((generations & generation.bit) == 0) {
-            continue;
-        }
-        const Fusion fusion(generation);
-        ComPointer<::IAssemblyCache> cache;
-        if (const Status opened = fusion ? fusion.openCache(cache) : kModuleNotFound; !succeeded(opened)) {
-            keepFirst(result, opened);
-            continue;
-        }
-        for (const std::wstring& file : files) {
-            keepFirst(result, statusOf(cache->InstallAssembly(0, file.c_str(), nullptr)));
-        }
-    }
-    return result;
+std::unique_ptr<IAssemblyCache> windowsAssemblies() {
+    return std::make_unique<WindowsAssemblyCache>();
 }
 
 }  // namespace kz7

@@ -33,9 +33,9 @@ Owner ownerOf(HANDLE file) {
 
 NativeHandle openFolder(const std::wstring& folder) {
     // Without sharing deletion: the folder stays in its place while it is looked at and used.
-    return ownedFile(CreateFileW(folder.c_str(), FILE_READ_ATTRIBUTES | READ_CONTROL,
-                                 FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr, OPEN_EXISTING,
-                                 FILE_FLAG_BACKUP_SEMANTICS | FILE_FLAG_OPEN_REPARSE_POINT, nullptr));
+    return owned<NativeHandle>(CreateFileW(folder.c_str(), FILE_READ_ATTRIBUTES | READ_CONTROL,
+                                           FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr, OPEN_EXISTING,
+                                           FILE_FLAG_BACKUP_SEMANTICS | FILE_FLAG_OPEN_REPARSE_POINT, nullptr));
 }
 
 // Administrators, the system, and the owner of the system's own folder, who could change anything anyway.
@@ -87,9 +87,9 @@ bool ChangeLock::tryHold() {
         isWanted_ = false;
         return true;
     }
-    file_ =
-        ownedFile(CreateFileW((folder + L"\\lock").c_str(), FILE_READ_ATTRIBUTES | FILE_WRITE_DATA | READ_CONTROL, 0,
-                              &attributes, OPEN_ALWAYS, FILE_ATTRIBUTE_NORMAL | FILE_FLAG_OPEN_REPARSE_POINT, nullptr));
+    file_ = owned<NativeHandle>(
+        CreateFileW((folder + L"\\lock").c_str(), FILE_READ_ATTRIBUTES | FILE_WRITE_DATA | READ_CONTROL, 0, &attributes,
+                    OPEN_ALWAYS, FILE_ATTRIBUTE_NORMAL | FILE_FLAG_OPEN_REPARSE_POINT, nullptr));
     if (!file_ && GetLastError() == ERROR_SHARING_VIOLATION) {
         return false;
     }

@@ -1,4 +1,4 @@
-#include "install/platform/windows/console.h"
+#include "install/platform/windows/ports.h"
 
 #include <io.h>
 #include <windows.h>
@@ -36,22 +36,35 @@ Status writeToConsole(std::FILE* stream, HANDLE console, std::string_view text) 
     return kSuccess;
 }
 
+// The C library's streams. A console gets Unicode, files and pipes get the active code page.
+class WindowsConsole final : public IConsole {
+public:
+    Status writeOutput(std::string_view text) override {
+        const HANDLE console = consoleOf(stdout);
+        return console != nullptr ? writeToConsole(stdout, console, text) : streams_->writeOutput(narrowFromText(text));
+    }
+
+    Status writeError(std::string_view text) override {
+        flush();
+        const HANDLE console = consoleOf(stderr);
+        return console != nullptr ? writeToConsole(stderr, console, text) : streams_->writeError(narrowFromText(text));
+    }
+
+    Status writeDocument(std::string_view text) override {
+        const HANDLE console = consoleOf(stdout);
+        return console != nullptr ? writeToConsole(stdout, console, text) : streams_->writeOutput(text);
+    }
+
+    Status flush() override { return streams_->flush(); }
+
+private:
+    std::unique_ptr<IConsole> streams_ = standardConsole();
+};
+
 }  // namespace
 
-Status WindowsConsole::writeOutput(std::string_view text) {
-    const HANDLE console = consoleOf(stdout);
-    return console != nullptr ? writeToConsole(stdout, console, text) : streams_->writeOutput(narrowFromText(text));
-}
-
-Status WindowsConsole::writeError(std::string_view text) {
-    flush();
-    const HANDLE console = consoleOf(stderr);
-    return console != nullptr ? writeToConsole(stderr, console, text) : streams_->writeError(narrowFromText(text));
-}
-
-Status WindowsConsole::writeDocument(std::string_view text) {
-    const HANDLE console = consoleOf(stdout);
-    return console != nullptr ? writeToConsole(stdout, console, text) : streams_->writeOutput(text);
+std::unique_ptr<IConsole> windowsConsole() {
+    return std::make_unique<WindowsConsole>();
 }
 
 }  // namespace kz7

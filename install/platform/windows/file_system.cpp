@@ -1,5 +1,5 @@
 #define _CRT_RAND_S
-#include "install/platform/windows/file_system.h"
+#include "install/platform/windows/ports.h"
 
 #include <io.h>
 #include <windows.h>
@@ -77,160 +77,169 @@ Status checkTarget(const std::string& path, bool replace) {
     return (found & kNotAFile) != 0 ? kBadPathname : replace ? kSuccess : kFileExists;
 }
 
-}  // namespace
-
-Status WindowsFileSystem::probe(std::string_view path) {
-    // Nothing is taken relative to the current folder.
-    if (namesNothing(path)) {
-        return kFileNotFound;
+class WindowsFileSystem final : public IFileSystem {
+public:
+    Status probe(std::string_view path) override {
+        // Nothing is taken relative to the current folder.
+        if (namesNothing(path)) {
+            return kFileNotFound;
+        }
+        if (_waccess(WideText(path).c_str(), 0) == 0) {
+            return kSuccess;
+        }
+        return errno == EACCES ? kAccessDenied : kFileNotFound;
     }
-    if (_waccess(WideText(path).c_str(), 0) == 0) {
+
+    Status readFile(std::string_view path, std::string& content) override {
+        if (namesNothing(path)) {
+            return kFileNotFound;
+        }
+        // Others may have chosen the path. The server of a pipe of that name can identify this program, not act with
+        // its rights.
+        const NativeHandle file = owned<NativeHandle>(
+            CreateFileW(WideText(path).c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr,
+                        OPEN_EXISTING, FILE_ATTRIBUTE_NORMAL | kWithoutOurRights, nullptr));
+        if (!file) {
+            return GetLastError() == ERROR_PATH_NOT_FOUND ? kFileNotFound : GetLastError();
+        }
+        std::string read;
+        DWORD count = 0;
+        do {
+            const std::size_t length = read.size();
+            read.resize(length + kReadPiece);
+            if (ReadFile(file.get(), read.data() + length, kReadPiece, &count, nullptr) == FALSE) {
+                return GetLastError();
+            }
+            read.resize(length + count);
+        } while (count != 0);
+        content = std::move(read);
         return kSuccess;
     }
-    return errno == EACCES ? kAccessDenied : kFileNotFound;
-}
 
-Status WindowsFileSystem::readFile(std::string_view path, std::string& content) {
-    if (namesNothing(path)) {
-        return kFileNotFound;
-    }
-    // Others may have chosen the path. The server of a pipe of that name can identify this program, not act with its
-    // rights.
-    const NativeHandle file =
-        ownedFile(CreateFileW(WideText(path).c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr,
-                              OPEN_EXISTING, FILE_ATTRIBUTE_NORMAL | kWithoutOurRights, nullptr));
-    if (!file) {
-        return GetLastError() == ERROR_PATH_NOT_FOUND ? kFileNotFound : GetLastError();
-    }
-    std::string read;
-    DWORD count = 0;
-    do {
-        const std::size_t length = read.size();
-        read.resize(length + kReadPiece);
-        if (ReadFile(file.get(), read.data() + length, kReadPiece, &count, nullptr) == FALSE) {
+    Status openForAppend(std::string_view path, FileHandle& file) override {
+        if (namesNothing(path)) {
+            return kFileNotFound;
+        }
+        const std::string whole = wholePath(path);
+        if (whole.starts_with(R"(\\.\)")) {
+            return kAccessDenied;
+        }
+        // The folder first, and held in its place: nothing is made where a link leads.
+        const std::string folderPath = whole.substr(0, whole.find_last_of('\\') + 1);
+        const NativeHandle folder = owned<NativeHandle>(
+            CreateFileW(WideText(folderPath).c_str(), FILE_READ_ATTRIBUTES, FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr,
+                        OPEN_EXISTING, FILE_FLAG_BACKUP_SEMANTICS | kWithoutOurRights, nullptr));
+        if (!folder) {
+            return GetLastError() == ERROR_FILE_NOT_FOUND ? kPathNotFound : GetLastError();
+        }
+        if (!liesAt(folder.get(), folderPath)) {
+            return kAccessDenied;
+        }
+        NativeHandle opened = owned<NativeHandle>(CreateFileW(
+            WideText(whole).c_str(), FILE_APPEND_DATA, FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr, OPEN_ALWAYS,
+            FILE_ATTRIBUTE_NORMAL | FILE_FLAG_OPEN_REPARSE_POINT | kWithoutOurRights, nullptr));
+        if (!opened) {
             return GetLastError();
         }
-        read.resize(length + count);
-    } while (count != 0);
-    content = std::move(read);
-    return kSuccess;
-}
-
-Status WindowsFileSystem::openForAppend(std::string_view path, FileHandle& file) {
-    if (namesNothing(path)) {
-        return kFileNotFound;
-    }
-    const std::string whole = wholePath(path);
-    if (whole.starts_with(R"(\\.\)")) {
-        return kAccessDenied;
-    }
-    // The folder first, and held in its place: nothing is made where a link leads.
-    const std::string folderPath = whole.substr(0, whole.find_last_of('\\') + 1);
-    const NativeHandle folder =
-        ownedFile(CreateFileW(WideText(folderPath).c_str(), FILE_READ_ATTRIBUTES, FILE_SHARE_READ | FILE_SHARE_WRITE,
-                              nullptr, OPEN_EXISTING, FILE_FLAG_BACKUP_SEMANTICS | kWithoutOurRights, nullptr));
-    if (!folder) {
-        return GetLastError() == ERROR_FILE_NOT_FOUND ? kPathNotFound : GetLastError();
-    }
-    if (!liesAt(folder.get(), folderPath)) {
-        return kAccessDenied;
-    }
-    NativeHandle opened = ownedFile(
-        CreateFileW(WideText(whole).c_str(), FILE_APPEND_DATA, FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr, OPEN_ALWAYS,
-                    FILE_ATTRIBUTE_NORMAL | FILE_FLAG_OPEN_REPARSE_POINT | kWithoutOurRights, nullptr));
-    if (!opened) {
-        return GetLastError();
-    }
-    BY_HANDLE_FILE_INFORMATION information{};
-    if (GetFileType(opened.get()) != FILE_TYPE_DISK ||
-        GetFileInformationByHandle(opened.get(), &information) == FALSE ||
-        (information.dwFileAttributes & (FILE_ATTRIBUTE_REPARSE_POINT | FILE_ATTRIBUTE_DIRECTORY)) != 0 ||
-        information.nNumberOfLinks != 1 || !liesAt(opened.get(), whole)) {
-        return kAccessDenied;
-    }
-    file = FileHandle{reinterpret_cast<std::uintptr_t>(opened.release())};
-    return kSuccess;
-}
-
-Status WindowsFileSystem::write(FileHandle file, std::string_view data, std::uint32_t& written) {
-    DWORD count = 0;
-    const BOOL taken = WriteFile(native(file), data.data(), static_cast<DWORD>(data.size()), &count, nullptr);
-    written = count;
-    return taken != FALSE ? kSuccess : GetLastError();
-}
-
-Status WindowsFileSystem::closeFile(FileHandle file) {
-    return CloseHandle(native(file)) != FALSE ? kSuccess : GetLastError();
-}
-
-Status WindowsFileSystem::writeFile(std::string_view path, std::string_view content, bool replace) {
-    const std::string target(path);
-    const std::string unfinished = randomName(path.substr(0, path.find_last_of("\\/") + 1));
-    if (namesNothing(path) || target.ends_with('\\') || target.ends_with('/')) {
-        return kBadPathname;
-    }
-    if (const Status status = checkTarget(target, replace); status != kSuccess || unfinished.empty()) {
-        return status != kSuccess ? status : kGeneralFailure;
-    }
-    const HANDLE opened = CreateFileW(WideText(unfinished).c_str(), GENERIC_WRITE, 0, nullptr, CREATE_NEW,
-                                      FILE_ATTRIBUTE_NORMAL, nullptr);
-    if (opened == INVALID_HANDLE_VALUE) {
-        return GetLastError();
-    }
-    OwnedFile file(*this);
-    file.receive() = FileHandle{reinterpret_cast<std::uintptr_t>(opened)};
-    Status status = kSuccess;
-    while (status == kSuccess && !content.empty()) {
-        std::uint32_t written = 0;
-        status = write(file.get(), content.substr(0, kWritePiece), written);
-        content.remove_prefix(written);
-    }
-    if (status == kSuccess && FlushFileBuffers(opened) == FALSE) {
-        status = GetLastError();
-    }
-    file.reset();
-    const DWORD how = MOVEFILE_WRITE_THROUGH | (replace ? DWORD{MOVEFILE_REPLACE_EXISTING} : 0);
-    if (status == kSuccess && MoveFileExW(WideText(unfinished).c_str(), WideText(target).c_str(), how) == FALSE) {
-        status = GetLastError() == ERROR_ALREADY_EXISTS ? kFileExists : GetLastError();
-    }
-    if (status != kSuccess) {
-        DeleteFileW(WideText(unfinished).c_str());
-    }
-    return status;
-}
-
-Status WindowsFileSystem::findFile(std::string_view pattern, std::string& name) {
-    if (namesNothing(pattern)) {
-        return kFileNotFound;
-    }
-    const std::string_view names = pattern.substr(pattern.find_last_of("\\/:") + 1);
-    WIN32_FIND_DATAW found{};
-    const FileSearch search = ownedSearch(FindFirstFileW(WideText(pattern).c_str(), &found));
-    if (!search) {
-        return GetLastError() == ERROR_PATH_NOT_FOUND ? kFileNotFound : GetLastError();
-    }
-    // The system's '?' also stands for no character at all.
-    std::string first;
-    do {
-        const std::string each = textFromWide(found.cFileName);
-        if (fitsPattern(each, names) && (first.empty() || each < first)) {
-            first = each;
+        BY_HANDLE_FILE_INFORMATION information{};
+        if (GetFileType(opened.get()) != FILE_TYPE_DISK ||
+            GetFileInformationByHandle(opened.get(), &information) == FALSE ||
+            (information.dwFileAttributes & (FILE_ATTRIBUTE_REPARSE_POINT | FILE_ATTRIBUTE_DIRECTORY)) != 0 ||
+            information.nNumberOfLinks != 1 || !liesAt(opened.get(), whole)) {
+            return kAccessDenied;
         }
-    } while (FindNextFileW(search.get(), &found) != FALSE);
-    if (first.empty()) {
-        return kFileNotFound;
+        file = FileHandle{reinterpret_cast<std::uintptr_t>(opened.release())};
+        return kSuccess;
     }
-    name = std::move(first);
-    return kSuccess;
-}
 
-Status WindowsFileSystem::productPath(std::string_view hostPath, std::string& path) {
-    std::string whole = wholePath(hostPath);
-    if (namesNothing(whole)) {
-        return kInvalidName;
+    Status write(FileHandle file, std::string_view data, std::uint32_t& written) override {
+        DWORD count = 0;
+        const BOOL taken = WriteFile(native(file), data.data(), static_cast<DWORD>(data.size()), &count, nullptr);
+        written = count;
+        return taken != FALSE ? kSuccess : GetLastError();
     }
-    path = std::move(whole);
-    return kSuccess;
+
+    Status closeFile(FileHandle file) override {
+        return CloseHandle(native(file)) != FALSE ? kSuccess : GetLastError();
+    }
+
+    Status writeFile(std::string_view path, std::string_view content, bool replace) override {
+        const std::string target(path);
+        const std::string unfinished = randomName(path.substr(0, path.find_last_of("\\/") + 1));
+        if (namesNothing(path) || target.ends_with('\\') || target.ends_with('/')) {
+            return kBadPathname;
+        }
+        if (const Status status = checkTarget(target, replace); status != kSuccess || unfinished.empty()) {
+            return status != kSuccess ? status : kGeneralFailure;
+        }
+        const HANDLE opened = CreateFileW(WideText(unfinished).c_str(), GENERIC_WRITE, 0, nullptr, CREATE_NEW,
+                                          FILE_ATTRIBUTE_NORMAL, nullptr);
+        if (opened == INVALID_HANDLE_VALUE) {
+            return GetLastError();
+        }
+        OwnedFile file(*this);
+        file.receive() = FileHandle{reinterpret_cast<std::uintptr_t>(opened)};
+        Status status = kSuccess;
+        while (status == kSuccess && !content.empty()) {
+            std::uint32_t written = 0;
+            status = write(file.get(), content.substr(0, kWritePiece), written);
+            content.remove_prefix(written);
+        }
+        if (status == kSuccess && FlushFileBuffers(opened) == FALSE) {
+            status = GetLastError();
+        }
+        file.reset();
+        const DWORD how = MOVEFILE_WRITE_THROUGH | (replace ? DWORD{MOVEFILE_REPLACE_EXISTING} : 0);
+        if (status == kSuccess && MoveFileExW(WideText(unfinished).c_str(), WideText(target).c_str(), how) == FALSE) {
+            status = GetLastError() == ERROR_ALREADY_EXISTS ? kFileExists : GetLastError();
+        }
+        if (status != kSuccess) {
+            DeleteFileW(WideText(unfinished).c_str());
+        }
+        return status;
+    }
+
+    Status findFile(std::string_view pattern, std::string& name) override {
+        if (namesNothing(pattern)) {
+            return kFileNotFound;
+        }
+        const std::string_view names = pattern.substr(pattern.find_last_of("\\/:") + 1);
+        WIN32_FIND_DATAW found{};
+        const FileSearch search = owned<FileSearch>(FindFirstFileW(WideText(pattern).c_str(), &found));
+        if (!search) {
+            return GetLastError() == ERROR_PATH_NOT_FOUND ? kFileNotFound : GetLastError();
+        }
+        // The system's '?' also stands for no character at all.
+        std::string first;
+        do {
+            const std::string each = textFromWide(found.cFileName);
+            if (fitsPattern(each, names) && (first.empty() || each < first)) {
+                first = each;
+            }
+        } while (FindNextFileW(search.get(), &found) != FALSE);
+        if (first.empty()) {
+            return kFileNotFound;
+        }
+        name = std::move(first);
+        return kSuccess;
+    }
+
+    Status productPath(std::string_view hostPath, std::string& path) override {
+        std::string whole = wholePath(hostPath);
+        if (namesNothing(whole)) {
+            return kInvalidName;
+        }
+        path = std::move(whole);
+        return kSuccess;
+    }
+
+    std::string shownPath(std::string_view path) override { return std::string(path); }
+};
+
+}  // namespace
+
+std::unique_ptr<IFileSystem> windowsFiles() {
+    return std::make_unique<WindowsFileSystem>();
 }
 
 }  // namespace kz7

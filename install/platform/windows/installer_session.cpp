@@ -1,4 +1,4 @@
-#include "install/platform/windows/installer_session.h"
+#include "install/platform/installer_session.h"
 
 #include <windows.h>
 // The types above first.
@@ -47,84 +47,87 @@ Status readText(Buffer& text, Call call) {
     }
 }
 
+class WindowsInstallerSession final : public IInstallerSession {
+public:
+    // `installation` is the handle that the installer gave; it stays the installer's.
+    explicit WindowsInstallerSession(std::uint32_t installation) : installation_(installation) {}
+
+    Status runMode(RunMode mode, bool& isOn) override {
+        isOn = MsiGetMode(installation_, static_cast<MSIRUNMODE>(mode)) != FALSE;
+        return kSuccess;
+    }
+
+    Status getProperty(std::string_view name, Buffer& value) override {
+        const WideText wide(name);
+        return readText(value, [&](wchar_t* room, DWORD* size) {
+            return MsiGetPropertyW(installation_, wide.c_str(), room, size);
+        });
+    }
+
+    Status setProperty(std::string_view name, std::string_view value) override {
+        return MsiSetPropertyW(installation_, WideText(name).c_str(), WideText(value).c_str());
+    }
+
+    Status featureState(std::string_view feature, FeatureState& installed, FeatureState& requested) override {
+        INSTALLSTATE is = INSTALLSTATE_UNKNOWN;
+        INSTALLSTATE toBe = INSTALLSTATE_UNKNOWN;
+        const UINT status = MsiGetFeatureStateW(installation_, WideText(feature).c_str(), &is, &toBe);
+        if (status == ERROR_SUCCESS) {
+            installed = static_cast<FeatureState>(is);
+            requested = static_cast<FeatureState>(toBe);
+        }
+        return status;
+    }
+
+    Status doAction(std::string_view name) override { return MsiDoActionW(installation_, WideText(name).c_str()); }
+
+    Status activeDatabase(SessionHandle& database) override {
+        return giveHandle(MsiGetActiveDatabase(installation_), kInvalidHandle, database);
+    }
+
+    Status openView(SessionHandle database, std::string_view query, SessionHandle& view) override {
+        MSIHANDLE opened = 0;
+        const UINT status = MsiDatabaseOpenViewW(native(database), WideText(query).c_str(), &opened);
+        return status != ERROR_SUCCESS ? status : giveHandle(opened, kInvalidHandle, view);
+    }
+
+    Status executeView(SessionHandle view) override { return MsiViewExecute(native(view), 0); }
+
+    Status fetchRecord(SessionHandle view, SessionHandle& record) override {
+        MSIHANDLE fetched = 0;
+        const UINT status = MsiViewFetch(native(view), &fetched);
+        return status != ERROR_SUCCESS ? status : giveHandle(fetched, kInvalidHandle, record);
+    }
+
+    Status recordString(SessionHandle record, std::uint32_t field, Buffer& text) override {
+        return readText(
+            text, [&](wchar_t* room, DWORD* size) { return MsiRecordGetStringW(native(record), field, room, size); });
+    }
+
+    Status createRecord(std::uint32_t fields, SessionHandle& record) override {
+        return giveHandle(MsiCreateRecord(fields), kOutOfMemory, record);
+    }
+
+    Status setRecordString(SessionHandle record, std::uint32_t field, std::string_view text) override {
+        return MsiRecordSetStringW(native(record), field, WideText(text).c_str());
+    }
+
+    Status processMessage(std::uint32_t kind, SessionHandle record, std::int32_t& answer) override {
+        const int chosen = MsiProcessMessage(installation_, static_cast<INSTALLMESSAGE>(kind), native(record));
+        if (chosen == -1) {
+            return kInvalidHandle;
+        }
+        answer = chosen;
+        return kSuccess;
+    }
+
+    Status closeHandle(SessionHandle handle) override { return MsiCloseHandle(native(handle)); }
+
+private:
+    std::uint32_t installation_;
+};
+
 }  // namespace
-
-Status WindowsInstallerSession::runMode(RunMode mode, bool& isOn) {
-    isOn = MsiGetMode(installation_, static_cast<MSIRUNMODE>(mode)) != FALSE;
-    return kSuccess;
-}
-
-Status WindowsInstallerSession::getProperty(std::string_view name, Buffer& value) {
-    const WideText wide(name);
-    return readText(
-        value, [&](wchar_t* room, DWORD* size) { return MsiGetPropertyW(installation_, wide.c_str(), room, size); });
-}
-
-Status WindowsInstallerSession::setProperty(std::string_view name, std::string_view value) {
-    return MsiSetPropertyW(installation_, WideText(name).c_str(), WideText(value).c_str());
-}
-
-Status WindowsInstallerSession::featureState(std::string_view feature, FeatureState& installed,
-                                             FeatureState& requested) {
-    INSTALLSTATE is = INSTALLSTATE_UNKNOWN;
-    INSTALLSTATE toBe = INSTALLSTATE_UNKNOWN;
-    const UINT status = MsiGetFeatureStateW(installation_, WideText(feature).c_str(), &is, &toBe);
-    if (status == ERROR_SUCCESS) {
-        installed = static_cast<FeatureState>(is);
-        requested = static_cast<FeatureState>(toBe);
-    }
-    return status;
-}
-
-Status WindowsInstallerSession::doAction(std::string_view name) {
-    return MsiDoActionW(installation_, WideText(name).c_str());
-}
-
-Status WindowsInstallerSession::activeDatabase(SessionHandle& database) {
-    return giveHandle(MsiGetActiveDatabase(installation_), kInvalidHandle, database);
-}
-
-Status WindowsInstallerSession::openView(SessionHandle database, std::string_view query, SessionHandle& view) {
-    MSIHANDLE opened = 0;
-    const UINT status = MsiDatabaseOpenViewW(native(database), WideText(query).c_str(), &opened);
-    return status != ERROR_SUCCESS ? status : giveHandle(opened, kInvalidHandle, view);
-}
-
-Status WindowsInstallerSession::executeView(SessionHandle view) {
-    return MsiViewExecute(native(view), 0);
-}
-
-Status WindowsInstallerSession::fetchRecord(SessionHandle view, SessionHandle& record) {
-    MSIHANDLE fetched = 0;
-    const UINT status = MsiViewFetch(native(view), &fetched);
-    return status != ERROR_SUCCESS ? status : giveHandle(fetched, kInvalidHandle, record);
-}
-
-Status WindowsInstallerSession::recordString(SessionHandle record, std::uint32_t field, Buffer& text) {
-    return readText(text,
-                    [&](wchar_t* room, DWORD* size) { return MsiRecordGetStringW(native(record), field, room, size); });
-}
-
-Status WindowsInstallerSession::createRecord(std::uint32_t fields, SessionHandle& record) {
-    return giveHandle(MsiCreateRecord(fields), kOutOfMemory, record);
-}
-
-Status WindowsInstallerSession::setRecordString(SessionHandle record, std::uint32_t field, std::string_view text) {
-    return MsiRecordSetStringW(native(record), field, WideText(text).c_str());
-}
-
-Status WindowsInstallerSession::processMessage(std::uint32_t kind, SessionHandle record, std::int32_t& answer) {
-    const int chosen = MsiProcessMessage(installation_, static_cast<INSTALLMESSAGE>(kind), native(record));
-    if (chosen == -1) {
-        return kInvalidHandle;
-    }
-    answer = chosen;
-    return kSuccess;
-}
-
-Status WindowsInstallerSession::closeHandle(SessionHandle handle) {
-    return MsiCloseHandle(native(handle));
-}
 
 std::unique_ptr<IInstallerSession> hostInstallerSession(std::uint32_t installation) {
     return std::make_unique<WindowsInstallerSession>(installation);

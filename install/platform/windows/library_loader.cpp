@@ -1,4 +1,4 @@
-#include "install/platform/windows/library_loader.h"
+#include "install/platform/windows/ports.h"
 
 #include <windows.h>
 
@@ -21,32 +21,39 @@ Status lastErrorOr(Status fallback) {
     return status == kSuccess ? fallback : status;
 }
 
+class WindowsLibraryLoader final : public ILibraryLoader {
+public:
+    Status load(std::string_view path, LibraryHandle& library) override {
+        if (!isAbsolutePath(path)) {
+            return kModuleNotFound;
+        }
+        const HMODULE module = LoadLibraryExW(WideText(path).c_str(), nullptr, LOAD_WITH_ALTERED_SEARCH_PATH);
+        if (module == nullptr) {
+            return kModuleNotFound;
+        }
+        library = std::bit_cast<LibraryHandle>(module);
+        return kSuccess;
+    }
+
+    Status resolve(LibraryHandle library, std::string_view name, LibraryFunction& function) override {
+        SetLastError(kSuccess);
+        const FARPROC entry = GetProcAddress(moduleOf(library), std::string(name).c_str());
+        if (entry == nullptr) {
+            return lastErrorOr(kProcedureNotFound);
+        }
+        function = std::bit_cast<LibraryFunction>(entry);
+        return kSuccess;
+    }
+
+    Status free(LibraryHandle library) override {
+        return FreeLibrary(moduleOf(library)) != 0 ? kSuccess : lastErrorOr(kInvalidHandle);
+    }
+};
+
 }  // namespace
 
-Status WindowsLibraryLoader::load(std::string_view path, LibraryHandle& library) {
-    if (!isAbsolutePath(path)) {
-        return kModuleNotFound;
-    }
-    const HMODULE module = LoadLibraryExW(WideText(path).c_str(), nullptr, LOAD_WITH_ALTERED_SEARCH_PATH);
-    if (module == nullptr) {
-        return kModuleNotFound;
-    }
-    library = std::bit_cast<LibraryHandle>(module);
-    return kSuccess;
-}
-
-Status WindowsLibraryLoader::resolve(LibraryHandle library, std::string_view name, LibraryFunction& function) {
-    SetLastError(kSuccess);
-    const FARPROC entry = GetProcAddress(moduleOf(library), std::string(name).c_str());
-    if (entry == nullptr) {
-        return lastErrorOr(kProcedureNotFound);
-    }
-    function = std::bit_cast<LibraryFunction>(entry);
-    return kSuccess;
-}
-
-Status WindowsLibraryLoader::free(LibraryHandle library) {
-    return FreeLibrary(moduleOf(library)) != 0 ? kSuccess : lastErrorOr(kInvalidHandle);
+std::unique_ptr<ILibraryLoader> windowsLibraries() {
+    return std::make_unique<WindowsLibraryLoader>();
 }
 
 }  // namespace kz7

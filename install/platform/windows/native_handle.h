@@ -1,4 +1,4 @@
-// Owners of the system's own handles, for the files of this folder: nothing that throws leaks one.
+// Owners of the system's own handles: what throws leaks none.
 #pragma once
 
 #include <windows.h>
@@ -7,26 +7,18 @@
 
 namespace kz7 {
 
-struct CloseNativeHandle {
+template <BOOL(WINAPI* close)(HANDLE)>
+struct CloseBy {
     using pointer = HANDLE;
-    void operator()(HANDLE handle) const { CloseHandle(handle); }
+    void operator()(HANDLE handle) const { close(handle); }
 };
-using NativeHandle = std::unique_ptr<void, CloseNativeHandle>;
+using NativeHandle = std::unique_ptr<void, CloseBy<CloseHandle>>;
+using FileSearch = std::unique_ptr<void, CloseBy<FindClose>>;
 
-// The result of a call that returns INVALID_HANDLE_VALUE on failure; null then.
-inline NativeHandle ownedFile(HANDLE file) {
-    return NativeHandle(file == INVALID_HANDLE_VALUE ? nullptr : file);
-}
-
-struct CloseSearch {
-    using pointer = HANDLE;
-    void operator()(HANDLE search) const { FindClose(search); }
-};
-using FileSearch = std::unique_ptr<void, CloseSearch>;
-
-// The same for FindFirstFile.
-inline FileSearch ownedSearch(HANDLE search) {
-    return FileSearch(search == INVALID_HANDLE_VALUE ? nullptr : search);
+// Owns the result of a call that returns INVALID_HANDLE_VALUE on failure; null then.
+template <typename Owner>
+Owner owned(HANDLE handle) {
+    return Owner(handle == INVALID_HANDLE_VALUE ? nullptr : handle);
 }
 
 struct FreeLocal {

@@ -7,17 +7,8 @@
 
 #include <cstdio>
 
-#include "install/platform/windows/assembly_cache.h"
-#include "install/platform/windows/console.h"
-#include "install/platform/windows/debug_output.h"
-#include "install/platform/windows/file_system.h"
-#include "install/platform/windows/host_information.h"
-#include "install/platform/windows/library_loader.h"
-#include "install/platform/windows/process_host.h"
-#include "install/platform/windows/registry.h"
-#include "install/platform/windows/services.h"
-#include "install/platform/windows/terminal.h"
-#include "install/platform/windows/threads.h"
+#include "install/platform/windows/change_lock.h"
+#include "install/platform/windows/ports.h"
 #include "install/platform/windows/wide_text.h"
 
 namespace kz7 {
@@ -29,8 +20,9 @@ public:
         : program_(options.program),
           // A library in an installer changes only what the user's own key holds.
           lock_(options.ownProcess && !options.readOnly, [this] { tellBusy(); }) {
-        ports_ = {&registry_, &services_,  &console_,    &debugOutput_, &files_,   &processes_,
-                  &threads_,  &libraries_, &assemblies_, &host_,        &terminal_};
+        ports_ = {registry_.get(),   services_.get(),  console_.get(), debugOutput_.get(),
+                  files_.get(),      processes_.get(), threads_.get(), libraries_.get(),
+                  assemblies_.get(), host_.get(),      terminal_.get()};
     }
 
     // The caller's own, so that nobody else can have put something in its place.
@@ -42,7 +34,7 @@ public:
             (CreateDirectoryW(WideText(own).c_str(), nullptr) == FALSE && GetLastError() != ERROR_ALREADY_EXISTS)) {
             return kPathNotFound;
         }
-        return files_.productPath(own, path);
+        return files_->productPath(own, path);
     }
     std::string storeName() override { return "the registry of this machine"; }
     bool storeIsOwn() override { return false; }
@@ -51,26 +43,26 @@ public:
 private:
     void tellBusy() {
         if (!faultTold_) {
-            console_.writeError(program_ +
-                                ": %ProgramData%\\KZ7\\lock: stayed locked by another program for 5 seconds\n");
+            console_->writeError(program_ +
+                                 ": %ProgramData%\\KZ7\\lock: stayed locked by another program for 5 seconds\n");
         }
         faultTold_ = true;
     }
 
     std::string program_;
     bool faultTold_ = false;
-    WindowsConsole console_;
-    WindowsDebugOutput debugOutput_{console_};
-    WindowsFileSystem files_;
+    std::unique_ptr<IConsole> console_ = windowsConsole();
+    std::unique_ptr<IDebugOutput> debugOutput_ = windowsDebugOutput(*console_);
+    std::unique_ptr<IFileSystem> files_ = windowsFiles();
     ChangeLock lock_;
-    WindowsRegistry registry_{lock_};
-    WindowsServiceManager services_{lock_};
-    WindowsProcessHost processes_;
-    WindowsThreads threads_;
-    WindowsLibraryLoader libraries_;
-    WindowsAssemblyCache assemblies_;
-    WindowsHost host_;
-    WindowsTerminal terminal_;
+    std::unique_ptr<IRegistryStore> registry_ = windowsRegistry(lock_);
+    std::unique_ptr<IServiceManager> services_ = windowsServices(lock_);
+    std::unique_ptr<IProcessHost> processes_ = windowsProcesses();
+    std::unique_ptr<IThreads> threads_ = windowsThreads();
+    std::unique_ptr<ILibraryLoader> libraries_ = windowsLibraries();
+    std::unique_ptr<IAssemblyCache> assemblies_ = windowsAssemblies();
+    std::unique_ptr<IHostInformation> host_ = windowsHost();
+    std::unique_ptr<ITerminal> terminal_ = windowsTerminal();
 };
 
 }  // namespace

@@ -1,4 +1,4 @@
-#include "install/platform/windows/process_host.h"
+#include "install/platform/windows/ports.h"
 
 #include <windows.h>
 
@@ -163,129 +163,132 @@ private:
     bool isMade_ = false;
 };
 
+class WindowsProcessHost final : public IProcessHost {
+public:
+    Status getSlot(StandardSlot slot, StreamHandle& stream) override {
+        const HANDLE handle = GetStdHandle(slotNumber(slot));
+        if (handle == INVALID_HANDLE_VALUE) {
+            return GetLastError();
+        }
+        stream = portHandle<StreamHandle>(handle);
+        return kSuccess;
+    }
+
+    Status setSlot(StandardSlot slot, StreamHandle stream) override {
+        return judged(SetStdHandle(slotNumber(slot), native(stream)));
+    }
+
+    Status createPipe(StreamHandle& readEnd, StreamHandle& writeEnd) override {
+        SECURITY_ATTRIBUTES inherited{sizeof inherited, nullptr, TRUE};
+        HANDLE reading = nullptr;
+        HANDLE writing = nullptr;
+        const Status status = judged(CreatePipe(&reading, &writing, &inherited, 0));
+        if (status == kSuccess) {
+            readEnd = portHandle<StreamHandle>(reading);
+            writeEnd = portHandle<StreamHandle>(writing);
+        }
+        return status;
+    }
+
+    Status duplicate(StreamHandle stream, StreamHandle& copy) override {
+        HANDLE handle = nullptr;
+        const Status status = judged(DuplicateHandle(GetCurrentProcess(), native(stream), GetCurrentProcess(), &handle,
+                                                     0, FALSE, DUPLICATE_SAME_ACCESS));
+        if (status == kSuccess) {
+            copy = portHandle<StreamHandle>(handle);
+        }
+        return status;
+    }
+
+    Status read(StreamHandle stream, Buffer& data) override {
+        DWORD count = 0;
+        const Status status = judged(ReadFile(native(stream), data.data, data.capacity, &count, nullptr));
+        if (status == kSuccess) {
+            data.size = count;
+        }
+        return status;
+    }
+
+    Status write(StreamHandle stream, std::string_view data) override {
+        DWORD count = 0;
+        return judged(WriteFile(native(stream), data.data(), static_cast<DWORD>(data.size()), &count, nullptr));
+    }
+
+    Status closeStream(StreamHandle stream) override { return judged(CloseHandle(native(stream))); }
+
+    Status startProcess(const ProcessStart& start, ProcessInformation& started) override {
+        const std::vector<CommandReading> readings = commandReadings(start.commandLine);
+        const SearchWithoutCurrentFolder search;
+        if (readings.empty() || hangsOnCurrentFolder(readings)) {
+            return kFileNotFound;
+        }
+        const std::string directory(start.workingDirectory);
+        if (!directory.empty() && !isAbsolutePath(directory)) {
+            return kBadDirectory;
+        }
+        InheritedHandles inherited({start.output, start.error, start.input});
+        if (inherited.status() != kSuccess) {
+            return inherited.status();
+        }
+        STARTUPINFOEXW startup{};
+        startup.StartupInfo.cb = sizeof startup;
+        startup.StartupInfo.dwFlags = STARTF_USESTDHANDLES | STARTF_USESHOWWINDOW;
+        startup.StartupInfo.wShowWindow = SW_HIDE;
+        startup.StartupInfo.hStdInput = native(start.input);
+        startup.StartupInfo.hStdOutput = native(start.output);
+        startup.StartupInfo.hStdError = native(start.error);
+        startup.lpAttributeList = inherited.list();
+        WideText commandLine(start.commandLine);  // the call writes into it
+        PROCESS_INFORMATION information{};
+        const Status status = judged(CreateProcessW(
+            nullptr, commandLine.data(), nullptr, nullptr, inherited.any() ? TRUE : FALSE,
+            NORMAL_PRIORITY_CLASS | CREATE_UNICODE_ENVIRONMENT | EXTENDED_STARTUPINFO_PRESENT, search.environment(),
+            directory.empty() ? nullptr : WideText(directory).c_str(), &startup.StartupInfo, &information));
+        if (status == kSuccess) {
+            started = {portHandle<ProcessHandle>(information.hProcess), portHandle<ProcessHandle>(information.hThread),
+                       information.dwProcessId, information.dwThreadId};
+        }
+        return status;
+    }
+
+    Status waitProcess(ProcessHandle process, std::uint32_t milliseconds) override {
+        switch (WaitForSingleObject(native(process), milliseconds)) {
+            case WAIT_OBJECT_0:
+                return kSuccess;
+            case WAIT_TIMEOUT:
+                return kWaitTimedOut;
+            default:
+                return GetLastError();
+        }
+    }
+
+    Status exitCode(ProcessHandle process, std::uint32_t& code) override {
+        DWORD found = 0;
+        const Status status = judged(GetExitCodeProcess(native(process), &found));
+        if (status == kSuccess) {
+            code = found;
+        }
+        return status;
+    }
+
+    Status closeProcess(ProcessHandle process) override { return judged(CloseHandle(native(process))); }
+
+    Status shortPath(std::string_view path, Buffer& shortened) override {
+        const WideText wide(path);
+        DWORD error = kSuccess;
+        const std::string found = textOf([&](wchar_t* room, DWORD size) {
+            const DWORD length = GetShortPathNameW(wide.c_str(), room, size);
+            error = length == 0 ? GetLastError() : kSuccess;
+            return length;
+        });
+        return error != kSuccess ? error : giveName(found, shortened);
+    }
+};
+
 }  // namespace
 
-Status WindowsProcessHost::getSlot(StandardSlot slot, StreamHandle& stream) {
-    const HANDLE handle = GetStdHandle(slotNumber(slot));
-    if (handle == INVALID_HANDLE_VALUE) {
-        return GetLastError();
-    }
-    stream = portHandle<StreamHandle>(handle);
-    return kSuccess;
-}
-
-Status WindowsProcessHost::setSlot(StandardSlot slot, StreamHandle stream) {
-    return judged(SetStdHandle(slotNumber(slot), native(stream)));
-}
-
-Status WindowsProcessHost::createPipe(StreamHandle& readEnd, StreamHandle& writeEnd) {
-    SECURITY_ATTRIBUTES inherited{sizeof inherited, nullptr, TRUE};
-    HANDLE reading = nullptr;
-    HANDLE writing = nullptr;
-    const Status status = judged(CreatePipe(&reading, &writing, &inherited, 0));
-    if (status == kSuccess) {
-        readEnd = portHandle<StreamHandle>(reading);
-        writeEnd = portHandle<StreamHandle>(writing);
-    }
-    return status;
-}
-
-Status WindowsProcessHost::duplicate(StreamHandle stream, StreamHandle& copy) {
-    HANDLE handle = nullptr;
-    const Status status = judged(DuplicateHandle(GetCurrentProcess(), native(stream), GetCurrentProcess(), &handle, 0,
-                                                 FALSE, DUPLICATE_SAME_ACCESS));
-    if (status == kSuccess) {
-        copy = portHandle<StreamHandle>(handle);
-    }
-    return status;
-}
-
-Status WindowsProcessHost::read(StreamHandle stream, Buffer& data) {
-    DWORD count = 0;
-    const Status status = judged(ReadFile(native(stream), data.data, data.capacity, &count, nullptr));
-    if (status == kSuccess) {
-        data.size = count;
-    }
-    return status;
-}
-
-Status WindowsProcessHost::write(StreamHandle stream, std::string_view data) {
-    DWORD count = 0;
-    return judged(WriteFile(native(stream), data.data(), static_cast<DWORD>(data.size()), &count, nullptr));
-}
-
-Status WindowsProcessHost::closeStream(StreamHandle stream) {
-    return judged(CloseHandle(native(stream)));
-}
-
-Status WindowsProcessHost::startProcess(const ProcessStart& start, ProcessInformation& started) {
-    const std::vector<CommandReading> readings = commandReadings(start.commandLine);
-    const SearchWithoutCurrentFolder search;
-    if (readings.empty() || hangsOnCurrentFolder(readings)) {
-        return kFileNotFound;
-    }
-    const std::string directory(start.workingDirectory);
-    if (!directory.empty() && !isAbsolutePath(directory)) {
-        return kBadDirectory;
-    }
-    InheritedHandles inherited({start.output, start.error, start.input});
-    if (inherited.status() != kSuccess) {
-        return inherited.status();
-    }
-    STARTUPINFOEXW startup{};
-    startup.StartupInfo.cb = sizeof startup;
-    startup.StartupInfo.dwFlags = STARTF_USESTDHANDLES | STARTF_USESHOWWINDOW;
-    startup.StartupInfo.wShowWindow = SW_HIDE;
-    startup.StartupInfo.hStdInput = native(start.input);
-    startup.StartupInfo.hStdOutput = native(start.output);
-    startup.StartupInfo.hStdError = native(start.error);
-    startup.lpAttributeList = inherited.list();
-    WideText commandLine(start.commandLine);  // the call writes into it
-    PROCESS_INFORMATION information{};
-    const Status status = judged(CreateProcessW(
-        nullptr, commandLine.data(), nullptr, nullptr, inherited.any() ? TRUE : FALSE,
-        NORMAL_PRIORITY_CLASS | CREATE_UNICODE_ENVIRONMENT | EXTENDED_STARTUPINFO_PRESENT, search.environment(),
-        directory.empty() ? nullptr : WideText(directory).c_str(), &startup.StartupInfo, &information));
-    if (status == kSuccess) {
-        started = {portHandle<ProcessHandle>(information.hProcess), portHandle<ProcessHandle>(information.hThread),
-                   information.dwProcessId, information.dwThreadId};
-    }
-    return status;
-}
-
-Status WindowsProcessHost::waitProcess(ProcessHandle process, std::uint32_t milliseconds) {
-    switch (WaitForSingleObject(native(process), milliseconds)) {
-        case WAIT_OBJECT_0:
-            return kSuccess;
-        case WAIT_TIMEOUT:
-            return kWaitTimedOut;
-        default:
-            return GetLastError();
-    }
-}
-
-Status WindowsProcessHost::exitCode(ProcessHandle process, std::uint32_t& code) {
-    DWORD found = 0;
-    const Status status = judged(GetExitCodeProcess(native(process), &found));
-    if (status == kSuccess) {
-        code = found;
-    }
-    return status;
-}
-
-Status WindowsProcessHost::closeProcess(ProcessHandle process) {
-    return judged(CloseHandle(native(process)));
-}
-
-Status WindowsProcessHost::shortPath(std::string_view path, Buffer& shortened) {
-    const WideText wide(path);
-    DWORD error = kSuccess;
-    const std::string found = textOf([&](wchar_t* room, DWORD size) {
-        const DWORD length = GetShortPathNameW(wide.c_str(), room, size);
-        error = length == 0 ? GetLastError() : kSuccess;
-        return length;
-    });
-    return error != kSuccess ? error : giveName(found, shortened);
+std::unique_ptr<IProcessHost> windowsProcesses() {
+    return std::make_unique<WindowsProcessHost>();
 }
 
 }  // namespace kz7

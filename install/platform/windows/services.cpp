@@ -1,7 +1,8 @@
-#include "install/platform/windows/services.h"
+#include "install/platform/windows/ports.h"
 
 #include <windows.h>
 
+#include "install/platform/windows/change_lock.h"
 #include "install/platform/windows/wide_text.h"
 
 namespace kz7 {
@@ -26,89 +27,95 @@ Status done(BOOL result) {
     return result ? kSuccess : GetLastError();
 }
 
-}  // namespace
+class WindowsServiceManager final : public IServiceManager {
+public:
+    explicit WindowsServiceManager(ChangeLock& lock) : lock_(lock) {}
 
-Status WindowsServiceManager::openManager(std::uint32_t access, ServiceHandle& manager) {
-    if (const Status status = lock_.hold(); status != kSuccess) {
+    Status openManager(std::uint32_t access, ServiceHandle& manager) override {
+        if (const Status status = lock_.hold(); status != kSuccess) {
+            return status;
+        }
+        return opened(OpenSCManagerW(nullptr, nullptr, access), manager);
+    }
+
+    Status createService(ServiceHandle manager, const ServiceDefinition& definition, ServiceHandle& service) override {
+        if (!isServiceName(definition.name)) {
+            return kInvalidName;
+        }
+        const WideText name(definition.name);
+        const WideText displayName(definition.displayName);
+        const WideText program(definition.programPath);
+        const ULONGLONG begin = GetTickCount64();
+        for (;;) {
+            const Status status =
+                opened(CreateServiceW(native(manager), name.c_str(), displayName.c_str(), kServiceAllAccess,
+                                      definition.type, static_cast<DWORD>(definition.start), definition.errorControl,
+                                      program.c_str(), nullptr, nullptr, nullptr, nullptr, nullptr),
+                       service);
+            if (status != kServiceMarkedForDelete || GetTickCount64() - begin >= definition.deletionWait) {
+                return status;
+            }
+            Sleep(kPoll);
+        }
+    }
+
+    Status openService(ServiceHandle manager, std::string_view name, std::uint32_t access,
+                       ServiceHandle& service) override {
+        if (!isServiceName(name)) {
+            return kInvalidName;
+        }
+        return opened(OpenServiceW(native(manager), WideText(name).c_str(), access), service);
+    }
+
+    Status changeStartType(ServiceHandle service, ServiceStart start) override {
+        return done(ChangeServiceConfigW(native(service), SERVICE_NO_CHANGE, static_cast<DWORD>(start),
+                                         SERVICE_NO_CHANGE, nullptr, nullptr, nullptr, nullptr, nullptr, nullptr,
+                                         nullptr));
+    }
+
+    Status startService(ServiceHandle service) override { return done(StartServiceW(native(service), 0, nullptr)); }
+
+    Status stopService(ServiceHandle service) override {
+        SERVICE_STATUS answered{};
+        return done(ControlService(native(service), SERVICE_CONTROL_STOP, &answered));
+    }
+
+    Status waitForStop(ServiceHandle service, std::uint32_t milliseconds) override {
+        const ULONGLONG begin = GetTickCount64();
+        for (;;) {
+            ServiceState state{};
+            const Status status = queryState(service, state);
+            if (status != kSuccess || state == ServiceState::stopped) {
+                return status;
+            }
+            if (GetTickCount64() - begin >= milliseconds) {
+                return kWaitTimedOut;
+            }
+            Sleep(kPoll);
+        }
+    }
+
+    Status queryState(ServiceHandle service, ServiceState& state) override {
+        SERVICE_STATUS answered{};
+        const Status status = done(QueryServiceStatus(native(service), &answered));
+        if (status == kSuccess) {
+            state = static_cast<ServiceState>(answered.dwCurrentState);
+        }
         return status;
     }
-    return opened(OpenSCManagerW(nullptr, nullptr, access), manager);
-}
 
-Status WindowsServiceManager::createService(ServiceHandle manager, const ServiceDefinition& definition,
-                                            ServiceHandle& service) {
-    if (!isServiceName(definition.name)) {
-        return kInvalidName;
-    }
-    const WideText name(definition.name);
-    const WideText displayName(definition.displayName);
-    const WideText program(definition.programPath);
-    const ULONGLONG begin = GetTickCount64();
-    for (;;) {
-        const Status status =
-            opened(CreateServiceW(native(manager), name.c_str(), displayName.c_str(), kServiceAllAccess,
-                                  definition.type, static_cast<DWORD>(definition.start), definition.errorControl,
-                                  program.c_str(), nullptr, nullptr, nullptr, nullptr, nullptr),
-                   service);
-        if (status != kServiceMarkedForDelete || GetTickCount64() - begin >= definition.deletionWait) {
-            return status;
-        }
-        Sleep(kPoll);
-    }
-}
+    Status deleteService(ServiceHandle service) override { return done(DeleteService(native(service))); }
 
-Status WindowsServiceManager::openService(ServiceHandle manager, std::string_view name, std::uint32_t access,
-                                          ServiceHandle& service) {
-    if (!isServiceName(name)) {
-        return kInvalidName;
-    }
-    return opened(OpenServiceW(native(manager), WideText(name).c_str(), access), service);
-}
+    Status closeHandle(ServiceHandle handle) override { return done(CloseServiceHandle(native(handle))); }
 
-Status WindowsServiceManager::changeStartType(ServiceHandle service, ServiceStart start) {
-    return done(ChangeServiceConfigW(native(service), SERVICE_NO_CHANGE, static_cast<DWORD>(start), SERVICE_NO_CHANGE,
-                                     nullptr, nullptr, nullptr, nullptr, nullptr, nullptr, nullptr));
-}
+private:
+    ChangeLock& lock_;
+};
 
-Status WindowsServiceManager::startService(ServiceHandle service) {
-    return done(StartServiceW(native(service), 0, nullptr));
-}
+}  // namespace
 
-Status WindowsServiceManager::stopService(ServiceHandle service) {
-    SERVICE_STATUS answered{};
-    return done(ControlService(native(service), SERVICE_CONTROL_STOP, &answered));
-}
-
-Status WindowsServiceManager::waitForStop(ServiceHandle service, std::uint32_t milliseconds) {
-    const ULONGLONG begin = GetTickCount64();
-    for (;;) {
-        ServiceState state{};
-        const Status status = queryState(service, state);
-        if (status != kSuccess || state == ServiceState::stopped) {
-            return status;
-        }
-        if (GetTickCount64() - begin >= milliseconds) {
-            return kWaitTimedOut;
-        }
-        Sleep(kPoll);
-    }
-}
-
-Status WindowsServiceManager::queryState(ServiceHandle service, ServiceState& state) {
-    SERVICE_STATUS answered{};
-    const Status status = done(QueryServiceStatus(native(service), &answered));
-    if (status == kSuccess) {
-        state = static_cast<ServiceState>(answered.dwCurrentState);
-    }
-    return status;
-}
-
-Status WindowsServiceManager::deleteService(ServiceHandle service) {
-    return done(DeleteService(native(service)));
-}
-
-Status WindowsServiceManager::closeHandle(ServiceHandle handle) {
-    return done(CloseServiceHandle(native(handle)));
+std::unique_ptr<IServiceManager> windowsServices(ChangeLock& lock) {
+    return std::make_unique<WindowsServiceManager>(lock);
 }
 
 }  // namespace kz7

@@ -1,4 +1,4 @@
-#include "install/platform/windows/threads.h"
+#include "install/platform/windows/ports.h"
 
 #include <process.h>
 #include <windows.h>
@@ -15,27 +15,35 @@ unsigned __stdcall enter(void* record) {
     return 0;
 }
 
+// Threads of the C runtime, which then keeps its data of each.
+class WindowsThreads final : public IThreads {
+public:
+    Status startThread(std::unique_ptr<ThreadStart>& record, std::uint32_t stackBytes, std::uint32_t& id,
+                       ThreadHandle& thread) override {
+        unsigned number = 0;
+        const std::uintptr_t handle = _beginthreadex(nullptr, stackBytes, enter, record.get(), 0, &number);
+        if (handle == 0) {
+            return _doserrno != 0 ? static_cast<Status>(_doserrno) : kTooManyThreads;
+        }
+        static_cast<void>(record.release());
+        id = number;
+        thread = ThreadHandle{handle};
+        return kSuccess;
+    }
+
+    Status waitThread(ThreadHandle thread) override {
+        return WaitForSingleObject(native(thread), INFINITE) == WAIT_OBJECT_0 ? kSuccess : GetLastError();
+    }
+
+    Status closeThread(ThreadHandle thread) override {
+        return CloseHandle(native(thread)) != FALSE ? kSuccess : GetLastError();
+    }
+};
+
 }  // namespace
 
-Status WindowsThreads::startThread(std::unique_ptr<ThreadStart>& record, std::uint32_t stackBytes, std::uint32_t& id,
-                                   ThreadHandle& thread) {
-    unsigned number = 0;
-    const std::uintptr_t handle = _beginthreadex(nullptr, stackBytes, enter, record.get(), 0, &number);
-    if (handle == 0) {
-        return _doserrno != 0 ? static_cast<Status>(_doserrno) : kTooManyThreads;
-    }
-    static_cast<void>(record.release());
-    id = number;
-    thread = ThreadHandle{handle};
-    return kSuccess;
-}
-
-Status WindowsThreads::waitThread(ThreadHandle thread) {
-    return WaitForSingleObject(native(thread), INFINITE) == WAIT_OBJECT_0 ? kSuccess : GetLastError();
-}
-
-Status WindowsThreads::closeThread(ThreadHandle thread) {
-    return CloseHandle(native(thread)) != FALSE ? kSuccess : GetLastError();
+std::unique_ptr<IThreads> windowsThreads() {
+    return std::make_unique<WindowsThreads>();
 }
 
 }  // namespace kz7

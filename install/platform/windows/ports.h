@@ -1,0 +1,24 @@
+// The ports of this host. Each factory is in the source file that is named after its port.
+#pragma once
+
+#include <memory>
+
+#include "install/platform/platform.h"
+
+namespace kz7 {
+
+class ChangeLock;
+
+std::unique_ptr<IRegistryStore> windowsRegistry(ChangeLock& lock);
+std::unique_ptr<IServiceManager> windowsServices(ChangeLock& lock);
+std::unique_ptr<IConsole> windowsConsole();
+std::unique_ptr<IDebugOutput> windowsDebugOutput(IConsole& console);
+std::unique_ptr<IFileSystem> windowsFiles();
+std::unique_ptr<IProcessHost> windowsProcesses();
+std::unique_ptr<IThreads> windowsThreads();
+std::unique_ptr<ILibraryLoader> windowsLibraries();
+std::unique_ptr<IAssemblyCache> windowsAssemblies();
+std::unique_ptr<IHostInformation> windowsHost();
+std::unique_ptr<ITerminal> windowsTerminal();
+
+}  // namespace kz7
