@@ -9,6 +9,7 @@
 #include <thread>
 
 #include "install/admin/key_walk.h"
+#include "install/platform/intercept/ports.h"
 #include "install/src/registry/registry_access.h"
 #include "install/src/services/management_service.h"
 #include "tests/support/backends.h"
@@ -63,6 +64,8 @@ protected:
     }
 
     static constexpr auto kScratch = "SOFTWARE\\KZ7 test of Windows";
+    static constexpr auto kTree = "SOFTWARE\\KZ7 test of Windows\\Tree";
+    static constexpr auto kCopy = "SOFTWARE\\KZ7 test of Windows\\Copy";
     std::unique_ptr<Backend> backend_ = backendNamed("host");
     IPlatform& platform_ = backend_->platform();
     IRegistryStore& registry_ = platform_.registry();
@@ -91,6 +94,38 @@ TEST_F(OnWindows, NoWalkFollowsALinkInTheRegistry) {
     lay();
     EXPECT_EQ(importText(registry_, "REGEDIT4\n[-HKEY_LOCAL_MACHINE\\" + below("Tree") + "]\n"), "");
     EXPECT_TRUE(has(below("Target\\Below")) && !has(below("Tree")));
+}
+
+// Runs something each time that a call of a port names that key.
+struct Intruder : ICallObserver {
+    Intruder(std::string seen, std::function<void()> act) : seen_(std::move(seen)), act_(std::move(act)) {}
+    void after(const PortCall& call) override {
+        if (call.text().find(seen_) != std::string::npos) {
+            std::exchange(act_, [] {})();
+        }
+    }
+    std::string seen_;
+    std::function<void()> act_;
+};
+
+TEST_F(OnWindows, NoWalkFollowsALinkThatAppearsInItsWay) {
+    const auto walk = [](IRegistryStore& registry, bool isCopy) {
+        return isCopy ? TreeCopy(registry).copy(KeyHandle::localMachine, kTree, KeyHandle::localMachine, kCopy, true)
+                      : deleteTree(registry, KeyHandle::localMachine, kTree, 0, {}, {});
+    };
+    for (const bool isCopy : {true, false}) {
+        make(below("Target\\Leaf\\Secret"));
+        make(below("Tree\\Mid\\Leaf"));
+        Intruder intruder("\"Leaf\"", [&] {
+            registry_.deleteKey(KeyHandle::localMachine, below("Tree\\Mid\\Leaf"), 0);
+            registry_.deleteKey(KeyHandle::localMachine, below("Tree\\Mid"), 0);
+            makeLink(below("Tree\\Mid"), below("Target"));
+        });
+        InterceptedRegistry watched(registry_, intruder);
+        EXPECT_EQ(walk(watched, isCopy), kKeyDeleted);
+        EXPECT_TRUE(has(below("Target\\Leaf\\Secret")) && !has(below("Copy\\Mid\\Leaf\\Secret")));
+        deleteTree(registry_, KeyHandle::localMachine, kTree, 0, {}, {});
+    }
 }
 
 TEST_F(OnWindows, KeysThatCannotBeReadAreLeftOutAndTold) {

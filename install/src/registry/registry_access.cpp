@@ -10,8 +10,8 @@ namespace {
 
 constexpr std::size_t kMaxDepth = 1 << 16;  // levels below the first key; more are a cycle in a damaged store
 
-// Deletes a tree depth first. It holds a handle for each level, so that a subkey whose path does not fit can be reached
-// from the key above it. Iterative: the depth of a tree is input.
+// Deletes a tree depth first. Each level is opened below the handle of the level above: a path could lead elsewhere by
+// now, through a link that another program puts into it. Iterative: the depth of a tree is input.
 class TreeDeletion {
 public:
     TreeDeletion(IRegistryStore& registry, KeyHandle root, AccessMask view, std::string_view copyName,
@@ -37,33 +37,19 @@ public:
 private:
     struct Level {
         OwnedKey key;
-        KeyHandle parent;         // where `address` begins: the root, or the level above
-        std::string address;      // the substituted path, or the subkey's name if that path does not fit
-        std::size_t pathLength;   // of path_ without this level
+        std::string path;         // below the level above
         std::uint32_t index = 0;  // of the subkeys to spare
     };
 
-    // Opens the first key by its path, or a subkey of the last level.
-    Status open(std::string_view name) {
-        Level level{OwnedKey(registry_), root_, {}, path_.size()};
-        // Below a level whose path does not fit, none does.
-        if (levels_.empty() || levels_.back().parent == root_) {
-            path_.append(levels_.empty() ? "" : "\\").append(name);
-            level.address = substituteCopyName(path_, copyName_);
+    // The root, or the last level.
+    KeyHandle parent() const { return levels_.empty() ? root_ : levels_.back().key.get(); }
+
+    Status open(std::string_view path) {
+        Level level{OwnedKey(registry_), substituteCopyName(path, copyName_)};
+        Status status = levels_.size() > kMaxDepth ? kRegistryCorrupt : checkPathLength(level.path);
+        if (succeeded(status)) {
+            status = registry_.openKey(parent(), level.path, kKeyFull | kKeyOpenLink | view_, level.key.receive());
         }
-        const Status fits = level.address.empty() ? kFilenameExceedsRange : checkPathLength(level.address);
-        if (!succeeded(fits)) {
-            if (levels_.empty()) {
-                return fits;
-            }
-            level.parent = levels_.back().key.get();
-            level.address = name;
-        }
-        if (levels_.size() > kMaxDepth) {
-            return kRegistryCorrupt;
-        }
-        const Status status =
-            registry_.openKey(level.parent, level.address, kKeyFull | kKeyOpenLink | view_, level.key.receive());
         if (succeeded(status)) {
             levels_.push_back(std::move(level));
         }
@@ -72,12 +58,9 @@ private:
 
     // Deletes the key of the last level, which has no subkeys left but spared ones.
     Status deleteLast() {
-        Level& level = levels_.back();
-        level.key.reset();
-        const Status status = registry_.deleteKey(level.parent, level.address, view_);
-        path_.resize(level.pathLength);
+        const std::string path = std::move(levels_.back().path);
         levels_.pop_back();
-        return status;
+        return registry_.deleteKey(parent(), path, view_);
     }
 
     IRegistryStore& registry_;
@@ -85,7 +68,6 @@ private:
     AccessMask view_;
     std::string_view copyName_;
     std::string_view spared_;
-    std::string path_;  // unsubstituted, of the last level whose path fits
     std::vector<Level> levels_;
     TextBuffer<256> name_;
 };
@@ -123,32 +105,31 @@ bool valueExists(IRegistryStore& registry, KeyHandle key, std::string_view name)
 
 Status TreeCopy::copy(KeyHandle sourceRoot, std::string_view sourcePath, KeyHandle targetRoot,
                       std::string_view targetPath, bool overwrite) {
-    sourceRoot_ = sourceRoot;
-    targetRoot_ = targetRoot;
-    sourcePath_ = sourcePath;
-    targetPath_ = targetPath;
-    return copyBelow(overwrite);
+    overwrite_ = overwrite;
+    path_ = sourcePath.size() > targetPath.size() ? sourcePath : targetPath;
+    return copyKey(sourceRoot, sourcePath, targetRoot, targetPath);
 }
 
-Status TreeCopy::copyBelow(bool overwrite) {
+Status TreeCopy::copyKey(KeyHandle sourceParent, std::string_view sourcePath, KeyHandle targetParent,
+                         std::string_view targetPath) {
     OwnedKey source(registry_);
     OwnedKey target(registry_);
-    Status status = checkPathLength(sourcePath_.size() > targetPath_.size() ? sourcePath_ : targetPath_);
+    Status status = checkPathLength(path_);
     if (succeeded(status)) {
-        status = registry_.openKey(sourceRoot_, sourcePath_, kKeyRead | kKeyRefuseLink, source.receive());
+        status = registry_.openKey(sourceParent, sourcePath, kKeyRead | kKeyRefuseLink, source.receive());
     }
     if (succeeded(status)) {
-        status = registry_.createKey(targetRoot_, targetPath_, {}, kKeyCopyTarget | kKeyRefuseLink, target.receive());
+        status = registry_.createKey(targetParent, targetPath, {}, kKeyCopyTarget | kKeyRefuseLink, target.receive());
     }
     if (succeeded(status)) {
-        status = copySubkeys(source.get(), target.get(), overwrite);
+        status = copySubkeys(source.get(), target.get());
     }
-    return succeeded(status) ? copyValues(source.get(), target.get(), overwrite) : status;
+    return succeeded(status) ? copyValues(source.get(), target.get()) : status;
 }
 
-Status TreeCopy::copySubkeys(KeyHandle source, KeyHandle target, bool overwrite) {
-    const std::size_t sourceLength = sourcePath_.size();
-    const std::size_t targetLength = targetPath_.size();
+// Each level is opened below the handles of the level above: a path could lead elsewhere by now.
+Status TreeCopy::copySubkeys(KeyHandle source, KeyHandle target) {
+    const std::size_t length = path_.size();
     for (std::uint32_t index = 0;; ++index) {
         Status status = registry_.enumerateKey(source, index, name_, &class_);
         if (!succeeded(status)) {
@@ -160,25 +141,24 @@ Status TreeCopy::copySubkeys(KeyHandle source, KeyHandle target, bool overwrite)
             return status;
         }
         made.reset();
-        sourcePath_.append(1, '\\').append(name_.view());
-        targetPath_.append(1, '\\').append(name_.view());
-        status = copyBelow(overwrite);
+        path_.append(1, '\\').append(name_.view());
+        const std::string name(name_.view());
+        status = copyKey(source, name, target, name);
         if (!succeeded(status)) {
             return status;
         }
-        sourcePath_.resize(sourceLength);
-        targetPath_.resize(targetLength);
+        path_.resize(length);
     }
 }
 
-Status TreeCopy::copyValues(KeyHandle source, KeyHandle target, bool overwrite) {
+Status TreeCopy::copyValues(KeyHandle source, KeyHandle target) {
     for (std::uint32_t index = 0;; ++index) {
         ValueType type{};
         Status status = registry_.enumerateValue(source, index, valueName_, &type, &data_);
         if (!succeeded(status)) {
             return isEndOfItems(status) ? kSuccess : status;
         }
-        if (!overwrite && valueExists(registry_, target, valueName_.view())) {
+        if (!overwrite_ && valueExists(registry_, target, valueName_.view())) {
             continue;
         }
         status = registry_.setValue(target, valueName_.view(), type, data_.view());

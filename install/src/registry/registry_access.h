@@ -33,15 +33,14 @@ public:
                 bool overwrite);
 
 private:
-    Status copyBelow(bool overwrite);
-    Status copySubkeys(KeyHandle source, KeyHandle target, bool overwrite);
-    Status copyValues(KeyHandle source, KeyHandle target, bool overwrite);
+    Status copyKey(KeyHandle sourceParent, std::string_view sourcePath, KeyHandle targetParent,
+                   std::string_view targetPath);
+    Status copySubkeys(KeyHandle source, KeyHandle target);
+    Status copyValues(KeyHandle source, KeyHandle target);
 
     IRegistryStore& registry_;
-    KeyHandle sourceRoot_ = KeyHandle::none;
-    KeyHandle targetRoot_ = KeyHandle::none;
-    std::string sourcePath_;
-    std::string targetPath_;
+    bool overwrite_ = false;
+    std::string path_;  // of the last level, the longer one of source and target
     // Shared by all levels: a set of buffers for each level would overflow a small stack.
     TextBuffer<260> name_;
     TextBuffer<260> class_;
