@@ -65,7 +65,7 @@ TEST(RegistryAccess, ATreeDeletionReachesBelowThePathsThatFit) {
     OwnedKey key(machine.registry_);
     machine.registry_.createKey(kMachine, "T", {}, kKeyFull, key.receive());
     for (int level = 0; level < 20; ++level) {
-        for (const char* name : {"leaf", "spared"}) {
+        for (const char* name : {"leaf", "spared", "$CurrentInstallationName$"}) {
             OwnedKey leaf(machine.registry_);
             machine.registry_.createKey(key.get(), name, {}, kKeyFull, leaf.receive());
         }
@@ -75,7 +75,7 @@ TEST(RegistryAccess, ATreeDeletionReachesBelowThePathsThatFit) {
     }
     key.reset();
     EXPECT_EQ(deleteTree(machine.registry_, kMachine, "T", 0, {}, "spared"), kAccessDenied);
-    EXPECT_EQ(deleteTree(machine.registry_, kMachine, "T", 0, {}, {}), kSuccess);
+    EXPECT_EQ(deleteTree(machine.registry_, kMachine, "T", 0, "NAME", {}), kSuccess);
     EXPECT_EQ(machine.dump(), "[Beside] \n");
 }
 

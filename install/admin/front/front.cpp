@@ -5,6 +5,7 @@
 #include <charconv>
 #include <chrono>
 #include <functional>
+#include <new>
 #include <numeric>
 
 #include "install/platform/command_line.h"
@@ -21,8 +22,9 @@ constexpr std::string_view kAbort = "ABORT";
 
 // Marks the end of a program's output, written after it once the program has ended: programs that it has started may
 // keep the pipe open.
-constexpr char kEndText[] = "\0kz7admin front: the program has ended";
-constexpr std::string_view kEndLine{kEndText, sizeof kEndText - 1};
+constexpr char kEndText[] = "\n\0kz7admin front: the program has ended\n";
+constexpr std::string_view kEndMark{kEndText, sizeof kEndText - 1};
+constexpr std::string_view kEndLine = kEndMark.substr(1, kEndMark.size() - 2);
 
 // Reads one of the program's streams on a thread of its own.
 class StreamReader {
@@ -50,7 +52,7 @@ public:
     void finish() {
         if (thread_ != ThreadHandle::none) {
             isEnding_ = true;
-            ports_.processes.write(writeEnd_.get(), "\n" + std::string(kEndLine) + "\n");
+            ports_.processes.write(writeEnd_.get(), kEndMark);
             ports_.threads.waitThread(thread_);
             ports_.threads.closeThread(std::exchange(thread_, ThreadHandle::none));
         }
@@ -69,10 +71,20 @@ private:
             }
         };
         FixedBuffer<4096> piece;
-        while (!hasEnded && ports_.processes.read(readEnd_.get(), piece) == kSuccess) {
-            cutter.add(piece.view(), takeLine);
+        Status status = kSuccess;
+        while (!hasEnded && status == kSuccess) {
+            status = ports_.processes.read(readEnd_.get(), piece);
+            // What there is no memory for is not shown; a reader that ended would keep the program waiting.
+            try {
+                if (status == kSuccess) {
+                    cutter.add(piece.view(), takeLine);
+                } else {
+                    cutter.end(takeLine);
+                }
+            } catch (const std::bad_alloc&) {
+                hasEnded = isEnding_;
+            }
         }
-        cutter.end(takeLine);
     }
 
     const FrontPorts& ports_;

@@ -1,6 +1,5 @@
 #include "install/platform/embedded/ports.h"
 
-#include <algorithm>
 #include <filesystem>
 #include <string>
 #include <system_error>
@@ -27,14 +26,11 @@ public:
         const std::string folder = hostPath(std::string(location) + "\\bin", stateDirectory_);
         std::vector<std::string> files;
         // A folder that is missing or cannot be read has nothing to register.
-        std::error_code ignored;
-        for (std::filesystem::directory_iterator entry(folder, ignored), end; entry != end; entry.increment(ignored)) {
-            std::string file = entry->path().filename().string();
-            if (isProviderFile(file) && entry->is_regular_file(ignored)) {
-                files.push_back(std::move(file));
-            }
-        }
-        std::sort(files.begin(), files.end());
+        namesIn(folder, files);
+        std::erase_if(files, [&](const std::string& file) {
+            std::error_code ignored;
+            return !isProviderFile(file) || !std::filesystem::is_regular_file(folder + '/' + file, ignored);
+        });
         return recordProviders(registry_, location, level, generations, files);
     }
 

@@ -1,6 +1,5 @@
 #include "install/platform/embedded/ports.h"
 
-#include <dirent.h>
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -189,21 +188,17 @@ public:
         if (folder == std::string::npos) {
             return kFileNotFound;
         }
-        const std::unique_ptr<DIR, int (*)(DIR*)> entries(opendir(host.substr(0, folder + 1).c_str()), closedir);
-        if (entries == nullptr) {
-            return statusOf(errno);
+        std::vector<std::string> names;
+        if (const int error = namesIn(host.substr(0, folder + 1), names); error != 0) {
+            return statusOf(error);
         }
-        std::string first;
-        while (const dirent* entry = readdir(entries.get())) {
-            if (fitsPattern(entry->d_name, std::string_view(host).substr(folder + 1)) &&
-                (first.empty() || entry->d_name < first)) {
-                first = entry->d_name;
-            }
-        }
-        if (first.empty()) {
+        const auto first = std::find_if(names.begin(), names.end(), [&](const std::string& found) {
+            return fitsPattern(found, std::string_view(host).substr(folder + 1));
+        });
+        if (first == names.end()) {
             return kFileNotFound;
         }
-        name = std::move(first);
+        name = std::move(*first);
         return kSuccess;
     }
 

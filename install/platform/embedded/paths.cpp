@@ -1,6 +1,10 @@
 #include "install/platform/embedded/paths.h"
 
+#include <dirent.h>
+
 #include <algorithm>
+#include <cerrno>
+#include <memory>
 
 namespace kz7 {
 namespace {
@@ -28,6 +32,18 @@ std::string hostPath(std::string_view productPath, const std::string& stateDirec
     }
     const char drive = static_cast<char>(path[0] | 0x20);
     return stateDirectory + "/drive_" + drive + path.substr(2);
+}
+
+int namesIn(const std::string& directory, std::vector<std::string>& names) {
+    const std::unique_ptr<DIR, int (*)(DIR*)> entries(opendir(directory.c_str()), closedir);
+    if (entries == nullptr) {
+        return errno;
+    }
+    while (const dirent* entry = readdir(entries.get())) {
+        names.emplace_back(entry->d_name);
+    }
+    std::sort(names.begin(), names.end());
+    return 0;
 }
 
 }  // namespace kz7

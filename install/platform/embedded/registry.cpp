@@ -96,6 +96,7 @@ Status EmbeddedRegistry::fail(int result) {
     if ((result & 0xFF) == SQLITE_TOOBIG) {
         return kInvalidParameter;
     }
+    fault_ = kRegistryIoFailed;  // should there be no memory to explain it
     return fail(file_.explain(connection_.get(), result));
 }
 
@@ -161,6 +162,7 @@ Status EmbeddedRegistry::commit() {
         const int result = execute(connection_.get(), "COMMIT");
         commitFailed_ = result != SQLITE_OK;
         if (commitFailed_) {
+            fault_ = kRegistryIoFailed;  // should there be no memory to explain it
             StoreFault fault = file_.explain(connection_.get(), result);
             endTransaction();
             if (commitFailed_) {
@@ -233,6 +235,8 @@ EmbeddedRegistry::OpenKey* EmbeddedRegistry::slotOf(KeyHandle handle) {
 KeyHandle EmbeddedRegistry::giveOut(KeyId id, AccessMask access) {
     if (free_.empty()) {
         open_.emplace_back();
+        // A key is closed without an allocation: owners do it while an exception is on its way.
+        free_.reserve(open_.capacity());
         free_.push_back(static_cast<std::uint32_t>(open_.size() - 1));
     }
     const std::uint32_t slot = free_.back();
@@ -323,10 +327,10 @@ EmbeddedRegistry::KnownSubkey& EmbeddedRegistry::knownSlot(KeyId parent, std::st
 
 void EmbeddedRegistry::remember(KeyId parent, std::string_view fold, KeyId id) {
     KnownSubkey& slot = knownSlot(parent, fold);
+    slot.fold = fold;  // first: it may throw
     slot.transaction = transaction_;
     slot.parent = parent;
     slot.id = id;
-    slot.fold = fold;
 }
 
 Status EmbeddedRegistry::child(KeyId parent, std::string_view fold, KeyId& id) {

@@ -6,8 +6,6 @@
 #include <array>
 #include <cerrno>
 #include <cstdlib>
-#include <filesystem>
-#include <vector>
 
 #include "install/platform/embedded/descriptor.h"
 
@@ -16,6 +14,7 @@ namespace {
 
 constexpr int kTries = 20;
 constexpr const char* kLogSuffix = "-wal";
+constexpr const char* kSuffixes[] = {"", kLogSuffix, "-shm", "-journal"};
 
 // Changes with every write to a file; all zero where there is none.
 std::array<std::int64_t, 4> stampOf(const std::string& path) {
@@ -49,10 +48,10 @@ int copyFile(const std::string& from, const std::string& to) {
 }  // namespace
 
 StoreCopy::~StoreCopy() {
-    std::error_code ignored;
-    if (!folder_.empty()) {
-        std::filesystem::remove_all(folder_, ignored);
+    for (const std::string& file : files_) {
+        unlink(file.c_str());
     }
+    rmdir(folder_.c_str());
 }
 
 int StoreCopy::make(const std::string& store) {
@@ -61,7 +60,10 @@ int StoreCopy::make(const std::string& store) {
     if (mkdtemp(folder.data()) == nullptr) {
         return errno;
     }
-    folder_ = folder;
+    folder_ = std::move(folder);
+    for (const char* suffix : kSuffixes) {
+        files_.push_back(path() + suffix);
+    }
     for (int tries = 0; tries < kTries; ++tries) {
         // A checkpoint moves pages from the log to the store: both copies must be of one moment.
         const std::array before = {stampOf(store), stampOf(store + kLogSuffix)};

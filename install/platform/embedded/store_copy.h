@@ -2,6 +2,7 @@
 #pragma once
 
 #include <string>
+#include <vector>
 
 namespace kz7 {
 
@@ -21,6 +22,8 @@ public:
 
 private:
     std::string folder_;
+    std::vector<std::string>
+        files_;  // that SQLite may have made too; known before, so that removing them needs no memory
 };
 
 }  // namespace kz7

@@ -1,6 +1,5 @@
 #include "install/platform/embedded/store_directory.h"
 
-#include <dirent.h>
 #include <fcntl.h>
 #include <poll.h>
 #include <sys/file.h>
@@ -10,8 +9,10 @@
 #include <array>
 #include <chrono>
 #include <cstdlib>
-#include <memory>
 #include <string_view>
+#include <vector>
+
+#include "install/platform/embedded/paths.h"
 
 namespace kz7 {
 namespace {
@@ -119,10 +120,11 @@ bool unfinishedStoreName(std::string& name) {
 }
 
 void removeUnfinishedStores(const std::string& path) {
-    const std::unique_ptr<DIR, int (*)(DIR*)> entries(opendir(path.c_str()), closedir);
-    while (const dirent* entry = entries == nullptr ? nullptr : readdir(entries.get())) {
-        if (isUnfinishedStore(entry->d_name)) {
-            unlinkat(dirfd(entries.get()), entry->d_name, 0);
+    std::vector<std::string> names;
+    namesIn(path, names);
+    for (const std::string& name : names) {
+        if (isUnfinishedStore(name)) {
+            unlink((path + '/' + name).c_str());
         }
     }
 }

@@ -14,9 +14,8 @@ constexpr std::size_t kMaxDepth = 1 << 16;  // levels below the first key; more 
 // now, through a link that another program puts into it. Iterative: the depth of a tree is input.
 class TreeDeletion {
 public:
-    TreeDeletion(IRegistryStore& registry, KeyHandle root, AccessMask view, std::string_view copyName,
-                 std::string_view spared)
-        : registry_(registry), root_(root), view_(view), copyName_(copyName), spared_(spared) {}
+    TreeDeletion(IRegistryStore& registry, KeyHandle root, AccessMask view, std::string_view spared)
+        : registry_(registry), root_(root), view_(view), spared_(spared) {}
 
     Status run(std::string_view path) {
         Status status = open(path);
@@ -45,7 +44,7 @@ private:
     KeyHandle parent() const { return levels_.empty() ? root_ : levels_.back().key.get(); }
 
     Status open(std::string_view path) {
-        Level level{OwnedKey(registry_), substituteCopyName(path, copyName_)};
+        Level level{OwnedKey(registry_), std::string(path)};
         Status status = levels_.size() > kMaxDepth ? kRegistryCorrupt : checkPathLength(level.path);
         if (succeeded(status)) {
             status = registry_.openKey(parent(), level.path, kKeyFull | kKeyOpenLink | view_, level.key.receive());
@@ -66,7 +65,6 @@ private:
     IRegistryStore& registry_;
     KeyHandle root_;
     AccessMask view_;
-    std::string_view copyName_;
     std::string_view spared_;
     std::vector<Level> levels_;
     TextBuffer<256> name_;
@@ -173,7 +171,8 @@ Status deleteTree(IRegistryStore& registry, KeyHandle root, std::string_view pat
     if (path.empty()) {
         return kBadKey;
     }
-    return TreeDeletion(registry, root, view, copyName, sparedSubkey).run(path);
+    // In the path alone: a subkey whose name holds a placeholder is deleted like any other.
+    return TreeDeletion(registry, root, view, sparedSubkey).run(substituteCopyName(path, copyName));
 }
 
 }  // namespace kz7
