@@ -4,6 +4,7 @@
 #include <sqlite3.h>
 #include <sys/mount.h>
 #include <sys/resource.h>
+#include <sys/stat.h>
 
 #include <filesystem>
 
@@ -37,7 +38,11 @@ TEST(StoreFaults, BadStoresEndWithTheirStatusAndOneLineThatNamesTheFile) {
         {"a folder in its place", [](const std::string& path) {
              std::filesystem::remove(path);
              std::filesystem::create_directory(path);
-         }, kCannotOpen, ""},
+         }, kCannotOpen, "is not a regular file"},
+        {"a pipe in its place", [](const std::string& path) {
+             std::filesystem::remove(path);
+             mkfifo(path.c_str(), 0600);
+         }, kCannotOpen, "is not a regular file"},
     };
     // clang-format on
     const Arguments commands[] = {
@@ -60,6 +65,7 @@ TEST(StoreFaults, BadStoresEndWithTheirStatusAndOneLineThatNamesTheFile) {
             ":941: Unable to add a new copy of KZ7 to this machine : rc = " + std::to_string(row.status) + "\n"))
             << result.error;
         EXPECT_EQ(result.output.find("added successfully"), std::string::npos) << row.why;
+        EXPECT_EQ(state.run("kz7admin", {"copies"}).error, "kz7admin: " + path + ": " + row.said + "\n") << row.why;
     }
 }
 
@@ -107,6 +113,21 @@ TEST(DeepStores, AServiceWithADeepTreeOrACycleBelowIt) {
     const ProgramResult result = cyclic.tool({"-removeKZ7Copy", "FIRST"});
     EXPECT_EQ(result.exitCode, hostExitCode(kRegistryCorrupt));
     EXPECT_NE(result.error.find("registry.db: the keys form a cycle\n"), std::string::npos) << result.error;
+}
+
+// The log is written back only while no other program reads. The reader of the pipe adds copies after its first byte.
+TEST(SlowReaders, HoldNoTransaction) {
+    const std::string adds = " | (head -c 1; for i in $(seq 40); do " + programPath("kz7InstallReg") +
+                             " -addKZ7Copy C$i /x; done; cat) >/dev/null";
+    for (const std::string command : {" tree", " export"}) {
+        const StateDirectory state;
+        overwrite(state.file("large.reg"),
+                  "REGEDIT4\n\n[HKEY_USERS\\L]\n\"v\"=\"" + std::string(1 << 19, 'x') + "\"\n");
+        ASSERT_EQ(state.run("kz7admin", {"import", state.file("large.reg")}).exitCode, 0);
+        runProgram({"/bin/sh", "-c", programPath("kz7admin") + command + adds},
+                   {{"KZ7_STATE_DIR=" + state.path()}, {}});
+        EXPECT_LT(std::filesystem::file_size(state.file("registry.db-wal")), 1U << 19) << command;
+    }
 }
 
 TEST(StateDirectories, WorkAtAnyLengthAndFromAnyDirectory) {
@@ -183,6 +204,7 @@ TEST_F(ScarceResources, FullDisk) {
     const ProgramResult done = state.tool(kAddSecond);
     umount2(state.path().c_str(), MNT_DETACH);
     EXPECT_EQ(refused.exitCode, hostExitCode(kDiskFull)) << refused.error;
+    EXPECT_EQ(refused.error.find("appear later"), std::string::npos) << refused.error;
     EXPECT_EQ(found, before_);
     EXPECT_EQ(done.exitCode, 0) << done.error;
 }

@@ -165,7 +165,8 @@ Status EmbeddedRegistry::commit() {
             fault_ = kRegistryIoFailed;  // should there be no memory to explain it
             StoreFault fault = file_.explain(connection_.get(), result);
             endTransaction();
-            if (commitFailed_) {
+            // Without room, not even the mark of the commit was written.
+            if (commitFailed_ && (result & 0xFF) != SQLITE_FULL) {
                 fault.reason += "; the changes could not be taken back and may appear later";
             }
             fail(fault);

@@ -235,6 +235,11 @@ int StoreFile::connect(const std::string& name, int flags, Connection& connectio
 }
 
 StoreFault StoreFile::open(int flags, Connection& connection) {
+    // A pipe without a writer would be waited for.
+    struct stat found {};
+    if (stat(path_.c_str(), &found) == 0 && !S_ISREG(found.st_mode)) {
+        return {kCannotOpen, path_, "is not a regular file"};
+    }
     Connection owned;
     int result = connect(kStoreName, flags, owned);
     sqlite3* const opened = owned.get();
