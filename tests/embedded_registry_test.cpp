@@ -83,7 +83,7 @@ TEST_F(EmbeddedStore, AFaultIsToldOnceAndAnswersUntilTheMark) {
     std::filesystem::remove(path);
     EXPECT_EQ(setText(registry, "K", "v", "1"), status) << "half of a run must not become the whole of it";
     EXPECT_EQ(registry.commit(), status);
-    EXPECT_EQ(faults_, "Is a directory");
+    EXPECT_EQ(faults_, "is not a regular file");
     EXPECT_EQ(setText(registry, "K", "v", "1"), kSuccess) << "a new run starts over";
 }
 
