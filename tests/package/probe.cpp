@@ -1,12 +1,11 @@
-// The custom-action library of somebody else's package: it loads kz7actions64.dll from the path that it is told, calls
-// it by its C names and writes what it saw to the installer's log, in lines that begin with "probe".
+// The custom-action library of a foreign package. It loads kz7actions64.dll from the path in its data, calls it by its
+// C names and writes the results to the installer's log, in lines that begin with "probe".
 #include <windows.h>
-// The types above first.
+// Needs the types above.
 #include <msi.h>
 #include <msiquery.h>
 
-#include <cstdarg>
-#include <cstdio>
+#include <cstdint>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -15,118 +14,89 @@
 
 namespace {
 
-constexpr char kSavedProperties[] = "\\SOFTWARE\\NVQ\\KZ7\\TEMP\\PROPERTIES95";
-constexpr DWORD kRoom = 4096;  // for whatever the tests set
+constexpr DWORD kRoom = 4096;  // enough for every value of the test
 
-std::string ownProperty(MSIHANDLE installation, const char* name) {
+std::string sessionProperty(MSIHANDLE installation, const char* name) {
     std::string value(kRoom, '\0');
     DWORD size = kRoom;
     value.resize(MsiGetPropertyA(installation, name, value.data(), &size) == ERROR_SUCCESS ? size : 0);
     return value;
 }
 
-template <typename Function>
-void resolve(HMODULE library, const char* name, Function& function) {
-    // By way of a function without arguments: an address has no type of its own.
-    function = reinterpret_cast<Function>(reinterpret_cast<void (*)()>(GetProcAddress(library, name)));
+void log(MSIHANDLE installation, const std::string& text) {
+    const char* mode = MsiGetMode(installation, MSIRUNMODE_ROLLBACK)    ? "rollback"
+                       : MsiGetMode(installation, MSIRUNMODE_COMMIT)    ? "commit"
+                       : MsiGetMode(installation, MSIRUNMODE_SCHEDULED) ? "deferred"
+                                                                        : "immediate";
+    const MSIHANDLE record = MsiCreateRecord(1);
+    MsiRecordSetStringA(record, 1, (std::string("probe ") + mode + ": " + text).c_str());
+    MsiProcessMessage(installation, INSTALLMESSAGE_INFO, record);
+    MsiCloseHandle(record);
 }
 
-class Probe {
-public:
-    // The action is told the path of the library and names of properties, between semicolons. One that is run at once
-    // has no data of its own.
-    explicit Probe(MSIHANDLE installation) : installation_(installation) {
-        const std::string given = ownProperty(installation, "CustomActionData");
-        std::istringstream told(given.empty() ? ownProperty(installation, "PROBE_DATA") : given);
-        std::string path;
-        std::getline(told, path, ';');
-        for (std::string name; std::getline(told, name, ';');) {
-            names_.push_back(name);
-        }
-        const HMODULE library = LoadLibraryA(path.c_str());
-        resolve(library, "iMsiGetProperty", getProperty_);
-        resolve(library, "iMsiSetProperty", setProperty_);
-        resolve(library, "iSubstituteCopyName", substitute_);
+// The data of an action: the path of the library, then names of properties, separated by semicolons. An immediate
+// action has no data of its own.
+std::vector<std::string> actionData(MSIHANDLE installation) {
+    const std::string own = sessionProperty(installation, "CustomActionData");
+    std::istringstream data(own.empty() ? sessionProperty(installation, "PROBE_DATA") : own);
+    std::vector<std::string> fields;
+    for (std::string field; std::getline(data, field, ';');) {
+        fields.push_back(field);
     }
+    return fields;
+}
 
-    void tellKey() const {
-        const std::string path = ownProperty(installation_, "UserSID") + kSavedProperties;
-        HKEY key = nullptr;
-        const LSTATUS status = RegOpenKeyExA(HKEY_USERS, path.c_str(), 0, KEY_READ, &key);
-        RegCloseKey(key);
-        tell("opening the key: status %ld", status);
+template <typename Function>
+Function entryPoint(MSIHANDLE installation, const char* name) {
+    // Cast by way of a function type: FARPROC converts to no other one without a warning.
+    const HMODULE library = LoadLibraryA(actionData(installation).front().c_str());
+    return reinterpret_cast<Function>(reinterpret_cast<void (*)()>(GetProcAddress(library, name)));
+}
+
+// One line: "NAME 3 'abc', ...", the size as the call returns it; a call that fails shows its status.
+void readProperties(MSIHANDLE installation) {
+    const auto read = entryPoint<decltype(&iMsiGetProperty)>(installation, "iMsiGetProperty");
+    const std::vector<std::string> data = actionData(installation);
+    std::string line;
+    for (auto name = data.begin() + 1; name != data.end(); ++name) {
+        std::string value(kRoom, '#');
+        std::uint32_t size = kRoom;
+        const std::uint32_t status = read(installation, name->c_str(), value.data(), &size);
+        line += (line.empty() ? "" : ", ") + *name + " " + std::to_string(size) + " '" + value.c_str() + "'";
+        line += status == 0 ? "" : " status " + std::to_string(status);
     }
-
-    void tellProperties() const {
-        for (const std::string& name : names_) {
-            std::string value(kRoom, '#');
-            std::uint32_t size = kRoom;
-            const std::uint32_t status = getProperty_(installation_, name.c_str(), value.data(), &size);
-            tell("%s: status %u, size %u, '%s'", name.c_str(), status, size, value.c_str());
-        }
-    }
-
-    // Whoever reads the old values later has them from where they were saved.
-    void changeProperties() const {
-        for (const std::string& name : names_) {
-            tell("setting %s: status %u", name.c_str(), setProperty_(installation_, name.c_str(), "new"));
-        }
-    }
-
-    void tellSubstitution() const {
-        const char path[] = "InstalledCopies\\$CurrentInstallationName$";
-        char output[sizeof path];
-        tell("substituted: %s", substitute_(path, "COPY1", sizeof output, output));
-        tell("substituted without a buffer: %s", substitute_(path, "COPY2", 0, nullptr));
-    }
-
-private:
-    const char* mode() const {
-        if (MsiGetMode(installation_, MSIRUNMODE_ROLLBACK)) {
-            return "rollback";
-        }
-        if (MsiGetMode(installation_, MSIRUNMODE_COMMIT)) {
-            return "commit";
-        }
-        return MsiGetMode(installation_, MSIRUNMODE_SCHEDULED) ? "deferred" : "immediate";
-    }
-
-    __attribute__((format(gnu_printf, 2, 3))) void tell(const char* pattern, ...) const {
-        std::string text(kRoom, '\0');
-        std::va_list inserts;
-        va_start(inserts, pattern);
-        std::vsnprintf(text.data(), text.size(), pattern, inserts);
-        va_end(inserts);
-        const MSIHANDLE record = MsiCreateRecord(1);
-        MsiRecordSetStringA(record, 1, (std::string("probe ") + mode() + ": " + text.c_str()).c_str());
-        MsiProcessMessage(installation_, INSTALLMESSAGE_INFO, record);
-        MsiCloseHandle(record);
-    }
-
-    MSIHANDLE installation_;
-    std::vector<std::string> names_;
-    decltype(&iMsiGetProperty) getProperty_ = nullptr;
-    decltype(&iMsiSetProperty) setProperty_ = nullptr;
-    decltype(&iSubstituteCopyName) substitute_ = nullptr;
-};
+    log(installation, line);
+}
 
 }  // namespace
 
 extern "C" {
 
 __declspec(dllexport) UINT probeRead(MSIHANDLE installation) {
-    const Probe probe(installation);
-    probe.tellKey();
-    probe.tellProperties();
+    const std::string path = sessionProperty(installation, "UserSID") + "\\SOFTWARE\\NVQ\\KZ7\\TEMP\\PROPERTIES95";
+    HKEY key = nullptr;
+    const LSTATUS status = RegOpenKeyExA(HKEY_USERS, path.c_str(), 0, KEY_READ, &key);
+    RegCloseKey(key);
+    log(installation, "opening the key: status " + std::to_string(status));
+    readProperties(installation);
     return ERROR_SUCCESS;
 }
 
 __declspec(dllexport) UINT probeChange(MSIHANDLE installation) {
-    const Probe probe(installation);
-    probe.tellSubstitution();
-    probe.tellProperties();
-    probe.changeProperties();
-    probe.tellProperties();
+    const auto substitute = entryPoint<decltype(&iSubstituteCopyName)>(installation, "iSubstituteCopyName");
+    const auto set = entryPoint<decltype(&iMsiSetProperty)>(installation, "iMsiSetProperty");
+    const char path[] = "InstalledCopies\\$CurrentInstallationName$";
+    char output[sizeof path];
+    log(installation, std::string("substituted: ") + substitute(path, "COPY1", sizeof output, output));
+    log(installation, std::string("substituted without a buffer: ") + substitute(path, "COPY2", 0, nullptr));
+    readProperties(installation);
+    const std::vector<std::string> data = actionData(installation);
+    std::string line = "setting:";
+    for (auto name = data.begin() + 1; name != data.end(); ++name) {
+        line += " " + std::to_string(set(installation, name->c_str(), "new"));
+    }
+    log(installation, line);
+    readProperties(installation);
     return ERROR_SUCCESS;
 }
 
