@@ -1,7 +1,8 @@
-// What every registry must do alike: the one in memory and this machine's.
+// The contract of the registry port, for the registry in memory and this machine's.
 #include <gtest/gtest.h>
 
 #include <functional>
+#include <map>
 #include <numeric>
 #include <sstream>
 
@@ -21,10 +22,15 @@ protected:
         }
     }
 
-    // Makes a key of the machine the one that the helpers below work in.
+    // Creates a key and makes it the one that the helpers below work in.
     void enter(const std::string& path) {
         EXPECT_EQ(registry_.createKey(KeyHandle::localMachine, path, {}, kKeyFull, key_.receive()), kSuccess);
         at_ = key_.get();
+    }
+    OwnedKey opened(const std::string& path, AccessMask access) {
+        OwnedKey key(registry_);
+        EXPECT_EQ(registry_.openKey(at_, path, access, key.receive()), kSuccess) << path;
+        return key;
     }
     Status make(const std::string& path, const std::string& keyClass = {}) {
         OwnedKey key(registry_);
@@ -40,8 +46,8 @@ protected:
     }
     Status unset(const std::string& name) { return registry_.deleteValue(at_, name); }
 
-    // What was asked for, or the status in brackets: a value's bytes, the index-th name of a key, with its class, or of
-    // a value; or all of them.
+    // The bytes of a value; the name of a key (with its class) or of a value at an index; all names. Or the status in
+    // angle brackets.
     std::string get(const std::string& name) {
         const Status status = registry_.queryValue(at_, name, nullptr, room_);
         return status == kSuccess ? std::string(room_.view()) : "<" + std::to_string(status) + ">";
@@ -52,7 +58,7 @@ protected:
         const Status status = ofKeys ? registry_.enumerateKey(at_, index, name_, &keyClass)
                                      : registry_.enumerateValue(at_, index, name_, nullptr, nullptr);
         return status != kSuccess   ? "<" + std::to_string(status) + ">"
-               : keyClass.size != 0 ? std::string(name_.view()) + "=" + keyClass.data
+               : keyClass.size != 0 ? std::string(name_.view()) + ":" + keyClass.data
                                     : std::string(name_.view());
     }
     std::string names(bool ofKeys) {
@@ -64,31 +70,31 @@ protected:
         return all;
     }
 
-    // What the steps of a script answer, with blanks between them; "@" is the empty name.
-    std::string answers(const std::string& script) {
-        std::istringstream steps(script);
-        std::string told;
-        for (std::string step; std::getline(steps, step, ';');) {
-            std::string words[3];
-            std::istringstream(step) >> words[0] >> words[1] >> words[2];
-            told += (told.empty() ? "" : " ") + answer(words[0], words[1] == "@" ? "" : words[1], words[2]);
+    // Takes steps as "verb name data = result; ..." and expects each result; "@" is the empty name.
+    void expectSteps(const std::string& steps, const char* why) {
+        std::istringstream all(steps);
+        for (std::string step; std::getline(all >> std::ws, step, ';');) {
+            const std::size_t sign = step.find(" = ");
+            std::string verb, name, data;
+            std::istringstream(step.substr(0, sign)) >> verb >> name >> data;
+            EXPECT_EQ(step.substr(0, sign) + " = " + result(verb, name == "@" ? "" : name, data), step) << why;
         }
-        return told;
     }
-    std::string answer(const std::string& verb, const std::string& name, const std::string& more) {
+    std::string result(const std::string& verb, const std::string& name, const std::string& data) {
+        if (verb == "get") {
+            return get(name);
+        }
         if (verb == "keys" || verb == "values") {
             return names(verb == "keys");
         }
         if (verb == "key" || verb == "value") {
             return nameAt(verb == "key", std::stoul(name));
         }
-        return verb == "get" ? get(name)
-                             : std::to_string(verb == "make"     ? make(name, more)
-                                              : verb == "open"   ? open(name)
-                                              : verb == "remove" ? remove(name)
-                                              : verb == "set"    ? set(name, more)
-                                              : verb == "unset"  ? unset(name)
-                                                                 : registry_.commit());
+        const std::map<std::string, std::function<Status()>> verbs = {
+            {"make", [&] { return make(name, data); }}, {"open", [&] { return open(name); }},
+            {"remove", [&] { return remove(name); }},   {"set", [&] { return set(name, data); }},
+            {"unset", [&] { return unset(name); }},     {"commit", [&] { return registry_.commit(); }}};
+        return std::to_string(verbs.at(verb)());
     }
 
     static constexpr auto kScratch = "SOFTWARE\\KZ7ContractTest";
@@ -96,92 +102,87 @@ protected:
     IRegistryStore& registry_ = platform_.registry();
     Differences differences_ = backend_->differences();
     OwnedKey key_{registry_};
-    KeyHandle at_ = KeyHandle::none;  // what the helpers work in: that key, unless a test says otherwise
+    KeyHandle at_ = KeyHandle::none;  // the key that the helpers work in
     FixedBuffer<kMaxValueName + 1> name_;
     FixedBuffer<200'000> room_;
 };
 
 INSTANTIATE_TEST_SUITE_P(Stores, RegistryContract, testing::ValuesIn(kBackends));
 
-TEST_P(RegistryContract, StepsAnswerAlike) {
+TEST_P(RegistryContract, NamesOrderAndEnumerationFollowTheContract) {
+    const std::string folded = differences_.foldsBeyondAscii ? "0" : "2";
+    const std::string keyClass = differences_.passesClassesOn ? "late" : "its";
+    const std::string parentClass = differences_.passesClassesOn ? ":its" : "";
+    const std::string keyOrder = differences_.ordersKeysByLowerCase ? "1,_x,A,aa,b,Z1" : "1,A,aa,b,Z1,_x";
+    const std::string valueOrder = differences_.ordersValuesByName ? "_x,A,b,Z0" : "b,_x,A,Z0";
     // clang-format off
-    const struct { const char* why; const char* script; const char* answers; } rows[] = {
+    const struct { const char* why; std::string steps; } rows[] = {
         {"names of keys compare without case, the first spelling stays",
-         "make Alpha\\Beta; make aLPHA; open ALPHA\\bETA; keys; remove ALPHA\\BETA; open Alpha\\Beta", "0 0 0 Alpha 0 2"},
-        {"and so do those of values",
-         "set Name 1; set NAME 2; get nAme; values; set @ 3; get @; unset name; values; get Name", "0 0 2 Name 0 3 0  <2>"},
-        {"other letters", "make \xC3\x84; open \xC3\xA4; remove \xC3\x84", differences_.foldsBeyondAscii ? "0 0 0" : "0 2 0"},
-        {"an enumeration of keys sees what is done before, at and behind its place, and a mark loses none",
-         "make b; make c; make d; key 0; remove b; key 0; key 1; make e; key 2; make f; key 3; key 4; key 1; remove c; key 1;"
-         "key 2; key 0; remove f; key 2; key 1; make a; key 1; key 2; commit; key 2; key 3",
-         "0 0 0 b 0 c d 0 e 0 f <259> d 0 e f d 0 <259> e 0 d e 0 e <259>"},
-        {"and so does one of values",
-         "set b; set c; set d; value 0; unset b; value 0; value 1; set e; value 2; set f; value 3; value 4; value 1; unset c;"
-         "value 1; value 2; value 0; unset f; value 2; value 1; commit; value 1",
-         "0 0 0 b 0 c d 0 e 0 f <259> d 0 e f d 0 <259> e 0 e"},
+         "make Alpha\\Beta = 0; make aLPHA = 0; open ALPHA\\bETA = 0; keys = Alpha; remove ALPHA\\BETA = 0; open Alpha\\Beta = 2"},
+        {"names of values compare without case",
+         "set Name 1 = 0; set NAME 2 = 0; get nAme = 2; values = Name; set @ 3 = 0; get @ = 3; unset name = 0; values = ; get Name = <2>"},
+        {"letters beyond ASCII", "make \xC3\x84 = 0; open \xC3\xA4 = " + folded + "; remove \xC3\x84 = 0"},
+        {"an enumeration of keys sees changes before, at and after its index, and a commit loses none",
+         "make b = 0; make c = 0; make d = 0; key 0 = b; remove b = 0; key 0 = c; key 1 = d; make e = 0; key 2 = e; "
+         "make f = 0; key 3 = f; key 4 = <259>; key 1 = d; remove c = 0; key 1 = e; key 2 = f; key 0 = d; remove f = 0; "
+         "key 2 = <259>; key 1 = e; make a = 0; key 1 = d; key 2 = e; commit = 0; key 2 = e; key 3 = <259>"},
+        {"an enumeration of values does the same",
+         "set b = 0; set c = 0; set d = 0; value 0 = b; unset b = 0; value 0 = c; value 1 = d; set e = 0; value 2 = e; "
+         "set f = 0; value 3 = f; value 4 = <259>; value 1 = d; unset c = 0; value 1 = e; value 2 = f; value 0 = d; "
+         "unset f = 0; value 2 = <259>; value 1 = e; commit = 0; value 1 = e"},
         {"subkeys enumerate by name",
-         "make b; make _x; make A; make z0; make Z1; make aa; make 1; make ~; keys",
-         differences_.ordersKeysByLowerCase ? "0 0 0 0 0 0 0 0 1,_x,A,aa,b,z0,Z1,~" : "0 0 0 0 0 0 0 0 1,A,aa,b,z0,Z1,_x,~"},
-        {"values by age", "set b; set _x; set A; set z0; set a again; unset Z0; set Z0; values",
-         differences_.ordersValuesByName ? "0 0 0 0 0 0 0 _x,A,b,Z0" : "0 0 0 0 0 0 0 b,_x,A,Z0"},
-        {"a class stays with its key", "make One its; make One late; keys",
-         differences_.passesClassesOn ? "0 0 One=late" : "0 0 One=its"},
-        {"parents that are made have none", "make Two\\Three its; keys",
-         differences_.passesClassesOn ? "0 Two=its" : "0 Two"},
-        {"keys with subkeys stay, the empty path is the key itself",
-         "make One\\Two; remove One; open One\\Two; remove One\\Absent; remove One\\Two; remove One\\Two; remove One;"
-         "open One; remove @; key 0", "0 5 0 2 0 2 0 2 0 <1018>"},
+         "make b = 0; make _x = 0; make A = 0; make Z1 = 0; make aa = 0; make 1 = 0; keys = " + keyOrder},
+        {"values enumerate in insertion order",
+         "set b = 0; set _x = 0; set A = 0; set z0 = 0; set a again = 0; unset Z0 = 0; set Z0 = 0; values = " + valueOrder},
+        {"an existing key keeps its class", "make One its = 0; make One late = 0; keys = One:" + keyClass},
+        {"parents that are created have no class", "make Two\\Three its = 0; keys = Two" + parentClass},
+        {"a key with subkeys is not deleted; the empty path is the key itself",
+         "make One\\Two = 0; remove One = 5; open One\\Two = 0; remove One\\Absent = 2; remove One\\Two = 0; "
+         "remove One\\Two = 2; remove One = 0; open One = 2; remove @ = 0; key 0 = <1018>"},
     };
     // clang-format on
     for (const auto& row : rows) {
         enter(std::string(kScratch) + "\\" + std::to_string(&row - rows));
-        EXPECT_EQ(answers(row.script), row.answers) << row.why;
+        expectSteps(row.steps, row.why);
     }
 }
 
-TEST_P(RegistryContract, OperationsAnswerByTheStateOfTheirHandle) {
-    ASSERT_EQ(answers("make Gone; make There\\Below; set v x"), "0 0 0");
-    const auto opened = [&](const char* path, AccessMask access) {
-        OwnedKey key(registry_);
-        EXPECT_EQ(registry_.openKey(at_, path, access, key.receive()), kSuccess) << path;
-        return key;
-    };
+TEST_P(RegistryContract, AHandleAllowsWhatItsRightsAndItsKeyAllow) {
+    expectSteps("make Gone = 0; make There\\Below = 0; set v x = 0", "set-up");
     OwnedKey gone = opened("Gone", kKeyFull);
     const OwnedKey query = opened("", kKeyQueryValue);
     const OwnedKey setting = opened("", kKeySetValue);
     const OwnedKey listing = opened("", kKeyEnumerateSubkeys);
-    ASSERT_EQ(answers("remove Gone; make Gone"), "0 0") << "another key of that name";
+    expectSteps("remove Gone = 0; make Gone = 0", "another key with that name");
     const KeyHandle shut = opened("", kKeyFull).get();
     // clang-format off
-    const struct { const char* why; KeyHandle key; const char* answers; } rows[] = {
-        {"one that was closed",  shut,             "6 6 <6> 6 6 <6> <6> 6"},
-        {"none",                 KeyHandle::none,  "6 6 <6> 6 6 <6> <6> 6"},
-        {"of a deleted key",     gone.get(),       "1018 1018 <1018> 1018 1018 <1018> <1018> 1018"},
-        {"with every right",     at_,              "0 0 x 0 2 Gone v 2"},
-        {"to query values only", query.get(),      "0 0 y 5 5 <5> v 2"},
-        {"to set values only",   setting.get(),    "0 0 <5> 0 2 <5> <5> 2"},
-        {"to list keys only",    listing.get(),    "0 0 <5> 5 5 Gone <5> 2"},
+    const struct { const char* why; KeyHandle key; const char* steps; } rows[] = {
+        {"a closed handle",      shut,            "open There = 6; make There = 6; get v = <6>; set v y = 6; unset absent = 6; key 0 = <6>; value 0 = <6>; remove Absent = 6"},
+        {"the null handle",      KeyHandle::none, "open There = 6; make There = 6; get v = <6>; set v y = 6; unset absent = 6; key 0 = <6>; value 0 = <6>; remove Absent = 6"},
+        {"of a deleted key",     gone.get(),      "open x = 1018; make x = 1018; get v = <1018>; set v y = 1018; unset v = 1018; key 0 = <1018>; value 0 = <1018>; remove x = 1018"},
+        {"with every right",     at_,             "open There = 0; make There = 0; get v = x; set v y = 0; unset absent = 2; key 0 = Gone; value 0 = v; remove Absent = 2"},
+        {"to query values only", query.get(),     "open There = 0; make There = 0; get v = y; set v y = 5; unset absent = 5; key 0 = <5>; value 0 = v; remove Absent = 2"},
+        {"to set values only",   setting.get(),   "open There = 0; make There = 0; get v = <5>; set v y = 0; unset absent = 2; key 0 = <5>; value 0 = <5>; remove Absent = 2"},
+        {"to list keys only",    listing.get(),   "open There = 0; make There = 0; get v = <5>; set v y = 5; unset absent = 5; key 0 = Gone; value 0 = <5>; remove Absent = 2"},
     };
     // clang-format on
     for (const auto& row : rows) {
         at_ = row.key;
-        EXPECT_EQ(answers("open There; make There; get v; set v y; unset absent; key 0; value 0; remove Absent"),
-                  row.answers)
-            << row.why;
+        expectSteps(row.steps, row.why);
     }
     EXPECT_EQ(registry_.closeKey(shut), kInvalidHandle);
     EXPECT_EQ(registry_.closeKey(KeyHandle::none), kInvalidHandle);
     const KeyHandle deleted = gone.get();
     gone.leaveOpen();
-    EXPECT_EQ(registry_.closeKey(deleted), kSuccess) << "a handle of a deleted key is still one to close";
+    EXPECT_EQ(registry_.closeKey(deleted), kSuccess) << "a handle of a deleted key can still be closed";
     for (const KeyHandle root : {KeyHandle::localMachine, KeyHandle::currentUser, KeyHandle::users}) {
         EXPECT_EQ(registry_.closeKey(root), kSuccess);
         at_ = root;
-        EXPECT_NE(answers("key 0"), "<6>") << "a root stays open";
+        EXPECT_NE(nameAt(true, 0), "<6>") << "a root stays open";
     }
 }
 
-// A character of three bytes in UTF-8, one unit in UTF-16, so many times.
+// A character that has three bytes in UTF-8 and one unit in UTF-16, so many times.
 std::string repeated(std::size_t times) {
     std::string text;
     while (times-- > 0) {
@@ -190,21 +191,21 @@ std::string repeated(std::size_t times) {
     return text;
 }
 
-TEST_P(RegistryContract, PathsAreReadAlike) {
+TEST_P(RegistryContract, PathsAreCheckedBeforeTheyAreUsed) {
     ASSERT_EQ(make("A\\B\\C"), kSuccess);
     const std::string longest(kMaxKeyName, 'k');
     // clang-format off
     const struct { const char* why; std::string path; Status status; } rows[] = {
-        {"doubled separators",        "A\\\\b\\\\\\C",              kSuccess},
-        {"a separator at the end",    "A\\B\\",                     kSuccess},
-        {"a separator at the begin",  "\\A\\B",                     kBadPathname},
-        {"nothing but a separator",   "\\",                         kBadPathname},
-        {"the longest name, missing", longest,                      kFileNotFound},
-        {"a name too long",           longest + "k",                kInvalidParameter},
-        {"deep down, too long",       "A\\" + longest + "k" + "\\C", kInvalidParameter},
-        {"255 of three bytes",        repeated(255),              kFileNotFound},
-        {"256 of three bytes",        repeated(256),              kInvalidParameter},
-        {"a NUL",                     std::string("A\0B", 3),       kInvalidParameter},
+        {"doubled separators",          "A\\\\b\\\\\\C",               kSuccess},
+        {"a trailing separator",        "A\\B\\",                      kSuccess},
+        {"a leading separator",         "\\A\\B",                      kBadPathname},
+        {"nothing but a separator",     "\\",                          kBadPathname},
+        {"the longest name, missing",   longest,                       kFileNotFound},
+        {"a name too long",             longest + "k",                 kInvalidParameter},
+        {"a long name below a key",     "A\\" + longest + "k" + "\\C", kInvalidParameter},
+        {"255 characters, three bytes", repeated(255),                 kFileNotFound},
+        {"256 characters, three bytes", repeated(256),                 kInvalidParameter},
+        {"a NUL",                       std::string("A\0B", 3),        kInvalidParameter},
     };
     // clang-format on
     for (const auto& row : rows) {
@@ -218,10 +219,10 @@ TEST_P(RegistryContract, PathsAreReadAlike) {
     }
     EXPECT_EQ(make(longest + "\\" + longest + "\\" + longest), kSuccess);
     EXPECT_EQ(open(longest + "\\" + longest + "\\" + longest), kSuccess);
-    EXPECT_EQ(names(true), "A," + longest) << "a refused path leaves nothing of itself";
+    EXPECT_EQ(names(true), "A," + longest) << "a refused path creates nothing";
 }
 
-TEST_P(RegistryContract, ValuesKeepEveryByte) {
+TEST_P(RegistryContract, ValuesPreserveEveryByte) {
     std::string allBytes(256, '\0');
     std::iota(allBytes.begin(), allBytes.end(), '\0');
     // clang-format off
@@ -230,7 +231,7 @@ TEST_P(RegistryContract, ValuesKeepEveryByte) {
         {"nothing",                ValueType::binary,          ""},
         {"100,000 bytes",          ValueType::binary,          std::string(100'000, '\xFF')},
         {"a text of a path",       ValueType::expandSz,        std::string("%PATH%\\\xC3\xA9\0", 10)},
-        {"a text without its end", ValueType::sz,              "text"},
+        {"no NUL terminator", ValueType::sz,              "text"},
         {"other scripts, two units, unpaired surrogates", ValueType::multiSz, repeated(250) + "\xF0\x9F\x98\x80\xED\xA0\x80x\xED\xB0\x80"},
         {"texts",                  ValueType::multiSz,         std::string("one\0two\0\0", 9)},
         {"an unknown type",        static_cast<ValueType>(77), "bytes"},
@@ -254,8 +255,8 @@ TEST_P(RegistryContract, ValuesKeepEveryByte) {
     }
 }
 
-TEST_P(RegistryContract, WhatDoesNotFitIsToldWithItsSize) {
-    ASSERT_EQ(answers("set value 12345; make subkey class"), "0 0");
+TEST_P(RegistryContract, AShortBufferReportsTheSizeAndStaysEmpty) {
+    expectSteps("set value 12345 = 0; make subkey class = 0", "set-up");
     ValueType type{};
     // clang-format off
     const struct { const char* why; std::string_view whole; bool terminated; std::function<Status(Buffer&)> read; } rows[] = {
@@ -280,7 +281,7 @@ TEST_P(RegistryContract, WhatDoesNotFitIsToldWithItsSize) {
     }
 }
 
-TEST_P(RegistryContract, NamesHoldAnythingButASeparatorAndANul) {
+TEST_P(RegistryContract, NamesHoldAnyCharacterButSeparatorAndNul) {
     const std::string longest(kMaxValueName, 'v');
     const std::string wide = repeated(250);
     for (const std::string name : {"with blanks", " leading", "trailing ", "..", "100%d%s%%", "quote\"s'",
@@ -304,23 +305,23 @@ TEST_P(RegistryContract, NamesHoldAnythingButASeparatorAndANul) {
     EXPECT_EQ(names(false), "");
 }
 
-TEST_P(RegistryContract, TheViewBitLeadsToTheOtherTree) {
-    // Through the path and the one of the other tree, each without a view, in the wide and in the narrow one.
+TEST_P(RegistryContract, TheViewBitSelectsTheOtherTree) {
+    // Opens the path and that of the 32-bit tree; each with no view, the 64-bit view and the 32-bit view.
     const auto opened = [&] {
-        std::string told;
+        std::string statuses;
         for (const std::string path : {kScratch, kScratch32}) {
             for (const AccessMask view : {AccessMask{0}, kKeyView64, kKeyView32}) {
                 OwnedKey key(registry_);
-                told += std::to_string(
+                statuses += std::to_string(
                     registry_.openKey(KeyHandle::localMachine, path + "\\Only32", kKeyRead | view, key.receive()));
             }
         }
-        return told;
+        return statuses;
     };
     const std::string path = std::string(kScratch) + "\\Only32";
     OwnedKey key(registry_);
     ASSERT_EQ(registry_.createKey(KeyHandle::localMachine, path, {}, kKeyFull | kKeyView32, key.receive()), kSuccess);
-    EXPECT_EQ(opened(), "220000") << "a path that goes there already is left alone";
+    EXPECT_EQ(opened(), "220000") << "a path into the 32-bit tree is used as it is";
     EXPECT_EQ(registry_.deleteKey(KeyHandle::localMachine, path, 0), kFileNotFound);
     EXPECT_EQ(registry_.deleteKey(KeyHandle::localMachine, path, kKeyView32), kSuccess);
     EXPECT_EQ(opened(), "222222");
