@@ -25,6 +25,11 @@ bool fails(const char* kind, long notCounted) {
     return number == first || (lasting != nullptr && *lasting == '1' && number > first);
 }
 
+// The program may succeed all the same.
+void report() {
+    write(2, "a call fails\n", 13);
+}
+
 // One for each signature and name: it keeps the real function.
 template <typename Result, typename... Arguments>
 Result real(const char* name, Arguments... arguments) {
@@ -35,17 +40,17 @@ template <typename... Arguments>
 void* allocate(const char* name, Arguments... arguments) {
     static const auto allocation = reinterpret_cast<void* (*)(Arguments...)>(dlsym(RTLD_NEXT, name));
     if (fails("malloc", 2)) {
+        report();
         errno = ENOMEM;
         return nullptr;
     }
     return allocation(arguments...);
 }
 
-// Says so, since a program may do without what it asked for.
 template <typename Result, typename... Arguments>
 Result call(const char* kind, const char* name, Arguments... arguments) {
     if (fails(kind, 0)) {
-        write(2, "a call fails\n", 13);
+        report();
         errno = ENOSPC;
         return -1;
     }

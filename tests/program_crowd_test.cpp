@@ -1,4 +1,5 @@
-// Many runs at once, and runs that are killed: nothing is lost that was reported, nothing is ever half there.
+// Concurrent runs, and runs that are killed or whose system calls fail: what was reported is never lost, and a store
+// never holds half a run.
 #include <gtest/gtest.h>
 #include <signal.h>
 #include <sys/wait.h>
@@ -98,8 +99,6 @@ std::vector<Arguments> manyAdds() {
     return adds;
 }
 
-class Kills : public testing::TestWithParam<KilledFlow> {};
-
 const KilledFlow kFlows[] = {
     {"add", {kAddFirst}, kAddSecond},
     {"addToAnEmptyMachine", {}, kAddFirst},
@@ -132,33 +131,42 @@ std::set<std::string> statesOfChildren(const StateDirectory& start, const Argume
     return states;
 }
 
+class Kills : public testing::TestWithParam<KilledFlow> {
+protected:
+    void SetUp() override {
+        for (const auto& command : flow_.before) {
+            ASSERT_EQ(start_.tool(command).exitCode, 0);
+        }
+        done_.copyFrom(start_);
+        const auto begun = std::chrono::steady_clock::now();
+        ASSERT_EQ(done_.tool(flow_.command).exitCode, 0);
+        usual_ = std::chrono::steady_clock::now() - begun;
+        after_ = done_.dump();
+        ASSERT_NE(start_.dump(), after_);
+        unfinished_ = statesOfChildren(start_, flow_.command);
+        unfinished_.insert(start_.dump());
+        unfinished_.erase(after_);
+    }
+
+    const KilledFlow& flow_ = GetParam();
+    const StateDirectory start_;
+    const StateDirectory done_;
+    std::chrono::nanoseconds usual_{};  // the time of a whole run
+    std::string after_;
+    std::set<std::string> unfinished_;  // states that were committed before the last one
+};
+
 TEST_P(Kills, LeaveAStateThatWasCommitted) {
-    const KilledFlow& flow = GetParam();
     // More of them for a soak; else enough to meet every part of a run.
     const char* const asked = std::getenv("KZ7_KILLS");
     const int kills = asked == nullptr ? 100 : std::atoi(asked);
-    const StateDirectory start;
-    for (const auto& command : flow.before) {
-        ASSERT_EQ(start.tool(command).exitCode, 0);
-    }
-    const StateDirectory done;
-    done.copyFrom(start);
-    const auto begun = std::chrono::steady_clock::now();
-    ASSERT_EQ(done.tool(flow.command).exitCode, 0);
-    const std::chrono::nanoseconds usual = std::chrono::steady_clock::now() - begun;
-    const std::string after = done.dump();
-    const std::string before = start.dump();
-    ASSERT_NE(before, after);
-    std::set<std::string> allowed = statesOfChildren(start, flow.command);
-    allowed.insert({before, after});
-
     std::mt19937_64 random(20240607);
     int killed = 0;
     for (int round = 0; round < kills; ++round) {
         const StateDirectory state;
-        state.copyFrom(start);
-        const pid_t child = state.start(flow.command);
-        const std::chrono::nanoseconds moment(random() % static_cast<std::uint64_t>(usual.count()));
+        state.copyFrom(start_);
+        const pid_t child = state.start(flow_.command);
+        const std::chrono::nanoseconds moment(random() % static_cast<std::uint64_t>(usual_.count()));
         // A busy wait: the moments of interest are microseconds apart.
         for (const auto from = std::chrono::steady_clock::now(); std::chrono::steady_clock::now() - from < moment;) {
         }
@@ -167,9 +175,10 @@ TEST_P(Kills, LeaveAStateThatWasCommitted) {
         waitpid(child, &status, 0);
         const std::string found = state.dump();
         killed += WIFSIGNALED(status) ? 1 : 0;
-        EXPECT_TRUE(WIFSIGNALED(status) ? allowed.contains(found) : found == after) << "round " << round << found;
-        if (found != after) {
-            EXPECT_EQ(state.tool(flow.command).exitCode, 0) << "round " << round;
+        EXPECT_TRUE(found == after_ || (WIFSIGNALED(status) && unfinished_.contains(found)))
+            << "round " << round << found;
+        if (found != after_) {
+            EXPECT_EQ(state.tool(flow_.command).exitCode, 0) << "round " << round;
         }
         EXPECT_EQ(state.integrity(), "ok") << "round " << round;
         EXPECT_FALSE(hasUnfinishedStore(state)) << "round " << round;
@@ -177,39 +186,34 @@ TEST_P(Kills, LeaveAStateThatWasCommitted) {
     EXPECT_GT(killed, kills / 20);
 }
 
-// The same with each call of a kind that fails, for lack of room: the exit code says which state is left.
+// The same with each call of a kind that fails because the disk or the memory is full: the exit code tells which state
+// remains. Allocations fail in one flow only, because every run has hundreds of them; one that fails after the commit
+// fails the run.
 TEST_P(Kills, FailedCallsLeaveTheStateThatTheExitCodeTells) {
 #if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
-    GTEST_SKIP() << "a sanitizer's library lets no other be loaded before it";
+    GTEST_SKIP() << "a sanitizer's library must be the first one that is loaded";
 #endif
-    const KilledFlow& flow = GetParam();
-    const StateDirectory start;
-    for (const auto& command : flow.before) {
-        ASSERT_EQ(start.tool(command).exitCode, 0);
-    }
-    const StateDirectory done;
-    done.copyFrom(start);
-    ASSERT_EQ(done.tool(flow.command).exitCode, 0);
-    const std::string after = done.dump();
-    std::set<std::string> unfinished = statesOfChildren(start, flow.command);
-    unfinished.insert(start.dump());
-    unfinished.erase(after);
     const std::string preloaded = "LD_PRELOAD=" + std::string(KZ7_FAILING_CALLS);
-    for (const std::string kind : {"sync", "pwrite", "ftruncate", "rename", "open", "mkdir"}) {
+    for (const std::string kind : {"sync", "pwrite", "ftruncate", "rename", "open", "mkdir", "malloc"}) {
         for (const std::string forGood : {"0", "1"}) {
-            bool failed = true;
+            bool failed = kind != "malloc" || flow_.command == kAddSecond;
             for (int call = 1; failed && !HasFailure(); ++call) {
                 const std::string row = kind + " " + std::to_string(call) + (forGood == "1" ? " for good" : "");
                 const StateDirectory state;
-                state.copyFrom(start);
+                state.copyFrom(start_);
                 const ProgramResult result =
-                    state.tool(flow.command, {{preloaded, "KZ7_FAIL_CALL=" + kind,
-                                               "KZ7_FAIL_AT=" + std::to_string(call), "KZ7_FAIL_FOR_GOOD=" + forGood},
-                                              {}});
+                    state.tool(flow_.command, {{preloaded, "KZ7_FAIL_CALL=" + kind,
+                                                "KZ7_FAIL_AT=" + std::to_string(call), "KZ7_FAIL_FOR_GOOD=" + forGood},
+                                               {}});
                 failed = result.error.find("a call fails\n") != std::string::npos;
                 const std::string found = state.dump();
-                EXPECT_TRUE(result.exitCode == 0 ? found == after : failed && unfinished.contains(found))
+                const bool isLate = kind == "malloc" && found == after_;
+                EXPECT_TRUE(result.exitCode == 0 ? found == after_ : failed && (unfinished_.contains(found) || isLate))
                     << row << ": " << result.exitCode << found << result.error;
+                EXPECT_GE(result.exitCode, 0) << row;
+                EXPECT_TRUE(result.exitCode == 0 || flow_.command != kAddSecond ||
+                            result.output.find("added successfully") == std::string::npos)
+                    << row << result.output;
                 EXPECT_TRUE(result.exitCode == 0 || kind != "sync" || result.exitCode == hostExitCode(kDiskFull))
                     << row << ": " << result.exitCode << result.error;
                 EXPECT_TRUE(found.empty() || state.integrity() == "ok") << row;
@@ -221,37 +225,6 @@ TEST_P(Kills, FailedCallsLeaveTheStateThatTheExitCodeTells) {
 
 INSTANTIATE_TEST_SUITE_P(Flows, Kills, testing::ValuesIn(kFlows),
                          [](const testing::TestParamInfo<KilledFlow>& row) { return row.param.name; });
-
-// The log of a store that lost its end, as after a power cut on a disk that had not written it yet, or that has
-// noise there: what is left is the state after some whole run, and the next run works.
-TEST(LogFile, ACutOrNoisyEndLeavesWholeRuns) {
-    const StateDirectory start;
-    std::set<std::string> states;
-    std::string last;
-    for (int run = 0; run < 6; ++run) {
-        states.insert(last);
-        ASSERT_EQ(start.tool({"-addKZ7Copy", copyName(0, run), "C:\\KZ7"}).exitCode, 0);
-        last = start.dump();
-    }
-    const std::string log = contents(start.file("registry.db-wal"));
-    ASSERT_GT(log.size(), 10000U);
-    std::mt19937_64 random(7);
-    for (int round = 0; round < 60; ++round) {
-        const StateDirectory state;
-        state.copyFrom(start);
-        const std::size_t kept = random() % (log.size() + 1);
-        std::string spoiled = log.substr(0, kept);
-        std::generate_n(std::back_inserter(spoiled), round % 3 == 0 ? 0 : 5000,
-                        [&] { return static_cast<char>(random()); });
-        overwrite(state.file("registry.db-wal"), spoiled);
-        const std::string found = state.dump();
-        EXPECT_TRUE(found == last || states.contains(found)) << "kept " << kept << " bytes of the log\n" << found;
-        EXPECT_EQ(state.tool({"-addKZ7Copy", "NEXT", "C:\\KZ7"}).exitCode, 0);
-        EXPECT_EQ(state.integrity(), "ok");
-    }
-    overwrite(start.file("registry.db-wal"), log + std::string(5000, '\xA5'));
-    EXPECT_EQ(start.dump(), last) << "noise behind the log's end cost a run that was reported";
-}
 
 }  // namespace
 }  // namespace kz7::test
