@@ -6,7 +6,7 @@
 #include <vector>
 
 #include "install/runtime/config_handler.h"
-#include "tests/support/fault_sweep.h"
+#include "tests/support/registry_dump.h"
 #include "tests/support/runtime_machine.h"
 
 namespace kz7::test {
@@ -166,34 +166,6 @@ TEST_F(Configuration, OneParameterAtOnce) {
                   why + "Note: KZ7CfgHandler::set_dbm_parameter, step 10" + why);
     EXPECT_EQ(machine.processes_.started,
               std::vector<std::string>{"\"" + doubled + "\" /c kz7 update dbm config using DIAGLEVEL \"3\""});
-}
-
-// Every call fails once: what it hit is reported as not set, the others are set, nothing stays open.
-TEST_F(Configuration, NoFailureStopsTheOthers) {
-    const std::uint64_t calls = sweepFaults(
-        false,
-        [](FaultyMachine& host) {
-            host.files_.add("C:\\prof\\INST\\kz7systm");
-            host.processes_.addProgram(kProcessor, {});
-            addCopyKey(host.registry_);
-            ProfileRegistry(host.registry_, "COPY1").set("INST", "KZ7INSTPROF", "C:\\prof");
-        },
-        [](FaultyMachine& host) {
-            URE engine(portsOf(host));
-            engine.installationPath = "C:\\copy1";
-            ProfileRegistry faulty(host.registry(), "COPY1");
-            KZ7CfgHandler handler(engine, faulty, targetOf("INST"));
-            handler.recordVariable("KZ7ACCOUNT", "1");
-            handler.recordVariable("KZ7COMM", "1");
-            handler.recordParameter("DIAGLEVEL", "1");
-            handler.recordParameter("NUMDB", "1");
-            handler.commitProfileReg();
-            handler.commitDBMCfg("INST");
-            EXPECT_EQ(handler.successes() + handler.failures(), 4U);
-            return handler.failures();
-        },
-        [](FaultyMachine& host, Status failures) { EXPECT_LE(failures, host.faults_.failed().empty() ? 0U : 1U); });
-    EXPECT_GT(calls, 30U);
 }
 
 }  // namespace

@@ -2,12 +2,9 @@
 // leaves behind, on scripted programs and on real ones.
 #include <gtest/gtest.h>
 
-#include <set>
-
 #include "install/platform/memory/process_host.h"
 #include "install/platform/memory/threads.h"
 #include "tests/support/backends.h"
-#include "tests/support/fault_sweep.h"
 #include "tests/support/gate.h"
 #include "tests/support/told_run.h"
 
@@ -113,44 +110,6 @@ TEST_F(ScriptedProcess, TellsWhatWasNotExecutedWhatCouldNotBeAndWhatRunsOn) {
     EXPECT_EQ(ending(process, sink_), "0 4 ") << "it was not killed";
     process.execute(true, false);
     EXPECT_EQ(ending(process, sink_), "0 4 dropped") << "the timeout of the last wait stays: none";
-}
-
-// What comes of a run when one call of it fails once: the statuses of its execution and of the wait. A failed close
-// closes, and nothing that fails after the program's end changes how it ended.
-TEST_F(ScriptedProcess, AFailedCallOfARunGivesItsCodeAndLeavesNothingOpen) {
-    std::set<std::string> outcomes;
-    for (const bool forGood : {false, true}) {
-        std::string outcome;
-        std::uint32_t code = 0;
-        const auto prepare = [](FaultyMachine& machine) {
-            machine.processes_.addProgram("C:\\k\\t.cmd", {.output = "said", .error = "cried", .exitCode = 7});
-        };
-        const auto run = [&](FaultyMachine& machine) {
-            InstallProcess process(machine.processes(), machine.threads(), sink_, "C:\\k\\t.cmd x");
-            outcome = std::to_string(process.execute(true, false));
-            const Status waited = process.waitForCompletion(code, kInfiniteWait);
-            process.postOutput("swept", 0);
-            return waited;
-        };
-        sweepFaults(forGood, prepare, run, [&](FaultyMachine& machine, Status waited) {
-            EXPECT_EQ(code, waited == kSuccess ? 7U : waited);
-            if (!forGood) {
-                outcomes.insert(machine.faults_.failed() + ": " + outcome + " " + std::to_string(waited) +
-                                (machine.processes_.started.empty() ? ", not started" : ""));
-            }
-        });
-    }
-    const std::set<std::string> expected = {
-        ": 0 0", "closeProcess: 0 0", "closeStream: 0 0", "closeThread: 0 0", "getSlot: 0 0", "read: 0 0",
-        "shortPath: 0 0", "waitProcess: 0 0", "waitThread: 0 0",
-        // Not reported by the execution itself, which goes no further.
-        "createPipe: 0 5030, not started", "duplicate: 0 5030, not started", "setSlot: 0 5030, not started",
-        "setSlot: 0 0",  // after the program
-        "startThread: 5111 0",
-        "startThread: 0 0",  // that of the first reader is not told
-        "startProcess: 0 5082, not started", "exitCode: 0 5082"};
-    EXPECT_EQ(outcomes, expected);
-    EXPECT_NE(sink_.lines.find("trace 67108865 ureCreateThread 30 4321 \n"), std::string::npos);
     EXPECT_EQ(ureCreateThread(threads_, sink_, nullptr, nullptr, nullptr), kNullArgument);
 }
 

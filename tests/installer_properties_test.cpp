@@ -1,11 +1,10 @@
 // Installer properties in immediate and deferred custom actions, on a session that allows what the installer allows.
 #include <gtest/gtest.h>
 
-#include "install/platform/intercept/ports.h"
 #include "install/runtime/installer_properties.h"
 #include "install/runtime/saved_property_names.h"
 #include "install/src/registry/copy_name.h"
-#include "tests/support/fault_sweep.h"
+#include "tests/support/registry_dump.h"
 #include "tests/support/runtime_machine.h"
 
 namespace kz7::test {
@@ -149,38 +148,6 @@ TEST_F(InstallerProperties, EverythingThatDeferredActionsNeedIsSaved) {
     EXPECT_EQ(iDeleteSavedProperties(at), kSuccess);
     EXPECT_EQ(dumpRegistry(machine.registry_, KeyHandle::users, key), "[" + key + "] cannot be opened\n");
     EXPECT_EQ(iDeleteSavedProperties(at), kSuccess) << "nothing saved is a successful delete";
-}
-
-// Every call fails once, and once for good: saving ends with the failure of a step that gives the table and goes on
-// past any other, nothing stays open, and what could be saved is there.
-TEST(SavingProperties, AnyCallMayFail) {
-    for (const bool forGood : {false, true}) {
-        const std::uint64_t calls = sweepFaults(
-            forGood, [](FaultyMachine&) {},
-            [](FaultyMachine& machine) {
-                MemoryInstallerSession kept;
-                kept.properties = {{"A", "a"}, {"B", "b"}};
-                kept.tableRows = {"A", "B"};
-                kept.features = {{"LDAP.bin", {FeatureState::absent, FeatureState::local}}};
-                InterceptedSession session(kept, machine.faults_);
-                URE engine(portsOf(machine));
-                const Status status = iSavePropertiesForDeferred({session, machine.registry(), engine});
-                EXPECT_EQ(kept.openHandles(), 0U) << machine.faults_.failed();
-                return status;
-            },
-            [&](FaultyMachine& machine, Status status) {
-                const std::string& failed = machine.faults_.failed();
-                const bool stops = failed == "activeDatabase" || failed == "openView" || failed == "executeView";
-                const bool isSaved = dumpRegistry(machine.registry_, KeyHandle::currentUser) != "";
-                if (!forGood) {
-                    EXPECT_EQ(isSaved, !stops && failed != "createKey");
-                    EXPECT_EQ(status, failed == "activeDatabase"         ? kNoInstallationDatabase
-                                      : stops || failed == "fetchRecord" ? kFault
-                                                                         : kSuccess);
-                }
-            });
-        EXPECT_GT(calls, 400U);
-    }
 }
 
 }  // namespace

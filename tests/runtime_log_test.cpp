@@ -3,8 +3,6 @@
 
 #include <sstream>
 
-#include "install/platform/intercept/ports.h"
-#include "tests/support/fault_sweep.h"
 #include "tests/support/runtime_machine.h"
 
 namespace kz7::test {
@@ -139,49 +137,6 @@ TEST(LogFile, TellsShortWrites) {
         EXPECT_EQ(machine.log().writeHeader(true), row.header) << row.room;
         machine.files_.room = 1000;
         EXPECT_EQ(machine.log().writeLine("there is room again"), kSuccess);
-    }
-}
-
-// Every call of every port fails once, and once for good: the run goes on to its end, nothing stays open, the
-// front end is told everything, and the log ends with a whole line.
-TEST(LogFile, AnyCallMayFail) {
-    for (const bool forGood : {false, true}) {
-        const std::uint64_t calls = sweepFaults(
-            forGood,
-            [](FaultyMachine& machine) {
-                machine.processes_.addProgram(RuntimeMachine::kFolder, {});
-                machine.files_.add(std::string(RuntimeMachine::kFolder) + "readme");
-            },
-            [](FaultyMachine& machine) {
-                MemoryInstallerSession kept;
-                InterceptedSession session(kept, machine.faults_);
-                URE engine({machine.files(), machine.processes(), machine.threads(), machine.console_,
-                            machine.terminal_, machine.host(), &session});
-                const ObserversEnd end;
-                URELogObserver* log = URELogObserver::getInstance(engine);
-                log->setLogFile(RuntimeMachine::kLogFile);
-                engine.registerObserver(*log, Takes::everything);
-                engine.registerObserver(*UREExternalObserverMachineStream::getInstance(engine));
-                engine.startTask(1, 10, true, "Copying files");
-                log->writeFunction("in words");
-                engine.endTask(10, true, "Copying files");
-                log->writeHeader(true);
-                return kSuccess;
-            },
-            [](FaultyMachine& machine, Status) {
-                const std::string named = machine.faults_.failed() == "shortPath" ? "" : RuntimeMachine::kLogFile;
-                EXPECT_EQ(machine.console_.output,
-                          "MESSAGE INFO INSTALLSTART\n"
-                          "PROGRESS TASK START :: INSTALLATION :: 1 :: 10 :: Copying files\n"
-                          "MESSAGE ERROR GENERAL :: writeFunction, step 10: in words\n"
-                          "PROGRESS TASK END :: INSTALLATION :: 10 :: Copying files\n"
-                          "MESSAGE INFO INSTALLEND :: " +
-                              named + "\n");
-                const std::string log = machine.files_.content(RuntimeMachine::kLogFile);
-                EXPECT_TRUE(log.empty() || log.ends_with('\n')) << log;
-                EXPECT_EQ(machine.files_.openFiles(), 0U);
-            });
-        EXPECT_GT(calls, 15U) << "the sweep reaches every step";
     }
 }
 

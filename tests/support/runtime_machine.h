@@ -5,10 +5,12 @@
 
 #include <array>
 #include <ios>
+#include <memory>
 #include <sstream>
 #include <string>
 #include <utility>
 
+#include "install/platform/intercept/ports.h"
 #include "install/platform/memory/installer_session.h"
 #include "install/platform/memory/platform.h"
 #include "install/runtime/observers/observers_end.h"
@@ -20,7 +22,9 @@ namespace kz7::test {
 // Its end releases the process-wide observers; nothing may be open after that.
 class RuntimeMachine : public MemoryPlatform {
 public:
-    explicit RuntimeMachine(bool withSession = false) : engine(portsOf(*this, withSession ? &session : nullptr)) {
+    // An observer sees what the engine does, but no call of the machine's plain members.
+    explicit RuntimeMachine(bool withSession = false, ICallObserver* observer = nullptr)
+        : engine(enginePorts(withSession, observer)) {
         processes_.addProgram(kFolder, {});  // has a short form
         files_.add(std::string(kFolder) + "readme");
     }
@@ -70,7 +74,26 @@ public:
     static constexpr const char* kFolder = "C:\\Setup Logs\\";
     static constexpr const char* kLogFile = "C:\\Setup Logs\\setup.log";
 
+    IInstallerSession& installer() {
+        return intercepted_ ? static_cast<IInstallerSession&>(*interceptedSession_) : session;
+    }
+
     MemoryInstallerSession session;
+
+private:
+    RuntimePorts enginePorts(bool withSession, ICallObserver* observer) {
+        if (observer != nullptr) {
+            intercepted_ = std::make_unique<InterceptedPorts>(ports_, *observer);
+            interceptedSession_ = std::make_unique<InterceptedSession>(session, *observer);
+            ports_ = intercepted_->ports();
+        }
+        return portsOf(*this, withSession ? &installer() : nullptr);
+    }
+
+    std::unique_ptr<InterceptedPorts> intercepted_;
+    std::unique_ptr<InterceptedSession> interceptedSession_;
+
+public:
     URE engine;
 };
 
