@@ -1,5 +1,5 @@
-// Every call of every flow fails in turn, once and for good: the flow ends, says so, leaks nothing, and what it
-// was not to touch is still there. A new flow is a new row.
+// Every call of every flow fails in turn, once and for good: the flow ends, reports it, leaks nothing and does not
+// change what it must not touch. A new flow is a new row.
 #include <gtest/gtest.h>
 
 #include <cstring>
@@ -31,6 +31,7 @@ void twoCopies(FaultyMachine& machine) {
     machine.addService("KZ7MGMTSVC", false);
     machine.libraries_.libraries["C:\\KZ9\\bin\\kz7install64.dll"]["sqleGetLevelInfo"] =
         reinterpret_cast<LibraryFunction>(tellLevel);
+    machine.files_.add("C:\\KZ9\\bin\\kz7mgmtsvc.exe");
     for (const char* program : {"kz7nmpgac32.exe", "kz7nmpcfg.exe", "kz7nmpcfg_32.exe"}) {
         const std::string path = "C:\\KZ9\\bin\\" + std::string(program);
         machine.files_.add(path);
@@ -52,11 +53,21 @@ const SweptFlow kSwept[] = {
     {'9', {"-v9", "C:\\KZ9"}},
     {'d', {"-dotnet", "C:\\KZ9"}},
     {'v', {"-addv9", "THIRD", "C:\\third"}},
+    {'s', {"start of a new service"}},
 };
 
-// Every error line that those failures bring out, with the flows that report it; without those that name a registry
-// row. Line numbers and texts are what support knows them by.
-const std::map<std::string, std::string> kToldLines = {
+// No option starts a service that it has just created.
+Status runFlow(const SweptFlow& flow, FaultyMachine& machine) {
+    if (flow.mark != 's') {
+        return machine.run(flow.arguments);
+    }
+    Report report(machine.console());
+    return registerManagementService(machine.registry(), machine.services(), report, "C:\\KZ9", "NEW", true);
+}
+
+// Every error line that those failures cause, with the flows that report it, except the lines that name a registry row.
+// Support staff search for the line numbers and texts.
+const std::map<std::string, std::string> kErrorLines = {
     // clang-format off
     {":1241: An error occurred while creating default version 8 registry keys", "8"},
     {":1345: Error occurred while backing up old registry", "9"},
@@ -67,9 +78,12 @@ const std::map<std::string, std::string> kToldLines = {
     {":1466: Failed to copy copy SOFTWARE\\NVQ\\KZ7BackupV8 to SOFTWARE\\NVQ\\KZ7", "8"},
     {":1467: Create empty version 8 registry", "8"},
     {":1486: Failed to create basic registry keys or update location of the version 8 sqllib", "8"},
-    {":1510: Failed open the SCM - error code 4321", "8"},
+    {":1510: Failed open the SCM - error code 4321", "8s"},
     {":1523: Failed open the Service KZ7MGMTSVC - error code 4321", "8"},
+    {":1523: Failed open the Service KZ7MGMTSVC_NEW - error code 4321", "s"},
     {":1541: Unable to update the start type of the service KZ7MGMTSVC - error 4321", "8"},
+    {":1541: Unable to update the start type of the service KZ7MGMTSVC_NEW - error 4321", "s"},
+    {":1552: Unable to start the service KZ7MGMTSVC_NEW - error 4321", "s"},
     {":1602: Unable to deregister the KZ7 .NET Data Provider - ", "v"},
     {":1602: Unable to deregister the KZ7 .NET Data Provider - 9.1.0", "9d"},
     {":1629: Failed to register 32-bit KZ7 .net data provider to GAC.  rc = 5030", "9d"},
@@ -82,11 +96,11 @@ const std::map<std::string, std::string> kToldLines = {
     {":1689: Failed to execute kz7nmpcfg_32.exe command.  rc = 5030", "9dv"},
     {":1689: Failed to execute kz7nmpcfg_32.exe command.  rc = 5082", "9dv"},
     {":1689: Failed to execute kz7nmpcfg_32.exe command.  rc = 5111", "9dv"},
-    {":1739: Failed open the SCM - error code 4321", "ab9v"},
-    {":1775: Failed to create service- error code 4321", "ab9v"},
-    {":1800: Failed to create Event log registry key -error 4321", "a9v"},
-    {":1816: Failed to set EventMessageFile -error 4321", "a9v"},
-    {":1838: Failed to set TypesSupported -error 4321", "a9v"},
+    {":1739: Failed open the SCM - error code 4321", "ab9vs"},
+    {":1775: Failed to create service- error code 4321", "ab9vs"},
+    {":1800: Failed to create Event log registry key -error 4321", "a9vs"},
+    {":1816: Failed to set EventMessageFile -error 4321", "a9vs"},
+    {":1838: Failed to set TypesSupported -error 4321", "a9vs"},
     {":421: Failed to copy copy SOFTWARE\\NVQ\\KZ7 to SOFTWARE\\NVQ\\KZ7BackupV8", "9"},
     {":595: Unable to resolve the sqleGetLevelInfo from C:\\KZ9\\bin\\kz7install64.dll", "9d"},
     {":601: Unable to load C:\\KZ9\\bin\\kz7install64.dll", "9d"},
@@ -101,23 +115,23 @@ const std::map<std::string, std::string> kToldLines = {
     // clang-format on
 };
 
-TEST(FaultSweep, EveryFlowEndsSaysSoAndTouchesNothingElse) {
-    std::map<std::string, std::string> told;
+TEST(FaultSweep, EveryFlowEndsReportsAndTouchesNothingElse) {
+    std::map<std::string, std::string> reported;
     for (const SweptFlow& flow : kSwept) {
         SCOPED_TRACE(flow.mark);
         const std::string& option = flow.arguments[0];
         for (const bool forGood : {false, true}) {
             std::vector<std::string> cut;  // the console of the runs whose first, second, ... commit failed
             const auto check = [&](FaultyMachine& machine, Status status) {
-                machine.servicesLeftOpen = option == "-v8" ? 2 : 0;
+                machine.servicesLeftOpen = option == "-v8" || flow.mark == 's' ? 2 : 0;
                 EXPECT_NE(machine.dump("SOFTWARE\\Other").find("somebody else's"), std::string::npos);
                 EXPECT_NE(machine.service("KZ7MGMTSVC_SECOND"), "");
                 const std::string& failed = machine.faults_.failed();
                 std::istringstream errors(machine.console_.error);
                 for (std::string line; !forGood && std::getline(errors, line);) {
                     line.erase(0, line.starts_with(kPrefix) ? kPrefix.size() - 1 : 0);
-                    if (!line.starts_with(":392:") && !told[line].ends_with(flow.mark)) {
-                        told[line] += flow.mark;
+                    if (!line.starts_with(":392:") && !reported[line].ends_with(flow.mark)) {
+                        reported[line] += flow.mark;
                     }
                 }
                 if (failed == "commit" && !forGood) {
@@ -129,11 +143,14 @@ TEST(FaultSweep, EveryFlowEndsSaysSoAndTouchesNothingElse) {
                     EXPECT_TRUE(machine.console_.both.starts_with(cut[i])) << cut[i];
                     EXPECT_NE(machine.console_.both, cut[0]);
                 }
-                // Closes and lines that did not reach the console judge nothing.
+                // A failed close and a lost line of the console do not change the status.
                 if (failed.starts_with("close") || failed.starts_with("write") || failed == "flush") {
-                    if (!forGood && flow.arguments[1] != "NONE") {
+                    if (!forGood && flow.mark != 'u') {
                         EXPECT_EQ(status, kSuccess);
                     }
+                } else if (flow.mark == 's' && !forGood) {
+                    EXPECT_EQ(status == kSuccess, machine.console_.error.empty() || failed == "changeStartType");
+                    EXPECT_EQ(machine.runs("KZ7MGMTSVC_NEW"), status == kSuccess);
                 } else if (option == "-addKZ7Copy") {
                     EXPECT_EQ(status, failed.empty() ? kSuccess : kFault);
                     const std::string& output = machine.console_.output;
@@ -146,48 +163,11 @@ TEST(FaultSweep, EveryFlowEndsSaysSoAndTouchesNothingElse) {
                     }
                 }
             };
-            const auto run = [&](FaultyMachine& machine) { return machine.run(flow.arguments); };
+            const auto run = [&](FaultyMachine& machine) { return runFlow(flow, machine); };
             EXPECT_GT(sweepFaults(forGood, twoCopies, run, check), 10U);
         }
     }
-    EXPECT_EQ(told, kToldLines);
-}
-
-// The start of a service, which no flow reaches as long as the service is new to it.
-TEST(ServiceUnderFaults, AStartIsReportedStepByStep) {
-    std::set<std::string> outcomes;
-    sweepFaults(
-        false, [](FaultyMachine& machine) { machine.files_.add("C:\\KZ\\bin\\kz7mgmtsvc.exe"); },
-        [](FaultyMachine& machine) {
-            Report report(machine.console());
-            return registerManagementService(machine.registry(), machine.services(), report, "C:\\KZ", "NEW", true);
-        },
-        [&](FaultyMachine& machine, Status status) {
-            machine.servicesLeftOpen = 2;
-            const bool runs = machine.runs("KZ7MGMTSVC_NEW");
-            std::string error = machine.console_.error;
-            error.erase(0, error.empty() ? 0 : kPrefix.size());
-            outcomes.insert(machine.faults_.failed() + ": " + std::to_string(status) + (runs ? " runs " : " ") + error +
-                            machine.console_.output);
-        });
-    const std::string notStarted =
-        "The KZ7 Management service could not be started - some function not\n"
-        "yet ported to the new registry layout may not function properly\n";
-    const std::set<std::string> expected = {
-        ": 0 runs ",
-        "changeStartType: 0 runs 1541: Unable to update the start type of the service KZ7MGMTSVC_NEW - error 4321\n",
-        "closeHandle: 0 runs ",
-        "closeKey: 0 runs ",
-        "createKey: 4321 1800: Failed to create Event log registry key -error 4321\n",
-        "createService: 4321 1775: Failed to create service- error code 4321\n",
-        "openManager: 4321 1510: Failed open the SCM - error code 4321\n" + notStarted,
-        "openManager: 4321 1739: Failed open the SCM - error code 4321\n",
-        "openService: 4321 1523: Failed open the Service KZ7MGMTSVC_NEW - error code 4321\n" + notStarted,
-        "setValue: 4321 1816: Failed to set EventMessageFile -error 4321\n",
-        "setValue: 4321 1838: Failed to set TypesSupported -error 4321\n",
-        "startService: 4321 1552: Unable to start the service KZ7MGMTSVC_NEW - error 4321\n" + notStarted,
-    };
-    EXPECT_EQ(outcomes, expected);
+    EXPECT_EQ(reported, kErrorLines);
 }
 
 // What a removal takes away when one of its calls fails once. The list is read first: a copy that could not be
@@ -236,42 +216,32 @@ TEST(RemovalUnderFaults, WhatIsLeftFollowsFromTheCallThatFailed) {
 class Trace final : public ICallObserver {
 public:
     void after(const PortCall& call) override { text += call.text() + '\n'; }
-
     std::string text;
 };
 
-class TracedMachine : public Machine {
-public:
-    TracedMachine() { ports_ = intercepted_.ports(); }
-
-    Trace trace_;
-
-private:
-    InterceptedPorts intercepted_{ports_, trace_};
-};
-
 TEST(CallObserver, SeesEveryCallWithItsArgumentsAndResult) {
-    TracedMachine machine;
+    Machine machine;
+    Trace trace;
+    InterceptedRegistry registry(machine.registry_, trace);
+    InterceptedProcesses processes(machine.processes_, trace);
     FixedBuffer<8> data;
     ValueType type{};
     ProcessInformation started;
     {
-        OwnedKey key(machine.registry());
-        machine.registry().createKey(KeyHandle::localMachine, "A", "c", kKeyFull, key.receive());
-        machine.registry().setValue(key.get(), "n", ValueType::sz, std::string_view("x", 2));
-        machine.registry().queryValue(key.get(), "n", &type, data);
-        machine.registry().queryValue(key.get(), "m", nullptr, data);
+        OwnedKey key(registry);
+        registry.createKey(KeyHandle::localMachine, "A", "c", kKeyFull, key.receive());
+        registry.setValue(key.get(), "n", ValueType::sz, std::string_view("x", 2));
+        registry.queryValue(key.get(), "n", &type, data);
+        registry.queryValue(key.get(), "m", nullptr, data);
     }
-    machine.processes().startProcess({"a b", "", StreamHandle::none, StreamHandle::none}, started);
-    machine.terminal().keepLineFeeds(true);
-    EXPECT_EQ(machine.trace_.text,
+    processes.startProcess({"a b", "", StreamHandle::none, StreamHandle::none}, started);
+    EXPECT_EQ(trace.text,
               "registry.createKey(0x80000002, \"A\", \"c\", 0xf003f, 0x100000001) = 0\n"
               "registry.setValue(0x100000001, \"n\", 1, \"x\\x00\") = 0\n"
               "registry.queryValue(0x100000001, \"n\", 1, \"x\\x00\") = 0\n"
               "registry.queryValue(0x100000001, \"m\", null, ?) = 2\n"
               "registry.closeKey(0x100000001) = 0\n"
-              "processes.startProcess(\"a b\", ?) = 2\n"
-              "terminal.keepLineFeeds(1) = 0\n");
+              "processes.startProcess(\"a b\", ?) = 2\n");
 }
 
 }  // namespace

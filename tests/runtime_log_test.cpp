@@ -54,7 +54,7 @@ TEST(LogFile, HoldsARunToTheByte) {
     }
 }
 
-TEST(LogFile, TitlesComeFromTheModeAndTheCatalogue) {
+TEST(LogFile, BeginsWithTheSystemAndATitleOfTheModeAndTheCatalogue) {
     // clang-format off
     const struct { const char* why; std::uint32_t mode; const char* catalogue; bool isEnd; std::string title; } rows[] = {
         {"another bit",             8,       "",                              true,  ""},
@@ -66,8 +66,11 @@ TEST(LogFile, TitlesComeFromTheModeAndTheCatalogue) {
         {"44 characters",           1,       "2000 = aaaaaaaaaabbbbbbbbbbccccccccccddddddddddeeeeeeeeee", false, "aaaaaaaaaabbbbbbbbbbccccccccccddddddddddeeee"},
     };
     // clang-format on
+    const std::string cut(79, 'x');
     RuntimeMachine machine;
+    machine.host_.installed = {cut, cut + "x", cut + "x"};
     machine.openLog();
+    EXPECT_EQ(machine.logText(), "\nTue Jan  2 03:04:05 2024 UTC\n" + kLine60 + cut + " " + cut + "." + cut + "\n");
     machine.host_.dateAndZone = std::string(50, '9');
     for (const auto& row : rows) {
         ResponseFault fault;
@@ -78,15 +81,7 @@ TEST(LogFile, TitlesComeFromTheModeAndTheCatalogue) {
     }
 }
 
-TEST(LogFile, SaysWhatTheMachineRuns) {
-    const std::string cut(79, 'x');
-    RuntimeMachine machine;
-    machine.host_.installed = {cut, cut + "x", cut + "x"};
-    machine.openLog();
-    EXPECT_EQ(machine.logText(), "\nTue Jan  2 03:04:05 2024 UTC\n" + kLine60 + cut + " " + cut + "." + cut + "\n");
-}
-
-TEST(LogFile, ThatCannotBeKeptStandsInNobodysWay) {
+TEST(LogFile, IsReplacedByTheSessionIfItCannotBeOpened) {
     const std::string onlyNotes = "in the session, [Secret] [1] ][\na note\n";
     const std::string all = "in the session, [Secret] [1] ][\nNote: a note\nERROR: an error\na task\n";
     const std::string header = "\nTue Jan  2 03:04:05 2024 UTC\n" + kLine60 + "Memory 1.0\n";
@@ -122,7 +117,7 @@ TEST(LogFile, ThatCannotBeKeptStandsInNobodysWay) {
     EXPECT_EQ(machine.log().writeLine("nowhere"), kNoInstallerSession);
 }
 
-TEST(LogFile, TellsShortWrites) {
+TEST(LogFile, ReportsShortWrites) {
     // clang-format off
     const struct { std::uint64_t room; Status line; Status header; } rows[] = {
         {1000, kSuccess, kSuccess}, {6, kSuccess, kFailed}, {5, 5, kFailed}, {1, 1, kFailed}, {0, kFailed, kFailed},

@@ -23,6 +23,7 @@ struct Runtime : RuntimeMachine {
     explicit Runtime(ICallObserver* observer = nullptr) : RuntimeMachine(true, observer) {
         openLog();
         engine.registerObserver(*UREExternalObserverHumanStream::getInstance(engine));
+        engine.registerObserver(*UREExternalObserverMachineStream::getInstance(engine));
         engine.installationPath = "C:\\the folder of the first copy";
         processes_.otherPrograms = ScriptedProgram{.output = std::string(2000, 'o'), .error = "an error"};
         files_.add("C:\\profiles\\INST\\kz7systm");

@@ -6,7 +6,6 @@
 #include "install/runtime/observers/display_observer.h"
 #include "install/runtime/observers/external_output_pipe.h"
 #include "install/runtime/observers/protocol_lines.h"
-#include "tests/support/failing_new.h"
 #include "tests/support/runtime_machine.h"
 
 namespace kz7::test {
@@ -109,43 +108,6 @@ TEST(MachineStream, TellsAWholeRunToTheByte) {
         "PROGRESS TASK END :: CONFIGURATION :: 5 :: a\n"
         "MESSAGE QUERY CDPATH :: The text of message 0x44000002 is missing. :: \n\n"
         "MESSAGE INFO INSTALLEND :: C:\\Setup Logs\\setup.log\n");
-}
-
-TEST(Pipe, AnAllocationThatFailsIsReportedAndLosesOneLine) {
-    const std::string made = "ERROR: UREExternalOutputPipe::UREExternalOutputPipe, step ";
-    const std::string grown = "ERROR: UREExternalOutputPipe::addQueueMessage, step ";
-    const std::string memory = ": error 5002: There is not enough memory.\n";
-    std::string neverMade;
-    for (int line = 0; line < 6; ++line) {
-        neverMade += grown + "10" + memory;
-    }
-    // The queue is made of an array and 4 buffers; the fifth line asks for an array and 4 buffers more.
-    // clang-format off
-    const struct { int failing; const char* told; std::string log; } rows[] = {
-        {0,  "-----|",       made + "10" + memory + neverMade},
-        {4,  "-----|",       made + "20" + memory + neverMade},
-        {5,  "xxxx-|xxxxy",  grown + "10" + memory},
-        {9,  "xxxx-|xxxxy",  grown + "20" + memory},
-        {10, "xxxxx|xxxxxy", ""},
-    };
-    // clang-format on
-    for (const auto& row : rows) {
-        RuntimeMachine machine;
-        machine.openLog();
-        std::string told;
-        const std::string log = machine.logged([&] {
-            failAllocation(row.failing);
-            UREExternalOutputPipe pipe(machine.console_, machine.terminal_, machine.engine);
-            for (int line = 0; line < 5; ++line) {
-                told += pipe.addQueueMessage("x") == kSuccess ? 'x' : '-';
-            }
-            endFailingAllocations();
-            pipe.addQueueMessage("y");
-            pipe.flushQueue();
-        });
-        EXPECT_EQ(told + "|" + machine.console_.output, row.told) << row.failing;
-        EXPECT_EQ(log, row.log) << row.failing;
-    }
 }
 
 TEST(HumanStream, IsReadableAndAsWideAsTheTerminal) {
