@@ -1,4 +1,4 @@
-// Registry-editor text: what is written is read back exactly, and what is bad is named before anything is done.
+// Registry-editor text: an export is read back exactly, and a bad line is reported before anything is changed.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -31,7 +31,7 @@ void set(IRegistryStore& registry, std::string_view path, std::string_view name,
     ASSERT_EQ(registry.setValue(key.get(), name, type, data), kSuccess);
 }
 
-// Both roots, in an order that does not hang on when a value was set.
+// Both roots, in an order that does not depend on when a value was set.
 std::vector<std::string> contents(IRegistryStore& registry) {
     std::istringstream dump(test::dumpRegistry(registry) + test::dumpRegistry(registry, KeyHandle::users));
     std::vector<std::string> lines;
@@ -89,19 +89,15 @@ TEST(RegText, RoundTripIsExactInEveryByte) {
     set(registry, {}, "in a root", ValueType::none, {}, {}, KeyHandle::users);
 
     const std::string text = exportAll(registry);
-    std::string carriageReturns;
-    for (const char c : text) {
-        carriageReturns.append(c == '\n' ? "\r" : "").append(1, c);
-        EXPECT_TRUE(c < 0 || (c >= ' ' && c != 0x7F) || c == '\n') << "nothing in it steers a terminal";
-    }
-    for (const std::string& form :
-         {text, "\xEF\xBB\xBF" + text, carriageReturns, std::string(kUtf16Mark) + utf16FileText(text)}) {
-        MemoryRegistry again;
-        EXPECT_EQ(importText(again, form), "") << form.substr(0, 3);
-        EXPECT_EQ(contents(again), contents(registry)) << form.substr(0, 3);
-        EXPECT_EQ(importText(again, headed("[-HKLM\\k]\n")), "");
-        EXPECT_TRUE(exportAll(again).find("at the bottom") == std::string::npos);
-    }
+    EXPECT_TRUE(std::none_of(text.begin(), text.end(), [](char c) {
+        return (c >= 0 && c < ' ' && c != '\n') || c == 0x7F;
+    })) << "no control character reaches a terminal";
+    // The fuzzer's inputs try the other encodings.
+    MemoryRegistry again;
+    EXPECT_EQ(importText(again, text), "");
+    EXPECT_EQ(contents(again), contents(registry));
+    EXPECT_EQ(importText(again, headed("[-HKLM\\k]\n")), "");
+    EXPECT_TRUE(exportAll(again).find("at the bottom") == std::string::npos);
 }
 
 TEST(RegText, WritesWhatOtherEditorsRead) {
@@ -202,25 +198,24 @@ TEST(RegText, ReadsWhatPeopleWriteOrNamesTheBadLine) {
 TEST(RegText, PassesEveryFaultOfTheStoreOn) {
     const std::string file =
         headed("[HKLM\\a\\b]\n\"x\"=\"y\"\n@=-\n[-HKLM\\old]\n[HKU\\c]\n;class=\"c\"\n@=dword:1\n");
-    const auto prepare = [](test::FaultyMachine& machine) {
-        set(machine.registry_, "old\\k\\k", "x", ValueType::sz, "\0"sv);
-        set(machine.registry_, "a\\b", {}, ValueType::sz, "\0"sv);
-    };
-    std::string told;
-    const auto passesOn = [&](test::FaultyMachine& machine, Status) {
-        const std::string& failed = machine.faults_.failed();
-        EXPECT_EQ(told.find("error 4321") != std::string::npos, !failed.empty() && failed != "closeKey") << told;
-    };
-    const auto imports = [&](test::FaultyMachine& machine) {
-        told = importText(machine.registry(), file);
-        return kSuccess;
-    };
-    const auto exports = [&](test::FaultyMachine& machine) {
-        told = exportAll(machine.registry());
-        return kSuccess;
-    };
-    EXPECT_GT(test::sweepFaults(false, prepare, imports, passesOn), 20U);
-    EXPECT_GT(test::sweepFaults(false, prepare, exports, passesOn), 20U);
+    for (const bool imports : {true, false}) {
+        std::string result;
+        const std::uint64_t calls = test::sweepFaults(
+            false,
+            [](test::FaultyMachine& machine) {
+                set(machine.registry_, "old\\k\\k", "x", ValueType::sz, "\0"sv);
+                set(machine.registry_, "a\\b", {}, ValueType::sz, "\0"sv);
+            },
+            [&](test::FaultyMachine& machine) {
+                result = imports ? importText(machine.registry(), file) : exportAll(machine.registry());
+                return kSuccess;
+            },
+            [&](test::FaultyMachine& machine, Status) {
+                const std::string& failed = machine.faults_.failed();
+                EXPECT_EQ(result.find("error 4321") != std::string::npos, !failed.empty() && failed != "closeKey");
+            });
+        EXPECT_GT(calls, 20U);
+    }
 }
 
 TEST(KeyWalk, ShowsTheProductInAMachinesRegistry) {

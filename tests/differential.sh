@@ -80,9 +80,6 @@ long() { printf '%*s' "$1" '' | tr ' ' "${2:-n}"; }
 # why                                        command
 same 'usage without an option'
 same 'usage for an unknown option'           -addKZ7
-same 'usage for a count too small'           -addKZ7Copy COPY1
-same 'usage for a count too great'           -removeKZ7Copy COPY1 'C:\KZ7'
-same 'usage for five arguments'              -addKZ7Copy COPY1 'C:\KZ7' more
 same 'removal with nothing there'            -removeKZ7Copy COPY1
 same 'the first copy'                        -addKZ7Copy COPY1 'C:\KZ7\copy1'
 same 'the same copy, elsewhere'              -addKZ7Copy COPY1 'D:\other place'

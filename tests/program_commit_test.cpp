@@ -50,10 +50,8 @@ TEST_F(CommitProgram, SetsWhatAResponseFileSays) {
         << kept;
     EXPECT_NE(store_.dump().find("COPY1\\PROFILES\\INST : KZ7ACCOUNT = 1:me\\x00\n"), std::string::npos);
 
-    const ProgramResult lost = runProgram({"/bin/sh", "-c",
-                                           programPath("kz7admin") + " commit --copy COPY1 --response-file " +
-                                               responses("KZ7COMM = a\nNOPE = 1\n") + " >&-"},
-                                          {{"KZ7_STATE_DIR=" + store_.path()}, {}});
+    const ProgramResult lost =
+        store_.shell("kz7admin commit --copy COPY1 --response-file " + responses("KZ7COMM = a\nNOPE = 1\n") + " >&-");
     EXPECT_EQ(lost.exitCode, 1) << "exits by what was set";
     EXPECT_TRUE(lost.error.starts_with("Error: ") &&
                 lost.error.ends_with("\nkz7admin: cannot write: standard output: error 29\n"))

@@ -48,11 +48,7 @@ TEST_F(ProviderProgram, RegistersWhileItsProgramsUseTheStore) {
 }
 
 TEST_F(ProviderProgram, ErrorsStandBetweenTheLinesThatTheyBelongTo) {
-    const auto both = [&](const std::string& arguments) {
-        return runProgram({"/bin/sh", "-c", programPath("kz7InstallReg") + arguments + " 2>&1"},
-                          {{"KZ7_STATE_DIR=" + store_.path(), "KZ7_SAMPLE_EXIT=5"}, {}});
-    };
-    const ProgramResult refused = both(" -dotnet 'C:\\KZ7'");
+    const ProgramResult refused = store_.shell("kz7InstallReg -dotnet 'C:\\KZ7' 2>&1", {{"KZ7_SAMPLE_EXIT=5"}, {}});
     EXPECT_EQ(refused.exitCode, 255) << "no copies, no aliases";
     EXPECT_EQ(refused.output,
               "Level Returned: 9.1.0.0\n"
@@ -66,21 +62,19 @@ TEST_F(ProviderProgram, ErrorsStandBetweenTheLinesThatTheyBelongTo) {
               "debug: Failed to open the registry key: SOFTWARE\\NVQ\\KZ7\\InstalledCopies\n"
               "debug: Failed to backup the old profile info\n")
         << "texts for a debugger, shown when asked for";
-    EXPECT_TRUE(both(" -v8 'C:\\KZ8'").output.starts_with("Creating version 8 registry\n" + kPrefix + "1466: "));
+    EXPECT_TRUE(store_.shell("kz7InstallReg -v8 'C:\\KZ8' 2>&1")
+                    .output.starts_with("Creating version 8 registry\n" + kPrefix + "1466: "));
 }
 
 TEST_F(ProviderProgram, LostOutputAndHostileTextsAreOneLineEach) {
-    const auto both = [&](const std::string& command, const std::string& directory) {
-        return runProgram({"/bin/sh", "-c", programPath("kz7InstallReg") + command},
-                          {{"KZ7_STATE_DIR=" + directory}, {}});
-    };
-    const ProgramResult full = both(" -addKZ7Copy C 'C:\\c' >/dev/full", store_.path());
+    const ProgramResult full = store_.shell("kz7InstallReg -addKZ7Copy C 'C:\\c' >/dev/full");
     EXPECT_EQ(full.exitCode, 0);
     EXPECT_EQ(full.error, "kz7InstallReg: cannot write standard output: error 112\n");
-    EXPECT_EQ(both(" -removeKZ7Copy NONE 2>&1 | true", store_.path()).error, "") << "a reader that is gone";
+    EXPECT_EQ(store_.shell("kz7InstallReg -removeKZ7Copy NONE 2>&1 | true").error, "") << "a reader that is gone";
     const std::string hostile = store_.file("\x1b[2J\xD8\x9C");
     overwrite(hostile, "");
-    const ProgramResult escaped = both(" -removeKZ7Copy C", hostile);
+    const ProgramResult escaped =
+        runProgram({programPath("kz7InstallReg"), "-removeKZ7Copy", "C"}, {{"KZ7_STATE_DIR=" + hostile}, {}});
     EXPECT_NE(escaped.error.find("/\\x1b[2J\\u061c"), std::string::npos) << escaped.error;
 }
 

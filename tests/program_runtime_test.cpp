@@ -3,7 +3,6 @@
 #include <gtest/gtest.h>
 
 #include <fcntl.h>
-#include <sys/resource.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -81,11 +80,7 @@ TEST_F(RuntimeProgram, KeepsItsLogWithoutAReaderAndItsReaderWithoutALog) {
     // More than the lines on standard output, which meet the same limit.
     const std::string before = log() + std::string(10'000, 'x') + '\n';
     overwrite(path("setup.log"), before);
-    const auto limited = [size = before.size() + 50] {
-        const rlimit room{size, size};
-        setrlimit(RLIMIT_FSIZE, &room);
-    };
-    const ProgramResult full = install({.environment = {}, .inChild = limited});
+    const ProgramResult full = install({.environment = {}, .inChild = limitFileSize(before.size() + 50)});
     EXPECT_EQ(full.exitCode, 0);
     EXPECT_TRUE(full.output.ends_with(lastLine()));
     EXPECT_TRUE(log().starts_with(before)) << "the log of the earlier run stays";

@@ -1,6 +1,7 @@
 #include "tests/support/run_program.h"
 
 #include <fcntl.h>
+#include <sys/resource.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -58,6 +59,10 @@ ProgramResult runProgram(const std::vector<std::string>& command, const ProgramO
     int status = 0;
     waitpid(startProgram(command, options, output, error), &status, 0);
     return {WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status), contents(output), contents(error)};
+}
+
+std::function<void()> limitFileSize(std::size_t bytes) {
+    return [limit = rlimit{bytes, bytes}] { setrlimit(RLIMIT_FSIZE, &limit); };
 }
 
 }  // namespace kz7::test

@@ -35,4 +35,7 @@ pid_t startProgram(const std::vector<std::string>& command, const ProgramOptions
                    const std::string& output = "/dev/null", const std::string& error = "/dev/null");
 ProgramResult runProgram(const std::vector<std::string>& command, const ProgramOptions& options = {});
 
+// For `inChild`: no file may grow beyond that size.
+std::function<void()> limitFileSize(std::size_t bytes);
+
 }  // namespace kz7::test

@@ -23,6 +23,11 @@ public:
     ProgramResult tool(Arguments arguments, ProgramOptions options = {}) const {
         return run("kz7InstallReg", std::move(arguments), std::move(options));
     }
+    // Runs a shell command that begins with the name of a program of the project.
+    ProgramResult shell(const std::string& command, ProgramOptions options = {}) const {
+        options.environment.push_back("KZ7_STATE_DIR=" + path());
+        return runProgram({"/bin/bash", "-c", programPath(command)}, options);
+    }
     // Starts the tool without waiting; output and errors are dropped.
     pid_t start(Arguments arguments) const;
 
