@@ -145,15 +145,17 @@ Status ServiceRecords::changeStartType(ServiceHandle service, ServiceStart start
                : registry_.setValue(record.get(), kStart, ValueType::dword, bytesOf(static_cast<std::uint32_t>(start)));
 }
 
-Status ServiceRecords::state(KeyHandle record, ServiceState& state) {
+Status ServiceRecords::recordOf(ServiceHandle handle, std::uint32_t needed, OwnedKey& record, ServiceState& state) {
+    if (const Status status = recordOf(handle, needed, record); status != kSuccess) {
+        return status;
+    }
     FixedBuffer<4> number;
-    const Status status = registry_.queryValue(record, kRunState, nullptr, number);
+    const Status status = registry_.queryValue(record.get(), kRunState, nullptr, number);
     if (status != kSuccess && !isNotFound(status) && status != kMoreData) {
         return status;
     }
-    state = status == kSuccess && number.view() == bytesOf(static_cast<std::uint32_t>(ServiceState::running))
-                ? ServiceState::running
-                : ServiceState::stopped;
+    const bool runs = status == kSuccess && number.view() == bytesOf(static_cast<std::uint32_t>(ServiceState::running));
+    state = runs ? ServiceState::running : ServiceState::stopped;
     return kSuccess;
 }
 
@@ -162,10 +164,7 @@ Status ServiceRecords::state(KeyHandle record, ServiceState& state) {
 Status ServiceRecords::startService(ServiceHandle service) {
     OwnedKey record(registry_);
     ServiceState now{};
-    Status status = recordOf(service, kServiceStartRight, record);
-    if (status == kSuccess) {
-        status = state(record.get(), now);
-    }
+    Status status = recordOf(service, kServiceStartRight, record, now);
     if (status != kSuccess) {
         return status;
     }
@@ -185,10 +184,7 @@ Status ServiceRecords::startService(ServiceHandle service) {
 Status ServiceRecords::stopService(ServiceHandle service) {
     OwnedKey record(registry_);
     ServiceState now{};
-    Status status = recordOf(service, kServiceStop, record);
-    if (status == kSuccess) {
-        status = state(record.get(), now);
-    }
+    const Status status = recordOf(service, kServiceStop, record, now);
     if (status != kSuccess) {
         return status;
     }
@@ -204,8 +200,7 @@ Status ServiceRecords::waitForStop(ServiceHandle service, std::uint32_t) {
 
 Status ServiceRecords::queryState(ServiceHandle service, ServiceState& state) {
     OwnedKey record(registry_);
-    const Status status = recordOf(service, kServiceQueryStatus, record);
-    return status != kSuccess ? status : this->state(record.get(), state);
+    return recordOf(service, kServiceQueryStatus, record, state);
 }
 
 // By handles and without recursion: a tree of keys may be deeper than a path is long, or than the stack.

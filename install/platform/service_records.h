@@ -44,7 +44,8 @@ private:
     Status managerOf(ServiceHandle handle);
     // The record behind a handle that has the right needed.
     Status recordOf(ServiceHandle handle, std::uint32_t needed, OwnedKey& record);
-    Status state(KeyHandle record, ServiceState& state);
+    // The same, with the state that it has.
+    Status recordOf(ServiceHandle handle, std::uint32_t needed, OwnedKey& record, ServiceState& state);
     Status deleteRecord(const std::string& path);
 
     IRegistryStore& registry_;

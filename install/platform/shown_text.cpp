@@ -1,6 +1,7 @@
 #include "install/platform/shown_text.h"
 
 #include "install/platform/encoding.h"
+#include "install/platform/text.h"
 
 namespace kz7 {
 namespace {
@@ -15,7 +16,6 @@ bool steersTerminal(char32_t character) {
 }  // namespace
 
 std::string shownText(std::string_view foreign) {
-    static constexpr char kDigits[] = "0123456789abcdef";
     const std::u16string utf16 = utf16FromText(foreign);
     std::u16string shown;
     for (std::u16string_view rest = utf16; !rest.empty();) {
@@ -26,10 +26,9 @@ std::string shownText(std::string_view foreign) {
         }
         // A byte that is no character shows as the byte it is.
         const bool isByte = character < 0x80 || isSurrogate(character);
-        shown += isByte ? u"\\x" : u"\\u";
-        for (int shift = isByte ? 4 : 12; shift >= 0; shift -= 4) {
-            shown += static_cast<char16_t>(kDigits[character >> shift & 15]);
-        }
+        std::string escape = isByte ? "\\x" : "\\u";
+        appendHex(character, isByte ? 2 : 4, escape);
+        shown.append(escape.begin(), escape.end());
     }
     return textFromUtf16(shown);
 }

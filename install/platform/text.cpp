@@ -100,6 +100,13 @@ bool equalsIgnoreCase(std::string_view left, std::string_view right) {
                                                      [](char a, char b) { return foldUpper(a) == foldUpper(b); });
 }
 
+void appendHex(std::uint64_t number, int digits, std::string& text) {
+    static constexpr char kDigits[] = "0123456789abcdef";
+    while (digits-- > 0) {
+        text += kDigits[number >> (4 * digits) & 15];
+    }
+}
+
 std::string compose(std::string_view pattern, std::initializer_list<Insert> inserts) {
     std::string text;
     text.reserve(pattern.size() + 32 * inserts.size());

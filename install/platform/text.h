@@ -86,6 +86,9 @@ std::uint32_t columnsOf(std::string_view text);
 // break nothing.
 std::string_view takeWrappedLine(std::string_view& text, std::uint32_t columns);
 
+// Appends that many hexadecimal digits of a number, in lower case, its last one at the end.
+void appendHex(std::uint64_t number, int digits, std::string& text);
+
 // What stands in for a placeholder: %s takes a text, %d and %u a number (%d shows it signed, as the
 // messages always did with a status).
 using Insert = std::variant<std::string_view, std::uint32_t>;

@@ -17,13 +17,11 @@ struct ExportOptions {
 };
 
 void appendJsonValue(const KeyValue& value, std::string& json) {
-    static constexpr char kDigits[] = "0123456789abcdef";
     json += "{\"name\":";
     appendJsonText(value.name, json);
     json += ",\"type\":" + std::to_string(static_cast<std::uint32_t>(value.type)) + ",\"bytes\":\"";
     for (const char c : value.data) {
-        json += kDigits[static_cast<unsigned char>(c) >> 4];
-        json += kDigits[static_cast<unsigned char>(c) & 15];
+        appendHex(static_cast<unsigned char>(c), 2, json);
     }
     json += '"';
     std::uint64_t number = 0;

@@ -45,9 +45,8 @@ std::string shownData(const KeyValue& value) {
     }
     std::string shown;
     for (const char c : value.data) {
-        char byte[4];
-        std::snprintf(byte, sizeof byte, " %02x", static_cast<unsigned char>(c));
-        shown += byte;
+        shown += ' ';
+        appendHex(static_cast<unsigned char>(c), 2, shown);
     }
     return shown;
 }

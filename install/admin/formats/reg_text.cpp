@@ -68,13 +68,6 @@ bool isPlainText(const KeyValue& value, std::string& utf8) {
     return true;
 }
 
-void appendHex(std::uint32_t number, int digits, std::string& text) {
-    static constexpr char kDigits[] = "0123456789abcdef";
-    while (digits-- > 0) {
-        text += kDigits[number >> (4 * digits) & 15];
-    }
-}
-
 void appendHexType(ValueType type, std::string& text) {
     text += "hex";
     if (type != ValueType::binary) {

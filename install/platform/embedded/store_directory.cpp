@@ -13,11 +13,11 @@
 #include <vector>
 
 #include "install/platform/embedded/paths.h"
+#include "install/platform/text.h"
 
 namespace kz7 {
 namespace {
 
-constexpr std::string_view kDigits = "0123456789abcdef";
 constexpr std::size_t kNoiseSize = 16;  // bytes of randomness in the name of an unfinished store
 
 std::string environment(const char* name) {
@@ -36,7 +36,7 @@ bool isUnfinishedStore(std::string_view name) {
         return false;
     }
     name.remove_prefix(prefix.size());
-    const std::size_t end = name.find_first_not_of(kDigits);
+    const std::size_t end = name.find_first_not_of("0123456789abcdef");
     return (end == std::string_view::npos ? name.size() : end) == 2 * kNoiseSize &&
            (end == std::string_view::npos || name[end] == '-');
 }
@@ -109,8 +109,7 @@ bool randomName(const std::string& prefix, std::string& name) {
     }
     name = prefix;
     for (const unsigned char byte : noise) {
-        name += kDigits[byte >> 4];
-        name += kDigits[byte & 15];
+        appendHex(byte, 2, name);
     }
     return true;
 }

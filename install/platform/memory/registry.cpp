@@ -15,7 +15,10 @@ constexpr std::uint64_t kFirstHandle = std::uint64_t{1} << 32;
 }  // namespace
 
 MemoryRegistry::MemoryRegistry()
-    : machine_(std::make_shared<Node>()), users_(std::make_shared<Node>()), lastHandle_(kFirstHandle) {}
+    : machine_(std::make_shared<Node>()),
+      users_(std::make_shared<Node>()),
+      noUser_(std::make_shared<Node>()),
+      lastHandle_(kFirstHandle) {}
 
 std::vector<MemoryRegistry::NodePointer>::iterator MemoryRegistry::lowerBound(Node& parent, std::string_view fold) {
     return std::lower_bound(parent.subkeys.begin(), parent.subkeys.end(), fold,
@@ -47,7 +50,8 @@ Status MemoryRegistry::nodeOf(KeyHandle handle, AccessMask needed, NodePointer& 
             node = users_;
             return kSuccess;
         case KeyHandle::currentUser:
-            node = child(*users_, kCallersSid, true);
+            node = child(*users_, kCallersSid, false);
+            node = node == nullptr ? noUser_ : node;
             return kSuccess;
         default:
             break;
@@ -78,7 +82,11 @@ Status MemoryRegistry::find(KeyHandle parent, std::string_view path, AccessMask 
         node = child(*node, name, false);
         status = node == nullptr ? kFileNotFound : kSuccess;
     }
-    return status;
+    return status == kSuccess && node == noUser_ ? kFileNotFound : status;
+}
+
+MemoryRegistry::NodePointer MemoryRegistry::writable(NodePointer node) {
+    return node == noUser_ ? child(*users_, kCallersSid, true) : node;
 }
 
 KeyHandle MemoryRegistry::giveOut(NodePointer node, AccessMask access) {
@@ -105,6 +113,7 @@ Status MemoryRegistry::createKey(KeyHandle parent, std::string_view path, std::s
         const std::string plain = plainKeyPath(parent, path, access);
         std::string_view rest = plain;
         std::string_view name;
+        node = writable(node);
         while (status == kSuccess && takeName(rest, name)) {
             node = child(*node, name, true);
         }
@@ -143,6 +152,7 @@ Status MemoryRegistry::setValue(KeyHandle key, std::string_view name, ValueType 
     if (const Status status = nodeForValue(key, kKeySetValue, name, node); status != kSuccess) {
         return status;
     }
+    node = writable(node);
     const auto [place, isNew] = node->byName.try_emplace(foldUpper(name));
     Value& value = place->second;
     if (isNew) {

@@ -57,6 +57,8 @@ private:
 
     static std::vector<NodePointer>::iterator lowerBound(Node& parent, std::string_view fold);
     static NodePointer child(Node& parent, std::string_view name, bool create);
+    // The node itself, or the caller's key, which a write makes.
+    NodePointer writable(NodePointer node);
     // The key behind a handle that has the rights needed.
     Status nodeOf(KeyHandle handle, AccessMask needed, NodePointer& node);
     Status nodeForValue(KeyHandle key, AccessMask needed, std::string_view name, NodePointer& node);
@@ -65,6 +67,7 @@ private:
 
     NodePointer machine_;
     NodePointer users_;
+    NodePointer noUser_;  // stands for the caller's key while it does not exist
     std::map<KeyHandle, OpenKey> open_;
     std::uint64_t lastHandle_;
     std::uint64_t lastPlace_ = 0;

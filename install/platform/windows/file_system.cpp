@@ -8,6 +8,7 @@
 #include <cstdlib>
 #include <string>
 
+#include "install/platform/text.h"
 #include "install/platform/windows/native_handle.h"
 #include "install/platform/windows/paths.h"
 #include "install/platform/windows/wide_text.h"
@@ -54,16 +55,13 @@ bool liesAt(HANDLE file, std::string_view path) {
 
 // A name for a new file in a folder; empty when the system has no randomness.
 std::string randomName(std::string_view folder) {
-    static constexpr char kDigits[] = "0123456789abcdef";
     std::string name = std::string(folder) + ".kz7-";
     for (int word = 0; word < 4; ++word) {
         unsigned noise = 0;
         if (rand_s(&noise) != 0) {
             return {};
         }
-        for (int shift = 28; shift >= 0; shift -= 4) {
-            name += kDigits[noise >> shift & 15];
-        }
+        appendHex(noise, 8, name);
     }
     return name;
 }
