@@ -178,6 +178,8 @@ TEST_F(AdminProgram, BackupReplacesNothingThatItShouldNot) {
     }
     ASSERT_EQ(admin({"import", file(big)}).exitCode, 0);
     const std::string before = store_.dump();
+    const StateDirectory other;
+    ASSERT_EQ(other.tool(kAddFirst).exitCode, 0);
     const std::string link = files_.path() + "/link";
     const std::string old = file("old");
     ASSERT_EQ(symlink(old.c_str(), link.c_str()), 0);
@@ -189,10 +191,14 @@ TEST_F(AdminProgram, BackupReplacesNothingThatItShouldNot) {
         {"/dev/null",                     true,  "not a regular file",                {}},
         {files_.path() + "/",             true,  "not a regular file",                {}},
         {files_.path() + "/none/x",       false, "no such directory",                 {}},
-        {store_.path() + "/registry.db",  true,  "part of the store itself",          {}},
-        {store_.path() + "/./registry.db-wal", true, "part of the store itself",      {}},
+        {files_.path() + "/a\\b",         false, "no file can have this name",        {}},
+        {store_.path() + "/registry.db",  true,  "part of a store",                   {}},
+        {store_.path() + "/./registry.db-wal", true, "part of a store",               {}},
+        {other.file("registry.db"),       true,  "part of a store",                   {}},
+        {other.file("registry.db-shm"),   true,  "part of a store",                   {}},
     };
     // clang-format on
+    EXPECT_EQ(admin({"backup", ""}).error, told("FILE: the name is empty (see --help)"));
     for (const auto& row : rows) {
         const Arguments words = {"backup", row.target, row.force ? "--force" : "--store=" + store_.path()};
         const ProgramResult result = admin(words, {{}, row.inChild});

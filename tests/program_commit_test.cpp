@@ -80,8 +80,8 @@ TEST_F(CommitProgram, TellsWhyItCannotBegin) {
         {"no response file",    "COPY1", "/nowhere", {}, "/nowhere: No such file or directory"},
         {"a long instance",     "COPY1", good, {"--instance", "INSTANCE9"}, "invalid instance name: INSTANCE9: at most 8 characters, no separators"},
         {"another folder",      "COPY1", good, {"--instance", ".."}, "invalid instance name: ..: at most 8 characters, no separators"},
-        {"no folder for a log", "COPY1", good, {"--log", "/nowhere/l"}, "cannot write log: /nowhere/l: error 3"},
-        {"a pipe for a log",    "COPY1", good, {"--log", pipe}, "cannot write log: " + pipe + ": error 5"},
+        {"no folder for a log", "COPY1", good, {"--log", "/nowhere/l"}, "cannot write log: /nowhere/l: no such directory"},
+        {"a pipe for a log",    "COPY1", good, {"--log", pipe}, "cannot write log: " + pipe + ": permission denied"},
     };
     // clang-format on
     for (const auto& row : rows) {

@@ -184,7 +184,7 @@ TEST_F(RuntimeProgram, FrontTakesWhateverAProgramDoes) {
     kill(std::stoi(contents(path("child"))), SIGKILL);
     const ProgramResult relative = front({"./script"});
     EXPECT_EQ(relative.exitCode, 127) << "nothing is started from the current folder";
-    EXPECT_EQ(relative.error, "kz7admin: no such program: ./script (needs an absolute path)\n");
+    EXPECT_EQ(relative.error, "kz7admin: no such program: ./script (a path must be absolute)\n");
     EXPECT_EQ(front({"kz7 no such program"}).error, "kz7admin: no such program: kz7 no such program\n");
 }
 

@@ -1,5 +1,6 @@
 #include "install/admin/admin.h"
 
+#include <array>
 #include <utility>
 
 #include "install/platform/registry_path.h"
@@ -120,6 +121,26 @@ Answer Admin::storeFault(std::string_view what, Status status) {
         tell(compose("%s: error %u", {what, status}));
     }
     return kAnswerFault;
+}
+
+std::string reasonOf(Status status) {
+    // clang-format off
+    static constexpr std::array<std::pair<Status, std::string_view>, 7> kReasons = {{
+        {kFileExists,           "file exists (--force replaces it)"},
+        {kPathNotFound,         "no such directory"},
+        {kBadPathname,          "not a regular file"},
+        {kAccessDenied,         "permission denied"},
+        {kDiskFull,             "no space left on device"},
+        {kInvalidName,          "no file can have this name"},
+        {kFilenameExceedsRange, "the name is too long"},
+    }};
+    // clang-format on
+    for (const auto& [number, reason] : kReasons) {
+        if (number == status) {
+            return std::string(reason);
+        }
+    }
+    return compose("error %u", {status});
 }
 
 Answer Admin::write(std::string_view text, Form form) {

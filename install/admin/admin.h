@@ -75,4 +75,7 @@ private:
     bool readerGone_ = false;
 };
 
+// Why a file cannot be written.
+std::string reasonOf(Status status);
+
 }  // namespace kz7

@@ -12,6 +12,7 @@
 #include "install/admin/commands/front_command.h"
 #include "install/admin/commands/import_command.h"
 #include "install/admin/commands/tree_command.h"
+#include "install/admin/given_name.h"
 #include "install/platform/console.h"
 #include "install/platform/encoding.h"
 #include "install/platform/program.h"
@@ -44,7 +45,7 @@ int run(int argc, char** argv) {
     Admin admin;
     CLI::App program("Looks at what kz7InstallReg wrote and moves it", "kz7admin");
     program.add_option("--store", admin.storeDirectory, "The state directory to use instead of the usual one")
-        ->check(CLI::Validator([](const std::string& text) { return text.empty() ? "the name is empty" : ""; }, {}));
+        ->check(givenName());
     program.footer(kFooter);
     program.require_subcommand(0, 1);
     program.fallthrough();

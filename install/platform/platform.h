@@ -78,7 +78,7 @@ public:
     // kFileNotFound: no store exists. kCallNotImplemented: the store is not the programs' own.
     virtual Status storeImage(std::string&) { return kCallNotImplemented; }
 
-    // Whether a path, as users of this host write it, names one of the store's files.
+    // Whether a path, as users of this host write it, names a file of the store, or of another one that has a log.
     virtual bool isStoreFile(const std::string&) { return false; }
 
 protected:

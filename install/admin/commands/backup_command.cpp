@@ -1,10 +1,10 @@
 #include "install/admin/commands/backup_command.h"
 
 #include <CLI/CLI.hpp>
-#include <array>
 #include <memory>
 
 #include "install/admin/formats/reg_text.h"
+#include "install/admin/given_name.h"
 #include "install/platform/text.h"
 
 namespace kz7 {
@@ -52,24 +52,6 @@ Answer readStore(Admin& admin, std::string& content) {
     return status == kSuccess ? kAnswerYes : admin.storeFault("cannot read store", status);
 }
 
-std::string reasonOf(Status status) {
-    // clang-format off
-    static constexpr std::array<std::pair<Status, std::string_view>, 5> kReasons = {{
-        {kFileExists,   "file exists (--force replaces it)"},
-        {kPathNotFound, "no such directory"},
-        {kBadPathname,  "not a regular file"},
-        {kAccessDenied, "permission denied"},
-        {kDiskFull,     "no space left on device"},
-    }};
-    // clang-format on
-    for (const auto& [number, reason] : kReasons) {
-        if (number == status) {
-            return std::string(reason);
-        }
-    }
-    return compose("error %u", {status});
-}
-
 Answer backUp(Admin& admin, const BackupOptions& options) {
     if (!admin.open(true)) {
         return kAnswerFault;
@@ -80,7 +62,7 @@ Answer backUp(Admin& admin, const BackupOptions& options) {
         return fail(admin, options, reasonOf(status));
     }
     if (admin.platform().isStoreFile(options.file)) {
-        return fail(admin, options, "part of the store itself");
+        return fail(admin, options, "part of a store");
     }
     std::string content;
     if (const Answer read = readStore(admin, content); read != kAnswerYes) {
@@ -97,7 +79,7 @@ Answer backUp(Admin& admin, const BackupOptions& options) {
 void addBackupCommand(CLI::App& program, Admin& admin) {
     auto* command = program.add_subcommand("backup", "Write the whole store to one file");
     auto options = std::make_shared<BackupOptions>();
-    command->add_option("FILE", options->file, "The file to make")->required();
+    command->add_option("FILE", options->file, "The file to make")->required()->check(givenName());
     command->add_flag("--force", options->force, "Replace an existing file");
     command->callback([&admin, options] { admin.answer = [&admin, options] { return backUp(admin, *options); }; });
 }

@@ -6,6 +6,7 @@
 
 #include "install/admin/configuration_run.h"
 #include "install/admin/copy_location.h"
+#include "install/admin/given_name.h"
 #include "install/admin/input_file.h"
 #include "install/platform/text.h"
 #include "install/runtime/config_handler.h"
@@ -77,7 +78,7 @@ Answer findLog(Admin& admin, const Words& words, ConfigurationRequest& request) 
     }
     const std::string shown = words.logFile.empty() ? files.shownPath(request.logFile) : words.logFile;
     return status == kSuccess ? kAnswerYes
-                              : admin.fault(compose("cannot write log: %s: error %u", {shownText(shown), status}));
+                              : admin.fault(compose("cannot write log: %s: %s", {shownText(shown), reasonOf(status)}));
 }
 
 // A relative path begins at the current directory, as that of a response file does.
@@ -89,7 +90,7 @@ Answer findMessages(Admin& admin, const Words&, ConfigurationRequest& request) {
     const Status status = admin.platform().files().productPath(path, request.messageFile);
     return status == kSuccess
                ? kAnswerYes
-               : admin.fault(compose("%s: %s: not a path: error %u", {kMessagesVariable, shownText(path), status}));
+               : admin.fault(compose("%s: %s: %s", {kMessagesVariable, shownText(path), reasonOf(status)}));
 }
 
 Answer commit(Admin& admin, const Words& words) {
@@ -129,7 +130,8 @@ void addCommitCommand(CLI::App& program, Admin& admin) {
     auto words = std::make_shared<Words>();
     command->add_option("--copy", words->copy, "The copy's name")->required();
     command->add_option("--response-file", words->responseFile, "Lines NAME = value; \"-\" is standard input")
-        ->required();
+        ->required()
+        ->check(givenName());
     command->add_option("--instance", words->instance, "The instance that it is set for; without: all of the copy");
     command->add_option("--log", words->logFile, "The log; without: kz7msi.log in the state directory");
     command->add_flag("--machine", words->machine, "Speak the progress protocol, for a front end");

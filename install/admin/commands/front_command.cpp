@@ -31,7 +31,7 @@ Answer runProgram(Admin& admin, const std::vector<std::string>& command) {
     }
     const std::string program = shownText(command.front());
     if (isNotFound(status)) {
-        const char* const hint = isBareName(command.front()) ? "" : " (needs an absolute path)";
+        const char* const hint = isBareName(command.front()) ? "" : " (a path must be absolute)";
         admin.tell("no such program: " + program + hint);
     } else {
         admin.tell(compose("cannot run program: %s: error %u", {program, status}));

@@ -3,6 +3,7 @@
 #include <CLI/CLI.hpp>
 
 #include "install/admin/formats/reg_text.h"
+#include "install/admin/given_name.h"
 #include "install/admin/input_file.h"
 #include "install/platform/text.h"
 
@@ -45,7 +46,7 @@ Answer importFile(Admin& admin, const std::string& path) {
 void addImportCommand(CLI::App& program, Admin& admin) {
     auto* command = program.add_subcommand("import", "Do what a file of registry-editor text asks for");
     auto path = std::make_shared<std::string>();
-    command->add_option("FILE", *path, "The file; \"-\" is standard input")->required();
+    command->add_option("FILE", *path, "The file; \"-\" is standard input")->required()->check(givenName());
     command->callback([&admin, path] { admin.answer = [&admin, path] { return importFile(admin, *path); }; });
 }
 

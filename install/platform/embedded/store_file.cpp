@@ -69,6 +69,14 @@ bool isTooLong(const std::string& directory) {
            (resolved != nullptr && std::strlen(resolved.get()) > kLongestDirectory);
 }
 
+// Whether a file is a store with a log, or such a log.
+bool hasLog(std::string path) {
+    for (const std::string_view suffix : {"-wal", "-shm"}) {
+        path.resize(path.size() - (path.ends_with(suffix) ? suffix.size() : 0));
+    }
+    return access((path + "-wal").c_str(), F_OK) == 0;
+}
+
 bool isReadableFile(const std::string& path) {
     struct stat found {};
     return stat(path.c_str(), &found) == 0 && S_ISREG(found.st_mode) && access(path.c_str(), R_OK) == 0;
@@ -96,7 +104,7 @@ bool StoreFile::isPart(const std::string& path) const {
             return true;
         }
     }
-    return false;
+    return hasLog(asked.string());
 }
 
 StoreFault StoreFile::refused(Status status, const std::string& file, int error) const {

@@ -23,7 +23,8 @@ public:
     const std::string& path() const { return path_; }
     bool exists() const;
 
-    // Whether a host path names the store, its log or another file that SQLite keeps next to it.
+    // Whether a host path names the store, its log or another file that SQLite keeps next to it; or one of another
+    // store that has a log: the log would be read into whatever took its store's place.
     bool isPart(const std::string& path) const;
 
     // Makes the state directory (mode 0700) and the store when they are missing, and opens it as a writer.
