@@ -70,14 +70,10 @@ TEST(RegText, RoundTripIsExactInEveryByte) {
             set(registry, "values", std::to_string(number++), each, isTextType(each) ? asText(data) : data);
         }
     }
-    std::string everyByte = bytes.substr(1);
-    for (const std::string& name :
-         {""s, everyByte, "\xED\xB2\x80"s, "\x80"s, "\xED\xB0\x81 \xED\xB0\x80"s,
-          "\xED\xA0\x80\xED\xA0\x81\xED\xB0\x80"s, "\xED\xA0\x80\xFF"s, std::string(kMaxValueName, '"')}) {
+    for (const std::string& name : {""s, bytes.substr(1), "\x80"s, "\xED\xB0\x81 \xED\xB0\x80"s,
+                                    "\xED\xA0\x80\xED\xA0\x81\xED\xB0\x80"s, std::string(kMaxValueName, '"')}) {
         set(registry, "names", asText(name), ValueType::sz, "data\0"sv);
     }
-    everyByte.erase(everyByte.find('\\'), 1);
-    set(registry, asText(everyByte.substr(0, 127) + "\\" + everyByte.substr(127)), "n", ValueType::sz, "\0"sv);
     set(registry, std::string(kMaxKeyName, ']') + "\\[-HKLM]\\;class=\"x\"\\ blanks ", "n", ValueType::sz, "\0"sv);
     std::string deep = "k";
     for (int level = 1; level < 500; ++level) {
@@ -216,26 +212,6 @@ TEST(RegText, PassesEveryFaultOfTheStoreOn) {
             });
         EXPECT_GT(calls, 20U);
     }
-}
-
-TEST(KeyWalk, ShowsTheProductInAMachinesRegistry) {
-    const std::string services = "SYSTEM\\CurrentControlSet\\Services\\";
-    const std::string events = services + "EventLog\\Application\\KZ7 Management Service";
-    const std::string services1 = services + "kz7mgmtsvc_Copy1";
-    MemoryRegistry registry;
-    for (const std::string& path :
-         {"SOFTWARE\\NVQ\\KZ7\\InstalledCopies"s, "SOFTWARE\\NVQ\\KZ7Other"s, "SOFTWARE\\Other"s,
-          "SOFTWARE\\Wow6432Node\\nvq\\kz7"s, services1, services + "KZ7MGMTSVC", services + "KZ7", events}) {
-        set(registry, path, {}, ValueType::none, {});
-    }
-    std::vector<KeyStart> starts;
-    ASSERT_EQ(findEverything(registry, false, starts), kSuccess);
-    std::string found;
-    for (const KeyStart& start : starts) {
-        found += start.name.path + '\n';
-    }
-    EXPECT_EQ(found, "SOFTWARE\\NVQ\\KZ7\nSOFTWARE\\Wow6432Node\\NVQ\\kz7\n" + events + "\n" + services +
-                         "KZ7MGMTSVC\n" + services1 + "\n");
 }
 
 }  // namespace

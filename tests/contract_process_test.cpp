@@ -91,21 +91,5 @@ TEST_P(ProcessHostContract, ProgramsThatAreNotThereDoNotStart) {
     fs::current_path(before);
 }
 
-TEST_P(ProcessHostContract, ThreadsCallTheirFunctionAndAreWaitedForAnyNumberOfTimes) {
-    IThreads& threads = platform_.threads();
-    int called = 0;
-    auto record = std::make_unique<ThreadStart>(ThreadStart{[](void* value) { ++*static_cast<int*>(value); }, &called});
-    std::uint32_t id = 0;
-    ThreadHandle thread = ThreadHandle::none;
-    ASSERT_EQ(threads.startThread(record, 256 * 1024 + 1, id, thread), kSuccess);
-    EXPECT_EQ(record, nullptr);
-    EXPECT_EQ(threads.waitThread(thread), kSuccess);
-    EXPECT_EQ(threads.waitThread(thread), kSuccess);
-    EXPECT_EQ(called, 1);
-    EXPECT_EQ(threads.closeThread(thread), kSuccess);
-    EXPECT_EQ(threads.waitThread(ThreadHandle::none), kInvalidHandle);
-    EXPECT_EQ(threads.closeThread(ThreadHandle::none), kInvalidHandle);
-}
-
 }  // namespace
 }  // namespace kz7::test

@@ -120,18 +120,5 @@ TEST_P(SmallPortContract, LinesAreReadToTheirEndAndCutToTheirRoom) {
     });
 }
 
-TEST_P(SmallPortContract, AFileIsNoTerminal) {
-    std::vector<TerminalView> views;
-    backend_->written([&](IConsole&) {
-        views.push_back(platform_.terminal().look(TerminalStream::output));
-        views.push_back(platform_.terminal().look(TerminalStream::error));
-    });
-    backend_->reading("", [&] { views.push_back(platform_.terminal().look(TerminalStream::input)); });
-    for (const TerminalView& view : views) {
-        EXPECT_FALSE(view.terminal || view.redraws || view.colours);
-        EXPECT_EQ(view.columns, 0U);
-    }
-}
-
 }  // namespace
 }  // namespace kz7::test

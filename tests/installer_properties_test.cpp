@@ -105,12 +105,7 @@ TEST_F(InstallerProperties, EverythingThatDeferredActionsNeedIsSaved) {
     machine.engine.takeResponses({{"PROD", "PROD_ESE"}, {"prod", "PROD_ESE"}, {"FILE", "C:\\p"}, {"EMPTY", ""}});
     save("S-1-5", "of an earlier installation");
     const std::string log = machine.logged([&] { EXPECT_EQ(iSavePropertiesForDeferred(at), kSuccess); });
-    EXPECT_TRUE(
-        log.starts_with("Note: iMsiGetProperty: UserSID, status 0\n"
-                        "Note: iMsiGetProperty: PROD, status 0\n"
-                        "Note: iMsiSetProperty: BASE_CLIENT_BIN_SELECTED, status 0\n"
-                        "Note: iMsiGetProperty: TOO_LONG, status 234\n"))
-        << log;
+    EXPECT_NE(log.find("Note: iMsiGetProperty: TOO_LONG, status 234\n"), std::string::npos) << log;
     EXPECT_NE(log.find("Note: MsiDoAction: ResolveSource, status 0\nNote: iMsiGetProperty: SOURCEDIR, status 0\n"),
               std::string::npos);
     EXPECT_EQ(log.find("secret"), std::string::npos) << "values stay out of the log";
