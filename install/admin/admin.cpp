@@ -46,45 +46,54 @@ Answer Admin::selectKeys(const std::string& key, std::vector<KeyStart>& starts) 
     return status == kSuccess ? kAnswerYes : storeFault("cannot read key: " + shown, status);
 }
 
+// The state of showKeys().
+struct Admin::Showing {
+    std::string text;
+    const Appender& append;
+    Reading reading;
+    Answer written = kAnswerYes;
+    Answer outcome = kAnswerNo;
+};
+
+Status Admin::showKey(const KeyRecord& record, Showing& showing) {
+    if (record.status != kSuccess) {
+        showing.outcome = storeFault("cannot read key: " + shownText(record.name), record.status);
+        if (platform_->storeFaultTold()) {
+            return record.status;
+        }
+    } else if (isBareRoot(record) && !record.hasSubkeys) {
+        return kSuccess;
+    }
+    showing.outcome = showing.outcome == kAnswerNo ? kAnswerYes : showing.outcome;
+    showing.append(record, showing.text);
+    if (showing.reading == Reading::pages && showing.text.size() > kPage) {
+        showing.written = show(showing.text);
+        showing.text.clear();
+    }
+    return showing.written == kAnswerYes ? kSuccess : kWriteFault;
+}
+
 Answer Admin::showKeys(const std::string& key, std::string text, const Appender& append, std::string_view tail,
                        Reading reading) {
     std::vector<KeyStart> starts;
     if (const Answer selected = selectKeys(key, starts); selected != kAnswerYes) {
         return selected;
     }
-    Answer written = kAnswerYes;
-    Answer outcome = kAnswerNo;
-    const auto visit = [&](const KeyRecord& record) {
-        if (record.status != kSuccess) {
-            if (platform_->storeFaultTold()) {
-                return record.status;
-            }
-            outcome = storeFault("cannot read key: " + shownText(record.name), record.status);
-        } else if (isBareRoot(record) && !record.hasSubkeys) {
-            return kSuccess;
-        }
-        outcome = outcome == kAnswerNo ? kAnswerYes : outcome;
-        append(record, text);
-        if (reading == Reading::pages && text.size() > kPage) {
-            written = show(text);
-            text.clear();
-        }
-        return written == kAnswerYes ? kSuccess : kWriteFault;
-    };
+    Showing showing{std::move(text), append, reading};
     for (const KeyStart& start : starts) {
-        const Status status = walkKeys(registry(), start, visit);
-        if (written != kAnswerYes) {
-            return written;
-        }
+        const Status status =
+            walkKeys(registry(), start, [&](const KeyRecord& record) { return showKey(record, showing); });
         if (status != kSuccess) {
-            return storeFault("cannot read key: " + shownText(fullKeyName(start.name)), status);
+            return showing.written != kAnswerYes
+                       ? showing.written
+                       : storeFault("cannot read key: " + shownText(fullKeyName(start.name)), status);
         }
     }
-    written = show(text.append(tail), reading == Reading::snapshot ? Form::document : Form::text);
-    if (written == kAnswerYes && outcome == kAnswerNo) {
+    const Answer written = show(showing.text.append(tail), reading == Reading::snapshot ? Form::document : Form::text);
+    if (written == kAnswerYes && showing.outcome == kAnswerNo) {
         tell("nothing to show: " + shownText(platform_->storeName()));
     }
-    return written != kAnswerYes ? written : outcome;
+    return written != kAnswerYes ? written : showing.outcome;
 }
 
 Answer Admin::show(std::string_view text, Form form) {

@@ -67,7 +67,10 @@ public:
     Answer write(std::string_view text, Form form = Form::text);
 
 private:
+    struct Showing;
+
     Answer selectKeys(const std::string& key, std::vector<KeyStart>& starts);
+    Status showKey(const KeyRecord& record, Showing& showing);
 
     std::unique_ptr<IPlatform> platform_;
     bool readOnly_ = false;

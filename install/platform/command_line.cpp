@@ -13,31 +13,39 @@ constexpr bool isBlank(char c) {
     return c == ' ' || c == '\t';
 }
 
+std::size_t takeBackslashes(std::string_view& text) {
+    const std::size_t count = std::min(text.find_first_not_of('\\'), text.size());
+    text.remove_prefix(count);
+    return count;
+}
+
+// Takes a quotation mark and appends it if it is a literal one: after an odd number of backslashes, or doubled inside
+// quotation marks. Otherwise it begins or ends a quotation.
+void takeMark(bool isEscaped, std::string_view& text, bool& quoted, std::string& argument) {
+    text.remove_prefix(1);
+    const bool isDoubled = !isEscaped && quoted && text.starts_with('"');
+    if (isEscaped || isDoubled) {
+        argument += '"';
+        text.remove_prefix(isDoubled ? 1 : 0);
+    } else {
+        quoted = !quoted;
+    }
+}
+
 // Takes one argument off `text`, which does not begin with a blank.
 std::string takeArgument(std::string_view& text) {
     std::string argument;
     bool quoted = false;
     while (!text.empty() && (quoted || !isBlank(text.front()))) {
-        std::size_t backslashes = text.find_first_not_of('\\');
-        backslashes = backslashes == std::string_view::npos ? text.size() : backslashes;
-        text.remove_prefix(backslashes);
-        if (text.empty() || text.front() != '"') {
+        const std::size_t backslashes = takeBackslashes(text);
+        if (text.starts_with('"')) {
+            argument.append(backslashes / 2, '\\');
+            takeMark(backslashes % 2 != 0, text, quoted, argument);
+        } else if (backslashes != 0) {
             argument.append(backslashes, '\\');
-            if (!text.empty() && (quoted || !isBlank(text.front()))) {
-                argument += text.front();
-                text.remove_prefix(1);
-            }
-            continue;
-        }
-        argument.append(backslashes / 2, '\\');
-        text.remove_prefix(1);
-        if (backslashes % 2 != 0) {
-            argument += '"';
-        } else if (quoted && !text.empty() && text.front() == '"') {
-            argument += '"';
-            text.remove_prefix(1);
         } else {
-            quoted = !quoted;
+            argument += text.front();
+            text.remove_prefix(1);
         }
     }
     return argument;

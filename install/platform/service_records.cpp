@@ -27,6 +27,26 @@ std::string terminated(std::string_view text) {
     return std::string(text) + '\0';
 }
 
+Status writeRecord(IRegistryStore& registry, KeyHandle record, const ServiceDefinition& definition) {
+    const struct {
+        std::string_view name;
+        ValueType type;
+        std::string data;
+    } rows[] = {
+        {"Type", ValueType::dword, bytesOf(definition.type)},
+        {kStart, ValueType::dword, bytesOf(static_cast<std::uint32_t>(definition.start))},
+        {"ErrorControl", ValueType::dword, bytesOf(definition.errorControl)},
+        {kImagePath, ValueType::expandSz, terminated(definition.programPath)},
+        {"DisplayName", ValueType::sz, terminated(definition.displayName)},
+        {"ObjectName", ValueType::sz, terminated("LocalSystem")},
+    };
+    Status status = kSuccess;
+    for (const auto& row : rows) {
+        status = status == kSuccess ? registry.setValue(record, row.name, row.type, row.data) : status;
+    }
+    return status;
+}
+
 }  // namespace
 
 ServiceHandle ServiceRecords::giveOut(std::string recordPath, std::uint32_t access) {
@@ -95,24 +115,7 @@ Status ServiceRecords::createService(ServiceHandle manager, const ServiceDefinit
     if (isNotFound(status)) {
         status = registry_.createKey(KeyHandle::localMachine, path, {}, kKeyFull, record.receive());
     }
-    struct Row {
-        std::string_view name;
-        ValueType type;
-        std::string data;
-    };
-    const std::array rows = {
-        Row{"Type", ValueType::dword, bytesOf(definition.type)},
-        Row{kStart, ValueType::dword, bytesOf(static_cast<std::uint32_t>(definition.start))},
-        Row{"ErrorControl", ValueType::dword, bytesOf(definition.errorControl)},
-        Row{kImagePath, ValueType::expandSz, terminated(definition.programPath)},
-        Row{"DisplayName", ValueType::sz, terminated(definition.displayName)},
-        Row{"ObjectName", ValueType::sz, terminated("LocalSystem")},
-    };
-    for (const Row& row : rows) {
-        if (status == kSuccess) {
-            status = registry_.setValue(record.get(), row.name, row.type, row.data);
-        }
-    }
+    status = status == kSuccess ? writeRecord(registry_, record.get(), definition) : status;
     if (status == kSuccess) {
         service = giveOut(path, kServiceAllAccess);
     }

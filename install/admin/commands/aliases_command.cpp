@@ -80,20 +80,24 @@ void computeAliases(Admin& admin, AliasRows& rows) {
     }
 }
 
+// What a rewrite does to an alias without a copy.
+std::string fateOf(const AliasRow& row, std::string_view missingView) {
+    if (!missingView.empty()) {
+        return "leaves it: the copies' key is missing from the " + std::string(missingView) + " view";
+    }
+    const auto stays = [&](std::size_t view) { return row.names[view] && !row.deletable[view]; };
+    if (!stays(0) && !stays(1)) {
+        return "deletes it";
+    }
+    const std::string fate = row.deletable[0]   ? "deletes it from the native view only"
+                             : row.deletable[1] ? "deletes it from the 32-bit view only"
+                                                : "leaves it";
+    return fate + ": a value name of 100 characters or more ends its walk";
+}
+
 std::string why(const AliasRow& row, std::string_view missingView) {
     if (!row.should) {
-        std::string reason = "no copy has such a version; the next rewrite ";
-        if (!missingView.empty()) {
-            return reason.append("leaves it: the copies' key is missing from the ").append(missingView) + " view";
-        }
-        const auto stays = [&](std::size_t view) { return row.names[view] && !row.deletable[view]; };
-        if (!stays(0) && !stays(1)) {
-            return reason + "deletes it";
-        }
-        reason += row.deletable[0]   ? "deletes it from the native view only"
-                  : row.deletable[1] ? "deletes it from the 32-bit view only"
-                                     : "leaves it";
-        return reason + ": a value name of 100 characters or more ends its walk";
+        return "no copy has such a version; the next rewrite " + fateOf(row, missingView);
     }
     if (row.version.empty()) {
         return row.exact ? "no copy has exactly this version; written empty" : "no version continues it; written empty";
@@ -109,6 +113,18 @@ bool isAskedFor(std::string_view prefix, std::string_view asked) {
 
 std::string shownName(const std::optional<std::string>& name) {
     return !name ? "-" : name->empty() ? "(empty)" : shownText(*name);
+}
+
+std::string aliasesText(const AliasRows& rows, const std::string& asked, std::string_view missingView,
+                        std::uint32_t columns) {
+    std::vector<TableRow> table = {{"PREFIX", "NATIVE", "32-BIT", "SHOULD BE", "WHY"}};
+    for (const auto& [key, row] : rows) {
+        if ((row.should || isAliasName(row.prefix)) && isAskedFor(row.prefix, asked)) {
+            table.push_back({row.prefix.empty() ? "(default)" : shownText(row.prefix), shownName(row.names[0]),
+                             shownName(row.names[1]), shownName(row.should), why(row, missingView)});
+        }
+    }
+    return table.size() == 1 ? std::string{} : tableText(table, columns);
 }
 
 Answer showAliases(Admin& admin, const std::string& asked) {
@@ -129,17 +145,8 @@ Answer showAliases(Admin& admin, const std::string& asked) {
     if (admin.platform().storeFaultTold()) {
         return kAnswerFault;
     }
-    std::vector<TableRow> table = {{"PREFIX", "NATIVE", "32-BIT", "SHOULD BE", "WHY"}};
-    for (const auto& [key, row] : rows) {
-        if ((row.should || isAliasName(row.prefix)) && isAskedFor(row.prefix, asked)) {
-            table.push_back({row.prefix.empty() ? "(default)" : shownText(row.prefix), shownName(row.names[0]),
-                             shownName(row.names[1]), shownName(row.should), why(row, missingView)});
-        }
-    }
-    if (table.size() == 1) {
-        return admin.no("no such alias: " + shownText(admin.platform().storeName()));
-    }
-    return admin.show(tableText(table, admin.output().columns));
+    const std::string text = aliasesText(rows, asked, missingView, admin.output().columns);
+    return text.empty() ? admin.no("no such alias: " + shownText(admin.platform().storeName())) : admin.show(text);
 }
 
 }  // namespace

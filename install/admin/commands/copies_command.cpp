@@ -98,15 +98,22 @@ Answer readCopies(Admin& admin, CopyRows& rows) {
     return admin.platform().storeFaultTold() ? kAnswerFault : kAnswerYes;
 }
 
+TableRow tableRow(const CopyRow& row, std::size_t view) {
+    const CopyInView& copy = *row.views[view];
+    return {shownText(row.name),
+            kViews[view].name,
+            shownText(copy.info.getVersion()),
+            copy.info.isValid() ? "yes" : "no",
+            copy.location.empty() ? "none" : shownText(copy.location),
+            row.state.empty() ? "none" : shownText(row.service) + " " + row.state};
+}
+
 std::string copiesText(const CopyRows& copies, std::uint32_t columns) {
     std::vector<TableRow> table = {{"NAME", "VIEW", "VERSION", "VALID", "LOCATION", "SERVICE"}};
     for (const auto& [fold, row] : copies) {
         for (std::size_t view = 0; view < kViews.size(); ++view) {
-            if (const auto& copy = row.views[view]) {
-                table.push_back({shownText(row.name), kViews[view].name, shownText(copy->info.getVersion()),
-                                 copy->info.isValid() ? "yes" : "no",
-                                 copy->location.empty() ? "none" : shownText(copy->location),
-                                 row.state.empty() ? "none" : shownText(row.service) + " " + row.state});
+            if (row.views[view]) {
+                table.push_back(tableRow(row, view));
             }
         }
     }

@@ -311,17 +311,23 @@ private:
             change.data += '\0';
             return ended();
         }
+        return take("dword:") ? dword(change) : hexList(change);
+    }
+
+    bool dword(ValueChange& change) {
         std::uint32_t number = 0;
-        if (take("dword:")) {
-            change.type = ValueType::dword;
-            if (!takeHex(8, number)) {
-                return fail("a dword is 1 to 8 hexadecimal digits");
-            }
-            for (unsigned shift = 0; shift < 32; shift += 8) {
-                change.data += static_cast<char>(number >> shift & 0xFF);
-            }
-            return ended();
+        if (!takeHex(8, number)) {
+            return fail("a dword is 1 to 8 hexadecimal digits");
         }
+        change.type = ValueType::dword;
+        for (unsigned shift = 0; shift < 32; shift += 8) {
+            change.data += static_cast<char>(number >> shift & 0xFF);
+        }
+        return ended();
+    }
+
+    bool hexList(ValueChange& change) {
+        std::uint32_t number = 0;
         change.type = ValueType::binary;
         if (take("hex(")) {
             if (!takeHex(8, number) || !take("):")) {
@@ -346,11 +352,8 @@ private:
         for (;;) {
             skipBlanks();
             if (take("\\")) {
-                if (!ended()) {
+                if (!continuation()) {
                     return false;
-                }
-                if (!nextLine()) {
-                    return fail("the file ends within a value");
                 }
                 continue;
             }
@@ -366,6 +369,8 @@ private:
             more = take(",");
         }
     }
+
+    bool continuation() { return ended() && (nextLine() || fail("the file ends within a value")); }
 
     void hexText(ValueType& type, std::string& data) const {
         if (narrowHex_) {

@@ -19,24 +19,28 @@ constexpr std::int64_t kPageSize = 4096;
 constexpr std::int64_t kLogLimit = std::int64_t{256} * 1024;  // bytes of log that a run leaves to the next one
 
 // clang-format off
-constexpr std::array kSql = {
-    "SELECT id FROM key WHERE parent = ? AND fold = ?",
-    "INSERT INTO key (parent, fold, name, class) VALUES (?, ?, ?, ?)",
-    "SELECT 1 FROM key WHERE id = ?",
-    "SELECT id, fold, name, class FROM key WHERE parent = ? AND fold >= ? ORDER BY fold LIMIT 64 OFFSET ?",
-    "SELECT 1 FROM key WHERE parent = ? LIMIT 1",
-    "SELECT parent, fold FROM key WHERE id = ?",
-    "DELETE FROM key WHERE id = ?",
-    "DELETE FROM value WHERE key = ?",
-    "SELECT type, data FROM value WHERE key = ? AND fold = ?",
-    "SELECT coalesce(max(place), 0) FROM value WHERE key = ?",
-    "INSERT INTO value (key, fold, name, type, data, place) VALUES (?, ?, ?, ?, ?, ?)"
-        " ON CONFLICT (key, fold) DO UPDATE SET type = excluded.type, data = excluded.data",
-    "DELETE FROM value WHERE key = ? AND fold = ?",
-    "DELETE FROM value WHERE key = ? AND fold = ? RETURNING place",
-    "SELECT place, name, type, data FROM value WHERE key = ? AND place >= ? ORDER BY place LIMIT 1 OFFSET ?",
-    "SELECT place, name, type FROM value WHERE key = ? AND place >= ? ORDER BY place LIMIT 64 OFFSET ?",
-};
+// Each statement by its name.
+#define KZ7_STATEMENTS(SQL) \
+    SQL(findKey,           "SELECT id FROM key WHERE parent = ? AND fold = ?") \
+    SQL(addKey,            "INSERT INTO key (parent, fold, name, class) VALUES (?, ?, ?, ?)") \
+    SQL(keyExists,         "SELECT 1 FROM key WHERE id = ?") \
+    SQL(nextKeys,          "SELECT id, fold, name, class FROM key WHERE parent = ? AND fold >= ? ORDER BY fold LIMIT 64 OFFSET ?") \
+    SQL(hasSubkey,         "SELECT 1 FROM key WHERE parent = ? LIMIT 1") \
+    SQL(keyAbove,          "SELECT parent, fold FROM key WHERE id = ?") \
+    SQL(deleteKey,         "DELETE FROM key WHERE id = ?") \
+    SQL(deleteValues,      "DELETE FROM value WHERE key = ?") \
+    SQL(getValue,          "SELECT type, data FROM value WHERE key = ? AND fold = ?") \
+    SQL(highestPlace,      "SELECT coalesce(max(place), 0) FROM value WHERE key = ?") \
+    SQL(setValue,          "INSERT INTO value (key, fold, name, type, data, place) VALUES (?, ?, ?, ?, ?, ?)" \
+                           " ON CONFLICT (key, fold) DO UPDATE SET type = excluded.type, data = excluded.data") \
+    SQL(deleteValue,       "DELETE FROM value WHERE key = ? AND fold = ?") \
+    SQL(deletePlacedValue, "DELETE FROM value WHERE key = ? AND fold = ? RETURNING place") \
+    SQL(nextValue,         "SELECT place, name, type, data FROM value WHERE key = ? AND place >= ? ORDER BY place LIMIT 1 OFFSET ?") \
+    SQL(nextValueNames,    "SELECT place, name, type FROM value WHERE key = ? AND place >= ? ORDER BY place LIMIT 64 OFFSET ?")
+
+#define KZ7_TEXT(name, text) text,
+#define KZ7_NAME(name, text) name,
+constexpr std::array kSql = {KZ7_STATEMENTS(KZ7_TEXT)};
 // clang-format on
 
 std::string userName() {
@@ -45,23 +49,9 @@ std::string userName() {
 
 }  // namespace
 
-enum class EmbeddedRegistry::Sql : std::size_t {
-    findKey,
-    addKey,
-    keyExists,
-    nextKeys,
-    hasSubkey,
-    keyAbove,
-    deleteKey,
-    deleteValues,
-    getValue,
-    highestPlace,
-    setValue,
-    deleteValue,
-    deletePlacedValue,
-    nextValue,
-    nextValueNames,
-};
+// clang-format off
+enum class EmbeddedRegistry::Sql : std::size_t { KZ7_STATEMENTS(KZ7_NAME) };
+// clang-format on
 
 EmbeddedRegistry::EmbeddedRegistry(const std::string& directory, bool readOnly, FaultListener listener)
     : file_(directory), readOnly_(readOnly), listener_(std::move(listener)) {
@@ -566,18 +556,21 @@ Status EmbeddedRegistry::deleteValue(KeyHandle key, std::string_view name) {
     if (result != SQLITE_ROW) {
         return result == SQLITE_DONE ? kFileNotFound : fail(result);
     }
-    const std::int64_t place = remove.number(0);
-    for (OpenKey& other : open_) {
-        if (!isEnumerated(other)) {
+    valueDeleted(open->id, remove.number(0));
+    return kSuccess;
+}
+
+void EmbeddedRegistry::valueDeleted(KeyId key, std::int64_t place) {
+    for (OpenKey& open : open_) {
+        if (!open.used || open.id != key || open.values.place == 0) {
             continue;
         }
-        if (place < other.values.place) {
-            --other.values.index;
+        if (place < open.values.place) {
+            --open.values.index;
         } else {
-            other.values.ahead.clear();
+            open.values.ahead.clear();
         }
     }
-    return kSuccess;
 }
 
 Status EmbeddedRegistry::readAhead(const OpenKey& open, std::uint32_t skip, std::vector<Subkey>& rows) {
@@ -635,50 +628,57 @@ Status EmbeddedRegistry::enumerateKey(KeyHandle key, std::uint32_t index, Buffer
     return named != kSuccess ? named : classed;
 }
 
+Status EmbeddedRegistry::enumerateValueName(OpenKey& open, std::uint32_t index, Buffer& name, ValueType* type) {
+    ValuePlace& values = open.values;
+    const std::uint32_t skip = index - values.index;
+    if (values.next + skip < values.ahead.size()) {
+        values.next += skip;
+    } else {
+        std::vector<ValueName> rows;
+        if (const Status status = readAhead(open, skip, rows); status != kSuccess || rows.empty()) {
+            return status != kSuccess ? status : kNoMoreItems;
+        }
+        values.ahead = std::move(rows);
+        values.next = 0;
+    }
+    const ValueName& found = values.ahead[values.next];
+    values.index = index;
+    values.place = found.place;
+    const Status named = giveName(found.name, name);
+    if (named == kSuccess && type != nullptr) {
+        *type = found.type;
+    }
+    return named;
+}
+
+Status EmbeddedRegistry::enumerateWholeValue(OpenKey& open, std::uint32_t index, Buffer& name, ValueType* type,
+                                             Buffer& data) {
+    Query next = query(Sql::nextValue);
+    const int result = next.bind(open.id).bind(open.values.place).bind(index - open.values.index).step();
+    if (result != SQLITE_ROW) {
+        return result == SQLITE_DONE ? kNoMoreItems : fail(result);
+    }
+    open.values = {index, next.number(0), {}, 0};
+    const Status named = giveName(next.bytes(1), name);
+    const auto found = static_cast<ValueType>(next.number(2));
+    const Status given = giveData(found, next.bytes(3), data);
+    if (named == kSuccess && given == kSuccess && type != nullptr) {
+        *type = found;
+    }
+    return named != kSuccess ? named : given;
+}
+
 Status EmbeddedRegistry::enumerateValue(KeyHandle key, std::uint32_t index, Buffer& name, ValueType* type,
                                         Buffer* data) {
     OpenKey* open = nullptr;
     if (const Status status = keyOf(key, kKeyQueryValue, open); status != kSuccess) {
         return status;
     }
-    ValuePlace& values = open->values;
-    if (index < values.index) {
-        values = {};
+    if (index < open->values.index) {
+        open->values = {};
     }
-    const std::uint32_t skip = index - values.index;
-    if (data == nullptr) {
-        if (values.next + skip < values.ahead.size()) {
-            values.next += skip;
-        } else {
-            std::vector<ValueName> rows;
-            if (const Status status = readAhead(*open, skip, rows); status != kSuccess || rows.empty()) {
-                return status != kSuccess ? status : kNoMoreItems;
-            }
-            values.ahead = std::move(rows);
-            values.next = 0;
-        }
-        const ValueName& found = values.ahead[values.next];
-        values.index = index;
-        values.place = found.place;
-        const Status named = giveName(found.name, name);
-        if (named == kSuccess && type != nullptr) {
-            *type = found.type;
-        }
-        return named;
-    }
-    Query next = query(Sql::nextValue);
-    const int result = next.bind(open->id).bind(values.place).bind(skip).step();
-    if (result != SQLITE_ROW) {
-        return result == SQLITE_DONE ? kNoMoreItems : fail(result);
-    }
-    values = {index, next.number(0), {}, 0};
-    const Status named = giveName(next.bytes(1), name);
-    const auto found = static_cast<ValueType>(next.number(2));
-    const Status given = giveData(found, next.bytes(3), *data);
-    if (named == kSuccess && given == kSuccess && type != nullptr) {
-        *type = found;
-    }
-    return named != kSuccess ? named : given;
+    return data == nullptr ? enumerateValueName(*open, index, name, type)
+                           : enumerateWholeValue(*open, index, name, type, *data);
 }
 
 Status EmbeddedRegistry::deleteKey(KeyHandle parent, std::string_view path, AccessMask view) {

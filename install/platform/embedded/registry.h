@@ -133,6 +133,11 @@ private:
     void remember(KeyId parent, std::string_view fold, KeyId id);
     Status readAhead(const OpenKey& open, std::uint32_t skip, std::vector<Subkey>& rows);
     Status readAhead(const OpenKey& open, std::uint32_t skip, std::vector<ValueName>& rows);
+    // Only names and types are read ahead: data would be copied for callers that stop early.
+    Status enumerateValueName(OpenKey& open, std::uint32_t index, Buffer& name, ValueType* type);
+    Status enumerateWholeValue(OpenKey& open, std::uint32_t index, Buffer& name, ValueType* type, Buffer& data);
+    // Corrects the enumerations of that key.
+    void valueDeleted(KeyId key, std::int64_t place);
     Status checkBelow(KeyId id);
     void subkeyAdded(KeyId parent, std::string_view fold);
     void subkeyDeleted(const Found& gone);

@@ -177,15 +177,7 @@ public:
         }
         OwnedFile file(*this);
         file.receive() = FileHandle{reinterpret_cast<std::uintptr_t>(opened)};
-        Status status = kSuccess;
-        while (status == kSuccess && !content.empty()) {
-            std::uint32_t written = 0;
-            status = write(file.get(), content.substr(0, kWritePiece), written);
-            content.remove_prefix(written);
-        }
-        if (status == kSuccess && FlushFileBuffers(opened) == FALSE) {
-            status = GetLastError();
-        }
+        Status status = writeAll(file.get(), content);
         file.reset();
         const DWORD how = MOVEFILE_WRITE_THROUGH | (replace ? DWORD{MOVEFILE_REPLACE_EXISTING} : 0);
         if (status == kSuccess && MoveFileExW(WideText(unfinished).c_str(), WideText(target).c_str(), how) == FALSE) {
@@ -232,6 +224,18 @@ public:
     }
 
     std::string shownPath(std::string_view path) override { return std::string(path); }
+
+private:
+    Status writeAll(FileHandle file, std::string_view content) {
+        while (!content.empty()) {
+            std::uint32_t written = 0;
+            if (const Status status = write(file, content.substr(0, kWritePiece), written); status != kSuccess) {
+                return status;
+            }
+            content.remove_prefix(written);
+        }
+        return FlushFileBuffers(native(file)) != FALSE ? kSuccess : GetLastError();
+    }
 };
 
 }  // namespace
