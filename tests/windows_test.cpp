@@ -8,8 +8,8 @@
 #include <filesystem>
 #include <thread>
 
-#include "install/admin/key_walk.h"
 #include "install/platform/intercept/ports.h"
+#include "install/src/registry/key_walk.h"
 #include "install/src/registry/registry_access.h"
 #include "install/src/services/management_service.h"
 #include "tests/support/backends.h"

@@ -14,11 +14,12 @@ constexpr std::size_t kPage = 1 << 16;  // bytes that are shown at once
 
 }  // namespace
 
-bool Admin::open(bool readOnly) {
+bool Admin::open(bool readOnly, bool missingIsEmpty) {
     readOnly_ = readOnly;
     platform_ = hostPlatform({.program = std::string(kProgram),
                               .stateDirectory = storeDirectory,
                               .readOnly = readOnly,
+                              .missingIsEmpty = missingIsEmpty,
                               .plainStreams = true});
     if (!storeDirectory.empty() && !platform_->storeIsOwn()) {
         fault("cannot open store: --store: the store of this machine is its registry");

@@ -8,17 +8,18 @@
 #include <string_view>
 #include <vector>
 
-#include "install/admin/key_walk.h"
 #include "install/platform/platform.h"
 #include "install/platform/shown_text.h"
+#include "install/src/registry/key_walk.h"
 
 namespace kz7 {
 
 // The exit status of a subcommand.
 enum Answer : int {
     kAnswerYes = 0,
-    kAnswerNo = 1,     // the result is empty, or a part of the work failed
-    kAnswerFault = 2,  // an unusable store, file or command line
+    kAnswerNo = 1,       // the result is empty, or a part of the work failed
+    kAnswerFault = 2,    // an unusable store, file or command line
+    kAnswerChanged = 3,  // done, and something changed; with --detailed-exitcode only
 };
 
 class Admin {
@@ -27,8 +28,8 @@ public:
     std::function<Answer()> answer;  // runs the chosen subcommand
 
     // Opens the ports, once. False, with a message: a store directory was given, and this machine's store is its
-    // registry.
-    bool open(bool readOnly);
+    // registry. `missingIsEmpty`: see PlatformOptions.
+    bool open(bool readOnly, bool missingIsEmpty = false);
 
     // Only after open().
     IPlatform& platform() { return *platform_; }

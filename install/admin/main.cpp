@@ -4,14 +4,7 @@
 #include <new>
 #include <sstream>
 
-#include "install/admin/commands/aliases_command.h"
-#include "install/admin/commands/backup_command.h"
-#include "install/admin/commands/commit_command.h"
-#include "install/admin/commands/copies_command.h"
-#include "install/admin/commands/export_command.h"
-#include "install/admin/commands/front_command.h"
-#include "install/admin/commands/import_command.h"
-#include "install/admin/commands/tree_command.h"
+#include "install/admin/commands/commands.h"
 #include "install/admin/given_name.h"
 #include "install/platform/console.h"
 #include "install/platform/encoding.h"
@@ -24,7 +17,8 @@ constexpr const char* kFooter =
     "The usual state directory is $KZ7_STATE_DIR; else /var/lib/kz7 for root; else $XDG_STATE_HOME/kz7 or\n"
     "~/.local/state/kz7. On Windows the store is the registry of the machine.\n"
     "\n"
-    "Exit codes: 0 done; 1 no: not there, nothing to show, or something was not set; 2 fault: a store, file, key or\n"
+    "Exit codes: 0 done; 1 no: not there, nothing to show, different, or something failed; 2 fault: a store, file, key "
+    "or\n"
     "output that cannot be used, or a wrong command line. front exits as its program does.\n";
 
 // What help prints is output like any other.
@@ -50,9 +44,11 @@ int run(int argc, char** argv) {
     program.require_subcommand(0, 1);
     program.fallthrough();
     addAliasesCommand(program, admin);
+    addApplyCommand(program, admin);
     addBackupCommand(program, admin);
     addCommitCommand(program, admin);
     addCopiesCommand(program, admin);
+    addDiffCommand(program, admin);
     addExportCommand(program, admin);
     addFrontCommand(program, admin);
     addImportCommand(program, admin);

@@ -5,7 +5,6 @@
 namespace kz7 {
 namespace {
 
-constexpr std::string_view kRecordsKey = "SOFTWARE\\Classes\\Installer\\Assemblies\\Global";
 constexpr std::uint32_t kRecordNameRoom = 1024;  // a file name of 255 bytes and a level of 255 fit
 
 // What a record's name says between its file and the number of its generation.
@@ -28,7 +27,7 @@ Status recordProviders(IRegistryStore& registry, std::string_view location, std:
         return kSuccess;
     }
     OwnedKey key(registry);
-    Status status = registry.createKey(KeyHandle::localMachine, kRecordsKey, {}, kKeyFull, key.receive());
+    Status status = registry.createKey(KeyHandle::localMachine, kAssemblyRecords, {}, kKeyFull, key.receive());
     if (!succeeded(status)) {
         return status;
     }
@@ -53,7 +52,7 @@ Status dropProviders(IRegistryStore& registry, std::string_view level) {
         return kSuccess;
     }
     OwnedKey key(registry);
-    Status status = registry.openKey(KeyHandle::localMachine, kRecordsKey, kKeyFull, key.receive());
+    Status status = registry.openKey(KeyHandle::localMachine, kAssemblyRecords, kKeyFull, key.receive());
     if (!succeeded(status)) {
         return isNotFound(status) ? kSuccess : status;
     }

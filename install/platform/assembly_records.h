@@ -11,6 +11,9 @@
 
 namespace kz7 {
 
+// The key of the records, below HKEY_LOCAL_MACHINE.
+inline constexpr std::string_view kAssemblyRecords = "SOFTWARE\\Classes\\Installer\\Assemblies\\Global";
+
 // Whether a file of a bin folder is a data provider.
 bool isProviderFile(std::string_view file);
 

@@ -21,7 +21,9 @@ namespace kz7 {
 struct PlatformOptions {
     std::string program;              // begins the lines that the platform itself writes on standard error
     std::string stateDirectory = {};  // where an embedded store lives; empty: this user's usual place
+    std::string backup = {};          // a copy of an embedded store that is read instead of a store
     bool readOnly = false;            // reads what is there, takes no writer's lock, creates nothing
+    bool missingIsEmpty = false;      // with readOnly: a state directory that does not exist reads as empty
     bool plainStreams = false;        // standard input and output carry bytes, their line ends stay as they are
     bool ownProcess = true;           // false: a library in somebody else's, which leaves the process as it is
 };
@@ -46,6 +48,7 @@ class IPlatform {
 public:
     virtual ~IPlatform() = default;
 
+    const Ports& ports() const { return ports_; }
     IRegistryStore& registry() { return *ports_.registry; }
     IServiceManager& services() { return *ports_.services; }
     IConsole& console() { return *ports_.console; }
@@ -73,6 +76,9 @@ public:
 
     // Whether a fault of the store was reported on standard error, so that its status needs no further line.
     virtual bool storeFaultTold() { return false; }
+
+    // The assembly cache of this machine as it would act on another registry, without a change to the machine.
+    virtual std::unique_ptr<IAssemblyCache> assembliesOn(IRegistryStore& registry) = 0;
 
     // The content of a file that holds the whole store as it is at one moment, also while others write.
     // kFileNotFound: no store exists. kCallNotImplemented: the store is not the programs' own.

@@ -76,6 +76,9 @@ public:
     // Sets the start type and leaves everything else of the service unchanged.
     virtual Status changeStartType(ServiceHandle service, ServiceStart start) = 0;
 
+    // Sets everything that a definition holds but the name.
+    virtual Status configureService(ServiceHandle service, const ServiceDefinition& definition) = 0;
+
     // Starts without arguments. kServiceAlreadyRunning; kFileNotFound when the program is missing.
     virtual Status startService(ServiceHandle service) = 0;
 

@@ -122,6 +122,12 @@ Status ServiceRecords::createService(ServiceHandle manager, const ServiceDefinit
     return status;
 }
 
+Status ServiceRecords::configureService(ServiceHandle service, const ServiceDefinition& definition) {
+    OwnedKey record(registry_);
+    const Status status = recordOf(service, kServiceChangeConfig, record);
+    return status == kSuccess ? writeRecord(registry_, record.get(), definition) : status;
+}
+
 Status ServiceRecords::openService(ServiceHandle manager, std::string_view name, std::uint32_t access,
                                    ServiceHandle& service) {
     if (const Status status = managerOf(manager); status != kSuccess) {

@@ -21,6 +21,7 @@ public:
     Status openService(ServiceHandle manager, std::string_view name, std::uint32_t access,
                        ServiceHandle& service) override;
     Status changeStartType(ServiceHandle service, ServiceStart start) override;
+    Status configureService(ServiceHandle service, const ServiceDefinition& definition) override;
     Status startService(ServiceHandle service) override;
     Status stopService(ServiceHandle service) override;
     Status waitForStop(ServiceHandle service, std::uint32_t milliseconds) override;

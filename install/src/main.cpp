@@ -8,7 +8,7 @@
 int kz7::programMain(int argc, char** argv) {
     try {
         const auto platform = hostPlatform({.program = "kz7InstallReg"});
-        const Status status = runTool(*platform, {argv, static_cast<std::size_t>(argc)});
+        const Status status = runTool(platform->ports(), {argv, static_cast<std::size_t>(argc)});
         // The exit code stays that of the flow. A reader that is gone, as in "| head -1", chose to miss the rest.
         const Status written = platform->console().flush();
         if (!succeeded(written) && written != kPipeClosing) {

@@ -1,7 +1,9 @@
 #include "install/src/uselvlkz7reg.h"
 
+#include <algorithm>
+#include <array>
+
 #include "install/src/add_copy.h"
-#include "install/src/registry/report.h"
 #include "install/src/remove_copy.h"
 #include "install/src/services/provider_registration.h"
 #include "install/src/version8.h"
@@ -25,46 +27,68 @@ constexpr std::string_view kUsage =
     " -addKZ7Copy.  This cannot be used to remove a copy installed with the KZ7 Setup Wizard\n"
     " \n";
 
+enum class Option { version9, version8, providers, remove, add, addVersion9 };
+
+struct OptionRow {
+    std::string_view word;
+    std::size_t arguments;  // after it
+    Option option;
+};
+
+// clang-format off
+constexpr std::array kOptions = {
+    OptionRow{"-v9",            1, Option::version9},
+    OptionRow{"-v8",            1, Option::version8},
+    OptionRow{"-dotnet",        1, Option::providers},
+    OptionRow{"-removeKZ7Copy", 1, Option::remove},
+    OptionRow{"-addKZ7Copy",    2, Option::add},
+    OptionRow{"-addv9",         2, Option::addVersion9},
+};
+// clang-format on
+
+// Null: the arguments, which begin with the program's name, are none of the options.
+const OptionRow* findOption(std::span<const char* const> arguments) {
+    const auto* const row = std::find_if(kOptions.begin(), kOptions.end(), [&](const OptionRow& option) {
+        return arguments.size() == option.arguments + 2 && equalsIgnoreCase(arguments[1], option.word);
+    });
+    return row == kOptions.end() ? nullptr : row;
+}
+
 class Tool {
 public:
-    explicit Tool(IPlatform& platform) : platform_(platform), report_(platform.console()) {}
+    Tool(const Ports& ports, std::vector<ErrorLine>* errors) : ports_(ports), report_(*ports.console, errors) {}
 
     Status run(std::span<const char* const> arguments) {
-        if (arguments.size() == 3) {
-            const std::string_view option = arguments[1];
-            if (equalsIgnoreCase(option, "-v9")) {
+        const OptionRow* const row = findOption(arguments);
+        if (row == nullptr) {
+            // Deliberate: the usage names the two copy options only; the others are the installer's.
+            report_.line(kUsage);
+            return kInvalidParameter;
+        }
+        const char* const first = arguments[2];
+        switch (row->option) {
+            case Option::version9:
                 return migrateToVersion9(
-                    platform_.registry(), platform_.services(), report_,
+                    *ports_.registry, *ports_.services, report_,
                     [this](std::string_view location) { return level(location); },
-                    [this](std::string_view location) { return registerProvidersOf(location); }, arguments[2]);
-            }
-            if (equalsIgnoreCase(option, "-v8")) {
-                return restoreVersion8(platform_.registry(), platform_.services(), platform_.console(), arguments[2]);
-            }
-            if (equalsIgnoreCase(option, "-dotnet")) {
-                return registerProvidersOf(arguments[2]);
-            }
-            if (equalsIgnoreCase(option, "-removeKZ7Copy")) {
-                return removeCopy(platform_.registry(), platform_.services(), platform_.debugOutput(), report_,
-                                  arguments[2]);
-            }
+                    [this](std::string_view location) { return registerProvidersOf(location); }, first);
+            case Option::version8:
+                return restoreVersion8(*ports_.registry, *ports_.services, report_, first);
+            case Option::providers:
+                return registerProvidersOf(first);
+            case Option::remove:
+                return removeCopy(*ports_.registry, *ports_.services, *ports_.debugOutput, report_, first);
+            case Option::add:
+            case Option::addVersion9:
+                break;
         }
-        if (arguments.size() == 4) {
-            const std::string_view option = arguments[1];
-            const bool withProviders = equalsIgnoreCase(option, "-addv9");
-            if (withProviders || equalsIgnoreCase(option, "-addKZ7Copy")) {
-                return add({arguments[2], arguments[3]}, withProviders);
-            }
-        }
-        // Deliberate: the usage names the two copy options only; the others are the installer's.
-        report_.line(kUsage);
-        return kInvalidParameter;
+        return add({first, arguments[3]}, row->option == Option::addVersion9);
     }
 
 private:
     Status add(const CopyRequest& request, bool withProviders) {
-        const Status added = addCopy(platform_.registry(), platform_.services(), report_, {}, request);
-        if (const Status committed = platform_.registry().commit(); !succeeded(committed)) {
+        const Status added = addCopy(*ports_.registry, *ports_.services, report_, {}, request);
+        if (const Status committed = ports_.registry->commit(); !succeeded(committed)) {
             return committed;
         }
         if (succeeded(added)) {
@@ -77,25 +101,28 @@ private:
 
     std::string level(std::string_view location) {
         std::string text;
-        queryLevel(platform_.libraries(), report_, location, text);
+        queryLevel(*ports_.libraries, report_, location, text);
         return text;
     }
 
     Status registerProvidersOf(std::string_view location) {
-        return registerProviders(
-            {platform_.registry(), platform_.libraries(), platform_.assemblies(), platform_.files(),
-             platform_.processes(), platform_.threads(), platform_.console(), platform_.debugOutput()},
-            location);
+        return registerProviders({*ports_.registry, *ports_.libraries, *ports_.assemblies, *ports_.files,
+                                  *ports_.processes, *ports_.threads, *ports_.debugOutput, report_},
+                                 location);
     }
 
-    IPlatform& platform_;
+    const Ports& ports_;
     Report report_;
 };
 
 }  // namespace
 
-Status runTool(IPlatform& platform, std::span<const char* const> arguments) {
-    return Tool(platform).run(arguments);
+bool isToolCommand(std::span<const char* const> arguments) {
+    return findOption(arguments) != nullptr;
+}
+
+Status runTool(const Ports& ports, std::span<const char* const> arguments, std::vector<ErrorLine>* errors) {
+    return Tool(ports, errors).run(arguments);
 }
 
 }  // namespace kz7

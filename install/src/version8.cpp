@@ -14,8 +14,8 @@ namespace {
 
 // clang-format off
 constexpr ErrorText kDefaultsFailed  {1241, "An error occurred while creating default version 8 registry keys\n"};
-constexpr ErrorText kRestoreFailed   {1466, "Failed to copy copy %s to %s\n"};
-constexpr ErrorText kStartEmpty      {1467, "Create empty version 8 registry\n"};
+constexpr ErrorText kRestoreFailed   {1466, "Failed to copy copy %s to %s\n", kAlways};
+constexpr ErrorText kStartEmpty      {1467, "Create empty version 8 registry\n", kAlways};
 constexpr ErrorText kLocationFailed  {1486, "Failed to create basic registry keys or update location of the version 8 sqllib\n"};
 
 constexpr std::string_view kBegin        = "Creating version 8 registry\n";
@@ -63,16 +63,14 @@ Status writeDefaults(IRegistryStore& registry, Report& report, std::string_view 
 
 }  // namespace
 
-Status restoreVersion8(IRegistryStore& registry, IServiceManager& services, IConsole& console,
-                       std::string_view location) {
-    Report report(console);
+Status restoreVersion8(IRegistryStore& registry, IServiceManager& services, Report& report, std::string_view location) {
     report.line(kBegin);
     restoreBackup(registry, report);
     const Status status = writeDefaults(registry, report, location);
 
     // The success line comes before those of the service, and none of them may be printed before the commit.
     HeldConsole held;
-    Report closing(held);
+    Report closing(report, held);
     if (succeeded(status)) {
         closing.line(kDefaultsSet);
     } else {
@@ -83,7 +81,7 @@ Status restoreVersion8(IRegistryStore& registry, IServiceManager& services, ICon
     if (const Status committed = registry.commit(); !succeeded(committed)) {
         return committed;
     }
-    held.release(console);
+    held.release(report.console());
     return status;
 }
 

@@ -4,15 +4,14 @@
 
 #include <string_view>
 
-#include "install/platform/console.h"
 #include "install/platform/registry_store.h"
 #include "install/platform/service_manager.h"
+#include "install/src/registry/report.h"
 
 namespace kz7 {
 
 // `location` is the version-8 product directory. Returns the status of the last default written, or that of a
 // store that could not keep the changes.
-Status restoreVersion8(IRegistryStore& registry, IServiceManager& services, IConsole& console,
-                       std::string_view location);
+Status restoreVersion8(IRegistryStore& registry, IServiceManager& services, Report& report, std::string_view location);
 
 }  // namespace kz7

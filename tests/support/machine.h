@@ -37,7 +37,7 @@ public:
         for (const std::string& argument : arguments) {
             all.push_back(argument.c_str());
         }
-        return runTool(*this, all);
+        return runTool(ports_, all);
     }
     // The same, as "output|errors|status".
     std::string told(const std::vector<std::string>& arguments) {

@@ -1,10 +1,9 @@
-#include "install/admin/commands/aliases_command.h"
-
 #include <CLI/CLI.hpp>
 #include <array>
 #include <map>
 #include <optional>
 
+#include "install/admin/commands/commands.h"
 #include "install/admin/formats/text_table.h"
 #include "install/platform/text.h"
 #include "install/src/copies/install_copies_profile.h"

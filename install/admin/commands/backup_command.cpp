@@ -1,8 +1,7 @@
-#include "install/admin/commands/backup_command.h"
-
 #include <CLI/CLI.hpp>
 #include <memory>
 
+#include "install/admin/commands/commands.h"
 #include "install/admin/formats/reg_text.h"
 #include "install/admin/given_name.h"
 #include "install/platform/text.h"

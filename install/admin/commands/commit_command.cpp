@@ -1,9 +1,8 @@
-#include "install/admin/commands/commit_command.h"
-
 #include <CLI/CLI.hpp>
 #include <algorithm>
 #include <cstdlib>
 
+#include "install/admin/commands/commands.h"
 #include "install/admin/configuration_run.h"
 #include "install/admin/copy_location.h"
 #include "install/admin/given_name.h"

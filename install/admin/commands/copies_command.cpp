@@ -1,10 +1,9 @@
-#include "install/admin/commands/copies_command.h"
-
 #include <CLI/CLI.hpp>
 #include <array>
 #include <map>
 #include <optional>
 
+#include "install/admin/commands/commands.h"
 #include "install/admin/copy_location.h"
 #include "install/admin/formats/json_text.h"
 #include "install/admin/formats/text_table.h"

@@ -1,7 +1,6 @@
-#include "install/admin/commands/export_command.h"
-
 #include <CLI/CLI.hpp>
 
+#include "install/admin/commands/commands.h"
 #include "install/admin/formats/json_text.h"
 #include "install/admin/formats/reg_text.h"
 #include "install/admin/formats/value_type.h"
@@ -19,18 +18,8 @@ struct ExportOptions {
 void appendJsonValue(const KeyValue& value, std::string& json) {
     json += "{\"name\":";
     appendJsonText(value.name, json);
-    json += ",\"type\":" + std::to_string(static_cast<std::uint32_t>(value.type)) + ",\"bytes\":\"";
-    for (const char c : value.data) {
-        appendHex(static_cast<unsigned char>(c), 2, json);
-    }
-    json += '"';
-    std::uint64_t number = 0;
-    if (value.type == ValueType::sz || value.type == ValueType::expandSz) {
-        json += ",\"text\":";
-        appendJsonText(std::string_view(value.data).substr(0, value.data.find('\0')), json);
-    } else if (numberOf(value.type, value.data, number)) {
-        json += ",\"number\":" + std::to_string(number);
-    }
+    json += ',';
+    appendJsonData(value.type, value.data, json);
     json += '}';
 }
 
@@ -62,21 +51,6 @@ std::string shownLines(std::string_view text) {
     return shown;
 }
 
-Answer exportJson(Admin& admin, const std::string& key) {
-    std::string head = "{\"store\":";
-    appendJsonText(admin.platform().storeName(), head);
-    std::string separator = "\n";
-    return admin.showKeys(
-        key, head + ",\"keys\":[",
-        [&](const KeyRecord& record, std::string& json) {
-            if (!isBareRoot(record) || record.status != kSuccess) {
-                json += std::exchange(separator, ",\n");
-                appendJsonKey(record, json);
-            }
-        },
-        "]}\n", Admin::Reading::snapshot);
-}
-
 Answer exportKeys(Admin& admin, const ExportOptions& options) {
     if (!admin.open(true)) {
         return kAnswerFault;
@@ -85,10 +59,21 @@ Answer exportKeys(Admin& admin, const ExportOptions& options) {
     if (isTerminal && options.utf16) {
         return admin.fault("cannot write UTF-16: standard output: is a terminal (redirect it to a file)");
     }
+    std::string separator = "\n";
     if (options.json) {
-        return exportJson(admin, options.key);
+        std::string head = "{\"store\":";
+        appendJsonText(admin.platform().storeName(), head);
+        return admin.showKeys(
+            options.key, head + ",\"keys\":[",
+            [&](const KeyRecord& key, std::string& json) {
+                if (!isBareRoot(key) || key.status != kSuccess) {
+                    json += std::exchange(separator, ",\n");
+                    appendJsonKey(key, json);
+                }
+            },
+            "]}\n", Admin::Reading::snapshot);
     }
-    const std::string head = regTextHeader();
+    std::string head = regTextHeader();
     return admin.showKeys(
         options.key, options.utf16 ? std::string(kUtf16Mark) + utf16FileText(head) : head,
         [&](const KeyRecord& key, std::string& text) {

@@ -1,8 +1,7 @@
-#include "install/admin/commands/front_command.h"
-
 #include <CLI/CLI.hpp>
 #include <memory>
 
+#include "install/admin/commands/commands.h"
 #include "install/admin/front/front.h"
 #include "install/platform/command_line.h"
 #include "install/platform/text.h"

@@ -1,7 +1,6 @@
-#include "install/admin/commands/import_command.h"
-
 #include <CLI/CLI.hpp>
 
+#include "install/admin/commands/commands.h"
 #include "install/admin/formats/reg_text.h"
 #include "install/admin/given_name.h"
 #include "install/admin/input_file.h"

@@ -1,7 +1,6 @@
-#include "install/admin/commands/tree_command.h"
-
 #include <CLI/CLI.hpp>
 
+#include "install/admin/commands/commands.h"
 #include "install/admin/formats/value_type.h"
 #include "install/platform/text.h"
 
@@ -9,47 +8,6 @@ namespace kz7 {
 namespace {
 
 constexpr std::string_view kIndent = "  ";
-
-std::string hexNumber(std::uint64_t number) {
-    char text[19];
-    std::snprintf(text, sizeof text, "0x%llx", static_cast<unsigned long long>(number));
-    return text;
-}
-
-// The NUL-terminated texts of the data in quotation marks; notes a missing terminator.
-std::string shownTexts(std::string_view data) {
-    std::string shown;
-    while (!data.empty()) {
-        const std::size_t end = data.find('\0');
-        shown += " \"" + shownText(data.substr(0, end)) + '"';
-        if (end == std::string_view::npos) {
-            return shown + " (no NUL terminator)";
-        }
-        data.remove_prefix(end + 1);
-    }
-    return shown;
-}
-
-std::string shownData(const KeyValue& value) {
-    std::uint64_t number = 0;
-    switch (value.type) {
-        case ValueType::sz:
-        case ValueType::expandSz:
-        case ValueType::multiSz:
-            return shownTexts(value.data);
-        default:
-            break;
-    }
-    if (numberOf(value.type, value.data, number)) {
-        return " " + std::to_string(number) + " (" + hexNumber(number) + ")";
-    }
-    std::string shown;
-    for (const char c : value.data) {
-        shown += ' ';
-        appendHex(static_cast<unsigned char>(c), 2, shown);
-    }
-    return shown;
-}
 
 void appendTreeKey(const KeyRecord& key, std::string& text) {
     std::string indent;
@@ -66,12 +24,9 @@ void appendTreeKey(const KeyRecord& key, std::string& text) {
     }
     text += '\n';
     for (const KeyValue& value : key.values) {
-        const std::string_view type = typeName(value.type);
         text.append(indent).append(kIndent);
         text += value.name.empty() ? "@" : '"' + shownText(value.name) + '"';
-        text += ' ';
-        text += type.empty() ? "type " + std::to_string(static_cast<std::uint32_t>(value.type)) : std::string(type);
-        text += shownData(value) + '\n';
+        text += ' ' + typeName(value.type) + shownData(value.type, value.data) + '\n';
     }
 }
 

@@ -101,6 +101,15 @@ void appendData(const KeyValue& value, std::string& text) {
     }
 }
 
+void appendValueName(std::string_view name, std::string& text) {
+    if (name.empty()) {
+        text += '@';
+    } else {
+        appendQuoted(nameText(name), text);
+    }
+    text += '=';
+}
+
 class Parser {
 public:
     Parser(std::vector<KeyChange>& changes, TextFault& fault) : changes_(changes), fault_(fault) {}
@@ -398,22 +407,34 @@ std::string regTextHeader() {
     return std::string(kHeader) + '\n';
 }
 
-void appendRegText(const KeyRecord& key, std::string& text) {
-    text.append("\n[").append(nameText(key.name)).append("]\n");
-    if (!key.keyClass.empty()) {
+void appendRegKey(std::string_view name, std::string_view keyClass, std::string& text) {
+    text.append("\n[").append(nameText(name)).append("]\n");
+    if (!keyClass.empty()) {
         text += kClassComment.substr(0, kClassComment.size() - 1);
-        appendQuoted(nameText(key.keyClass), text);
+        appendQuoted(nameText(keyClass), text);
         text += '\n';
     }
+}
+
+void appendRegValue(const KeyValue& value, std::string& text) {
+    appendValueName(value.name, text);
+    appendData(value, text);
+    text += '\n';
+}
+
+void appendRegKeyRemoval(std::string_view name, std::string& text) {
+    text.append("\n[-").append(nameText(name)).append("]\n");
+}
+
+void appendRegValueRemoval(std::string_view name, std::string& text) {
+    appendValueName(name, text);
+    text += "-\n";
+}
+
+void appendRegText(const KeyRecord& key, std::string& text) {
+    appendRegKey(key.name, key.keyClass, text);
     for (const KeyValue& value : key.values) {
-        if (value.name.empty()) {
-            text += '@';
-        } else {
-            appendQuoted(nameText(value.name), text);
-        }
-        text += '=';
-        appendData(value, text);
-        text += '\n';
+        appendRegValue(value, text);
     }
 }
 

@@ -10,13 +10,20 @@
 #include <string_view>
 #include <vector>
 
-#include "install/admin/key_changes.h"
-#include "install/admin/key_walk.h"
+#include "install/src/registry/key_changes.h"
+#include "install/src/registry/key_walk.h"
 
 namespace kz7 {
 
-// The first line of a file and the lines of a key: UTF-8 with LF.
+// The first line of a file and the lines of keys, values and their removals: UTF-8 with LF. Values belong to the key
+// before them.
 std::string regTextHeader();
+void appendRegKey(std::string_view name, std::string_view keyClass, std::string& text);
+void appendRegValue(const KeyValue& value, std::string& text);
+void appendRegKeyRemoval(std::string_view name, std::string& text);
+void appendRegValueRemoval(std::string_view name, std::string& text);
+
+// A key with its values.
 void appendRegText(const KeyRecord& key, std::string& text);
 
 // Converts such text to the form of Windows' own editor: UTF-16LE with CR LF. The caller writes the byte order mark.

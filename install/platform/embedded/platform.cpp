@@ -29,12 +29,15 @@ public:
         : program_(options.program),
           byDefault_(options.stateDirectory.empty() && std::getenv("KZ7_STATE_DIR") == nullptr),
           directory_(absolute(options.stateDirectory.empty() ? usualStateDirectory() : options.stateDirectory)),
-          registry_(directory_, options.readOnly, [this](const StoreFault& fault) {
-              if (!faultTold_) {
-                  console_->writeError(program_ + ": " + shownText(fault.file) + ": " + shownText(fault.reason) + "\n");
-              }
-              faultTold_ = true;
-          }) {
+          registry_(directory_, options.readOnly,
+                    [this](const StoreFault& fault) {
+                        if (!faultTold_) {
+                            console_->writeError(program_ + ": " + shownText(fault.file) + ": " +
+                                                 shownText(fault.reason) + "\n");
+                        }
+                        faultTold_ = true;
+                    },
+                    {options.backup, options.missingIsEmpty}) {
         ports_ = {&registry_,        &services_,       console_.get(), debugOutput_.get(),
                   files_.get(),      processes_.get(), threads_.get(), libraries_.get(),
                   assemblies_.get(), host_.get(),      terminal_.get()};
@@ -48,6 +51,9 @@ public:
     std::string storeName() override { return registry_.path(); }
     bool storeFaultTold() override { return faultTold_; }
 
+    std::unique_ptr<IAssemblyCache> assembliesOn(IRegistryStore& registry) override {
+        return embeddedAssemblies(registry, directory_);
+    }
     Status storeImage(std::string& image) override { return registry_.image(image); }
     bool isStoreFile(const std::string& path) override { return registry_.isFile(path); }
 

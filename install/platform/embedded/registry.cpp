@@ -53,8 +53,9 @@ std::string userName() {
 enum class EmbeddedRegistry::Sql : std::size_t { KZ7_STATEMENTS(KZ7_NAME) };
 // clang-format on
 
-EmbeddedRegistry::EmbeddedRegistry(const std::string& directory, bool readOnly, FaultListener listener)
-    : file_(directory), readOnly_(readOnly), listener_(std::move(listener)) {
+EmbeddedRegistry::EmbeddedRegistry(const std::string& directory, bool readOnly, FaultListener listener,
+                                   const StoreReading& reading)
+    : file_(directory, reading), readOnly_(readOnly), listener_(std::move(listener)) {
     static_assert(kSql.size() == std::tuple_size_v<decltype(statements_)>);
     for (const KeyId id : {kMachineId, kUsersId, kNoKey}) {
         OpenKey& root = open_.emplace_back();

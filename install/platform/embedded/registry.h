@@ -20,7 +20,7 @@ public:
 
     // Opens nothing yet. A read-only store takes no writer's lock and makes nothing: one that is not there
     // reads as empty.
-    EmbeddedRegistry(const std::string& directory, bool readOnly, FaultListener listener);
+    EmbeddedRegistry(const std::string& directory, bool readOnly, FaultListener listener, const StoreReading& reading = {});
     EmbeddedRegistry(const EmbeddedRegistry&) = delete;
     EmbeddedRegistry& operator=(const EmbeddedRegistry&) = delete;
 

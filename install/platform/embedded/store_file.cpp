@@ -84,7 +84,10 @@ bool isReadableFile(const std::string& path) {
 
 }  // namespace
 
-StoreFile::StoreFile(std::string directory) : directory_(std::move(directory)), path_(directory_ + '/' + kStoreName) {}
+StoreFile::StoreFile(std::string directory, const StoreReading& reading)
+    : directory_(std::move(directory)),
+      path_(reading.backup.empty() ? directory_ + '/' + kStoreName : reading.backup),
+      reading_(reading) {}
 
 bool StoreFile::exists() const {
     // Only a definite "not there" is one: a folder that may not be searched is an error of the open.
@@ -130,7 +133,14 @@ StoreFault StoreFile::openForWriting(Connection& connection) {
 }
 
 StoreFault StoreFile::openForReading(Connection& connection) {
+    if (!reading_.backup.empty()) {
+        return openCopy(connection);
+    }
     StoreFault fault = checkDirectory();
+    const bool isMissing = !directory_.empty() && access(directory_.c_str(), F_OK) != 0 && errno == ENOENT;
+    if (isMissing && reading_.missingIsEmpty) {
+        return openEmpty(connection);
+    }
     if (fault.status != kSuccess || !exists()) {
         return fault.status != kSuccess ? fault : openEmpty(connection);
     }

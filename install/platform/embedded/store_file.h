@@ -16,9 +16,15 @@ struct StoreFault {
     std::string reason;  // why, for people
 };
 
+// How a store is read.
+struct StoreReading {
+    std::string backup;           // a file that is read instead of the store
+    bool missingIsEmpty = false;  // a state directory that does not exist reads as empty
+};
+
 class StoreFile {
 public:
-    explicit StoreFile(std::string directory);
+    StoreFile(std::string directory, const StoreReading& reading);
 
     const std::string& path() const { return path_; }
     bool exists() const;
@@ -52,6 +58,7 @@ private:
 
     std::string directory_;
     std::string path_;
+    StoreReading reading_;
     OwnedDescriptor folder_;  // the state directory, where its path is too long for SQLite
 };
 

@@ -95,7 +95,8 @@ KZ7_INTERCEPTED(InterceptedRegistry, IRegistryStore, "registry",
     KZ7_4(openKey) KZ7_5(createKey) KZ7_1(closeKey) KZ7_4(queryValue) KZ7_4(setValue) KZ7_2(deleteValue)
     KZ7_4(enumerateKey) KZ7_5(enumerateValue) KZ7_3(deleteKey) KZ7_0(commit))
 KZ7_INTERCEPTED(InterceptedServices, IServiceManager, "services",
-    KZ7_2(openManager) KZ7_3(createService) KZ7_4(openService) KZ7_2(changeStartType) KZ7_1(startService)
+    KZ7_2(openManager) KZ7_3(createService) KZ7_4(openService) KZ7_2(changeStartType)
+    KZ7_2(configureService) KZ7_1(startService)
     KZ7_1(stopService) KZ7_2(waitForStop) KZ7_2(queryState) KZ7_1(deleteService) KZ7_1(closeHandle))
 KZ7_INTERCEPTED(InterceptedConsole, IConsole, "console",
     KZ7_1(writeOutput) KZ7_1(writeError) KZ7_1(writeDocument) KZ7_0(flush))

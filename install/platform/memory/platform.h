@@ -26,6 +26,10 @@ public:
     }
     std::string storeName() override { return "memory"; }
 
+    std::unique_ptr<IAssemblyCache> assembliesOn(IRegistryStore& registry) override {
+        return std::make_unique<MemoryAssemblyCache>(registry);
+    }
+
     MemoryRegistry registry_;
     MemoryFileSystem files_;
     ServiceRecords services_{registry_, files_};

@@ -175,6 +175,8 @@ void keepFirst(Status& first, Status status) {
 // registering fails.
 class WindowsAssemblyCache final : public IAssemblyCache {
 public:
+    explicit WindowsAssemblyCache(bool isPreview) : isPreview_(isPreview) {}
+
     Status deregisterProviders(std::string_view level) override {
         if (level.empty()) {
             return kSuccess;
@@ -190,7 +192,7 @@ public:
             std::vector<std::wstring> names;
             keepFirst(result, fusion.openCache(cache));
             keepFirst(result, listProviders(fusion, WideText(level).c_str(), names));
-            for (const std::wstring& name : names) {
+            for (const std::wstring& name : isPreview_ ? std::vector<std::wstring>{} : names) {
                 keepFirst(result, cache == nullptr ? kSuccess : uninstall(*cache, name));
             }
         }
@@ -214,18 +216,21 @@ public:
                 keepFirst(result, opened);
                 continue;
             }
-            for (const std::wstring& file : files) {
+            for (const std::wstring& file : isPreview_ ? std::vector<std::wstring>{} : files) {
                 keepFirst(result, statusOf(cache->InstallAssembly(0, file.c_str(), nullptr)));
             }
         }
         return result;
     }
+
+private:
+    bool isPreview_;
 };
 
 }  // namespace
 
-std::unique_ptr<IAssemblyCache> windowsAssemblies() {
-    return std::make_unique<WindowsAssemblyCache>();
+std::unique_ptr<IAssemblyCache> windowsAssemblies(bool isPreview) {
+    return std::make_unique<WindowsAssemblyCache>(isPreview);
 }
 
 }  // namespace kz7

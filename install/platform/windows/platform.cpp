@@ -38,6 +38,7 @@ public:
     }
     std::string storeName() override { return "the registry of this machine"; }
     bool storeIsOwn() override { return false; }
+    std::unique_ptr<IAssemblyCache> assembliesOn(IRegistryStore&) override { return windowsAssemblies(true); }
     bool storeFaultTold() override { return faultTold_; }
 
 private:
@@ -60,7 +61,7 @@ private:
     std::unique_ptr<IProcessHost> processes_ = windowsProcesses();
     std::unique_ptr<IThreads> threads_ = windowsThreads();
     std::unique_ptr<ILibraryLoader> libraries_ = windowsLibraries();
-    std::unique_ptr<IAssemblyCache> assemblies_ = windowsAssemblies();
+    std::unique_ptr<IAssemblyCache> assemblies_ = windowsAssemblies(false);
     std::unique_ptr<IHostInformation> host_ = windowsHost();
     std::unique_ptr<ITerminal> terminal_ = windowsTerminal();
 };

@@ -17,7 +17,10 @@ std::unique_ptr<IFileSystem> windowsFiles();
 std::unique_ptr<IProcessHost> windowsProcesses();
 std::unique_ptr<IThreads> windowsThreads();
 std::unique_ptr<ILibraryLoader> windowsLibraries();
-std::unique_ptr<IAssemblyCache> windowsAssemblies();
+
+// `isPreview`: opens the caches and leaves them as they are.
+std::unique_ptr<IAssemblyCache> windowsAssemblies(bool isPreview);
+
 std::unique_ptr<IHostInformation> windowsHost();
 std::unique_ptr<ITerminal> windowsTerminal();
 

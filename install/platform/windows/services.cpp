@@ -73,6 +73,14 @@ public:
                                          nullptr));
     }
 
+    Status configureService(ServiceHandle service, const ServiceDefinition& definition) override {
+        const WideText displayName(definition.displayName);
+        const WideText program(definition.programPath);
+        return done(ChangeServiceConfigW(native(service), definition.type, static_cast<DWORD>(definition.start),
+                                         definition.errorControl, program.c_str(), nullptr, nullptr, nullptr, nullptr,
+                                         nullptr, displayName.c_str()));
+    }
+
     Status startService(ServiceHandle service) override { return done(StartServiceW(native(service), 0, nullptr)); }
 
     Status stopService(ServiceHandle service) override {

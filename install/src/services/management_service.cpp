@@ -9,10 +9,10 @@ constexpr std::uint32_t kServiceWait = 30'000;  // milliseconds that one which e
 
 // clang-format off
 constexpr ErrorText kServiceManagerFailed  {1510, "Failed open the SCM - error code %d\n"};
-constexpr ErrorText kServiceOpenFailed     {1523, "Failed open the Service %s - error code %d\n"};
+constexpr ErrorText kServiceOpenFailed     {1523, "Failed open the Service %s - error code %d\n", kServiceDoesNotExist};
 constexpr ErrorText kStartTypeFailed       {1541, "Unable to update the start type of the service %s - error %d\n"};
 constexpr ErrorText kStartFailed           {1552, "Unable to start the service %s - error %d\n"};
-constexpr ErrorText kStopFailed            {1566, "Unable to stop the service %s - error %d\n"};
+constexpr ErrorText kStopFailed            {1566, "Unable to stop the service %s - error %d\n", kAlways};
 constexpr ErrorText kCreateManagerFailed   {1739, "Failed open the SCM - error code %d\n"};
 constexpr ErrorText kCreateFailed          {1775, "Failed to create service- error code %d\n"};
 constexpr ErrorText kEventLogKeyFailed     {1800, "Failed to create Event log registry key -error %d\n"};

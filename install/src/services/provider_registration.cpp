@@ -112,7 +112,7 @@ bool readLevel(ILibraryLoader& libraries, Report& report, std::string_view locat
 class Registration {
 public:
     Registration(const ProviderPorts& ports, std::string_view location)
-        : ports_(ports), report_(ports.console), location_(location), atRoot_(location.ends_with('\\')) {}
+        : ports_(ports), report_(ports.report), location_(location), atRoot_(location.ends_with('\\')) {}
 
     Status run() {
         std::string level;
@@ -178,7 +178,7 @@ private:
 
     // Runs a program to its end. The flush puts its lines after those printed so far.
     Status runProgram(const Command& command, std::uint32_t& exitCode) {
-        ports_.console.flush();
+        report_.console().flush();
         QuietSink sink;
         InstallProcess process(ports_.processes, ports_.threads, sink, command.c_str());
         const Status executed = process.execute(true, false);
@@ -187,7 +187,7 @@ private:
     }
 
     const ProviderPorts& ports_;
-    Report report_;
+    Report& report_;
     std::string_view location_;
     bool atRoot_;
 };

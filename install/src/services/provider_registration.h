@@ -7,7 +7,6 @@
 #include <string_view>
 
 #include "install/platform/assembly_cache.h"
-#include "install/platform/console.h"
 #include "install/platform/debug_output.h"
 #include "install/platform/file_system.h"
 #include "install/platform/library_loader.h"
@@ -25,8 +24,8 @@ struct ProviderPorts {
     IFileSystem& files;
     IProcessHost& processes;
     IThreads& threads;
-    IConsole& console;
     IDebugOutput& debug;
+    Report& report;
 };
 
 // Asks the product library of a location for its level, a dotted text such as "9.1.0.0", and tells it. On a

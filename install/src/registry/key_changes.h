@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "install/admin/key_name.h"
+#include "install/src/registry/key_name.h"
 
 namespace kz7 {
 

@@ -26,6 +26,9 @@ KeyName typedKeyName(std::string_view text);
 // The name with the root's full name.
 std::string fullKeyName(const KeyName& name);
 
+// What a full key name sorts by in a walk: case is ignored, and a separator comes before every character of a name.
+std::string walkPlace(std::string_view fullName);
+
 // Below HKEY_LOCAL_MACHINE. A trailing '*' matches every key whose name begins with the text before it.
 // clang-format off
 inline constexpr std::array<std::string_view, 6> kProductKeys = {

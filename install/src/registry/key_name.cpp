@@ -1,4 +1,6 @@
-#include "install/admin/key_name.h"
+#include "install/src/registry/key_name.h"
+
+#include <algorithm>
 
 #include "install/platform/registry_path.h"
 #include "install/platform/text.h"
@@ -54,6 +56,12 @@ std::string fullKeyName(const KeyName& name) {
         }
     }
     return name.path.empty() ? text : text + '\\' + name.path;
+}
+
+std::string walkPlace(std::string_view fullName) {
+    std::string place = foldUpper(fullName);
+    std::replace(place.begin(), place.end(), '\\', '\0');
+    return place;
 }
 
 }  // namespace kz7

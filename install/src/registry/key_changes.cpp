@@ -1,4 +1,4 @@
-#include "install/admin/key_changes.h"
+#include "install/src/registry/key_changes.h"
 
 namespace kz7 {
 namespace {

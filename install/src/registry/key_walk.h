@@ -6,15 +6,10 @@
 #include <string>
 #include <vector>
 
-#include "install/admin/key_name.h"
+#include "install/src/registry/key_name.h"
+#include "install/src/registry/key_reader.h"
 
 namespace kz7 {
-
-struct KeyValue {
-    std::string name;
-    ValueType type = ValueType::none;
-    std::string data;
-};
 
 struct KeyRecord {
     std::string name;       // with its root

@@ -1,0 +1,78 @@
+#include "install/admin/change_report.h"
+
+#include <algorithm>
+
+#include "install/admin/formats/change_text.h"
+#include "install/admin/formats/json_text.h"
+#include "install/platform/text.h"
+
+namespace kz7 {
+namespace {
+
+void appendTexts(std::string_view name, const std::vector<std::string>& texts, std::string& json) {
+    std::string_view separator;
+    json.append(",\"").append(name).append("\":[");
+    for (const std::string& text : texts) {
+        json += separator;
+        appendJsonText(text, json);
+        separator = ",";
+    }
+    json += ']';
+}
+
+std::string runJson(const ChangeRun& run, bool isCheck) {
+    std::string json = compose("{\"schema\":1,\"check\":%s,\"changed\":%s,\"status\":%u,\"changes\":",
+                               {isCheck ? "true" : "false", run.changes.empty() ? "false" : "true", run.status});
+    appendChangesJson(run.changes, json);
+    appendTexts("programs", run.programs, json);
+    appendTexts("notes", run.notes, json);
+    json += ",\"output\":";
+    appendJsonText(run.output, json);
+    std::string_view separator;
+    json += ",\"errors\":[";
+    for (const ErrorLine& error : run.errors) {
+        json += separator;
+        json += compose("{\"line\":%u,\"status\":%u,\"failure\":%s,\"text\":",
+                        {error.line, error.status, error.isFailure ? "true" : "false"});
+        appendJsonText(std::string_view(error.text).substr(0, error.text.find_last_not_of('\n') + 1), json);
+        json += '}';
+        separator = ",";
+    }
+    return json + "]}\n";
+}
+
+std::string runText(const ChangeRun& run, const ChangeOptions& options, bool isColoured) {
+    std::string text = options.diff ? changeText(run.changes, isColoured) : std::string{};
+    for (const std::string& note : run.notes) {
+        text += markedLine('!', note, isColoured);
+    }
+    for (const std::string& program : run.programs) {
+        text += markedLine('>', "would run " + shownText(program), isColoured);
+    }
+    return text + changeSummary(run.changes, options.check ? "would change" : "changed") + '\n';
+}
+
+}  // namespace
+
+void addChangeOptions(CLI::App& command, ChangeOptions& options) {
+    command.add_flag("--check", options.check, "Change nothing; tell what would change");
+    command.add_flag("--diff", options.diff, "Show each change");
+    command.add_flag("--json", options.json, "Write JSON for programs");
+    command.add_flag("--detailed-exitcode", options.detailedExitCode, "Exit with 3 if something changed");
+}
+
+bool ChangeRun::isFailed() const {
+    return status != kSuccess ||
+           std::any_of(errors.begin(), errors.end(), [](const ErrorLine& error) { return error.isFailure; });
+}
+
+Answer showRun(Admin& admin, const ChangeOptions& options, const ChangeRun& run) {
+    const Answer written = options.json ? admin.write(runJson(run, options.check), Admin::Form::document)
+                                        : admin.write(runText(run, options, admin.output().colours));
+    if (written != kAnswerYes || run.isFailed()) {
+        return written != kAnswerYes ? written : kAnswerNo;
+    }
+    return options.detailedExitCode && !run.changes.empty() ? kAnswerChanged : kAnswerYes;
+}
+
+}  // namespace kz7

@@ -1,0 +1,41 @@
+// What the commands that change a store have in common: their options, and how they tell what changed or would change.
+#pragma once
+
+#include <CLI/CLI.hpp>
+#include <string>
+#include <vector>
+
+#include "install/admin/admin.h"
+#include "install/src/registry/change_set.h"
+#include "install/src/registry/report.h"
+
+namespace kz7 {
+
+struct ChangeOptions {
+    bool check = false;
+    bool diff = false;
+    bool json = false;
+    bool detailedExitCode = false;
+};
+
+// Adds --check, --diff, --json and --detailed-exitcode.
+void addChangeOptions(CLI::App& command, ChangeOptions& options);
+
+// What a run did, or would do.
+struct ChangeRun {
+    Status status = kSuccess;  // of the flow
+    ChangeSet changes;
+    std::vector<std::string> programs;  // command lines, not started
+    std::vector<std::string> notes;     // what stays otherwise than one may expect
+    std::string output;                 // of the flow, where it was not written
+    std::vector<ErrorLine> errors;
+
+    // A flow may print failures and succeed.
+    bool isFailed() const;
+};
+
+// Writes the run as text or JSON. kAnswerNo for a run that failed; with --detailed-exitcode, kAnswerChanged for one
+// that succeeded and changes something.
+Answer showRun(Admin& admin, const ChangeOptions& options, const ChangeRun& run);
+
+}  // namespace kz7

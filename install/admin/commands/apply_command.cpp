@@ -1,0 +1,136 @@
+#include <CLI/CLI.hpp>
+
+#include "install/admin/change_report.h"
+#include "install/admin/commands/commands.h"
+#include "install/admin/preview.h"
+#include "install/platform/text.h"
+#include "install/src/registry/copy_layout.h"
+#include "install/src/services/management_service.h"
+#include "install/src/uselvlkz7reg.h"
+
+namespace kz7 {
+namespace {
+
+struct ApplyOptions : ChangeOptions {
+    std::vector<std::string> words;
+    bool noLevel = false;
+};
+
+// A copy that gets another location keeps the service that it has.
+void noteServices(IRegistryStore& registry, ChangeRun& run) {
+    constexpr std::string_view kRecords = "SYSTEM\\CurrentControlSet\\Services\\";
+    const std::string copies = "HKEY_LOCAL_MACHINE\\" + std::string(layout::kCopies) + '\\';
+    for (const Change& change : run.changes) {
+        if (change.isKey() || !change.after || change.name != layout::kPathName ||
+            !equalsIgnoreCase(std::string_view(change.key).substr(0, copies.size()), copies)) {
+            continue;
+        }
+        const std::string service(managementServiceName(change.key.substr(copies.size())).view());
+        const std::string location = change.after->data.substr(0, change.after->data.find('\0'));
+        OwnedKey record(registry);
+        std::optional<ValueState> program;
+        if (registry.openKey(KeyHandle::localMachine, std::string(kRecords) + service, kKeyQueryValue,
+                             record.receive()) == kSuccess &&
+            KeyReader(registry).value(record.get(), "ImagePath", program) == kSuccess && program) {
+            const std::string path = program->data.substr(0, program->data.find('\0'));
+            if (!equalsIgnoreCase(std::string_view(path).substr(0, location.size()), location)) {
+                run.notes.push_back("service " + shownText(service) + " stays at " + shownText(path));
+            }
+        }
+    }
+}
+
+Answer preview(Admin& admin, const ApplyOptions& options, std::span<const char* const> arguments) {
+    Preview preview(admin.platform(), !options.noLevel);
+    std::string key;
+    if (const Status status = preview.fill(key); status != kSuccess) {
+        return admin.storeFault("cannot read: " + shownText(key), status);
+    }
+    ChangeRun run;
+    run.status = runTool(preview.ports(), arguments, &run.errors);
+    run.changes = preview.changes();
+    run.programs = preview.programs();
+    run.output = preview.console().output;
+    noteServices(*preview.ports().registry, run);
+    if (!options.json) {
+        admin.platform().console().writeError(preview.console().error);
+    }
+    return showRun(admin, options, run);
+}
+
+// Knows whether the last line that passed was ended.
+class LineConsole final : public IConsole {
+public:
+    explicit LineConsole(IConsole& real) : real_(real) {}
+
+    Status writeOutput(std::string_view text) override {
+        isOpen_ = text.empty() ? isOpen_ : !text.ends_with('\n');
+        return real_.writeOutput(text);
+    }
+    Status writeError(std::string_view text) override { return real_.writeError(text); }
+    Status flush() override { return real_.flush(); }
+
+    void endLine() {
+        if (isOpen_) {
+            writeOutput("\n");
+        }
+    }
+
+private:
+    IConsole& real_;
+    bool isOpen_ = false;
+};
+
+Answer run(Admin& admin, const ApplyOptions& options, std::span<const char* const> arguments) {
+    MemoryConsole kept;
+    LineConsole shown(admin.platform().console());
+    Ports ports = admin.platform().ports();
+    ports.console = options.json ? static_cast<IConsole*>(&kept) : &shown;
+    RecordedPorts recorded(ports, admin.platform().storeIsOwn());
+    ChangeRun run;
+    run.status = runTool(recorded.ports(), arguments, &run.errors);
+    run.changes = recorded.changes();
+    run.output = kept.output;
+    shown.endLine();
+    noteServices(admin.registry(), run);
+    admin.registry().commit();
+    return showRun(admin, options, run);
+}
+
+std::string shownWords(const std::vector<std::string>& words) {
+    std::string text;
+    for (const std::string& word : words) {
+        text += (text.empty() ? "" : " ") + shownText(word);
+    }
+    return text;
+}
+
+Answer apply(Admin& admin, const ApplyOptions& options) {
+    std::vector<const char*> arguments = {"kz7InstallReg"};
+    for (const std::string& word : options.words) {
+        arguments.push_back(word.c_str());
+    }
+    if (!isToolCommand(arguments)) {
+        return admin.open(true) ? admin.fault("not a command of kz7InstallReg: " + shownWords(options.words) +
+                                              " (see kz7admin apply --help)")
+                                : kAnswerFault;
+    }
+    if (!admin.open(options.check, true)) {
+        return kAnswerFault;
+    }
+    return options.check ? preview(admin, options, arguments) : run(admin, options, arguments);
+}
+
+}  // namespace
+
+void addApplyCommand(CLI::App& program, Admin& admin) {
+    auto* command = program.add_subcommand("apply", "Run a command of kz7InstallReg, or show what it would do");
+    auto options = std::make_shared<ApplyOptions>();
+    addChangeOptions(*command, *options);
+    command->add_flag("--no-level", options->noLevel, "With --check, do not load the library that knows the level");
+    command->add_option("COMMAND", options->words, "The option of kz7InstallReg with its arguments, after \"--\"")
+        ->required();
+    command->callback([&admin, options] { admin.answer = [&admin, options] { return apply(admin, *options); }; });
+}
+
+}  // namespace kz7

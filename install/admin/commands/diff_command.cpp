@@ -1,0 +1,70 @@
+#include <CLI/CLI.hpp>
+
+#include "install/admin/commands/commands.h"
+#include "install/admin/formats/change_text.h"
+#include "install/admin/formats/json_text.h"
+#include "install/admin/formats/reg_text.h"
+#include "install/admin/registry_source.h"
+
+namespace kz7 {
+namespace {
+
+struct DiffOptions {
+    std::string before;
+    std::string after;
+    std::string key;
+    bool reg = false;
+    bool json = false;
+    bool stat = false;
+};
+
+std::string diffJson(const ChangeSet& changes) {
+    std::string json = changes.empty() ? "{\"schema\":1,\"changed\":false,\"changes\":"
+                                       : "{\"schema\":1,\"changed\":true,\"changes\":";
+    appendChangesJson(changes, json);
+    return json + "}\n";
+}
+
+Answer diff(Admin& admin, const DiffOptions& options) {
+    if (!admin.open(true)) {
+        return kAnswerFault;
+    }
+    Snapshot before;
+    Snapshot after;
+    for (const auto& [place, snapshot] : {std::pair(&options.before, &before), {&options.after, &after}}) {
+        RegistrySource source(admin, *place);
+        if (const Answer opened = source.open(); opened != kAnswerYes) {
+            return opened;
+        }
+        if (const Answer read = source.read(options.key, *snapshot); read != kAnswerYes) {
+            return read;
+        }
+    }
+    const ChangeSet changes = difference(before, after);
+    const Admin::Form form = options.json || options.reg ? Admin::Form::document : Admin::Form::text;
+    const Answer written = admin.write(options.json   ? diffJson(changes)
+                                       : options.reg  ? regTextHeader() + changeRegText(changes)
+                                       : options.stat ? changeSummary(changes, "differ") + '\n'
+                                                      : changeText(changes, admin.output().colours),
+                                       form);
+    return written != kAnswerYes || changes.empty() ? written : kAnswerNo;
+}
+
+}  // namespace
+
+void addDiffCommand(CLI::App& program, Admin& admin) {
+    auto* command = program.add_subcommand("diff", "Show what differs between two registries");
+    auto options = std::make_shared<DiffOptions>();
+    command->footer(
+        "A and B are each a state directory, a backup, a file of registry-editor text, or \".\" for this machine.\n"
+        "Exits with 0 if they are the same and with 1 if they differ.");
+    command->add_option("A", options->before, "The registry before")->required();
+    command->add_option("B", options->after, "The registry after")->required();
+    command->add_option("KEY", options->key, "The key to compare; without it everything");
+    auto* reg = command->add_flag("--reg", options->reg, "Write the file whose import turns A into B");
+    auto* json = command->add_flag("--json", options->json, "Write JSON for programs")->excludes(reg);
+    command->add_flag("--stat", options->stat, "Count the differences")->excludes(reg)->excludes(json);
+    command->callback([&admin, options] { admin.answer = [&admin, options] { return diff(admin, *options); }; });
+}
+
+}  // namespace kz7

@@ -1,0 +1,26 @@
+// Change sets as people, programs and the registry editor read them.
+#pragma once
+
+#include <string>
+
+#include "install/src/registry/change_set.h"
+
+namespace kz7 {
+
+// A line for each value that differs, each key without values and each service, marked + (new), - (gone) or
+// ~ (different); a change that is the same in both registry views is one line. `isColoured`: for a terminal.
+std::string changeText(const ChangeSet& changes, bool isColoured);
+
+// One line of such a text.
+std::string markedLine(char mark, const std::string& text, bool isColoured);
+
+// "changed: 27 values, 12 keys, 1 service" or "unchanged"; `verb` stands before the colon.
+std::string changeSummary(const ChangeSet& changes, std::string_view verb = "changed");
+
+// A JSON array; docs/json.md has the fields.
+void appendChangesJson(const ChangeSet& changes, std::string& json);
+
+// The body of a registry-editor file that makes these changes.
+std::string changeRegText(const ChangeSet& changes);
+
+}  // namespace kz7

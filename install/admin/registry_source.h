@@ -1,0 +1,45 @@
+// What a command line can name as a registry: "." for this machine's store, the state directory of another store, a
+// backup, or a file of registry-editor text. Errors are reported here.
+#pragma once
+
+#include <memory>
+#include <string>
+
+#include "install/admin/admin.h"
+#include "install/platform/memory/registry.h"
+#include "install/src/registry/change_set.h"
+
+namespace kz7 {
+
+class RegistrySource {
+public:
+    RegistrySource(Admin& admin, std::string place) : admin_(admin), place_(std::move(place)) {}
+
+    // For reading; after admin.open().
+    Answer open();
+
+    // Only after open().
+    IRegistryStore& registry() { return *registry_; }
+
+    // Whether all of it is the product's: everything but this machine's own registry.
+    bool isOwn() const { return isOwn_; }
+
+    // Reads a key with everything below it, or without a key everything. A key that does not exist reads as nothing.
+    Answer read(const std::string& key, Snapshot& snapshot);
+
+    // Reads the product's keys and services only.
+    Answer readProduct(Snapshot& snapshot);
+
+private:
+    Answer openStore(const PlatformOptions& options);
+    Answer readFrom(const std::vector<KeyStart>& starts, Status found, Snapshot& snapshot);
+
+    Admin& admin_;
+    std::string place_;
+    std::unique_ptr<IPlatform> platform_;  // of another store
+    MemoryRegistry memory_;                // of a file
+    IRegistryStore* registry_ = nullptr;
+    bool isOwn_ = true;
+};
+
+}  // namespace kz7

@@ -1,0 +1,437 @@
+#include "install/src/registry/change_recorder.h"
+
+#include <utility>
+
+#include "install/platform/assembly_records.h"
+#include "install/platform/registry_path.h"
+#include "install/platform/text.h"
+
+namespace kz7 {
+namespace {
+
+constexpr std::string_view kServices = "SYSTEM\\CurrentControlSet\\Services\\";
+
+KeyName parentOf(const KeyName& name) {
+    const std::size_t end = name.path.find_last_of('\\');
+    return {name.root, end == std::string::npos ? std::string{} : name.path.substr(0, end)};
+}
+
+bool isRoot(KeyHandle key) {
+    return key == KeyHandle::localMachine || key == KeyHandle::users || key == KeyHandle::currentUser;
+}
+
+}  // namespace
+
+ChangeSet ChangeRecorder::changes() const {
+    Snapshot before;
+    Snapshot now;
+    std::map<std::string_view, std::string> spelled;  // by place, as the store spells the keys that it was asked for
+    for (const auto& [place, key] : keys_) {
+        KeyRecord was;
+        was.name = key.name;
+        if (const auto parent = spelled.find(std::string_view(place).substr(0, place.find_last_of('\0')));
+            parent != spelled.end()) {
+            was.name = parent->second + key.name.substr(key.name.find_last_of('\\'));
+        }
+        if (key.isSpelled || was.name != key.name) {
+            spelled.emplace(place, was.name);
+        }
+        was.keyClass = key.keyClass;
+        KeyRecord is = was;
+        for (const auto& [fold, value] : key.values) {
+            if (value.before) {
+                was.values.push_back({value.name, value.before->type, value.before->data});
+            }
+            if (value.now) {
+                is.values.push_back({value.name, value.now->type, value.now->data});
+            }
+        }
+        if (key.before) {
+            before.push_back(std::move(was));
+        }
+        if (key.now) {
+            now.push_back(std::move(is));
+        }
+    }
+    return difference(before, now);
+}
+
+ChangeRecorder::Key& ChangeRecorder::note(const KeyName& name, bool exists) {
+    const std::string full = fullKeyName(name);
+    const auto [place, isNew] = keys_.try_emplace(walkPlace(full));
+    if (isNew) {
+        place->second.name = full;
+        place->second.before = place->second.now = exists;
+    }
+    return place->second;
+}
+
+bool ChangeRecorder::exists(const KeyName& name) {
+    const auto known = keys_.find(walkPlace(fullKeyName(name)));
+    if (known != keys_.end()) {
+        return known->second.now;
+    }
+    OwnedKey key(registry_);
+    const Status status = registry_.openKey(name.root, name.path, kKeyQueryValue | kKeyOpenLink, key.receive());
+    keep(isNotFound(status) ? kSuccess : status);
+    return !isNotFound(status);
+}
+
+void ChangeRecorder::beforeCreate(const KeyName& name) {
+    missing_.clear();
+    for (KeyName key = name; !key.path.empty() && !exists(key); key = parentOf(key)) {
+        note(key, false);
+        missing_.push_back(key);
+    }
+}
+
+void ChangeRecorder::created(const KeyName& name, std::string_view keyClass) {
+    for (const KeyName& key : std::exchange(missing_, {})) {
+        note(key, false).now = true;
+    }
+    note(name, false).keyClass = keyClass;
+}
+
+// Notes the values of a key that exists.
+void ChangeRecorder::list(const KeyName& name, Key& key) {
+    if (std::exchange(key.isListed, true)) {
+        return;
+    }
+    OwnedKey opened(registry_);
+    std::vector<KeyValue> values;
+    Status status = registry_.openKey(name.root, name.path, kKeyWalk | kKeyOpenLink, opened.receive());
+    status = status == kSuccess ? reader_.values(opened.get(), values) : status;
+    keep(status);
+    for (const KeyValue& value : values) {
+        const ValueState state{value.type, value.data};
+        key.values.try_emplace(foldUpper(value.name), Value{value.name, state, state});
+    }
+}
+
+void ChangeRecorder::beforeDelete(const KeyName& name) {
+    rest();
+    if (!exists(name)) {
+        return;
+    }
+    Key& key = note(name, true);
+    if (!std::exchange(key.isSpelled, true)) {
+        KeyStart start;
+        const Status status = findKey(registry_, name, start);
+        keep(status);
+        if (status == kSuccess) {
+            key.name.replace(key.name.size() - name.path.size(), name.path.size(), start.name.path);
+            key.keyClass = start.keyClass;
+        }
+    }
+    list(name, key);
+}
+
+void ChangeRecorder::deleted(const KeyName& name) {
+    Key& key = note(name, true);
+    key.now = false;
+    for (auto& [fold, value] : key.values) {
+        value.now.reset();
+    }
+}
+
+void ChangeRecorder::beforeValue(const KeyName& name, std::string_view value, bool isRemoved) {
+    Key& key = note(name, true);
+    if (key.isListed || !key.before || key.values.contains(foldUpper(value))) {
+        return;
+    }
+    if (isRemoved) {
+        list(name, key);
+        return;
+    }
+    Status status = kSuccess;
+    if (!open_ || openName_ != key.name) {
+        openName_ = key.name;
+        status = registry_.openKey(name.root, name.path, kKeyQueryValue | kKeyOpenLink, open_.receive());
+    }
+    std::optional<ValueState> state;
+    status = status == kSuccess ? reader_.value(open_.get(), value, state) : status;
+    keep(status);
+    key.values.try_emplace(foldUpper(value), Value{std::string(value), state, state});
+}
+
+void ChangeRecorder::valueSet(const KeyName& name, std::string_view value, std::optional<ValueState> state) {
+    auto& values = note(name, true).values;
+    values.try_emplace(foldUpper(value), Value{std::string(value), {}, {}}).first->second.now = std::move(state);
+}
+
+void ChangeRecorder::beforeTree(const KeyName& name) {
+    rest();
+    if (!exists(name)) {
+        beforeCreate(name);
+        return;
+    }
+    missing_.clear();
+    KeyStart start;
+    Snapshot tree;
+    std::string unread;
+    Status status = findKey(registry_, name, start);
+    status = status == kSuccess ? readSnapshot(registry_, storeIsOwn_, {start}, tree, unread) : status;
+    keep(status);
+    for (const KeyRecord& record : tree) {
+        const auto [place, isNew] = keys_.try_emplace(walkPlace(record.name));
+        Key& key = place->second;
+        if (isNew) {
+            key.name = record.name;
+            key.keyClass = record.keyClass;
+            key.before = key.now = true;
+        }
+        key.isSpelled = key.isListed = true;
+        for (const KeyValue& value : record.values) {
+            const ValueState state{value.type, value.data};
+            key.values.try_emplace(foldUpper(value.name), Value{value.name, state, state});
+        }
+    }
+}
+
+void ChangeRecorder::afterTree(const KeyName& name, bool isDeleted) {
+    const std::string place = walkPlace(fullKeyName(name));
+    for (auto key = keys_.lower_bound(place); key != keys_.end() && key->first.starts_with(place); ++key) {
+        if (key->first.size() == place.size() || key->first[place.size()] == '\0') {
+            key->second.now = false;
+            for (auto& [fold, value] : key->second.values) {
+                value.now.reset();
+            }
+        }
+    }
+    OwnedKey opened(registry_);
+    for (const KeyName& key : std::exchange(missing_, {})) {
+        note(key, false).now =
+            registry_.openKey(key.root, key.path, kKeyQueryValue | kKeyOpenLink, opened.receive()) == kSuccess;
+    }
+    KeyStart start;
+    if (isDeleted || findKey(registry_, name, start) != kSuccess) {
+        return;
+    }
+    Snapshot tree;
+    std::string unread;
+    keep(readSnapshot(registry_, storeIsOwn_, {start}, tree, unread));
+    for (const KeyRecord& record : tree) {
+        Key& key = keys_[walkPlace(record.name)];
+        key.name = key.name.empty() ? record.name : key.name;
+        key.keyClass = record.keyClass;
+        key.now = true;
+        for (const KeyValue& value : record.values) {
+            key.values.try_emplace(foldUpper(value.name), Value{value.name, {}, {}}).first->second.now =
+                ValueState{value.type, value.data};
+        }
+    }
+}
+
+// Knows the name of every open key.
+class RecordedPorts::Registry final : public IRegistryStore {
+public:
+    Registry(IRegistryStore& real, ChangeRecorder& recorder) : real_(real), recorder_(recorder) {}
+
+    Status openKey(KeyHandle parent, std::string_view path, AccessMask access, KeyHandle& key) override {
+        const KeyName name = nameOf(parent, path, access);
+        return opened(real_.openKey(parent, path, access, key), name, key);
+    }
+    Status createKey(KeyHandle parent, std::string_view path, std::string_view keyClass, AccessMask access,
+                     KeyHandle& key) override {
+        const KeyName name = nameOf(parent, path, access);
+        Status status = real_.openKey(parent, path, access, key);
+        if (isNotFound(status)) {
+            recorder_.beforeCreate(name);
+            status = real_.createKey(parent, path, keyClass, access, key);
+            if (status == kSuccess) {
+                recorder_.created(name, keyClass);
+            }
+        } else if (status != kSuccess) {
+            status = real_.createKey(parent, path, keyClass, access, key);
+        }
+        return opened(status, name, key);
+    }
+    Status closeKey(KeyHandle key) override {
+        open_.erase(key);
+        return real_.closeKey(key);
+    }
+    Status queryValue(KeyHandle key, std::string_view name, ValueType* type, Buffer& data) override {
+        return real_.queryValue(key, name, type, data);
+    }
+    Status setValue(KeyHandle key, std::string_view name, ValueType type, std::string_view data) override {
+        const KeyName of = nameOf(key, {}, 0);
+        recorder_.beforeValue(of, name, false);
+        const Status status = real_.setValue(key, name, type, data);
+        if (status == kSuccess) {
+            recorder_.valueSet(of, name, ValueState{type, std::string(data)});
+        }
+        return status;
+    }
+    Status deleteValue(KeyHandle key, std::string_view name) override {
+        const KeyName of = nameOf(key, {}, 0);
+        recorder_.beforeValue(of, name, true);
+        const Status status = real_.deleteValue(key, name);
+        if (status == kSuccess) {
+            recorder_.valueSet(of, name, std::nullopt);
+        }
+        return status;
+    }
+    Status enumerateKey(KeyHandle key, std::uint32_t index, Buffer& name, Buffer* keyClass) override {
+        return real_.enumerateKey(key, index, name, keyClass);
+    }
+    Status enumerateValue(KeyHandle key, std::uint32_t index, Buffer& name, ValueType* type, Buffer* data) override {
+        return real_.enumerateValue(key, index, name, type, data);
+    }
+    Status deleteKey(KeyHandle parent, std::string_view path, AccessMask view) override {
+        const KeyName name = nameOf(parent, path, view);
+        recorder_.beforeDelete(name);
+        const Status status = real_.deleteKey(parent, path, view);
+        if (status == kSuccess) {
+            recorder_.deleted(name);
+        }
+        return status;
+    }
+    Status commit() override {
+        recorder_.rest();
+        const Status status = real_.commit();
+        if (status == kSuccess) {
+            committed = recorder_.changes();
+        }
+        return status;
+    }
+
+    ChangeSet committed;
+
+private:
+    KeyName nameOf(KeyHandle parent, std::string_view path, AccessMask access) const {
+        KeyName name{parent, {}};
+        if (const auto open = open_.find(parent); open != open_.end()) {
+            name = open->second;
+        }
+        const std::string plain = plainKeyPath(parent, path, access);
+        std::string_view rest = plain;
+        for (std::string_view part; takeName(rest, part);) {
+            name.path.append(name.path.empty() ? "" : "\\").append(part);
+        }
+        return name;
+    }
+    Status opened(Status status, const KeyName& name, const KeyHandle& key) {
+        if (status == kSuccess && !isRoot(key)) {
+            open_.insert_or_assign(key, name);
+        }
+        return status;
+    }
+
+    IRegistryStore& real_;
+    ChangeRecorder& recorder_;
+    std::map<KeyHandle, KeyName> open_;
+};
+
+// A service is the key of its record, whoever keeps it.
+class RecordedPorts::Services final : public IServiceManager {
+public:
+    Services(IServiceManager& real, ChangeRecorder& recorder) : real_(real), recorder_(recorder) {}
+
+    Status openManager(std::uint32_t access, ServiceHandle& manager) override {
+        return real_.openManager(access, manager);
+    }
+    Status createService(ServiceHandle manager, const ServiceDefinition& definition, ServiceHandle& service) override {
+        const Status status =
+            change(definition.name, false, [&] { return real_.createService(manager, definition, service); });
+        return opened(status, definition.name, service);
+    }
+    Status openService(ServiceHandle manager, std::string_view name, std::uint32_t access,
+                       ServiceHandle& service) override {
+        return opened(real_.openService(manager, name, access, service), name, service);
+    }
+    Status changeStartType(ServiceHandle service, ServiceStart start) override {
+        return change(open_[service], false, [&] { return real_.changeStartType(service, start); });
+    }
+    Status configureService(ServiceHandle service, const ServiceDefinition& definition) override {
+        return change(open_[service], false, [&] { return real_.configureService(service, definition); });
+    }
+    Status startService(ServiceHandle service) override {
+        return change(open_[service], false, [&] { return real_.startService(service); });
+    }
+    Status stopService(ServiceHandle service) override {
+        return change(open_[service], false, [&] { return real_.stopService(service); });
+    }
+    Status waitForStop(ServiceHandle service, std::uint32_t milliseconds) override {
+        return real_.waitForStop(service, milliseconds);
+    }
+    Status queryState(ServiceHandle service, ServiceState& state) override { return real_.queryState(service, state); }
+    Status deleteService(ServiceHandle service) override {
+        return change(open_[service], true, [&] { return real_.deleteService(service); });
+    }
+    Status closeHandle(ServiceHandle handle) override {
+        open_.erase(handle);
+        return real_.closeHandle(handle);
+    }
+
+private:
+    template <typename Call>
+    Status change(std::string_view name, bool isDeletion, Call call) {
+        if (!isServiceName(name)) {
+            return call();
+        }
+        const KeyName key{KeyHandle::localMachine, std::string(kServices) + std::string(name)};
+        recorder_.beforeTree(key);
+        const Status status = call();
+        // The key of a deleted service may stay for as long as a handle is open.
+        recorder_.afterTree(key, isDeletion && status == kSuccess);
+        return status;
+    }
+    Status opened(Status status, std::string_view name, const ServiceHandle& service) {
+        if (status == kSuccess) {
+            open_.insert_or_assign(service, std::string(name));
+        }
+        return status;
+    }
+
+    IServiceManager& real_;
+    ChangeRecorder& recorder_;
+    std::map<ServiceHandle, std::string> open_;  // names
+};
+
+// Writes to the registry only where that holds the cache's records.
+class RecordedPorts::Assemblies final : public IAssemblyCache {
+public:
+    Assemblies(IAssemblyCache& real, ChangeRecorder& recorder) : real_(real), recorder_(recorder) {}
+
+    Status deregisterProviders(std::string_view level) override {
+        return change([&] { return real_.deregisterProviders(level); });
+    }
+    Status registerProviders(std::string_view location, std::string_view level,
+                             FrameworkGenerations generations) override {
+        return change([&] { return real_.registerProviders(location, level, generations); });
+    }
+
+private:
+    template <typename Call>
+    Status change(Call call) {
+        const KeyName key{KeyHandle::localMachine, std::string(kAssemblyRecords)};
+        recorder_.beforeTree(key);
+        const Status status = call();
+        recorder_.afterTree(key, false);
+        return status;
+    }
+
+    IAssemblyCache& real_;
+    ChangeRecorder& recorder_;
+};
+
+RecordedPorts::RecordedPorts(const Ports& real, bool storeIsOwn)
+    : recorder_(*real.registry, storeIsOwn),
+      ports_(real),
+      registry_(std::make_unique<Registry>(*real.registry, recorder_)),
+      services_(std::make_unique<Services>(*real.services, recorder_)) {
+    ports_.registry = registry_.get();
+    ports_.services = services_.get();
+    if (storeIsOwn) {
+        assemblies_ = std::make_unique<Assemblies>(*real.assemblies, recorder_);
+        ports_.assemblies = assemblies_.get();
+    }
+}
+
+RecordedPorts::~RecordedPorts() = default;
+
+const ChangeSet& RecordedPorts::changes() const {
+    return registry_->committed;
+}
+
+}  // namespace kz7

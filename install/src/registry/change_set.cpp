@@ -1,0 +1,406 @@
+#include "install/src/registry/change_set.h"
+
+#include <algorithm>
+#include <array>
+#include <map>
+#include <set>
+
+#include "install/platform/text.h"
+
+namespace kz7 {
+namespace {
+
+constexpr std::string_view kServicePrefix = "HKEY_LOCAL_MACHINE\\SYSTEM\\CurrentControlSet\\Services\\KZ7MGMTSVC";
+
+// The values of a service's record that are its configuration.
+constexpr std::array<std::string_view, 6> kServiceValues = {"Type",      "Start",       "ErrorControl",
+                                                            "ImagePath", "DisplayName", "ObjectName"};
+constexpr std::uint32_t kServiceWait = 30'000;  // milliseconds that a service gets to stop or to be gone
+
+std::optional<ValueState> stateOf(const KeyValue* value) {
+    return value == nullptr ? std::nullopt : std::optional(ValueState{value->type, value->data});
+}
+
+// Calls `visit` with the items of two sorted sequences in order, side by side where they have the same name.
+template <typename Item, typename Order, typename Visit>
+void merge(const std::vector<Item>& before, const std::vector<Item>& after, Order order, Visit visit) {
+    auto left = before.begin();
+    auto right = after.begin();
+    while (left != before.end() || right != after.end()) {
+        int comparison = left == before.end() ? 1 : -1;
+        if (left != before.end() && right != after.end()) {
+            comparison = order(left->name).compare(order(right->name));
+        }
+        visit(comparison <= 0 ? &*left : nullptr, comparison >= 0 ? &*right : nullptr);
+        left += comparison <= 0 ? 1 : 0;
+        right += comparison >= 0 ? 1 : 0;
+    }
+}
+
+void addValues(const std::string& key, const std::vector<KeyValue>& before, const std::vector<KeyValue>& after,
+               ChangeSet& changes) {
+    merge(
+        before, after, [](const std::string& name) { return foldUpper(name); },
+        [&](const KeyValue* left, const KeyValue* right) {
+            Change change{Change::Kind::value, key,           {}, left == nullptr ? right->name : left->name,
+                          stateOf(left),       stateOf(right)};
+            if (change.before != change.after) {
+                changes.push_back(std::move(change));
+            }
+        });
+}
+
+// Keys that exist before only, children before their parents.
+void removeKeys(std::vector<const KeyRecord*>& removed, ChangeSet& changes) {
+    for (; !removed.empty(); removed.pop_back()) {
+        const KeyRecord& key = *removed.back();
+        addValues(key.name, key.values, {}, changes);
+        changes.push_back({Change::Kind::keyRemoved, key.name, key.keyClass, {}, {}, {}});
+    }
+}
+
+KeyName nameOf(const std::string& fullName) {
+    KeyName name;
+    parseKeyName(fullName, name);
+    return name;
+}
+
+// Reads rows one after another; rows of one key come together.
+class RowReader {
+public:
+    explicit RowReader(IRegistryStore& registry) : registry_(registry), reader_(registry), key_(registry) {}
+
+    // kFileNotFound: the key does not exist.
+    Status open(const std::string& key) {
+        if (key_ && key == name_) {
+            return kSuccess;
+        }
+        const KeyName name = nameOf(key);
+        name_ = key;
+        return registry_.openKey(name.root, name.path, kKeyWalk | kKeyOpenLink, key_.receive());
+    }
+
+    Status value(std::string_view name, std::optional<ValueState>& state) {
+        return reader_.value(key_.get(), name, state);
+    }
+
+    // Whether the open key has exactly that many values and subkeys.
+    Status has(std::size_t values, std::size_t subkeys, bool& exactly) {
+        std::vector<KeyValue> allValues;
+        std::vector<Subkey> allSubkeys;
+        Status status = reader_.values(key_.get(), allValues);
+        if (status == kSuccess) {
+            status = reader_.subkeys(key_.get(), allSubkeys);
+        }
+        exactly = allValues.size() == values && allSubkeys.size() == subkeys;
+        return status;
+    }
+
+private:
+    IRegistryStore& registry_;
+    KeyReader reader_;
+    OwnedKey key_;
+    std::string name_;
+};
+
+// How many values and subkeys of each removed key are removed with it.
+struct Content {
+    std::size_t values = 0;
+    std::size_t subkeys = 0;
+};
+using Contents = std::map<std::string, Content>;  // by folded key
+
+Contents removedContents(const ChangeSet& changes) {
+    Contents contents;
+    for (const Change& change : changes) {
+        if (change.kind == Change::Kind::keyRemoved) {
+            ++contents[foldUpper(change.key.substr(0, change.key.find_last_of('\\')))].subkeys;
+        } else if (change.kind == Change::Kind::value && change.before) {
+            ++contents[foldUpper(change.key)].values;
+        }
+    }
+    return contents;
+}
+
+Status isAsBefore(RowReader& reader, const Change& change, const Contents& contents, bool storeIsOwn, bool& asBefore) {
+    Status status = reader.open(change.key);
+    if (isNotFound(status)) {
+        asBefore = change.kind == Change::Kind::keyCreated || (change.kind == Change::Kind::value && !change.before);
+        return kSuccess;
+    }
+    if (status != kSuccess) {
+        return status;
+    }
+    if (change.kind == Change::Kind::keyRemoved) {
+        if (!storeIsOwn && !serviceOf(change.key).empty()) {
+            asBefore = true;  // whatever else the service manager keeps there
+            return kSuccess;
+        }
+        const auto removed = contents.find(foldUpper(change.key));
+        const Content content = removed == contents.end() ? Content{} : removed->second;
+        return reader.has(content.values, content.subkeys, asBefore);
+    }
+    if (change.kind == Change::Kind::keyCreated) {
+        asBefore = false;
+        return kSuccess;
+    }
+    std::optional<ValueState> state;
+    status = reader.value(change.name, state);
+    asBefore = state == change.before;
+    return status;
+}
+
+// Changes rows one after another; the key of the values that come together stays open.
+class ChangeWriter {
+public:
+    explicit ChangeWriter(IRegistryStore& registry) : registry_(registry), key_(registry) {}
+
+    Status apply(const Change& change) {
+        const KeyName name = nameOf(change.key);
+        Status status = kSuccess;
+        if (change.isKey() || !key_ || change.key != name_) {
+            key_.reset();
+            name_ = change.key;
+        }
+        if (change.kind == Change::Kind::keyRemoved) {
+            return registry_.deleteKey(name.root, name.path, 0);
+        }
+        if (change.kind == Change::Kind::keyCreated) {
+            return registry_.createKey(name.root, name.path, change.keyClass, kKeySetValue, key_.receive());
+        }
+        if (!key_) {
+            status = registry_.openKey(name.root, name.path, kKeySetValue | kKeyOpenLink, key_.receive());
+        }
+        if (status != kSuccess) {
+            return status;
+        }
+        return change.after ? registry_.setValue(key_.get(), change.name, change.after->type, change.after->data)
+                            : registry_.deleteValue(key_.get(), change.name);
+    }
+
+private:
+    IRegistryStore& registry_;
+    OwnedKey key_;
+    std::string name_;
+};
+
+// The values of a service's record that are its configuration, each with what stands for one that is missing.
+class ServiceValues {
+public:
+    void set(std::string_view name, const std::optional<ValueState>& state) {
+        if (state) {
+            values_[foldUpper(name)] = state->data;
+        } else {
+            values_.erase(foldUpper(name));
+        }
+    }
+    std::string_view text(std::string_view name) const {
+        const auto found = values_.find(foldUpper(name));
+        const std::string_view data = found == values_.end() ? std::string_view{} : found->second;
+        return data.substr(0, data.find('\0'));
+    }
+    std::uint32_t number(std::string_view name, std::uint32_t otherwise) const {
+        const auto found = values_.find(foldUpper(name));
+        std::uint32_t number = 0;
+        if (found == values_.end() || found->second.size() != sizeof number) {
+            return otherwise;
+        }
+        for (std::size_t at = sizeof number; at-- > 0;) {
+            number = number << 8 | static_cast<unsigned char>(found->second[at]);
+        }
+        return number;
+    }
+
+private:
+    std::map<std::string, std::string> values_;  // by folded name
+};
+
+struct ServiceChange {
+    std::string name;
+    bool isCreated = false;
+    bool isRemoved = false;
+    ServiceValues after;
+};
+
+Status removeService(IServiceManager& services, ServiceHandle service) {
+    const Status stopped = services.stopService(service);
+    if (stopped == kSuccess || stopped == kServiceTakesNoControl) {
+        services.waitForStop(service, kServiceWait);
+    }
+    return services.deleteService(service);
+}
+
+Status applyService(IServiceManager& services, const ServiceChange& change) {
+    OwnedService manager(services);
+    OwnedService service(services);
+    const Status status = services.openManager(kServiceManagerAllAccess, manager.receive());
+    if (status != kSuccess) {
+        return status;
+    }
+    const auto automatic = static_cast<std::uint32_t>(ServiceStart::automatic);
+    const ServiceDefinition definition{.name = change.name,
+                                       .displayName = change.after.text("DisplayName"),
+                                       .programPath = change.after.text("ImagePath"),
+                                       .type = change.after.number("Type", kServiceOwnProcess),
+                                       .start = static_cast<ServiceStart>(change.after.number("Start", automatic)),
+                                       .errorControl = change.after.number("ErrorControl", kServiceErrorNormal),
+                                       .deletionWait = kServiceWait};
+    if (change.isCreated) {
+        return services.createService(manager.get(), definition, service.receive());
+    }
+    if (const Status opened = services.openService(manager.get(), change.name, kServiceAllAccess, service.receive());
+        opened != kSuccess) {
+        return opened;
+    }
+    return change.isRemoved ? removeService(services, service.get())
+                            : services.configureService(service.get(), definition);
+}
+
+// The changes of services, each with its whole configuration afterwards.
+Status gatherServices(IRegistryStore& registry, const ChangeSet& changes,
+                      std::map<std::string, ServiceChange>& gathered, std::string& key) {
+    RowReader reader(registry);
+    for (const Change& change : changes) {
+        const std::string_view name = serviceOf(change.key);
+        if (name.empty()) {
+            continue;
+        }
+        const auto [place, isNew] =
+            gathered.try_emplace(foldUpper(name), ServiceChange{std::string(name), false, false, {}});
+        ServiceChange& service = place->second;
+        service.isCreated = service.isCreated || change.kind == Change::Kind::keyCreated;
+        service.isRemoved = service.isRemoved || change.kind == Change::Kind::keyRemoved;
+        if (isNew && !service.isCreated) {
+            Status status = reader.open(change.key);
+            for (const std::string_view value : kServiceValues) {
+                std::optional<ValueState> state;
+                status = status == kSuccess ? reader.value(value, state) : status;
+                service.after.set(value, state);
+            }
+            if (status != kSuccess) {
+                key = change.key;
+                return status;
+            }
+        }
+        if (change.kind == Change::Kind::value) {
+            service.after.set(change.name, change.after);
+        }
+    }
+    return kSuccess;
+}
+
+bool isServiceValue(std::string_view name) {
+    return std::any_of(kServiceValues.begin(), kServiceValues.end(),
+                       [&](std::string_view value) { return equalsIgnoreCase(value, name); });
+}
+
+}  // namespace
+
+ChangeSet difference(const Snapshot& before, const Snapshot& after) {
+    ChangeSet changes;
+    std::vector<const KeyRecord*> removed;
+    merge(before, after, walkPlace, [&](const KeyRecord* left, const KeyRecord* right) {
+        if (right == nullptr) {
+            removed.push_back(left);
+            return;
+        }
+        removeKeys(removed, changes);
+        if (left == nullptr) {
+            changes.push_back({Change::Kind::keyCreated, right->name, right->keyClass, {}, {}, {}});
+        }
+        addValues(right->name, left == nullptr ? std::vector<KeyValue>{} : left->values, right->values, changes);
+    });
+    removeKeys(removed, changes);
+    return changes;
+}
+
+ChangeSet inverse(const ChangeSet& changes) {
+    ChangeSet inverted(changes.rbegin(), changes.rend());
+    for (Change& change : inverted) {
+        std::swap(change.before, change.after);
+        if (change.isKey()) {
+            change.kind = change.kind == Change::Kind::keyCreated ? Change::Kind::keyRemoved : Change::Kind::keyCreated;
+        }
+    }
+    return inverted;
+}
+
+Status findConflicts(IRegistryStore& registry, bool storeIsOwn, const ChangeSet& changes,
+                     std::vector<const Change*>& conflicts, std::string& key) {
+    const Contents contents = removedContents(changes);
+    RowReader reader(registry);
+    for (const Change& change : changes) {
+        bool asBefore = false;
+        if (const Status status = isAsBefore(reader, change, contents, storeIsOwn, asBefore); status != kSuccess) {
+            key = change.key;
+            return status;
+        }
+        if (!asBefore) {
+            conflicts.push_back(&change);
+        }
+    }
+    return kSuccess;
+}
+
+Status applyChangeSet(IRegistryStore& registry, IServiceManager* services, const ChangeSet& changes, std::string& key) {
+    std::map<std::string, ServiceChange> ofServices;
+    Status status = services == nullptr ? kSuccess : gatherServices(registry, changes, ofServices, key);
+    ChangeWriter writer(registry);
+    for (auto change = changes.begin(); status == kSuccess && change != changes.end(); ++change) {
+        if (services == nullptr || serviceOf(change->key).empty()) {
+            key = change->key;
+            status = writer.apply(*change);
+        }
+    }
+    for (auto service = ofServices.begin(); status == kSuccess && service != ofServices.end(); ++service) {
+        key = service->second.name;
+        status = applyService(*services, service->second);
+    }
+    return status;
+}
+
+std::string_view serviceOf(std::string_view fullKeyName) {
+    if (!equalsIgnoreCase(fullKeyName.substr(0, kServicePrefix.size()), kServicePrefix)) {
+        return {};
+    }
+    const std::string_view name = fullKeyName.substr(kServicePrefix.find_last_of('\\') + 1);
+    return name.substr(0, name.find('\\'));
+}
+
+ChangeCounts countChanges(const ChangeSet& changes) {
+    ChangeCounts counts;
+    std::set<std::string> services;
+    for (const Change& change : changes) {
+        if (const std::string_view service = serviceOf(change.key); !service.empty()) {
+            services.insert(foldUpper(service));
+        } else {
+            ++(change.isKey() ? counts.keys : counts.values);
+        }
+    }
+    counts.services = services.size();
+    return counts;
+}
+
+Status readSnapshot(IRegistryStore& registry, bool storeIsOwn, const std::vector<KeyStart>& starts, Snapshot& snapshot,
+                    std::string& key) {
+    const auto add = [&](const KeyRecord& record) {
+        key = record.name;
+        const std::string_view service = serviceOf(record.name);
+        if (storeIsOwn || service.empty() || record.status != kSuccess) {
+            snapshot.push_back(record);
+        } else if (record.name.ends_with(service)) {
+            snapshot.push_back(record);
+            std::erase_if(snapshot.back().values, [](const KeyValue& value) { return !isServiceValue(value.name); });
+        }
+        return record.status;
+    };
+    for (const KeyStart& start : starts) {
+        key = fullKeyName(start.name);
+        if (const Status status = walkKeys(registry, start, add); status != kSuccess) {
+            return status;
+        }
+    }
+    return kSuccess;
+}
+
+}  // namespace kz7

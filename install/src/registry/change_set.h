@@ -1,0 +1,69 @@
+// Change sets: what differs between two states of the registry, as data. The same model is shown before a run, recorded
+// during one, taken back and applied again.
+#pragma once
+
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "install/platform/service_manager.h"
+#include "install/src/registry/key_walk.h"
+
+namespace kz7 {
+
+// A key that is created or removed, or a value with its state before and after. A removed key's values and subkeys are
+// changes of their own.
+struct Change {
+    enum class Kind { keyCreated, keyRemoved, value };
+
+    Kind kind{};
+    std::string key;                   // full name, with its root
+    std::string keyClass;              // of a key that is created or removed
+    std::string name;                  // of the value; empty for the default value
+    std::optional<ValueState> before;  // of the value; none: it does not exist
+    std::optional<ValueState> after;
+
+    bool isKey() const { return kind != Kind::value; }
+};
+
+// In the order in which the changes can be applied: a key before what is below it, and after it where it is removed.
+using ChangeSet = std::vector<Change>;
+
+// Keys in walk order: a key before its subkeys, subkeys and values by their upper-cased names.
+using Snapshot = std::vector<KeyRecord>;
+
+// What turns `before` into `after`. Classes of keys that exist in both are not compared: no registry can change them.
+ChangeSet difference(const Snapshot& before, const Snapshot& after);
+
+// What takes the changes back.
+ChangeSet inverse(const ChangeSet& changes);
+
+// The changes whose row is not in its state before any more. That of a removed key includes that it has no other values
+// and subkeys than those that are removed with it. On failure `key` names the key that cannot be read.
+Status findConflicts(IRegistryStore& registry, bool storeIsOwn, const ChangeSet& changes,
+                     std::vector<const Change*>& conflicts, std::string& key);
+
+// Makes the changes, without a commit and without a look at the states before. With `services`, those of services are
+// made through that port, and without it they are rows like all others. On failure `key` names the key or service that
+// cannot be changed; what comes before it is made.
+Status applyChangeSet(IRegistryStore& registry, IServiceManager* services, const ChangeSet& changes, std::string& key);
+
+// The name of the management service whose record the key belongs to; empty for other keys.
+std::string_view serviceOf(std::string_view fullKeyName);
+
+// How many services, and keys and values apart from those, a change set changes.
+struct ChangeCounts {
+    std::size_t values = 0;
+    std::size_t keys = 0;
+    std::size_t services = 0;
+};
+ChangeCounts countChanges(const ChangeSet& changes);
+
+// Reads the keys with everything below them. On failure `key` names the key that cannot be read.
+//
+// On a machine whose registry is not the programs' own, a service is read as its configuration only: the service
+// manager keeps more in the same place, for itself.
+Status readSnapshot(IRegistryStore& registry, bool storeIsOwn, const std::vector<KeyStart>& starts, Snapshot& snapshot,
+                    std::string& key);
+
+}  // namespace kz7
