@@ -24,7 +24,9 @@ wine_differences=(
 
 on_linux() {
     local code=0
+    foretell "$linux/kz7admin" -- "$@"
     "$linux/kz7InstallReg" "$@" >output 2>error || code=$?
+    compare_foretold "$linux/kz7admin"
     # Windows writes a question mark for each unit that its code page lacks.
     perl -CSD -i -pe 's/[^\0-\xff]/ord $& > 0xffff ? "??" : "?"/ge' output error
     show "$code" "$("$linux/kz7admin" export 2>/dev/null | readable)"
@@ -32,7 +34,9 @@ on_linux() {
 
 # The exit code is whole here; on Linux it is the low 8 bits, or 1 where a failure has none.
 on_windows() {
+    foretell wine "$windows/kz7admin.exe" -- "$@"
     wine "$windows/full_exit_code.exe" "$windows/kz7InstallReg.exe" "$@" >told 2>error_told
+    compare_foretold wine "$windows/kz7admin.exe"
     local code
     code=$(tr -d '\r' <told | sed -n '$s/^exit code //p')
     tr -d '\r' <told | head -c "-$((${#code} + 12))" | iconv -f CP1252 -t UTF-8 >output
@@ -57,6 +61,25 @@ show() {
     cat error
     printf -- '\n--- registry\n%s\n' "$2"
 }
+
+# What check mode foretells is what the run then changes: foretell KZ7ADMIN -- COMMAND, the run, compare_foretold KZ7ADMIN.
+product_lines() { tr -d '\r' | grep -E '^[-+~] .*(\\NVQ\\KZ7|^. service |\\KZ7 Management Service)' || true; }
+foretell() {
+    local admin=()
+    while [ "$1" != -- ]; do admin+=("$1"); shift; done
+    "${admin[@]}" export >before.reg 2>/dev/null || true
+    [ -s before.reg ] || echo 'Windows Registry Editor Version 5.00' >before.reg
+    "${admin[@]}" apply --check --diff "$@" 2>/dev/null | product_lines >foretold
+}
+compare_foretold() {
+    "$@" diff before.reg . 2>/dev/null | product_lines >changed
+    if ! diff -u foretold changed >difference; then
+        echo 'FAILED: check mode foretold something else than'
+        cat difference
+        failed=$((failed + 1))
+    fi >&3
+}
+exec 3>&1
 
 rows=0
 failed=0

@@ -54,10 +54,10 @@ Answer RegistrySource::openStore(const PlatformOptions& options) {
     return kAnswerYes;
 }
 
-Answer RegistrySource::read(const std::string& key, Snapshot& snapshot) {
+Answer RegistrySource::read(const std::string& key, bool wholeServices, Snapshot& snapshot) {
     std::vector<KeyStart> starts;
     if (key.empty()) {
-        return readFrom(starts, findEverything(registry(), isOwn_, starts), snapshot);
+        return readFrom(starts, findEverything(registry(), isOwn_, starts), wholeServices, snapshot);
     }
     const KeyName name = typedKeyName(key);
     if (checkKeyPath(name.path) != kSuccess) {
@@ -68,18 +68,19 @@ Answer RegistrySource::read(const std::string& key, Snapshot& snapshot) {
     if (found == kSuccess) {
         starts.push_back(std::move(start));
     }
-    return readFrom(starts, isNotFound(found) ? kSuccess : found, snapshot);
+    return readFrom(starts, isNotFound(found) ? kSuccess : found, wholeServices, snapshot);
 }
 
-Answer RegistrySource::readProduct(Snapshot& snapshot) {
+Answer RegistrySource::readProduct(bool wholeServices, Snapshot& snapshot) {
     std::vector<KeyStart> starts;
     const Status found = findEverything(registry(), false, starts);
-    return readFrom(starts, found, snapshot);
+    return readFrom(starts, found, wholeServices, snapshot);
 }
 
-Answer RegistrySource::readFrom(const std::vector<KeyStart>& starts, Status found, Snapshot& snapshot) {
+Answer RegistrySource::readFrom(const std::vector<KeyStart>& starts, Status found, bool wholeServices,
+                                Snapshot& snapshot) {
     std::string unread = place_;
-    const Status status = found == kSuccess ? readSnapshot(registry(), isOwn_, starts, snapshot, unread) : found;
+    const Status status = found == kSuccess ? readSnapshot(registry(), wholeServices, starts, snapshot, unread) : found;
     registry().commit();
     if (status == kSuccess || (platform_ != nullptr && platform_->storeFaultTold())) {
         return status == kSuccess ? kAnswerYes : kAnswerFault;

@@ -25,14 +25,15 @@ public:
     bool isOwn() const { return isOwn_; }
 
     // Reads a key with everything below it, or without a key everything. A key that does not exist reads as nothing.
-    Answer read(const std::string& key, Snapshot& snapshot);
+    // `wholeServices`: see readSnapshot().
+    Answer read(const std::string& key, bool wholeServices, Snapshot& snapshot);
 
     // Reads the product's keys and services only.
-    Answer readProduct(Snapshot& snapshot);
+    Answer readProduct(bool wholeServices, Snapshot& snapshot);
 
 private:
     Answer openStore(const PlatformOptions& options);
-    Answer readFrom(const std::vector<KeyStart>& starts, Status found, Snapshot& snapshot);
+    Answer readFrom(const std::vector<KeyStart>& starts, Status found, bool wholeServices, Snapshot& snapshot);
 
     Admin& admin_;
     std::string place_;

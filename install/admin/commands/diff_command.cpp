@@ -29,18 +29,22 @@ Answer diff(Admin& admin, const DiffOptions& options) {
     if (!admin.open(true)) {
         return kAnswerFault;
     }
-    Snapshot before;
-    Snapshot after;
-    for (const auto& [place, snapshot] : {std::pair(&options.before, &before), {&options.after, &after}}) {
-        RegistrySource source(admin, *place);
-        if (const Answer opened = source.open(); opened != kAnswerYes) {
+    RegistrySource before(admin, options.before);
+    RegistrySource after(admin, options.after);
+    for (RegistrySource* const source : {&before, &after}) {
+        if (const Answer opened = source->open(); opened != kAnswerYes) {
             return opened;
         }
-        if (const Answer read = source.read(options.key, *snapshot); read != kAnswerYes) {
+    }
+    const bool wholeServices = before.isOwn() && after.isOwn();
+    Snapshot old;
+    Snapshot now;
+    for (const auto& [source, snapshot] : {std::pair(&before, &old), {&after, &now}}) {
+        if (const Answer read = source->read(options.key, wholeServices, *snapshot); read != kAnswerYes) {
             return read;
         }
     }
-    const ChangeSet changes = difference(before, after);
+    const ChangeSet changes = difference(old, now);
     const Admin::Form form = options.json || options.reg ? Admin::Form::document : Admin::Form::text;
     const Answer written = admin.write(options.json   ? diffJson(changes)
                                        : options.reg  ? regTextHeader() + changeRegText(changes)

@@ -27,7 +27,9 @@ public:
     std::string storeName() override { return "memory"; }
 
     std::unique_ptr<IAssemblyCache> assembliesOn(IRegistryStore& registry) override {
-        return std::make_unique<MemoryAssemblyCache>(registry);
+        auto assemblies = std::make_unique<MemoryAssemblyCache>(registry);
+        assemblies->files = assemblies_.files;
+        return assemblies;
     }
 
     MemoryRegistry registry_;

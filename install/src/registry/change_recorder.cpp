@@ -25,19 +25,12 @@ bool isRoot(KeyHandle key) {
 ChangeSet ChangeRecorder::changes() const {
     Snapshot before;
     Snapshot now;
-    std::map<std::string_view, std::string> spelled;  // by place, as the store spells the keys that it was asked for
     for (const auto& [place, key] : keys_) {
         KeyRecord was;
         was.name = key.name;
-        if (const auto parent = spelled.find(std::string_view(place).substr(0, place.find_last_of('\0')));
-            parent != spelled.end()) {
-            was.name = parent->second + key.name.substr(key.name.find_last_of('\\'));
-        }
-        if (key.isSpelled || was.name != key.name) {
-            spelled.emplace(place, was.name);
-        }
-        was.keyClass = key.keyClass;
         KeyRecord is = was;
+        was.keyClass = key.classBefore;
+        is.keyClass = key.classNow;
         for (const auto& [fold, value] : key.values) {
             if (value.before) {
                 was.values.push_back({value.name, value.before->type, value.before->data});
@@ -56,14 +49,40 @@ ChangeSet ChangeRecorder::changes() const {
     return difference(before, now);
 }
 
-ChangeRecorder::Key& ChangeRecorder::note(const KeyName& name, bool exists) {
-    const std::string full = fullKeyName(name);
-    const auto [place, isNew] = keys_.try_emplace(walkPlace(full));
-    if (isNew) {
-        place->second.name = full;
-        place->second.before = place->second.now = exists;
+// Names and classes as the store has them. The last name of a key that does not exist is taken as it is given.
+ChangeRecorder::Spelling ChangeRecorder::spell(const KeyName& name, bool exists) {
+    Spelling spelling{fullKeyName({name.root, {}}), {}};
+    std::string_view rest = name.path;
+    std::size_t end = 0;  // of the parent in the path
+    for (std::string_view part; takeName(rest, part);) {
+        const KeyName parent{name.root, name.path.substr(0, end)};
+        end += part.size() + (end == 0 ? 0 : 1);
+        const auto [known, isNew] = spelled_.try_emplace(walkPlace(spelling.name + '\\' + std::string(part)));
+        if (isNew) {
+            Subkey found{std::string(part), {}};
+            OwnedKey key(registry_);
+            if ((!rest.empty() || exists) &&
+                registry_.openKey(parent.root, parent.path, kKeyWalk | kKeyOpenLink, key.receive()) == kSuccess &&
+                reader_.subkey(key.get(), part, found) != kSuccess) {
+                found = {std::string(part), {}};
+            }
+            known->second = {spelling.name + '\\' + found.name, std::move(found.keyClass)};
+        }
+        spelling = known->second;
     }
-    return place->second;
+    return spelling;
+}
+
+ChangeRecorder::Key& ChangeRecorder::note(const KeyName& name, bool exists) {
+    const auto [place, isNew] = keys_.try_emplace(walkPlace(fullKeyName(name)));
+    Key& key = place->second;
+    if (isNew) {
+        Spelling spelling = spell(name, exists);
+        key.name = std::move(spelling.name);
+        key.classBefore = key.classNow = spelling.keyClass;
+        key.before = key.now = exists;
+    }
+    return key;
 }
 
 bool ChangeRecorder::exists(const KeyName& name) {
@@ -80,16 +99,20 @@ bool ChangeRecorder::exists(const KeyName& name) {
 void ChangeRecorder::beforeCreate(const KeyName& name) {
     missing_.clear();
     for (KeyName key = name; !key.path.empty() && !exists(key); key = parentOf(key)) {
-        note(key, false);
         missing_.push_back(key);
+    }
+    for (auto key = missing_.rbegin(); key != missing_.rend(); ++key) {
+        note(*key, false);
     }
 }
 
 void ChangeRecorder::created(const KeyName& name, std::string_view keyClass) {
     for (const KeyName& key : std::exchange(missing_, {})) {
-        note(key, false).now = true;
+        Key& missing = note(key, false);
+        missing.now = true;
+        missing.classNow.clear();
     }
-    note(name, false).keyClass = keyClass;
+    note(name, false).classNow = keyClass;
 }
 
 // Notes the values of a key that exists.
@@ -113,17 +136,7 @@ void ChangeRecorder::beforeDelete(const KeyName& name) {
     if (!exists(name)) {
         return;
     }
-    Key& key = note(name, true);
-    if (!std::exchange(key.isSpelled, true)) {
-        KeyStart start;
-        const Status status = findKey(registry_, name, start);
-        keep(status);
-        if (status == kSuccess) {
-            key.name.replace(key.name.size() - name.path.size(), name.path.size(), start.name.path);
-            key.keyClass = start.keyClass;
-        }
-    }
-    list(name, key);
+    list(name, note(name, true));
 }
 
 void ChangeRecorder::deleted(const KeyName& name) {
@@ -134,13 +147,9 @@ void ChangeRecorder::deleted(const KeyName& name) {
     }
 }
 
-void ChangeRecorder::beforeValue(const KeyName& name, std::string_view value, bool isRemoved) {
+void ChangeRecorder::beforeValue(const KeyName& name, std::string_view value) {
     Key& key = note(name, true);
     if (key.isListed || !key.before || key.values.contains(foldUpper(value))) {
-        return;
-    }
-    if (isRemoved) {
-        list(name, key);
         return;
     }
     Status status = kSuccess;
@@ -151,7 +160,12 @@ void ChangeRecorder::beforeValue(const KeyName& name, std::string_view value, bo
     std::optional<ValueState> state;
     status = status == kSuccess ? reader_.value(open_.get(), value, state) : status;
     keep(status);
-    key.values.try_emplace(foldUpper(value), Value{std::string(value), state, state});
+    if (state) {
+        // The only way to find out how the store spells the name.
+        list(name, key);
+    } else {
+        key.values.try_emplace(foldUpper(value), Value{std::string(value), {}, {}});
+    }
 }
 
 void ChangeRecorder::valueSet(const KeyName& name, std::string_view value, std::optional<ValueState> state) {
@@ -170,17 +184,17 @@ void ChangeRecorder::beforeTree(const KeyName& name) {
     Snapshot tree;
     std::string unread;
     Status status = findKey(registry_, name, start);
-    status = status == kSuccess ? readSnapshot(registry_, storeIsOwn_, {start}, tree, unread) : status;
+    status = status == kSuccess ? readSnapshot(registry_, wholeServices_, {start}, tree, unread) : status;
     keep(status);
     for (const KeyRecord& record : tree) {
         const auto [place, isNew] = keys_.try_emplace(walkPlace(record.name));
         Key& key = place->second;
         if (isNew) {
             key.name = record.name;
-            key.keyClass = record.keyClass;
+            key.classBefore = key.classNow = record.keyClass;
             key.before = key.now = true;
         }
-        key.isSpelled = key.isListed = true;
+        key.isListed = true;
         for (const KeyValue& value : record.values) {
             const ValueState state{value.type, value.data};
             key.values.try_emplace(foldUpper(value.name), Value{value.name, state, state});
@@ -209,11 +223,11 @@ void ChangeRecorder::afterTree(const KeyName& name, bool isDeleted) {
     }
     Snapshot tree;
     std::string unread;
-    keep(readSnapshot(registry_, storeIsOwn_, {start}, tree, unread));
+    keep(readSnapshot(registry_, wholeServices_, {start}, tree, unread));
     for (const KeyRecord& record : tree) {
         Key& key = keys_[walkPlace(record.name)];
         key.name = key.name.empty() ? record.name : key.name;
-        key.keyClass = record.keyClass;
+        key.classNow = record.keyClass;
         key.now = true;
         for (const KeyValue& value : record.values) {
             key.values.try_emplace(foldUpper(value.name), Value{value.name, {}, {}}).first->second.now =
@@ -255,7 +269,7 @@ public:
     }
     Status setValue(KeyHandle key, std::string_view name, ValueType type, std::string_view data) override {
         const KeyName of = nameOf(key, {}, 0);
-        recorder_.beforeValue(of, name, false);
+        recorder_.beforeValue(of, name);
         const Status status = real_.setValue(key, name, type, data);
         if (status == kSuccess) {
             recorder_.valueSet(of, name, ValueState{type, std::string(data)});
@@ -264,7 +278,7 @@ public:
     }
     Status deleteValue(KeyHandle key, std::string_view name) override {
         const KeyName of = nameOf(key, {}, 0);
-        recorder_.beforeValue(of, name, true);
+        recorder_.beforeValue(of, name);
         const Status status = real_.deleteValue(key, name);
         if (status == kSuccess) {
             recorder_.valueSet(of, name, std::nullopt);
@@ -415,14 +429,14 @@ private:
     ChangeRecorder& recorder_;
 };
 
-RecordedPorts::RecordedPorts(const Ports& real, bool storeIsOwn)
-    : recorder_(*real.registry, storeIsOwn),
+RecordedPorts::RecordedPorts(const Ports& real, bool wholeServices)
+    : recorder_(*real.registry, wholeServices),
       ports_(real),
       registry_(std::make_unique<Registry>(*real.registry, recorder_)),
       services_(std::make_unique<Services>(*real.services, recorder_)) {
     ports_.registry = registry_.get();
     ports_.services = services_.get();
-    if (storeIsOwn) {
+    if (wholeServices) {
         assemblies_ = std::make_unique<Assemblies>(*real.assemblies, recorder_);
         ports_.assemblies = assemblies_.get();
     }

@@ -15,9 +15,10 @@ namespace kz7 {
 // Keeps every row that a run touches as it was before and as it is now. What others change meanwhile is not recorded.
 class ChangeRecorder {
 public:
-    // States before are read from `registry`. Without `storeIsOwn`, a service is its configuration only.
-    ChangeRecorder(IRegistryStore& registry, bool storeIsOwn)
-        : registry_(registry), storeIsOwn_(storeIsOwn), reader_(registry), open_(registry) {}
+    // States before are read from `registry`. Without `wholeServices`, a service is its
+    // configuration only.
+    ChangeRecorder(IRegistryStore& registry, bool wholeServices)
+        : registry_(registry), wholeServices_(wholeServices), reader_(registry), open_(registry) {}
 
     // What differs, in the order of a difference.
     ChangeSet changes() const;
@@ -32,8 +33,7 @@ public:
     void beforeDelete(const KeyName& name);
     void deleted(const KeyName& name);
 
-    // `isRemoved` also finds out how the store spells the name.
-    void beforeValue(const KeyName& key, std::string_view name, bool isRemoved);
+    void beforeValue(const KeyName& key, std::string_view name);
     void valueSet(const KeyName& key, std::string_view name, std::optional<ValueState> state);
 
     // Around a change that another port makes to a key and what is below it.
@@ -51,33 +51,40 @@ private:
     };
     struct Key {
         std::string name;
-        std::string keyClass;
+        std::string classBefore;
+        std::string classNow;
         bool before = false;
         bool now = false;
-        bool isSpelled = false;               // name and class are the store's
         bool isListed = false;                // all values are touched
         std::map<std::string, Value> values;  // the touched ones, by folded name
     };
 
+    struct Spelling {
+        std::string name;  // full
+        std::string keyClass;
+    };
+
+    Spelling spell(const KeyName& name, bool exists);
     Key& note(const KeyName& name, bool exists);
     bool exists(const KeyName& name);
     void list(const KeyName& name, Key& key);
     void keep(Status status) { status_ = status_ == kSuccess ? status : status_; }
 
     IRegistryStore& registry_;
-    bool storeIsOwn_;
+    bool wholeServices_;
     KeyReader reader_;
     OwnedKey open_;  // the key whose values were read last
     std::string openName_;
     Status status_ = kSuccess;
-    std::map<std::string, Key> keys_;  // by their place in a walk
-    std::vector<KeyName> missing_;     // before the creation that is being made
+    std::map<std::string, Key> keys_;          // by their place in a walk
+    std::map<std::string, Spelling> spelled_;  // by place
+    std::vector<KeyName> missing_;             // before the creation that is being made
 };
 
 // The ports of a machine, those that change something behind a recorder.
 class RecordedPorts {
 public:
-    RecordedPorts(const Ports& real, bool storeIsOwn);
+    RecordedPorts(const Ports& real, bool wholeServices);
     ~RecordedPorts();
     RecordedPorts(const RecordedPorts&) = delete;
     RecordedPorts& operator=(const RecordedPorts&) = delete;

@@ -50,14 +50,43 @@ void addValues(const std::string& key, const std::vector<KeyValue>& before, cons
         });
 }
 
-// Keys that exist before only, children before their parents.
-void removeKeys(std::vector<const KeyRecord*>& removed, ChangeSet& changes) {
-    for (; !removed.empty(); removed.pop_back()) {
-        const KeyRecord& key = *removed.back();
-        addValues(key.name, key.values, {}, changes);
-        changes.push_back({Change::Kind::keyRemoved, key.name, key.keyClass, {}, {}, {}});
+// The keys that a walk has met and that are to be removed, as a path from a key to one below it. A key whose class
+// differs is removed with everything below it and created again. Each is removed when the walk has left it, so that the
+// order does not depend on the keys that are the same.
+class RemovedKeys {
+public:
+    explicit RemovedKeys(ChangeSet& changes) : changes_(changes) {}
+
+    void add(const KeyRecord& key) { keys_.emplace_back(walkPlace(key.name) + '\0', &key); }
+
+    // Begins or goes on to create a key below one that is removed first.
+    void createAfter(const KeyRecord& key) { created_.push_back(&key); }
+
+    bool isReplacing() const { return !created_.empty(); }
+
+    // Before the walk goes on with a key; `place` is empty at its end.
+    void leaveFor(const std::string& place) {
+        for (; !keys_.empty() && !place.starts_with(keys_.back().first); keys_.pop_back()) {
+            const KeyRecord& key = *keys_.back().second;
+            addValues(key.name, key.values, {}, changes_);
+            changes_.push_back({Change::Kind::keyRemoved, key.name, key.keyClass, {}, {}, {}});
+        }
+        for (auto key = created_.begin(); keys_.empty() && key != created_.end(); ++key) {
+            create(**key);
+        }
+        created_.resize(keys_.empty() ? 0 : created_.size());
     }
-}
+
+    void create(const KeyRecord& key) {
+        changes_.push_back({Change::Kind::keyCreated, key.name, key.keyClass, {}, {}, {}});
+        addValues(key.name, {}, key.values, changes_);
+    }
+
+private:
+    ChangeSet& changes_;
+    std::vector<std::pair<std::string, const KeyRecord*>> keys_;
+    std::vector<const KeyRecord*> created_;
+};
 
 KeyName nameOf(const std::string& fullName) {
     KeyName name;
@@ -105,6 +134,7 @@ private:
 
 // How many values and subkeys of each removed key are removed with it.
 struct Content {
+    bool isRemoved = false;
     std::size_t values = 0;
     std::size_t subkeys = 0;
 };
@@ -115,6 +145,7 @@ Contents removedContents(const ChangeSet& changes) {
     for (const Change& change : changes) {
         if (change.kind == Change::Kind::keyRemoved) {
             ++contents[foldUpper(change.key.substr(0, change.key.find_last_of('\\')))].subkeys;
+            contents[foldUpper(change.key)].isRemoved = true;
         } else if (change.kind == Change::Kind::value && change.before) {
             ++contents[foldUpper(change.key)].values;
         }
@@ -122,7 +153,14 @@ Contents removedContents(const ChangeSet& changes) {
     return contents;
 }
 
-Status isAsBefore(RowReader& reader, const Change& change, const Contents& contents, bool storeIsOwn, bool& asBefore) {
+Status isAsBefore(RowReader& reader, const Change& change, const Contents& contents, bool wholeServices,
+                  bool& asBefore) {
+    const auto found = contents.find(foldUpper(change.key));
+    const Content removed = found == contents.end() ? Content{} : found->second;
+    if (removed.isRemoved && change.kind != Change::Kind::keyRemoved && !change.before) {
+        asBefore = true;  // below a key that is created again
+        return kSuccess;
+    }
     Status status = reader.open(change.key);
     if (isNotFound(status)) {
         asBefore = change.kind == Change::Kind::keyCreated || (change.kind == Change::Kind::value && !change.before);
@@ -132,13 +170,11 @@ Status isAsBefore(RowReader& reader, const Change& change, const Contents& conte
         return status;
     }
     if (change.kind == Change::Kind::keyRemoved) {
-        if (!storeIsOwn && !serviceOf(change.key).empty()) {
+        if (!wholeServices && !serviceOf(change.key).empty()) {
             asBefore = true;  // whatever else the service manager keeps there
             return kSuccess;
         }
-        const auto removed = contents.find(foldUpper(change.key));
-        const Content content = removed == contents.end() ? Content{} : removed->second;
-        return reader.has(content.values, content.subkeys, asBefore);
+        return reader.has(removed.values, removed.subkeys, asBefore);
     }
     if (change.kind == Change::Kind::keyCreated) {
         asBefore = false;
@@ -298,19 +334,23 @@ bool isServiceValue(std::string_view name) {
 
 ChangeSet difference(const Snapshot& before, const Snapshot& after) {
     ChangeSet changes;
-    std::vector<const KeyRecord*> removed;
+    RemovedKeys removed(changes);
     merge(before, after, walkPlace, [&](const KeyRecord* left, const KeyRecord* right) {
-        if (right == nullptr) {
-            removed.push_back(left);
-            return;
+        removed.leaveFor(walkPlace(left == nullptr ? right->name : left->name));
+        const bool isReplaced =
+            left != nullptr && right != nullptr && (removed.isReplacing() || left->keyClass != right->keyClass);
+        if (left != nullptr && (right == nullptr || isReplaced)) {
+            removed.add(*left);
         }
-        removeKeys(removed, changes);
-        if (left == nullptr) {
-            changes.push_back({Change::Kind::keyCreated, right->name, right->keyClass, {}, {}, {}});
+        if (right != nullptr && (isReplaced || removed.isReplacing())) {
+            removed.createAfter(*right);
+        } else if (left == nullptr) {
+            removed.create(*right);
+        } else if (right != nullptr) {
+            addValues(right->name, left->values, right->values, changes);
         }
-        addValues(right->name, left == nullptr ? std::vector<KeyValue>{} : left->values, right->values, changes);
     });
-    removeKeys(removed, changes);
+    removed.leaveFor({});
     return changes;
 }
 
@@ -325,13 +365,13 @@ ChangeSet inverse(const ChangeSet& changes) {
     return inverted;
 }
 
-Status findConflicts(IRegistryStore& registry, bool storeIsOwn, const ChangeSet& changes,
+Status findConflicts(IRegistryStore& registry, bool wholeServices, const ChangeSet& changes,
                      std::vector<const Change*>& conflicts, std::string& key) {
     const Contents contents = removedContents(changes);
     RowReader reader(registry);
     for (const Change& change : changes) {
         bool asBefore = false;
-        if (const Status status = isAsBefore(reader, change, contents, storeIsOwn, asBefore); status != kSuccess) {
+        if (const Status status = isAsBefore(reader, change, contents, wholeServices, asBefore); status != kSuccess) {
             key = change.key;
             return status;
         }
@@ -381,12 +421,12 @@ ChangeCounts countChanges(const ChangeSet& changes) {
     return counts;
 }
 
-Status readSnapshot(IRegistryStore& registry, bool storeIsOwn, const std::vector<KeyStart>& starts, Snapshot& snapshot,
-                    std::string& key) {
+Status readSnapshot(IRegistryStore& registry, bool wholeServices, const std::vector<KeyStart>& starts,
+                    Snapshot& snapshot, std::string& key) {
     const auto add = [&](const KeyRecord& record) {
         key = record.name;
         const std::string_view service = serviceOf(record.name);
-        if (storeIsOwn || service.empty() || record.status != kSuccess) {
+        if (wholeServices || service.empty() || record.status != kSuccess) {
             snapshot.push_back(record);
         } else if (record.name.ends_with(service)) {
             snapshot.push_back(record);

@@ -32,7 +32,8 @@ using ChangeSet = std::vector<Change>;
 // Keys in walk order: a key before its subkeys, subkeys and values by their upper-cased names.
 using Snapshot = std::vector<KeyRecord>;
 
-// What turns `before` into `after`. Classes of keys that exist in both are not compared: no registry can change them.
+// What turns `before` into `after`. A key whose class differs is removed and created again, with all below it: no
+// registry can change a class.
 ChangeSet difference(const Snapshot& before, const Snapshot& after);
 
 // What takes the changes back.
@@ -40,7 +41,7 @@ ChangeSet inverse(const ChangeSet& changes);
 
 // The changes whose row is not in its state before any more. That of a removed key includes that it has no other values
 // and subkeys than those that are removed with it. On failure `key` names the key that cannot be read.
-Status findConflicts(IRegistryStore& registry, bool storeIsOwn, const ChangeSet& changes,
+Status findConflicts(IRegistryStore& registry, bool wholeServices, const ChangeSet& changes,
                      std::vector<const Change*>& conflicts, std::string& key);
 
 // Makes the changes, without a commit and without a look at the states before. With `services`, those of services are
@@ -61,9 +62,9 @@ ChangeCounts countChanges(const ChangeSet& changes);
 
 // Reads the keys with everything below them. On failure `key` names the key that cannot be read.
 //
-// On a machine whose registry is not the programs' own, a service is read as its configuration only: the service
-// manager keeps more in the same place, for itself.
-Status readSnapshot(IRegistryStore& registry, bool storeIsOwn, const std::vector<KeyStart>& starts, Snapshot& snapshot,
-                    std::string& key);
+// Without `wholeServices`, a service is read as its configuration only: a machine's service manager keeps more in the
+// same place, for itself.
+Status readSnapshot(IRegistryStore& registry, bool wholeServices, const std::vector<KeyStart>& starts,
+                    Snapshot& snapshot, std::string& key);
 
 }  // namespace kz7

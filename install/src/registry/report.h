@@ -36,8 +36,7 @@ struct ErrorLine {
 class Report {
 public:
     // With `errors`, also keeps the error lines there.
-    explicit Report(IConsole& console, std::vector<ErrorLine>* errors = nullptr)
-        : console_(console), errors_(errors) {}
+    explicit Report(IConsole& console, std::vector<ErrorLine>* errors = nullptr) : console_(console), errors_(errors) {}
 
     // The same lines on another console.
     Report(const Report& other, IConsole& console) : Report(console, other.errors_) {}
@@ -50,16 +49,14 @@ public:
 
     void error(const ErrorText& text, std::initializer_list<Insert> inserts = {}) {
         const std::string line = compose(text.pattern, inserts);
-        console_.writeError(
-            compose("install\\src\\%s:%u: ", {std::string_view("uselvlkz7reg.cpp"), text.line}) + line);
+        console_.writeError(compose("install\\src\\%s:%u: ", {std::string_view("uselvlkz7reg.cpp"), text.line}) + line);
         if (errors_ != nullptr) {
             Status status = kSuccess;
             for (const Insert& insert : inserts) {
                 const auto* const number = std::get_if<std::uint32_t>(&insert);
                 status = number == nullptr ? status : *number;
             }
-            const bool isHarmless =
-                text.harmless == kAlways || (text.harmless != kNever && text.harmless == status);
+            const bool isHarmless = text.harmless == kAlways || (text.harmless != kNever && text.harmless == status);
             errors_->push_back({text.line, status, line, !isHarmless});
         }
     }
