@@ -30,11 +30,19 @@ elseif(NOT KZ7_SANITIZERS)
   target_link_options(kz7_options INTERFACE -static-libstdc++ -static-libgcc)
 endif()
 
-# CLI11 is a header-only library of the host. Its include directory is the host's own, which a cross compiler must never
-# search, so the build tree gets a link to the library's directory alone.
+# CLI11 and nlohmann-json are header-only libraries of the host. Their include directory is the host's own, which a cross
+# compiler must never search, so the build tree gets links to the directories of the libraries alone.
 find_package(CLI11 REQUIRED CONFIG PATHS /usr/share/cmake NO_CMAKE_FIND_ROOT_PATH)
-get_target_property(KZ7_HOST_INCLUDES CLI11::CLI11 INTERFACE_INCLUDE_DIRECTORIES)
-file(MAKE_DIRECTORY ${PROJECT_BINARY_DIR}/cli11)
-file(CREATE_LINK ${KZ7_HOST_INCLUDES}/CLI ${PROJECT_BINARY_DIR}/cli11/CLI SYMBOLIC)
-add_library(kz7_cli11 INTERFACE)
-target_include_directories(kz7_cli11 SYSTEM INTERFACE ${PROJECT_BINARY_DIR}/cli11)
+find_package(nlohmann_json REQUIRED CONFIG PATHS /usr/share/cmake NO_CMAKE_FIND_ROOT_PATH)
+file(MAKE_DIRECTORY ${PROJECT_BINARY_DIR}/headers)
+foreach(library IN ITEMS CLI11::CLI11 nlohmann_json::nlohmann_json)
+  get_target_property(includes ${library} INTERFACE_INCLUDE_DIRECTORIES)
+  list(GET includes 0 includes)
+  foreach(folder IN ITEMS CLI nlohmann)
+    if(EXISTS ${includes}/${folder})
+      file(CREATE_LINK ${includes}/${folder} ${PROJECT_BINARY_DIR}/headers/${folder} SYMBOLIC)
+    endif()
+  endforeach()
+endforeach()
+add_library(kz7_headers INTERFACE)
+target_include_directories(kz7_headers SYSTEM INTERFACE ${PROJECT_BINARY_DIR}/headers)

@@ -49,9 +49,11 @@ int run(int argc, char** argv) {
     addCommitCommand(program, admin);
     addCopiesCommand(program, admin);
     addDiffCommand(program, admin);
+    addEnsureCommand(program, admin);
     addExportCommand(program, admin);
     addFrontCommand(program, admin);
     addImportCommand(program, admin);
+    addRestoreCommand(program, admin);
     addTreeCommand(program, admin);
     try {
         program.parse(argc, argv);

@@ -81,7 +81,9 @@ Answer RegistrySource::readFrom(const std::vector<KeyStart>& starts, Status foun
                                 Snapshot& snapshot) {
     std::string unread = place_;
     const Status status = found == kSuccess ? readSnapshot(registry(), wholeServices, starts, snapshot, unread) : found;
-    registry().commit();
+    if (platform_ != nullptr) {
+        registry().commit();  // the end of its transaction
+    }
     if (status == kSuccess || (platform_ != nullptr && platform_->storeFaultTold())) {
         return status == kSuccess ? kAnswerYes : kAnswerFault;
     }

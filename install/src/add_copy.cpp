@@ -83,6 +83,10 @@ void nameByLevel(IRegistryStore& registry, Report& report, const LevelQuery& que
 
 }  // namespace
 
+std::span<const LayoutRow> copyRows() {
+    return kCopyRows;
+}
+
 Status addCopy(IRegistryStore& registry, IServiceManager& services, Report& report, const LevelQuery& level,
                const CopyRequest& request) {
     RowWriter writer(registry, report);

@@ -2,12 +2,14 @@
 #pragma once
 
 #include <functional>
+#include <span>
 #include <string>
 #include <string_view>
 
 #include "install/platform/registry_store.h"
 #include "install/platform/service_manager.h"
 #include "install/src/registry/report.h"
+#include "install/src/registry/row_writer.h"
 
 namespace kz7 {
 
@@ -20,6 +22,9 @@ struct CopyRequest {
     std::string_view location;
     bool isV9 = false;  // also names the copy as the default and by its level
 };
+
+// The rows of a copy's layout, below its key in each view.
+std::span<const LayoutRow> copyRows();
 
 // Returns the status of the step that failed, which is reported; everything before it stays. Queries the level with
 // isV9 only. The caller commits, and then prints the closing line with reportAdded().

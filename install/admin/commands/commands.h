@@ -16,9 +16,11 @@ void addBackupCommand(CLI::App& program, Admin& admin);
 void addCommitCommand(CLI::App& program, Admin& admin);
 void addCopiesCommand(CLI::App& program, Admin& admin);
 void addDiffCommand(CLI::App& program, Admin& admin);
+void addEnsureCommand(CLI::App& program, Admin& admin);
 void addExportCommand(CLI::App& program, Admin& admin);
 void addFrontCommand(CLI::App& program, Admin& admin);
 void addImportCommand(CLI::App& program, Admin& admin);
+void addRestoreCommand(CLI::App& program, Admin& admin);
 void addTreeCommand(CLI::App& program, Admin& admin);
 // clang-format on
 

@@ -239,7 +239,8 @@ void ChangeRecorder::afterTree(const KeyName& name, bool isDeleted) {
 // Knows the name of every open key.
 class RecordedPorts::Registry final : public IRegistryStore {
 public:
-    Registry(IRegistryStore& real, ChangeRecorder& recorder) : real_(real), recorder_(recorder) {}
+    Registry(IRegistryStore& real, ChangeRecorder& recorder, bool holdsCommits)
+        : real_(real), recorder_(recorder), holdsCommits_(holdsCommits) {}
 
     Status openKey(KeyHandle parent, std::string_view path, AccessMask access, KeyHandle& key) override {
         const KeyName name = nameOf(parent, path, access);
@@ -302,7 +303,7 @@ public:
     }
     Status commit() override {
         recorder_.rest();
-        const Status status = real_.commit();
+        const Status status = holdsCommits_ ? kSuccess : real_.commit();
         if (status == kSuccess) {
             committed = recorder_.changes();
         }
@@ -333,6 +334,7 @@ private:
 
     IRegistryStore& real_;
     ChangeRecorder& recorder_;
+    bool holdsCommits_;
     std::map<KeyHandle, KeyName> open_;
 };
 
@@ -429,10 +431,10 @@ private:
     ChangeRecorder& recorder_;
 };
 
-RecordedPorts::RecordedPorts(const Ports& real, bool wholeServices)
+RecordedPorts::RecordedPorts(const Ports& real, bool wholeServices, bool holdsCommits)
     : recorder_(*real.registry, wholeServices),
       ports_(real),
-      registry_(std::make_unique<Registry>(*real.registry, recorder_)),
+      registry_(std::make_unique<Registry>(*real.registry, recorder_, holdsCommits)),
       services_(std::make_unique<Services>(*real.services, recorder_)) {
     ports_.registry = registry_.get();
     ports_.services = services_.get();

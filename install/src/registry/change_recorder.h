@@ -84,7 +84,8 @@ private:
 // The ports of a machine, those that change something behind a recorder.
 class RecordedPorts {
 public:
-    RecordedPorts(const Ports& real, bool wholeServices);
+    // With `holdsCommits`, the run's commits succeed and do nothing: the caller commits.
+    RecordedPorts(const Ports& real, bool wholeServices, bool holdsCommits = false);
     ~RecordedPorts();
     RecordedPorts(const RecordedPorts&) = delete;
     RecordedPorts& operator=(const RecordedPorts&) = delete;

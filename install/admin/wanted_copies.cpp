@@ -1,0 +1,142 @@
+#include "install/admin/wanted_copies.h"
+
+#include <algorithm>
+#include <nlohmann/json.hpp>
+#include <set>
+
+#include "install/platform/text.h"
+#include "install/src/registry/copy_layout.h"
+
+namespace kz7 {
+namespace {
+
+using nlohmann::json;
+
+constexpr std::size_t kLongestName = 64;       // characters; longer names make copies that cannot be told apart
+constexpr std::size_t kLongestLocation = 255;  // characters of a copy's record
+
+// What makes a name one that no copy can work with; empty for a good one.
+std::string_view faultOfName(const std::string& name) {
+    const bool isControlled = std::any_of(name.begin(), name.end(),
+                                          [](char c) { return static_cast<unsigned char>(c) < ' ' || c == '\x7F'; });
+    if (name.empty()) {
+        return "is empty";
+    }
+    if (!fitsCharacters(name, kLongestName)) {
+        return "is longer than 64 characters";
+    }
+    if (isControlled || name.find_first_of("\\/") != std::string::npos || name == "." || name == "..") {
+        return "is no single name of a key";
+    }
+    return equalsIgnoreCase(name, layout::kVersion8Copy) ? "stands for a version-8 installation" : "";
+}
+
+std::string_view faultOfLocation(const std::string& location) {
+    if (location.empty()) {
+        return "is empty";
+    }
+    if (!fitsCharacters(location, kLongestLocation)) {
+        return "is longer than 255 characters";
+    }
+    const bool isControlled = std::any_of(location.begin(), location.end(),
+                                          [](char c) { return static_cast<unsigned char>(c) < ' ' || c == '\x7F'; });
+    return isControlled ? "holds a control character" : "";
+}
+
+class Reader {
+public:
+    Reader(std::vector<WantedCopy>& copies, std::string& fault) : copies_(copies), fault_(fault) {}
+
+    bool document(const json& document) {
+        if (!document.is_object()) {
+            return fail("document", "is no object");
+        }
+        for (const auto& [field, value] : document.items()) {
+            if (field == "schema" ? value != 1 : field != "copies" && field != "$schema") {
+                return fail(field, field == "schema" ? "is not 1" : "is an unknown field");
+            }
+        }
+        const auto list = document.find("copies");
+        if (list == document.end() || !list->is_array()) {
+            return fail("copies", list == document.end() ? "is missing" : "is no array");
+        }
+        for (std::size_t index = 0; index < list->size(); ++index) {
+            if (!copy((*list)[index], compose("copies[%u]", {static_cast<std::uint32_t>(index)}))) {
+                return false;
+            }
+        }
+        return true;
+    }
+
+private:
+    bool fail(std::string_view path, std::string_view reason) {
+        fault_ = compose("%s: %s", {path, reason});
+        return false;
+    }
+
+    bool text(const json& copy, const std::string& path, const char* field, std::string& text) {
+        const auto found = copy.find(field);
+        if (found != copy.end() && !found->is_string()) {
+            return fail(path + '.' + field, "is no text");
+        }
+        text = found == copy.end() ? std::string{} : found->get<std::string>();
+        return true;
+    }
+
+    bool copy(const json& copy, const std::string& path) {
+        if (!copy.is_object()) {
+            return fail(path, "is no object");
+        }
+        for (const auto& [field, value] : copy.items()) {
+            if (field != "name" && field != "location" && field != "state") {
+                return fail(path + '.' + field, "is an unknown field");
+            }
+        }
+        WantedCopy wanted;
+        std::string state;
+        if (!text(copy, path, "name", wanted.name) || !text(copy, path, "location", wanted.location) ||
+            !text(copy, path, "state", state)) {
+            return false;
+        }
+        if (!copy.contains("name")) {
+            return fail(path + ".name", "is missing");
+        }
+        if (const std::string_view fault = faultOfName(wanted.name); !fault.empty()) {
+            return fail(path + ".name", fault);
+        }
+        if (copy.contains("state") && state != "present" && state != "absent") {
+            return fail(path + ".state", "is neither \"present\" nor \"absent\"");
+        }
+        wanted.isPresent = state != "absent";
+        const std::string_view fault = wanted.isPresent ? faultOfLocation(wanted.location) : std::string_view{};
+        if (!fault.empty()) {
+            return fail(path + ".location", copy.contains("location") ? fault : "is missing");
+        }
+        if (!names_.insert(foldUpper(wanted.name)).second) {
+            return fail(path + ".name", "is in the list twice");
+        }
+        copies_.push_back(std::move(wanted));
+        return true;
+    }
+
+    std::vector<WantedCopy>& copies_;
+    std::string& fault_;
+    std::set<std::string> names_;  // folded
+};
+
+}  // namespace
+
+bool parseWantedCopies(std::string_view text, std::vector<WantedCopy>& copies, std::string& fault) {
+    json document;
+    try {
+        document = json::parse(text);
+    } catch (const json::parse_error& error) {
+        const std::size_t read = std::min(error.byte, text.size());
+        const auto line = 1 + std::count(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(read), '\n');
+        fault = compose("line %u: no JSON", {static_cast<std::uint32_t>(line)});
+        return false;
+    }
+    return Reader(copies, fault).document(document);
+}
+
+}  // namespace kz7
