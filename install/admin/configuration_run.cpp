@@ -16,7 +16,9 @@ constexpr std::uint64_t kParametersStart = 10;
 class Observers {
 public:
     Observers(URE& engine, const std::string& logFile, bool machine) : engine_(engine) {
-        log_ = URELogObserver::getInstance(engine);
+        if (!logFile.empty()) {
+            log_ = URELogObserver::getInstance(engine);
+        }
         if (machine) {
             stream_ = UREExternalObserverMachineStream::getInstance(engine);
         } else {
@@ -66,11 +68,11 @@ std::uint32_t record(URE& engine, KZ7CfgHandler& handler) {
 
 }  // namespace
 
-ConfigurationOutcome runConfiguration(IPlatform& platform, ConfigurationRequest request) {
-    ProfileRegistry profile(platform.registry(), request.copy);
+ConfigurationOutcome runConfiguration(const Ports& ports, ConfigurationRequest request) {
+    ProfileRegistry profile(*ports.registry, request.copy);
     // Ends the transaction of the lookups: others can write while the log is opened.
     profile.settle();
-    URE engine(portsOf(platform));
+    URE engine(portsOf(ports));
     engine.mode = kModeConfigure;
     engine.installationPath = std::move(request.location);
     engine.takeResponses(std::move(request.responses));

@@ -19,7 +19,7 @@ struct ConfigurationRequest {
     std::string location;  // of the copy, one of the product's paths
     std::string instance;  // at most 8 characters; empty: all of the copy
     std::vector<ResponseKeyword> responses;
-    std::string logFile;      // one of the product's paths
+    std::string logFile;      // one of the product's paths; empty: no log
     std::string messageFile;  // the same; empty: the built-in texts
     bool machine = false;     // speaks the progress protocol
 };
@@ -30,6 +30,6 @@ struct ConfigurationOutcome {
     Status kept = kSuccess;    // what keeping the copy's variables came to
 };
 
-ConfigurationOutcome runConfiguration(IPlatform& platform, ConfigurationRequest request);
+ConfigurationOutcome runConfiguration(const Ports& ports, ConfigurationRequest request);
 
 }  // namespace kz7

@@ -27,45 +27,28 @@ Ports Preview::memoryPorts(bool asksLevel) {
     return ports;
 }
 
-// What is there above a key is not created by a flow.
-Status Preview::copyParents(IRegistryStore& live, std::string_view path) {
+// What exists above a key is not created by a flow.
+Status Preview::copyParents(const KeyName& name) {
     Status status = kSuccess;
-    for (std::size_t end = path.find('\\'); status == kSuccess && end != std::string_view::npos;
-         end = path.find('\\', end + 1)) {
-        OwnedKey key(live);
+    for (std::size_t end = name.path.find('\\'); status == kSuccess && end != std::string::npos;
+         end = name.path.find('\\', end + 1)) {
+        OwnedKey key(machine_.registry());
         OwnedKey copied(registry_);
-        status = live.openKey(KeyHandle::localMachine, path.substr(0, end), kKeyQueryValue, key.receive());
+        const std::string path = name.path.substr(0, end);
+        status = machine_.registry().openKey(name.root, path, kKeyQueryValue, key.receive());
         if (isNotFound(status)) {
             return kSuccess;
         }
         if (status == kSuccess) {
-            status =
-                registry_.createKey(KeyHandle::localMachine, path.substr(0, end), {}, kKeySetValue, copied.receive());
+            status = registry_.createKey(name.root, path, {}, kKeySetValue, copied.receive());
         }
     }
     return status;
 }
 
-Status Preview::fill(std::string& key) {
-    IRegistryStore& live = machine_.registry();
-    std::vector<KeyStart> starts;
-    Status status = findEverything(live, false, starts);
-    if (KeyStart records;
-        status == kSuccess && machine_.storeIsOwn() &&
-        findKey(live, {KeyHandle::localMachine, std::string(kAssemblyRecords)}, records) == kSuccess) {
-        starts.push_back(std::move(records));
-    }
-    for (const std::string_view path : kProductKeys) {
-        if (status == kSuccess) {
-            status = copyParents(live, path);
-        }
-    }
-    if (status == kSuccess && machine_.storeIsOwn()) {
-        status = copyParents(live, kAssemblyRecords);
-    }
-    Snapshot snapshot;
-    status = status == kSuccess ? readSnapshot(live, machine_.storeIsOwn(), starts, snapshot, key) : status;
-    for (auto record = snapshot.begin(); status == kSuccess && record != snapshot.end(); ++record) {
+Status Preview::copyKeys(const Snapshot& keys) {
+    Status status = kSuccess;
+    for (auto record = keys.begin(); status == kSuccess && record != keys.end(); ++record) {
         KeyName name;
         parseKeyName(record->name, name);
         OwnedKey copied(registry_);
@@ -74,7 +57,55 @@ Status Preview::fill(std::string& key) {
             status = status == kSuccess ? registry_.setValue(copied.get(), value.name, value.type, value.data) : status;
         }
     }
-    // The end of the live store's transaction.
+    return status;
+}
+
+Status Preview::fill(std::string& key) {
+    IRegistryStore& live = machine_.registry();
+    const bool isOwn = machine_.storeIsOwn();
+    std::vector<KeyStart> starts;
+    Status status = findEverything(live, false, starts);
+    std::vector<std::string_view> paths(kProductKeys.begin(), kProductKeys.end());
+    if (isOwn) {
+        paths.push_back(kAssemblyRecords);
+        KeyStart records;
+        if (status == kSuccess &&
+            findKey(live, {KeyHandle::localMachine, std::string(kAssemblyRecords)}, records) == kSuccess) {
+            starts.push_back(std::move(records));
+        }
+    }
+    for (const std::string_view path : paths) {
+        status = status == kSuccess ? copyParents({KeyHandle::localMachine, std::string(path)}) : status;
+    }
+    Snapshot snapshot;
+    status = status == kSuccess ? readSnapshot(live, isOwn, starts, snapshot, key) : status;
+    status = status == kSuccess ? copyKeys(snapshot) : status;
+    live.commit();  // the end of its transaction
+    return status;
+}
+
+Status Preview::fill(const std::vector<KeyChange>& changes, std::string& key) {
+    IRegistryStore& live = machine_.registry();
+    Status status = kSuccess;
+    for (auto change = changes.begin(); status == kSuccess && change != changes.end(); ++change) {
+        key = fullKeyName(change->name);
+        status = copyParents(change->name);
+        KeyStart start;
+        const Status found = status == kSuccess ? findKey(live, change->name, start) : status;
+        if (found != kSuccess) {
+            status = isNotFound(found) ? kSuccess : found;
+            continue;
+        }
+        Snapshot tree;
+        const auto keep = [&](const KeyRecord& record) {
+            key = record.name;
+            tree.push_back(record);
+            return record.status != kSuccess || change->remove ? record.status : kNoMoreItems;
+        };
+        status = walkKeys(live, start, keep);
+        status = isEndOfItems(status) ? kSuccess : status;
+        status = status == kSuccess ? copyKeys(tree) : status;
+    }
     live.commit();
     return status;
 }

@@ -12,6 +12,7 @@
 #include "install/platform/platform.h"
 #include "install/platform/service_records.h"
 #include "install/src/registry/change_recorder.h"
+#include "install/src/registry/key_changes.h"
 
 namespace kz7 {
 
@@ -21,8 +22,11 @@ public:
     // counts as one that ended with 0.
     Preview(IPlatform& machine, bool asksLevel);
 
-    // Copies the state of the machine. On failure `key` names the key that cannot be read.
+    // Copies the product's keys and services. On failure `key` names the key that cannot be read.
     Status fill(std::string& key);
+
+    // Copies what the changes of an import touch.
+    Status fill(const std::vector<KeyChange>& changes, std::string& key);
 
     const Ports& ports() const { return recorded_.ports(); }
     const ChangeSet& changes() const { return recorded_.changes(); }
@@ -34,7 +38,8 @@ public:
 
 private:
     Ports memoryPorts(bool asksLevel);
-    Status copyParents(IRegistryStore& live, std::string_view path);
+    Status copyParents(const KeyName& name);
+    Status copyKeys(const Snapshot& keys);
 
     IPlatform& machine_;
     MemoryRegistry registry_;

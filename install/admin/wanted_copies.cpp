@@ -26,7 +26,7 @@ std::string_view faultOfName(const std::string& name) {
         return "is longer than 64 characters";
     }
     if (isControlled || name.find_first_of("\\/") != std::string::npos || name == "." || name == "..") {
-        return "is no single name of a key";
+        return "is not a valid copy name";
     }
     return equalsIgnoreCase(name, layout::kVersion8Copy) ? "stands for a version-8 installation" : "";
 }
@@ -49,7 +49,7 @@ public:
 
     bool document(const json& document) {
         if (!document.is_object()) {
-            return fail("document", "is no object");
+            return fail("document", "is not an object");
         }
         for (const auto& [field, value] : document.items()) {
             if (field == "schema" ? value != 1 : field != "copies" && field != "$schema") {
@@ -58,7 +58,7 @@ public:
         }
         const auto list = document.find("copies");
         if (list == document.end() || !list->is_array()) {
-            return fail("copies", list == document.end() ? "is missing" : "is no array");
+            return fail("copies", list == document.end() ? "is missing" : "is not an array");
         }
         for (std::size_t index = 0; index < list->size(); ++index) {
             if (!copy((*list)[index], compose("copies[%u]", {static_cast<std::uint32_t>(index)}))) {
@@ -77,7 +77,7 @@ private:
     bool text(const json& copy, const std::string& path, const char* field, std::string& text) {
         const auto found = copy.find(field);
         if (found != copy.end() && !found->is_string()) {
-            return fail(path + '.' + field, "is no text");
+            return fail(path + '.' + field, "is not a string");
         }
         text = found == copy.end() ? std::string{} : found->get<std::string>();
         return true;
@@ -85,7 +85,7 @@ private:
 
     bool copy(const json& copy, const std::string& path) {
         if (!copy.is_object()) {
-            return fail(path, "is no object");
+            return fail(path, "is not an object");
         }
         for (const auto& [field, value] : copy.items()) {
             if (field != "name" && field != "location" && field != "state") {
@@ -133,7 +133,7 @@ bool parseWantedCopies(std::string_view text, std::vector<WantedCopy>& copies, s
     } catch (const json::parse_error& error) {
         const std::size_t read = std::min(error.byte, text.size());
         const auto line = 1 + std::count(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(read), '\n');
-        fault = compose("line %u: no JSON", {static_cast<std::uint32_t>(line)});
+        fault = compose("line %u: not valid JSON", {static_cast<std::uint32_t>(line)});
         return false;
     }
     return Reader(copies, fault).document(document);

@@ -6,14 +6,11 @@
 
 namespace kz7 {
 
-inline RuntimePorts portsOf(IPlatform& platform, IInstallerSession* session = nullptr) {
-    return {platform.files(),
-            platform.processes(),
-            platform.threads(),
-            platform.console(),
-            platform.terminal(),
-            platform.host(),
-            session};
+inline RuntimePorts portsOf(const Ports& ports, IInstallerSession* session = nullptr) {
+    return {*ports.files, *ports.processes, *ports.threads, *ports.console, *ports.terminal, *ports.host, session};
+}
+inline RuntimePorts portsOf(const IPlatform& platform, IInstallerSession* session = nullptr) {
+    return portsOf(platform.ports(), session);
 }
 
 }  // namespace kz7

@@ -2,11 +2,13 @@
 #include <algorithm>
 #include <cstdlib>
 
+#include "install/admin/change_report.h"
 #include "install/admin/commands/commands.h"
 #include "install/admin/configuration_run.h"
 #include "install/admin/copy_location.h"
 #include "install/admin/given_name.h"
 #include "install/admin/input_file.h"
+#include "install/admin/preview.h"
 #include "install/platform/text.h"
 #include "install/runtime/config_handler.h"
 #include "install/runtime/observers/log_observer.h"
@@ -16,7 +18,7 @@
 namespace kz7 {
 namespace {
 
-struct Words {
+struct Words : ChangeOptions {
     std::string copy;
     std::string instance;
     std::string responseFile;
@@ -60,6 +62,9 @@ Answer findCopy(Admin& admin, const Words& words, ConfigurationRequest& request)
 
 // Fails before anything is set if the log cannot be opened.
 Answer findLog(Admin& admin, const Words& words, ConfigurationRequest& request) {
+    if (words.check) {
+        return kAnswerYes;
+    }
     IFileSystem& files = admin.platform().files();
     Status status = kSuccess;
     if (words.logFile.empty()) {
@@ -92,13 +97,55 @@ Answer findMessages(Admin& admin, const Words&, ConfigurationRequest& request) {
                : admin.fault(compose("%s: %s: %s", {kMessagesVariable, shownText(path), reasonOf(status)}));
 }
 
+Answer preview(Admin& admin, const Words& words, ConfigurationRequest request) {
+    Preview preview(admin.platform(), false);
+    std::string key;
+    if (const Status status = preview.fill(key); status != kSuccess) {
+        return admin.storeFault("cannot read: " + shownText(key), status);
+    }
+    ChangeRun run;
+    run.status = runConfiguration(preview.ports(), std::move(request)).notSet == 0 ? kSuccess : kParameterNotSet;
+    run.changes = preview.changes();
+    run.programs = preview.programs();
+    run.output = preview.console().output;
+    if (!words.json) {
+        admin.platform().console().writeError(preview.console().error);
+    }
+    return showRun(admin, words, run);
+}
+
+Answer run(Admin& admin, const Words& words, ConfigurationRequest request) {
+    const std::string log = admin.platform().files().shownPath(request.logFile);
+    MemoryConsole kept;
+    Ports ports = admin.platform().ports();
+    ports.console = words.json ? &kept : ports.console;
+    RecordedPorts recorded(ports, admin.platform().storeIsOwn());
+    const ConfigurationOutcome outcome = runConfiguration(recorded.ports(), std::move(request));
+    if (outcome.kept != kSuccess) {
+        return admin.storeFault("cannot save changes: " + shownText(words.copy), outcome.kept);
+    }
+    if (words.machine) {
+        return outcome.notSet == 0 ? kAnswerYes : kAnswerNo;
+    }
+    ChangeRun run;
+    run.status = outcome.notSet == 0 ? kSuccess : kParameterNotSet;
+    run.changes = recorded.changes();
+    run.output = kept.output;
+    if (!words.json) {
+        // A failure is reported and does not change the exit status: the values are set.
+        admin.write(compose("%s: %u set, %u not set; the log is %s\n",
+                            {shownText(words.copy), outcome.set, outcome.notSet, shownText(log)}));
+    }
+    return showRun(admin, words, run);
+}
+
 Answer commit(Admin& admin, const Words& words) {
     if (!fitsCharacters(words.instance, kMaxInstanceName) || !isOneName(words.instance)) {
         return admin.open(true) ? admin.fault(compose("invalid instance name: %s: at most %u characters, no separators",
                                                       {shownText(words.instance), std::uint32_t{kMaxInstanceName}}))
                                 : kAnswerFault;
     }
-    if (!admin.open(false)) {
+    if (!admin.open(words.check)) {
         return kAnswerFault;
     }
     ConfigurationRequest request;
@@ -109,17 +156,7 @@ Answer commit(Admin& admin, const Words& words) {
             return answer;
         }
     }
-    const std::string log = admin.platform().files().shownPath(request.logFile);
-    const ConfigurationOutcome outcome = runConfiguration(admin.platform(), std::move(request));
-    if (outcome.kept != kSuccess) {
-        return admin.storeFault("cannot save changes: " + shownText(words.copy), outcome.kept);
-    }
-    if (!words.machine) {
-        // A failure is reported and does not change the exit status: the values are set.
-        admin.write(compose("%s: %u set, %u not set; the log is %s\n",
-                            {shownText(words.copy), outcome.set, outcome.notSet, shownText(log)}));
-    }
-    return outcome.notSet == 0 ? kAnswerYes : kAnswerNo;
+    return words.check ? preview(admin, words, std::move(request)) : run(admin, words, std::move(request));
 }
 
 }  // namespace
@@ -133,7 +170,11 @@ void addCommitCommand(CLI::App& program, Admin& admin) {
         ->check(givenName());
     command->add_option("--instance", words->instance, "The instance that it is set for; without: all of the copy");
     command->add_option("--log", words->logFile, "The log; without: kz7msi.log in the state directory");
-    command->add_flag("--machine", words->machine, "Speak the progress protocol, for a front end");
+    auto* machine = command->add_flag("--machine", words->machine, "Speak the progress protocol, for a front end");
+    addChangeOptions(*command, *words);
+    for (const char* const option : {"--check", "--diff", "--json"}) {
+        machine->excludes(command->get_option(option));
+    }
     command->callback([&admin, words] { admin.answer = [&admin, words] { return commit(admin, *words); }; });
 }
 

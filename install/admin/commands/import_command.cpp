@@ -1,19 +1,50 @@
 #include <CLI/CLI.hpp>
 
+#include "install/admin/change_report.h"
 #include "install/admin/commands/commands.h"
 #include "install/admin/formats/reg_text.h"
 #include "install/admin/given_name.h"
 #include "install/admin/input_file.h"
+#include "install/admin/preview.h"
 #include "install/platform/text.h"
 
 namespace kz7 {
 namespace {
 
-Answer importFile(Admin& admin, const std::string& path) {
-    if (!admin.open(false)) {
+struct ImportOptions : ChangeOptions {
+    std::string file;
+};
+
+Answer importOn(Admin& admin, const InputFile& file, const std::vector<KeyChange>& changes, IRegistryStore& registry) {
+    std::uint32_t line = 0;
+    Status status = applyChanges(registry, changes, line);
+    if (status != kSuccess) {
+        return admin.storeFault(compose("cannot apply: %s:%u", {file.shown(), line}), status);
+    }
+    status = registry.commit();
+    return status == kSuccess ? kAnswerYes : admin.storeFault("cannot save changes: " + file.shown(), status);
+}
+
+Answer preview(Admin& admin, const ImportOptions& options, const InputFile& file,
+               const std::vector<KeyChange>& changes) {
+    Preview preview(admin.platform(), false);
+    std::string key;
+    if (const Status status = preview.fill(changes, key); status != kSuccess) {
+        return admin.storeFault("cannot read: " + shownText(key), status);
+    }
+    if (const Answer answer = importOn(admin, file, changes, *preview.ports().registry); answer != kAnswerYes) {
+        return answer;
+    }
+    ChangeRun run;
+    run.changes = preview.changes();
+    return showRun(admin, options, run);
+}
+
+Answer importFile(Admin& admin, const ImportOptions& options) {
+    if (!admin.open(options.check, true)) {
         return kAnswerFault;
     }
-    InputFile file(admin, path);
+    InputFile file(admin, options.file);
     if (const Answer answer = file.read(); answer != kAnswerYes) {
         return answer;
     }
@@ -22,31 +53,35 @@ Answer importFile(Admin& admin, const std::string& path) {
     if (!parseRegText(file.bytes(), changes, bad)) {
         return file.badLine(bad.line, bad.reason);
     }
-    std::uint32_t line = 0;
-    Status status = applyChanges(admin.registry(), changes, line);
-    if (status != kSuccess) {
-        return admin.storeFault(compose("cannot apply: %s:%u", {file.shown(), line}), status);
+    if (options.check) {
+        return preview(admin, options, file, changes);
     }
-    status = admin.registry().commit();
-    if (status != kSuccess) {
-        return admin.storeFault("cannot save changes: " + file.shown(), status);
+    RecordedPorts recorded(admin.platform().ports(), admin.platform().storeIsOwn());
+    if (const Answer answer = importOn(admin, file, changes, *recorded.ports().registry); answer != kAnswerYes) {
+        return answer;
     }
-    std::size_t values = 0;
-    for (const KeyChange& change : changes) {
-        values += change.values.size();
+    ChangeRun run;
+    run.changes = recorded.changes();
+    if (!options.json) {
+        std::size_t values = 0;
+        for (const KeyChange& change : changes) {
+            values += change.values.size();
+        }
+        admin.write(compose("imported %s into %s: %u keys, %u values\n",
+                            {file.shown(), admin.storeLine(), static_cast<std::uint32_t>(changes.size()),
+                             static_cast<std::uint32_t>(values)}));
     }
-    return admin.write(compose("imported %s into %s: %u keys, %u values\n",
-                               {file.shown(), admin.storeLine(), static_cast<std::uint32_t>(changes.size()),
-                                static_cast<std::uint32_t>(values)}));
+    return showRun(admin, options, run);
 }
 
 }  // namespace
 
 void addImportCommand(CLI::App& program, Admin& admin) {
     auto* command = program.add_subcommand("import", "Do what a file of registry-editor text asks for");
-    auto path = std::make_shared<std::string>();
-    command->add_option("FILE", *path, "The file; \"-\" is standard input")->required()->check(givenName());
-    command->callback([&admin, path] { admin.answer = [&admin, path] { return importFile(admin, *path); }; });
+    auto options = std::make_shared<ImportOptions>();
+    addChangeOptions(*command, *options);
+    command->add_option("FILE", options->file, "The file; \"-\" is standard input")->required();
+    command->callback([&admin, options] { admin.answer = [&admin, options] { return importFile(admin, *options); }; });
 }
 
 }  // namespace kz7
