@@ -46,8 +46,8 @@ TEST_F(AdminProgram, MovesWhatTheToolWroteToAnotherStore) {
         const ProgramResult moved = store_.shell("kz7admin export "s + form + " | " + programPath("kz7admin") +
                                                  " --store '" + other.path() + "' import -");
         EXPECT_EQ(moved.exitCode, 0) << moved.error;
-        EXPECT_EQ(moved.output,
-                  "imported standard input into store " + other.file("registry.db") + ": 27 keys, 28 values\n");
+        EXPECT_EQ(moved.output, "imported standard input into store " + other.file("registry.db") +
+                                    ": 27 keys, 28 values\nchanged: 22 values, 26 keys, 1 service\n");
         EXPECT_EQ(admin({"export", "--store", other.path()}).output, exported.output);
     }
     const ProgramResult key = admin({"export", "\\SOFTWARE\\nvq\\\\KZ7\\InstalledCopies\\Copy\xE9\\global_profile\\"});

@@ -42,7 +42,7 @@ std::string runJson(const ChangeRun& run, bool isCheck) {
 }
 
 std::string runText(const ChangeRun& run, const ChangeOptions& options, bool isColoured) {
-    std::string text = options.diff ? changeText(run.changes, isColoured) : std::string{};
+    std::string text = run.heading + (options.diff ? changeText(run.changes, isColoured) : std::string{});
     for (const std::string& note : run.notes) {
         text += markedLine('!', note, isColoured);
     }
@@ -54,11 +54,16 @@ std::string runText(const ChangeRun& run, const ChangeOptions& options, bool isC
 
 }  // namespace
 
-void addChangeOptions(CLI::App& command, ChangeOptions& options) {
-    command.add_flag("--check", options.check, "Change nothing; tell what would change");
-    command.add_flag("--diff", options.diff, "Show each change");
-    command.add_flag("--json", options.json, "Write JSON for programs");
+void addChangeOptions(CLI::App& command, ChangeOptions& options, CLI::Option* excluded) {
+    auto* check = command.add_flag("--check", options.check, "Change nothing; tell what would change");
+    auto* diff = command.add_flag("--diff", options.diff, "Show each change");
+    auto* json = command.add_flag("--json", options.json, "Write JSON for programs");
     command.add_flag("--detailed-exitcode", options.detailedExitCode, "Exit with 3 if something changed");
+    for (CLI::Option* const option : {check, diff, json}) {
+        if (excluded != nullptr) {
+            option->excludes(excluded);
+        }
+    }
 }
 
 bool ChangeRun::isFailed() const {

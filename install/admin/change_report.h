@@ -18,13 +18,14 @@ struct ChangeOptions {
     bool detailedExitCode = false;
 };
 
-// Adds --check, --diff, --json and --detailed-exitcode.
-void addChangeOptions(CLI::App& command, ChangeOptions& options);
+// Adds --check, --diff, --json and --detailed-exitcode; the first three cannot stand beside `excluded`.
+void addChangeOptions(CLI::App& command, ChangeOptions& options, CLI::Option* excluded = nullptr);
 
 // What a run did, or would do.
 struct ChangeRun {
     Status status = kSuccess;  // of the flow
     ChangeSet changes;
+    std::string heading;                // text for people that comes first
     std::vector<std::string> programs;  // command lines, not started
     std::vector<std::string> notes;     // what stays otherwise than one may expect
     std::string output;                 // of the flow, where it was not written

@@ -131,12 +131,11 @@ Answer run(Admin& admin, const Words& words, ConfigurationRequest request) {
     run.status = outcome.notSet == 0 ? kSuccess : kParameterNotSet;
     run.changes = recorded.changes();
     run.output = kept.output;
-    if (!words.json) {
-        // A failure is reported and does not change the exit status: the values are set.
-        admin.write(compose("%s: %u set, %u not set; the log is %s\n",
-                            {shownText(words.copy), outcome.set, outcome.notSet, shownText(log)}));
-    }
-    return showRun(admin, words, run);
+    run.heading = compose("%s: %u set, %u not set; the log is %s\n",
+                          {shownText(words.copy), outcome.set, outcome.notSet, shownText(log)});
+    // Text that cannot be written is reported and does not change the exit status: the values are set.
+    const Answer shown = showRun(admin, words, run);
+    return shown != kAnswerFault ? shown : outcome.notSet == 0 ? kAnswerYes : kAnswerNo;
 }
 
 Answer commit(Admin& admin, const Words& words) {
@@ -171,10 +170,7 @@ void addCommitCommand(CLI::App& program, Admin& admin) {
     command->add_option("--instance", words->instance, "The instance that it is set for; without: all of the copy");
     command->add_option("--log", words->logFile, "The log; without: kz7msi.log in the state directory");
     auto* machine = command->add_flag("--machine", words->machine, "Speak the progress protocol, for a front end");
-    addChangeOptions(*command, *words);
-    for (const char* const option : {"--check", "--diff", "--json"}) {
-        machine->excludes(command->get_option(option));
-    }
+    addChangeOptions(*command, *words, machine);
     command->callback([&admin, words] { admin.answer = [&admin, words] { return commit(admin, *words); }; });
 }
 

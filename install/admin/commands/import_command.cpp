@@ -62,15 +62,13 @@ Answer importFile(Admin& admin, const ImportOptions& options) {
     }
     ChangeRun run;
     run.changes = recorded.changes();
-    if (!options.json) {
-        std::size_t values = 0;
-        for (const KeyChange& change : changes) {
-            values += change.values.size();
-        }
-        admin.write(compose("imported %s into %s: %u keys, %u values\n",
-                            {file.shown(), admin.storeLine(), static_cast<std::uint32_t>(changes.size()),
-                             static_cast<std::uint32_t>(values)}));
+    std::size_t values = 0;
+    for (const KeyChange& change : changes) {
+        values += change.values.size();
     }
+    run.heading = compose("imported %s into %s: %u keys, %u values\n",
+                          {file.shown(), admin.storeLine(), static_cast<std::uint32_t>(changes.size()),
+                           static_cast<std::uint32_t>(values)});
     return showRun(admin, options, run);
 }
 
