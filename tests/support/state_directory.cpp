@@ -16,7 +16,7 @@ ProgramResult StateDirectory::run(const std::string& program, Arguments argument
 }
 
 pid_t StateDirectory::start(Arguments arguments) const {
-    arguments.insert(arguments.begin(), programPath("kz7InstallReg"));
+    arguments.insert(arguments.begin(), programPath(programOf(arguments)));
     return startProgram(arguments, {{"KZ7_STATE_DIR=" + path()}, {}});
 }
 

@@ -18,17 +18,19 @@ public:
     const std::string& path() const { return directory_.path(); }
     std::string file(const std::string& name) const { return path() + "/" + name; }
 
-    // Runs a program of the project, or the tool, on this store.
+    // Runs a program of the project on this store, by default the tool, or kz7admin for arguments that begin with a
+    // command of it.
     ProgramResult run(const std::string& program, Arguments arguments, ProgramOptions options = {}) const;
     ProgramResult tool(Arguments arguments, ProgramOptions options = {}) const {
-        return run("kz7InstallReg", std::move(arguments), std::move(options));
+        const char* const program = programOf(arguments);
+        return run(program, std::move(arguments), std::move(options));
     }
     // Runs a shell command that begins with the name of a program of the project.
     ProgramResult shell(const std::string& command, ProgramOptions options = {}) const {
         options.environment.push_back("KZ7_STATE_DIR=" + path());
         return runProgram({"/bin/bash", "-c", programPath(command)}, options);
     }
-    // Starts the tool without waiting; output and errors are dropped.
+    // Starts the same without waiting; output and errors are dropped.
     pid_t start(Arguments arguments) const;
 
     // Everything in the store of a folder, or this one; a store that is not there reads as empty. A fault of the store
@@ -42,6 +44,10 @@ public:
     void copyFrom(const StateDirectory& other) const;
 
 private:
+    static const char* programOf(const Arguments& arguments) {
+        return arguments.front().starts_with('-') ? "kz7InstallReg" : "kz7admin";
+    }
+
     TemporaryDirectory directory_;
 };
 
