@@ -13,6 +13,11 @@ std::FILE* openInput(const char* path) {
     return _wfopen(WideText(path).c_str(), L"rb");
 }
 
+std::string environmentText(const char* name) {
+    const WideText wide(name);
+    return textOf([&](wchar_t* room, DWORD size) { return GetEnvironmentVariableW(wide.c_str(), room, size); });
+}
+
 }  // namespace kz7
 
 // The wide vector of the C runtime: CommandLineToArgvW() splits `"a""b" c` otherwise, and the narrow vector is split
