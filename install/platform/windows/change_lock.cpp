@@ -2,8 +2,9 @@
 
 #include <aclapi.h>
 #include <sddl.h>
-#include <shlobj.h>
 
+#include <cwchar>
+#include <string_view>
 #include <utility>
 
 namespace kz7 {
@@ -61,12 +62,24 @@ bool isTrusted(HANDLE file, bool isFolder) {
     return owner.sid != nullptr && isTrustedOwner(owner.sid);
 }
 
+// %ProgramData%\KZ7; empty if the system does not know the folder. Not from the environment, which is the user's, and
+// not from the shell, whose libraries would make every start slower.
 std::wstring lockFolder() {
-    // Not from the environment, which is the user's.
-    PWSTR folder = nullptr;
-    const bool known = SUCCEEDED(SHGetKnownFolderPath(FOLDERID_ProgramData, 0, nullptr, &folder));
-    const std::unique_ptr<wchar_t, decltype(&CoTaskMemFree)> owner(folder, CoTaskMemFree);
-    return known ? std::wstring(folder) + L"\\KZ7" : std::wstring{};
+    constexpr std::wstring_view kSystemDrive = L"%SystemDrive%";
+    wchar_t folder[MAX_PATH] = {};
+    DWORD size = sizeof folder;
+    wchar_t system[MAX_PATH] = {};
+    if (RegGetValueW(HKEY_LOCAL_MACHINE, L"SOFTWARE\\Microsoft\\Windows NT\\CurrentVersion\\ProfileList",
+                     L"ProgramData", RRF_RT_REG_SZ | RRF_RT_REG_EXPAND_SZ | RRF_NOEXPAND, nullptr, folder,
+                     &size) != ERROR_SUCCESS ||
+        GetSystemWindowsDirectoryW(system, MAX_PATH) == 0) {
+        return {};
+    }
+    std::wstring path = folder;
+    if (_wcsnicmp(folder, kSystemDrive.data(), kSystemDrive.size()) == 0) {
+        path.replace(0, kSystemDrive.size(), system, 2);
+    }
+    return path + L"\\KZ7";
 }
 
 }  // namespace
