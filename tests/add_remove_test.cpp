@@ -134,14 +134,14 @@ TEST(RemoveCopy, DeletesTheNativeTreeAndTheServiceAndTheLastOneTheProduct) {
     const std::string stem(64, 'n');
     const std::string longest(255, 'k');
     for (const std::string& name : {stem + "one", stem + "two", longest}) {
-        machine.set(kCopies + "\\" + name, "KZ7 Path Name", "C:\\x");
+        machine.set(compose("%s\\%s", {kCopies, name}), "KZ7 Path Name", "C:\\x");
     }
     EXPECT_EQ(machine.run({"-removeKZ7Copy", stem}), kMissingItem) << "it agrees in 64 characters only";
     EXPECT_EQ(machine.run({"-removeKZ7Copy", stem + "TWO"}), kSuccess);
     EXPECT_TRUE(machine.has(kCopies + "\\" + stem + "one") && !machine.has(kCopies + "\\" + stem + "two"));
     for (const std::string& name : {stem + "one", longest}) {
         EXPECT_EQ(machine.run({"-removeKZ7Copy", name}), kSuccess);
-        EXPECT_TRUE(machine.has(kCopies + "\\COPY2") && !machine.has(kCopies + "\\" + name));
+        EXPECT_TRUE(machine.has(kCopies + "\\COPY2") && !machine.has(compose("%s\\%s", {kCopies, name})));
     }
     machine.set(kCopies + "\\NoService", "KZ7 Path Name", "C:\\x");
     EXPECT_EQ(machine.told({"-removeKZ7Copy", "NoService"}), "The KZ7 Copy NoService has been removed||0");

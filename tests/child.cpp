@@ -9,7 +9,7 @@ using namespace kz7::test;
 
 // Writes to both streams in turn until a write fails or all is written.
 static bool flood(long pieces) {
-    const std::string piece(64 * 1024, 'x');
+    const std::string piece(std::size_t{64} * 1024, 'x');
     for (long written = 0; written != pieces; ++written) {
         if (std::fwrite(piece.data(), 1, piece.size(), stdout) != piece.size() ||
             std::fwrite(piece.data(), 1, piece.size(), stderr) != piece.size()) {

@@ -1,4 +1,4 @@
-#define _CRT_RAND_S
+#define _CRT_RAND_S  // NOLINT(bugprone-reserved-identifier): what rand_s() asks for
 #include "install/platform/windows/ports.h"
 
 #include <io.h>
@@ -16,7 +16,7 @@
 namespace kz7 {
 namespace {
 
-constexpr std::size_t kReadPiece = 64 * 1024;
+constexpr std::size_t kReadPiece = std::size_t{64} * 1024;
 constexpr DWORD kWithoutOurRights = SECURITY_SQOS_PRESENT | SECURITY_IDENTIFICATION;
 constexpr std::size_t kWritePiece = 1 << 30;
 

@@ -25,10 +25,12 @@ std::string environmentText(const char* name) {
 int wmain(int argc, wchar_t** argv) {
     try {
         std::vector<std::string> words;
+        words.reserve(static_cast<std::size_t>(argc));
         for (int i = 0; i < argc; ++i) {
             words.push_back(kz7::textFromWide(argv[i]));
         }
         std::vector<char*> vector;
+        vector.reserve(words.size() + 1);
         for (std::string& word : words) {
             vector.push_back(word.data());
         }
