@@ -212,7 +212,7 @@ TEST(CallObserver, SeesEveryCallWithItsArgumentsAndResult) {
     {
         OwnedKey key(registry);
         registry.createKey(KeyHandle::localMachine, "A", "c", kKeyFull, key.receive());
-        registry.setValue(key.get(), "n", ValueType::sz, std::string_view("x", 2));
+        registry.setValue(key.get(), "n", ValueType::sz, std::string_view("x\0", 2));
         registry.queryValue(key.get(), "n", &type, data);
         registry.queryValue(key.get(), "m", nullptr, data);
     }

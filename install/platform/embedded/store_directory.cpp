@@ -119,11 +119,12 @@ bool unfinishedStoreName(std::string& name) {
 }
 
 void removeUnfinishedStores(const std::string& path) {
+    const std::string folder = path + '/';
     std::vector<std::string> names;
-    namesIn(path, names);
+    namesIn(folder, names);
     for (const std::string& name : names) {
         if (isUnfinishedStore(name)) {
-            unlink((path + '/' + name).c_str());
+            unlink((folder + name).c_str());
         }
     }
 }

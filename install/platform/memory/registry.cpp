@@ -85,7 +85,7 @@ Status MemoryRegistry::find(KeyHandle parent, std::string_view path, AccessMask 
     return status == kSuccess && node == noUser_ ? kFileNotFound : status;
 }
 
-MemoryRegistry::NodePointer MemoryRegistry::writable(NodePointer node) {
+MemoryRegistry::NodePointer MemoryRegistry::writable(const NodePointer& node) {
     return node == noUser_ ? child(*users_, kCallersSid, true) : node;
 }
 

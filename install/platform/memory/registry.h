@@ -58,7 +58,7 @@ private:
     static std::vector<NodePointer>::iterator lowerBound(Node& parent, std::string_view fold);
     static NodePointer child(Node& parent, std::string_view name, bool create);
     // The node itself, or the caller's key, which a write makes.
-    NodePointer writable(NodePointer node);
+    NodePointer writable(const NodePointer& node);
     // The key behind a handle that has the rights needed.
     Status nodeOf(KeyHandle handle, AccessMask needed, NodePointer& node);
     Status nodeForValue(KeyHandle key, AccessMask needed, std::string_view name, NodePointer& node);
