@@ -149,8 +149,8 @@ protected:
     }
 
     const KilledFlow& flow_ = GetParam();
-    const StateDirectory start_;
-    const StateDirectory done_;
+    const StateDirectory start_{};
+    const StateDirectory done_{};
     std::chrono::nanoseconds usual_{};  // the time of a whole run
     std::string after_;
     std::set<std::string> unfinished_;  // states that were committed before the last one
