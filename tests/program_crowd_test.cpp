@@ -92,9 +92,9 @@ struct KilledFlow {
 };
 
 std::vector<Arguments> manyAdds() {
-    std::vector<Arguments> adds;
-    for (int run = 0; run < 14; ++run) {
-        adds.push_back({"-addKZ7Copy", copyName(0, run), "C:\\KZ7"});
+    std::vector<Arguments> adds(14);
+    for (int run = 0; Arguments & add : adds) {
+        add = {"-addKZ7Copy", copyName(0, run++), "C:\\KZ7"};
     }
     return adds;
 }

@@ -156,7 +156,7 @@ TEST_F(RuntimeProgram, FrontTakesWhateverAProgramDoes) {
         bars += "Installing: x\n";
         complaints += "y\n";
     }
-    const std::string longest(64 * 1024, 'x');
+    const std::string longest(std::size_t{64} * 1024, 'x');
     // clang-format off
     const struct { const char* why; std::string lines; int exitCode; std::string output; std::string error; } rows[] = {
         {"garbage and half a line", R"(printf 'a\001b\n\n\377\nPROGRESS TASK\nhalf'; exit 3)", 3,

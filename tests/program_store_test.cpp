@@ -116,15 +116,15 @@ TEST(DeepStores, AServiceWithADeepTreeOrACycleBelowIt) {
 
 // The log is written back only while no other program reads. The reader of the pipe adds copies after its first byte.
 TEST(SlowReaders, HoldNoTransaction) {
+    const std::string program = programPath("kz7admin");
     const std::string adds = " | (head -c 1; for i in $(seq 40); do " + programPath("kz7InstallReg") +
                              " -addKZ7Copy C$i /x; done; cat) >/dev/null";
-    for (const std::string command : {" tree", " export"}) {
+    for (const std::string& command : {program + " tree" + adds, program + " export" + adds}) {
         const StateDirectory state;
         overwrite(state.file("large.reg"),
                   "REGEDIT4\n\n[HKEY_USERS\\L]\n\"v\"=\"" + std::string(1 << 19, 'x') + "\"\n");
         ASSERT_EQ(state.run("kz7admin", {"import", state.file("large.reg")}).exitCode, 0);
-        runProgram({"/bin/sh", "-c", programPath("kz7admin") + command + adds},
-                   {{"KZ7_STATE_DIR=" + state.path()}, {}});
+        runProgram({"/bin/sh", "-c", command}, {{"KZ7_STATE_DIR=" + state.path()}, {}});
         EXPECT_LT(std::filesystem::file_size(state.file("registry.db-wal")), 1U << 19) << command;
     }
 }
@@ -155,7 +155,7 @@ TEST(ScarceResources, AFullDiskChangesNothing) {
         GTEST_SKIP() << "no small file system can be mounted here";
     }
     state.copyFrom(start);
-    overwrite(state.file("ballast"), std::string(128 * 1024, 'x'));
+    overwrite(state.file("ballast"), std::string(std::size_t{128} * 1024, 'x'));
     const ProgramResult refused = state.tool(kAddSecond);
     std::filesystem::remove(state.file("ballast"));
     const std::string found = state.dump();
