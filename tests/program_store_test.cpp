@@ -119,7 +119,8 @@ TEST(SlowReaders, HoldNoTransaction) {
     const std::string program = programPath("kz7admin");
     const std::string adds = " | (head -c 1; for i in $(seq 40); do " + programPath("kz7InstallReg") +
                              " -addKZ7Copy C$i /x; done; cat) >/dev/null";
-    for (const std::string& command : {program + " tree" + adds, program + " export" + adds}) {
+    const std::string commands[] = {program + " tree" + adds, program + " export" + adds};
+    for (const std::string& command : commands) {
         const StateDirectory state;
         overwrite(state.file("large.reg"),
                   "REGEDIT4\n\n[HKEY_USERS\\L]\n\"v\"=\"" + std::string(1 << 19, 'x') + "\"\n");

@@ -64,7 +64,7 @@ TEST(DotNet, RegistersALocationInBothForms) {
         EXPECT_EQ(machine.told({"-DOTNET", location}),
                   "Level Returned: 9.7.8.1\n" + configured("9.7.8", location, end) + "||0");
 
-        const std::string arguments = " -register -level 9.7.8 -kz7path " + location + end;
+        const std::string arguments = compose(" -register -level 9.7.8 -kz7path %s%s", {location, end});
         const std::vector<std::string> started = {"\"C:\\KZ7\\bin\\kz7nmpgac32.exe\" -i \"" + location + "\" ",
                                                   "\"C:\\KZ7\\bin\\kz7nmpcfg.exe\"" + arguments,
                                                   "\"C:\\KZ7\\bin\\kz7nmpcfg_32.exe\"" + arguments + " -migratev8 "};

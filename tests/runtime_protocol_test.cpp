@@ -84,7 +84,7 @@ TEST(MachineStream, TellsAWholeRunToTheByte) {
     engine.startTask(0x1FFFFFFFF, -1, true, "a\r\n :: %s%n%%");
     engine.endTask(5, false, "a\0b"sv);
     responses.push_back(engine.ask(2, 1, {}, "", answer));
-    ObserversEnd{};
+    { const ObserversEnd end; }
     EXPECT_FALSE(machine.terminal_.keepsLineFeeds);
     EXPECT_EQ(responses, (std::vector{Response::answered, Response::none, Response::aborted}));
     EXPECT_EQ(answer, "");

@@ -20,7 +20,7 @@ public:
 
 private:
     std::string name_;
-    void* event_ = nullptr;
+    [[maybe_unused]] void* event_ = nullptr;  // where the system can tell
 };
 
 // In the child.
