@@ -28,6 +28,7 @@ std::string programPath(const std::string& name) {
 pid_t startProgram(const std::vector<std::string>& command, const ProgramOptions& options, const std::string& output,
                    const std::string& error) {
     std::vector<char*> arguments;
+    arguments.reserve(command.size() + 1);
     for (const std::string& argument : command) {
         arguments.push_back(const_cast<char*>(argument.c_str()));
     }
