@@ -86,7 +86,8 @@ cut=$copy$copy$copy
 cut=${cut:0:$((25 / width))}
 # The copy's name for two sizes of the buffer. A saved value that does not fit counts as not saved.
 copy_name() { # kind of action, saved or deleted
-    local room notes=2 line=()
+    local room notes=2 line=() terminator=0
+    [ -z "${2:-}" ] || terminator=1
     for room in 10 11; do
         if [ "${2:-}" = deleted ] || { [ "${2:-}" = saved ] && [ $room -le $length ]; }; then
             line+=("3 'new'")
@@ -95,7 +96,7 @@ copy_name() { # kind of action, saved or deleted
             notes=1
             line+=("$((length + 1)) status 234")
         else
-            line+=("$((length + ${2:+1}0 / 10)) '$copy'")
+            line+=("$((length + terminator)) '$copy'")
         fi
     done
     printf '%s\n' "iMsiGetProperty x $notes" "probe $1: KZ7_COPY_NAME ${line[0]}, KZ7_COPY_NAME ${line[1]}"
