@@ -191,6 +191,15 @@ same 'to version 9 once more'                -v9 'C:\sample'
 same 'and back'                              -v8 'C:\KZ8'
 same 'removal of all copies'                 -removeKZ7Copy kz7build
 
+# A file in the code page with a byte that is not a character, and with the second code of one, which ends in a backslash.
+if [ "$page" -eq 932 ]; then
+    rows=$((rows + 1))
+    printf 'REGEDIT4\n[HKEY_USERS\\KZ7]\n"bad"="\x81"\n"\x95\x5c"="\xed\x5c"\n' >narrow.reg
+    wine "$windows/kz7admin.exe" import narrow.reg >/dev/null
+    wine "$windows/kz7admin.exe" export 'HKU\KZ7' 2>/dev/null | tr -d '\r' | grep '^"' >seen
+    printf '"bad"=hex(1):81,dc,00,00\n"表"="%s"\n' 偆 | diff - seen || failed=$((failed + 1))
+fi
+
 [ "$page" -eq 1252 ] || finish
 
 # Two at once, on Windows only, where no transaction keeps them apart: they leave what one after the other would have.

@@ -13,12 +13,13 @@ namespace {
 constexpr ULONGLONG kPatience = 5000;  // milliseconds
 constexpr DWORD kPoll = 20;            // milliseconds
 
-// Owner and group are the administrators; they and the system have all rights, below too; nothing is inherited.
+// Owner and group: administrators. Full access for administrators and the system, inherited by the files inside; no
+// access is inherited from the parent.
 constexpr wchar_t kForAdministrators[] = L"O:BAG:BAD:P(A;OICI;FA;;;BA)(A;OICI;FA;;;SY)";
 
 struct Owner {
     LocalMemory descriptor;
-    PSID sid = nullptr;  // a part of it; null: the owner cannot be read
+    PSID sid = nullptr;  // points into it; null: the owner cannot be read
 };
 
 Owner ownerOf(HANDLE file) {
@@ -33,13 +34,13 @@ Owner ownerOf(HANDLE file) {
 }
 
 NativeHandle openFolder(const std::wstring& folder) {
-    // Without sharing deletion: the folder stays in its place while it is looked at and used.
+    // Without FILE_SHARE_DELETE: nobody can rename or replace the folder while it is checked and used.
     return owned<NativeHandle>(CreateFileW(folder.c_str(), FILE_READ_ATTRIBUTES | READ_CONTROL,
                                            FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr, OPEN_EXISTING,
                                            FILE_FLAG_BACKUP_SEMANTICS | FILE_FLAG_OPEN_REPARSE_POINT, nullptr));
 }
 
-// Administrators, the system, and the owner of the system's own folder, who could change anything anyway.
+// Administrators, the system, and the owner of the Windows folder, who can change everything anyway.
 bool isTrustedOwner(PSID sid) {
     if (IsWellKnownSid(sid, WinBuiltinAdministratorsSid) != FALSE || IsWellKnownSid(sid, WinLocalSystemSid) != FALSE) {
         return true;

@@ -20,8 +20,8 @@ std::string environmentText(const char* name) {
 
 }  // namespace kz7
 
-// The wide vector of the C runtime: CommandLineToArgvW() splits `"a""b" c` otherwise, and the narrow vector is split
-// after other quotation marks have become ASCII's.
+// Takes the wide vector of the C runtime. CommandLineToArgvW() splits `"a""b" c` differently, and the narrow vector is
+// split after a conversion that turns U+FF02 into a quotation mark.
 int wmain(int argc, wchar_t** argv) {
     try {
         std::vector<std::string> words;
