@@ -22,6 +22,8 @@ linux=$(realpath "$1")
 windows=$(realpath "$2")
 folder=$(mktemp -d)
 trap 'rm -rf "$folder"' EXIT
+set -E
+trap 'echo "FAILED: line $LINENO: $BASH_COMMAND" >&2' ERR
 export KZ7_STATE_DIR=$folder/state
 cd "$folder"
 
