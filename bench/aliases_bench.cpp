@@ -15,7 +15,7 @@
 #include "bench/scratch.h"
 #include "install/platform/embedded/ports.h"
 #include "install/platform/embedded/registry.h"
-#include "install/src/copies/install_copies_profile.h"
+#include "install/src/copies/alias_rewrite.h"
 
 namespace kz7 {
 namespace {

@@ -10,7 +10,7 @@
 #include "install/platform/embedded/ports.h"
 #include "install/platform/embedded/registry.h"
 #include "install/platform/service_records.h"
-#include "install/src/copies/install_copy_list.h"
+#include "install/src/copies/copy_list.h"
 #include "install/src/held_console.h"
 #include "install/src/registry/registry_access.h"
 #include "install/src/version8.h"

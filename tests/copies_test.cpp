@@ -8,8 +8,8 @@
 #include <random>
 #include <set>
 
+#include "install/src/copies/alias_rewrite.h"
 #include "install/src/copies/ilist.h"
-#include "install/src/copies/install_copies_profile.h"
 #include "install/src/copies/product_lists.h"
 #include "install/src/registry/copy_layout.h"
 #include "tests/support/fault_sweep.h"

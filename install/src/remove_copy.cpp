@@ -1,6 +1,6 @@
 #include "install/src/remove_copy.h"
 
-#include "install/src/copies/install_copy_list.h"
+#include "install/src/copies/copy_list.h"
 #include "install/src/registry/copy_layout.h"
 #include "install/src/registry/copy_name.h"
 #include "install/src/registry/registry_access.h"

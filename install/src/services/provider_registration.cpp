@@ -7,7 +7,7 @@
 #include "install/platform/encoding.h"
 #include "install/platform/text.h"
 #include "install/runtime/install_process.h"
-#include "install/src/copies/install_copies_profile.h"
+#include "install/src/copies/alias_rewrite.h"
 
 namespace kz7 {
 namespace {

@@ -1,4 +1,4 @@
-#include "install/src/copies/install_copies_profile.h"
+#include "install/src/copies/alias_rewrite.h"
 
 #include <algorithm>
 #include <cstring>
