@@ -1,5 +1,5 @@
-// A program for the tests of process execution: each of its modes is one thing that a started program may do
-// to whoever started it.
+// A program for the tests of process execution: each mode is one thing that a child may do
+// to its parent.
 #include <cstdio>
 #include <string>
 

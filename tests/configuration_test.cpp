@@ -114,7 +114,7 @@ TEST_F(Configuration, ParametersAreSetByTheCommandProcessor) {
     const std::string fails = "ERROR: Could not set a database-manager parameter: DIAGLEVEL=";
     const std::string refuses = "Note: setDBMUsingProcess, step 10: error 5057: DIAGLEVEL\n" + fails;
     const std::string long780(780, 'v');
-    // Blanks and percent signs stay as they are; of two names of one parameter the processor is told the first.
+    // Blanks and percent signs stay as they are; of two names of one parameter the command has the first.
     EXPECT_EQ(commit("INST", {{"DIAGLEVEL", "3"}, {"DFTDBPATH", "a b%PATH%%d"}, {"MAXDARI", "7"}}),
               set + "DFTDBPATH=a b%PATH%%d, instance INST\n" + set + "DIAGLEVEL=3, instance INST\n" + set +
                   "MAXDARI=7, instance INST\n0: 3 set, 0 not set");

@@ -64,7 +64,7 @@ TEST_P(ProcessHostContract, ProgramsThatAreNotThereDoNotStart) {
     fs::copy_file(childProgram(), folder / "kz7_stray.exe");
     fs::copy_file(childProgram(), folder / "bare folder/kz7_stray.exe");
     fs::current_path(folder);
-    setSearchPath(".");  // hangs on the current folder like the rest
+    setSearchPath(".");  // relative, like the programs
     // clang-format off
     const struct { std::string commandLine; bool pathMayBeNamed; const char* why; } rows[] = {
         {"\"/no such/program.exe\" x",                              true,  "no such file"},

@@ -1,4 +1,4 @@
-// What a front end is told and answers: single lines, the queue, whole runs to the byte, and what goes wrong.
+// The progress protocol and the streams for people: single lines, the queue, whole runs to the byte.
 #include <gtest/gtest.h>
 
 #include <array>

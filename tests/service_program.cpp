@@ -1,4 +1,4 @@
-// A service that does nothing but run until it is told to stop.
+// A service that runs until it gets the stop control.
 #include <windows.h>
 
 #include <string>

@@ -1,5 +1,5 @@
-// The implementations of the ports that every contract suite runs over: the one in memory, and this machine's.
-// Each is fresh, or open on a place of its own that goes with it.
+// The implementations of the ports that every contract suite runs on: the one in memory and this machine's. Each is
+// new, or works in a temporary folder of its own.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -14,7 +14,7 @@
 
 namespace kz7::test {
 
-// What an implementation is known to do differently. Everything else it must do like the others.
+// Known differences of an implementation. In everything else it must behave like the others.
 struct Differences {
     bool ordersValuesByName = false;     // instead of by when they were first set
     bool ordersKeysByLowerCase = false;  // "_" before the letters
@@ -38,13 +38,13 @@ public:
     std::string program() { return folder() + "\\Program.exe"; }
     std::string library() { return folder() + "\\kz7install64.dll"; }
 
-    // Puts a data provider, which is none that a framework would take, into the bin folder below that folder.
+    // Creates a file that is named like a data provider in the folder's bin folder. No framework accepts it.
     virtual void addProvider() = 0;
 
-    // Does it while standard input is that text.
+    // Runs `body` with that text as standard input.
     virtual void reading(const std::string& input, const std::function<void()>& body) = 0;
 
-    // What `writing` brings out on standard output and standard error, in the order in which it arrives.
+    // The text that `writing` writes on standard output and standard error, in the order in which it arrives.
     virtual std::string written(const std::function<void(IConsole&)>& writing) = 0;
 };
 
@@ -61,7 +61,7 @@ struct HostPorts {
     Differences differences = {};
 };
 
-// For a place of the host that nobody else uses.
+// `place` is a folder of the host that only this object uses.
 HostPorts hostPorts(const std::string& place);
 
 // The path of the program that the tests start, in the host's form, and how much it writes on each stream in a flood:

@@ -1,4 +1,4 @@
-// A state directory of the embedded platform as a test sees it from outside.
+// A state directory of the embedded platform, used through the programs.
 #pragma once
 
 #include <string>
@@ -31,8 +31,8 @@ public:
     // Starts the tool without waiting; output and errors are dropped.
     pid_t start(Arguments arguments) const;
 
-    // Everything in the store of a folder, or this one; a store that is not there reads as empty. A fault of the store
-    // is told in the text.
+    // Everything in the store of a folder, or this one; a missing store reads as empty. The text
+    // contains the faults of the store.
     static std::string dumpOf(const std::string& folder);
     std::string dump() const { return dumpOf(path()); }
 

@@ -53,14 +53,14 @@ Status statusOf(int error) {
     }
 }
 
-// Keeps a descriptor out of the three numbers that a child's streams are put on; none on failure.
+// Moves a descriptor above the three that become a child's streams; empty on failure.
 OwnedDescriptor moveUp(OwnedDescriptor descriptor) {
     return descriptor.get() >= kFirstOwnDescriptor
                ? std::move(descriptor)
                : OwnedDescriptor(fcntl(descriptor.get(), F_DUPFD_CLOEXEC, kFirstOwnDescriptor));
 }
 
-// What says that a file is none that this host can execute.
+// Whether an error number means that this host cannot execute a file.
 bool isNoProgram(int error) {
     return error == ENOENT || error == ENOTDIR || error == EACCES || error == ENOEXEC || error == ELOOP ||
            error == ENAMETOOLONG;
@@ -71,7 +71,7 @@ bool isProgram(const std::string& file) {
     return stat(file.c_str(), &found) == 0 && S_ISREG(found.st_mode) && access(file.c_str(), X_OK) == 0;
 }
 
-// The files that a program's name may stand for, in the order of the search.
+// The files that a program's name may refer to, in the order of the search.
 std::vector<std::string> programFiles(std::string_view program, const std::string& stateDirectory) {
     if (!isBareName(program)) {
         std::string file = hostPath(program, stateDirectory);

@@ -12,7 +12,7 @@ namespace {
 
 constexpr std::int64_t kMachineId = 1;
 constexpr std::int64_t kUsersId = 2;
-constexpr std::int64_t kNoKey = -1;  // the caller's key while it does not exist: nothing is below it
+constexpr std::int64_t kNoKey = -1;  // the caller's key while it does not exist; it has no subkeys
 constexpr std::uint32_t kRoots = 3;  // the first slots of the open keys
 constexpr std::uint32_t kUserSlot = 2;
 constexpr std::int64_t kPageSize = 4096;
@@ -67,7 +67,7 @@ EmbeddedRegistry::EmbeddedRegistry(const std::string& directory, bool readOnly, 
 EmbeddedRegistry::~EmbeddedRegistry() {
     endTransaction();
     if (logPages_ * kPageSize > kLogLimit) {
-        // Whoever is in the way makes the checkpoint at their own end; nobody waits for this one.
+        // Does not wait: a program that uses the log now makes the checkpoint when it ends.
         sqlite3_busy_timeout(connection_.get(), 0);
         execute(connection_.get(), "PRAGMA wal_checkpoint(TRUNCATE)");
     }

@@ -16,7 +16,7 @@ constexpr int kTries = 20;
 constexpr const char* kLogSuffix = "-wal";
 constexpr const char* kSuffixes[] = {"", kLogSuffix, "-shm", "-journal"};
 
-// Changes with every write to a file; all zero where there is none.
+// Changes with every write to a file; all zero if the file does not exist.
 std::array<std::int64_t, 4> stampOf(const std::string& path) {
     struct stat found {};
     return stat(path.c_str(), &found) != 0

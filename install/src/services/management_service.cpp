@@ -149,7 +149,7 @@ void switchOffService(IServiceManager& services, Report& report, std::string_vie
     if (!succeeded(openWithStartType(services, report, name, ServiceStart::demand, service))) {
         return;
     }
-    // Deliberate: the platform's result of the stop is judged inverted; a stop that succeeds is told as
+    // Deliberate: the platform's result of the stop is judged inverted; a stop that succeeds is reported as
     // error 1, one that fails not at all. Logs of every switch-off so far read that way.
     if (succeeded(services.stopService(service.get()))) {
         report.error(kStopFailed, {name, std::uint32_t{1}});
