@@ -11,8 +11,8 @@
 
 namespace kz7 {
 
-// Asks the product library of a location for its level, a dotted text such as "9.1.0.0"; empty when there is
-// none to be had.
+// Queries the product library of a location for its level, a dotted text such as "9.1.0.0"; empty if the level cannot
+// be read.
 using LevelQuery = std::function<std::string(std::string_view location)>;
 
 struct CopyRequest {
@@ -21,8 +21,8 @@ struct CopyRequest {
     bool isV9 = false;  // also names the copy as the default and by its level
 };
 
-// Returns the status of the step that failed, which is reported; everything before it stays. Queries the level with
-// isV9 only. The caller commits, and then prints the closing line with reportAdded().
+// Returns the status of the step that failed, which is reported; what earlier steps wrote remains. Queries the level
+// only with isV9. The caller commits and then prints the closing line with reportAdded().
 Status addCopy(IRegistryStore& registry, IServiceManager& services, Report& report, const LevelQuery& level,
                const CopyRequest& request);
 

@@ -56,7 +56,7 @@ public:
                 return add({arguments[2], arguments[3]}, withProviders);
             }
         }
-        // Deliberate: the usage names the two copy options only; the others are the installer's.
+        // Deliberate: the usage lists only the two copy options; the others are for installers.
         report_.line(kUsage);
         return kInvalidParameter;
     }
@@ -70,8 +70,8 @@ private:
         if (succeeded(added)) {
             reportAdded(report_, request);
         }
-        // Deliberate: the registration gets the copy's name where it expects a location, and the result of the add is
-        // dropped; the installers that use "-addv9" expect both.
+        // Deliberate: the registration gets the copy's name as its location, and the result of the add is ignored; the
+        // installers that use "-addv9" expect both.
         return withProviders ? registerProvidersOf(request.name) : added;
     }
 

@@ -1,4 +1,4 @@
-// The tool's entry: picks the one flow that the command line asks for.
+// The entry of the tool: selects the flow that the command line asks for.
 #pragma once
 
 #include <span>
@@ -7,8 +7,8 @@
 
 namespace kz7 {
 
-// Runs a command; `arguments` begins with the program's name. Returns the flow's status, which is the exit
-// code; kInvalidParameter after the usage text.
+// Runs a command; `arguments` begins with the program's name. Returns the status of the flow, which is the exit code,
+// or kInvalidParameter after the usage text.
 Status runTool(IPlatform& platform, std::span<const char* const> arguments);
 
 }  // namespace kz7
