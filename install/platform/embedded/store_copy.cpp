@@ -65,7 +65,7 @@ int StoreCopy::make(const std::string& store) {
         files_.push_back(path() + suffix);
     }
     for (int tries = 0; tries < kTries; ++tries) {
-        // A checkpoint moves pages from the log to the store: both copies must be of one moment.
+        // A checkpoint moves pages from the log to the store, so both must be copied at one moment.
         const std::array before = {stampOf(store), stampOf(store + kLogSuffix)};
         std::remove((path() + kLogSuffix).c_str());
         int error = copyFile(store, path());

@@ -9,7 +9,7 @@ namespace kz7 {
 namespace {
 
 constexpr std::string_view kCallersSid = "S-1-22-1-0";
-// Clear of the roots, and of the numbers that other ports give out.
+// Above the numbers of the roots and of the handles of other ports.
 constexpr std::uint64_t kFirstHandle = std::uint64_t{1} << 32;
 
 }  // namespace
