@@ -1,4 +1,4 @@
-// What the embedded store adds to the port's contract: transactions, other processes, faults.
+// What the embedded store guarantees beyond the contract of the port: transactions, other processes, faults.
 #include "install/platform/embedded/registry.h"
 
 #include <gtest/gtest.h>
@@ -19,7 +19,7 @@ namespace {
 
 constexpr KeyHandle kMachine = KeyHandle::localMachine;
 
-// One process's view of a store; two of them are two processes to SQLite.
+// A view of one process; SQLite treats two of them as two processes.
 class EmbeddedStore : public testing::Test {
 protected:
     EmbeddedRegistry open() {

@@ -14,7 +14,7 @@ namespace {
 using namespace std::literals;
 using Response = UREInfo::Response;
 
-TEST(ProtocolLines, KeepTheirLineFeedAndTellNoOtherEvent) {
+TEST(ProtocolLines, EndInALineFeedWhenCutAndIgnoreOtherEvents) {
     ProtocolLine line;
     EXPECT_TRUE(progressLine({ProgressKind::end, 0, 1, true, std::string(5000, 'x')}, line));
     EXPECT_EQ(line.view().size(), 1023U);
@@ -26,7 +26,7 @@ TEST(ProtocolLines, KeepTheirLineFeedAndTellNoOtherEvent) {
     EXPECT_EQ(many.identifiers.view().size(), 1024U);
 }
 
-TEST(ProtocolLines, TakeAnswers) {
+TEST(ProtocolLines, ParseAnswers) {
     const auto all = [](std::initializer_list<const char*> lines, AnswerLine answer) {
         for (const char* line : lines) {
             EXPECT_EQ(parseAnswer(line), answer) << line;
@@ -57,9 +57,9 @@ TEST(Pipe, WritesWhatIsQueuedCutAndWithPercentSignsOnce) {
     EXPECT_EQ(machine.console_.flushed, machine.console_.output.size());
 }
 
-// As an installer makes it: tasks, errors, questions, a roll-back. Entries of a task list are cut as a whole,
-// and a line that is longer than any answer is one line.
-TEST(MachineStream, TellsAWholeRunToTheByte) {
+// The calls of an installer: tasks, errors, questions, a roll-back. Entries of a task list are cut as a whole, and an
+// answer line that is too long is one line.
+TEST(MachineStream, WritesAWholeRunExactly) {
     RuntimeMachine machine;
     URE& engine = machine.engine;
     machine.terminal_.input = "RESPONSE :: E\r\n" + std::string(5000, 'x') + "ABORT\nABORT\n";
@@ -110,7 +110,7 @@ TEST(MachineStream, TellsAWholeRunToTheByte) {
         "MESSAGE INFO INSTALLEND :: C:\\Setup Logs\\setup.log\n");
 }
 
-TEST(HumanStream, IsReadableAndAsWideAsTheTerminal) {
+TEST(HumanStream, FitsTheTerminal) {
     RuntimeMachine machine;
     URE& engine = machine.engine;
     machine.terminal_.view = {.terminal = true, .redraws = true, .colours = true, .columns = 30};

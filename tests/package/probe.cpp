@@ -48,7 +48,7 @@ std::vector<std::string> actionData(MSIHANDLE installation) {
 
 template <typename Function>
 Function entryPoint(MSIHANDLE installation, const char* name) {
-    // Cast by way of a function type: FARPROC converts to no other one without a warning.
+    // Cast through a function type: any other conversion of FARPROC is a warning.
     const HMODULE library = LoadLibraryA(actionData(installation).front().c_str());
     return reinterpret_cast<Function>(reinterpret_cast<void (*)()>(GetProcAddress(library, name)));
 }

@@ -16,10 +16,10 @@ namespace kz7::test {
 
 // Known differences of an implementation. In everything else it must behave like the others.
 struct Differences {
-    bool ordersValuesByName = false;     // instead of by when they were first set
+    bool ordersValuesByName = false;     // instead of in insertion order
     bool ordersKeysByLowerCase = false;  // "_" before the letters
     bool foldsBeyondAscii = false;       // names that differ in the case of other letters are one
-    bool passesClassesOn = false;        // to new parents, and to the key when it is there already
+    bool passesClassesOn = false;        // to new parents, and to an existing key
     bool startsDeletedServices = false;  // while they are still open
     bool needsFramework = false;         // to keep data providers
     bool usesHandlesAgain = false;       // a closed handle may be that of another file
@@ -32,8 +32,8 @@ public:
     virtual IPlatform& platform() = 0;
     virtual Differences differences() const { return {}; }
 
-    // The product's path of a folder that is there, of a program in it that can run as a service, and of the sample
-    // copy's level library in it.
+    // The product path of an existing folder, of a program in it that can run as a service, and of the sample copy's
+    // level library in it.
     virtual std::string folder() = 0;
     std::string program() { return folder() + "\\Program.exe"; }
     std::string library() { return folder() + "\\kz7install64.dll"; }
@@ -52,7 +52,7 @@ inline constexpr const char* kBackends[] = {"memory", "host"};
 
 std::unique_ptr<Backend> backendNamed(const std::string& name);
 
-// This machine's ports, and what goes into the folder that they see.
+// This machine's ports, and the folder that they use.
 struct HostPorts {
     std::unique_ptr<IPlatform> platform;
     std::string folder;
@@ -64,8 +64,8 @@ struct HostPorts {
 // `place` is a folder of the host that only this object uses.
 HostPorts hostPorts(const std::string& place);
 
-// The path of the program that the tests start, in the host's form, and how much it writes on each stream in a flood:
-// a pipe is slow where the host is emulated.
+// The path of the child program, in the host's form, and the size of its output on each stream in a flood: pipes of an
+// emulated host are slow.
 std::string childProgram();
 extern const std::size_t kFloodMebibytes;
 
@@ -74,7 +74,7 @@ extern const bool kExitCodesAreWhole;
 
 void setSearchPath(const std::string& path);
 
-// For what a system shows only a moment later: that a thread, a child or a service has ended.
+// For states that a system shows only after a moment: the end of a thread, a child or a service.
 inline bool eventually(const std::function<bool()>& holds) {
     bool held = holds();
     for (int i = 0; i < 1'000'000 && !held; ++i) {
@@ -84,7 +84,7 @@ inline bool eventually(const std::function<bool()>& holds) {
     return held;
 }
 
-// What every contract suite begins with: one of the implementations.
+// The base of every contract suite: one of the implementations.
 class Contract : public testing::TestWithParam<const char*> {
 protected:
     std::unique_ptr<Backend> backend_ = backendNamed(GetParam());

@@ -53,7 +53,7 @@ pid_t startProgram(const std::vector<std::string>& command, const ProgramOptions
 }
 
 ProgramResult runProgram(const std::vector<std::string>& command, const ProgramOptions& options) {
-    // Files, not pipes: nothing of a flood can block, and a program that outlives its parent holds nobody up.
+    // Files instead of pipes: large output cannot block, and a program that outlives its parent delays nothing.
     const TemporaryDirectory scratch;
     const std::string output = scratch.path() + "/output";
     const std::string error = scratch.path() + "/error";

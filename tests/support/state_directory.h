@@ -18,7 +18,7 @@ public:
     const std::string& path() const { return directory_.path(); }
     std::string file(const std::string& name) const { return path() + "/" + name; }
 
-    // Runs a program of the project, or the tool, on this store.
+    // Runs a program of the project or the tool on this store.
     ProgramResult run(const std::string& program, Arguments arguments, ProgramOptions options = {}) const;
     ProgramResult tool(Arguments arguments, ProgramOptions options = {}) const {
         return run("kz7InstallReg", std::move(arguments), std::move(options));
@@ -31,12 +31,12 @@ public:
     // Starts the tool without waiting; output and errors are dropped.
     pid_t start(Arguments arguments) const;
 
-    // Everything in the store of a folder, or this one; a missing store reads as empty. The text
-    // contains the faults of the store.
+    // The content of the store of a folder, or of this one; a missing store reads as empty. The text contains the
+    // faults of the store.
     static std::string dumpOf(const std::string& folder);
     std::string dump() const { return dumpOf(path()); }
 
-    // "ok", or what SQLite's own check finds.
+    // The result of SQLite's integrity check.
     std::string integrity() const;
 
     void copyFrom(const StateDirectory& other) const;

@@ -48,7 +48,7 @@ const char* fileSystemOfGivenNames() {
     return known ? system.zName : nullptr;
 }
 
-// The error number of a failure, or 0 if there is none. SQLite returns it for calls that open and read, but stores that
+// The error number of a failure, or 0. SQLite returns it for calls that open and read, but stores that
 // of a failed sync with the file.
 int systemError(sqlite3* connection) {
     int error = connection == nullptr ? 0 : sqlite3_system_errno(connection);
