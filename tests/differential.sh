@@ -21,9 +21,8 @@ fi
 linux=$(realpath "$1")
 windows=$(realpath "$2")
 folder=$(mktemp -d)
-trap 'rm -rf "$folder"' EXIT
-set -E
-trap 'echo "FAILED: line $LINENO: $BASH_COMMAND" >&2' ERR
+finished=
+trap 'status=$?; [ -n "$finished" ] || echo "FAILED: status $status of: $BASH_COMMAND"; rm -rf "$folder"' EXIT
 export KZ7_STATE_DIR=$folder/state
 cd "$folder"
 
@@ -91,6 +90,7 @@ same() {
 }
 
 finish() {
+    finished=yes
     echo "differential: $rows commands, $failed differ"
     exit $((failed != 0))
 }
