@@ -1,6 +1,6 @@
-// The version aliases for 10 to 100,000 copies: computing them beside one bare pass over the sorted version
-// texts, for versions of several shapes, and beside one over the records of the copies, and the whole rewrite on the
-// embedded store beside a bare SQLite program that reads and writes the same rows of the same file.
+// The version aliases for 10 to 100,000 copies: their computation compared with one pass over the sorted version texts,
+// for versions of several shapes, and over the records of the copies; and the whole rewrite on the embedded store
+// compared with a bare SQLite program that reads and writes the same rows of the same file.
 #include <benchmark/benchmark.h>
 #include <sqlite3.h>
 
@@ -15,14 +15,14 @@
 #include "bench/scratch.h"
 #include "install/platform/embedded/ports.h"
 #include "install/platform/embedded/registry.h"
-#include "install/src/copies/install_copies_profile.h"
+#include "install/src/copies/alias_rewrite.h"
 
 namespace kz7 {
 namespace {
 
 using SortedCopies = std::map<std::string, std::string>;  // version text -> name
 
-// The debugger output of this machine, which nobody listens to.
+// The debugger output of this machine, which nobody reads.
 struct Debug {
     const std::unique_ptr<IConsole> console = standardConsole();
     const std::unique_ptr<IDebugOutput> output = embeddedDebugOutput(*console);
@@ -36,12 +36,12 @@ void require(bool condition, const char* what) {
 
 using Version = std::array<std::string, 4>;  // its four fields
 
-// 100 fix levels to a modification.
+// 100 fix levels for each modification.
 Version balanced(std::int64_t copy) {
     return {"9", std::to_string(copy / 10000), std::to_string(copy / 100 % 100), std::to_string(copy % 100)};
 }
 
-// Ten texts of which each begins with the one before.
+// Ten texts, each a prefix of the next.
 Version prefixesOfOneAnother(std::int64_t copy) {
     std::string fixLevel = "0";
     for (std::int64_t more = 0; more < copy % 10; ++more) {
@@ -50,7 +50,7 @@ Version prefixesOfOneAnother(std::int64_t copy) {
     return {"9", std::to_string(copy / 1000), std::to_string(copy / 10 % 100), fixLevel};
 }
 
-// As balanced, each fix level a word in which any letter may be written in either case.
+// Balanced; each fix level is a word whose letters have either case.
 Version bothCases(std::int64_t copy) {
     std::string word = "fixpack";
     const std::uint64_t spelling = static_cast<std::uint64_t>(copy) * 0x9E3779B97F4A7C15U >> 32U;
@@ -62,14 +62,14 @@ Version bothCases(std::int64_t copy) {
     return version;
 }
 
-// The same word, all of them in one modification.
+// The same word in a single modification.
 Version bothCasesTogether(std::int64_t copy) {
     return {"9", "7", "0", bothCases(copy)[3] + std::to_string(copy / 4)};
 }
 
 using Shape = Version (*)(std::int64_t copy);
 
-// A state directory with that many copies in it and their aliases.
+// A state directory with that many copies and their aliases.
 class StoreWithCopies {
 public:
     StoreWithCopies(std::int64_t copies, Shape shape) {
@@ -104,7 +104,7 @@ private:
     Debug debug_;
 };
 
-// The store that was asked for last is kept: a benchmark is called anew for every estimate of its length.
+// Keeps the last store: the library calls a benchmark again for each estimate of its length.
 const StoreWithCopies& storeWith(std::int64_t copies, Shape shape) {
     static std::unique_ptr<StoreWithCopies> kept;
     static std::pair<std::int64_t, Shape> what;
@@ -116,8 +116,8 @@ const StoreWithCopies& storeWith(std::int64_t copies, Shape shape) {
     return *kept;
 }
 
-// Every prefix is given to the greatest text that has it: what no program can do without. Case is not looked
-// at, and the prefixes that a text shares with its neighbour are passed over.
+// Assigns every prefix to the greatest text that has it, the minimum of work. Ignores case and skips the prefixes that
+// a text shares with its neighbour.
 template <class Copies>
 void onePass(const Copies& copies, AliasMap& aliases) {
     std::string_view greater;
@@ -144,7 +144,7 @@ void onePassOverSortedTexts(benchmark::State& state, Shape shape) {
         benchmark::DoNotOptimize(aliases);
     }
     profile.generateProfileInfo();
-    // Which copy answers is another matter where case or whole versions count.
+    // With letters or whole versions the copies may differ.
     require(shape == balanced ? aliases == profile.profileInfo() : aliases.size() == profile.profileInfo().size(),
             "both compute the same");
     state.SetComplexityN(state.range(0));
@@ -173,8 +173,8 @@ void aliasRewrite(benchmark::State& state) {
     state.SetComplexityN(state.range(0));
 }
 
-// The rewrite as a program would do it that knows this file and nothing else: prepared statements, every row
-// found by its key, one cursor over the subkeys and one over the values of each view.
+// The rewrite in a program for this file only: prepared statements, each row found by its key, one cursor for the
+// subkeys and one for the values of each view.
 class BareProgram {
 public:
     explicit BareProgram(const std::string& file) {

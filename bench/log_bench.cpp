@@ -1,5 +1,5 @@
-// Flushed lines of the runtime against spdlog's with a flush per line: a log line with its time, an info in the
-// log, a protocol line, and what an info to all three observers allocates. Standard output goes to a file meanwhile.
+// Flushed lines of the runtime compared with spdlog's, flushed for each line: a log line with its time, an info in the
+// log, a protocol line, and the allocations of an info to all three observers. Standard output goes to a file.
 #include <benchmark/benchmark.h>
 #include <fcntl.h>
 #include <spdlog/logger.h>
@@ -23,7 +23,7 @@ static std::uint64_t allocations = 0;
 
 }  // namespace kz7::bench
 
-// Not inlined: gcc would take the pair for a mismatch.
+// Not inlined: otherwise gcc reports the pair as a mismatch.
 [[gnu::noinline]] void* operator new(std::size_t size) {
     ++kz7::bench::allocations;
     void* const memory = std::malloc(size);
@@ -44,7 +44,7 @@ static std::uint64_t allocations = 0;
 namespace kz7 {
 namespace {
 
-// The product's spelling of a file in the folder.
+// The product path of a file in the folder.
 std::string productPath(const Scratch& scratch, const std::string& name) {
     std::string path = scratch.file(name);
     std::replace(path.begin(), path.end(), '/', '\\');

@@ -1,7 +1,6 @@
-// Running a program with its output captured against the bare calls, in pairs of the same run: what is captured
-// against one loop that reads a pipe and appends; start and end against posix_spawn() with two pipes that two
-// threads drain. KZ7_BENCH_LARGE=1 adds the capture of 1 GiB. The ratio is of the
-// fastest tenth of each.
+// Running a program with its output captured, compared with the bare calls in pairs: the capture with one loop that
+// reads a pipe and appends; start and end with posix_spawn() and two pipes that two threads read. KZ7_BENCH_LARGE=1
+// adds the capture of 1 GiB. The ratio is that of the fastest tenth of each.
 #include <benchmark/benchmark.h>
 #include <fcntl.h>
 #include <spawn.h>
@@ -96,14 +95,14 @@ void runOurs(std::size_t mebibytes) {
     require(process.waitForCompletion(code, kInfiniteWait) == kSuccess && code == 0);
 }
 
-// The tenth below which the fastest runs lie: what else the machine does shows least there.
+// The limit of the fastest tenth, which other load affects least.
 double fastest(std::vector<double>& seconds) {
     const auto at = seconds.begin() + static_cast<std::ptrdiff_t>(seconds.size() / 10);
     std::nth_element(seconds.begin(), at, seconds.end());
     return *at;
 }
 
-// The two in turn, so that whatever else the machine does falls on both.
+// Alternates, so that other load affects both.
 void inPairs(benchmark::State& state, const std::function<void()>& ours, const std::function<void()>& bare) {
     const auto timed = [](const std::function<void()>& run) {
         const auto begin = std::chrono::steady_clock::now();
@@ -127,13 +126,12 @@ void inPairs(benchmark::State& state, const std::function<void()>& ours, const s
 
 void capture(benchmark::State& state) {
     const auto mebibytes = static_cast<std::size_t>(state.range(0));
-    // A terminator more than what was written is nothing to measure; NUL bytes would end the text early.
+    // The output must not contain NUL bytes, which would end the text.
     inPairs(
         state, [=] { runOurs(mebibytes); }, [=] { captureBare(mebibytes); });
 }
 
-// By the mebibytes in use and the limit of open files: 0 for this session's own, else as much of it as this
-// session may have.
+// By the mebibytes in use and the limit of open files: 0 for that of this session, which is also the maximum.
 void startAndWait(benchmark::State& state) {
     const auto bytes = static_cast<std::size_t>(state.range(0)) << 20;
     const std::vector<char> inUse(bytes, 'x');

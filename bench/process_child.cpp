@@ -1,5 +1,4 @@
-// What the benchmarks of process execution start: `process_child MIB` writes that much, and without it ends at
-// once.
+// The child of the process benchmarks: `process_child MIB` writes that much; without an argument it ends at once.
 #include <unistd.h>
 
 #include <cstdlib>

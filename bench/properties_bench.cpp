@@ -1,4 +1,4 @@
-// Many installer properties saved and read back, and long response files: both take time in proportion.
+// Many installer properties saved and read back, and long response files; both must take linear time.
 #include <benchmark/benchmark.h>
 
 #include <cstdlib>

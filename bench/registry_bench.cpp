@@ -1,5 +1,5 @@
-// The registry layer on the embedded store against bare SQLite: the writes of an add, copies and deletions of
-// trees in three shapes, enumeration by index, the list of copies.
+// The registry layer on the embedded store compared with bare SQLite: the writes of an add, copies and deletions of
+// trees of three shapes, enumeration by index, the list of copies.
 #include <benchmark/benchmark.h>
 
 #include <cstdlib>
@@ -10,7 +10,7 @@
 #include "install/platform/embedded/ports.h"
 #include "install/platform/embedded/registry.h"
 #include "install/platform/service_records.h"
-#include "install/src/copies/install_copy_list.h"
+#include "install/src/copies/copy_list.h"
 #include "install/src/held_console.h"
 #include "install/src/registry/registry_access.h"
 #include "install/src/version8.h"
@@ -29,7 +29,7 @@ EmbeddedRegistry openStore(const Scratch& scratch) {
     return {scratch.path(), false, [](const StoreFault&) { std::abort(); }};
 }
 
-// The tables of the store without anything around them.
+// The tables of the store and nothing else.
 class BareStore {
 public:
     explicit BareStore(const Scratch& scratch) {
@@ -191,7 +191,7 @@ void treeDeleteBare(benchmark::State& state) {
 }
 BENCHMARK(treeDeleteBare)->Apply(arguments);
 
-// A version-8 registry with such a tree below PROFILES, to version 9 and back, providers left out.
+// Migrates a version-8 registry with such a tree below PROFILES to version 9 and back, without the providers.
 void migrationThereAndBack(benchmark::State& state) {
     const Scratch scratch;
     fill(scratch, static_cast<Shape>(state.range(0)), state.range(1));
@@ -214,7 +214,7 @@ void migrationThereAndBack(benchmark::State& state) {
 }
 BENCHMARK(migrationThereAndBack)->Apply(arguments);
 
-// One step of an enumeration that stands at the index asked for.
+// One step of an enumeration at the given index.
 void enumerateAt(benchmark::State& state) {
     const Scratch scratch;
     fill(scratch, state.range(0) == 0 ? wide : flat, 100000 + 10000);
@@ -234,7 +234,7 @@ void enumerateAt(benchmark::State& state) {
 }
 BENCHMARK(enumerateAt)->ArgNames({"values", "index"})->ArgsProduct({{0, 1}, {10, 100000}})->Iterations(9000);
 
-// The forty-some writes of an add, in one transaction that is committed.
+// The writes of an add, in one transaction that is committed.
 void addWrites(benchmark::State& state) {
     const Scratch scratch;
     EmbeddedRegistry registry = openStore(scratch);

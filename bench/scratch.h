@@ -1,4 +1,4 @@
-// A folder of a benchmark's own that goes with the object.
+// A folder of a benchmark, deleted with the object.
 #pragma once
 
 #include <cstdlib>

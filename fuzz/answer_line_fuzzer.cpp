@@ -1,4 +1,4 @@
-// Whatever a front end sends, a question takes one line of it and is answered, aborted or left as it was.
+// A question consumes one line of any input and is answered, aborted or unchanged.
 #include "fuzz/fuzzer.h"
 #include "tests/support/runtime_machine.h"
 

@@ -1,5 +1,5 @@
-// Whatever a path holds, both stores of our own answer it alike; what was made is there, and goes again. The
-// first line is the path, the rest a copy name.
+// The memory store and the embedded store treat any path alike; a created key exists and can be deleted. The first line
+// is the path, the rest a copy name.
 #include "fuzz/fuzzer.h"
 #include "install/platform/embedded/paths.h"
 #include "install/platform/embedded/registry.h"
@@ -11,7 +11,7 @@
 
 using namespace kz7;
 
-// What the operations on a path give, and what they leave.
+// The results of the operations on a path, and the store after them.
 static std::string outcome(IRegistryStore& registry, std::string_view path, AccessMask view) {
     OwnedKey key(registry);
     FixedBuffer<16> data;
@@ -35,7 +35,7 @@ void tryInput(std::string_view input) {
     static const test::TemporaryDirectory directory;
     for (const AccessMask view : {AccessMask{0}, kKeyView32}) {
         MemoryRegistry memory;
-        // Nothing is committed, so every input finds the store empty.
+        // Commits nothing, so that every input starts with an empty store.
         EmbeddedRegistry embedded(directory.path(), false, [](const StoreFault&) { std::abort(); });
         check(outcome(memory, path, view) == outcome(embedded, path, view));
         check(memory.openHandles() == 0);

@@ -1,5 +1,4 @@
-// Whatever a program writes, the front end shows it, in whatever pieces it comes, and what it shows steers no
-// terminal.
+// The front end shows any output of a program, in pieces of any size, and no control character reaches the terminal.
 #include "fuzz/fuzzer.h"
 #include "install/admin/front/front.h"
 #include "install/platform/memory/platform.h"

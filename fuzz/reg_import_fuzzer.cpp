@@ -1,5 +1,5 @@
-// Whatever a file holds, it is refused or it imports; and what it made exports to a text that makes the same
-// store again, in both encodings.
+// Any file is refused or imported, and the export of the imported store produces the same store again in both
+// encodings.
 #include "fuzz/fuzzer.h"
 #include "install/admin/formats/reg_text.h"
 #include "install/platform/memory/registry.h"

@@ -1,5 +1,5 @@
-// Whatever a file holds, it is refused with a line and a reason, or its keywords written out again read the
-// same; and as a catalogue it never breaks a text.
+// Any file is refused with a line and a reason, or its keywords are the same after they are written and read again; as
+// a catalogue it leaves all texts usable.
 #include <algorithm>
 
 #include "fuzz/fuzzer.h"

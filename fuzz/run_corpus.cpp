@@ -1,4 +1,4 @@
-// Gives a fuzzer's kept inputs to it without the fuzzing library, so that every build checks them.
+// Runs a fuzzer on its committed inputs without the fuzzing library, so that every build checks them.
 #include <cstdint>
 #include <cstdio>
 #include <filesystem>

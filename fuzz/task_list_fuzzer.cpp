@@ -1,5 +1,5 @@
-// Whatever a task list holds, its lines keep to their lengths and to one line each, and a reader finds as many
-// fields as were counted where nothing was cut.
+// The lines of any task list keep their maximum length and contain no line end, and a reader finds as many fields as
+// were counted unless the list was cut.
 #include "fuzz/fuzzer.h"
 #include "install/admin/front/protocol_reader.h"
 #include "install/runtime/observers/protocol_lines.h"
@@ -13,7 +13,7 @@ void tryInput(std::string_view input) {
     const bool plain = input.find_first_of(" \r\n:") == std::string_view::npos;
     for (const std::string_view line : {lines.identifiers.view(), lines.times.view()}) {
         check(line.size() <= 1024 && line.find_first_of(std::string_view("\r\n\0", 3)) == std::string_view::npos);
-        // A last field that is empty leaves a separator behind which nothing comes.
+        // After an empty last field nothing follows the separator.
         const kz7::ProtocolEvent event = kz7::readProtocolLine(line);
         const auto fields = static_cast<std::int32_t>(event.fields.size()) + (line.ends_with(" :: ") ? 1 : 0);
         check(!plain || line.size() == 1024 || fields == count.task);

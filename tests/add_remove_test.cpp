@@ -11,7 +11,7 @@ const std::string kCopies = "SOFTWARE\\NVQ\\KZ7\\InstalledCopies";
 const std::string kCopies32 = "SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies";
 const std::string kEventSource = "SYSTEM\\CurrentControlSet\\Services\\EventLog\\Application\\KZ7 Management Service";
 
-// In a text, '#' stands for the copy's key and '@' for its location.
+// In a text, '#' is the copy's key and '@' its location.
 std::string filled(const std::string& text, const std::string& key, const std::string& location) {
     std::string result;
     for (const char c : text) {
@@ -49,7 +49,7 @@ std::string copyDump(const std::string& key, const std::string& location) {
 
 TEST(AddCopy, WritesBothViewsTheServiceAndItsEventSource) {
     Machine machine;
-    EXPECT_EQ(machine.told({"-ADDkz7copy", "COPY1", "C:\\old\\100%s"}),
+    EXPECT_EQ(machine.result({"-ADDkz7copy", "COPY1", "C:\\old\\100%s"}),
               addLines("COPY1", "C:\\old\\100%s") + "COPY1 install copy at C:\\old\\100%s added successfully\n||0");
     for (const std::string& key : {kCopies + "\\COPY1", kCopies32 + "\\COPY1"}) {
         EXPECT_EQ(machine.dump(key), copyDump(key, "C:\\old\\100%s"));
@@ -104,7 +104,7 @@ TEST(AddCopy, UsesNamesUnchanged) {
     EXPECT_EQ(machine.console_.error, failure + kCopies + "\\" + longName + " with value C:\\KZ7 : rc= 87\n" + failure +
                                           kCopies32 + "\\" + longName + " with value C:\\KZ7 : rc= 87\n" + kPrefix +
                                           "941: Unable to add a new copy of KZ7 to this machine : rc = 87\n");
-    EXPECT_EQ(machine.told({"-addKZ7Copy", "a\\b", "C:\\KZ7"}),
+    EXPECT_EQ(machine.result({"-addKZ7Copy", "a\\b", "C:\\KZ7"}),
               addLines("a\\b", "C:\\KZ7") +
                   "An error occurred while registering the KZ7 Management Service\n"
                   "The KZ7 Management service could not be started - some function not \n"
@@ -121,10 +121,10 @@ TEST(RemoveCopy, DeletesTheNativeTreeAndTheServiceAndTheLastOneTheProduct) {
     machine.set(kCopies, "9", "COPY1");
     machine.run({"-addKZ7Copy", "COPY2", "C:\\two"});
     const std::string before = machine.dump();
-    EXPECT_EQ(machine.told({"-removeKZ7Copy", "%s"}), "The KZ7 Copy %s was not found\n||5021");
+    EXPECT_EQ(machine.result({"-removeKZ7Copy", "%s"}), "The KZ7 Copy %s was not found\n||5021");
     EXPECT_EQ(machine.dump(), before);
 
-    EXPECT_EQ(machine.told({"-removekz7copy", "copy1"}), "The KZ7 Copy copy1 has been removed||0");
+    EXPECT_EQ(machine.result({"-removekz7copy", "copy1"}), "The KZ7 Copy copy1 has been removed||0");
     EXPECT_EQ(machine.dump(kCopies),
               kCopies + " : 9 = 1:COPY1\\x00\n[" + kCopies + "\\COPY2] \n" + copyDump(kCopies + "\\COPY2", "C:\\two"));
     EXPECT_TRUE(machine.has(kCopies32 + "\\COPY1\\Components"));
@@ -134,19 +134,19 @@ TEST(RemoveCopy, DeletesTheNativeTreeAndTheServiceAndTheLastOneTheProduct) {
     const std::string stem(64, 'n');
     const std::string longest(255, 'k');
     for (const std::string& name : {stem + "one", stem + "two", longest}) {
-        machine.set(kCopies + "\\" + name, "KZ7 Path Name", "C:\\x");
+        machine.set(compose("%s\\%s", {kCopies, name}), "KZ7 Path Name", "C:\\x");
     }
     EXPECT_EQ(machine.run({"-removeKZ7Copy", stem}), kMissingItem) << "it agrees in 64 characters only";
     EXPECT_EQ(machine.run({"-removeKZ7Copy", stem + "TWO"}), kSuccess);
     EXPECT_TRUE(machine.has(kCopies + "\\" + stem + "one") && !machine.has(kCopies + "\\" + stem + "two"));
     for (const std::string& name : {stem + "one", longest}) {
         EXPECT_EQ(machine.run({"-removeKZ7Copy", name}), kSuccess);
-        EXPECT_TRUE(machine.has(kCopies + "\\COPY2") && !machine.has(kCopies + "\\" + name));
+        EXPECT_TRUE(machine.has(kCopies + "\\COPY2") && !machine.has(compose("%s\\%s", {kCopies, name})));
     }
     machine.set(kCopies + "\\NoService", "KZ7 Path Name", "C:\\x");
-    EXPECT_EQ(machine.told({"-removeKZ7Copy", "NoService"}), "The KZ7 Copy NoService has been removed||0");
+    EXPECT_EQ(machine.result({"-removeKZ7Copy", "NoService"}), "The KZ7 Copy NoService has been removed||0");
     machine.set("SOFTWARE\\NVQ\\KZ7\\Other", "v", "");
-    EXPECT_EQ(machine.told({"-removeKZ7Copy", "COPY2"}), "The KZ7 Copy COPY2 has been removed||0");
+    EXPECT_EQ(machine.result({"-removeKZ7Copy", "COPY2"}), "The KZ7 Copy COPY2 has been removed||0");
     EXPECT_FALSE(machine.has("SOFTWARE\\NVQ\\KZ7"));
     EXPECT_TRUE(machine.has("SOFTWARE\\NVQ"));
     EXPECT_TRUE(machine.has(kCopies32 + "\\COPY2"));
@@ -180,7 +180,7 @@ TEST(CommandLine, AnythingElsePrintsTheUsage) {
     };
     for (const auto& row : rows) {
         Machine machine;
-        EXPECT_EQ(machine.told(row),
+        EXPECT_EQ(machine.result(row),
                   "Supported Command Line Options\n\n\n -addKZ7Copy [installName] [installLocation] - this will set up "
                   "a computer to for \n very basic KZ7 functionality. This option depends on a valid directory "
                   "existing \n with all of the files needed for KZ7 to operate properly that is specified with \n the "

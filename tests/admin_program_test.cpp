@@ -1,4 +1,4 @@
-// kz7admin as people run it: what it shows, what it answers, and that a store stays as it was where it fails.
+// kz7admin as a program: its output and exit codes, and that a failure does not change a store.
 #include <gtest/gtest.h>
 #include <sqlite3.h>
 
@@ -29,8 +29,8 @@ protected:
         return files_.path() + "/file.reg";
     }
 
-    std::string told(const std::string& line) const { return "kz7admin: " + line + "\n"; }
-    std::string storeTold() const { return told("store " + store_.file("registry.db")); }
+    std::string adminError(const std::string& line) const { return "kz7admin: " + line + "\n"; }
+    std::string storeLine() const { return adminError("store " + store_.file("registry.db")); }
 
     StateDirectory store_;
     TemporaryDirectory files_;
@@ -40,7 +40,7 @@ TEST_F(AdminProgram, MovesWhatTheToolWroteToAnotherStore) {
     ASSERT_EQ(store_.tool({"-addKZ7Copy", "Copy\xE9", "C:\\KZ7\\\x1B[31m"}).exitCode, 0);
     const ProgramResult exported = admin({"export"});
     EXPECT_EQ(exported.exitCode, 0);
-    EXPECT_EQ(exported.error, storeTold());
+    EXPECT_EQ(exported.error, storeLine());
     for (const char* const form : {"", "--utf16"}) {
         const StateDirectory other;
         const ProgramResult moved = store_.shell("kz7admin export "s + form + " | " + programPath("kz7admin") +
@@ -68,7 +68,7 @@ TEST_F(AdminProgram, ShowsForReadingAndForPrograms) {
     ASSERT_EQ(admin({"import", path}).exitCode, 0);
     const ProgramResult tree = admin({"tree"});
     EXPECT_EQ(tree.exitCode, 0);
-    EXPECT_EQ(tree.error, storeTold());
+    EXPECT_EQ(tree.error, storeLine());
     EXPECT_EQ(tree.output, R"(HKEY_LOCAL_MACHINE
   K (class "c\x1b")
     @ REG_SZ "a\b"
@@ -82,7 +82,7 @@ TEST_F(AdminProgram, ShowsForReadingAndForPrograms) {
     Sub
 )");
     const ProgramResult json = admin({"export", "--json", "HKLM\\K"});
-    EXPECT_EQ(json.error, storeTold());
+    EXPECT_EQ(json.error, storeLine());
     EXPECT_EQ(json.output, "{\"store\":\"" + store_.file("registry.db") +
                                R"(","keys":[
 {"key":"HKEY_LOCAL_MACHINE\\K","class":"c\u001b","values":[
@@ -98,27 +98,27 @@ TEST_F(AdminProgram, ShowsForReadingAndForPrograms) {
 )");
 }
 
-TEST_F(AdminProgram, AnswersNoAndTellsFaults) {
+TEST_F(AdminProgram, ReportsMissingKeysAndFaults) {
     const std::string missing = store_.file("registry.db");
     const std::string bad = file(std::string(kHead) + "[HKLM\\a]\n\"x\"=\"y\"\n[HKLM\\b]\nrubbish\n");
     const std::string unnamable = "HKU\\" + std::string(256, 'x');
     // clang-format off
     const struct { std::vector<std::string> arguments; int exitCode; std::string output; std::string error; } rows[] = {
-        {{"tree"},                1, "", told("nothing to show: " + missing)},
-        {{"export"},              1, kHead, storeTold() + told("nothing to show: " + missing)},
-        {{"export", "HKU\\x\n"},  1, "", told("no such key: HKEY_USERS\\x\\x0a")},
-        {{"tree", "HKCU"},        1, "", told("no such key: HKEY_CURRENT_USER")},
-        {{"tree", unnamable},     2, "", told("invalid key name: HKEY_USERS" + unnamable.substr(3))},
-        {{"import", bad},         2, "", told(bad + ":5: the line is no key, no value and no comment")},
-        {{"import", store_.path()}, 2, "", told(store_.path() + ": Is a directory")},
-        {{"import", "/none/such"},  2, "", told("/none/such: No such file or directory")},
-        {{},                      2, "", told("no command (see --help)")},
-        {{"rubbish"},             2, "", told("The following argument was not expected: rubbish (see --help)")},
-        {{"export", "--json", "--utf16"}, 2, "", told("--utf16 excludes --json (see --help)")},
-        {{"tree", "--store="},    2, "", told("--store: 1 required TEXT missing (see --help)")},
-        {{"copies", "--store", "/dev/null"},  2, "", told("/dev/null: Not a directory")},
-        {{"aliases", "--store", "/none/such"}, 2, "", told("/none/such: No such file or directory")},
-        {{"import"},              2, "", told("FILE is required (see --help)")},
+        {{"tree"},                1, "", adminError("nothing to show: " + missing)},
+        {{"export"},              1, kHead, storeLine() + adminError("nothing to show: " + missing)},
+        {{"export", "HKU\\x\n"},  1, "", adminError("no such key: HKEY_USERS\\x\\x0a")},
+        {{"tree", "HKCU"},        1, "", adminError("no such key: HKEY_CURRENT_USER")},
+        {{"tree", unnamable},     2, "", adminError("invalid key name: HKEY_USERS" + unnamable.substr(3))},
+        {{"import", bad},         2, "", adminError(bad + ":5: the line is no key, no value and no comment")},
+        {{"import", store_.path()}, 2, "", adminError(store_.path() + ": Is a directory")},
+        {{"import", "/none/such"},  2, "", adminError("/none/such: No such file or directory")},
+        {{},                      2, "", adminError("no command (see --help)")},
+        {{"rubbish"},             2, "", adminError("The following argument was not expected: rubbish (see --help)")},
+        {{"export", "--json", "--utf16"}, 2, "", adminError("--utf16 excludes --json (see --help)")},
+        {{"tree", "--store="},    2, "", adminError("--store: 1 required TEXT missing (see --help)")},
+        {{"copies", "--store", "/dev/null"},  2, "", adminError("/dev/null: Not a directory")},
+        {{"aliases", "--store", "/none/such"}, 2, "", adminError("/none/such: No such file or directory")},
+        {{"import"},              2, "", adminError("FILE is required (see --help)")},
     };
     // clang-format on
     for (const auto& row : rows) {
@@ -140,13 +140,13 @@ TEST_F(AdminProgram, ReadsAStoreWhoseDirectoryItMayNotWrite) {
     for (const char* const missing : {"-none", "-shm", "-wal"}) {
         unlink(store_.file("registry.db"s + missing).c_str());
         const ProgramResult result = admin({"export"}, {.environment = {}, .inChild = asOther});
-        // All of this store is still in its log.
+        // The whole store is still in its log.
         EXPECT_EQ(result.exitCode, missing == "-wal"s ? 1 : 0) << missing << result.error;
         EXPECT_EQ(result.output == whole, missing != "-wal"s) << missing;
     }
     ASSERT_EQ(chmod(store_.file("registry.db").c_str(), 0), 0);
     EXPECT_EQ(admin({"tree"}, {.environment = {}, .inChild = asOther}).error,
-              told(store_.file("registry.db") + ": Permission denied"));
+              adminError(store_.file("registry.db") + ": Permission denied"));
 }
 
 TEST_F(AdminProgram, BacksUpCommittedRunsOnlyWhileAnotherProgramWrites) {
@@ -171,7 +171,7 @@ TEST_F(AdminProgram, BacksUpCommittedRunsOnlyWhileAnotherProgramWrites) {
 
 TEST_F(AdminProgram, BackupReplacesNothingThatItShouldNot) {
     EXPECT_EQ(admin({"backup", files_.path() + "/none"}).error,
-              told("nothing to back up: " + store_.file("registry.db")));
+              adminError("nothing to back up: " + store_.file("registry.db")));
     std::string big = kHead + "[HKLM\\big]\n"s;
     for (int value = 0; value < 200; ++value) {
         big += "\"" + std::to_string(value) + "\"=\"" + std::string(1000, 'x') + "\"\n";
@@ -198,12 +198,12 @@ TEST_F(AdminProgram, BackupReplacesNothingThatItShouldNot) {
         {other.file("registry.db-shm"),   true,  "part of a store",                   {}},
     };
     // clang-format on
-    EXPECT_EQ(admin({"backup", ""}).error, told("FILE: the name is empty (see --help)"));
+    EXPECT_EQ(admin({"backup", ""}).error, adminError("FILE: the name is empty (see --help)"));
     for (const auto& row : rows) {
         const Arguments words = {"backup", row.target, row.force ? "--force" : "--store=" + store_.path()};
         const ProgramResult result = admin(words, {{}, row.inChild});
         EXPECT_EQ(result.exitCode, 2) << row.target;
-        EXPECT_EQ(result.error, told("cannot write backup: " + row.target + ": " + row.reason));
+        EXPECT_EQ(result.error, adminError("cannot write backup: " + row.target + ": " + row.reason));
         EXPECT_EQ(result.output, "");
         EXPECT_EQ(contents(old), "old") << row.target;
         EXPECT_EQ(store_.dump(), before) << row.target;
@@ -212,7 +212,7 @@ TEST_F(AdminProgram, BackupReplacesNothingThatItShouldNot) {
     EXPECT_EQ(std::distance(begin(left), end(left)), 2) << "no temporary file";
 }
 
-TEST_F(AdminProgram, FitsItsTerminalAndNeverSteersIt) {
+TEST_F(AdminProgram, FitsTheTerminalAndEscapesControlCharacters) {
     ASSERT_EQ(store_.tool({"-addKZ7Copy", "\xE6\x9D\xB1\xE4\xBA\xAC", "C:\\Program Files\\KZ7"}).exitCode, 0);
     ASSERT_EQ(store_.tool({"-addKZ7Copy", "PLAIN", "C:\\KZ7"}).exitCode, 0);
     ASSERT_EQ(admin({"import", file(kHead + "[HKLM\\a\xC2\x9B]\n"s)}).exitCode, 0);
@@ -254,7 +254,7 @@ TEST_F(AdminProgram, ReportsKeysThatAreListedAndCannotBeRead) {
                                          {{"export", "--json"}, json}}) {
         const ProgramResult result = admin(command);
         EXPECT_EQ(result.exitCode, 2);
-        EXPECT_EQ(result.error, told(line) + storeTold());
+        EXPECT_EQ(result.error, adminError(line) + storeLine());
         EXPECT_NE(result.output.find(shown), std::string::npos) << result.output;
     }
 }
@@ -278,14 +278,15 @@ TEST_F(AdminProgram, KeepsAStoreThatItCannotChange) {
           {"export --utf16 | head -c 1 >/dev/null; exit ${PIPESTATUS[0]}", 0, ""}}) {
         const ProgramResult result = store_.shell("kz7admin "s + command);
         EXPECT_EQ(result.exitCode, exitCode) << command;
-        EXPECT_EQ(result.error, storeTold() + (exitCode == 0 ? "" : told("cannot write: standard output: "s + said)));
+        EXPECT_EQ(result.error,
+                  storeLine() + (exitCode == 0 ? "" : adminError("cannot write: standard output: "s + said)));
     }
 
     overwrite(store_.file("registry.db"), "rubbish");
     for (const char* const command : {"tree", "import"}) {
         const ProgramResult damaged = admin({command, "import"s == command ? file(kHead + "[HKLM\\a]\n"s) : "HKLM"s});
         EXPECT_EQ(damaged.exitCode, 2);
-        EXPECT_EQ(damaged.error, told(store_.file("registry.db") + ": file is not a database"));
+        EXPECT_EQ(damaged.error, adminError(store_.file("registry.db") + ": file is not a database"));
         EXPECT_EQ(damaged.output, "");
     }
 }

@@ -42,7 +42,7 @@ std::vector<std::string> contents(IRegistryStore& registry) {
     return lines;
 }
 
-// Any bytes are a text on the embedded store; on Windows texts are UTF-16.
+// The embedded store accepts any bytes as text; on Windows texts are UTF-16.
 const bool kBytesAreText = textFromUtf16(u"\xDCE9").size() == 1;
 
 std::string asText(const std::string& bytes) {
@@ -130,7 +130,7 @@ TEST(RegText, WritesWhatOtherEditorsRead) {
                                         "a : t = 2:A\\x00"}));
 }
 
-TEST(RegText, ReadsWhatPeopleWriteOrNamesTheBadLine) {
+TEST(RegText, ReadsAnySpellingOrReportsTheBadLine) {
     // clang-format off
     const struct { std::string lines; const char* left; const char* why; } rows[] = {
         {"[HKLM\\a]\n[hkey_users\\b]\n[HKU\\c]", "\n[HKEY_LOCAL_MACHINE\\a]\n\n[HKEY_USERS\\b]\n\n[HKEY_USERS\\c]\n",

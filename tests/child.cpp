@@ -1,5 +1,5 @@
-// A program for the tests of process execution: each of its modes is one thing that a started program may do
-// to whoever started it.
+// A program for the tests of process execution: each mode is one thing that a child may do
+// to its parent.
 #include <cstdio>
 #include <string>
 
@@ -9,7 +9,7 @@ using namespace kz7::test;
 
 // Writes to both streams in turn until a write fails or all is written.
 static bool flood(long pieces) {
-    const std::string piece(64 * 1024, 'x');
+    const std::string piece(std::size_t{64} * 1024, 'x');
     for (long written = 0; written != pieces; ++written) {
         if (std::fwrite(piece.data(), 1, piece.size(), stdout) != piece.size() ||
             std::fwrite(piece.data(), 1, piece.size(), stderr) != piece.size()) {

@@ -42,7 +42,7 @@ protected:
 
     using Lines = std::vector<std::pair<const char*, std::string>>;
 
-    // Commits variables and parameters: what it logs, and what comes of it.
+    // Commits variables and parameters; returns the log and the result.
     std::string commit(const char* instance, const Lines& lines) {
         KZ7CfgHandler handler(machine.engine, profile, targetOf(instance));
         handler.setFollowUp([this] { ++followed; });
@@ -59,7 +59,7 @@ protected:
         return log + compose("%u: %u set, %u not set", {status, handler.successes(), handler.failures()});
     }
 
-    // What the copy's profiles hold, by the ends of their paths.
+    // The values of the copy's profiles, by the ends of their paths.
     std::string profiles() {
         std::istringstream dump(dumpRegistry(machine.registry_));
         std::string values;
@@ -76,9 +76,9 @@ protected:
     int followed = 0;  // runs of the command processor
 };
 
-TEST_F(Configuration, VariablesAreSetWhereTheyMayBe) {
-    // Names compare without case and keep the table's spelling, the later of two lines counts, and removing what is
-    // not set is success.
+TEST_F(Configuration, VariablesAreSetWhereTheyAreAllowed) {
+    // Names compare without case and get the table's spelling, the later of two lines counts, and removing a variable
+    // that is not set succeeds.
     EXPECT_EQ(commit("INST", {{"KZ7ACCOUNT", "an earlier line"},
                               {"KZ7LDAPHOST", "ldap"},
                               {"KZ7COMM", ""},
@@ -114,7 +114,7 @@ TEST_F(Configuration, ParametersAreSetByTheCommandProcessor) {
     const std::string fails = "ERROR: Could not set a database-manager parameter: DIAGLEVEL=";
     const std::string refuses = "Note: setDBMUsingProcess, step 10: error 5057: DIAGLEVEL\n" + fails;
     const std::string long780(780, 'v');
-    // Blanks and percent signs stay as they are; of two names of one parameter the processor is told the first.
+    // Blanks and percent signs are unchanged; of two names of one parameter the command has the first.
     EXPECT_EQ(commit("INST", {{"DIAGLEVEL", "3"}, {"DFTDBPATH", "a b%PATH%%d"}, {"MAXDARI", "7"}}),
               set + "DFTDBPATH=a b%PATH%%d, instance INST\n" + set + "DIAGLEVEL=3, instance INST\n" + set +
                   "MAXDARI=7, instance INST\n0: 3 set, 0 not set");

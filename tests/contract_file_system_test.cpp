@@ -1,4 +1,4 @@
-// What every file system must answer alike: the one in memory and this machine's.
+// The contract of the file-system port, for the one in memory and this machine's.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -17,7 +17,7 @@ protected:
 
 INSTANTIATE_TEST_SUITE_P(FileSystems, FileSystemContract, testing::ValuesIn(kBackends));
 
-TEST_P(FileSystemContract, TellsWhatIsThereAndWhatIsNoFile) {
+TEST_P(FileSystemContract, DistinguishesFilesFromOtherPaths) {
     std::string slashes = backend_->program();
     std::replace(slashes.begin(), slashes.end(), '\\', '/');
     // clang-format off
@@ -49,7 +49,7 @@ TEST_P(FileSystemContract, TellsWhatIsThereAndWhatIsNoFile) {
     }
 }
 
-TEST_P(FileSystemContract, FilesAreWrittenAtTheirEndAndReadWhole) {
+TEST_P(FileSystemContract, FilesAreAppendedToAndReadWhole) {
     const std::string path = folder_ + "run.log";
     OwnedFile file(files_);
     OwnedFile second(files_);
@@ -60,7 +60,7 @@ TEST_P(FileSystemContract, FilesAreWrittenAtTheirEndAndReadWhole) {
     EXPECT_EQ(files_.probe(path), kSuccess) << "made by the opening";
     ASSERT_EQ(files_.openForAppend(path, second.receive()), kSuccess);
     std::string all;
-    // Each goes behind what the other one wrote.
+    // Each writes after the other's bytes.
     for (const std::string& bytes :
          {std::string("one\r\n\0\xFF\n", 8), std::string(200'000, 'x'), std::string("end"), std::string()}) {
         std::uint32_t written = 77;

@@ -1,4 +1,4 @@
-// What every process host and every kind of threads must do alike: this machine's and the ones in memory.
+// The contract of the process port, for this machine's and the one in memory.
 #include <gtest/gtest.h>
 
 #include <cstdlib>
@@ -18,7 +18,7 @@ protected:
 
 INSTANTIATE_TEST_SUITE_P(Hosts, ProcessHostContract, testing::ValuesIn(kBackends));
 
-TEST_P(ProcessHostContract, PipesCarryBytesToTheirEndAndTellWhenTheOtherSideIsGone) {
+TEST_P(ProcessHostContract, PipesCarryAllBytesAndReportAClosedEnd) {
     OwnedStream reading(*host_);
     OwnedStream writing(*host_);
     OwnedStream copy(*host_);
@@ -54,7 +54,7 @@ TEST_P(ProcessHostContract, HandlesThatAreNotOpenAreRefused) {
     EXPECT_EQ(code, 77U);
 }
 
-TEST_P(ProcessHostContract, ProgramsThatAreNotThereDoNotStart) {
+TEST_P(ProcessHostContract, MissingProgramsDoNotStart) {
     namespace fs = std::filesystem;
     const TemporaryDirectory directory;
     const fs::path folder = directory.path();
@@ -64,7 +64,7 @@ TEST_P(ProcessHostContract, ProgramsThatAreNotThereDoNotStart) {
     fs::copy_file(childProgram(), folder / "kz7_stray.exe");
     fs::copy_file(childProgram(), folder / "bare folder/kz7_stray.exe");
     fs::current_path(folder);
-    setSearchPath(".");  // hangs on the current folder like the rest
+    setSearchPath(".");  // relative, like the programs
     // clang-format off
     const struct { std::string commandLine; bool pathMayBeNamed; const char* why; } rows[] = {
         {"\"/no such/program.exe\" x",                              true,  "no such file"},

@@ -1,4 +1,4 @@
-// What every service manager must do alike: the one in memory and this machine's.
+// The contract of the service manager port, for the one in memory and this machine's.
 #include <gtest/gtest.h>
 
 #include "tests/support/backends.h"
@@ -25,7 +25,7 @@ protected:
         return services_.openService(manager_.get(), name, access, service.receive());
     }
     Status start(const OwnedService& service) {
-        // A machine that is still starting its own services starts no other.
+        // While a machine starts its own services it starts no others.
         constexpr Status kDatabaseLocked = 1055;
         Status status = kDatabaseLocked;
         eventually([&] { return (status = services_.startService(service.get())) != kDatabaseLocked; });
@@ -43,7 +43,7 @@ protected:
 
 INSTANTIATE_TEST_SUITE_P(Managers, ServicesContract, testing::ValuesIn(kBackends));
 
-TEST_P(ServicesContract, AServiceIsMadeFoundRunAndDeleted) {
+TEST_P(ServicesContract, AServiceIsCreatedOpenedRunAndDeleted) {
     OwnedService service(services_);
     OwnedService second(services_);
     EXPECT_EQ(open(kName, service), kServiceDoesNotExist);
@@ -74,7 +74,7 @@ TEST_P(ServicesContract, AServiceIsMadeFoundRunAndDeleted) {
     service.reset();
     EXPECT_EQ(create(service, kName, backend_->program()), kServiceMarkedForDelete) << "while it is open elsewhere";
     second.reset();
-    // A manager may hold on to it for a moment longer.
+    // A manager may keep it for a moment.
     EXPECT_TRUE(eventually([&] { return open(kName, service) == kServiceDoesNotExist; }));
     EXPECT_EQ(create(service, kName, backend_->folder() + "\\absent.exe"), kSuccess) << "its name is free again";
     EXPECT_EQ(start(service), kFileNotFound);
@@ -85,7 +85,7 @@ TEST_P(ServicesContract, AServiceIsMadeFoundRunAndDeleted) {
     }
 }
 
-TEST_P(ServicesContract, HandlesAreJudgedByWhatTheyAreAndMayDo) {
+TEST_P(ServicesContract, HandlesAllowWhatTheirKindAndRightsAllow) {
     OwnedService query(services_);
     OwnedService other(services_);
     ASSERT_EQ(create(other, kName, backend_->program()), kSuccess);

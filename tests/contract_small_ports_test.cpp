@@ -1,5 +1,5 @@
-// What the implementations of the small ports must do alike, in memory and this machine's: console and debug output,
-// libraries, the assembly cache, the clock, the line channel and the terminal.
+// The contracts of the small ports, in memory and of this machine: console and debug output, libraries, the assembly
+// cache, the clock, the line channel and the terminal.
 #include <gtest/gtest.h>
 
 #include "tests/support/backends.h"
@@ -13,7 +13,7 @@ using SmallPortContract = Contract;
 
 INSTANTIATE_TEST_SUITE_P(SmallPorts, SmallPortContract, testing::ValuesIn(kBackends));
 
-TEST_P(SmallPortContract, TextsComeOutWholeInTheirOrderAndDebugTextsNotAtAll) {
+TEST_P(SmallPortContract, WritesWholeTextsInOrderAndNoDebugTexts) {
     const std::string text = "100%s %n\n" + std::string(100'000, 'x') + "\xE9\n\nno line feed at the end";
     EXPECT_EQ(backend_->written([&](IConsole& console) {
         EXPECT_EQ(console.writeOutput(text), kSuccess);
@@ -30,7 +30,7 @@ TEST_P(SmallPortContract, TextsComeOutWholeInTheirOrderAndDebugTextsNotAtAll) {
               text + " error more and more last");
 }
 
-TEST_P(SmallPortContract, LibrariesAreLoadedByTheirWholePathOnly) {
+TEST_P(SmallPortContract, LibrariesAreLoadedByAbsolutePathsOnly) {
     ILibraryLoader& libraries = platform_.libraries();
     const std::string text = backend_->folder() + "\\text.dll";
     OwnedFile file(platform_.files());
@@ -57,7 +57,7 @@ TEST_P(SmallPortContract, LibrariesAreLoadedByTheirWholePathOnly) {
     EXPECT_STREQ(level, "KZ7 v9.1.0.0");
 }
 
-TEST_P(SmallPortContract, ProvidersComeAndGoWithTheirLevel) {
+TEST_P(SmallPortContract, ProvidersAreRegisteredByLevel) {
     IAssemblyCache& cache = platform_.assemblies();
     const std::string location = backend_->folder();
     EXPECT_EQ(cache.registerProviders(location, "9.1.0", kFrameworkAll), kSuccess) << "none to register";
@@ -93,7 +93,7 @@ TEST_P(SmallPortContract, ProvidersComeAndGoWithTheirLevel) {
     }
 }
 
-TEST_P(SmallPortContract, TheTimeIsGivenWhereItFitsWithANul) {
+TEST_P(SmallPortContract, TheTimeMustFitWithItsTerminator) {
     FixedBuffer<64> text;
     FixedBuffer<8> eight;
     FixedBuffer<9> nine;
@@ -107,9 +107,10 @@ TEST_P(SmallPortContract, TheTimeIsGivenWhereItFitsWithANul) {
     EXPECT_EQ(shape, "00:00:00");
 }
 
-TEST_P(SmallPortContract, LinesAreReadToTheirEndAndCutToTheirRoom) {
+TEST_P(SmallPortContract, LinesAreReadWholeAndCutToTheBuffer) {
     FixedBuffer<8> line;
-    // Both line ends and none; what does not fit is no line of its own; a carriage return inside and at the end, a NUL.
+    // Both line ends and none; a line that does not fit is cut and the next line follows; a carriage return inside and
+    // at the end; a NUL.
     backend_->reading("one\n\ntwo\r\n123456789\nnext\r\n12345678\r\na\rb\nc\0d\ne\r"s, [&] {
         std::string lines;
         while (platform_.terminal().readLine(line) == kSuccess) {

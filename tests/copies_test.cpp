@@ -8,8 +8,8 @@
 #include <random>
 #include <set>
 
+#include "install/src/copies/alias_rewrite.h"
 #include "install/src/copies/ilist.h"
-#include "install/src/copies/install_copies_profile.h"
 #include "install/src/copies/product_lists.h"
 #include "install/src/registry/copy_layout.h"
 #include "tests/support/fault_sweep.h"
@@ -26,7 +26,7 @@ struct Element {
     int& alive;
 };
 
-TEST(IntrusiveList, AWalkGoesOnAfterARemovalUnderItAndTheEndFreesEveryElement) {
+TEST(IntrusiveList, AWalkContinuesAfterARemovalAndTheDestructorFreesEveryElement) {
     int alive = 0;
     {
         ILIST<Element> list;
@@ -104,7 +104,7 @@ TEST(InstalledCopies, AreListedInRegistryOrder) {
     EXPECT_EQ(list.findByName(stem.substr(1).c_str()), nullptr);
 }
 
-TEST(InstalledCopies, AVersion8InstallationIsTheFirstOfThem) {
+TEST(InstalledCopies, BeginWithAVersion8Installation) {
     // clang-format off
     const struct { const char* why; const char* version; bool path; std::uint32_t status; const char* listed; } rows[] = {
         {"eight with its path",       "8",    true,  0, "KZ7V8=C:\\8;C=C:\\c;"},
@@ -129,7 +129,7 @@ TEST(InstalledCopies, AVersion8InstallationIsTheFirstOfThem) {
     }
 }
 
-TEST(InstalledCopies, NoKeyIsAnEmptyListAndThe32BitViewHasItsOwn) {
+TEST(InstalledCopies, AreEmptyWithoutAKeyAndSeparateForThe32BitView) {
     Machine machine;
     InstallCopyList none(machine.registry_, machine.debugOutput_, false, false);
     EXPECT_EQ(none.count() + none.status(), 0U);
@@ -141,7 +141,7 @@ TEST(InstalledCopies, NoKeyIsAnEmptyListAndThe32BitViewHasItsOwn) {
 }
 
 struct Version {
-    std::string copy, version, release, modification, fixLevel;  // an empty field is not there
+    std::string copy, version, release, modification, fixLevel;  // an empty field is missing
 };
 
 void addVersion(Machine& machine, const Version& row) {
@@ -187,7 +187,7 @@ TEST(AliasComputation, EqualsASearchForEachPrefix) {
     for (int round = 0; round < 2000; ++round) {
         Machine machine;
         const std::size_t copies = 1 + random() % 12;
-        const bool few = random() % 2 == 0;  // few versions make many neighbours
+        const bool few = random() % 2 == 0;  // few versions have many common prefixes
         for (std::size_t copy = 0; copy < copies; ++copy) {
             addVersion(machine, {"C" + std::to_string(copy), few ? "9" : pick(), few ? "1" : pick(), pick(), pick()});
         }

@@ -1,4 +1,4 @@
-// What the embedded store adds to the port's contract: transactions, other processes, faults.
+// What the embedded store guarantees beyond the contract of the port: transactions, other processes, faults.
 #include "install/platform/embedded/registry.h"
 
 #include <gtest/gtest.h>
@@ -9,6 +9,7 @@
 #include <filesystem>
 #include <utility>
 
+#include "install/platform/text.h"
 #include "install/src/registry/registry_access.h"
 #include "tests/support/registry_dump.h"
 #include "tests/support/temporary_directory.h"
@@ -18,7 +19,7 @@ namespace {
 
 constexpr KeyHandle kMachine = KeyHandle::localMachine;
 
-// One process's view of a store; two of them are two processes to SQLite.
+// A view of one process; SQLite treats two of them as two processes.
 class EmbeddedStore : public testing::Test {
 protected:
     EmbeddedRegistry open() {
@@ -71,7 +72,7 @@ TEST_F(EmbeddedStore, OnlyAWriteCreatesTheCallersKey) {
                              : registry.setValue(KeyHandle::currentUser, "v", ValueType::sz, {}),
                   kSuccess);
         EXPECT_EQ(dumpRegistry(registry, KeyHandle::users),
-                  round == 0 ? "[" + name + "] \n[" + name + "\\Mine] \n" : "[" + name + "] \n" + name + " : v = 1:\n");
+                  compose(round == 0 ? "[%s] \n[%s\\Mine] \n" : "[%s] \n%s : v = 1:\n", {name, name}));
         EXPECT_EQ(registry.deleteKey(KeyHandle::currentUser, "Mine", 0), round == 0 ? kSuccess : kFileNotFound);
         EXPECT_EQ(registry.deleteKey(KeyHandle::users, name, 0), kSuccess) << "by its other name";
     }

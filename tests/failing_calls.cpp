@@ -1,6 +1,5 @@
-// Preloaded into a program under test: the n-th call of the kind KZ7_FAIL_CALL fails, once or from there on. Programs
-// that it starts are left alone. The first two allocations of a process, the loader's own and the C++ library's reserve
-// for exceptions, always succeed.
+// Preloaded into a program under test: the n-th call of the kind KZ7_FAIL_CALL fails, once or from there on, but not in
+// its child programs. The first two allocations, which the loader and the C++ library make, always succeed.
 #include <dlfcn.h>
 #include <sys/types.h>
 
@@ -25,12 +24,12 @@ bool fails(const char* kind, long notCounted) {
     return number == first || (lasting != nullptr && *lasting == '1' && number > first);
 }
 
-// The program may succeed all the same.
+// The program may succeed despite the failure.
 void report() {
     write(2, "a call fails\n", 13);
 }
 
-// One for each signature and name: it keeps the real function.
+// One instance for each signature and name, which stores the real function.
 template <typename Result, typename... Arguments>
 Result real(const char* name, Arguments... arguments) {
     return reinterpret_cast<Result (*)(Arguments...)>(dlsym(RTLD_NEXT, name))(arguments...);

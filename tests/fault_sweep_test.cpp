@@ -168,7 +168,7 @@ TEST(FaultSweep, EveryFlowEndsReportsAndTouchesNothingElse) {
 
 // What a removal deletes when one of its calls fails once: whether the product and either copy are still there. The
 // list is read first: a copy that could not be read is not in it, and after a list of one copy the whole product goes.
-TEST(RemovalUnderFaults, DeletesWhatTheListOfCopiesSays) {
+TEST(RemovalUnderFaults, DeletesByTheListOfCopies) {
     std::map<std::string, std::set<std::string>> outcomes;
     const auto flow = [](FaultyMachine& machine) { return machine.run({"-removeKZ7Copy", "FIRST"}); };
     sweepFaults(false, twoCopies, flow, [&](FaultyMachine& machine, Status status) {
@@ -212,7 +212,7 @@ TEST(CallObserver, SeesEveryCallWithItsArgumentsAndResult) {
     {
         OwnedKey key(registry);
         registry.createKey(KeyHandle::localMachine, "A", "c", kKeyFull, key.receive());
-        registry.setValue(key.get(), "n", ValueType::sz, std::string_view("x", 2));
+        registry.setValue(key.get(), "n", ValueType::sz, std::string_view("x\0", 2));
         registry.queryValue(key.get(), "n", &type, data);
         registry.queryValue(key.get(), "m", nullptr, data);
     }

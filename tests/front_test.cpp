@@ -1,4 +1,4 @@
-// kz7admin front in one process: how it reads lines, counts tasks, draws bars, and a whole run on a machine in
+// kz7admin front in one process: how it reads lines, counts tasks and draws bars, and a whole run on a machine in
 // memory.
 #include <gtest/gtest.h>
 
@@ -21,7 +21,8 @@ void runLines(Machine& machine, const std::string& lines) {
     EXPECT_EQ(exitCode, 0U);
 }
 
-// A task counts once and by its announced time, one that was not announced not at all; more to do takes nothing back.
+// A task counts once, by its announced time; a task that was not announced does not count; new tasks do not reduce the
+// percentage.
 TEST(Front, ShowsAnyLine) {
     // clang-format off
     const struct { const char* line; const char* shown; } rows[] = {
@@ -67,7 +68,7 @@ TEST(Front, ShowsAnyLine) {
     EXPECT_EQ(machine.console_.both, shown + "Configuring 100%: done\nThe log is \\var\\a :: b.log\nDone.\n");
 }
 
-TEST(Front, GivesABatchFileNothingThatItsInterpreterActsUpon) {
+TEST(Front, PassesNoSpecialCharactersToABatchFile) {
     // clang-format off
     const struct { std::vector<std::string> words; bool passed; } rows[] = {
         {{"x.bat", "plain", "a & b", "^<>|()!", "C:\\KZ7\\"},  true},
@@ -109,7 +110,7 @@ TEST(Front, EstimatesByAnnouncedTimesThenByMeasuredOnes) {
     progress.takeTimes({"30", "10", "20"});
     // clang-format off
     const struct { std::int32_t started; std::int32_t ended; std::uint64_t now; std::uint64_t left; } rows[] = {
-        {1, 0, 0,  60}, {0, 0, 5, 55}, {0, 0, 40, 30},  // a task that is overdue takes nothing from the others
+        {1, 0, 0,  60}, {0, 0, 5, 55}, {0, 0, 40, 30},  // an overdue task does not reduce the time of the others
         {0, 1, 60, 60}, {2, 0, 60, 60}, {0, 0, 70, 50}, {3, 2, 80, 40}, {0, 3, 120, 0},
     };
     // clang-format on

@@ -1,17 +1,16 @@
-// Running a command with its output captured: the command lines that are built, and what each kind of program
-// leaves behind, on scripted programs and on real ones.
+// Running a command with its output captured: the command lines, and the results of scripted and real programs.
 #include <gtest/gtest.h>
 
 #include "install/platform/memory/process_host.h"
 #include "install/platform/memory/threads.h"
 #include "tests/support/backends.h"
+#include "tests/support/captured_run.h"
 #include "tests/support/gate.h"
-#include "tests/support/told_run.h"
 
 namespace kz7::test {
 namespace {
 
-// Programs in a table.
+// Programs of a table.
 class ScriptedProcess : public testing::Test {
 protected:
     ~ScriptedProcess() override { EXPECT_EQ(host_.openHandles() + threads_.openHandles(), 0U); }
@@ -56,7 +55,7 @@ TEST_F(ScriptedProcess, BuildsCommandLines) {
     EXPECT_EQ(untyped.commandLine(), "") << "a later command needs its type";
 }
 
-TEST_F(ScriptedProcess, HandsOutAndPostsWhatWasWritten) {
+TEST_F(ScriptedProcess, CopiesAndPostsTheOutput) {
     host_.addProgram("t.exe", {.output = "five5", .error = std::string("cut\0off", 7), .exitCode = 7});
     InstallProcess process(host_, threads_, sink_, "t.exe %n");
     EXPECT_EQ(process.standardOutputLength(), 0U) << "nothing was collected yet";
@@ -80,7 +79,7 @@ TEST_F(ScriptedProcess, HandsOutAndPostsWhatWasWritten) {
     EXPECT_EQ(host_.started, std::vector<std::string>{"\"t.exe\" %n"});
 }
 
-TEST_F(ScriptedProcess, CapturedTextsKeepTheirLengthAroundEveryDoubling) {
+TEST_F(ScriptedProcess, CapturesTextsAroundEachBufferSize) {
     for (const std::size_t length : {0U, 1U, 511U, 512U, 513U, 1024U, 1025U, 2049U, 100000U}) {
         host_.addProgram("t.exe", {.output = std::string(length, 'x')});
         InstallProcess process(host_, threads_, sink_, "t.exe");
@@ -91,7 +90,7 @@ TEST_F(ScriptedProcess, CapturedTextsKeepTheirLengthAroundEveryDoubling) {
     }
 }
 
-TEST_F(ScriptedProcess, TellsWhatWasNotExecutedWhatCouldNotBeAndWhatRunsOn) {
+TEST_F(ScriptedProcess, ReportsProgramsThatDidNotStartOrStillRun) {
     InstallProcess process(host_, threads_, sink_, "missing.exe");
     EXPECT_EQ(ending(process, sink_), "5030 5030 ");
     EXPECT_EQ(process.execute(true, false), kSuccess);
@@ -113,7 +112,7 @@ TEST_F(ScriptedProcess, TellsWhatWasNotExecutedWhatCouldNotBeAndWhatRunsOn) {
     EXPECT_EQ(ureCreateThread(threads_, sink_, nullptr, nullptr, nullptr), kNullArgument);
 }
 
-// Real programs of this machine, and what they leave in the two slots.
+// Real programs of this machine, and the values of the two slots after them.
 class RealProcess : public testing::Test {
 protected:
     RealProcess() {
@@ -137,7 +136,7 @@ protected:
     StreamHandle error_ = StreamHandle::none;
 };
 
-TEST_F(RealProcess, CapturesWhatProgramsWriteAndHowTheyEndAndRestoresBothSlotsThroughOne) {
+TEST_F(RealProcess, CapturesOutputAndExitCodesAndRestoresBothSlotsThroughOne) {
     Gate gate;
     const std::string flood(kFloodMebibytes << 20, 'x');
     // clang-format off
@@ -163,8 +162,8 @@ TEST_F(RealProcess, CapturesWhatProgramsWriteAndHowTheyEndAndRestoresBothSlotsTh
         if (row.arguments.find(gate.name()) != std::string::npos) {
             gate.open();
         }
-        const std::string told = ending(process, sink_);
-        EXPECT_TRUE(told == row.ending) << row.why << ": " << told.substr(0, 100);
+        const std::string ended = ending(process, sink_);
+        EXPECT_TRUE(ended == row.ending) << row.why << ": " << ended.substr(0, 100);
         host_->getSlot(StandardSlot::output, now);
         EXPECT_EQ(now, before) << "the slot of standard output holds the old standard error";
         host_->getSlot(StandardSlot::error, now);
@@ -202,8 +201,8 @@ TEST_F(RealProcess, ATimeoutStopsTheReadersAndLeavesTheProgram) {
         EXPECT_FALSE(ending(flood, sink_).starts_with("0 259 ")) << "nobody reads: its writing ends it";
 
         gate.open();
-        const std::string told = ending(quiet, sink_);
-        EXPECT_TRUE(told == "0 8 " || told == "0 141 ") << "it ran to an end of its own: " << told;
+        const std::string ended = ending(quiet, sink_);
+        EXPECT_TRUE(ended == "0 8 " || ended == "0 141 ") << "it ran to an end of its own: " << ended;
     }
 }
 

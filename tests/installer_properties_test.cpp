@@ -1,4 +1,4 @@
-// Installer properties in immediate and deferred custom actions, on a session that allows what the installer allows.
+// Installer properties in immediate and deferred custom actions, on a session with the restrictions of the installer.
 #include <gtest/gtest.h>
 
 #include "install/runtime/installer_properties.h"
@@ -16,7 +16,7 @@ class InstallerProperties : public testing::Test {
 protected:
     InstallerProperties() { machine.openLog(); }
 
-    // A value of a user's key, or of the caller's, as somebody saved it.
+    // Saves a value in a user's key, or in the caller's.
     void save(const std::string& user, std::string_view bytes, const char* name = "P") {
         OwnedKey key(machine.registry_);
         const KeyHandle root = user.empty() ? KeyHandle::currentUser : KeyHandle::users;
@@ -28,7 +28,7 @@ protected:
     Installation at{machine.session, machine.registry_, machine.engine};
 };
 
-TEST_F(InstallerProperties, AreReadFromTheInstallerOrFromWhatWasSaved) {
+TEST_F(InstallerProperties, AreReadFromTheInstallerOrTheSavedValues) {
     using namespace std::literals;
     // clang-format off
     const struct {
@@ -71,7 +71,7 @@ TEST_F(InstallerProperties, AreReadFromTheInstallerOrFromWhatWasSaved) {
     }
 }
 
-TEST_F(InstallerProperties, WhatIsRefusedDependsOnTheKindOfAction) {
+TEST_F(InstallerProperties, RefusalsDependOnTheKindOfAction) {
     char room[8];
     std::uint32_t size = sizeof room;
     for (const bool deferred : {false, true}) {
@@ -89,7 +89,7 @@ TEST_F(InstallerProperties, WhatIsRefusedDependsOnTheKindOfAction) {
     EXPECT_NE(machine.logText().find("Note: iSavePropertiesForDeferred, step 10: error 6045: "), std::string::npos);
 }
 
-TEST_F(InstallerProperties, EverythingThatDeferredActionsNeedIsSaved) {
+TEST_F(InstallerProperties, SavesEverythingThatDeferredActionsNeed) {
     const std::string longest(1023, 'l');
     auto& properties = machine.session.properties;
     properties = {
@@ -118,12 +118,12 @@ TEST_F(InstallerProperties, EverythingThatDeferredActionsNeedIsSaved) {
         const std::string line = key + " : " + name + " = 1:" + value + "\\x00\n";
         expected += expected.find(line) == std::string::npos ? line : "";
     };
-    // What an earlier installation saved is gone.
+    // The values of an earlier installation are deleted.
     for (const char* name : {"Z_LAST", "A_FIRST", "LONGEST", "UNSET"}) {
         add(name, properties[name]);
     }
     for (const char* name : kSavedPropertyNames) {
-        add(name, properties[name]);  // some stand there twice
+        add(name, properties[name]);  // some are in the list twice
     }
     add("ADMIN_SERVER.bin_SELECT_STATE", "DESELECTED");
     add("LDAP.bin_SELECT_STATE", "SELECTED");

@@ -2,12 +2,21 @@
 # Builds an installer package that uses our custom actions, and has Windows Installer (Wine) fail to install it, install
 # it and remove it. Compares the exit code, the files and keys that remain and every line that the actions log.
 #
-#   tests/package.sh WINDOWS_PROGRAMS      (a folder)
+#   tests/package.sh WINDOWS_PROGRAMS [CODE_PAGE]      (a folder)
 set -euo pipefail
 
-[ $# -eq 1 ] || { echo "usage: package.sh WINDOWS_PROGRAMS" >&2; exit 2; }
+usage() { echo "usage: package.sh WINDOWS_PROGRAMS [1252|1251|932]" >&2; exit 2; }
+[ $# -eq 1 ] || [ $# -eq 2 ] || usage
+page=${2:-1252}
+width=1 # bytes of a character
+case $page in
+    1252) copy=COPY1 letter=n ;;
+    1251) copy=Привет letter=Ж KZ7_LOCALE=ru_RU ;;
+    932) copy=表データ表 letter=表 width=2 KZ7_LOCALE=ja_JP ;; # the second byte of some is a backslash
+    *) usage ;;
+esac
 if [ -z "${KZ7_WINE_PREFIX:-}" ]; then
-    exec "$(dirname "$0")/with_wine" "$0" "$@"
+    KZ7_LOCALE=${KZ7_LOCALE:-} exec "$(dirname "$0")/with_wine" "$0" "$@"
 fi
 programs=$(realpath "$1")
 source=$(realpath "$(dirname "$0")")/package/package.wxs
@@ -16,7 +25,7 @@ trap 'rm -rf "$folder"' EXIT
 cd "$folder"
 
 windows_path() { printf 'Z:%s' "${1//\//\\}"; }
-long() { printf '%*s' "$1" '' | tr ' ' n; }
+long() { printf '%*s' "$1" '' | sed "s/ /$letter/g"; }
 
 # wixl resolves relative paths only, and writes one type for every action that is not immediate.
 retype() {
@@ -43,7 +52,7 @@ retype 3585 ProbeCommit DeleteAtCommit ProbeCommitted       # commit
 run() {
     : >log
     wine "$programs/full_exit_code.exe" msiexec /qn "$@" '/l*v' "$(windows_path "$folder/log")" \
-        ACTIONS_PATH="$(windows_path "$programs/kz7actions64.dll")" KZ7_COPY_NAME=COPY1 \
+        ACTIONS_PATH="$(windows_path "$programs/kz7actions64.dll")" KZ7_COPY_NAME="$copy" \
         MIGRATION_FILES_PATH="$(long 1023)" INI_FILES_PATH="$(long 1024)" 2>/dev/null |
         tr -d '\r' | grep '^exit code' || echo 'no exit code'
     (cd "$WINEPREFIX/drive_c/Program Files" && find . -path '*/KZ7 package*' -type f | sort)
@@ -51,8 +60,8 @@ run() {
     for root in HKEY_CURRENT_USER $(wine reg query HKEY_USERS | tr -d '\r' | grep '^HKEY_'); do
         wine reg query "$root\\SOFTWARE\\NVQ" /s 2>/dev/null || true
     done | tr -d '\r' | sed '/^$/d; /^reg: /d; s/S-1-5[-0-9]*/USER/'
-    tr -d '\r' <log | sed -n -E 's/^1: ((probe|Note|WARNING|ERROR).*[^ ]) *$/\1/p' |
-        sed -E 's/n{1024}/<1024>/; s/n{1023}/<1023>/; s/(Note: iMsi...Property): .*, status 0/\1/' |
+    tr -d '\r' <log | iconv -f "CP$page" -t UTF-8 | sed -n -E 's/^1: ((probe|Note|WARNING|ERROR).*[^ ]) *$/\1/p' |
+        sed -E "s/$letter{1024}/<1024>/; s/$letter{1023}/<1023>/"'; s/(Note: iMsi...Property): .*, status 0/\1/' |
         uniq -c | sed -E 's/^ *([0-9]+) Note: (iMsi...Property)$/\2 x \1/; s/^ *1 //'
 }
 
@@ -60,7 +69,8 @@ check() { # why, the expected results, arguments of msiexec
     diff -u --label expected --label seen <(printf '%s\n' "$2") <(run "${@:3}") || { echo "FAILED: $1"; exit 1; }
 }
 
-printf '%s\r\n' '* of a user' 'PROD = PROD_ESE' 'KZ7.PASSWORD = "two  words "' 'EMPTY =' >responses
+printf '%s\r\n' '* of a user' 'PROD = PROD_ESE' "KZ7.PASSWORD = \"two  $letter words \"" 'EMPTY =' |
+    iconv -f UTF-8 -t "CP$page" >responses
 printf '%s\r\n' 'LEVEL = 8' 'no keyword' >bad_responses
 good=RSP_FILE_PATH=$(windows_path "$folder/responses")
 bad=RSP_FILE_PATH=$(windows_path "$folder/bad_responses")
@@ -71,15 +81,36 @@ keys='HKEY_CURRENT_USER\SOFTWARE\NVQ\KZ7
 HKEY_CURRENT_USER\SOFTWARE\NVQ\KZ7\TEMP
 HKEY_USERS\USER\SOFTWARE\NVQ\KZ7
 HKEY_USERS\USER\SOFTWARE\NVQ\KZ7\TEMP'
+length=$((${#copy} * width))
+cut=$copy$copy$copy
+cut=${cut:0:$((25 / width))}
+# The copy's name for two sizes of the buffer. A saved value that does not fit counts as not saved.
+copy_name() { # kind of action, saved or deleted
+    local room notes=2 line=() terminator=0
+    [ -z "${2:-}" ] || terminator=1
+    for room in 10 11; do
+        if [ "${2:-}" = deleted ] || { [ "${2:-}" = saved ] && [ $room -le $length ]; }; then
+            line+=("3 'new'")
+        elif [ $room -le $length ]; then
+            echo 'Note: iMsiGetProperty: KZ7_COPY_NAME, status 234'
+            notes=1
+            line+=("$((length + 1)) status 234")
+        else
+            line+=("$((length + terminator)) '$copy'")
+        fi
+    done
+    printf '%s\n' "iMsiGetProperty x $notes" "probe $1: KZ7_COPY_NAME ${line[0]}, KZ7_COPY_NAME ${line[1]}"
+}
 immediate() { # the feature BASE_CLIENT.bin selected: Y or N
     cat <<TEXT
 iMsiSetProperty x 1
 Note: iMsiGetProperty: INI_FILES_PATH, status 234
-probe immediate: substituted: InstalledCopies\\COPY1
-probe immediate: substituted without a buffer: InstalledCopies\\COPY2
+probe immediate: substituted: $cut
+probe immediate: substituted without a buffer: $copy
+$(copy_name immediate)
 iMsiGetProperty x 9
 probe immediate: DEBUG_PROP 22 'of the immediate phase', TABLE_PUBLIC 12 'of the table', TablePrivate 17 '100% of the table', \
-KZ7_COPY_NAME 5 'COPY1', MIGRATION_FILES_PATH 1023 '<1023>', INI_FILES_PATH 1024 '<1024>', NOT_INSTALL_DOTNET 0 '', \
+KZ7_COPY_NAME $length '$copy', MIGRATION_FILES_PATH $((1023 * width)) '<1023>', INI_FILES_PATH $((1024 * width)) '<1024>', NOT_INSTALL_DOTNET 0 '', \
 NotSaved 0 '', BASE_CLIENT_BIN_SELECTED 1 '$1'
 iMsiSetProperty x 9
 probe immediate: setting: 0 0 0 0 0 0 0 0 0
@@ -94,22 +125,24 @@ deferred() { # kind of action, the feature selected; as saved with its size: REM
 probe $1: opening the key: status 0
 iMsiGetProperty x 16
 probe $1: DEBUG_PROP 23 'of the immediate phase', TABLE_PUBLIC 13 'of the table', TablePrivate 18 '100% of the table', \
-KZ7_COPY_NAME 6 'COPY1', MIGRATION_FILES_PATH 1024 '<1023>', INI_FILES_PATH 3 'new', NOT_INSTALL_DOTNET 1 '', \
+KZ7_COPY_NAME $((length + 1)) '$copy', MIGRATION_FILES_PATH $((1023 * width + 1)) '<1023>', INI_FILES_PATH 3 'new', NOT_INSTALL_DOTNET 1 '', \
 NotSaved 3 'new', BASE_CLIENT_BIN_SELECTED 2 '$2', REMOVE $3, BASE_CLIENT.bin_SELECT_STATE $4, \
 ODBC_SUPPORT_SELECT_STATE $4, LDAP.bin_SELECT_STATE 0 '', PROP_RSP_KZ7.PASSWORD $5, PROP_RSP_EMPTY 0 '', PROP_RSP_PROD 1 ''
+$(copy_name "$1" saved)
 TEXT
 }
 deleted() { # kind of action
     printf '%s\n' 'iMsiGetProperty x 2' "probe $1: opening the key: status 2" 'iMsiGetProperty x 1' \
-        "probe $1: DEBUG_PROP 3 'new'"
+        "probe $1: DEBUG_PROP 3 'new'" "$(copy_name "$1" deleted)"
 }
 committed="probe commit: opening the key: status 0
 iMsiGetProperty x 1
 probe commit: DEBUG_PROP 23 'of the immediate phase'
+$(copy_name commit saved)
 $(deleted commit)"
 installing="iMsiGetProperty x 4
 $(immediate Y)"
-installed=(Y "1 ''" "9 'SELECTED'" "12 'two  words '")
+installed=(Y "1 ''" "9 'SELECTED'" "$((13 + width)) 'two  $letter words '")
 
 check 'a deferred action fails, so the installation is rolled back' "exit code 1603
 $keys

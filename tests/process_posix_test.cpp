@@ -13,9 +13,9 @@
 
 #include "install/platform/embedded/ports.h"
 #include "tests/support/backends.h"
+#include "tests/support/captured_run.h"
 #include "tests/support/gate.h"
 #include "tests/support/run_program.h"
-#include "tests/support/told_run.h"
 
 namespace kz7::test {
 namespace {
@@ -56,7 +56,7 @@ protected:
     std::unique_ptr<IThreads> threads_ = embeddedThreads();
 };
 
-TEST_F(PosixProcess, FindsProgramsWhereTheProductAndTheHostKeepThem) {
+TEST_F(PosixProcess, FindsProgramsOfTheProductAndTheHost) {
     const std::string script = "#!/bin/sh\nprintf '[%s]' \"$@\"\n";
     const std::pair<std::string, std::string> files[] = {{"drive_c/Program Files/x/run.cmd", script},
                                                          {"drive_c/Program", "in the way, but no program"},
@@ -107,7 +107,7 @@ TEST_F(PosixProcess, FindsProgramsWhereTheProductAndTheHostKeepThem) {
     EXPECT_EQ(outcome("/bin/sh -c \"kill -TERM $$\""), "0 143 ") << "a signal is an exit code";
 }
 
-TEST_F(PosixProcess, AChildBeginsCleanWhateverItsParentHas) {
+TEST_F(PosixProcess, AChildInheritsNoDescriptorsOrSignals) {
     inFork([&] {
         std::signal(SIGPIPE, SIG_IGN);
         std::signal(SIGTERM, SIG_IGN);
@@ -135,14 +135,14 @@ TEST_F(PosixProcess, WaitsWithALimitWhenNoDescriptorIsFree) {
     });
 }
 
-TEST_F(PosixProcess, TheProgramsOwnOutputStaysWhereItWent) {
+TEST_F(PosixProcess, TheParentsOutputIsUnaffected) {
     const std::string output = root_ + "/output";
     inFork([&] {
         ASSERT_NE(std::freopen(output.c_str(), "w", stdout), nullptr);
         for (int run = 0; run < 4; ++run) {
             std::printf("before %d\n", run);
             outcome(childProgram() + (run == 2 ? " nothing" : " print said cried 0"));
-            // What is opened now may have a number that a slot still holds in another form.
+            // A file that is opened now may get a number that a slot still contains in another form.
             open("/etc/passwd", O_RDONLY | O_CLOEXEC);
         }
     });

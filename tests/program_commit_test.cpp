@@ -1,4 +1,4 @@
-// kz7admin commit as people run it, with the sample's command processor, alone and under the front end.
+// kz7admin commit as a program, with the sample's command processor, alone and under the front end.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
@@ -37,7 +37,7 @@ protected:
 
 constexpr const char* kGood = "* for an instance\nPROD = X\nKZ7INSTPROF = C:\\prof\nKZ7ACCOUNT = me\nDIAGLEVEL = 3\n";
 
-TEST_F(CommitProgram, SetsWhatAResponseFileSays) {
+TEST_F(CommitProgram, SetsTheValuesOfAResponseFile) {
     const ProgramResult human = commit(kGood, {"--instance", "INST"});
     EXPECT_EQ(human.exitCode, 0) << human.error;
     EXPECT_EQ(human.output,
@@ -68,13 +68,13 @@ TEST_F(CommitProgram, SetsWhatAResponseFileSays) {
     EXPECT_NE(store_.dump().find("COPY1\\GLOBAL_PROFILE : KZ7LDAPHOST = 1:l\\x00\n"), std::string::npos);
 }
 
-TEST_F(CommitProgram, TellsWhyItCannotBegin) {
+TEST_F(CommitProgram, ReportsWhyItCannotBegin) {
     const std::string before = store_.dump();
     const std::string pipe = files_.path() + "/pipe";
     ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
     const std::string good = responses(kGood);
     // clang-format off
-    const struct { const char* why; std::string copy; std::string responses; std::vector<std::string> more; std::string told; } rows[] = {
+    const struct { const char* why; std::string copy; std::string responses; std::vector<std::string> more; std::string error; } rows[] = {
         {"no such copy",        "C2",              good, {}, "no such copy: C2 (see kz7admin copies)"},
         {"no copy's name",      "COPY1\\PROFILES", good, {}, "no such copy: COPY1\\PROFILES (see kz7admin copies)"},
         {"no response file",    "COPY1", "/nowhere", {}, "/nowhere: No such file or directory"},
@@ -89,7 +89,7 @@ TEST_F(CommitProgram, TellsWhyItCannotBegin) {
         words.insert(words.end(), row.more.begin(), row.more.end());
         const ProgramResult result = store_.run("kz7admin", words);
         EXPECT_EQ(result.exitCode, 2) << row.why;
-        EXPECT_EQ(result.error, "kz7admin: " + row.told + "\n") << row.why;
+        EXPECT_EQ(result.error, "kz7admin: " + row.error + "\n") << row.why;
     }
     const ProgramResult bad = commit("KZ7ACCOUNT = me\nwhat\n", {});
     EXPECT_EQ(bad.exitCode, 2);
@@ -97,7 +97,7 @@ TEST_F(CommitProgram, TellsWhyItCannotBegin) {
     EXPECT_EQ(store_.dump(), before) << "the whole file is read before anything is set";
 }
 
-TEST_F(CommitProgram, ReportsWhatTheProcessorDoes) {
+TEST_F(CommitProgram, ReportsTheResultOfTheProcessor) {
     const std::string set = "parameter set: DIAGLEVEL=3";
     // clang-format off
     const struct { const char* why; std::string variable; int exitCode; std::string log; } rows[] = {

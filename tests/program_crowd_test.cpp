@@ -33,7 +33,7 @@ std::string copyName(std::size_t process, int run) {
 
 class Crowd : public testing::TestWithParam<std::size_t> {};
 
-TEST_P(Crowd, AddsAtTheSameTimeOnAnEmptyMachineLoseNothing) {
+TEST_P(Crowd, ConcurrentAddsLoseNothing) {
     constexpr int kRuns = 200;
     const StateDirectory state;
     std::vector<std::future<std::string>> processes;
@@ -81,20 +81,20 @@ TEST(Race, ACopyThatIsRemovedWhileItsVariablesAreSetDoesNotComeBack) {
 
 INSTANTIATE_TEST_SUITE_P(Processes, Crowd, testing::Values(2, 8));
 
-// The sample copy's location; its programs can be made to look at the store that they were started on.
+// The location of the sample copy, whose programs can look at the store during a run.
 const std::string kSample = KZ7_SAMPLE;
 
 // A command that is killed at random moments. Adding a flow is adding a row.
 struct KilledFlow {
     const char* name;
-    std::vector<Arguments> before;  // commands that make the state it starts from
+    std::vector<Arguments> before;  // commands that create the initial state
     Arguments command;
 };
 
 std::vector<Arguments> manyAdds() {
-    std::vector<Arguments> adds;
-    for (int run = 0; run < 14; ++run) {
-        adds.push_back({"-addKZ7Copy", copyName(0, run), "C:\\KZ7"});
+    std::vector<Arguments> adds(14);
+    for (int run = 0; Arguments & add : adds) {
+        add = {"-addKZ7Copy", copyName(0, run++), "C:\\KZ7"};
     }
     return adds;
 }
@@ -137,7 +137,7 @@ bool hasUnfinishedStore(const StateDirectory& state) {
                        [](const auto& file) { return file.path().filename().string().starts_with("registry.db."); });
 }
 
-// The states in which a command starts its child programs: committed ones, so that the programs see them.
+// The committed states that the child programs of a command see.
 std::set<std::string> statesOfChildren(const StateDirectory& start, const Arguments& command) {
     const StateDirectory state;
     state.copyFrom(start);
@@ -170,15 +170,15 @@ protected:
     }
 
     const KilledFlow& flow_ = GetParam();
-    const StateDirectory start_;
-    const StateDirectory done_;
+    const StateDirectory start_{};
+    const StateDirectory done_{};
     std::chrono::nanoseconds usual_{};  // the time of a whole run
     std::string after_;
     std::set<std::string> unfinished_;  // states that were committed before the last one
 };
 
 TEST_P(Kills, LeaveAStateThatWasCommitted) {
-    // More of them for a soak; else enough to meet every part of a run.
+    // A soak test asks for more; this number reaches every part of a run.
     const char* const asked = std::getenv("KZ7_KILLS");
     const int kills = asked == nullptr ? 100 : std::atoi(asked);
     std::mt19937_64 random(20240607);

@@ -1,4 +1,4 @@
-// The provider registration and what kz7admin tells of its result, with a real library and real programs.
+// The provider registration, and its result in kz7admin, with a real library and real programs.
 #include <gtest/gtest.h>
 
 #include <unistd.h>
@@ -26,7 +26,7 @@ const std::string kPrefix = "install\\src\\uselvlkz7reg.cpp:";
 
 TEST_F(ProviderProgram, RegistersWhileItsProgramsUseTheStore) {
     ASSERT_EQ(store_.tool({"-addKZ7Copy", "COPY1", "C:\\KZ7"}).exitCode, 0);
-    // Each program adds a copy of its own: it could not while its parent holds the store.
+    // Each program adds a copy, which it could not do while its parent holds a transaction.
     const std::string hook = programPath("kz7InstallReg") + " -addKZ7Copy CHILD 'C:\\child' && " +
                              programPath("kz7admin") + " tree 'SOFTWARE\\Classes' | grep -q KZ7NMPdata";
     const ProgramResult result = store_.tool({"-dotnet", "C:\\KZ7\\"}, {{"KZ7_SAMPLE_HOOK=" + hook}, {}});
@@ -47,7 +47,7 @@ TEST_F(ProviderProgram, RegistersWhileItsProgramsUseTheStore) {
     EXPECT_EQ(dump.find("kz7nmpdata.txt"), std::string::npos);
 }
 
-TEST_F(ProviderProgram, ErrorsStandBetweenTheLinesThatTheyBelongTo) {
+TEST_F(ProviderProgram, ErrorsAreInOrderWithTheOutput) {
     const ProgramResult refused = store_.shell("kz7InstallReg -dotnet 'C:\\KZ7' 2>&1", {{"KZ7_SAMPLE_EXIT=5"}, {}});
     EXPECT_EQ(refused.exitCode, 255) << "no copies, no aliases";
     EXPECT_EQ(refused.output,
@@ -78,7 +78,7 @@ TEST_F(ProviderProgram, LostOutputAndHostileTextsAreOneLineEach) {
     EXPECT_NE(escaped.error.find("/\\x1b[2J\\u061c"), std::string::npos) << escaped.error;
 }
 
-TEST_F(ProviderProgram, NothingIsTakenFromTheCurrentFolder) {
+TEST_F(ProviderProgram, UsesNothingFromTheCurrentDirectory) {
     const std::string parent = store_.file("drive_c");
     const ProgramResult result = store_.tool({"-addv9", "KZ7", "C:\\KZ7"},
                                              {{}, [&] { [[maybe_unused]] const int moved = chdir(parent.c_str()); }});
@@ -90,7 +90,7 @@ TEST_F(ProviderProgram, NothingIsTakenFromTheCurrentFolder) {
     EXPECT_EQ(store_.dump().find("KZ7NMPdata"), std::string::npos);
 }
 
-TEST_F(ProviderProgram, CopiesAreShownWithTheirServicesAndAliasesWithWhatIsWrong) {
+TEST_F(ProviderProgram, ShowsCopiesWithTheirServicesAndWrongAliases) {
     const std::string storeLine = store_.file("registry.db");
     const ProgramResult none = store_.run("kz7admin", {"copies"});
     EXPECT_EQ(none.exitCode, 1);

@@ -1,5 +1,5 @@
-// The runtime and the front end as people run them: an installer program alone, misused by its front end, and
-// under kz7admin front.
+// The runtime and the front end as programs: an installer alone, with a misbehaving front end, and under kz7admin
+// front.
 #include <gtest/gtest.h>
 
 #include <fcntl.h>
@@ -16,7 +16,7 @@ namespace {
 
 class RuntimeProgram : public testing::Test {
 protected:
-    // In the folder of the log.
+    // A file next to the log.
     std::string path(const std::string& name) const { return store_.file(name); }
     std::string log() const { return contents(path("setup.log")); }
     std::string lastLine() const {
@@ -44,7 +44,7 @@ constexpr const char* kLoggedRun =
     "Note: The installation medium was not found. Where is it?\n"
     "Registering the copy\nRegistering the copy\nCreating the instance\nCreating the instance\n\nInstallation ended: ";
 
-TEST_F(RuntimeProgram, FinishesItsWorkWhateverTheFrontEndDoes) {
+TEST_F(RuntimeProgram, FinishesItsWorkOnAnyInput) {
     // clang-format off
     const struct { const char* why; std::string input; bool aborted; } rows[] = {
         {"nothing",           "",                                      false},
@@ -77,7 +77,7 @@ TEST_F(RuntimeProgram, KeepsItsLogWithoutAReaderAndItsReaderWithoutALog) {
     EXPECT_EQ(install({.environment = {}, .inChild = closed}).exitCode, 0);
     EXPECT_NE(log().find(kLoggedRun), std::string::npos);
 
-    // More than the lines on standard output, which meet the same limit.
+    // Larger than standard output, which has the same limit.
     const std::string before = log() + std::string(10'000, 'x') + '\n';
     overwrite(path("setup.log"), before);
     const ProgramResult full = install({.environment = {}, .inChild = limitFileSize(before.size() + 50)});
@@ -85,7 +85,7 @@ TEST_F(RuntimeProgram, KeepsItsLogWithoutAReaderAndItsReaderWithoutALog) {
     EXPECT_TRUE(full.output.ends_with(lastLine()));
     EXPECT_TRUE(log().starts_with(before)) << "the log of the earlier run stays";
 
-    // A log behind a link is not written: somebody else may have laid it.
+    // A log that is a link is not written: another user may have created it.
     std::filesystem::remove(path("setup.log"));
     overwrite(path("precious"), "precious");
     std::filesystem::create_symlink(path("precious"), path("setup.log"));
@@ -119,7 +119,7 @@ TEST_F(RuntimeProgram, FrontShowsARunAndAnswersIt) {
     EXPECT_NE(aborted.output.find("Undoing: done\n"), std::string::npos);
 }
 
-// The end of a program ends its question, though an answer could still come.
+// The end of a program ends its question, although an answer could still arrive.
 TEST_F(RuntimeProgram, FrontEndsWithAProgramThatAskedAndEnded) {
     overwrite(path("script"), "#!/bin/sh\necho 'MESSAGE QUERY CDPATH :: Where? :: '; exit 4\n");
     std::filesystem::permissions(path("script"), std::filesystem::perms::owner_all);
@@ -149,14 +149,14 @@ TEST_F(RuntimeProgram, TheExampleSurvivesAnyAllocationThatFails) {
     }
 }
 
-TEST_F(RuntimeProgram, FrontTakesWhateverAProgramDoes) {
+TEST_F(RuntimeProgram, FrontHandlesAnyProgram) {
     std::string bars;
     std::string complaints;
     for (int i = 0; i < 3000; ++i) {
         bars += "Installing: x\n";
         complaints += "y\n";
     }
-    const std::string longest(64 * 1024, 'x');
+    const std::string longest(std::size_t{64} * 1024, 'x');
     // clang-format off
     const struct { const char* why; std::string lines; int exitCode; std::string output; std::string error; } rows[] = {
         {"garbage and half a line", R"(printf 'a\001b\n\n\377\nPROGRESS TASK\nhalf'; exit 3)", 3,

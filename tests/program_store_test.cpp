@@ -1,5 +1,5 @@
-// The tool on stores that are damaged, locked, full or out of reach: it ends with a status and a line that
-// names the file, and nothing of what was there is lost.
+// The tool on stores that are damaged, locked, full or out of reach: it ends with a status and a line that names the
+// file, and nothing is lost.
 #include <gtest/gtest.h>
 #include <sqlite3.h>
 #include <sys/mount.h>
@@ -13,7 +13,7 @@
 namespace kz7::test {
 namespace {
 
-// The database is still open; closing null does nothing.
+// The database remains open; closing null does nothing.
 sqlite3* executeSql(const std::string& path, const char* sql) {
     sqlite3* database = nullptr;
     EXPECT_EQ(sqlite3_open(path.c_str(), &database), SQLITE_OK);
@@ -21,7 +21,7 @@ sqlite3* executeSql(const std::string& path, const char* sql) {
     return database;
 }
 
-TEST(StoreFaults, BadStoresEndWithTheirStatusAndOneLineThatNamesTheFile) {
+TEST(StoreFaults, BadStoresEndWithAStatusAndOneLineThatNamesTheFile) {
     // clang-format off
     const struct { const char* why; void (*spoil)(const std::string& path); Status status; const char* said; } rows[] = {
         {"noise over the header", [](const std::string& path) { overwrite(path, std::string(8192, 'x')); },
@@ -50,7 +50,7 @@ TEST(StoreFaults, BadStoresEndWithTheirStatusAndOneLineThatNamesTheFile) {
         const StateDirectory state;
         const std::string path = state.file("registry.db");
         ASSERT_EQ(state.tool(kAddFirst).exitCode, 0);
-        // Leaves the whole store in the one file that is spoiled.
+        // Moves the whole store to the one file that is damaged.
         sqlite3_close(executeSql(path, "PRAGMA wal_checkpoint(TRUNCATE)"));
         row.spoil(path);
         ProgramResult result;
@@ -68,7 +68,7 @@ TEST(StoreFaults, BadStoresEndWithTheirStatusAndOneLineThatNamesTheFile) {
     }
 }
 
-TEST(StoreFaults, AStoreThatStaysLockedOrIsOutOfReachIsTold) {
+TEST(StoreFaults, ReportsAStoreThatStaysLockedOrCannotBeReached) {
     const StateDirectory state;
     ASSERT_EQ(state.tool(kAddFirst).exitCode, 0);
     const std::string before = state.dump();
@@ -88,7 +88,7 @@ TEST(StoreFaults, AStoreThatStaysLockedOrIsOutOfReachIsTold) {
         << nowhere.error;
 }
 
-// What is below a service's key goes with it; the tree is as deep as no path and no stack is.
+// The keys below a service's key are deleted with it. The tree is deeper than any path and any stack.
 TEST(DeepStores, AServiceWithADeepTreeOrACycleBelowIt) {
     constexpr const char* kBelow =
         "INSERT INTO key (parent, fold, name, class) SELECT id, 'A', 'A', '' FROM key WHERE fold = 'KZ7MGMTSVC_FIRST';"
@@ -116,15 +116,16 @@ TEST(DeepStores, AServiceWithADeepTreeOrACycleBelowIt) {
 
 // The log is written back only while no other program reads. The reader of the pipe adds copies after its first byte.
 TEST(SlowReaders, HoldNoTransaction) {
+    const std::string program = programPath("kz7admin");
     const std::string adds = " | (head -c 1; for i in $(seq 40); do " + programPath("kz7InstallReg") +
                              " -addKZ7Copy C$i /x; done; cat) >/dev/null";
-    for (const std::string command : {" tree", " export"}) {
+    const std::string commands[] = {program + " tree" + adds, program + " export" + adds};
+    for (const std::string& command : commands) {
         const StateDirectory state;
         overwrite(state.file("large.reg"),
                   "REGEDIT4\n\n[HKEY_USERS\\L]\n\"v\"=\"" + std::string(1 << 19, 'x') + "\"\n");
         ASSERT_EQ(state.run("kz7admin", {"import", state.file("large.reg")}).exitCode, 0);
-        runProgram({"/bin/sh", "-c", programPath("kz7admin") + command + adds},
-                   {{"KZ7_STATE_DIR=" + state.path()}, {}});
+        runProgram({"/bin/sh", "-c", command}, {{"KZ7_STATE_DIR=" + state.path()}, {}});
         EXPECT_LT(std::filesystem::file_size(state.file("registry.db-wal")), 1U << 19) << command;
     }
 }
@@ -155,7 +156,7 @@ TEST(ScarceResources, AFullDiskChangesNothing) {
         GTEST_SKIP() << "no small file system can be mounted here";
     }
     state.copyFrom(start);
-    overwrite(state.file("ballast"), std::string(128 * 1024, 'x'));
+    overwrite(state.file("ballast"), std::string(std::size_t{128} * 1024, 'x'));
     const ProgramResult refused = state.tool(kAddSecond);
     std::filesystem::remove(state.file("ballast"));
     const std::string found = state.dump();

@@ -25,7 +25,7 @@ int sampleLevel(std::uint32_t version, LevelRecord* record) {
     return levelResult;
 }
 
-// A location with everything a copy ships, whose programs succeed, and one copy that the aliases can name.
+// A location with all files of a copy, whose programs succeed, and one copy for the aliases.
 void installAt(Machine& machine, const std::string& location) {
     levelText = "KZ7 v9.7.800.123";
     levelResult = 0;
@@ -45,7 +45,7 @@ void installAt(Machine& machine, const std::string& location) {
 
 constexpr const char* kAliases = "9.7.800.0=COPY1 9.7.800=COPY1 9.7=COPY1 9=COPY1";
 
-// What both configuration programs are announced with.
+// The lines that announce both configuration programs.
 std::string configured(const std::string& level, const std::string& location, const std::string& end = {}) {
     const std::string arguments = " -register -level " + level + " -kz7path " + location + end;
     const std::string program = (end.empty() ? location + "\\" : location) + "bin\\kz7nmpcfg";
@@ -57,14 +57,14 @@ TEST(DotNet, RegistersALocationInBothForms) {
         const std::string end = location.ends_with('\\') ? "\n" : "";
         Machine machine;
         installAt(machine, "C:\\KZ7");
-        installAt(machine, location);  // a library is looked for behind a doubled separator
+        installAt(machine, location);  // the library is searched after a doubled separator
         machine.set(kRecords, "kz7nmpold.dll,level=\"9.7.8\",generation=\"1\"", "old");
         machine.set(kRecords, "kz7nmpold.dll,level=\"9.7.80\",generation=\"1\"", "another level's");
 
-        EXPECT_EQ(machine.told({"-DOTNET", location}),
+        EXPECT_EQ(machine.result({"-DOTNET", location}),
                   "Level Returned: 9.7.8.1\n" + configured("9.7.8", location, end) + "||0");
 
-        const std::string arguments = " -register -level 9.7.8 -kz7path " + location + end;
+        const std::string arguments = compose(" -register -level 9.7.8 -kz7path %s%s", {location, end});
         const std::vector<std::string> started = {"\"C:\\KZ7\\bin\\kz7nmpgac32.exe\" -i \"" + location + "\" ",
                                                   "\"C:\\KZ7\\bin\\kz7nmpcfg.exe\"" + arguments,
                                                   "\"C:\\KZ7\\bin\\kz7nmpcfg_32.exe\"" + arguments + " -migratev8 "};
@@ -138,12 +138,12 @@ TEST(AddV9, RegistersTheProvidersOfALocationNamedAsTheCopy) {
                                           configured("9.7.8", "COPY1")));
     EXPECT_EQ(machine.values(kCopies), kAliases);
 
-    // What the add gives is dropped: this name cannot have a service.
+    // The result of the add is ignored: this name cannot have a service.
     EXPECT_EQ(machine.run({"-addv9", "a\\b", "C:\\KZ7"}), kSuccess);
     EXPECT_NE(machine.console_.error.find("941: Unable to add a new copy"), std::string::npos);
 }
 
-TEST(Migration, EndsWithTheProvidersAndAsksTheirLibraryForTheLevel) {
+TEST(Migration, EndsWithTheProvidersAndReadsTheLevelFromTheLibrary) {
     Machine machine;
     installAt(machine, "C:\\KZ7");
     EXPECT_EQ(machine.run({"-v9", "C:\\KZ7"}), kSuccess);

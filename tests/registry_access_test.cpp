@@ -10,7 +10,7 @@ namespace {
 
 constexpr KeyHandle kMachine = KeyHandle::localMachine;
 
-TEST(RegistryAccess, ATreeCopyKeepsWhatIsThereUnlessToldAndEndsAtWhatDoesNotFit) {
+TEST(RegistryAccess, ATreeCopyPreservesOrOverwritesAndFailsAtLongData) {
     for (const bool overwrite : {false, true}) {
         Machine machine;
         for (const char* key : {"From\\Sub", "To\\Sub"}) {
@@ -41,7 +41,7 @@ TEST(RegistryAccess, ATreeDeletionSparesANameAndTheKeysAboveIt) {
         {"a placeholder without a name is literal",  token, "",                     "",       kFileNotFound,         nullptr},
         {"a path over its 1,024 bytes",              token, std::string(1024, 'T'), "",       kFilenameExceedsRange, nullptr},
         {"the spared name is compared with its case", "T",  "",                     "sPARED", kSuccess,              "[Beside] \n"},
-        // The key with the spared one below it cannot go, and that failure ends the walk there.
+        // The key above the spared one cannot be deleted, and that failure ends the deletion.
         {"a spared subkey keeps all below it", "T", "", "Spared", kAccessDenied,
          "[Beside] \n[T] \n[T\\Spared] \n[T\\Spared\\x] \n[T\\Spared\\y] \n[T\\z] \n[T\\z\\Spared] \n[T\\z\\Spared\\w] \n"},
         {"a spared name deeper down ends the walk at the key above it", "T", "", "w", kAccessDenied,
@@ -80,7 +80,7 @@ TEST(RegistryAccess, ATreeDeletionReachesBelowThePathsThatFit) {
     EXPECT_EQ(machine.dump(), "[Beside] \n");
 }
 
-TEST(RegistryAccess, ARefusalToReadAValueIsNoAbsence) {
+TEST(RegistryAccess, AValueThatCannotBeReadExists) {
     Machine machine;
     OwnedKey key(machine.registry_);
     machine.registry_.createKey(kMachine, "K", {}, kKeySetValue, key.receive());

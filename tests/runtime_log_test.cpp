@@ -1,4 +1,4 @@
-// The log of a run: exact files with a clock that stands still, the session's log, and what goes wrong.
+// The log of a run: exact files with a fixed clock, the session's log, and failures.
 #include <gtest/gtest.h>
 
 #include <sstream>
@@ -10,7 +10,7 @@ namespace {
 
 const std::string kLine60 = "============================================================\n";
 
-TEST(LogFile, HoldsARunToTheByte) {
+TEST(LogFile, ContainsAWholeRunExactly) {
     RuntimeMachine machine;
     machine.engine.mode = kModeInstall;
     machine.host_.installed.name = "\"Linux\"";
@@ -87,7 +87,7 @@ TEST(LogFile, IsReplacedByTheSessionIfItCannotBeOpened) {
     const std::string header = "\nTue Jan  2 03:04:05 2024 UTC\n" + kLine60 + "Memory 1.0\n";
     const std::string report = "ERROR: URELogObserver::setLogFile, step 10: error ";
     // clang-format off
-    const struct { const char* why; std::string path; std::string told; } rows[] = {
+    const struct { const char* why; std::string path; std::string expected; } rows[] = {
         {"no folder in the path",     "setup.log",                                onlyNotes},
         {"no path",                   "",                                         onlyNotes},
         {"no short form",             "C:\\absent\\setup.log",                    onlyNotes},
@@ -105,9 +105,9 @@ TEST(LogFile, IsReplacedByTheSessionIfItCannotBeOpened) {
         machine.say(0x4000001, "\"a note\"");
         machine.say(0x4000100, "an error");
         machine.engine.startTask(1, 1, true, "a task");
-        std::istringstream told(row.told);
+        std::istringstream expected(row.expected);
         std::string shown;
-        for (std::string line; std::getline(told, line);) {
+        for (std::string line; std::getline(expected, line);) {
             shown += "4000000||" + line + "\n";
         }
         EXPECT_EQ(machine.shownInSession(), shown) << row.why;

@@ -160,7 +160,7 @@ TEST(RuntimeFaults, AnyCallMayFail) {
             }
         }
     }
-    // A call that is not in the table is one that the flow does without.
+    // The flows succeed although other calls fail.
     const std::map<std::string, std::set<std::string>> expected = {
         // clang-format off
         {"program",    {"createPipe 5030", "duplicate 5030", "exitCode 5082", "setSlot 5030", "startProcess 5082", "startThread 5111"}},

@@ -1,4 +1,4 @@
-// What a front end is told and answers: single lines, the queue, whole runs to the byte, and what goes wrong.
+// The progress protocol and the streams for people: single lines, the queue, whole runs to the byte.
 #include <gtest/gtest.h>
 
 #include <array>
@@ -14,7 +14,7 @@ namespace {
 using namespace std::literals;
 using Response = UREInfo::Response;
 
-TEST(ProtocolLines, KeepTheirLineFeedAndTellNoOtherEvent) {
+TEST(ProtocolLines, EndInALineFeedWhenCutAndIgnoreOtherEvents) {
     ProtocolLine line;
     EXPECT_TRUE(progressLine({ProgressKind::end, 0, 1, true, std::string(5000, 'x')}, line));
     EXPECT_EQ(line.view().size(), 1023U);
@@ -26,7 +26,7 @@ TEST(ProtocolLines, KeepTheirLineFeedAndTellNoOtherEvent) {
     EXPECT_EQ(many.identifiers.view().size(), 1024U);
 }
 
-TEST(ProtocolLines, TakeAnswers) {
+TEST(ProtocolLines, ParseAnswers) {
     const auto all = [](std::initializer_list<const char*> lines, AnswerLine answer) {
         for (const char* line : lines) {
             EXPECT_EQ(parseAnswer(line), answer) << line;
@@ -57,9 +57,9 @@ TEST(Pipe, WritesWhatIsQueuedCutAndWithPercentSignsOnce) {
     EXPECT_EQ(machine.console_.flushed, machine.console_.output.size());
 }
 
-// As an installer makes it: tasks, errors, questions, a roll-back. Entries of a task list are cut as a whole,
-// and a line that is longer than any answer is one line.
-TEST(MachineStream, TellsAWholeRunToTheByte) {
+// The calls of an installer: tasks, errors, questions, a roll-back. Entries of a task list are cut as a whole, and an
+// answer line that is too long is one line.
+TEST(MachineStream, WritesAWholeRunExactly) {
     RuntimeMachine machine;
     URE& engine = machine.engine;
     machine.terminal_.input = "RESPONSE :: E\r\n" + std::string(5000, 'x') + "ABORT\nABORT\n";
@@ -84,7 +84,7 @@ TEST(MachineStream, TellsAWholeRunToTheByte) {
     engine.startTask(0x1FFFFFFFF, -1, true, "a\r\n :: %s%n%%");
     engine.endTask(5, false, "a\0b"sv);
     responses.push_back(engine.ask(2, 1, {}, "", answer));
-    ObserversEnd{};
+    { const ObserversEnd end; }
     EXPECT_FALSE(machine.terminal_.keepsLineFeeds);
     EXPECT_EQ(responses, (std::vector{Response::answered, Response::none, Response::aborted}));
     EXPECT_EQ(answer, "");
@@ -110,7 +110,7 @@ TEST(MachineStream, TellsAWholeRunToTheByte) {
         "MESSAGE INFO INSTALLEND :: C:\\Setup Logs\\setup.log\n");
 }
 
-TEST(HumanStream, IsReadableAndAsWideAsTheTerminal) {
+TEST(HumanStream, FitsTheTerminal) {
     RuntimeMachine machine;
     URE& engine = machine.engine;
     machine.terminal_.view = {.terminal = true, .redraws = true, .colours = true, .columns = 30};

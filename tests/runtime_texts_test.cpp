@@ -1,4 +1,4 @@
-// What the runtime reads and says: response files, the message catalogue.
+// Response files and the message catalogue.
 #include <gtest/gtest.h>
 
 #include <string>
@@ -19,7 +19,7 @@ std::string shown(const std::vector<ResponseKeyword>& keywords) {
     return text;
 }
 
-TEST(ResponseFile, GivesNamesAndValuesInFileOrderOrTheFirstBadLine) {
+TEST(ResponseFile, ReturnsPairsInFileOrderOrTheFirstBadLine) {
     // clang-format off
     const struct { const char* why; std::string file; std::string keywords; } rows[] = {
         {"pairs in their order",            "B = 1\nA=2\nB =3\n",                      "B<1>A<2>B<3>"},
@@ -65,7 +65,7 @@ std::string textOf(const MessageCatalogue& catalogue, std::uint32_t number, std:
     return status == kSuccess ? std::string(room, length) : "status " + std::to_string(status);
 }
 
-TEST(MessageCatalogue, GivesOwnTextsAndThoseOfAFile) {
+TEST(MessageCatalogue, ReturnsBuiltInTextsAndThoseOfAFile) {
     MessageCatalogue catalogue;
     EXPECT_EQ(textOf(catalogue, 2003, {}), "Note: ");
     EXPECT_EQ(textOf(catalogue, 5058, {"A", "1", "I"}), "Database-manager parameter set: A=1, instance I");

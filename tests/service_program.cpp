@@ -1,17 +1,17 @@
-// A service that does nothing but run until it is told to stop.
+// A service that runs until it gets the stop control.
 #include <windows.h>
 
 #include <string>
 
-static SERVICE_STATUS_HANDLE told;
+static SERVICE_STATUS_HANDLE serviceStatus;
 static HANDLE stopAsked;
 
-static void tell(DWORD state) {
+static void report(DWORD state) {
     SERVICE_STATUS status{};
     status.dwServiceType = SERVICE_WIN32_OWN_PROCESS;
     status.dwCurrentState = state;
     status.dwControlsAccepted = SERVICE_ACCEPT_STOP;
-    SetServiceStatus(told, &status);
+    SetServiceStatus(serviceStatus, &status);
 }
 
 static void WINAPI control(DWORD code) {
@@ -22,15 +22,15 @@ static void WINAPI control(DWORD code) {
 
 static void WINAPI run(DWORD, char** arguments) {
     stopAsked = CreateEventA(nullptr, TRUE, FALSE, nullptr);
-    told = RegisterServiceCtrlHandlerA("", control);
-    tell(SERVICE_RUNNING);
+    serviceStatus = RegisterServiceCtrlHandlerA("", control);
+    report(SERVICE_RUNNING);
     WaitForSingleObject(stopAsked, INFINITE);
-    // A test that makes an event of the service's name decides when it has ended.
+    // A test that creates an event of the service's name decides when the service has ended.
     if (HANDLE gate = OpenEventA(SYNCHRONIZE, FALSE, (std::string("Global\\") + arguments[0]).c_str())) {
-        tell(SERVICE_STOP_PENDING);
+        report(SERVICE_STOP_PENDING);
         WaitForSingleObject(gate, INFINITE);
     }
-    tell(SERVICE_STOPPED);
+    report(SERVICE_STOPPED);
 }
 
 int main() {

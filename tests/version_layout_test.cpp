@@ -1,4 +1,4 @@
-// The migrations between the version-8 layout and the copies: exact lines and registries, there and back.
+// The migrations between the version-8 layout and the copies, in both directions: exact lines and registries.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -34,8 +34,8 @@ TEST(Version8, RestoresTheBackupAndWritesTheDefaults) {
     machine.addService("KZ7MGMTSVC", false);
     machine.servicesLeftOpen = 2;  // by the switch-off
 
-    EXPECT_EQ(machine.told({"-V8", "C:\\KZ8"}), "Creating version 8 registry\n" + kDefaultLines +
-                                                    "Version 8 default registry keys created successfully\n||0")
+    EXPECT_EQ(machine.result({"-V8", "C:\\KZ8"}), "Creating version 8 registry\n" + kDefaultLines +
+                                                      "Version 8 default registry keys created successfully\n||0")
         << "a stop that fails says nothing";
     EXPECT_EQ(machine.dump("SOFTWARE\\NVQ"),
               "[SOFTWARE\\NVQ\\KZ7] \nSOFTWARE\\NVQ\\KZ7 : KZ7 Path Name = 1:C:\\KZ8\\x00\n"
@@ -86,7 +86,7 @@ protected:
             },
             "C:\\KZ9");
     }
-    // The lines of the console without those that announce a value.
+    // The lines of the console, except those that announce a value.
     std::string reported() {
         std::string text;
         std::istringstream lines(machine.console_.both);
@@ -180,7 +180,7 @@ TEST_F(Version9, ReportsWhatIsMissingAndDoesTheRest) {
     EXPECT_TRUE(machine.has("SOFTWARE\\NVQ\\KZ7\\PROFILES\\I"));
 }
 
-// The lines of a dump, but for the aliases, which follow the copies.
+// The lines of a dump, except the aliases, which depend on the copies.
 std::set<std::string> linesOf(const std::string& dump) {
     std::set<std::string> all;
     std::istringstream lines(dump);
@@ -205,7 +205,7 @@ TEST_F(Version9, AMigrationAndTheWayBackLoseNothing) {
                              "\\$CurrentInstallationName$", "\\PROFILES\\$CurrentInstallationName$"}) {
         machine.set(product + path, "", "default");
     }
-    // Just under the limit of a path in the backup, whose key is eight characters longer.
+    // Just below the limit of a path in the backup, whose key is eight characters longer.
     std::string longest = product + "\\Long";
     while (longest.size() + 201 <= 1023 - 8) {
         longest += "\\" + std::string(200, 'l');
@@ -223,7 +223,7 @@ TEST_F(Version9, AMigrationAndTheWayBackLoseNothing) {
     std::set_difference(before.begin(), before.end(), after.begin(), after.end(), std::back_inserter(lost));
     EXPECT_EQ(lost, std::vector<std::string>{}) << "all stayed in the copies key or came out of the backup";
 
-    // One more character, and the backup cannot be made: nothing is migrated. Cut, the path would name the sibling.
+    // With one more character the backup fails and nothing is migrated. A cut path would name the other key.
     machine.set(longest + "s", "v", "over the limit");
     const auto over = linesOf(machine.dump(product));
     EXPECT_EQ(machine.run({"-v9", "C:\\KZ9"}), kSuccess);

@@ -170,6 +170,38 @@ TEST_F(OnWindows, ALogIsAFileOfOneNameInItsPlace) {
     EXPECT_EQ(files.openForAppend(folder + "folder\\..\\precious", file.receive()), kSuccess);
 }
 
+TEST_F(OnWindows, FoldersOfTheSearchPathMayBeQuoted) {
+    const std::string folder = backend_->folder() + "\\two  words";
+    std::filesystem::create_directory(folder);
+    std::filesystem::copy_file(childProgram(), folder + "\\kz7_quoted.exe");
+    const std::string before = std::getenv("PATH");
+    const struct {
+        std::string path;
+        Status status;
+    } rows[] = {
+        {folder, kSuccess},
+        {'"' + folder + '"', kSuccess},
+        {"C:\\none;\"" + folder + "\\\";;.", kSuccess},
+        {'"' + folder, kSuccess},
+        {"\"C:\\none;" + folder + '"', kFileNotFound},
+        {"\".\"", kFileNotFound},
+    };
+    for (const auto& row : rows) {
+        setSearchPath(row.path);
+        ProcessInformation child;
+        EXPECT_EQ(platform_.processes().startProcess(
+                      {"kz7_quoted arguments", {}, StreamHandle::none, StreamHandle::none}, child),
+                  row.status)
+            << row.path;
+        EXPECT_EQ(std::getenv("PATH"), row.path);
+        for (const ProcessHandle handle : {child.process, child.mainThread}) {
+            platform_.processes().waitProcess(child.process, kInfiniteWait);
+            platform_.processes().closeProcess(handle);
+        }
+    }
+    setSearchPath(before);
+}
+
 TEST_F(OnWindows, AServiceThatEndsSlowlyIsWaitedFor) {
     const char* const name = "KZ7TestOfWindows";
     const HANDLE gate = CreateEventA(nullptr, TRUE, FALSE, (std::string("Global\\") + name).c_str());

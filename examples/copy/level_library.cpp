@@ -1,4 +1,4 @@
-// The product library of the sample copy: tells its level.
+// The product library of the sample copy: returns its level.
 #include <cstdint>
 #include <cstring>
 

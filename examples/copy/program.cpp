@@ -1,6 +1,5 @@
-// A program of the sample copy: tells how it was called and succeeds. Two variables change that:
-// KZ7_SAMPLE_EXIT is the exit code, KZ7_SAMPLE_HOOK a command that it runs first, for a look at the state in
-// which it was started.
+// A program of the sample copy: prints its command line and succeeds. Two variables change that: KZ7_SAMPLE_EXIT is the
+// exit code, KZ7_SAMPLE_HOOK a command that it runs first, for example to look at the store.
 #include <cstdio>
 #include <cstdlib>
 

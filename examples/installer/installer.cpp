@@ -1,6 +1,6 @@
-// An installer program for a front end to drive: announces its tasks, reports the progress of each, asks for its medium
-// and keeps a log, setup.log, in the folder that belongs to the programs. On the answer ABORT it undoes its work and
-// exits with 1; else it exits with the code that it is given, or 0. 14: memory ran out.
+// An installer program for a front end: announces its tasks, reports their progress, asks for its medium and writes a
+// log, setup.log, to the state directory. On the answer ABORT it undoes its work and exits with 1; otherwise it exits
+// with its argument or 0. 14: memory ran out.
 #include <cstdlib>
 #include <new>
 #include <string>
@@ -35,7 +35,7 @@ int install(URE& engine, int exitCode) {
     return exitCode;
 }
 
-// Throws std::bad_alloc when memory runs out before the installation begins.
+// Throws std::bad_alloc if memory runs out before the installation begins.
 int runInstaller(int exitCode) {
     const auto platform = hostPlatform({.program = "kz7_installer"});
     URE engine(portsOf(*platform));

@@ -2,6 +2,7 @@
 // for every action, other libraries keep it.
 #include <algorithm>
 #include <cstring>
+#include <functional>
 #include <memory>
 #include <new>
 
@@ -99,31 +100,54 @@ private:
     std::string text_;
 };
 
-// Copies a text into a caller's buffer, cut to its size and terminated.
-void copyOut(std::string_view narrow, std::uint32_t size, char* output) {
-    output[narrow.copy(output, size - 1)] = '\0';
+// As many characters of a text as fit into that many bytes of the code page.
+std::string narrowCut(std::string_view text, std::size_t most) {
+    std::string narrow;
+    while (!text.empty()) {
+        std::string_view rest = text;
+        char32_t character = 0;
+        rest.remove_prefix(takeUtf8(rest, character) ? 0 : 1);
+        const std::string next = narrowFromText(text.substr(0, text.size() - rest.size()));
+        if (narrow.size() + next.size() > most) {
+            break;
+        }
+        narrow += next;
+        text = rest;
+    }
+    return narrow;
+}
+
+// A property in the code page; `characters` is the room for the first attempt.
+Status readWhole(const std::function<Status(Buffer&)>& read, std::uint32_t characters, std::string& narrow) {
+    for (;; characters *= 2) {
+        std::string room(std::size_t{kBytesOfCharacter} * characters, '\0');
+        Buffer value(room.data(), static_cast<std::uint32_t>(room.size()), characters);
+        const Status status = read(value);
+        if (status == kSuccess) {
+            narrow = narrowFromText(value.view());
+        }
+        if (status != kMoreData || characters >= kMostCharacters) {
+            return status;
+        }
+    }
 }
 
 // Reads a property into a caller's buffer: the code page decides whether it fits and what its size is.
 Status readNarrow(const Installation& at, const char* name, char* buffer, std::uint32_t& size) {
-    const std::uint32_t characters = std::min(size, kMostCharacters);
-    std::string room(std::size_t{kBytesOfCharacter} * characters, '\0');
-    Buffer value(room.data(), static_cast<std::uint32_t>(room.size()), characters);
-    Status status = readProperty(at, name, value);
+    std::string narrow;
+    const std::uint32_t room = std::clamp<std::uint32_t>(size, kPropertySize, kMostCharacters);
+    const auto needed = [&narrow] { return narrow.size() + (narrow.ends_with('\0') ? 0 : 1); };
+    Status status = readWhole([&](Buffer& value) { return readProperty(at, name, value); }, room, narrow);
+    if (status == kSuccess && needed() > size) {
+        // A saved value that does not fit counts as not saved.
+        status = readWhole([&](Buffer& value) { return at.session.getProperty(name, value); }, room, narrow);
+    }
     if (status != kSuccess) {
-        size = status == kMoreData ? value.size : size;
         return status;
     }
-    std::string narrow = narrowFromText(value.view());
-    if (narrow.size() + (narrow.ends_with('\0') ? 0 : 1) > size) {
-        // Only where a character has two bytes: what is saved does not fit, so that the installer is asked.
-        Buffer none(room.data(), 1);
-        status = readProperty(at, name, none);
-        if (status != kSuccess) {
-            size = static_cast<std::uint32_t>(narrow.size());
-            return status;
-        }
-        narrow.clear();
+    if (needed() > size) {
+        size = static_cast<std::uint32_t>(needed());
+        return kMoreData;
     }
     size = static_cast<std::uint32_t>(narrow.size());
     narrow.copy(buffer, narrow.size());
@@ -142,11 +166,11 @@ const char* substituteNarrow(const char* text, const Argument& copyName, std::ui
     const Argument given(text);
     const char* substituted = iSubstituteCopyName(given.get(), copyName.get(), 0, nullptr);
     const bool same = substituted == given.get();
-    const std::string narrow = same ? text : narrowFromText(substituted);
     if (outputSize != 0) {
-        copyOut(narrow, outputSize, output);
+        const std::string narrow = same ? text : narrowCut(substituted, outputSize - 1);
+        output[narrow.copy(output, outputSize - 1)] = '\0';
     } else if (!same) {
-        shared = narrow;
+        shared = narrowFromText(substituted);
     }
     return same ? text : outputSize != 0 ? output : shared.c_str();
 }

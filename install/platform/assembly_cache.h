@@ -20,12 +20,12 @@ class IAssemblyCache {
 public:
     virtual ~IAssemblyCache() = default;
 
-    // Removes the providers of that level from the cache of every generation. Succeeds if there are none, and for
-    // the empty level.
+    // Removes the providers of that level from the cache of every generation. Succeeds if no provider has that level
+    // and if the level is empty.
     virtual Status deregisterProviders(std::string_view level) = 0;
 
     // Adds the location's providers to the caches of `generations`, under `level` if the files do not carry one
-    // themselves. Succeeds if there are none. On any other status some providers are missing in some generation,
+    // themselves. Succeeds if the location has no providers. On any other status some providers are missing in some generation,
     // usually because the framework is not installed; the others are registered.
     virtual Status registerProviders(std::string_view location, std::string_view level,
                                      FrameworkGenerations generations) = 0;

@@ -22,7 +22,7 @@ bool isProviderFile(std::string_view file);
 Status recordProviders(IRegistryStore& registry, std::string_view location, std::string_view level,
                        FrameworkGenerations generations, const std::vector<std::string>& files);
 
-// Deletes the records of that level. Succeeds if there are none, and for the empty level.
+// Deletes the records of that level. Succeeds if no record has that level and if the level is empty.
 Status dropProviders(IRegistryStore& registry, std::string_view level);
 
 }  // namespace kz7

@@ -45,8 +45,8 @@ std::u16string utf16FromText(std::string_view text);
 std::string textFromUtf16(std::u16string_view utf16);
 
 // The narrow encoding, in which other programs read and write texts: the active code page on Windows, the text of the
-// ports itself elsewhere. Bytes that the code page cannot give back become surrogates of bytes, so that
-// narrowFromText(textFromNarrow(bytes)) is always `bytes`.
+// ports itself elsewhere. Bytes that are not a character of the code page become surrogates of bytes, so that
+// narrowFromText(textFromNarrow(bytes)) is `bytes`, except where the code page has two codes for one character.
 std::string textFromNarrow(std::string_view narrow);
 
 // Characters that the code page lacks come out as its closest ones.

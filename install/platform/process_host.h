@@ -32,7 +32,7 @@ struct ProcessStart {
     StreamHandle input = StreamHandle::none;  // none: an empty standard input
 };
 
-// The caller closes both handles; a host without a handle for a main thread gives none.
+// The caller closes both handles; `mainThread` is `none` on hosts without such a handle.
 struct ProcessInformation {
     ProcessHandle process = ProcessHandle::none;
     ProcessHandle mainThread = ProcessHandle::none;
@@ -40,8 +40,8 @@ struct ProcessInformation {
     std::uint32_t mainThreadId = 0;
 };
 
-// Outputs are written on success only. kInvalidHandle: a handle that is none or not open. `read`, `write`
-// and `closeStream` may be called from any thread, each stream by one at a time; all else by one thread.
+// Outputs are written on success only. kInvalidHandle: the null handle or one that is not open. `read`, `write`
+// and `closeStream` may be called from any thread, but each stream by one thread at a time; all other operations by one thread.
 class IProcessHost {
 public:
     virtual ~IProcessHost() = default;
@@ -57,7 +57,7 @@ public:
     // A second handle of a stream, with the same access, that no child inherits. The caller closes it.
     virtual Status duplicate(StreamHandle stream, StreamHandle& copy) = 0;
 
-    // Waits for bytes and gives those that are there, up to the capacity. kBrokenPipe: every write end is
+    // Waits for bytes and returns those that are available, up to the capacity. kBrokenPipe: every write end is
     // closed and all was read. A success with 0 bytes is a write of nothing at the other end.
     virtual Status read(StreamHandle stream, Buffer& data) = 0;
 
@@ -67,7 +67,7 @@ public:
     virtual Status closeStream(StreamHandle stream) = 0;
 
     // Starts a program, hidden, with this process's environment and the streams; it inherits no other handle.
-    // A program path with blanks and no quotes is looked for piece by piece. kFileNotFound: no such program;
+    // A program path with blanks and without quotation marks is tried up to each blank in turn. kFileNotFound: no such program;
     // also, where the host has no drives, one it cannot execute. kBadDirectory: no such working directory.
     virtual Status startProcess(const ProcessStart& start, ProcessInformation& started) = 0;
 

@@ -52,7 +52,7 @@ constexpr bool isTextType(ValueType type) {
 }
 
 // The type of a text that ends within a UTF-16 unit; its data are the bytes of its UTF-16 form. Only a registry of
-// UTF-16 texts makes such values, other stores keep them. The number is none that a registry can hold.
+// UTF-16 texts creates such values, other stores preserve them. No registry has a type of that number.
 constexpr ValueType oddText(ValueType text) {
     return ValueType{static_cast<std::uint64_t>(text) | std::uint64_t{1} << 32};
 }
@@ -66,7 +66,7 @@ inline constexpr std::uint32_t kMaxKeyName = 255;      // characters of one key 
 inline constexpr std::uint32_t kMaxValueName = 16383;  // characters of a value name
 
 // Paths are texts below a key, parts separated by backslashes; the empty path is the key itself.
-// Names keep their case and compare without it (ASCII). Subkeys enumerate in the order of their
+// Names preserve their case and compare without it (ASCII). Subkeys enumerate in the order of their
 // upper-cased names, values in the order they were first set; the first spelling of a name is kept.
 // On Windows a key may be a link to another; paths follow it unless the access for their last name says otherwise.
 // Outputs are written on success only, but for Buffer::size, which kMoreData fills.

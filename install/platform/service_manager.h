@@ -47,14 +47,14 @@ inline bool isServiceName(std::string_view name) {
 struct ServiceDefinition {
     std::string_view name;
     std::string_view displayName;
-    std::string_view programPath;  // stored as it stands, without quotation marks around it
+    std::string_view programPath;  // stored unchanged, without quotation marks
     std::uint32_t type = kServiceOwnProcess;
     ServiceStart start = ServiceStart::automatic;
     std::uint32_t errorControl = kServiceErrorNormal;
     std::uint32_t deletionWait = 0;  // milliseconds that a pending deletion of that name is waited for
 };
 
-// Every handle given out is the caller's to close. Outputs are written on success only. Service names
+// The caller closes every handle that it gets. Outputs are written on success only. Service names
 // compare without case (ASCII). Common results: kServiceDoesNotExist, kAccessDenied, kInvalidHandle,
 // kServiceMarkedForDelete for a service that was deleted while the handle was open. One thread.
 class IServiceManager {
@@ -63,10 +63,10 @@ public:
 
     virtual Status openManager(std::uint32_t access, ServiceHandle& manager) = 0;
 
-    // kServiceExists: there is one of that name. kInvalidName: an empty name, one over 255 characters or with
-    // a slash of either kind. kServiceMarkedForDelete: one of that name was deleted, it still runs or a handle of
-    // it is still open, also at the end of `deletionWait`. kDuplicateServiceName: its display name is taken, on a host
-    // that judges it.
+    // kServiceExists: a service has that name. kInvalidName: an empty name, one over 255 characters or with
+    // a slash of either kind. kServiceMarkedForDelete: a service of that name was deleted, but it still runs or a
+    // handle of it is still open at the end of `deletionWait`. kDuplicateServiceName: its display name is in use, on hosts
+    // that check it.
     virtual Status createService(ServiceHandle manager, const ServiceDefinition& definition,
                                  ServiceHandle& service) = 0;
 
@@ -83,7 +83,7 @@ public:
     virtual Status startService(ServiceHandle service) = 0;
 
     // Sends the stop control. kSuccess when the control was taken, which the platform's call reports as a
-    // non-zero result: whoever judges that raw result sees 1 for success and 0 for failure.
+    // non-zero result: callers of that raw result see 1 for success and 0 for failure.
     // kServiceNotActive when it does not run; kServiceTakesNoControl while it is starting or stopping.
     virtual Status stopService(ServiceHandle service) = 0;
 

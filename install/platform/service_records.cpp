@@ -168,8 +168,7 @@ Status ServiceRecords::recordOf(ServiceHandle handle, std::uint32_t needed, Owne
     return kSuccess;
 }
 
-// Deliberate: no process is run, the start stands in the record alone; that is what the flows and administrators look
-// at.
+// Deliberate: no process is started, only the record changes; flows and administrators read the record.
 Status ServiceRecords::startService(ServiceHandle service) {
     OwnedKey record(registry_);
     ServiceState now{};

@@ -82,19 +82,19 @@ std::uint32_t takeColumns(std::string_view& text);
 
 std::uint32_t columnsOf(std::string_view text);
 
-// Takes the next line of at most `columns` columns off a text, broken at a blank where there is one; 0 columns
-// break nothing.
+// Takes the next line of at most `columns` columns off a text, broken at a blank if it has one; with 0 columns it
+// is not broken.
 std::string_view takeWrappedLine(std::string_view& text, std::uint32_t columns);
 
-// Appends that many hexadecimal digits of a number, in lower case, its last one at the end.
+// Appends the last `digits` hexadecimal digits of a number, in lower case.
 void appendHex(std::uint64_t number, int digits, std::string& text);
 
-// What stands in for a placeholder: %s takes a text, %d and %u a number (%d shows it signed, as the
+// The value of a placeholder: %s takes a text, %d and %u a number (%d shows it signed, as the
 // messages always did with a status).
 using Insert = std::variant<std::string_view, std::uint32_t>;
 
 // The pattern with its placeholders replaced in order. Patterns are message texts of this system, never
-// foreign text; inserts are taken as they are. "%%" is a percent sign.
+// foreign text; inserts are not interpreted. "%%" is a percent sign.
 std::string compose(std::string_view pattern, std::initializer_list<Insert> inserts);
 
 // The same into room of the caller's, cut to it, without a terminator; the result is the length of the whole.

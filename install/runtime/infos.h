@@ -106,7 +106,6 @@ public:
         queryFlag_ = 1;
         default_ = defaultValue;
     }
-    std::uint32_t queryFlag() const { return queryFlag_; }
     bool isQuestion() const { return messageClass() == kClassQuestion && queryFlag_ == 1; }
     std::string_view defaultValue() const { return default_; }
 

@@ -5,7 +5,7 @@
 
 namespace kz7 {
 
-// Deliberate: SILENT_MODE and REMOVE stand in it more than once, and are saved again each time; the last value
+// Deliberate: SILENT_MODE and REMOVE are in the list more than once and are saved again each time; the last value
 // read is the one that stays.
 // clang-format off
 inline constexpr std::array kSavedPropertyNames = {

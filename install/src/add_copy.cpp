@@ -38,7 +38,7 @@ constexpr std::array kCopyRows = {
 };
 // clang-format on
 
-// Gives a version name to the copy in both views and tells how each went.
+// Names the copy by a version in both views and prints the results.
 void setLevelAlias(IRegistryStore& registry, Report& report, std::string_view level, std::string_view copyName) {
     if (succeeded(setText(registry, layout::kCopies, level, copyName))) {
         report.line(kLevelSet, {level});
@@ -52,8 +52,8 @@ void setLevelAlias(IRegistryStore& registry, Report& report, std::string_view le
     }
 }
 
-// Makes the copy the default of both views and names it by its level and every prefix of it. Failures are
-// reported and change nothing else.
+// Makes the copy the default of both views and names it by its level and every prefix of the level. Failures are
+// reported and have no other effect.
 void nameByLevel(IRegistryStore& registry, Report& report, const LevelQuery& queryLevel, const CopyRequest& request) {
     RowWriter writer(registry, report);
     writer.write(layout::kCopies, "", request.name);
@@ -61,7 +61,7 @@ void nameByLevel(IRegistryStore& registry, Report& report, const LevelQuery& que
 
     std::string level = queryLevel(request.location);
     for (;;) {
-        // Deliberate: a level that could not be had is empty, which writes the default value once more.
+        // Deliberate: a level that could not be read is empty, which writes the default value once more.
         setLevelAlias(registry, report, level, request.name);
         const std::size_t dot = level.rfind('.');
         if (dot == std::string::npos) {

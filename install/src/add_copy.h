@@ -13,8 +13,8 @@
 
 namespace kz7 {
 
-// Asks the product library of a location for its level, a dotted text such as "9.1.0.0"; empty when there is
-// none to be had.
+// Queries the product library of a location for its level, a dotted text such as "9.1.0.0"; empty if the level cannot
+// be read.
 using LevelQuery = std::function<std::string(std::string_view location)>;
 
 struct CopyRequest {
@@ -26,8 +26,8 @@ struct CopyRequest {
 // The rows of a copy's layout, below its key in each view.
 std::span<const LayoutRow> copyRows();
 
-// Returns the status of the step that failed, which is reported; everything before it stays. Queries the level with
-// isV9 only. The caller commits, and then prints the closing line with reportAdded().
+// Returns the status of the step that failed, which is reported; what earlier steps wrote remains. Queries the level
+// only with isV9. The caller commits and then prints the closing line with reportAdded().
 Status addCopy(IRegistryStore& registry, IServiceManager& services, Report& report, const LevelQuery& level,
                const CopyRequest& request);
 

@@ -9,7 +9,7 @@ int kz7::programMain(int argc, char** argv) {
     try {
         const auto platform = hostPlatform({.program = "kz7InstallReg"});
         const Status status = runTool(platform->ports(), {argv, static_cast<std::size_t>(argc)});
-        // The exit code stays that of the flow. A reader that is gone, as in "| head -1", chose to miss the rest.
+        // The exit code remains that of the flow. A reader that has gone, as in "| head -1", does not need the rest.
         const Status written = platform->console().flush();
         if (!succeeded(written) && written != kPipeClosing) {
             platform->console().writeError(
@@ -17,7 +17,7 @@ int kz7::programMain(int argc, char** argv) {
         }
         return hostExitCode(status);
     } catch (const std::bad_alloc&) {
-        // What was not committed is dropped with the platform.
+        // Changes that are not committed are dropped with the platform.
         std::fputs("kz7InstallReg: out of memory\n", stderr);
         return hostExitCode(kOutOfMemory);
     }

@@ -1,6 +1,6 @@
 #include "install/src/remove_copy.h"
 
-#include "install/src/copies/install_copy_list.h"
+#include "install/src/copies/copy_list.h"
 #include "install/src/registry/copy_layout.h"
 #include "install/src/registry/copy_name.h"
 #include "install/src/registry/registry_access.h"
@@ -11,7 +11,7 @@ namespace {
 
 // clang-format off
 constexpr std::string_view kNotFound = "The KZ7 Copy %s was not found\n";
-// Deliberate: no line feed; installers match the output to its end.
+// Deliberate: no line feed; installers compare the output to its end.
 constexpr std::string_view kRemoved  = "The KZ7 Copy %s has been removed";
 // clang-format on
 
@@ -21,15 +21,15 @@ Status removeCopy(IRegistryStore& registry, IServiceManager& services, IDebugOut
                   const char* copyName) {
     InstallCopyList copies(registry, debug, false, false);
     if (copies.findByName(copyName) == nullptr) {
-        // A store that cannot be read is no answer to whether the copy is there.
+        // A store that cannot be read does not tell whether the copy exists.
         if (const Status readable = registry.commit(); !succeeded(readable)) {
             return readable;
         }
         report.line(kNotFound, {std::string_view(copyName)});
         return kMissingItem;
     }
-    // Deliberate: a list that could not be read whole counts like the last copy, and the whole product goes.
-    // The copy's 32-bit key and the values that name it stay.
+    // Deliberate: if the list could not be read completely, the whole product is deleted, as for the last copy. The
+    // copy's 32-bit key and the values that name it remain.
     if (copies.status() == 0 && copies.count() > 1) {
         deleteTree(registry, KeyHandle::localMachine, layout::kCopy, 0, copyName, {});
         const std::string copy = substituteCopyName(layout::kCopy, copyName);

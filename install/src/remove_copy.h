@@ -1,5 +1,5 @@
-// Removes one installed copy: its tree in the native view, or the whole product tree with the last one, and
-// its management service.
+// Removes one installed copy: its tree in the native view, or the whole product tree with the last copy, and its
+// management service.
 #pragma once
 
 #include "install/platform/debug_output.h"
@@ -9,8 +9,7 @@
 
 namespace kz7 {
 
-// 0, or kMissingItem when no copy has that name. What the deletions give does not change it, only a store
-// that could not keep them does.
+// 0, or kMissingItem if no copy has that name. The results of the deletions do not change it; a failed commit does.
 Status removeCopy(IRegistryStore& registry, IServiceManager& services, IDebugOutput& debug, Report& report,
                   const char* copyName);
 

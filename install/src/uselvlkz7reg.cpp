@@ -61,7 +61,7 @@ public:
     Status run(std::span<const char* const> arguments) {
         const OptionRow* const row = findOption(arguments);
         if (row == nullptr) {
-            // Deliberate: the usage names the two copy options only; the others are the installer's.
+            // Deliberate: the usage lists only the two copy options; the others are for installers.
             report_.line(kUsage);
             return kInvalidParameter;
         }
@@ -94,8 +94,8 @@ private:
         if (succeeded(added)) {
             reportAdded(report_, request);
         }
-        // Deliberate: the registration gets the copy's name where it expects a location, and the result of the add is
-        // dropped; the installers that use "-addv9" expect both.
+        // Deliberate: the registration gets the copy's name as its location, and the result of the add is ignored; the
+        // installers that use "-addv9" expect both.
         return withProviders ? registerProvidersOf(request.name) : added;
     }
 

@@ -1,4 +1,4 @@
-// The tool's entry: picks the one flow that the command line asks for.
+// The entry of the tool: selects the flow that the command line asks for.
 #pragma once
 
 #include <span>
@@ -9,9 +9,9 @@
 
 namespace kz7 {
 
-// Runs a command; `arguments` begins with the program's name. Returns the flow's status, which is the exit
-// code; kInvalidParameter after the usage text.
-// With `errors`, the error lines are kept there, too.
+// Runs a command; `arguments` begins with the program's name. Returns the status of the flow, which is the exit code,
+// or kInvalidParameter after the usage text. With `errors`, also
+// keeps the error lines there.
 Status runTool(const Ports& ports, std::span<const char* const> arguments, std::vector<ErrorLine>* errors = nullptr);
 
 // Whether the arguments are one of the options and do not bring out the usage text.

@@ -54,8 +54,8 @@ Status writeDefaults(IRegistryStore& registry, Report& report, std::string_view 
     Status status = writer.writeLayout(kDefaults, layout::kProduct, {}, location);
     if (succeeded(status)) {
         status = writer.writeLayout(kLastDefault, layout::kProduct, {}, location);
-        // Deliberate: the marker is a value, so sparing a subkey of its name spares nothing and the component
-        // just written goes too. That is what makes a later migration take a new backup.
+        // Deliberate: the marker is a value, but the deletion spares subkeys only, so the component that was just
+        // written goes too. A later migration therefore takes a new backup.
         deleteTree(registry, KeyHandle::localMachine, layout::kComponents, 0, {}, layout::kVersion9Marker);
     }
     return status;
@@ -68,7 +68,7 @@ Status restoreVersion8(IRegistryStore& registry, IServiceManager& services, Repo
     restoreBackup(registry, report);
     const Status status = writeDefaults(registry, report, location);
 
-    // The success line comes before those of the service, and none of them may be printed before the commit.
+    // The success line precedes the lines of the service, and none of them may be printed before the commit.
     HeldConsole held;
     Report closing(report, held);
     if (succeeded(status)) {

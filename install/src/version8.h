@@ -1,5 +1,5 @@
-// Puts the registry back into the version-8 layout: the backup of a migration restored, the version-8
-// defaults written, the management service of that layout switched off.
+// Returns the registry to the version-8 layout: restores the backup of a migration, writes the version-8 defaults and
+// switches the management service of that layout off.
 #pragma once
 
 #include <string_view>
@@ -10,8 +10,8 @@
 
 namespace kz7 {
 
-// `location` is the version-8 product directory. Returns the status of the last default written, or that of a
-// store that could not keep the changes.
+// `location` is the version-8 product directory. Returns the status of the last default that was written, or of a
+// failed commit.
 Status restoreVersion8(IRegistryStore& registry, IServiceManager& services, Report& report, std::string_view location);
 
 }  // namespace kz7

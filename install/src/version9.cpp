@@ -34,8 +34,8 @@ constexpr std::string_view kServiceFailed    =
 
 bool isVersion9(IRegistryStore& registry) {
     OwnedKey components(registry);
-    // Deliberate: the marker is looked for in the product's own components, while copies get it in theirs; so
-    // every further migration takes a new backup over the old one.
+    // Deliberate: the marker is expected in the product's own components, but copies have it in theirs, so every
+    // further migration replaces the old backup.
     return succeeded(
                registry.openKey(KeyHandle::localMachine, layout::kComponents, kKeyQueryValue, components.receive())) &&
            valueExists(registry, components.get(), layout::kVersion9Marker);
@@ -53,7 +53,7 @@ bool backUp(IRegistryStore& registry, Report& report) {
     return true;
 }
 
-// Carries one profile key over from the backup; values that the copy has already are kept.
+// Copies one profile key from the backup; values that the copy already has remain.
 void copyProfile(IRegistryStore& registry, Report& report, std::string_view profile, std::string_view copied,
                  const ErrorText& failed) {
     const std::string source = compose("%s\\%s", {layout::kBackup, profile});
@@ -67,8 +67,7 @@ void copyProfile(IRegistryStore& registry, Report& report, std::string_view prof
 
 void migrate(IRegistryStore& registry, IServiceManager& services, Report& report, const LevelQuery& level,
              std::string_view location) {
-    // Deliberate: a registry that is version 9 already is refreshed, not left alone; only what would take a backup or
-    // read one is left out.
+    // Deliberate: a version-9 registry is refreshed; only the steps that take or read a backup are skipped.
     const bool refresh = isVersion9(registry);
     if (refresh) {
         report.line(kNoBackup);
@@ -76,7 +75,7 @@ void migrate(IRegistryStore& registry, IServiceManager& services, Report& report
         if (!backUp(registry, report)) {
             return;
         }
-        // Before the copy is added, which then sets its own location over the old one.
+        // Before the copy is added, so that its own location replaces the old one.
         copyProfile(registry, report, "GLOBAL_PROFILE", kGlobalCopied, kGlobalFailed);
     }
     report.line(kCreating);
@@ -90,7 +89,7 @@ void migrate(IRegistryStore& registry, IServiceManager& services, Report& report
         copyProfile(registry, report, "PROFILES", kInstancesCopied, kInstancesFailed);
         copyProfile(registry, report, "DAS_PROFILES", kDasCopied, kDasFailed);
     }
-    // The add has just made the service, so the start that is asked for here is not reached.
+    // The add has just created the service, so the start that is requested here never happens.
     if (succeeded(registerManagementService(registry, services, report, location, kMigratedCopy, true))) {
         report.line(kConfigured);
     } else {

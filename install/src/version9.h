@@ -1,5 +1,5 @@
-// Turns a version-8 registry into the layout of side-by-side copies: the old tree backed up and cleared, its
-// profiles carried over into the copy "kz7build", that copy added, its service registered.
+// Migrates a version-8 registry to the layout of side-by-side copies: takes a backup of the old tree and clears it,
+// copies its profiles to the copy "kz7build", adds that copy and registers its service.
 #pragma once
 
 #include <functional>
@@ -12,11 +12,11 @@
 
 namespace kz7 {
 
-// Registers the data providers of a location; ends every migration and gives its result.
+// Registers the data providers of a location; the last step of every migration, whose result it returns.
 using ProviderRegistration = std::function<Status(std::string_view location)>;
 
-// A registry that is version 9 already is refreshed, not migrated. The migration's own failures are reported
-// and never reach the result.
+// A version-9 registry is refreshed, not migrated. Failures of the migration itself are reported and do not change the
+// result.
 Status migrateToVersion9(IRegistryStore& registry, IServiceManager& services, Report& report, const LevelQuery& level,
                          const ProviderRegistration& registerProviders, std::string_view location);
 

@@ -48,22 +48,35 @@ std::vector<std::string> actionData(MSIHANDLE installation) {
 
 template <typename Function>
 Function entryPoint(MSIHANDLE installation, const char* name) {
-    // Cast by way of a function type: FARPROC converts to no other one without a warning.
+    // Cast through a function type: any other conversion of FARPROC is a warning.
     const HMODULE library = LoadLibraryA(actionData(installation).front().c_str());
     return reinterpret_cast<Function>(reinterpret_cast<void (*)()>(GetProcAddress(library, name)));
 }
 
 // One line: "NAME 3 'abc', ...", the size as the call returns it; a call that fails shows its status.
-void readProperties(MSIHANDLE installation) {
+void readInto(MSIHANDLE installation, const std::vector<std::string>& names, std::uint32_t room, std::string& line) {
     const auto read = entryPoint<decltype(&iMsiGetProperty)>(installation, "iMsiGetProperty");
+    for (const std::string& name : names) {
+        std::string value(kRoom, '#');
+        std::uint32_t size = room;
+        const std::uint32_t status = read(installation, name.c_str(), value.data(), &size);
+        line += (line.empty() ? "" : ", ") + name + " " + std::to_string(size);
+        line += status == 0 ? std::string(" '") + value.c_str() + "'" : " status " + std::to_string(status);
+    }
+}
+
+void readProperties(MSIHANDLE installation) {
     const std::vector<std::string> data = actionData(installation);
     std::string line;
-    for (auto name = data.begin() + 1; name != data.end(); ++name) {
-        std::string value(kRoom, '#');
-        std::uint32_t size = kRoom;
-        const std::uint32_t status = read(installation, name->c_str(), value.data(), &size);
-        line += (line.empty() ? "" : ", ") + *name + " " + std::to_string(size) + " '" + value.c_str() + "'";
-        line += status == 0 ? "" : " status " + std::to_string(status);
+    readInto(installation, {data.begin() + 1, data.end()}, kRoom, line);
+    log(installation, line);
+}
+
+// The copy's name, with room for all of it but the terminator in the test of two-byte characters, and with room for it.
+void readName(MSIHANDLE installation) {
+    std::string line;
+    for (const std::uint32_t room : {10U, 11U}) {
+        readInto(installation, {"KZ7_COPY_NAME"}, room, line);
     }
     log(installation, line);
 }
@@ -79,16 +92,20 @@ __declspec(dllexport) UINT probeRead(MSIHANDLE installation) {
     RegCloseKey(key);
     log(installation, "opening the key: status " + std::to_string(status));
     readProperties(installation);
+    readName(installation);
     return ERROR_SUCCESS;
 }
 
 __declspec(dllexport) UINT probeChange(MSIHANDLE installation) {
     const auto substitute = entryPoint<decltype(&iSubstituteCopyName)>(installation, "iSubstituteCopyName");
     const auto set = entryPoint<decltype(&iMsiSetProperty)>(installation, "iMsiSetProperty");
-    const char path[] = "InstalledCopies\\$CurrentInstallationName$";
-    char output[sizeof path];
-    log(installation, std::string("substituted: ") + substitute(path, "COPY1", sizeof output, output));
-    log(installation, std::string("substituted without a buffer: ") + substitute(path, "COPY2", 0, nullptr));
+    const std::string copy = sessionProperty(installation, "KZ7_COPY_NAME");
+    const char token[] = "$CurrentInstallationName$";
+    char output[sizeof token];
+    log(installation,
+        std::string("substituted: ") + substitute(token, (copy + copy + copy).c_str(), sizeof output, output));
+    log(installation, std::string("substituted without a buffer: ") + substitute(token, copy.c_str(), 0, nullptr));
+    readName(installation);
     readProperties(installation);
     const std::vector<std::string> data = actionData(installation);
     std::string line = "setting:";

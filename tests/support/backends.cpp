@@ -43,7 +43,7 @@ private:
     MemoryPlatform platform_;
 };
 
-// Streams of this process as a file that holds a text, for as long as the object is there.
+// Redirects streams of this process to a file that contains a text, as long as the object exists.
 class Redirected {
 public:
     explicit Redirected(const std::vector<int>& streams, const std::string& text = {}) {
@@ -68,7 +68,7 @@ public:
     Redirected(const Redirected&) = delete;
     Redirected& operator=(const Redirected&) = delete;
 
-    // What was written, with plain line feeds.
+    // The written text with plain line feeds.
     std::string text() const {
         std::fflush(stdout);
         std::rewind(file_);
@@ -89,7 +89,7 @@ public:
     HostBackend() {
         fs::create_directories(ports_.hostFolder);
         fs::copy_file(ports_.service, ports_.hostFolder / "Program.exe");
-        // Built beside the programs.
+        // Built next to the programs.
         const fs::path programs = fs::path(childProgram()).parent_path();
         fs::copy_file(programs.parent_path() / "examples/copy/bin/kz7install64.dll",
                       ports_.hostFolder / "kz7install64.dll");

@@ -1,5 +1,5 @@
-// The implementations of the ports that every contract suite runs over: the one in memory, and this machine's.
-// Each is fresh, or open on a place of its own that goes with it.
+// The implementations of the ports that every contract suite runs on: the one in memory and this machine's. Each is
+// new, or works in a temporary folder of its own.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -14,12 +14,12 @@
 
 namespace kz7::test {
 
-// What an implementation is known to do differently. Everything else it must do like the others.
+// Known differences of an implementation. In everything else it must behave like the others.
 struct Differences {
-    bool ordersValuesByName = false;     // instead of by when they were first set
+    bool ordersValuesByName = false;     // instead of in insertion order
     bool ordersKeysByLowerCase = false;  // "_" before the letters
     bool foldsBeyondAscii = false;       // names that differ in the case of other letters are one
-    bool passesClassesOn = false;        // to new parents, and to the key when it is there already
+    bool passesClassesOn = false;        // to new parents, and to an existing key
     bool startsDeletedServices = false;  // while they are still open
     bool needsFramework = false;         // to keep data providers
     bool usesHandlesAgain = false;       // a closed handle may be that of another file
@@ -32,19 +32,19 @@ public:
     virtual IPlatform& platform() = 0;
     virtual Differences differences() const { return {}; }
 
-    // The product's path of a folder that is there, of a program in it that can run as a service, and of the sample
-    // copy's level library in it.
+    // The product path of an existing folder, of a program in it that can run as a service, and of the sample copy's
+    // level library in it.
     virtual std::string folder() = 0;
     std::string program() { return folder() + "\\Program.exe"; }
     std::string library() { return folder() + "\\kz7install64.dll"; }
 
-    // Puts a data provider, which is none that a framework would take, into the bin folder below that folder.
+    // Creates a file that is named like a data provider in the folder's bin folder. No framework accepts it.
     virtual void addProvider() = 0;
 
-    // Does it while standard input is that text.
+    // Runs `body` with that text as standard input.
     virtual void reading(const std::string& input, const std::function<void()>& body) = 0;
 
-    // What `writing` brings out on standard output and standard error, in the order in which it arrives.
+    // The text that `writing` writes on standard output and standard error, in the order in which it arrives.
     virtual std::string written(const std::function<void(IConsole&)>& writing) = 0;
 };
 
@@ -52,7 +52,7 @@ inline constexpr const char* kBackends[] = {"memory", "host"};
 
 std::unique_ptr<Backend> backendNamed(const std::string& name);
 
-// This machine's ports, and what goes into the folder that they see.
+// This machine's ports, and the folder that they use.
 struct HostPorts {
     std::unique_ptr<IPlatform> platform;
     std::string folder;
@@ -61,11 +61,11 @@ struct HostPorts {
     Differences differences = {};
 };
 
-// For a place of the host that nobody else uses.
+// `place` is a folder of the host that only this object uses.
 HostPorts hostPorts(const std::string& place);
 
-// The path of the program that the tests start, in the host's form, and how much it writes on each stream in a flood:
-// a pipe is slow where the host is emulated.
+// The path of the child program, in the host's form, and the size of its output on each stream in a flood: pipes of an
+// emulated host are slow.
 std::string childProgram();
 extern const std::size_t kFloodMebibytes;
 
@@ -74,7 +74,7 @@ extern const bool kExitCodesAreWhole;
 
 void setSearchPath(const std::string& path);
 
-// For what a system shows only a moment later: that a thread, a child or a service has ended.
+// For states that a system shows only after a moment: the end of a thread, a child or a service.
 inline bool eventually(const std::function<bool()>& holds) {
     bool held = holds();
     for (int i = 0; i < 1'000'000 && !held; ++i) {
@@ -84,7 +84,7 @@ inline bool eventually(const std::function<bool()>& holds) {
     return held;
 }
 
-// What every contract suite begins with: one of the implementations.
+// The base of every contract suite: one of the implementations.
 class Contract : public testing::TestWithParam<const char*> {
 protected:
     std::unique_ptr<Backend> backend_ = backendNamed(GetParam());

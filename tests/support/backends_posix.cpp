@@ -10,7 +10,7 @@ std::string childProgram() {
 }
 
 HostPorts hostPorts(const std::string& place) {
-    // No service is ever started here.
+    // This host starts no services.
     return {hostPlatform({.program = "test", .stateDirectory = place}), "C:\\contract", place + "/drive_c/contract",
             childProgram()};
 }

@@ -24,7 +24,7 @@ bool endFailingAllocations() {
 
 }  // namespace kz7::test
 
-// Every form is replaced: a sanitizer has its own of each, which would fail nothing.
+// Every form is replaced: a sanitizer would otherwise use its own, which never fail.
 void* operator new(std::size_t size) {
     hasFailed = hasFailed || allocationsLeft == 0;
     void* const block = allocationsLeft == 0 ? nullptr : std::malloc(size == 0 ? 1 : size);

@@ -3,7 +3,7 @@
 
 namespace kz7::test {
 
-// Lets allocation `number` fail, counted from 0 from now on; below 0: none.
+// Makes allocation `number` fail, counted from 0 from now on; below 0: none.
 void failAllocation(int number);
 
 // Whether it has failed. Later allocations succeed.

@@ -1,4 +1,4 @@
-// Runs a flow again and again, failing its first call, its second, and so on until a run passes untouched.
+// Runs a flow repeatedly: first its first call fails, then its second, and so on, until no call fails.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -13,7 +13,7 @@
 
 namespace kz7::test {
 
-// A machine whose flows meet the faults, in any of its ports. Calls of its plain members meet none.
+// A machine whose flows meet the faults in any of its ports. Calls of its plain members do not.
 class FaultyMachine : public Machine {
 public:
     FaultyMachine() { ports_ = intercepted_.ports(); }
@@ -24,15 +24,15 @@ private:
     InterceptedPorts intercepted_{ports_, faults_};
 };
 
-inline constexpr Status kFault = 4321;  // no platform's number, so that it is recognised wherever it goes
+inline constexpr Status kFault = 4321;  // not a number of any platform, so that it can be recognised
 
-// `check` sees every run: the machine afterwards and the flow's status; a failure of it, or something left open, tells
-// the call. Returns the number of calls of the run that passed.
+// `check` gets the machine and the flow's status after every run; its failures and leaks are reported with the call.
+// Returns the number of calls of the run without a failure.
 inline std::uint64_t sweepFaults(bool forGood, const std::function<void(FaultyMachine&)>& prepare,
                                  const std::function<Status(FaultyMachine&)>& flow,
                                  const std::function<void(FaultyMachine&, Status)>& check) {
     for (std::uint64_t call = 1;; ++call) {
-        std::optional<testing::ScopedTrace> row;  // goes after the machine, which looks for what was left open
+        std::optional<testing::ScopedTrace> row;  // destroyed after the machine, which checks for leaks
         FaultyMachine machine;
         prepare(machine);
         machine.faults_ = FaultCounter(call, forGood, kFault);

@@ -1,7 +1,7 @@
-// Runs the rest of its command line, quotation marks and all, and then writes a line of its own with the
-// whole exit code: a shell sees only the low 8 bits.
+// Runs the rest of its command line, with its quotation marks, and then prints the whole exit code: a shell sees only
+// the low 8 bits.
 #include <windows.h>
-// The types above first.
+// Needs the types above.
 #include <shlwapi.h>
 
 #include <cstdio>

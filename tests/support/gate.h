@@ -1,5 +1,5 @@
-// A place where a started program waits until its test lets it go on: what makes the order of events certain
-// without any sleep. Also the few things that a test's child does by the system's calls.
+// A point where a child program waits until its test continues it, so that the order of events is certain without a
+// sleep; and two helpers of the child.
 #pragma once
 
 #include <string>
@@ -15,15 +15,15 @@ public:
 
     const std::string& name() const { return name_; }
 
-    // Lets one program pass; waits until it is there, where the system can tell.
+    // Lets one program pass. Waits until the program has arrived, if the system can tell.
     void open();
 
 private:
     std::string name_;
-    void* event_ = nullptr;
+    [[maybe_unused]] void* event_ = nullptr;  // where the system can tell
 };
 
-// In the child.
+// For the child.
 void waitAtGate(const char* name);
 bool startInheriting(const char* program, const char* mode, const char* argument);
 

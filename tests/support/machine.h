@@ -1,4 +1,4 @@
-// A whole machine in memory, and a command of the tool run on it.
+// A machine in memory that runs commands of the tool.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -15,10 +15,10 @@
 
 namespace kz7::test {
 
-// What an error line begins with, up to its line number.
+// The begin of an error line, up to its line number.
 inline const std::string kPrefix = "install\\src\\uselvlkz7reg.cpp:";
 
-// Whatever was done with it, nothing of it may be open in the end.
+// Nothing of it may be open at the end.
 class Machine : public MemoryPlatform {
 public:
     ~Machine() override {
@@ -28,7 +28,7 @@ public:
         EXPECT_LE(services_.openHandles(), servicesLeftOpen);
     }
 
-    // Runs a command with fresh console texts; the arguments without the program's name.
+    // Clears the console and runs a command; the arguments do not include the program's name.
     Status run(const std::vector<std::string>& arguments) {
         console_.output.clear();
         console_.error.clear();
@@ -40,7 +40,7 @@ public:
         return runTool(ports_, all);
     }
     // The same, as "output|errors|status".
-    std::string told(const std::vector<std::string>& arguments) {
+    std::string result(const std::vector<std::string>& arguments) {
         const Status status = run(arguments);
         return console_.output + "|" + console_.error + "|" + std::to_string(status);
     }
@@ -58,7 +58,7 @@ public:
         return has(path) ? dump(path) : "";
     }
     bool runs(const std::string& name) { return service(name).find("CurrentState = 4:\\x04") != std::string::npos; }
-    // A service of another's making.
+    // A service of another product.
     void addService(const std::string& name, bool running) {
         files_.add("C:\\svc.exe");
         OwnedService manager(services_);
@@ -69,7 +69,7 @@ public:
             services_.startService(service.get());
         }
     }
-    // Bytes as they are.
+    // Stores bytes unchanged.
     void setRaw(const std::string& path, const std::string& name, std::string_view data,
                 ValueType type = ValueType::sz) {
         OwnedKey key(registry_);
@@ -103,7 +103,7 @@ public:
         return text;
     }
 
-    std::size_t servicesLeftOpen = 0;  // on purpose, at most
+    std::size_t servicesLeftOpen = 0;  // the number that may remain open
 };
 
 }  // namespace kz7::test

@@ -1,4 +1,4 @@
-// Whole stores as registry-editor text and back, as the commands of kz7admin do it.
+// Whole stores as registry-editor text and back, with the functions of kz7admin.
 #pragma once
 
 #include <string>
@@ -8,10 +8,10 @@
 
 namespace kz7::test {
 
-// The export of everything in a store.
+// The export of a whole store.
 std::string exportAll(IRegistryStore& registry);
 
-// Parses a file and does what it asks for; empty, or "line: reason" or "line: error n".
+// Parses and applies a file. Returns an empty text, or "line: reason" or "line: error n".
 std::string importText(IRegistryStore& registry, std::string_view file);
 
 }  // namespace kz7::test

@@ -1,4 +1,4 @@
-// A registry as text, so that two states compare whole and a difference reads at a glance.
+// A registry as text, so that whole states can be compared and differences are easy to read.
 #pragma once
 
 #include <string>
@@ -7,8 +7,8 @@
 
 namespace kz7::test {
 
-// Everything below a key, a line for each key ("[path] class") and value ("path : name = type:data", bytes that
-// are no printable ASCII as \xNN), in the order that the store gives them.
+// Everything below a key: a line for each key ("[path] class") and value ("path : name = type:data", other bytes than
+// printable ASCII as \xNN), in the order of the store.
 std::string dumpRegistry(IRegistryStore& registry, KeyHandle root = KeyHandle::localMachine,
                          const std::string& path = {});
 

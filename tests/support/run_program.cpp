@@ -28,6 +28,7 @@ std::string programPath(const std::string& name) {
 pid_t startProgram(const std::vector<std::string>& command, const ProgramOptions& options, const std::string& output,
                    const std::string& error) {
     std::vector<char*> arguments;
+    arguments.reserve(command.size() + 1);
     for (const std::string& argument : command) {
         arguments.push_back(const_cast<char*>(argument.c_str()));
     }
@@ -52,7 +53,7 @@ pid_t startProgram(const std::vector<std::string>& command, const ProgramOptions
 }
 
 ProgramResult runProgram(const std::vector<std::string>& command, const ProgramOptions& options) {
-    // Files, not pipes: nothing of a flood can block, and a program that outlives its parent holds nobody up.
+    // Files instead of pipes: large output cannot block, and a program that outlives its parent delays nothing.
     const TemporaryDirectory scratch;
     const std::string output = scratch.path() + "/output";
     const std::string error = scratch.path() + "/error";

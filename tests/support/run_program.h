@@ -1,4 +1,4 @@
-// Runs a built program as a user does and tells what came of it.
+// Runs a built program as a user does and returns its result.
 #pragma once
 
 #include <sys/types.h>
@@ -22,9 +22,9 @@ struct ProgramOptions {
     std::function<void()> inChild;         // after the fork, for limits
 };
 
-// A file's bytes; empty where there is none.
+// A file's bytes; empty without a file.
 std::string contents(const std::string& path);
-// Makes a file, or gives it other bytes.
+// Creates a file or replaces its bytes.
 void overwrite(const std::string& path, const std::string& bytes);
 
 // The path of one of the project's programs.

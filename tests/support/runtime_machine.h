@@ -19,13 +19,13 @@
 
 namespace kz7::test {
 
-// Its end releases the process-wide observers; nothing may be open after that.
+// The destructor releases the process-wide observers; nothing may be open after that.
 class RuntimeMachine : public MemoryPlatform {
 public:
     // An observer sees what the engine does, but no call of the machine's plain members.
     explicit RuntimeMachine(bool withSession = false, ICallObserver* observer = nullptr)
         : engine(enginePorts(withSession, observer)) {
-        processes_.addProgram(kFolder, {});  // has a short form
+        processes_.addProgram(kFolder, {});  // for its short form
         files_.add(std::string(kFolder) + "readme");
     }
     ~RuntimeMachine() override {
@@ -45,7 +45,7 @@ public:
     }
     std::string logText() { return files_.content(kLogFile); }
 
-    // What an action adds to the log.
+    // The text that an action adds to the log.
     template <typename Action>
     std::string logged(Action action) {
         const std::size_t before = logText().size();
@@ -53,12 +53,12 @@ public:
         return logText().substr(before);
     }
 
-    // Raises a message that is nothing but a text.
+    // Raises a message that consists of a text.
     void say(std::uint32_t code, std::string_view text) {
         engine.message(code, kTextMessage, std::array<Insert, 1>{text});
     }
 
-    // What the session showed since the last look: "kind|field|field", a line for each message.
+    // The messages of the session since the last call: "kind|field|field", a line for each.
     std::string shownInSession() {
         std::ostringstream text;
         for (const auto& message : std::exchange(session.messages, {})) {

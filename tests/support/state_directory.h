@@ -1,4 +1,4 @@
-// A state directory of the embedded platform as a test sees it from outside.
+// A state directory of the embedded platform, used through the programs.
 #pragma once
 
 #include <string>
@@ -33,12 +33,12 @@ public:
     // Starts the same without waiting; output and errors are dropped.
     pid_t start(Arguments arguments) const;
 
-    // Everything in the store of a folder, or this one; a store that is not there reads as empty. A fault of the store
-    // is told in the text.
+    // The content of the store of a folder, or of this one; a missing store reads as empty. The text contains the
+    // faults of the store.
     static std::string dumpOf(const std::string& folder);
     std::string dump() const { return dumpOf(path()); }
 
-    // "ok", or what SQLite's own check finds.
+    // The result of SQLite's integrity check.
     std::string integrity() const;
 
     void copyFrom(const StateDirectory& other) const;

@@ -1,4 +1,4 @@
-// A folder of its own, its owner's alone, that goes when the object does.
+// A new folder that only its owner can use, deleted with the object.
 #pragma once
 
 #include <cstdlib>
@@ -16,7 +16,7 @@ public:
         }
         std::filesystem::permissions(path_, std::filesystem::perms::owner_all);
     }
-    // What a program that is just ending keeps open stays.
+    // Files that a program still has open remain.
     ~TemporaryDirectory() {
         std::error_code ignored;
         std::filesystem::remove_all(path_, ignored);

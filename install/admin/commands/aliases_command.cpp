@@ -6,7 +6,7 @@
 #include "install/admin/commands/commands.h"
 #include "install/admin/formats/text_table.h"
 #include "install/platform/text.h"
-#include "install/src/copies/install_copies_profile.h"
+#include "install/src/copies/alias_rewrite.h"
 #include "install/src/registry/copy_layout.h"
 
 namespace kz7 {

@@ -1,6 +1,5 @@
 #include <CLI/CLI.hpp>
 #include <algorithm>
-#include <cstdlib>
 
 #include "install/admin/change_report.h"
 #include "install/admin/commands/commands.h"
@@ -9,6 +8,7 @@
 #include "install/admin/given_name.h"
 #include "install/admin/input_file.h"
 #include "install/admin/preview.h"
+#include "install/platform/program.h"
 #include "install/platform/text.h"
 #include "install/runtime/config_handler.h"
 #include "install/runtime/observers/log_observer.h"
@@ -87,8 +87,8 @@ Answer findLog(Admin& admin, const Words& words, ConfigurationRequest& request) 
 
 // A relative path begins at the current directory, as that of a response file does.
 Answer findMessages(Admin& admin, const Words&, ConfigurationRequest& request) {
-    const char* const path = std::getenv(kMessagesVariable);
-    if (path == nullptr || *path == '\0') {
+    const std::string path = environmentText(kMessagesVariable);
+    if (path.empty()) {
         return kAnswerYes;
     }
     const Status status = admin.platform().files().productPath(path, request.messageFile);

@@ -8,7 +8,7 @@
 #include "install/admin/formats/json_text.h"
 #include "install/admin/formats/text_table.h"
 #include "install/platform/text.h"
-#include "install/src/copies/install_copies.h"
+#include "install/src/copies/copy_records.h"
 #include "install/src/registry/copy_layout.h"
 #include "install/src/services/management_service.h"
 

@@ -10,7 +10,7 @@
 #include "install/admin/wanted_copies.h"
 #include "install/platform/text.h"
 #include "install/src/add_copy.h"
-#include "install/src/copies/install_copy_list.h"
+#include "install/src/copies/copy_list.h"
 #include "install/src/registry/copy_layout.h"
 #include "install/src/registry/copy_name.h"
 #include "install/src/services/management_service.h"
@@ -59,7 +59,7 @@ public:
             }
         }
         for (const InstallCopy* copy = list.first(); options_.prune && copy != nullptr; copy = list.next()) {
-            if (!copy->isVersion8() && !named.contains(foldUpper(copy->name()))) {
+            if (copy != list.version8Copy() && !named.contains(foldUpper(copy->name()))) {
                 remove(std::string(copy->name()));
             }
         }

@@ -39,7 +39,7 @@ public:
     // A question, and where the answer is typed, at the end of a line that is left open.
     void showQuestion(std::string_view text, std::string_view prompt);
 
-    // What stands in for an answer that nobody saw being typed.
+    // Shows an answer that was not typed on the terminal.
     void showAnswer(std::string_view text);
 
 private:

@@ -12,8 +12,8 @@
 namespace kz7 {
 namespace {
 
-// The assembly cache of a host without the framework: the provider files that lie in a location's bin folder,
-// as records in the registry store.
+// The assembly cache of a host without the .NET framework: the provider files in a location's bin folder, as records in
+// the registry store.
 class EmbeddedAssemblyCache final : public IAssemblyCache {
 public:
     EmbeddedAssemblyCache(IRegistryStore& registry, std::string stateDirectory)
@@ -25,7 +25,7 @@ public:
                              FrameworkGenerations generations) override {
         const std::string folder = hostPath(std::string(location) + "\\bin", stateDirectory_);
         std::vector<std::string> files;
-        // A folder that is missing or cannot be read has nothing to register.
+        // A folder that is missing or cannot be read has no providers.
         namesIn(folder, files);
         std::erase_if(files, [&](const std::string& file) {
             std::error_code ignored;

@@ -1,5 +1,5 @@
-// A thin owner of one SQLite connection and its prepared statements. Results are SQLite's own codes; the
-// registry store turns them into the platform's numbers.
+// Owns one SQLite connection and its prepared statements. Results are SQLite's codes; the registry store translates
+// them.
 #pragma once
 
 #include <sqlite3.h>
@@ -11,12 +11,12 @@
 
 namespace kz7 {
 
-// A prepared statement in use: bound from 1, stepped, and reset when it goes out of scope, so that none
-// stays open between two calls of a port (an open one makes the next BEGIN IMMEDIATE fail at once after
-// another writer's commit).
+// A prepared statement in use: parameters are bound from 1, then it is stepped, and reset when it goes out of scope. No
+// statement stays open between two calls of a port: after another program's commit an open one makes the next BEGIN
+// IMMEDIATE fail at once.
 class Query {
 public:
-    // `error` is what preparing the statement gave; the steps answer it.
+    // `error` is the result of preparing the statement; each step returns it.
     Query(sqlite3_stmt* statement, int error) : statement_(statement), error_(error) {}
     Query(const Query&) = delete;
     Query& operator=(const Query&) = delete;
@@ -49,14 +49,13 @@ struct StatementCloser {
 };
 using Statement = std::unique_ptr<sqlite3_stmt, StatementCloser>;
 
-// Runs statements without results; the first error ends them.
+// Runs statements without results until one fails.
 int execute(sqlite3* connection, const char* sql);
 
 // The first column of the statement's first row, as a number.
 int queryNumber(sqlite3* connection, const char* sql, std::int64_t& number);
 
-// Copies a whole database, as the source's transaction sees it, into a new one in memory. An error belongs to the
-// source.
+// Copies a whole database, as the source's transaction sees it, to a new one in memory. The source has the error.
 int copyToMemory(sqlite3* source, Connection& memory);
 
 }  // namespace kz7

@@ -9,7 +9,7 @@
 namespace kz7 {
 namespace {
 
-// The debugger output port where no debugger listens: standard error when KZ7_DEBUG=1 is set.
+// The debugger output port without a debugger: standard error if KZ7_DEBUG=1 is set.
 class EmbeddedDebugOutput final : public IDebugOutput {
 public:
     explicit EmbeddedDebugOutput(IConsole& console) : console_(console) {

@@ -10,13 +10,13 @@
 
 namespace kz7 {
 
-// Descriptors belong to the process, so their port has no state.
+// Descriptors belong to the process, so this port has no state.
 struct DescriptorTraits {
     struct Port {};
     using Handle = int;
     static constexpr Handle kNone = -1;
     static inline Port process;
-    // Keeps errno: the reason of a failure is often read after its descriptors are closed.
+    // Preserves errno: callers often read the reason of a failure after its descriptors are closed.
     static void close(Port&, Handle descriptor) {
         const int error = errno;
         ::close(descriptor);
@@ -26,13 +26,13 @@ struct DescriptorTraits {
 
 class OwnedDescriptor : public OwnedHandle<DescriptorTraits> {
 public:
-    // Takes over the result of a call that opens one; -1 is no descriptor.
+    // Owns the result of a call that opens a descriptor; -1 is no descriptor.
     explicit OwnedDescriptor(int descriptor = DescriptorTraits::kNone) : OwnedHandle(DescriptorTraits::process) {
         receive() = descriptor;
     }
 };
 
-// False: errno is the reason, and a part may have been written.
+// False: errno is the reason, and some bytes may have been written.
 inline bool writeAll(int descriptor, std::string_view bytes) {
     while (!bytes.empty()) {
         const ssize_t written = ::write(descriptor, bytes.data(), bytes.size());

@@ -14,7 +14,7 @@ namespace kz7 {
 template <class Handle>
 class DescriptorTable {
 public:
-    // Tokens up to that number are reserved.
+    // Handles up to `taken` are reserved.
     explicit DescriptorTable(std::uint64_t taken = 0) : last_(taken) {}
 
     Handle give(OwnedDescriptor descriptor) {
@@ -25,14 +25,14 @@ public:
         return handle;
     }
 
-    // -1, which the system knows for none, where there is none.
+    // -1 if the handle is not in the table; system calls refuse that descriptor.
     int find(Handle handle) {
         const std::lock_guard<std::mutex> held(lock_);
         const auto found = open_.find(handle);
         return found != open_.end() ? found->second.get() : -1;
     }
 
-    // Takes it out of the table.
+    // Removes a descriptor from the table and returns it.
     OwnedDescriptor take(Handle handle) {
         const std::lock_guard<std::mutex> held(lock_);
         const auto found = open_.find(handle);

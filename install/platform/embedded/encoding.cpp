@@ -1,4 +1,4 @@
-// Texts are UTF-8 here, but nothing keeps other bytes out of them.
+// Texts are UTF-8 here, but may contain other bytes.
 #include "install/platform/encoding.h"
 
 namespace kz7 {
@@ -8,9 +8,9 @@ bool isLeading(char32_t character) {
     return character >= 0xD800 && character <= 0xDBFF;
 }
 
-// The size of the unpaired leading surrogates that the text begins with; 0 where a trailing one or a byte follows
-// them, which in UTF-16 would make a pair with the last of them. Then `bytes` is the size of those that must travel
-// byte by byte.
+// The size in bytes of the unpaired leading surrogates at the begin of the text; 0 if a trailing one or a byte follows,
+// which would form a pair with the last of them in UTF-16. `bytes` is then the size of those that must be encoded byte
+// by byte.
 std::size_t leadingSurrogates(std::string_view text, std::size_t& bytes) {
     std::string_view rest = text;
     char32_t character = 0;
@@ -29,15 +29,16 @@ std::size_t leadingSurrogates(std::string_view text, std::size_t& bytes) {
 std::u16string utf16FromText(std::string_view text) {
     std::u16string utf16;
     utf16.reserve(text.size());
-    std::size_t surrogates = 0;  // bytes of leading surrogates that the rest begins with
-    std::size_t bytes = 0;       // bytes that travel one by one
+    std::size_t surrogates = 0;  // bytes of leading surrogates at the begin of the rest
+    std::size_t bytes = 0;       // bytes that are encoded one by one
     while (!text.empty()) {
         std::string_view rest = text;
         char32_t character = 0;
         if (surrogates == 0 && bytes == 0 && text[0] == '\xED') {
             surrogates = leadingSurrogates(text, bytes);
         }
-        // The three bytes of a byte's surrogate travel byte by byte, so that the way back cannot take them for a byte.
+        // The three bytes of the surrogate of a byte are encoded byte by byte, so that decoding cannot take them for
+        // the byte itself.
         if (bytes != 0 || !takeUtf8(rest, character) || isByteSurrogate(character)) {
             character = 0xDC00 + static_cast<unsigned char>(text[0]);
             rest = text.substr(1);

@@ -50,7 +50,7 @@ Status statusOf(int error) {
     }
 }
 
-// Makes a new file for its owner alone. 0 or an error number.
+// Creates a new file that only its owner can use. 0 or an error number.
 int writeNewFile(int folder, const std::string& name, std::string_view content) {
     const OwnedDescriptor file(
         openat(folder, name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
@@ -67,11 +67,11 @@ int publish(int folder, const std::string& from, const std::string& to, bool rep
     if (renameat2(folder, source, folder, target, RENAME_NOREPLACE) == 0) {
         return 0;
     }
-    // Network file systems know no such rename. The caller removes the first name.
+    // Network file systems do not support this rename. The caller removes the first name.
     return errno == EINVAL && linkat(folder, source, folder, target, 0) == 0 ? 0 : errno;
 }
 
-// The file-system port on POSIX: product paths are led into the state directory.
+// The file-system port on POSIX: product paths lead to the state directory.
 class EmbeddedFileSystem final : public IFileSystem {
 public:
     explicit EmbeddedFileSystem(std::string stateDirectory) : stateDirectory_(std::move(stateDirectory)) {}
@@ -116,7 +116,8 @@ public:
         if (host.empty()) {
             return kFileNotFound;
         }
-        // A link that somebody left in a folder open to all is not followed, a pipe without a reader not waited for.
+        // Does not follow a link, which another user could have created in a shared directory, and does not wait for
+        // the reader of a pipe.
         OwnedDescriptor descriptor(
             open(host.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, kLogFileMode));
         if (!descriptor) {
@@ -146,7 +147,7 @@ public:
     Status closeFile(FileHandle file) override {
         OwnedDescriptor taken = files_.take(file);
         const int descriptor = taken.get();
-        taken.leaveOpen();  // closed here, since some file systems report a failed write only now
+        taken.leaveOpen();  // some file systems report a failed write only when the file is closed
         return close(descriptor) == 0 ? kSuccess : statusOf(errno);
     }
 
@@ -174,7 +175,7 @@ public:
         if (error == 0) {
             error = publish(folder.get(), unfinished, name, replace);
         }
-        // Without effect after a rename.
+        // Has no effect after a rename.
         unlinkat(folder.get(), unfinished.c_str(), 0);
         if (error == 0 && fsync(folder.get()) != 0) {
             error = errno;
@@ -205,7 +206,7 @@ public:
     Status productPath(std::string_view hostPath, std::string& path) override {
         std::error_code error;
         std::string whole = std::filesystem::absolute(hostPath, error).string();
-        // A backslash separates in the product's paths.
+        // A backslash is a separator in product paths.
         if (error || whole.find('\\') != std::string::npos || whole.find('\0') != std::string::npos) {
             return kInvalidName;
         }

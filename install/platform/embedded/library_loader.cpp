@@ -11,14 +11,14 @@
 namespace kz7 {
 namespace {
 
-// Libraries as the dynamic linker loads them, from the path that the product's path is led to.
+// Loads libraries with the dynamic linker, from the host path of the product path.
 class EmbeddedLibraryLoader final : public ILibraryLoader {
 public:
     explicit EmbeddedLibraryLoader(std::string stateDirectory) : stateDirectory_(std::move(stateDirectory)) {}
 
     Status load(std::string_view path, LibraryHandle& library) override {
         const std::string host = hostPath(path, stateDirectory_);
-        // A name without a slash would be searched for by the linker's rules.
+        // The linker would search for a name without a slash.
         if (host.find('/') == std::string::npos) {
             return kModuleNotFound;
         }

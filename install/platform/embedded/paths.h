@@ -12,8 +12,8 @@ namespace kz7 {
 // drive through "..", or one with a NUL.
 std::string hostPath(std::string_view productPath, const std::string& stateDirectory);
 
-// The names in a host directory, sorted. 0 or an error number. (The iterators of the C++ library end the process where
-// they find no memory.)
+// The names in a host directory, sorted. 0 or an error number. (The iterators of the C++ library end the process if
+// they cannot allocate memory.)
 int namesIn(const std::string& directory, std::vector<std::string>& names);
 
 }  // namespace kz7

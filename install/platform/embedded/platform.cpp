@@ -16,7 +16,7 @@
 namespace kz7 {
 namespace {
 
-// Programs are started in folders of their own.
+// Child programs run in other directories.
 std::string absolute(const std::string& directory) {
     std::error_code error;
     const std::string whole = directory.empty() ? directory : std::filesystem::absolute(directory, error).string();
@@ -86,13 +86,14 @@ private:
 std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options) {
     if (options.ownProcess) {
         settleInheritedState();
-        // A reader that went away or a file at its limit is a status of the write, never the end of a half-done run.
+        // A pipe without a reader or a file at its size limit makes a write fail; it must not kill the process in the
+        // middle of a run.
         std::signal(SIGPIPE, SIG_IGN);
         std::signal(SIGXFSZ, SIG_IGN);
     }
     auto platform = std::make_unique<EmbeddedPlatform>(options);
     if (options.ownProcess && !platform->directory().empty()) {
-        // Programs that are started work on the same store, from whatever directory.
+        // Child programs use the same store from any directory.
         setenv("KZ7_STATE_DIR", platform->directory().c_str(), 1);
     }
     return platform;

@@ -1,4 +1,4 @@
-// The ports of this host that need no type of their own. Paths of the product lead into the state directory.
+// The ports of this host whose classes are private. Product paths lead to the state directory.
 #pragma once
 
 #include <memory>
@@ -8,11 +8,11 @@
 
 namespace kz7 {
 
-// Repairs what a program may have inherited and the rest relies on; called first thing. Standard descriptors that are
-// closed are opened on /dev/null, so that no file of ours takes their number, and the end of a child is not ignored.
+// Repairs inherited state that the rest relies on; called first. Opens closed standard descriptors on /dev/null, so
+// that no file gets their number, and stops ignoring the end of children.
 void settleInheritedState();
 
-// Shows its texts on standard error if KZ7_DEBUG=1 is set: no debugger listens here.
+// Writes its texts to standard error if KZ7_DEBUG=1 is set: this host has no debugger that listens.
 std::unique_ptr<IDebugOutput> embeddedDebugOutput(IConsole& console);
 
 std::unique_ptr<IFileSystem> embeddedFiles(std::string stateDirectory);

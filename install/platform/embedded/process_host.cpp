@@ -34,7 +34,7 @@ namespace {
 constexpr int kFirstOwnDescriptor = STDERR_FILENO + 1;
 constexpr int kPollInterval = 20;     // milliseconds
 constexpr int kSignalExitCode = 128;  // a child ended by signal n has the exit code 128 + n
-constexpr std::string_view kUsualSearchPath = "/usr/local/bin:/usr/bin:/bin";  // where PATH is not set
+constexpr std::string_view kUsualSearchPath = "/usr/local/bin:/usr/bin:/bin";  // if PATH is not set
 
 Status statusOf(int error) {
     switch (error) {
@@ -53,14 +53,14 @@ Status statusOf(int error) {
     }
 }
 
-// Keeps a descriptor out of the three numbers that a child's streams are put on; none on failure.
+// Moves a descriptor above the three that become a child's streams; empty on failure.
 OwnedDescriptor moveUp(OwnedDescriptor descriptor) {
     return descriptor.get() >= kFirstOwnDescriptor
                ? std::move(descriptor)
                : OwnedDescriptor(fcntl(descriptor.get(), F_DUPFD_CLOEXEC, kFirstOwnDescriptor));
 }
 
-// What says that a file is none that this host can execute.
+// Whether an error number means that this host cannot execute a file.
 bool isNoProgram(int error) {
     return error == ENOENT || error == ENOTDIR || error == EACCES || error == ENOEXEC || error == ELOOP ||
            error == ENAMETOOLONG;
@@ -71,7 +71,7 @@ bool isProgram(const std::string& file) {
     return stat(file.c_str(), &found) == 0 && S_ISREG(found.st_mode) && access(file.c_str(), X_OK) == 0;
 }
 
-// The files that a program's name may stand for, in the order of the search.
+// The files that a program's name may refer to, in the order of the search.
 std::vector<std::string> programFiles(std::string_view program, const std::string& stateDirectory) {
     if (!isBareName(program)) {
         std::string file = hostPath(program, stateDirectory);
@@ -94,8 +94,8 @@ std::vector<std::string> programFiles(std::string_view program, const std::strin
     return files;
 }
 
-// A write to a pipe without reader raises SIGPIPE in this thread: it is held back here and taken out again,
-// so that the program's own choice for that signal stays as it is.
+// A write to a pipe without a reader raises SIGPIPE in this thread. The signal is blocked and removed here, so that the
+// program's own handling of it does not change.
 class WithoutPipeSignal {
 public:
     WithoutPipeSignal() {
@@ -121,12 +121,12 @@ private:
     bool wasPending_ = false;
 };
 
-// Signals that stay ignored in a child where this process ignores them: "nohup" and shells that start a program in the
-// background ask for that. Every other signal begins with its default action.
+// Signals that a child ignores if this process does: "nohup" and shells that start background programs rely on it. All
+// other signals get their default action.
 constexpr int kInheritedIgnores[] = {SIGHUP, SIGINT, SIGQUIT};
 
-// How a child begins: descriptors 0 to 2 as given and no others, no signal blocked or caught. posix_spawn() in place of
-// fork(), whose cost grows with the memory that this process has in use.
+// The initial state of a child: descriptors 0 to 2 and no others, no signal blocked or caught. Uses posix_spawn(),
+// because the cost of fork() grows with the memory in use.
 class SpawnPlan {
 public:
     SpawnPlan() {
@@ -145,9 +145,9 @@ public:
     }
     void give(int descriptor, int target) { note(posix_spawn_file_actions_adddup2(&actions_, descriptor, target)); }
 
-    // An error number, 0 for a child that executes the file.
+    // An error number, or 0 for a child that executes the file.
     int run(pid_t& id, const char* file, const std::string& directory, char* const* argv) {
-        // One system call, whatever the limit of open files is.
+        // One system call for any limit of open files.
         note(posix_spawn_file_actions_addclosefrom_np(&actions_, kFirstOwnDescriptor));
         if (!directory.empty()) {
             note(posix_spawn_file_actions_addchdir_np(&actions_, directory.c_str()));
@@ -179,7 +179,7 @@ private:
     int error_ = 0;
 };
 
-// waitpid() that no signal of the program's interrupts.
+// waitpid() that continues after a signal.
 pid_t waitForChild(pid_t id, int* ending, int options) {
     pid_t found = -1;
     do {
@@ -193,12 +193,12 @@ bool hasEnded(pid_t id) {
     return waitid(P_PID, static_cast<id_t>(id), &ended, WEXITED | WNOHANG | WNOWAIT) == -1 || ended.si_pid != 0;
 }
 
-// Waits until a child has ended or the time is over. The exit code remains to be collected.
+// Waits until a child has ended or the time is over. The exit code can still be collected.
 void waitWithin(pid_t id, std::uint32_t milliseconds) {
     using Clock = std::chrono::steady_clock;
     const auto deadline = Clock::now() + std::chrono::milliseconds(milliseconds);
     const OwnedDescriptor child(static_cast<int>(syscall(SYS_pidfd_open, id, 0)));
-    // Without a free descriptor, or on a kernel without the call, the child is asked for at short intervals.
+    // Without a free descriptor or a kernel that supports the call, polls the child at short intervals.
     const std::int64_t longest = child ? INT_MAX : kPollInterval;
     pollfd watched{child.get(), POLLIN, 0};  // poll() ignores -1
     while (!hasEnded(id) && Clock::now() < deadline) {
@@ -207,8 +207,8 @@ void waitWithin(pid_t id, std::uint32_t milliseconds) {
     }
 }
 
-// Collects the exit code of a child that no caller asks about any more, so that it does not stay a zombie. A thread of
-// its own waits for a child that still runs; it ends with the child or with this process.
+// Collects the exit code of a child that nobody waits for, so that it does not remain a zombie. A separate thread waits
+// for a child that still runs; it ends with the child or with this process.
 void collectLater(pid_t id) {
     const auto collect = [](void* child) -> void* {
         waitForChild(static_cast<pid_t>(reinterpret_cast<std::intptr_t>(child)), nullptr, 0);
@@ -220,14 +220,14 @@ void collectLater(pid_t id) {
     }
     pthread_attr_setdetachstate(&attributes, PTHREAD_CREATE_DETACHED);
     pthread_t thread{};
-    // The number itself is the argument: this also runs when memory is exhausted.
+    // The argument is the number itself: this also runs without memory.
     // NOLINTNEXTLINE(performance-no-int-to-ptr)
     pthread_create(&thread, &attributes, collect, reinterpret_cast<void*>(static_cast<std::intptr_t>(id)));
     pthread_attr_destroy(&attributes);
 }
 
-// The process port on POSIX. Handles and what the standard-handle slots hold are tokens of this object,
-// never descriptors.
+// The process port on POSIX. Handles and the values of the standard-handle slots are tokens of this object, never
+// descriptors.
 class EmbeddedProcessHost final : public IProcessHost {
 public:
     explicit EmbeddedProcessHost(std::string stateDirectory)
@@ -244,7 +244,7 @@ public:
     }
 
     Status createPipe(StreamHandle& readEnd, StreamHandle& writeEnd) override {
-        // A child is given its ends by name: none of ours passes an exec by itself.
+        // A child gets its ends explicitly: no descriptor of this process survives an exec.
         int ends[2];
         if (pipe2(ends, O_CLOEXEC) == -1) {
             return statusOf(errno);
@@ -412,7 +412,7 @@ private:
                 plan.give(streams_.find(stream), target);
             }
         }
-        // The entry comes first: a child that runs is never without one.
+        // The entry is made first, so that no running child is without one.
         const ProcessHandle process{++lastProcess_};
         Child& child = children_[process];
         const int error = plan.run(child.id, file.c_str(), directory, argv.data());
@@ -439,9 +439,9 @@ std::unique_ptr<IProcessHost> embeddedProcesses(std::string stateDirectory) {
 }
 
 void settleInheritedState() {
-    // Where it is ignored, children vanish with their exit codes.
+    // If SIGCHLD is ignored, exit codes of children are lost.
     std::signal(SIGCHLD, SIG_DFL);
-    // The lowest free number is the one that is missing. A write to a stream that was closed must fail.
+    // open() returns the lowest free number, which is the missing one. A write to a stream that was closed must fail.
     int opened = 0;
     do {
         opened = open("/dev/null", O_RDONLY);

@@ -12,11 +12,11 @@ namespace {
 
 constexpr std::int64_t kMachineId = 1;
 constexpr std::int64_t kUsersId = 2;
-constexpr std::int64_t kNoKey = -1;  // the caller's key while it does not exist: nothing is below it
+constexpr std::int64_t kNoKey = -1;  // the caller's key while it does not exist; it has no subkeys
 constexpr std::uint32_t kRoots = 3;  // the first slots of the open keys
 constexpr std::uint32_t kUserSlot = 2;
 constexpr std::int64_t kPageSize = 4096;
-constexpr std::int64_t kLogLimit = std::int64_t{256} * 1024;  // bytes of log that a run leaves to the next one
+constexpr std::int64_t kLogLimit = std::int64_t{256} * 1024;  // size of the log that a run may leave to the next one
 
 // clang-format off
 // Each statement by its name.
@@ -68,7 +68,7 @@ EmbeddedRegistry::EmbeddedRegistry(const std::string& directory, bool readOnly, 
 EmbeddedRegistry::~EmbeddedRegistry() {
     endTransaction();
     if (logPages_ * kPageSize > kLogLimit) {
-        // Whoever is in the way makes the checkpoint at their own end; nobody waits for this one.
+        // Does not wait: a program that uses the log now makes the checkpoint when it ends.
         sqlite3_busy_timeout(connection_.get(), 0);
         execute(connection_.get(), "PRAGMA wal_checkpoint(TRUNCATE)");
     }
@@ -87,7 +87,7 @@ Status EmbeddedRegistry::fail(int result) {
     if ((result & 0xFF) == SQLITE_TOOBIG) {
         return kInvalidParameter;
     }
-    fault_ = kRegistryIoFailed;  // should there be no memory to explain it
+    fault_ = kRegistryIoFailed;  // if there is no memory to explain it
     return fail(file_.explain(connection_.get(), result));
 }
 
@@ -125,8 +125,8 @@ void EmbeddedRegistry::endTransaction() {
     if (commitFailed_) {
         commitFailed_ = !overwriteFailedCommit();
     }
-    // What is left of a transaction that succeeded has no new keys. Those of another one give their ids to later keys,
-    // of other processes too.
+    // A transaction that succeeded leaves no new keys behind. The ids of new keys of a failed one are used again for
+    // later keys, also by other processes.
     for (OpenKey& open : open_) {
         open.deleted = open.deleted || (firstNew_ != 0 && open.id >= firstNew_);
     }
@@ -134,16 +134,16 @@ void EmbeddedRegistry::endTransaction() {
     inTransaction_ = false;
 }
 
-// A commit that fails at its sync has already written its frames, and the next process to open the store would take
-// them from the log as a commit that succeeded. Another commit, which changes nothing, is written over the first of
-// them: each frame is checked with the sum of those before it, so none behind it counts any more. It must not sync
-// before it writes, since the sync is what fails. Good frames of earlier commits, a checkpoint and readers are not
-// touched: the log goes on behind the last published frame, as for any writer. A process that is killed between the two
-// commits leaves the failed one; nothing that could be written earlier would prevent it.
+// A commit that fails at its sync has already written its frames, and the next process that opens the store would
+// recover them from the log as a commit that succeeded. A second commit, which changes nothing, overwrites the first of
+// them: the checksum of each frame covers the earlier ones, so the rest become invalid. It must not sync before it
+// writes, because the sync is what fails. Frames of earlier commits, checkpoints and readers are not affected: the log
+// continues after the last published frame, as for any writer. A process that is killed between the two commits leaves
+// the failed one; no earlier write could prevent that.
 bool EmbeddedRegistry::overwriteFailedCommit() {
     sqlite3* const connection = connection_.get();
     const bool overwritten = execute(connection, "PRAGMA synchronous = OFF; PRAGMA user_version = 1") == SQLITE_OK;
-    // Once more, to have it on the disk if that can be done.
+    // Again, so that it is on the disk if possible.
     execute(connection, "PRAGMA synchronous = FULL; PRAGMA user_version = 1");
     return overwritten;
 }
@@ -153,10 +153,10 @@ Status EmbeddedRegistry::commit() {
         const int result = execute(connection_.get(), "COMMIT");
         commitFailed_ = result != SQLITE_OK;
         if (commitFailed_) {
-            fault_ = kRegistryIoFailed;  // should there be no memory to explain it
+            fault_ = kRegistryIoFailed;  // if there is no memory to explain it
             StoreFault fault = file_.explain(connection_.get(), result);
             endTransaction();
-            // Without room, not even the mark of the commit was written.
+            // Without space, not even the commit record was written.
             if (commitFailed_ && (result & 0xFF) != SQLITE_FULL) {
                 fault.reason += "; the changes could not be taken back and may appear later";
             }
@@ -176,7 +176,7 @@ Status EmbeddedRegistry::image(std::string& bytes) {
     if (!file_.exists()) {
         return kFileNotFound;
     }
-    // Not serialized directly: that would turn pages that cannot be read into zeros.
+    // Not serialized directly: pages that cannot be read would become zeros.
     Connection memory;
     const int result = copyToMemory(connection_.get(), memory);
     if (result != SQLITE_OK) {
@@ -227,7 +227,7 @@ EmbeddedRegistry::OpenKey* EmbeddedRegistry::slotOf(KeyHandle handle) {
 KeyHandle EmbeddedRegistry::giveOut(KeyId id, AccessMask access) {
     if (free_.empty()) {
         open_.emplace_back();
-        // A key is closed without an allocation: owners do it while an exception is on its way.
+        // Closes a key without an allocation: owners do it during stack unwinding.
         free_.reserve(open_.capacity());
         free_.push_back(static_cast<std::uint32_t>(open_.size() - 1));
     }
@@ -265,7 +265,7 @@ Status EmbeddedRegistry::keyOf(KeyHandle handle, AccessMask needed, OpenKey*& op
         return status;
     }
     if (found->checkedIn != transaction_) {
-        // Another process may have written since.
+        // Another process may have written in the meantime.
         found->keys = {};
         found->values = {};
         if (const Status status = lookUp(*found); status != kSuccess) {
@@ -284,7 +284,7 @@ Status EmbeddedRegistry::keyOf(KeyHandle handle, AccessMask needed, OpenKey*& op
 }
 
 Status EmbeddedRegistry::lookUp(OpenKey& open) {
-    if (&open == &open_[kUserSlot]) {  // found by its name: it may not exist yet, or not any more
+    if (&open == &open_[kUserSlot]) {  // found by its name, because it may not exist
         open.id = kNoKey;
         open.deleted = false;
         const Status status = child(kUsersId, userName(), open.id);
@@ -300,14 +300,14 @@ Status EmbeddedRegistry::lookUp(OpenKey& open) {
     return kSuccess;
 }
 
-// Deliberate: only a write makes the caller's key; reading a setting must leave the store as it is.
+// Deliberate: only a write creates the caller's key; a read must not change the store.
 Status EmbeddedRegistry::makeUser(OpenKey& open) {
     const std::string name = userName();
     return open.id == kNoKey ? addChild(kUsersId, name, name, {}, open.id) : kSuccess;
 }
 
-// The roots are below no key. In a damaged store that has one there, walks of the tree would never end; other cycles
-// cannot be reached, since each key has one parent.
+// The roots have no parent. In a damaged store where one has, walks of the tree would never end. Other cycles cannot be
+// reached, because each key has one parent.
 Status EmbeddedRegistry::checkBelow(KeyId id) {
     return id > kUsersId ? kSuccess : fail({kRegistryCorrupt, file_.path(), "the keys form a cycle"});
 }
@@ -319,7 +319,7 @@ EmbeddedRegistry::KnownSubkey& EmbeddedRegistry::knownSlot(KeyId parent, std::st
 
 void EmbeddedRegistry::remember(KeyId parent, std::string_view fold, KeyId id) {
     KnownSubkey& slot = knownSlot(parent, fold);
-    slot.fold = fold;  // first: it may throw
+    slot.fold = fold;  // first, because it may throw
     slot.transaction = transaction_;
     slot.parent = parent;
     slot.id = id;
@@ -364,7 +364,7 @@ void EmbeddedRegistry::subkeyAdded(KeyId parent, std::string_view fold) {
         childless_ = 0;
     }
     if (parent == kUsersId) {
-        open_[kUserSlot].checkedIn = 0;  // may be found now
+        open_[kUserSlot].checkedIn = 0;  // it may exist now
     }
     for (OpenKey& open : open_) {
         if (!open.used || open.id != parent) {
@@ -500,7 +500,7 @@ Status EmbeddedRegistry::nextPlace(KeyId key, std::int64_t& place) {
         }
         placed_[0] = {key, highest.number(0)};
     }
-    // A value that is there already keeps its own place; the number it was offered is left out.
+    // A value that exists keeps its place; the new number is not used.
     place = ++placed_[0].highest;
     return kSuccess;
 }

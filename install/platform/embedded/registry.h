@@ -1,5 +1,5 @@
-// The registry port on an embedded SQLite store. Everything between two marks is one transaction, begun as
-// a writer before the first read: what a flow reads decides what it deletes.
+// The registry port on an embedded SQLite store. All changes between two commit points are one transaction, begun as a
+// writer before the first read: the flows decide on deletions by what they read.
 #pragma once
 
 #include <array>
@@ -15,16 +15,17 @@ namespace kz7 {
 
 class EmbeddedRegistry final : public IRegistryStore {
 public:
-    // Told once for each fault of the store, before the operation that met it returns.
+    // Called once for each fault of the store, before the operation that met it returns.
     using FaultListener = std::function<void(const StoreFault&)>;
 
-    // Opens nothing yet. A read-only store takes no writer's lock and makes nothing: one that is not there
-    // reads as empty.
-    EmbeddedRegistry(const std::string& directory, bool readOnly, FaultListener listener, const StoreReading& reading = {});
+    // Does not open the store yet. A read-only store takes no writer's lock and creates nothing; a missing one reads as
+    // empty.
+    EmbeddedRegistry(const std::string& directory, bool readOnly, FaultListener listener,
+                     const StoreReading& reading = {});
     EmbeddedRegistry(const EmbeddedRegistry&) = delete;
     EmbeddedRegistry& operator=(const EmbeddedRegistry&) = delete;
 
-    // What was not committed is dropped.
+    // Changes that are not committed are dropped.
     ~EmbeddedRegistry() override;
 
     const std::string& path() const { return file_.path(); }
@@ -55,12 +56,11 @@ private:
         std::string name;
         std::string keyClass;
     };
-    // Where an enumeration stands: `index` items lie before the mark. Kept as a name or number, never as an
-    // open cursor.
+    // The position of an enumeration: `index` items precede it. Stored as a name or number, never as an open cursor.
     struct KeyPlace {
         std::uint32_t index = 0;
         std::string fold;           // empty: before the first
-        std::vector<Subkey> ahead;  // read already; the one at `next` is the first behind the mark
+        std::vector<Subkey> ahead;  // read ahead; the item at `next` is the next one
         std::size_t next = 0;
     };
     struct ValueName {
@@ -71,27 +71,27 @@ private:
     struct ValuePlace {
         std::uint32_t index = 0;
         std::int64_t place = 0;
-        std::vector<ValueName> ahead;  // read already where no data are asked for; the one at `next` is the mark's
+        std::vector<ValueName> ahead;  // read ahead if no data are requested; the item at `next` is the current one
         std::size_t next = 0;
     };
     struct OpenKey {
         bool used = false;
         bool deleted = false;
-        std::uint32_t generation = 0;  // how often the slot was given out
+        std::uint32_t generation = 0;  // how often the slot was used
         AccessMask access = 0;
         KeyId id = 0;
         std::uint64_t checkedIn = 0;  // the transaction that last looked the key up
         KeyPlace keys;
         ValuePlace values;
     };
-    // A subkey that was looked up, made or enumerated in this transaction.
+    // A subkey that was looked up, created or enumerated in this transaction.
     struct KnownSubkey {
         std::uint64_t transaction = 0;
         KeyId parent = 0;
         KeyId id = 0;
         std::string fold;
     };
-    // A path that was opened in this transaction; the copies of both views are opened in turn.
+    // A path that was opened in this transaction; flows open the copies of both views in turn.
     struct KnownPath {
         std::uint64_t transaction = 0;
         KeyId parent = 0;
@@ -103,11 +103,11 @@ private:
         KeyId key = 0;
         std::int64_t highest = 0;
     };
-    // Where a path led.
+    // The result of resolving a path.
     struct Found {
         KeyId id = 0;
         KeyId parent = 0;
-        std::string fold;  // empty: no step was made
+        std::string fold;  // empty: the path was empty
     };
 
     Status begin();
@@ -119,7 +119,7 @@ private:
 
     OpenKey* slotOf(KeyHandle handle);
     KeyHandle giveOut(KeyId id, AccessMask access);
-    // The key behind a handle that has the rights needed. The pointer is good until the next key is given out.
+    // The key of a handle that has the required rights. The pointer is valid until the next key is opened.
     Status keyOf(KeyHandle handle, AccessMask needed, OpenKey*& open);
     Status keyForValue(KeyHandle key, AccessMask needed, std::string_view name, OpenKey*& open);
     Status lookUp(OpenKey& open);
@@ -145,14 +145,14 @@ private:
     StoreFile file_;
     bool readOnly_;
     FaultListener listener_;
-    // Before the statements: they must be gone when the connection closes.
+    // Declared before the statements, which must be destroyed before the connection closes.
     Connection connection_;
     std::array<Statement, 15> statements_;
-    Status fault_ = kSuccess;  // met in this transaction; every operation answers it until the next mark
+    Status fault_ = kSuccess;  // of this transaction; every operation returns it until the next commit point
     bool inTransaction_ = false;
-    bool commitFailed_ = false;  // and may still be found in the log by the next process
+    bool commitFailed_ = false;  // the next process may still find it in the log
     std::uint64_t transaction_ = 0;
-    KeyId firstNew_ = 0;  // the first key that this transaction made; ids ascend
+    KeyId firstNew_ = 0;  // the first key that this transaction created; ids ascend
     std::int64_t logPages_ = 0;
     std::vector<OpenKey> open_;  // the roots first
     std::vector<std::uint32_t> free_;

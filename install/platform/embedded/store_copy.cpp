@@ -16,7 +16,7 @@ constexpr int kTries = 20;
 constexpr const char* kLogSuffix = "-wal";
 constexpr const char* kSuffixes[] = {"", kLogSuffix, "-shm", "-journal"};
 
-// Changes with every write to a file; all zero where there is none.
+// Changes with every write to a file; all zero if the file does not exist.
 std::array<std::int64_t, 4> stampOf(const std::string& path) {
     struct stat found {};
     return stat(path.c_str(), &found) != 0
@@ -65,7 +65,7 @@ int StoreCopy::make(const std::string& store) {
         files_.push_back(path() + suffix);
     }
     for (int tries = 0; tries < kTries; ++tries) {
-        // A checkpoint moves pages from the log to the store: both copies must be of one moment.
+        // A checkpoint moves pages from the log to the store, so both must be copied at one moment.
         const std::array before = {stampOf(store), stampOf(store + kLogSuffix)};
         std::remove((path() + kLogSuffix).c_str());
         int error = copyFile(store, path());

@@ -1,4 +1,5 @@
-// A private copy of a store, for reading where SQLite cannot keep its shared-memory file next to the original.
+// A private copy of a store, for reading if SQLite cannot create its shared-memory file next to the original. The copy
+// exists as long as the object.
 #pragma once
 
 #include <string>
@@ -14,8 +15,8 @@ public:
     StoreCopy& operator=(const StoreCopy&) = delete;
     ~StoreCopy();
 
-    // Copies a store and its log, as they are at one moment, to a directory of its own below $TMPDIR or /tmp. 0 or an
-    // error number; EAGAIN: others kept changing the files.
+    // Copies a store and its log, as they are at one moment, to a new directory below $TMPDIR or /tmp. 0 or an error
+    // number; EAGAIN: other programs kept changing the files.
     int make(const std::string& store);
 
     std::string path() const { return folder_ + "/copy"; }

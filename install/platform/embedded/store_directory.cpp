@@ -29,7 +29,7 @@ std::string unfinishedPrefix() {
     return std::string(kStoreName) + '.';
 }
 
-// Also the name of a file that SQLite keeps beside such a store.
+// Also the name of a file that SQLite keeps next to such a store.
 bool isUnfinishedStore(std::string_view name) {
     const std::string prefix = unfinishedPrefix();
     if (!name.starts_with(prefix)) {
@@ -43,7 +43,7 @@ bool isUnfinishedStore(std::string_view name) {
 
 int syncFolder(const std::string& path) {
     const OwnedDescriptor folder(open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    // One that may be written but not read cannot be synced, and is no reason to make nothing in it.
+    // A directory that may be written but not read cannot be synced; that does not prevent its use.
     const bool done = folder ? fsync(folder.get()) == 0 : errno == EACCES;
     return done ? 0 : errno;
 }
@@ -119,11 +119,12 @@ bool unfinishedStoreName(std::string& name) {
 }
 
 void removeUnfinishedStores(const std::string& path) {
+    const std::string folder = path + '/';
     std::vector<std::string> names;
-    namesIn(path, names);
+    namesIn(folder, names);
     for (const std::string& name : names) {
         if (isUnfinishedStore(name)) {
-            unlink((path + '/' + name).c_str());
+            unlink((folder + name).c_str());
         }
     }
 }

@@ -17,11 +17,11 @@ namespace {
 
 constexpr int kBusyTimeout = 5000;  // milliseconds that a run waits for another writer
 constexpr std::int64_t kSchemaVersion = 1;
-constexpr std::size_t kLongestDirectory = 440;  // bytes; SQLite takes 512 with the names of the files in it
+constexpr std::size_t kLongestDirectory = 440;  // bytes; SQLite accepts 512 including the names of the files in it
 
-// Names are kept as they were first written beside their upper-cased form, which is what they are found and
-// ordered by. The roots are rows 1 and 2. Ids are never used again, so that a handle that another process's
-// delete has emptied never comes to mean a later key.
+// The first spelling of a name is stored next to its upper-cased form, which is used for lookups and order. The roots
+// are rows 1 and 2. Ids are never reused, so that a handle of a key that another process deleted never refers to a
+// later key.
 constexpr const char* kSchema =
     "CREATE TABLE key (id INTEGER PRIMARY KEY AUTOINCREMENT, parent INTEGER NOT NULL, fold TEXT NOT NULL,"
     " name TEXT NOT NULL, class TEXT NOT NULL, UNIQUE (parent, fold));"
@@ -31,8 +31,8 @@ constexpr const char* kSchema =
     " (2, 0, 'HKEY_USERS', 'HKEY_USERS', '');"
     "PRAGMA user_version = 1;";
 
-// SQLite's own file system but for one thing: names are used as they are given. Its own resolves links, and so would
-// turn the short name of a directory back into the long one.
+// SQLite's own file system, except that names are used unchanged. SQLite's resolves links and so would replace the
+// short name of a directory by the long one.
 const char* fileSystemOfGivenNames() {
     static sqlite3_vfs system = [] {
         const sqlite3_vfs* const usual = sqlite3_vfs_find(nullptr);
@@ -48,8 +48,8 @@ const char* fileSystemOfGivenNames() {
     return known ? system.zName : nullptr;
 }
 
-// The error number behind a failure; 0 when the system has none. SQLite passes it on for calls that open and read, but
-// keeps that of a failed sync with the file.
+// The error number of a failure, or 0. SQLite returns it for calls that open and read, but stores that
+// of a failed sync with the file.
 int systemError(sqlite3* connection) {
     int error = connection == nullptr ? 0 : sqlite3_system_errno(connection);
     for (const int which : {SQLITE_FCNTL_JOURNAL_POINTER, SQLITE_FCNTL_FILE_POINTER}) {
@@ -90,7 +90,7 @@ StoreFile::StoreFile(std::string directory, const StoreReading& reading)
       reading_(reading) {}
 
 bool StoreFile::exists() const {
-    // Only a definite "not there" is one: a folder that may not be searched is an error of the open.
+    // Only a definite "does not exist" counts; a directory that may not be searched makes the open fail.
     return access(path_.c_str(), F_OK) == 0 || (errno != ENOENT && errno != ENOTDIR);
 }
 
@@ -98,7 +98,7 @@ bool StoreFile::isPart(const std::string& path) const {
     namespace fs = std::filesystem;
     std::error_code ignored;
     const fs::path asked = fs::absolute(path, ignored);
-    // A store that is a link has the other files next to the file that it leads to.
+    // If the store is a link, the other files are next to its target.
     for (const fs::path& store : {fs::path(path_), fs::weakly_canonical(path_, ignored)}) {
         const std::string name = store.filename().string();
         const std::string other = asked.filename().string();
@@ -145,7 +145,7 @@ StoreFault StoreFile::openForReading(Connection& connection) {
         return fault.status != kSuccess ? fault : openEmpty(connection);
     }
     fault = open(SQLITE_OPEN_READONLY, connection);
-    // A log is read through a shared-memory file, which cannot always be made.
+    // A log is read through a shared-memory file, which cannot always be created.
     const bool refused = fault.status == kCannotOpen || fault.status == kAccessDenied;
     return refused && isReadableFile(path_) ? openCopy(connection) : fault;
 }
@@ -161,7 +161,7 @@ StoreFault StoreFile::checkDirectory() const {
     return S_ISDIR(found.st_mode) ? StoreFault{} : refused(kCannotOpen, directory_, ENOTDIR);
 }
 
-// Into memory, so that the copy's files are gone at once.
+// Into memory, so that the files of the copy can be deleted at once.
 StoreFault StoreFile::openCopy(Connection& connection) const {
     StoreCopy copy;
     if (const int error = copy.make(path_); error != 0) {
@@ -177,9 +177,9 @@ StoreFault StoreFile::openCopy(Connection& connection) const {
     return result == SQLITE_OK ? StoreFault{} : explain(opened, result);
 }
 
-// Several processes may make the store at once: one of them holds the lock of the directory and builds it under
-// another name, and the rest find it made. A process that is killed leaves at most a file that the next one removes.
-// (Switching a shared new file to a write-ahead log instead fails whatever the busy timeout.)
+// Several processes may create the store at once: one of them holds the lock of the directory and builds the store
+// under another name, the others find it finished. A killed process leaves at most a file that the next one removes.
+// (Switching a shared new file to a write-ahead log fails regardless of the busy timeout.)
 StoreFault StoreFile::make() {
     if (directory_.empty()) {
         return checkDirectory();
@@ -191,7 +191,7 @@ StoreFault StoreFile::make() {
     if (const int error = lockFolder(directory_, kBusyTimeout, folder); error != 0) {
         return error == EWOULDBLOCK ? stayedLocked() : refused(kCannotOpen, directory_, error);
     }
-    // Whatever has the name is left to the open, a link that leads nowhere too.
+    // If the name exists, even as a link without a target, the open decides.
     struct stat found {};
     if (fstatat(folder.get(), kStoreName, &found, AT_SYMLINK_NOFOLLOW) == 0) {
         return {};
@@ -209,7 +209,7 @@ StoreFault StoreFile::build(const OwnedDescriptor& folder) {
     if (!unfinishedStoreName(name)) {
         return refused(kCannotOpen, path_, errno);
     }
-    // Open until the end: closing it earlier would drop SQLite's locks on the file.
+    // Stays open: closing it earlier would drop SQLite's locks on the file.
     const OwnedDescriptor file(
         openat(folder.get(), name.c_str(), O_CREAT | O_EXCL | O_RDWR | O_NOFOLLOW | O_CLOEXEC, 0600));
     if (!file) {
@@ -217,7 +217,8 @@ StoreFault StoreFile::build(const OwnedDescriptor& folder) {
     }
     Connection connection;
     int result = connect(name, SQLITE_OPEN_READWRITE, connection);
-    // The schema first: a small file in rollback mode is written once, the switch then only marks its header.
+    // The schema is written first: in rollback mode a small file is written once, and the switch then only changes its
+    // header.
     for (const char* sql :
          {"PRAGMA page_size = 4096; PRAGMA synchronous = OFF; BEGIN", kSchema, "COMMIT", "PRAGMA journal_mode = WAL"}) {
         if (result == SQLITE_OK) {
@@ -228,7 +229,7 @@ StoreFault StoreFile::build(const OwnedDescriptor& folder) {
         return explain(connection.get(), result);
     }
     connection.reset();
-    // The lock makes this safe on file systems without hard links and without a rename that replaces nothing.
+    // The lock makes this safe on file systems without hard links and without a rename that does not replace.
     if (fsync(file.get()) != 0 || renameat(folder.get(), name.c_str(), folder.get(), kStoreName) != 0 ||
         fsync(folder.get()) != 0) {
         return refused(kCannotOpen, path_, errno);
@@ -253,7 +254,7 @@ int StoreFile::connect(const std::string& name, int flags, Connection& connectio
 }
 
 StoreFault StoreFile::open(int flags, Connection& connection) {
-    // A pipe without a writer would be waited for.
+    // Does not wait for the writer of a pipe.
     struct stat found {};
     if (stat(path_.c_str(), &found) == 0 && !S_ISREG(found.st_mode)) {
         return {kCannotOpen, path_, "is not a regular file"};
@@ -264,7 +265,7 @@ StoreFault StoreFile::open(int flags, Connection& connection) {
     if (result == SQLITE_OK) {
         sqlite3_extended_result_codes(opened, 1);
         sqlite3_busy_timeout(opened, kBusyTimeout);
-        // Each run would else pay for a checkpoint; the registry store makes one when the log has grown.
+        // Without this each run would make a checkpoint; the registry store makes one when the log has grown.
         sqlite3_db_config(opened, SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 1, nullptr);
         result = execute(opened, "PRAGMA synchronous = FULL; PRAGMA wal_autocheckpoint = 0");
     }
@@ -275,7 +276,7 @@ StoreFault StoreFile::open(int flags, Connection& connection) {
     return fault;
 }
 
-// `result` is that of opening the connection.
+// `result` is the result of opening the connection.
 StoreFault StoreFile::checkVersion(sqlite3* connection, int result) const {
     std::int64_t version = 0;
     if (result == SQLITE_OK) {

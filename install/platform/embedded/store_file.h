@@ -1,5 +1,5 @@
-// The file of the embedded registry store: where it lies, how the first of several processes makes it, and
-// how every later one opens it.
+// The file of the embedded registry store: its place, how the first of several processes creates it and how later ones
+// open it.
 #pragma once
 
 #include <string>
@@ -12,7 +12,7 @@ namespace kz7 {
 
 struct StoreFault {
     Status status = kSuccess;
-    std::string file;    // what could not be used
+    std::string file;    // the file that could not be used
     std::string reason;  // why, for people
 };
 
@@ -29,18 +29,18 @@ public:
     const std::string& path() const { return path_; }
     bool exists() const;
 
-    // Whether a host path names the store, its log or another file that SQLite keeps next to it; or one of another
-    // store that has a log: the log would be read into whatever took its store's place.
+    // Whether a host path names the store, its log or another file that SQLite keeps next to it, or such a file of
+    // another store that has a log: that log would be applied to any file that replaces its store.
     bool isPart(const std::string& path) const;
 
-    // Makes the state directory (mode 0700) and the store when they are missing, and opens it as a writer.
+    // Creates the state directory (mode 0700) and the store if they are missing, and opens the store for writing.
     StoreFault openForWriting(Connection& connection);
 
-    // Opens the store for reading, also where this process may not write; one in an existing directory that has none
-    // reads as empty. A connection must be closed before this object goes.
+    // Opens the store for reading, even if this process may not write to it. A missing store in an existing directory
+    // reads as empty. Close the connection before this object is destroyed.
     StoreFault openForReading(Connection& connection);
 
-    // What a failed SQLite call on this store means.
+    // Describes a failed SQLite call on this store.
     StoreFault explain(sqlite3* connection, int result) const;
 
 private:
@@ -51,7 +51,7 @@ private:
     StoreFault checkVersion(sqlite3* connection, int result) const;
     StoreFault make();
     StoreFault build(const OwnedDescriptor& folder);
-    // Opens the file of that name in the state directory; the connection is there on failure too, for its message.
+    // Opens the file of that name in the state directory; the connection is set on failure too, for its message.
     int connect(const std::string& name, int flags, Connection& connection);
     StoreFault refused(Status status, const std::string& file, int error) const;
     StoreFault stayedLocked() const;
@@ -59,7 +59,7 @@ private:
     std::string directory_;
     std::string path_;
     StoreReading reading_;
-    OwnedDescriptor folder_;  // the state directory, where its path is too long for SQLite
+    OwnedDescriptor folder_;  // the state directory, if its path is too long for SQLite
 };
 
 }  // namespace kz7

@@ -17,14 +17,14 @@ namespace kz7 {
 namespace {
 
 constexpr std::uint32_t kUsualColumns = 80;
-constexpr int kPollInterval = 100;  // milliseconds between two looks at endReading()
+constexpr int kPollInterval = 100;  // milliseconds between two checks of endReading()
 
 std::string_view environment(const char* name) {
     const char* value = std::getenv(name);
     return value == nullptr ? std::string_view{} : value;
 }
 
-// $COLUMNS, which users set to overrule the terminal; else the width of its window.
+// $COLUMNS, which overrides the terminal, or the width of its window.
 std::uint32_t columnsOf(int descriptor) {
     const std::string_view named = environment("COLUMNS");
     std::uint32_t columns = 0;
@@ -62,7 +62,7 @@ public:
         return view;
     }
 
-    // A handler in place of SIG_IGN: an ignored signal would stay ignored in the programs that this one starts.
+    // A handler instead of SIG_IGN: child programs would inherit an ignored signal.
     void leaveInterruptsToOthers(bool on) override {
         struct sigaction action {};
         sigaction(SIGINT, nullptr, &action);
@@ -93,7 +93,7 @@ private:
         return bytes_[at_++];
     }
 
-    // Not the C library's buffer: poll() must know whether a read would wait.
+    // Does not use the C library's buffer: poll() must know whether a read would wait.
     std::array<unsigned char, 4096> bytes_;
     std::size_t at_ = 0;
     std::size_t end_ = 0;

@@ -13,7 +13,7 @@
 namespace kz7 {
 namespace {
 
-// The host's page size and its smallest stack are known at run time only.
+// The page size and the smallest stack are known only at run time.
 std::size_t usableStack(std::size_t bytes) {
     const auto page = static_cast<std::size_t>(sysconf(_SC_PAGESIZE));
     const std::size_t wanted = std::max(bytes, static_cast<std::size_t>(PTHREAD_STACK_MIN));

@@ -47,7 +47,7 @@ std::string argumentText(const std::remove_reference_t<Parameter>& argument, boo
     } else if constexpr (std::is_convertible_v<const Value&, std::string_view>) {
         return quotedText(argument);
     } else {
-        return "...";  // what a text does not describe: functions and threads
+        return "...";  // functions and threads have no text
     }
 }
 

@@ -1,4 +1,4 @@
-// What sees every call of the ports that it is given to, and may fail some of them.
+// Sees every call of the ports that it observes, and may make some of them fail.
 #pragma once
 
 #include <functional>
@@ -28,11 +28,12 @@ class ICallObserver {
 public:
     virtual ~ICallObserver() = default;
 
-    // Before each call that returns a status. Any result but kSuccess becomes the result of the call, which is then
-    // not made. A close is made all the same, so that whatever stays open was left open by the caller of the port.
+    // Called before each call that returns a status. Any result but kSuccess becomes the result of the call, which is
+    // then not made. A close is always made, so that a handle that remains open was left open by the caller of the
+    // port.
     virtual Status before() { return kSuccess; }
 
-    // After each call, on the thread that made it.
+    // Called after each call, on the thread that made it.
     virtual void after(const PortCall& call) = 0;
 };
 

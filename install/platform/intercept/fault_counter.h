@@ -1,5 +1,5 @@
-// Makes one chosen call of many fail. All ports of a machine share one counter, so that "call N" counts over every port
-// in the order in which a flow makes its calls.
+// Makes one chosen call fail. All ports of a machine share one counter, so that "call N" counts over every port in the
+// order in which a flow makes its calls.
 #pragma once
 
 #include <cstdint>
@@ -29,7 +29,7 @@ public:
     // The operation that was the first to fail; empty if none did.
     const std::string& failed() const { return failed_; }
 
-    // That call with its arguments.
+    // The first failed call with its arguments.
     const std::string& failedCall() const { return failedCall_; }
 
     std::uint64_t calls() const { return calls_; }

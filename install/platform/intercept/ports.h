@@ -13,7 +13,7 @@
 
 namespace kz7 {
 
-// What all decorators do around a call.
+// The common part of the decorators.
 template <typename Port>
 class Intercepted : public Port {
 public:
@@ -133,7 +133,7 @@ KZ7_INTERCEPTED(InterceptedSession, IInstallerSession, "session",
 #undef KZ7_TYPES
 // clang-format on
 
-// The ports of a machine, each with the observer before it. Texts for a debugger pass by.
+// The decorated ports of a machine. Texts for a debugger are not observed.
 class InterceptedPorts {
 public:
     InterceptedPorts(const Ports& real, ICallObserver& observer)

@@ -5,7 +5,7 @@
 namespace kz7 {
 namespace {
 
-// One spelling for all that name the same file; empty for a path that names nothing.
+// The same text for all spellings of a file's path; empty for a path that names no file.
 std::string keyOf(std::string_view path) {
     const bool onDrive = path.size() >= 3 && path[1] == ':' && (path[2] == '\\' || path[2] == '/');
     if (path.empty() || (!onDrive && path.front() != '\\' && path.front() != '/')) {

@@ -1,4 +1,4 @@
-// The file-system port in memory: the set of paths that exist, and what is written to files.
+// The file-system port in memory: the paths that exist and the content of files.
 #pragma once
 
 #include <limits>
@@ -22,13 +22,13 @@ public:
     Status productPath(std::string_view hostPath, std::string& path) override;
     std::string shownPath(std::string_view path) override { return std::string(path); }
 
-    // Lets a file be there, and the folders above it. The path is absolute; names compare without case, as
-    // the product's own paths do.
+    // Creates a file and the folders above it. The path is absolute; names compare without case, as on the product's
+    // drives.
     void add(std::string_view path, std::string_view content = {});
 
     void remove(std::string_view path);
 
-    // What a file holds; empty for one that is not there.
+    // The content of a file; empty if the file does not exist.
     std::string content(std::string_view path);
 
     std::size_t openFiles() const { return open_.size(); }
@@ -37,7 +37,7 @@ public:
 
 private:
     struct File {
-        std::string name;  // as it was first spelled
+        std::string name;  // in its first spelling
         std::string content;
         bool isFolder = false;
     };

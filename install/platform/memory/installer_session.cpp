@@ -11,7 +11,7 @@ namespace {
 constexpr std::string_view kPropertyQuery = "SELECT `Property` FROM `Property` ORDER BY `Property`";
 constexpr std::size_t kBeforeExecution = static_cast<std::size_t>(-1);
 
-// A text with its NUL where it fits; else its size times a factor.
+// Copies a text with its NUL if it fits; otherwise the size is the text's size times a factor.
 Status giveText(std::string_view text, Buffer& room, std::uint32_t hintFactor) {
     const auto length = static_cast<std::uint32_t>(text.size());
     const Status status = giveName(text, room);
@@ -30,7 +30,7 @@ Status MemoryInstallerSession::getProperty(std::string_view name, Buffer& value)
     const auto found = properties.find(name);
     const bool readable = mayReach() || std::find(kReadableWhenScheduled.begin(), kReadableWhenScheduled.end(), name) !=
                                             kReadableWhenScheduled.end();
-    // The installer counts the room that was missing twice.
+    // The installer reports twice the size of a text that does not fit.
     return giveText(found == properties.end() || !readable ? std::string_view{} : found->second, value, 2);
 }
 
@@ -152,7 +152,7 @@ Status MemoryInstallerSession::closeHandle(SessionHandle handle) {
     return records_.erase(handle) + views_.erase(handle) + databases_.erase(handle) != 0 ? kSuccess : kInvalidHandle;
 }
 
-// "[Name]" is the property's value, "[\\x]" the character x, "[1]" a field and left for a reader as it is.
+// "[Name]" is replaced by the property's value and "[\\x]" by the character x; "[1]" is a field and remains.
 std::string MemoryInstallerSession::expanded(std::string_view text) const {
     std::string result;
     while (!text.empty()) {

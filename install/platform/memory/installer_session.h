@@ -1,5 +1,5 @@
-// The installer session in memory: properties, features and tables that a test sets up, and every message that
-// was processed, as the installer would show it. It allows a scheduled action no more than the installer does.
+// The installer session in memory: properties, features and tables that a test sets up, and every processed message as
+// the installer would show it. A scheduled action may do no more than in the installer.
 #pragma once
 
 #include <functional>
@@ -47,7 +47,7 @@ public:
     std::map<std::string, Feature, std::less<>> features;
     std::map<std::string, std::function<void()>, std::less<>> actions;
     std::vector<Message> messages;
-    std::int32_t answer = 0;  // what a message is answered with
+    std::int32_t answer = 0;  // the answer to every message
     std::size_t openHandles() const { return records_.size() + views_.size() + databases_.size(); }
 
 private:
@@ -55,7 +55,7 @@ private:
     SessionHandle nextHandle() { return SessionHandle{++lastHandle_}; }
     std::string expanded(std::string_view text) const;
 
-    std::map<SessionHandle, std::size_t> views_;  // the row that comes next; past the last before it is executed
+    std::map<SessionHandle, std::size_t> views_;  // the next row; beyond the last one until the view is executed
     std::set<SessionHandle> databases_;
 
     std::map<SessionHandle, std::vector<std::string>> records_;

@@ -1,4 +1,4 @@
-// A whole machine in memory. Its ports are public members, so that a test sets them up and reads them.
+// A whole machine in memory. Its ports are public members, so that tests can set them up and read them.
 #pragma once
 
 #include "install/platform/memory/file_system.h"

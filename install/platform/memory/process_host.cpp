@@ -136,7 +136,7 @@ Status MemoryProcessHost::closeProcess(ProcessHandle process) {
 }
 
 Status MemoryProcessHost::shortPath(std::string_view path, Buffer& shortened) {
-    // Only the blanks go: enough to tell a shortened path from one that was left alone.
+    // Removes the blanks only, which is enough to distinguish a shortened path.
     if (!programs_.contains(foldUpper(path))) {
         return kFileNotFound;
     }

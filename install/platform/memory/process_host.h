@@ -1,5 +1,5 @@
-// The process port in memory: programs are rows of a table that say what each writes and how it ends. A
-// program runs to its end while it is started, in this thread; use it with MemoryThreads.
+// The process port in memory: programs are rows of a table with their output and exit code. A program runs to its end
+// inside the call that starts it; use it with MemoryThreads.
 #pragma once
 
 #include <array>
@@ -17,16 +17,18 @@ struct ScriptedProgram {
     std::string output = {};
     std::string error = {};
     std::uint32_t exitCode = 0;
-    bool runsOn = false;  // outlasts every wait that has a limit, holding its pipes; ends in one without
+    bool runsOn =
+        false;  // still runs after every wait with a limit and holds its pipes; ends in a wait without a limit
 };
 
 class MemoryProcessHost final : public IProcessHost {
 public:
-    // Paths compare without case and stand as in the command lines, without quotes.
+    // Paths compare without case and are written as in command lines, without quotation marks.
     void addProgram(std::string_view path, ScriptedProgram program);
 
-    std::optional<ScriptedProgram> otherPrograms;  // what programs that were not added do; none: they do not exist
-    std::vector<std::string> started;              // the command lines of the programs that were started, in order
+    std::optional<ScriptedProgram>
+        otherPrograms;                 // the result of programs that were not added; empty: they do not exist
+    std::vector<std::string> started;  // the command lines of the programs that were started, in order
     std::size_t openHandles() const { return streams_.size() + children_.size(); }
 
     Status getSlot(StandardSlot slot, StreamHandle& stream) override;
@@ -34,7 +36,7 @@ public:
     Status createPipe(StreamHandle& readEnd, StreamHandle& writeEnd) override;
     Status duplicate(StreamHandle stream, StreamHandle& copy) override;
 
-    // Where the wait would have no end, kWaitTimedOut: nothing else runs here that could write.
+    // kWaitTimedOut if the wait would never end, because no other thread can write.
     Status read(StreamHandle stream, Buffer& data) override;
     Status write(StreamHandle stream, std::string_view data) override;
     Status closeStream(StreamHandle stream) override;
@@ -45,7 +47,7 @@ public:
     Status shortPath(std::string_view path, Buffer& shortened) override;
 
 private:
-    // The ends of a pipe share its bytes; an end is closed when nobody holds its token any more.
+    // The ends of a pipe share its bytes. An end is closed when its last token is closed.
     struct End {};
     struct Pipe {
         std::string bytes;

@@ -9,7 +9,7 @@ namespace kz7 {
 namespace {
 
 constexpr std::string_view kCallersSid = "S-1-22-1-0";
-// Clear of the roots, and of the numbers that other ports give out.
+// Above the numbers of the roots and of the handles of other ports.
 constexpr std::uint64_t kFirstHandle = std::uint64_t{1} << 32;
 
 }  // namespace
@@ -85,7 +85,7 @@ Status MemoryRegistry::find(KeyHandle parent, std::string_view path, AccessMask 
     return status == kSuccess && node == noUser_ ? kFileNotFound : status;
 }
 
-MemoryRegistry::NodePointer MemoryRegistry::writable(NodePointer node) {
+MemoryRegistry::NodePointer MemoryRegistry::writable(const NodePointer& node) {
     return node == noUser_ ? child(*users_, kCallersSid, true) : node;
 }
 

@@ -1,5 +1,5 @@
-// The registry port in memory, for tests and for looking at what a run would change. Handles are numbers in
-// a table, so that a closed one, and one whose key was deleted, answer what they do elsewhere.
+// The registry port in memory, for tests and for dry runs. Handles are numbers in a table, so that closed handles and
+// handles of deleted keys return the same results as elsewhere.
 #pragma once
 
 #include <map>
@@ -27,7 +27,7 @@ public:
     Status deleteKey(KeyHandle parent, std::string_view path, AccessMask view) override;
     Status commit() override;
 
-    // Handles given out and not closed yet, those of deleted keys among them.
+    // Open handles, including those of deleted keys.
     std::size_t openHandles() const { return open_.size(); }
 
     std::size_t commits() const { return commits_; }
@@ -43,7 +43,7 @@ private:
         std::string name;
         std::string fold;
         std::string keyClass;
-        Node* parent = nullptr;  // good while the key is not deleted
+        Node* parent = nullptr;  // valid until the key is deleted
         bool deleted = false;
         std::vector<std::shared_ptr<Node>> subkeys;        // by folded name
         std::map<std::string, Value, std::less<>> byName;  // folded
@@ -57,9 +57,9 @@ private:
 
     static std::vector<NodePointer>::iterator lowerBound(Node& parent, std::string_view fold);
     static NodePointer child(Node& parent, std::string_view name, bool create);
-    // The node itself, or the caller's key, which a write makes.
-    NodePointer writable(NodePointer node);
-    // The key behind a handle that has the rights needed.
+    // The node itself, or the caller's key, which a write creates.
+    NodePointer writable(const NodePointer& node);
+    // The key of a handle that has the required rights.
     Status nodeOf(KeyHandle handle, AccessMask needed, NodePointer& node);
     Status nodeForValue(KeyHandle key, AccessMask needed, std::string_view name, NodePointer& node);
     Status find(KeyHandle parent, std::string_view path, AccessMask access, NodePointer& node);
@@ -67,7 +67,7 @@ private:
 
     NodePointer machine_;
     NodePointer users_;
-    NodePointer noUser_;  // stands for the caller's key while it does not exist
+    NodePointer noUser_;  // represents the caller's key while it does not exist
     std::map<KeyHandle, OpenKey> open_;
     std::uint64_t lastHandle_;
     std::uint64_t lastPlace_ = 0;

@@ -37,7 +37,7 @@ public:
     std::string output;
     std::string error;
     std::string both;         // in the order of the calls
-    std::size_t flushed = 0;  // bytes of `output` that a child's output would follow
+    std::size_t flushed = 0;  // bytes of `output` that precede a child's output
 };
 
 class MemoryDebugOutput final : public IDebugOutput {
@@ -47,7 +47,7 @@ public:
     std::vector<std::string> messages;
 };
 
-// A clock that stands still.
+// A clock that does not advance.
 class MemoryHost final : public IHostInformation {
 public:
     Status localTime(TimeText form, Buffer& text) override {
@@ -81,13 +81,13 @@ public:
     TerminalView look(TerminalStream) override { return view; }
     void leaveInterruptsToOthers(bool on) override { leavesInterrupts = on; }
 
-    std::string input;  // what is left to read
+    std::string input;  // the rest of the input
     TerminalView view;
     bool keepsLineFeeds = false;
     bool leavesInterrupts = false;
 };
 
-// Entry points of this program, under the path and the name that they are found by.
+// Entry points of this program, by the path of their library and their name.
 class MemoryLibraryLoader final : public ILibraryLoader {
 public:
     using Entries = std::map<std::string, LibraryFunction>;

@@ -1,5 +1,5 @@
-// The thread port without threads: a thread's function runs when it is waited for, or closed, in the thread
-// that does so. Whatever is written with it runs the same way every time.
+// The thread port without threads: the function of a thread runs when the thread is waited for or closed, in the
+// calling thread. Tests that use it always run in the same order.
 #pragma once
 
 #include <map>
@@ -18,7 +18,7 @@ public:
     Status closeThread(ThreadHandle thread) override;
 
 private:
-    std::map<ThreadHandle, std::unique_ptr<ThreadStart>> threads_;  // null: has run
+    std::map<ThreadHandle, std::unique_ptr<ThreadStart>> threads_;  // null: it has run
     std::uint32_t lastId_ = 0;
 };
 

@@ -54,7 +54,7 @@ private:
     bool entered_;
 };
 
-// The cache interface of one generation.
+// The library of one framework generation.
 class Fusion {
 public:
     explicit Fusion(const Generation& generation) {
@@ -103,7 +103,7 @@ private:
     HMODULE library_ = nullptr;
 };
 
-// Whether a cached assembly is a provider of that level: version 9.1.0.x is of the level 9.1.0.
+// Whether a cached assembly is a provider of a level: version 9.1.0.x belongs to level 9.1.0.
 bool isProvider(IAssemblyName& assembly, const std::wstring& level) {
     wchar_t name[MAX_PATH] = {};
     DWORD size = MAX_PATH;
@@ -144,7 +144,7 @@ Status uninstall(::IAssemblyCache& cache, const std::wstring& name) {
     return result == S_FALSE && stays ? kBusy : statusOf(result);
 }
 
-// Nothing for a location that depends on where the process stands.
+// Empty for a location that depends on the current directory.
 std::vector<std::wstring> providerFiles(std::string_view location) {
     const std::string folder = std::string(location) + (location.ends_with('\\') ? "bin\\" : "\\bin\\");
     std::vector<std::wstring> files;
@@ -164,7 +164,7 @@ std::vector<std::wstring> providerFiles(std::string_view location) {
     return files;
 }
 
-// The first failure of several steps that do not stop one another.
+// Keeps the first failure of several steps that are all taken.
 void keepFirst(Status& first, Status status) {
     if (succeeded(first)) {
         first = status;

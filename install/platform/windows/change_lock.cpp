@@ -2,8 +2,9 @@
 
 #include <aclapi.h>
 #include <sddl.h>
-#include <shlobj.h>
 
+#include <cwchar>
+#include <string_view>
 #include <utility>
 
 namespace kz7 {
@@ -12,12 +13,13 @@ namespace {
 constexpr ULONGLONG kPatience = 5000;  // milliseconds
 constexpr DWORD kPoll = 20;            // milliseconds
 
-// Owner and group are the administrators; they and the system have all rights, below too; nothing is inherited.
+// Owner and group: administrators. Full access for administrators and the system, inherited by the files inside; no
+// access is inherited from the parent.
 constexpr wchar_t kForAdministrators[] = L"O:BAG:BAD:P(A;OICI;FA;;;BA)(A;OICI;FA;;;SY)";
 
 struct Owner {
     LocalMemory descriptor;
-    PSID sid = nullptr;  // a part of it; null: the owner cannot be read
+    PSID sid = nullptr;  // points into it; null: the owner cannot be read
 };
 
 Owner ownerOf(HANDLE file) {
@@ -32,13 +34,13 @@ Owner ownerOf(HANDLE file) {
 }
 
 NativeHandle openFolder(const std::wstring& folder) {
-    // Without sharing deletion: the folder stays in its place while it is looked at and used.
+    // Without FILE_SHARE_DELETE: nobody can rename or replace the folder while it is checked and used.
     return owned<NativeHandle>(CreateFileW(folder.c_str(), FILE_READ_ATTRIBUTES | READ_CONTROL,
                                            FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr, OPEN_EXISTING,
                                            FILE_FLAG_BACKUP_SEMANTICS | FILE_FLAG_OPEN_REPARSE_POINT, nullptr));
 }
 
-// Administrators, the system, and the owner of the system's own folder, who could change anything anyway.
+// Administrators, the system, and the owner of the Windows folder, who can change everything anyway.
 bool isTrustedOwner(PSID sid) {
     if (IsWellKnownSid(sid, WinBuiltinAdministratorsSid) != FALSE || IsWellKnownSid(sid, WinLocalSystemSid) != FALSE) {
         return true;
@@ -61,12 +63,24 @@ bool isTrusted(HANDLE file, bool isFolder) {
     return owner.sid != nullptr && isTrustedOwner(owner.sid);
 }
 
+// %ProgramData%\KZ7; empty if the system does not know the folder. Not from the environment, which is the user's, and
+// not from the shell, whose libraries would make every start slower.
 std::wstring lockFolder() {
-    // Not from the environment, which is the user's.
-    PWSTR folder = nullptr;
-    const bool known = SUCCEEDED(SHGetKnownFolderPath(FOLDERID_ProgramData, 0, nullptr, &folder));
-    const std::unique_ptr<wchar_t, decltype(&CoTaskMemFree)> owner(folder, CoTaskMemFree);
-    return known ? std::wstring(folder) + L"\\KZ7" : std::wstring{};
+    constexpr std::wstring_view kSystemDrive = L"%SystemDrive%";
+    wchar_t folder[MAX_PATH] = {};
+    DWORD size = sizeof folder;
+    wchar_t system[MAX_PATH] = {};
+    if (RegGetValueW(HKEY_LOCAL_MACHINE, L"SOFTWARE\\Microsoft\\Windows NT\\CurrentVersion\\ProfileList",
+                     L"ProgramData", RRF_RT_REG_SZ | RRF_RT_REG_EXPAND_SZ | RRF_NOEXPAND, nullptr, folder,
+                     &size) != ERROR_SUCCESS ||
+        GetSystemWindowsDirectoryW(system, MAX_PATH) == 0) {
+        return {};
+    }
+    std::wstring path = folder;
+    if (_wcsnicmp(folder, kSystemDrive.data(), kSystemDrive.size()) == 0) {
+        path.replace(0, kSystemDrive.size(), system, 2);
+    }
+    return path + L"\\KZ7";
 }
 
 }  // namespace

@@ -1,5 +1,5 @@
-// Keeps programs apart that change this machine's registry and services. A program holds the lock from its first
-// access to a commit point, where others get their turn: a program that it starts, too.
+// A lock between programs that change this machine's registry and services. A program holds it from its first access
+// to the next commit point. It is free while a child program runs, which may need it.
 #pragma once
 
 #include <functional>
@@ -10,23 +10,23 @@
 
 namespace kz7 {
 
-// The lock is the file %ProgramData%\KZ7\lock, open without sharing, in a folder for administrators and the system
-// only. Without a folder that can be trusted, changes are made without a lock: a folder that an unprivileged user made
+// The lock is the file %ProgramData%\KZ7\lock, opened without sharing, in a folder for administrators and the system
+// only. If the folder cannot be trusted, changes are made without the lock: a folder that an unprivileged user created
 // first must not keep administrators from their work. One thread.
 class ChangeLock {
 public:
-    // `isWanted` is false for programs that only read. `busy` is called once for each kBusy that is not a repetition.
+    // `isWanted` is false for programs that only read. `busy` is called when a wait for the lock ends without it.
     ChangeLock(bool isWanted, std::function<void()> busy) : isWanted_(isWanted), busy_(std::move(busy)) {}
 
-    // Takes the lock unless it is held. kBusy: another program kept it for 5 seconds; the result then stays so up to
+    // Takes the lock unless it is held. kBusy: another program held it for 5 seconds. The result is then kBusy until
     // the next release().
     Status hold();
 
-    // Lets others take it. The result is that of hold() since the last release.
+    // Lets other programs take it. Returns the result of hold() since the last release.
     Status release();
 
 private:
-    // False: another program has it. Otherwise it is held, or not wanted any more because there is none to be had.
+    // False: another program has it. True: this program has it, or goes on without one.
     bool tryHold();
 
     bool isWanted_;

@@ -11,9 +11,9 @@
 namespace kz7 {
 namespace {
 
-constexpr std::size_t kPiece = 8192;  // characters of one call
+constexpr std::size_t kPiece = 8192;  // UTF-16 units of one call
 
-// The handle of a stream that people look at; null for any other.
+// The handle of a stream that is a console; null for any other.
 HANDLE consoleOf(std::FILE* stream) {
     if (_isatty(_fileno(stream)) == 0) {
         return nullptr;
@@ -26,10 +26,13 @@ HANDLE consoleOf(std::FILE* stream) {
 Status writeToConsole(std::FILE* stream, HANDLE console, std::string_view text) {
     std::fflush(stream);
     const WideText wide(text);
-    for (std::size_t at = 0; at < wide.size(); at += kPiece) {
-        const auto length = static_cast<DWORD>(std::min(wide.size() - at, kPiece));
+    for (std::size_t at = 0, length = 0; at < wide.size(); at += length) {
+        length = std::min(wide.size() - at, kPiece);
+        if (length == kPiece && IS_HIGH_SURROGATE(wide.c_str()[at + length - 1])) {
+            --length;  // a pair stays together
+        }
         DWORD written = 0;
-        if (WriteConsoleW(console, wide.c_str() + at, length, &written, nullptr) == FALSE) {
+        if (WriteConsoleW(console, wide.c_str() + at, static_cast<DWORD>(length), &written, nullptr) == FALSE) {
             return kWriteFault;
         }
     }

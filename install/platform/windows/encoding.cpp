@@ -1,4 +1,4 @@
-// Narrow texts are in the active code page here.
+// Narrow texts are in the active code page.
 #include "install/platform/encoding.h"
 
 #include <windows.h>
@@ -14,7 +14,18 @@ bool isAscii(std::string_view text) {
     return std::all_of(text.begin(), text.end(), [](char c) { return static_cast<unsigned char>(c) < 0x80; });
 }
 
-// In the code page, or in the closest characters that it has.
+constexpr std::size_t kLongestCharacter = 4;  // bytes, in any code page
+
+// False, and `wide` is as before, for bytes that are not a text of the code page.
+bool appendWide(std::string_view narrow, std::wstring& wide) {
+    const int length = static_cast<int>(narrow.size());
+    const int units = MultiByteToWideChar(CP_ACP, MB_ERR_INVALID_CHARS, narrow.data(), length, nullptr, 0);
+    const std::size_t before = wide.size();
+    wide.resize(before + static_cast<std::size_t>(units));
+    return MultiByteToWideChar(CP_ACP, MB_ERR_INVALID_CHARS, narrow.data(), length, wide.data() + before, units) != 0;
+}
+
+// Characters that the code page lacks become its closest ones.
 void appendNarrow(std::u16string_view utf16, std::string& narrow) {
     if (utf16.empty()) {
         return;
@@ -57,21 +68,22 @@ std::string textFromNarrow(std::string_view narrow) {
     if (isAscii(narrow)) {
         return std::string(narrow);
     }
-    const int size = static_cast<int>(narrow.size());
-    std::wstring wide(narrow.size(), L'\0');
-    wide.resize(static_cast<std::size_t>(
-        MultiByteToWideChar(CP_ACP, 0, narrow.data(), size, wide.data(), static_cast<int>(wide.size()))));
-    std::string back;
-    appendNarrow(utf16View(wide), back);
-    if (back == narrow) {
+    std::wstring wide;
+    if (appendWide(narrow, wide)) {
         return textFromWide(wide);
     }
-    std::string text;
-    for (const char c : narrow) {
-        const char32_t byte = static_cast<unsigned char>(c);
-        appendUtf8(text, byte < 0x80 ? byte : 0xDC00 + byte);
+    while (!narrow.empty()) {
+        std::size_t length = 1;
+        while (length <= kLongestCharacter && !appendWide(narrow.substr(0, length), wide)) {
+            ++length;
+        }
+        if (length > kLongestCharacter) {
+            wide += static_cast<wchar_t>(0xDC00 + static_cast<unsigned char>(narrow[0]));
+            length = 1;
+        }
+        narrow.remove_prefix(std::min(length, narrow.size()));
     }
-    return text;
+    return textFromWide(wide);
 }
 
 std::string narrowFromText(std::string_view text) {
@@ -80,7 +92,7 @@ std::string narrowFromText(std::string_view text) {
     }
     const std::u16string utf16 = utf16FromText(text);
     std::string narrow;
-    std::size_t begin = 0;  // of what is not yet converted
+    std::size_t begin = 0;  // of the part that is not converted yet
     for (std::u16string_view rest = utf16; !rest.empty();) {
         const std::size_t at = utf16.size() - rest.size();
         const char32_t character = takeUtf16(rest);

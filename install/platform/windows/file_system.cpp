@@ -1,4 +1,4 @@
-#define _CRT_RAND_S
+#define _CRT_RAND_S  // NOLINT(bugprone-reserved-identifier): what rand_s() asks for
 #include "install/platform/windows/ports.h"
 
 #include <io.h>
@@ -16,7 +16,7 @@
 namespace kz7 {
 namespace {
 
-constexpr std::size_t kReadPiece = 64 * 1024;
+constexpr std::size_t kReadPiece = std::size_t{64} * 1024;
 constexpr DWORD kWithoutOurRights = SECURITY_SQOS_PRESENT | SECURITY_IDENTIFICATION;
 constexpr std::size_t kWritePiece = 1 << 30;
 
@@ -33,7 +33,7 @@ std::string wholePath(std::string_view path) {
     return textOf([&](wchar_t* room, DWORD size) { return GetFullPathNameW(given.c_str(), size, room, nullptr); });
 }
 
-// Whether an open file or folder is in the place that its path names: no folder on the way is a link.
+// Whether an open file or folder is where its path says, so that no folder of the path is a link.
 bool liesAt(HANDLE file, std::string_view path) {
     const auto withoutSeparator = [](std::string_view text) { return text.substr(0, text.find_last_not_of('\\') + 1); };
     std::string place = textOf([&](wchar_t* room, DWORD size) {
@@ -42,9 +42,9 @@ bool liesAt(HANDLE file, std::string_view path) {
     if (place.starts_with(R"(\\?\UNC\)")) {
         place.replace(0, 8, R"(\\)");
     } else {
-        place.erase(0, 4);  // of `\\?\C:\...`
+        place.erase(0, 4);  // the "\\?\" of "\\?\C:\..."
     }
-    // The path may have short names.
+    // The path may contain short names.
     const WideText given(path);
     const std::string asked =
         textOf([&](wchar_t* room, DWORD size) { return GetLongPathNameW(given.c_str(), room, size); });
@@ -53,7 +53,7 @@ bool liesAt(HANDLE file, std::string_view path) {
     return left.size() != 0 && CompareStringOrdinal(left.c_str(), -1, right.c_str(), -1, TRUE) == CSTR_EQUAL;
 }
 
-// A name for a new file in a folder; empty when the system has no randomness.
+// A random name for a new file in a folder; empty if the system has no random numbers.
 std::string randomName(std::string_view folder) {
     std::string name = std::string(folder) + ".kz7-";
     for (int word = 0; word < 4; ++word) {
@@ -78,7 +78,7 @@ Status checkTarget(const std::string& path, bool replace) {
 class WindowsFileSystem final : public IFileSystem {
 public:
     Status probe(std::string_view path) override {
-        // Nothing is taken relative to the current folder.
+        // Nothing is relative to the current folder, where another user could place files.
         if (namesNothing(path)) {
             return kFileNotFound;
         }
@@ -92,8 +92,8 @@ public:
         if (namesNothing(path)) {
             return kFileNotFound;
         }
-        // Others may have chosen the path. The server of a pipe of that name can identify this program, not act with
-        // its rights.
+        // Others may have chosen the path. If it is a named pipe, its server can identify this program but cannot
+        // impersonate it.
         const NativeHandle file = owned<NativeHandle>(
             CreateFileW(WideText(path).c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr,
                         OPEN_EXISTING, FILE_ATTRIBUTE_NORMAL | kWithoutOurRights, nullptr));
@@ -122,7 +122,7 @@ public:
         if (whole.starts_with(R"(\\.\)")) {
             return kAccessDenied;
         }
-        // The folder first, and held in its place: nothing is made where a link leads.
+        // Opens the folder first and holds it, so that no file is created behind a link.
         const std::string folderPath = whole.substr(0, whole.find_last_of('\\') + 1);
         const NativeHandle folder = owned<NativeHandle>(
             CreateFileW(WideText(folderPath).c_str(), FILE_READ_ATTRIBUTES, FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr,
@@ -199,7 +199,7 @@ public:
         if (!search) {
             return GetLastError() == ERROR_PATH_NOT_FOUND ? kFileNotFound : GetLastError();
         }
-        // The system's '?' also stands for no character at all.
+        // For the system a "?" also matches no character.
         std::string first;
         do {
             const std::string each = textFromWide(found.cFileName);

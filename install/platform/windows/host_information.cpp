@@ -22,7 +22,7 @@ public:
         char room[256];
         Buffer narrow(room, sizeof room);
         const Status status = giveTime(parts, form, narrow);
-        // The time zone has a name in the language of the machine.
+        // The name of the time zone is in the language of the machine.
         return status == kSuccess ? giveName(textFromNarrow(narrow.view()), text) : status;
     }
 

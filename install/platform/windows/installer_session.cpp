@@ -1,7 +1,7 @@
 #include "install/platform/installer_session.h"
 
 #include <windows.h>
-// The types above first.
+// Needs the types above.
 #include <msi.h>
 #include <msiquery.h>
 
@@ -20,7 +20,7 @@ MSIHANDLE native(SessionHandle handle) {
     return static_cast<MSIHANDLE>(handle);
 }
 
-// A handle that the installer gave, or what it means that it gave none.
+// A handle that the installer returned, or the status for none.
 Status giveHandle(MSIHANDLE given, Status none, SessionHandle& handle) {
     if (given == 0) {
         return none;
@@ -29,8 +29,8 @@ Status giveHandle(MSIHANDLE given, Status none, SessionHandle& handle) {
     return kSuccess;
 }
 
-// The text of a call that fills a room of a size, both in characters, or gives the size that is missing; that may be
-// twice the true one.
+// The text of a call that fills a buffer or returns the size needed, in characters. That size may be twice the real
+// one.
 template <typename Call>
 Status readText(Buffer& text, Call call) {
     std::wstring room(kFirstRoom, L'\0');
@@ -49,7 +49,7 @@ Status readText(Buffer& text, Call call) {
 
 class WindowsInstallerSession final : public IInstallerSession {
 public:
-    // `installation` is the handle that the installer gave; it stays the installer's.
+    // The installer owns the handle.
     explicit WindowsInstallerSession(std::uint32_t installation) : installation_(installation) {}
 
     Status runMode(RunMode mode, bool& isOn) override {

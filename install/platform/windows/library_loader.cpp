@@ -15,7 +15,7 @@ HMODULE moduleOf(LibraryHandle library) {
     return std::bit_cast<HMODULE>(library);
 }
 
-// The loader leaves no error for a missing export on every system that runs this.
+// Some systems set no error for a missing export.
 Status lastErrorOr(Status fallback) {
     const Status status = GetLastError();
     return status == kSuccess ? fallback : status;

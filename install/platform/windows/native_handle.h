@@ -1,4 +1,4 @@
-// Owners of the system's own handles: what throws leaks none.
+// RAII owners of Windows handles.
 #pragma once
 
 #include <windows.h>

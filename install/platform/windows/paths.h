@@ -1,4 +1,4 @@
-// Which paths name one place on Windows, wherever the process stands.
+// Tests of Windows paths.
 #pragma once
 
 #include <string_view>
@@ -9,7 +9,7 @@ constexpr bool isPathSeparator(char c) {
     return c == '\\' || c == '/';
 }
 
-// A drive with its root, or a share. `\x` and `C:x` depend on the directory the process was started in.
+// A path with a drive and its root, or a share. `\x` and `C:x` depend on the current directory.
 constexpr bool isAbsolutePath(std::string_view path) {
     return path.size() >= 3 &&
            ((path[1] == ':' && isPathSeparator(path[2])) || (isPathSeparator(path[0]) && isPathSeparator(path[1])));

@@ -18,14 +18,14 @@ class WindowsPlatform final : public IPlatform {
 public:
     explicit WindowsPlatform(const PlatformOptions& options)
         : program_(options.program),
-          // A library in an installer changes only what the user's own key holds.
+          // The library in an installer changes keys of one user only.
           lock_(options.ownProcess && !options.readOnly, [this] { tellBusy(); }) {
         ports_ = {registry_.get(),   services_.get(),  console_.get(), debugOutput_.get(),
                   files_.get(),      processes_.get(), threads_.get(), libraries_.get(),
                   assemblies_.get(), host_.get(),      terminal_.get()};
     }
 
-    // The caller's own, so that nobody else can have put something in its place.
+    // In the user's profile, where no other user can place a file or a link first.
     Status ownFolder(std::string& path) override {
         const std::string folder =
             textOf([](wchar_t* room, DWORD size) { return GetEnvironmentVariableW(L"LOCALAPPDATA", room, size); });
@@ -70,7 +70,7 @@ private:
 
 std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options) {
     if (options.ownProcess) {
-        // Libraries that the system loads for itself are not taken from the current folder either.
+        // The loader does not search the current folder for any library.
         SetDllDirectoryW(L"");
     }
     if (options.plainStreams) {

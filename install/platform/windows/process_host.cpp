@@ -33,8 +33,8 @@ DWORD slotNumber(StandardSlot slot) {
     return slot == StandardSlot::output ? STD_OUTPUT_HANDLE : STD_ERROR_HANDLE;
 }
 
-// Takes the next folder off a search path. In quotation marks a folder may hold a semicolon; the marks are not part of
-// its name.
+// Takes the next folder off a search path. A folder in quotation marks may contain a semicolon; the marks are not part
+// of its name.
 std::wstring takeFolder(std::wstring_view& path) {
     std::wstring folder;
     std::size_t at = 0;
@@ -49,8 +49,7 @@ std::wstring takeFolder(std::wstring_view& path) {
     return folder;
 }
 
-// The absolute folders of a search path. A folder with a semicolon in its name is left out: the system's search splits
-// it.
+// The absolute folders of a search path, without those with a semicolon in their name, which the system would split.
 std::wstring absoluteFolders(std::wstring_view path) {
     std::wstring kept;
     while (!path.empty()) {
@@ -62,8 +61,8 @@ std::wstring absoluteFolders(std::wstring_view path) {
     return kept;
 }
 
-// While it lives, the system searches for bare program names without the current folder: nothing is taken from
-// the folder that the tool happens to be run in. A child gets the environment as it was before.
+// While it lives, the system does not search the current folder for a program, where another user could place one. A
+// child gets the environment as it was before.
 class SearchWithoutCurrentFolder {
 public:
     SearchWithoutCurrentFolder() : environment_(GetEnvironmentStringsW()) {
@@ -97,7 +96,7 @@ private:
     bool wasSet_ = false;
 };
 
-// Whether the system finds the program by its bare name: beside this program, in its own folders or along the path.
+// Whether the system finds a program by its bare name: next to this program, in the system's folders or on the path.
 bool isFoundByName(std::string_view program) {
     const std::string own = textOf([](wchar_t* room, DWORD size) { return GetModuleFileNameW(nullptr, room, size); });
     std::string folders = own.substr(0, own.find_last_of('\\'));
@@ -109,8 +108,8 @@ bool isFoundByName(std::string_view program) {
     return SearchPathW(WideText(folders).c_str(), WideText(program).c_str(), L".exe", 0, nullptr, nullptr) != 0;
 }
 
-// Whether the reading that the system would settle for hangs on the current folder or drive. It takes the first of
-// which there is a file; behind a bare name that is not found, "a b\c.exe" may be one.
+// Whether the program that the system would choose depends on the current folder or drive. The system takes the first
+// reading of which a file exists; after a bare name that is not found it may be "a b\c.exe".
 bool hangsOnCurrentFolder(const std::vector<CommandReading>& readings) {
     for (const CommandReading& reading : readings) {
         if (!isBareName(reading.program)) {
@@ -123,8 +122,8 @@ bool hangsOnCurrentFolder(const std::vector<CommandReading>& readings) {
     return false;
 }
 
-// The handles that a program gets: the streams it is given, and no other that happens to be inheritable. What this
-// process was given by others would stay open for as long as the program, or one that it starts, runs.
+// The handles that a child inherits: its streams and no other inheritable handle of this process, which would stay open
+// for as long as the child or a grandchild runs.
 class InheritedHandles {
 public:
     explicit InheritedHandles(std::initializer_list<StreamHandle> streams) {
@@ -238,7 +237,7 @@ public:
         startup.StartupInfo.hStdOutput = native(start.output);
         startup.StartupInfo.hStdError = native(start.error);
         startup.lpAttributeList = inherited.list();
-        WideText commandLine(start.commandLine);  // the call writes into it
+        WideText commandLine(start.commandLine);  // CreateProcess() writes into it
         PROCESS_INFORMATION information{};
         const Status status = judged(CreateProcessW(
             nullptr, commandLine.data(), nullptr, nullptr, inherited.any() ? TRUE : FALSE,

@@ -13,17 +13,24 @@ std::FILE* openInput(const char* path) {
     return _wfopen(WideText(path).c_str(), L"rb");
 }
 
+std::string environmentText(const char* name) {
+    const WideText wide(name);
+    return textOf([&](wchar_t* room, DWORD size) { return GetEnvironmentVariableW(wide.c_str(), room, size); });
+}
+
 }  // namespace kz7
 
-// The wide vector of the C runtime: CommandLineToArgvW() splits `"a""b" c` otherwise, and the narrow vector is split
-// after other quotation marks have become ASCII's.
+// Takes the wide vector of the C runtime. CommandLineToArgvW() splits `"a""b" c` differently, and the narrow vector is
+// split after a conversion that turns U+FF02 into a quotation mark.
 int wmain(int argc, wchar_t** argv) {
     try {
         std::vector<std::string> words;
+        words.reserve(static_cast<std::size_t>(argc));
         for (int i = 0; i < argc; ++i) {
             words.push_back(kz7::textFromWide(argv[i]));
         }
         std::vector<char*> vector;
+        vector.reserve(words.size() + 1);
         for (std::string& word : words) {
             vector.push_back(word.data());
         }

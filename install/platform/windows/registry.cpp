@@ -19,7 +19,7 @@ extern "C" NTSTATUS NTAPI NtCreateKey(HANDLE* key, ACCESS_MASK access, OBJECT_AT
 namespace kz7 {
 namespace {
 
-// A key that was opened as a link is.
+// Whether an open key is a link; it was opened with REG_OPTION_OPEN_LINK.
 bool isLink(HKEY key) {
     DWORD type = 0;
     return RegQueryValueExW(key, L"SymbolicLinkValue", nullptr, &type, nullptr, nullptr) == ERROR_SUCCESS &&
@@ -30,7 +30,7 @@ bool isRoot(KeyHandle key) {
     return key == KeyHandle::currentUser || key == KeyHandle::localMachine || key == KeyHandle::users;
 }
 
-// Handles have 32 significant bits, which the system extends by their sign; so are the roots.
+// Handles have 32 significant bits and are sign-extended to 64, like the predefined roots.
 HKEY native(KeyHandle key) {
     return static_cast<HKEY>(LongToHandle(static_cast<LONG>(key)));
 }
@@ -46,11 +46,11 @@ Status statusOf(LSTATUS result) {
 constexpr AccessMask kLinkBits = kKeyOpenLink | kKeyRefuseLink;
 constexpr AccessMask kViewBits = kKeyView64 | kKeyView32;
 
-// A call makes 32 keys at most; a path of so many names, or bytes, goes to the call in pieces.
+// One call creates at most 32 keys. Longer paths are passed in pieces.
 constexpr std::size_t kCallNames = 32;
 constexpr std::size_t kCallBytes = 1024;
 
-// The last separator that leaves a path short enough for a call; 0 where all of it is, or no separator does.
+// The separator before which a path fits a call; 0 if all of it fits, or if none does.
 std::size_t placeForCall(std::string_view path) {
     std::size_t cut = 0;
     std::size_t names = 0;
@@ -66,7 +66,7 @@ std::size_t placeForCall(std::string_view path) {
     return 0;
 }
 
-// Where a path is cut before a call; 0 where it is not.
+// The separator at which a path is cut for a call; 0 if it is passed whole.
 std::size_t cutOf(std::string_view path, bool lastNameAlone) {
     const std::size_t cut = placeForCall(path);
     const std::size_t last = cut != 0 || !lastNameAlone ? std::string_view::npos : path.find_last_of('\\');
@@ -78,8 +78,8 @@ UNICODE_STRING unicodeString(WideText& text) {
     return {bytes, static_cast<USHORT>(bytes + sizeof(wchar_t)), text.data()};
 }
 
-// Creates a key below another, or opens it. A link of that name is opened itself: RegCreateKeyEx() would follow one
-// that another program puts there at the last moment.
+// Creates a key below another, or opens an existing one. A link of that name is opened itself: RegCreateKeyEx() would
+// follow a link that another program creates after a check.
 LSTATUS createBelow(HKEY parent, WideText name, WideText keyClass, AccessMask access, HKEY& key) {
     UNICODE_STRING named = unicodeString(name);
     UNICODE_STRING classed = unicodeString(keyClass);
@@ -92,7 +92,7 @@ LSTATUS createBelow(HKEY parent, WideText name, WideText keyClass, AccessMask ac
     return static_cast<LSTATUS>(RtlNtStatusToDosError(status));
 }
 
-// Texts are UTF-16 there, names and data of the text types alike.
+// Names and the data of text types are UTF-16 in the registry.
 class WindowsRegistry final : public IRegistryStore {
 public:
     explicit WindowsRegistry(ChangeLock& lock) : lock_(lock) {}
@@ -149,7 +149,7 @@ public:
             bytes.assign(reinterpret_cast<const char*>(text.data()), text.size() * sizeof(char16_t));
         }
         const auto size = static_cast<DWORD>(bytes.size());
-        // The call stores a NUL that it finds behind a text without one: here it finds none.
+        // RegSetValueEx() also stores a NUL that follows a text without one. These bytes keep it from finding one.
         bytes += "\1\1";
         return statusOf(RegSetValueExW(native(key), WideText(name).c_str(), 0, static_cast<DWORD>(type),
                                        reinterpret_cast<const BYTE*>(bytes.data()), size));
@@ -210,7 +210,7 @@ public:
         return status == kSuccess ? RtlNtStatusToDosError(NtDeleteKey(native(key.get()))) : status;
     }
 
-    // Every call is seen by others at once: nothing is left to be done but to let them have their turn.
+    // Every change is visible at once; only the lock is released.
     Status commit() override { return lock_.release(); }
 
 private:
@@ -224,8 +224,8 @@ private:
         return kSuccess;
     }
 
-    // Opens the first names of a path that is too long for one call, or of one whose last name must be no link, so that
-    // a call gets the rest of it below `parent`. `base` owns that key.
+    // Opens the first part of a path that is too long for one call, or all but its last name if that must not be a
+    // link. `parent` and `path` become the key and the rest; `base` owns the key.
     Status shorten(KeyHandle& parent, std::string_view& path, AccessMask access, bool create, OwnedKey& base) {
         Status status = lock_.hold();
         if (status == kSuccess) {
@@ -248,7 +248,7 @@ private:
         return status;
     }
 
-    // Reads data into a buffer of its own, whatever the size of the lent one: only all of a text has a size in UTF-8.
+    // Reads data into a buffer of its own: the size of a text in UTF-8 is known only from all of it.
     template <typename Call>
     Status readData(Call call, DWORD& size) {
         for (;;) {
@@ -261,7 +261,7 @@ private:
         }
     }
 
-    // Half a unit at the end of a text is left out.
+    // Drops half a unit at the end of a text.
     Status giveValue(ValueType found, std::uint32_t size, ValueType* type, Buffer& data) {
         const std::string_view bytes(reinterpret_cast<const char*>(room_.data()), size);
         const Status status = giveData(

@@ -12,9 +12,9 @@ SC_HANDLE native(ServiceHandle handle) {
     return reinterpret_cast<SC_HANDLE>(static_cast<std::uint64_t>(handle));
 }
 
-constexpr DWORD kPoll = 20;  // milliseconds between two looks at what is waited for
+constexpr DWORD kPoll = 20;  // milliseconds between two queries of a wait
 
-// The status of a call that gives a handle.
+// The handle of a call, or the error if it returned none.
 Status opened(SC_HANDLE made, ServiceHandle& handle) {
     if (made == nullptr) {
         return GetLastError();

@@ -48,7 +48,7 @@ public:
         constexpr int kAttempts = 50;
         constexpr DWORD kInterval = 20;  // milliseconds
         ended_ = true;
-        // The reader may not wait yet at the first attempt.
+        // At the first attempt the reader may not be waiting yet.
         for (int attempt = 0; attempt < kAttempts && reader_ != 0; ++attempt) {
             if (const HANDLE reader = OpenThread(THREAD_TERMINATE, FALSE, reader_); reader != nullptr) {
                 CancelSynchronousIo(reader);
@@ -68,7 +68,7 @@ public:
     }
 
     TerminalView look(TerminalStream stream) override {
-        // The streams' own handles: a standard-handle slot may name something else by now.
+        // The handles of the C streams: a standard-handle slot may have been changed.
         std::FILE* const file = stream == TerminalStream::input    ? stdin
                                 : stream == TerminalStream::output ? stdout
                                                                    : stderr;

@@ -1,4 +1,4 @@
-// Texts of the ports as the system's W calls take and give them.
+// Conversions between the UTF-8 of the ports and the UTF-16 of the W calls.
 #pragma once
 
 #include <algorithm>
@@ -19,7 +19,7 @@ inline std::string textFromWide(std::wstring_view wide) {
     return textFromUtf16(utf16View(wide));
 }
 
-// A text for the time of a call; it ends at its first NUL for calls that take no size.
+// A text as the argument of a W call. A call without a size parameter sees it up to its first NUL.
 class WideText {
 public:
     explicit WideText(std::string_view text) : text_(utf16FromText(text)) {}
@@ -32,8 +32,8 @@ private:
     std::u16string text_;
 };
 
-// The text of a call that fills a buffer: it returns the length without the NUL, or the room that it needs, as most of
-// the system's calls do; 0 is a failure. Empty on failure.
+// The text of a call that fills a buffer and returns the length without the NUL, the size needed, or 0 on failure.
+// Empty on failure.
 template <typename Call>
 std::string textOf(Call call) {
     std::wstring room(260, L'\0');

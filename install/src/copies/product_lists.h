@@ -5,8 +5,8 @@
 #include <utility>
 
 #include "install/platform/registry_store.h"
+#include "install/src/copies/copy_list.h"
 #include "install/src/copies/ilist.h"
-#include "install/src/copies/install_copy_list.h"
 #include "install/src/registry/copy_name.h"
 
 namespace kz7 {

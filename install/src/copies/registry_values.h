@@ -30,7 +30,7 @@ public:
 
     bool isHeard() { return debug_.isHeard(); }
 
-    // Writes a message to the debugger output, if anybody reads it.
+    // Writes a message to the debugger output if anybody reads it.
     void tell(std::string_view pattern, std::initializer_list<Insert> inserts = {}) {
         if (isHeard()) {
             debug_.write(compose(pattern, inserts));

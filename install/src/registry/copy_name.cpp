@@ -14,7 +14,7 @@ constexpr std::string_view kDefaultName = "$DefaultInstallationName$";
 // an earlier result.
 FixedText<kSubstitutedSize> sharedOutput;
 
-// Whether a byte is none that a character begins with.
+// Whether a byte continues a UTF-8 character.
 bool isWithinCharacter(char c) {
     return (static_cast<unsigned char>(c) & 0xC0) == 0x80;
 }

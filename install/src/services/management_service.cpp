@@ -5,7 +5,7 @@
 namespace kz7 {
 namespace {
 
-constexpr std::uint32_t kServiceWait = 30'000;  // milliseconds that one which ends or is being deleted gets
+constexpr std::uint32_t kServiceWait = 30'000;  // milliseconds to wait for a service that stops or is being deleted
 
 // clang-format off
 constexpr ErrorText kServiceManagerFailed  {1510, "Failed open the SCM - error code %d\n"};
@@ -28,7 +28,7 @@ constexpr std::string_view kEventLogKey =
 
 using FilePath = FixedText<261>;
 
-// Deliberate: a location that ends in a backslash gets a second one; the stored paths have always had it.
+// Deliberate: a location that ends in a backslash gets a second one; stored paths have always had it.
 FilePath binPath(std::string_view location, std::string_view file) {
     FilePath path(location);
     path.append("\\bin\\");
@@ -47,7 +47,7 @@ Status createService(IServiceManager& services, Report& report, std::string_view
     const FixedText<1024> displayName(compose("KZ7 Management Service (%s)", {copyName}));
     const FilePath program = binPath(location, "kz7mgmtsvc.exe");
     OwnedService service(services);
-    // One that was just removed may still be ending.
+    // A service that was just removed may still be stopping.
     const ServiceDefinition definition{.name = name.view(),
                                        .displayName = displayName.view(),
                                        .programPath = program.view(),
@@ -80,7 +80,7 @@ Status registerEventSource(IRegistryStore& registry, Report& report, std::string
     return status;
 }
 
-// Opens the service to change it and sets its start type; that step alone is reported and passed over.
+// Opens the service to change it and sets its start type. A failure of the second step is reported and ignored.
 Status openWithStartType(IServiceManager& services, Report& report, std::string_view name, ServiceStart start,
                          OwnedService& service) {
     OwnedService manager(services);
@@ -95,8 +95,8 @@ Status openWithStartType(IServiceManager& services, Report& report, std::string_
     } else if (const Status changed = services.changeStartType(service.get(), start); !succeeded(changed)) {
         report.error(kStartTypeFailed, {name, changed});
     }
-    // Deliberate: the handles of a start or a switch-off stay open to the end of the process, which holds off
-    // a deletion of the service meanwhile.
+    // Deliberate: the handles of a start or a switch-off remain open until the process ends, so that the service cannot
+    // be deleted meanwhile.
     manager.leaveOpen();
     return status;
 }
@@ -127,7 +127,7 @@ ServiceName managementServiceName(std::string_view copyName) {
 Status registerManagementService(IRegistryStore& registry, IServiceManager& services, Report& report,
                                  std::string_view location, std::string_view copyName, bool start) {
     Status status = createService(services, report, location, copyName);
-    // Deliberate: an existing service is left as it is, its event source and start included; a re-run does
+    // Deliberate: an existing service is not changed, and neither are its event source and its state; another run does
     // not repair it.
     if (status == kServiceExists) {
         return kSuccess;
@@ -149,8 +149,8 @@ void switchOffService(IServiceManager& services, Report& report, std::string_vie
     if (!succeeded(openWithStartType(services, report, name, ServiceStart::demand, service))) {
         return;
     }
-    // Deliberate: the platform's result of the stop is judged inverted; a stop that succeeds is told as
-    // error 1, one that fails not at all. Logs of every switch-off so far read that way.
+    // Deliberate: the result of the stop is inverted: a stop that succeeds is reported as error 1, one that fails is
+    // not reported. All existing logs have it so.
     if (succeeded(services.stopService(service.get()))) {
         report.error(kStopFailed, {name, std::uint32_t{1}});
     }
@@ -167,8 +167,7 @@ Status deleteServiceByName(IServiceManager& services, std::string_view name) {
     if (!succeeded(status)) {
         return status == kServiceDoesNotExist ? kSuccess : status;
     }
-    // While it runs on, it could not be created again. One that does not run, or will not stop, is deleted all the
-    // same.
+    // A service that still runs could not be created again. It is deleted even if it does not run or cannot be stopped.
     const Status stopped = services.stopService(service.get());
     if (stopped == kSuccess || stopped == kServiceTakesNoControl) {
         services.waitForStop(service.get(), kServiceWait);

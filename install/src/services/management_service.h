@@ -14,15 +14,15 @@ using ServiceName = FixedText<1024>;
 
 ServiceName managementServiceName(std::string_view copyName);
 
-// Creates the copy's service and the event-log source, and starts the service where asked. A service that
-// exists ends the work with 0 and nothing more. Every failure is reported once and returned.
+// Creates the copy's service and the event-log source, and with `start` starts the service. Succeeds at once if the
+// service exists. Every failure is reported once and returned.
 Status registerManagementService(IRegistryStore& registry, IServiceManager& services, Report& report,
                                  std::string_view location, std::string_view copyName, bool start);
 
-// Sets a service to start on demand only and stops it. What fails is reported.
+// Sets a service to start on demand only and stops it. Failures are reported.
 void switchOffService(IServiceManager& services, Report& report, std::string_view name);
 
-// Stops a service that runs and deletes it; one that is missing is no failure.
+// Stops a service that runs and deletes it; succeeds if the service does not exist.
 Status deleteServiceByName(IServiceManager& services, std::string_view name);
 
 }  // namespace kz7

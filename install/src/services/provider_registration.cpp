@@ -7,12 +7,12 @@
 #include "install/platform/encoding.h"
 #include "install/platform/text.h"
 #include "install/runtime/install_process.h"
-#include "install/src/copies/install_copies_profile.h"
+#include "install/src/copies/alias_rewrite.h"
 
 namespace kz7 {
 namespace {
 
-// The product library's record of its level.
+// The record that the product library fills with its level.
 struct sqleLevelInfo {
     char level[256];
 };
@@ -50,14 +50,14 @@ constexpr std::string_view kCacheTool           = "%s\\bin\\kz7nmpgac32.exe";
 constexpr std::string_view kCacheToolRoot       = "%sbin\\kz7nmpgac32.exe";
 constexpr std::string_view kCacheToolRun        = "%s -i \"%s\" ";
 constexpr std::string_view kConfiguration       = "%s\\bin\\%s -register -level %s -kz7path %s";
-// Deliberate: the line feed is part of the command, before what is appended to it; the programs take it so.
+// Deliberate: the line feed is part of the command, before the text that is appended; the programs expect it.
 constexpr std::string_view kConfigurationRoot   = "%sbin\\%s -register -level %s -kz7path %s\n";
 // clang-format on
 
 using FilePath = FixedText<261>;
 using Command = FixedText<1001>;
 
-// From the third component on, the two characters that stand for the build are left out; no dot ends the text.
+// From the third component on, the two characters of the build are left out; the text does not end in a dot.
 std::string shortenedLevel(std::string_view dotted) {
     std::string level;
     for (int component = 1;; ++component) {
@@ -89,7 +89,7 @@ bool askLevel(LevelEntry entry, std::string& level) {
         return false;
     }
     text.remove_prefix(kLevelPrefix.size());
-    // The library is a program of its own, in the narrow encoding.
+    // The library is foreign code and expects the narrow encoding.
     level = shortenedLevel(textFromNarrow(text));
     return true;
 }
@@ -139,7 +139,7 @@ public:
     }
 
 private:
-    // This and configure() return the status of the commit before their program: after a failed one nothing is
+    // This and configure() return the status of the commit before their program. After a failed commit nothing is
     // started or printed.
     Status runCacheTool() {
         const Command tool(compose(atRoot_ ? kCacheToolRoot : kCacheTool, {location_}));
@@ -149,7 +149,7 @@ private:
         if (const Status committed = ports_.registry.commit(); !succeeded(committed)) {
             return committed;
         }
-        std::uint32_t exitCode = 0;  // not judged
+        std::uint32_t exitCode = 0;  // ignored
         const Status status = runProgram(Command(compose(kCacheToolRun, {tool.view(), location_})), exitCode);
         if (!succeeded(status)) {
             report_.error(kCacheToolFailed, {status});
@@ -170,13 +170,13 @@ private:
         if (!succeeded(status)) {
             report_.error(program.failed, {status});
         } else if (exitCode != 0) {
-            // Deliberate: what the program wrote is not shown; its error line has always stood alone.
+            // Deliberate: the program's output is not shown; the error has always been a single line.
             report_.error(program.refused, {exitCode});
         }
         return kSuccess;
     }
 
-    // Runs a program to its end. The flush puts its lines after those printed so far.
+    // Runs a program to its end. The flush puts its output after the lines printed so far.
     Status runProgram(const Command& command, std::uint32_t& exitCode) {
         report_.console().flush();
         QuietSink sink;
@@ -195,8 +195,7 @@ private:
 }  // namespace
 
 void queryLevel(ILibraryLoader& libraries, Report& report, std::string_view location, std::string& level) {
-    // Deliberate: no level stands in for one that cannot be had, not the product's own either; the commands
-    // then carry an empty one.
+    // Deliberate: if the level cannot be read, the commands have an empty level, not the product's own.
     if (!readLevel(libraries, report, location, level)) {
         report.error(kNoLevel);
     }

@@ -1,6 +1,5 @@
-// Registers the .NET data providers of an install location: older ones of its level out, its own into the
-// assembly cache, the product's configuration programs for both frameworks run, and last the version aliases
-// rewritten.
+// Registers the .NET data providers of an install location: removes older ones of its level, adds its own to the
+// assembly cache, runs the product's configuration programs for both frameworks and rewrites the version aliases.
 #pragma once
 
 #include <string>
@@ -28,8 +27,8 @@ struct ProviderPorts {
     Report& report;
 };
 
-// Asks the product library of a location for its level, a dotted text such as "9.1.0.0", and tells it. On a
-// failure, which is reported, `level` stays as it was passed in.
+// Queries the product library of a location for its level, a dotted text such as "9.1.0.0", and prints it. A failure is
+// reported and leaves `level` unchanged.
 void queryLevel(ILibraryLoader& libraries, Report& report, std::string_view location, std::string& level);
 
 // Returns the result of the alias rewrite; failures before it are only reported. Commits before each program is

@@ -1,4 +1,4 @@
-#include "install/src/copies/install_copies_profile.h"
+#include "install/src/copies/alias_rewrite.h"
 
 #include <algorithm>
 #include <cstring>
@@ -224,7 +224,7 @@ Status InstallCopiesProfile::deleteAliases(std::string_view path, bool& allDelet
     return kSuccess;
 }
 
-// Somebody else may have deleted an alias since it was listed.
+// Another program may have deleted an alias since it was listed.
 bool InstallCopiesProfile::isGone(std::string_view path, std::string_view name) {
     IRegistryStore& registry = values_.registry();
     OwnedKey key(registry);

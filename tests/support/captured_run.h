@@ -1,4 +1,4 @@
-// A command run with its output captured, and what came of it as one text.
+// A command with its output captured, and its results as one text.
 #pragma once
 
 #include <string>
@@ -8,7 +8,7 @@
 
 namespace kz7::test {
 
-// Keeps what is said, a line each, and the texts that were posted last.
+// Records the messages, a line each, and the texts that were posted last.
 class ListedSink final : public IReportSink {
 public:
     void trace(std::uint32_t code, std::string_view function, std::uint32_t probe, Status value,
@@ -28,7 +28,7 @@ public:
     std::string standardError;
 };
 
-// Waits: "status code output|error", without the bar where nothing came on standard error.
+// Waits for the end: "status code output|error", without the bar if standard error is empty.
 inline std::string ending(InstallProcess& process, ListedSink& sink, std::uint32_t timeout = kInfiniteWait) {
     std::uint32_t code = 77;
     const Status status = process.waitForCompletion(code, timeout);

@@ -1,4 +1,4 @@
-#include "install/src/copies/install_copy_list.h"
+#include "install/src/copies/copy_list.h"
 
 #include <cstdlib>
 #include <cstring>

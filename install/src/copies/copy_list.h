@@ -28,7 +28,6 @@ public:
     std::string_view copyName() const { return copyName_.view(); }  // cut to 64 characters
     std::string_view installPath() const { return installPath_.view(); }
     std::string_view keyPath() const { return keyPath_.view(); }
-    bool isVersion8() const { return version8_; }
     bool isPerUser() const { return perUser_; }
     std::uint32_t status() const { return status_; }
     ILIST<char>& components() { return components_; }

@@ -1,4 +1,4 @@
-#include "install/src/copies/install_copies.h"
+#include "install/src/copies/copy_records.h"
 
 #include <algorithm>
 

@@ -9,7 +9,7 @@
 #include <string_view>
 #include <vector>
 
-#include "install/src/copies/install_copies.h"
+#include "install/src/copies/copy_records.h"
 
 namespace kz7 {
 
