@@ -46,7 +46,7 @@ constexpr std::array kOptions = {
 };
 // clang-format on
 
-// Null: the arguments, which begin with the program's name, are none of the options.
+// `arguments` begins with the program's name. Null: no option matches.
 const OptionRow* findOption(std::span<const char* const> arguments) {
     const auto* const row = std::find_if(kOptions.begin(), kOptions.end(), [&](const OptionRow& option) {
         return arguments.size() == option.arguments + 2 && equalsIgnoreCase(arguments[1], option.word);

@@ -338,7 +338,7 @@ private:
     std::map<KeyHandle, KeyName> open_;
 };
 
-// A service is the key of its record, whoever keeps it.
+// A service is recorded as the key of its record, which every service manager keeps in the same place.
 class RecordedPorts::Services final : public IServiceManager {
 public:
     Services(IServiceManager& real, ChangeRecorder& recorder) : real_(real), recorder_(recorder) {}
