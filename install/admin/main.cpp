@@ -17,9 +17,9 @@ constexpr const char* kFooter =
     "The usual state directory is $KZ7_STATE_DIR; else /var/lib/kz7 for root; else $XDG_STATE_HOME/kz7 or\n"
     "~/.local/state/kz7. On Windows the store is the registry of the machine.\n"
     "\n"
-    "Exit codes: 0 done; 1 no: not there, nothing to show, different, or something failed; 2 fault: a store, file, key\n"
-    "or output that cannot be used, or a wrong command line; 3 with --detailed-exitcode: done, and something changed.\n"
-    "front exits as its program does.\n";
+    "Exit codes: 0 done; 1 no: not there, nothing to show, different, or something failed; 2 fault: a store, file,\n"
+    "key or output that cannot be used, or a wrong command line; 3 with --detailed-exitcode: done, and something\n"
+    "changed. front exits as its program does.\n";
 
 // What help prints is output like any other.
 Answer showHelp(const CLI::App& program, const CLI::Success& help) {
