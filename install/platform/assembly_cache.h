@@ -25,8 +25,8 @@ public:
     virtual Status deregisterProviders(std::string_view level) = 0;
 
     // Adds the location's providers to the caches of `generations`, under `level` if the files do not carry one
-    // themselves. Succeeds if the location has no providers. On any other status some providers are missing in some generation,
-    // usually because the framework is not installed; the others are registered.
+    // themselves. Succeeds if the location has no providers. On any other status some providers are missing in some
+    // generation, usually because the framework is not installed; the others are registered.
     virtual Status registerProviders(std::string_view location, std::string_view level,
                                      FrameworkGenerations generations) = 0;
 };

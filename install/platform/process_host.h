@@ -41,7 +41,8 @@ struct ProcessInformation {
 };
 
 // Outputs are written on success only. kInvalidHandle: the null handle or one that is not open. `read`, `write`
-// and `closeStream` may be called from any thread, but each stream by one thread at a time; all other operations by one thread.
+// and `closeStream` may be called from any thread, but each stream by one thread at a time; all other operations by one
+// thread.
 class IProcessHost {
 public:
     virtual ~IProcessHost() = default;
@@ -67,8 +68,8 @@ public:
     virtual Status closeStream(StreamHandle stream) = 0;
 
     // Starts a program, hidden, with this process's environment and the streams; it inherits no other handle.
-    // A program path with blanks and without quotation marks is tried up to each blank in turn. kFileNotFound: no such program;
-    // also, where the host has no drives, one it cannot execute. kBadDirectory: no such working directory.
+    // A program path with blanks and without quotation marks is tried up to each blank in turn. kFileNotFound: no such
+    // program; also, where the host has no drives, one it cannot execute. kBadDirectory: no such working directory.
     virtual Status startProcess(const ProcessStart& start, ProcessInformation& started) = 0;
 
     // Waits for the program's end. kWaitTimedOut: it runs on.

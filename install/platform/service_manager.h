@@ -65,8 +65,8 @@ public:
 
     // kServiceExists: a service has that name. kInvalidName: an empty name, one over 255 characters or with
     // a slash of either kind. kServiceMarkedForDelete: a service of that name was deleted, but it still runs or a
-    // handle of it is still open at the end of `deletionWait`. kDuplicateServiceName: its display name is in use, on hosts
-    // that check it.
+    // handle of it is still open at the end of `deletionWait`. kDuplicateServiceName: its display name is in use, on
+    // hosts that check it.
     virtual Status createService(ServiceHandle manager, const ServiceDefinition& definition,
                                  ServiceHandle& service) = 0;
 

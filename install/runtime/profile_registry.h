@@ -15,7 +15,8 @@ class ProfileRegistry {
 public:
     ProfileRegistry(IRegistryStore& registry, std::string_view copyName);
 
-    // Sets a variable of a copy that has a key; the empty value removes it. kVariableNotThere: the variable to remove does not exist.
+    // Sets a variable of a copy that has a key; the empty value removes it. kVariableNotThere: the variable to remove
+    // does not exist.
     Status set(std::string_view instance, std::string_view variable, std::string_view value);
 
     // Commits: other programs, including ones that are started now, see the changes and can write.

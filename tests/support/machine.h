@@ -15,7 +15,7 @@
 
 namespace kz7::test {
 
-// The begin of an error line, up to its line number.
+// The beginning of an error line, up to its line number.
 inline const std::string kPrefix = "install\\src\\uselvlkz7reg.cpp:";
 
 // Nothing of it may be open at the end.

@@ -8,9 +8,9 @@ bool isLeading(char32_t character) {
     return character >= 0xD800 && character <= 0xDBFF;
 }
 
-// The size in bytes of the unpaired leading surrogates at the begin of the text; 0 if a trailing one or a byte follows,
-// which would form a pair with the last of them in UTF-16. `bytes` is then the size of those that must be encoded byte
-// by byte.
+// The size in bytes of the unpaired leading surrogates at the beginning of the text; 0 if a trailing one or a byte
+// follows, which would form a pair with the last of them in UTF-16. `bytes` is then the size of those that must be
+// encoded byte by byte.
 std::size_t leadingSurrogates(std::string_view text, std::size_t& bytes) {
     std::string_view rest = text;
     char32_t character = 0;
@@ -29,7 +29,7 @@ std::size_t leadingSurrogates(std::string_view text, std::size_t& bytes) {
 std::u16string utf16FromText(std::string_view text) {
     std::u16string utf16;
     utf16.reserve(text.size());
-    std::size_t surrogates = 0;  // bytes of leading surrogates at the begin of the rest
+    std::size_t surrogates = 0;  // bytes of leading surrogates at the beginning of the rest
     std::size_t bytes = 0;       // bytes that are encoded one by one
     while (!text.empty()) {
         std::string_view rest = text;
