@@ -22,7 +22,7 @@ linux=$(realpath "$1")
 windows=$(realpath "$2")
 folder=$(mktemp -d)
 finished=
-trap 'status=$?; [ -n "$finished" ] || echo "FAILED: status $status of: $BASH_COMMAND"; rm -rf "$folder"' EXIT
+trap 'status=$?; [ -n "$finished" ] || echo "FAILED: status $status of: $BASH_COMMAND" >&2; rm -rf "$folder"' EXIT
 export KZ7_STATE_DIR=$folder/state
 cd "$folder"
 
@@ -76,18 +76,18 @@ show() {
 }
 
 # What check mode foretells is what the run then changes: foretell KZ7ADMIN -- COMMAND, the run, compare_foretold KZ7ADMIN.
-product_lines() { tr -d '\r' | grep -E '^[-+~] (service |.*\\(NVQ\\KZ7|KZ7 Management Service))' || true; }
+product_lines() { tr -d '\r' | grep -aE '^[-+~] (service |.*\\(NVQ\\KZ7|KZ7 Management Service))' || true; }
 foretell() {
     [ "$program" = kz7InstallReg ] || return 0
     local admin=()
     while [ "$1" != -- ]; do admin+=("$1"); shift; done
     "${admin[@]}" export >before.reg 2>/dev/null || true
     [ -s before.reg ] || echo 'Windows Registry Editor Version 5.00' >before.reg
-    "${admin[@]}" apply --check --diff "$@" 2>/dev/null | product_lines >foretold
+    { "${admin[@]}" apply --check --diff "$@" 2>/dev/null || true; } | product_lines >foretold
 }
 compare_foretold() {
     [ "$program" = kz7InstallReg ] || return 0
-    "$@" diff before.reg . 2>/dev/null | product_lines >changed
+    { "$@" diff before.reg . 2>/dev/null || true; } | product_lines >changed
     if ! diff -u foretold changed >difference; then
         echo 'FAILED: check mode foretold something else than'
         cat difference
@@ -228,6 +228,21 @@ if [ "$page" -eq 932 ]; then
 fi
 
 [ "$page" -eq 1252 ] || finish
+
+# Wanted state and restore.
+echo '{"copies": [{"name": "A", "location": "C:\\a"}, {"name": "Zoë", "location": "C:\\Straße"}]}' >copies.json
+echo '{"copies": [{"name": "a", "location": "C:\\b"}, {"name": "Zoë", "state": "absent"}]}' >others.json
+same 'a copy for the export'                 -addKZ7Copy FIRST 'C:\KZ7\first'
+"$linux/kz7admin" export >wanted.reg 2>/dev/null
+program=kz7admin
+same 'copies of a list'                      ensure --from copies.json
+same 'nothing to do'                         ensure --from copies.json --detailed-exitcode
+same 'another list, with its service'        ensure --from others.json --services --detailed-exitcode
+same 'what the list leaves out'              ensure --from others.json --prune
+same 'no last copy'                          ensure --from /dev/null --prune
+same 'back to the export'                    restore wanted.reg --detailed-exitcode
+same 'it is there'                           restore wanted.reg --detailed-exitcode
+program=kz7InstallReg
 
 # Two at once, on Windows only, where no transaction keeps them apart: they leave what one after the other would have.
 tool() { wine "$windows/kz7InstallReg.exe" "$@" >/dev/null 2>&1 || true; }

@@ -61,6 +61,7 @@ void readInto(MSIHANDLE installation, const std::vector<std::string>& names, std
         std::uint32_t size = room;
         const std::uint32_t status = read(installation, name.c_str(), value.data(), &size);
         line += (line.empty() ? "" : ", ") + name + " " + std::to_string(size);
+        // NOLINTNEXTLINE(readability-redundant-string-cstr): the value ends at its NUL.
         line += status == 0 ? std::string(" '") + value.c_str() + "'" : " status " + std::to_string(status);
     }
 }

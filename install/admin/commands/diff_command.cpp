@@ -40,7 +40,10 @@ Answer diff(Admin& admin, const DiffOptions& options) {
     Snapshot old;
     Snapshot now;
     for (const auto& [source, snapshot] : {std::pair(&before, &old), {&after, &now}}) {
-        if (const Answer read = source->read(options.key, wholeServices, *snapshot); read != kAnswerYes) {
+        // Of a machine's registry only the product's keys can be compared with something.
+        const Answer read = options.key.empty() && !wholeServices ? source->readProduct(wholeServices, *snapshot)
+                                                                  : source->read(options.key, wholeServices, *snapshot);
+        if (read != kAnswerYes) {
             return read;
         }
     }

@@ -430,7 +430,12 @@ Status readSnapshot(IRegistryStore& registry, bool wholeServices, const std::vec
             snapshot.push_back(record);
         } else if (record.name.ends_with(service)) {
             snapshot.push_back(record);
-            std::erase_if(snapshot.back().values, [](const KeyValue& value) { return !isServiceValue(value.name); });
+            auto& values = snapshot.back().values;
+            std::erase_if(values, [](const KeyValue& value) { return !isServiceValue(value.name); });
+            for (KeyValue& value : values) {
+                // The service manager chooses the type.
+                value.type = equalsIgnoreCase(value.name, "ImagePath") ? ValueType::expandSz : value.type;
+            }
         }
         return record.status;
     };
