@@ -54,14 +54,14 @@ private:
     }
 
     void addRow() {
-        const std::string key =
-            pick({"SOFTWARE\\NVQ\\KZ7", "SOFTWARE\\NVQ\\KZ7\\InstalledCopies", "SOFTWARE\\NVQ\\KZ7\\GLOBAL_PROFILE\\deep",
-                  "SOFTWARE\\NVQ\\KZ7\\Components", "SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies",
-                  "SOFTWARE\\NVQ\\KZ7BackupV8\\PROFILES", "SYSTEM\\CurrentControlSet\\Services\\KZ7MGMTSVC_A\\Parameters",
-                  "SYSTEM\\CurrentControlSet\\Services\\KZ7MGMTSVC"});
+        const std::string key = pick(
+            {"SOFTWARE\\NVQ\\KZ7", "SOFTWARE\\NVQ\\KZ7\\InstalledCopies", "SOFTWARE\\NVQ\\KZ7\\GLOBAL_PROFILE\\deep",
+             "SOFTWARE\\NVQ\\KZ7\\Components", "SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies",
+             "SOFTWARE\\NVQ\\KZ7BackupV8\\PROFILES", "SYSTEM\\CurrentControlSet\\Services\\KZ7MGMTSVC_A\\Parameters",
+             "SYSTEM\\CurrentControlSet\\Services\\KZ7MGMTSVC"});
         make(key, pick({"", "a class"}));
         setRaw(key, pick({"", "9", "9.7", "10.1", "Version", "MULTI_VERSION_SUPPORT", "kz7 path name"}),
-               pick({std::string(), std::string("B", 2), std::string("text"), std::string("\0\xff", 2)}),
+               pick({std::string(), std::string("B\0", 2), std::string("text"), std::string("\0\xff", 2)}),
                pick<ValueType>({ValueType::sz, ValueType::binary, ValueType::dword}));
     }
 

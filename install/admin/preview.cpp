@@ -84,29 +84,30 @@ Status Preview::fill(std::string& key) {
     return status;
 }
 
-Status Preview::fill(const std::vector<KeyChange>& changes, std::string& key) {
+Status Preview::copyTouched(const KeyChange& change, std::string& key) {
     IRegistryStore& live = machine_.registry();
+    key = fullKeyName(change.name);
+    Status status = copyParents(change.name);
+    KeyStart start;
+    status = status == kSuccess ? findKey(live, change.name, start) : status;
+    if (status != kSuccess) {
+        return isNotFound(status) ? kSuccess : status;
+    }
+    Snapshot tree;
+    status = walkKeys(live, start, [&](const KeyRecord& record) {
+        key = record.name;
+        tree.push_back(record);
+        return record.status != kSuccess || change.remove ? record.status : kNoMoreItems;
+    });
+    return status == kSuccess || isEndOfItems(status) ? copyKeys(tree) : status;
+}
+
+Status Preview::fill(const std::vector<KeyChange>& changes, std::string& key) {
     Status status = kSuccess;
     for (auto change = changes.begin(); status == kSuccess && change != changes.end(); ++change) {
-        key = fullKeyName(change->name);
-        status = copyParents(change->name);
-        KeyStart start;
-        const Status found = status == kSuccess ? findKey(live, change->name, start) : status;
-        if (found != kSuccess) {
-            status = isNotFound(found) ? kSuccess : found;
-            continue;
-        }
-        Snapshot tree;
-        const auto keep = [&](const KeyRecord& record) {
-            key = record.name;
-            tree.push_back(record);
-            return record.status != kSuccess || change->remove ? record.status : kNoMoreItems;
-        };
-        status = walkKeys(live, start, keep);
-        status = isEndOfItems(status) ? kSuccess : status;
-        status = status == kSuccess ? copyKeys(tree) : status;
+        status = copyTouched(*change, key);
     }
-    live.commit();
+    machine_.registry().commit();
     return status;
 }
 

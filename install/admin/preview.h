@@ -40,6 +40,7 @@ private:
     Ports memoryPorts(bool asksLevel);
     Status copyParents(const KeyName& name);
     Status copyKeys(const Snapshot& keys);
+    Status copyTouched(const KeyChange& change, std::string& key);
 
     IPlatform& machine_;
     MemoryRegistry registry_;

@@ -51,21 +51,21 @@ public:
         if (!document.is_object()) {
             return fail("document", "is not an object");
         }
-        for (const auto& [field, value] : document.items()) {
-            if (field == "schema" ? value != 1 : field != "copies" && field != "$schema") {
-                return fail(field, field == "schema" ? "is not 1" : "is an unknown field");
-            }
+        if (!fields(document, "", {"copies", "schema", "$schema"})) {
+            return false;
+        }
+        if (document.value("schema", json(1)) != 1) {
+            return fail("schema", "is not 1");
         }
         const auto list = document.find("copies");
         if (list == document.end() || !list->is_array()) {
             return fail("copies", list == document.end() ? "is missing" : "is not an array");
         }
-        for (std::size_t index = 0; index < list->size(); ++index) {
-            if (!copy((*list)[index], compose("copies[%u]", {static_cast<std::uint32_t>(index)}))) {
-                return false;
-            }
+        bool isGood = true;
+        for (std::size_t index = 0; isGood && index < list->size(); ++index) {
+            isGood = copy((*list)[index], compose("copies[%u]", {static_cast<std::uint32_t>(index)}));
         }
-        return true;
+        return isGood;
     }
 
 private:
@@ -77,46 +77,54 @@ private:
     bool text(const json& copy, const std::string& path, const char* field, std::string& text) {
         const auto found = copy.find(field);
         if (found != copy.end() && !found->is_string()) {
-            return fail(path + '.' + field, "is not a string");
+            return fail(compose("%s.%s", {path, std::string_view(field)}), "is not a string");
         }
         text = found == copy.end() ? std::string{} : found->get<std::string>();
         return true;
     }
 
+    bool fields(const json& object, const std::string& path, std::initializer_list<std::string_view> known) {
+        for (const auto& [field, value] : object.items()) {
+            if (std::find(known.begin(), known.end(), field) == known.end()) {
+                return fail(path + field, "is an unknown field");
+            }
+        }
+        return true;
+    }
+
     bool copy(const json& copy, const std::string& path) {
+        WantedCopy wanted;
+        std::string state;
         if (!copy.is_object()) {
             return fail(path, "is not an object");
         }
-        for (const auto& [field, value] : copy.items()) {
-            if (field != "name" && field != "location" && field != "state") {
-                return fail(path + '.' + field, "is an unknown field");
-            }
-        }
-        WantedCopy wanted;
-        std::string state;
-        if (!text(copy, path, "name", wanted.name) || !text(copy, path, "location", wanted.location) ||
-            !text(copy, path, "state", state)) {
+        if (!fields(copy, path + '.', {"name", "location", "state"}) || !text(copy, path, "name", wanted.name) ||
+            !text(copy, path, "location", wanted.location) || !text(copy, path, "state", state)) {
             return false;
         }
-        if (!copy.contains("name")) {
-            return fail(path + ".name", "is missing");
+        wanted.isPresent = state != "absent";
+        if (!check(copy, path, wanted, state)) {
+            return false;
         }
-        if (const std::string_view fault = faultOfName(wanted.name); !fault.empty()) {
+        copies_.push_back(std::move(wanted));
+        return true;
+    }
+
+    bool check(const json& copy, const std::string& path, const WantedCopy& wanted, const std::string& state) {
+        std::string_view fault = copy.contains("name") ? faultOfName(wanted.name) : "is missing";
+        if (fault.empty() && !names_.insert(foldUpper(wanted.name)).second) {
+            fault = "is in the list twice";
+        }
+        if (!fault.empty()) {
             return fail(path + ".name", fault);
         }
         if (copy.contains("state") && state != "present" && state != "absent") {
             return fail(path + ".state", "is neither \"present\" nor \"absent\"");
         }
-        wanted.isPresent = state != "absent";
-        const std::string_view fault = wanted.isPresent ? faultOfLocation(wanted.location) : std::string_view{};
-        if (!fault.empty()) {
-            return fail(path + ".location", copy.contains("location") ? fault : "is missing");
+        if (wanted.isPresent) {
+            fault = copy.contains("location") ? faultOfLocation(wanted.location) : "is missing";
         }
-        if (!names_.insert(foldUpper(wanted.name)).second) {
-            return fail(path + ".name", "is in the list twice");
-        }
-        copies_.push_back(std::move(wanted));
-        return true;
+        return fault.empty() || fail(path + ".location", fault);
     }
 
     std::vector<WantedCopy>& copies_;

@@ -25,10 +25,7 @@ std::string diffJson(const ChangeSet& changes) {
     return json + "}\n";
 }
 
-Answer diff(Admin& admin, const DiffOptions& options) {
-    if (!admin.open(true)) {
-        return kAnswerFault;
-    }
+Answer readBoth(Admin& admin, const DiffOptions& options, Snapshot& old, Snapshot& now) {
     RegistrySource before(admin, options.before);
     RegistrySource after(admin, options.after);
     for (RegistrySource* const source : {&before, &after}) {
@@ -37,23 +34,37 @@ Answer diff(Admin& admin, const DiffOptions& options) {
         }
     }
     const bool wholeServices = before.isOwn() && after.isOwn();
-    Snapshot old;
-    Snapshot now;
+    // Of a machine's registry only the product's keys can be compared with something.
+    const bool isProduct = options.key.empty() && !wholeServices;
     for (const auto& [source, snapshot] : {std::pair(&before, &old), {&after, &now}}) {
-        // Of a machine's registry only the product's keys can be compared with something.
-        const Answer read = options.key.empty() && !wholeServices ? source->readProduct(wholeServices, *snapshot)
-                                                                  : source->read(options.key, wholeServices, *snapshot);
+        const Answer read = isProduct ? source->readProduct(wholeServices, *snapshot)
+                                      : source->read(options.key, wholeServices, *snapshot);
         if (read != kAnswerYes) {
             return read;
         }
     }
+    return kAnswerYes;
+}
+
+Answer diff(Admin& admin, const DiffOptions& options) {
+    if (!admin.open(true)) {
+        return kAnswerFault;
+    }
+    Snapshot old;
+    Snapshot now;
+    if (const Answer read = readBoth(admin, options, old, now); read != kAnswerYes) {
+        return read;
+    }
     const ChangeSet changes = difference(old, now);
-    const Admin::Form form = options.json || options.reg ? Admin::Form::document : Admin::Form::text;
-    const Answer written = admin.write(options.json   ? diffJson(changes)
-                                       : options.reg  ? regTextHeader() + changeRegText(changes)
-                                       : options.stat ? changeSummary(changes, "differ") + '\n'
-                                                      : changeText(changes, admin.output().colours),
-                                       form);
+    std::string text;
+    if (options.json) {
+        text = diffJson(changes);
+    } else if (options.reg) {
+        text = regTextHeader() + changeRegText(changes);
+    } else {
+        text = options.stat ? changeSummary(changes, "differ") + '\n' : changeText(changes, admin.output().colours);
+    }
+    const Answer written = admin.write(text, options.json || options.reg ? Admin::Form::document : Admin::Form::text);
     return written != kAnswerYes || changes.empty() ? written : kAnswerNo;
 }
 

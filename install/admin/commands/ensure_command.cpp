@@ -40,37 +40,15 @@ public:
     // Empty, or why nothing may be removed; checked before anything is changed.
     std::string plan(const std::vector<WantedCopy>& wanted) {
         InstallCopyList list(*ports_.registry, *ports_.debugOutput, false, false);
-        std::set<std::string> left;  // folded
-        for (const InstallCopy* copy = list.first(); copy != nullptr; copy = list.next()) {
-            left.insert(foldUpper(copy->name()));
-        }
-        const auto remove = [&](const std::string& name) {
-            if (left.erase(foldUpper(name)) != 0) {
-                removals_.push_back(name);
-            }
-        };
-        std::set<std::string> named;
-        for (const WantedCopy& copy : wanted) {
-            named.insert(foldUpper(copy.name));
-            if (!copy.isPresent) {
-                remove(copy.name);
-            } else {
-                left.insert(foldUpper(copy.name));
-            }
-        }
-        for (const InstallCopy* copy = list.first(); options_.prune && copy != nullptr; copy = list.next()) {
-            if (copy != list.version8Copy() && !named.contains(foldUpper(copy->name()))) {
-                remove(std::string(copy->name()));
-            }
-        }
+        const std::size_t left = findRemovals(list, wanted);
         if (!removals_.empty() && list.status() != 0) {
             return "cannot remove " + shownText(removals_.front()) + ": the list of copies cannot be read whole";
         }
-        const bool mayRemoveLast = options_.prune && options_.all;
-        return removals_.empty() || !left.empty() || mayRemoveLast
-                   ? std::string{}
-                   : "cannot remove " + shownText(removals_.back()) +
-                         ": the last copy takes the whole product along (--prune --all removes it)";
+        if (removals_.empty() || left != 0 || (options_.prune && options_.all)) {
+            return {};
+        }
+        return "cannot remove " + shownText(removals_.back()) +
+               ": the last copy takes the whole product along (--prune --all removes it)";
     }
 
     // Up to the first failure.
@@ -86,6 +64,25 @@ public:
     }
 
 private:
+    // Returns the number of copies that are left.
+    std::size_t findRemovals(InstallCopyList& list, const std::vector<WantedCopy>& wanted) {
+        std::set<std::string> present;  // folded
+        std::set<std::string> absent;
+        for (const WantedCopy& copy : wanted) {
+            (copy.isPresent ? present : absent).insert(foldUpper(copy.name));
+        }
+        for (const InstallCopy* copy = list.first(); copy != nullptr; copy = list.next()) {
+            const std::string fold = foldUpper(copy->name());
+            const bool isPruned = options_.prune && copy != list.version8Copy() && !present.contains(fold);
+            if (isPruned || absent.contains(fold)) {
+                removals_.emplace_back(copy->name());
+            } else {
+                present.insert(fold);
+            }
+        }
+        return present.size();
+    }
+
     Status makePresent(const WantedCopy& copy) {
         bool isInOrder = true;
         for (const std::string_view root : {layout::kCopy, layout::kCopy32}) {
@@ -108,23 +105,21 @@ private:
     Status compare(const std::string& root, const std::string& location, bool& isInOrder) {
         OwnedKey key(*ports_.registry);
         std::string open;
+        Status status = kSuccess;
         for (const LayoutRow& row : copyRows()) {
             const std::string path = row.key.empty() ? root : root + '\\' + std::string(row.key);
-            if (!key || path != open) {
-                const Status status =
-                    ports_.registry->openKey(KeyHandle::localMachine, path, kKeyQueryValue, key.receive());
-                if (status != kSuccess) {
-                    isInOrder = isInOrder && !isNotFound(status);
-                    return isNotFound(status) ? kSuccess : status;
-                }
+            if (path != open) {
                 open = path;
+                status = ports_.registry->openKey(KeyHandle::localMachine, path, kKeyQueryValue, key.receive());
             }
             std::optional<ValueState> state;
-            if (const Status status = reader_.value(key.get(), row.name, state); status != kSuccess) {
-                return status;
+            status = status == kSuccess ? reader_.value(key.get(), row.name, state) : status;
+            if (status != kSuccess) {
+                isInOrder = false;
+                return isNotFound(status) ? kSuccess : status;
             }
-            isInOrder =
-                isInOrder && state && (row.data != kLocation || *state == ValueState{ValueType::sz, location + '\0'});
+            const bool isWanted = row.data != kLocation || state == ValueState{ValueType::sz, location + '\0'};
+            isInOrder = isInOrder && state && isWanted;
         }
         return kSuccess;
     }

@@ -51,27 +51,31 @@ std::string shownLines(std::string_view text) {
     return shown;
 }
 
+Answer exportJson(Admin& admin, const std::string& key) {
+    std::string separator = "\n";
+    std::string head = "{\"store\":";
+    appendJsonText(admin.platform().storeName(), head);
+    return admin.showKeys(
+        key, head + ",\"keys\":[",
+        [&](const KeyRecord& record, std::string& json) {
+            if (!isBareRoot(record) || record.status != kSuccess) {
+                json += std::exchange(separator, ",\n");
+                appendJsonKey(record, json);
+            }
+        },
+        "]}\n", Admin::Reading::snapshot);
+}
+
 Answer exportKeys(Admin& admin, const ExportOptions& options) {
     if (!admin.open(true)) {
         return kAnswerFault;
     }
+    if (options.json) {
+        return exportJson(admin, options.key);
+    }
     const bool isTerminal = admin.output().terminal;
     if (isTerminal && options.utf16) {
         return admin.fault("cannot write UTF-16: standard output: is a terminal (redirect it to a file)");
-    }
-    std::string separator = "\n";
-    if (options.json) {
-        std::string head = "{\"store\":";
-        appendJsonText(admin.platform().storeName(), head);
-        return admin.showKeys(
-            options.key, head + ",\"keys\":[",
-            [&](const KeyRecord& key, std::string& json) {
-                if (!isBareRoot(key) || key.status != kSuccess) {
-                    json += std::exchange(separator, ",\n");
-                    appendJsonKey(key, json);
-                }
-            },
-            "]}\n", Admin::Reading::snapshot);
     }
     std::string head = regTextHeader();
     return admin.showKeys(

@@ -107,6 +107,29 @@ std::string counted(std::size_t count, std::string_view what) {
     return compose("%u %s%s", {static_cast<std::uint32_t>(count), what, count == 1 ? "" : "s"});
 }
 
+// The removal of a key takes everything below it along.
+class RemovedTrees {
+public:
+    explicit RemovedTrees(const ChangeSet& changes) {
+        for (const Change& change : changes) {
+            if (change.kind == Change::Kind::keyRemoved) {
+                keys_.insert(foldUpper(change.key));
+            }
+        }
+    }
+
+    // Whether the removal of another key makes the change.
+    bool takeAlong(const Change& change) const {
+        if (change.kind == Change::Kind::keyRemoved) {
+            return keys_.contains(foldUpper(change.key.substr(0, change.key.find_last_of('\\'))));
+        }
+        return !change.isKey() && !change.after && keys_.contains(foldUpper(change.key));
+    }
+
+private:
+    std::set<std::string> keys_;  // folded
+};
+
 void appendState(std::string_view field, const std::optional<ValueState>& state, std::string& json) {
     if (state) {
         json.append(",\"").append(field).append("\":{");
@@ -189,34 +212,26 @@ void appendChangesJson(const ChangeSet& changes, std::string& json) {
 }
 
 std::string changeRegText(const ChangeSet& changes) {
-    std::set<std::string> removed;
-    for (const Change& change : changes) {
-        if (change.kind == Change::Kind::keyRemoved) {
-            removed.insert(foldUpper(change.key));
-        }
-    }
+    const RemovedTrees trees(changes);
     std::string text;
     std::string key;  // of the section that is open
     for (const Change& change : changes) {
-        if (change.kind == Change::Kind::keyRemoved) {
-            // The removal of a key takes everything below it along.
-            if (!removed.contains(foldUpper(change.key.substr(0, change.key.find_last_of('\\'))))) {
-                appendRegKeyRemoval(change.key, text);
-                key.clear();
-            }
+        if (trees.takeAlong(change)) {
             continue;
         }
-        if (!change.isKey() && !change.after && removed.contains(foldUpper(change.key))) {
+        if (change.kind == Change::Kind::keyRemoved) {
+            appendRegKeyRemoval(change.key, text);
+            key.clear();
             continue;
         }
         if (change.key != key) {
             appendRegKey(change.key, change.keyClass, text);
             key = change.key;
         }
-        if (!change.isKey() && !change.after) {
-            appendRegValueRemoval(change.name, text);
-        } else if (!change.isKey()) {
+        if (change.after) {
             appendRegValue({change.name, change.after->type, change.after->data}, text);
+        } else if (!change.isKey()) {
+            appendRegValueRemoval(change.name, text);
         }
     }
     return text;

@@ -202,7 +202,8 @@ void ChangeRecorder::beforeTree(const KeyName& name) {
     }
 }
 
-void ChangeRecorder::afterTree(const KeyName& name, bool isDeleted) {
+// As if a key and everything below it were gone.
+void ChangeRecorder::forgetTree(const KeyName& name) {
     const std::string place = walkPlace(fullKeyName(name));
     for (auto key = keys_.lower_bound(place); key != keys_.end() && key->first.starts_with(place); ++key) {
         if (key->first.size() == place.size() || key->first[place.size()] == '\0') {
@@ -212,6 +213,10 @@ void ChangeRecorder::afterTree(const KeyName& name, bool isDeleted) {
             }
         }
     }
+}
+
+void ChangeRecorder::afterTree(const KeyName& name, bool isDeleted) {
+    forgetTree(name);
     OwnedKey opened(registry_);
     for (const KeyName& key : std::exchange(missing_, {})) {
         note(key, false).now =

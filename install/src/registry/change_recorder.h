@@ -64,6 +64,7 @@ private:
         std::string keyClass;
     };
 
+    void forgetTree(const KeyName& name);
     Spelling spell(const KeyName& name, bool exists);
     Key& note(const KeyName& name, bool exists);
     bool exists(const KeyName& name);

@@ -292,37 +292,40 @@ Status applyService(IServiceManager& services, const ServiceChange& change) {
                             : services.configureService(service.get(), definition);
 }
 
+Status readConfiguration(RowReader& reader, const std::string& key, ServiceValues& values) {
+    Status status = reader.open(key);
+    for (const std::string_view name : kServiceValues) {
+        std::optional<ValueState> state;
+        status = status == kSuccess ? reader.value(name, state) : status;
+        values.set(name, state);
+    }
+    return status;
+}
+
 // The changes of services, each with its whole configuration afterwards.
 Status gatherServices(IRegistryStore& registry, const ChangeSet& changes,
                       std::map<std::string, ServiceChange>& gathered, std::string& key) {
     RowReader reader(registry);
-    for (const Change& change : changes) {
-        const std::string_view name = serviceOf(change.key);
+    Status status = kSuccess;
+    for (auto change = changes.begin(); status == kSuccess && change != changes.end(); ++change) {
+        const std::string_view name = serviceOf(change->key);
         if (name.empty()) {
             continue;
         }
+        key = change->key;
         const auto [place, isNew] =
             gathered.try_emplace(foldUpper(name), ServiceChange{std::string(name), false, false, {}});
         ServiceChange& service = place->second;
-        service.isCreated = service.isCreated || change.kind == Change::Kind::keyCreated;
-        service.isRemoved = service.isRemoved || change.kind == Change::Kind::keyRemoved;
+        service.isCreated = service.isCreated || change->kind == Change::Kind::keyCreated;
+        service.isRemoved = service.isRemoved || change->kind == Change::Kind::keyRemoved;
         if (isNew && !service.isCreated) {
-            Status status = reader.open(change.key);
-            for (const std::string_view value : kServiceValues) {
-                std::optional<ValueState> state;
-                status = status == kSuccess ? reader.value(value, state) : status;
-                service.after.set(value, state);
-            }
-            if (status != kSuccess) {
-                key = change.key;
-                return status;
-            }
+            status = readConfiguration(reader, change->key, service.after);
         }
-        if (change.kind == Change::Kind::value) {
-            service.after.set(change.name, change.after);
+        if (!change->isKey()) {
+            service.after.set(change->name, change->after);
         }
     }
-    return kSuccess;
+    return status;
 }
 
 bool isServiceValue(std::string_view name) {

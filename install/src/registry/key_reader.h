@@ -60,7 +60,8 @@ private:
     Status valueAt(KeyHandle key, std::uint32_t index, KeyValue& found);
 
     IRegistryStore& registry_;
-    std::string name_ = std::string(4 * (kMaxValueName + 1), '\0');  // bytes of a name in any narrow encoding
+    std::string name_ =
+        std::string(std::size_t{4} * (kMaxValueName + 1), '\0');  // bytes of a name in any narrow encoding
     std::string class_ = std::string(256, '\0');
     std::string data_ = std::string(4096, '\0');
 };
