@@ -33,7 +33,7 @@ EmbeddedRegistry openStore(const Scratch& scratch) {
 class BareStore {
 public:
     explicit BareStore(const Scratch& scratch) {
-        StoreFile file(scratch.path());
+        StoreFile file(scratch.path(), {});
         require(file.openForWriting(connection_).status == kSuccess);
         addKey_ = prepare("INSERT INTO key (parent, fold, name, class) VALUES (?, ?, ?, '')");
         addValue_ = prepare("INSERT INTO value (key, fold, name, type, data, place) VALUES (?, ?, ?, 1, ?, ?)");
@@ -208,7 +208,7 @@ void migrationThereAndBack(benchmark::State& state) {
         migrateToVersion9(
             registry, services, report, [](std::string_view) { return std::string("9.1.0.0"); },
             [&](std::string_view) { return registry.commit(); }, "C:\\KZ9");
-        require(restoreVersion8(registry, services, console, "C:\\KZ8") == kSuccess);
+        require(restoreVersion8(registry, services, report, "C:\\KZ8") == kSuccess);
     }
     state.SetItemsProcessed(state.range(1));
 }

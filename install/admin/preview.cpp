@@ -8,7 +8,7 @@ Preview::Preview(IPlatform& machine, bool asksLevel)
     : machine_(machine),
       services_(registry_, machine.files()),
       assemblies_(machine.assembliesOn(registry_)),
-      recorded_(memoryPorts(asksLevel), machine.storeIsOwn()) {
+      recorded_(memoryPorts(asksLevel), machine.storeIsOwn(), true) {
     processes_.otherPrograms = ScriptedProgram{};
 }
 

@@ -29,7 +29,7 @@ public:
     Status fill(const std::vector<KeyChange>& changes, std::string& key);
 
     const Ports& ports() const { return recorded_.ports(); }
-    const ChangeSet& changes() const { return recorded_.changes(); }
+    ChangeSet changes() const { return recorded_.changes(); }
 
     // The command lines of the programs that would run, in order.
     const std::vector<std::string>& programs() const { return processes_.started; }

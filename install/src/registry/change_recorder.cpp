@@ -222,13 +222,17 @@ void ChangeRecorder::afterTree(const KeyName& name, bool isDeleted) {
         note(key, false).now =
             registry_.openKey(key.root, key.path, kKeyQueryValue | kKeyOpenLink, opened.receive()) == kSuccess;
     }
-    KeyStart start;
-    if (isDeleted || findKey(registry_, name, start) != kSuccess) {
+    if (isDeleted) {
         return;
     }
+    // Its name is known: a search among all services for each of them would take quadratic time.
+    const Key& top = note(name, false);
+    KeyStart start{name, top.classNow};
+    parseKeyName(top.name, start.name);
     Snapshot tree;
     std::string unread;
-    keep(readSnapshot(registry_, wholeServices_, {start}, tree, unread));
+    const Status status = readSnapshot(registry_, wholeServices_, {start}, tree, unread);
+    keep(isNotFound(status) ? kSuccess : status);
     for (const KeyRecord& record : tree) {
         Key& key = keys_[walkPlace(record.name)];
         key.name = key.name.empty() ? record.name : key.name;
@@ -309,13 +313,13 @@ public:
     Status commit() override {
         recorder_.rest();
         const Status status = holdsCommits_ ? kSuccess : real_.commit();
-        if (status == kSuccess) {
-            committed = recorder_.changes();
+        if (status == kSuccess && !holdsCommits_) {
+            committed_ = recorder_.changes();
         }
         return status;
     }
 
-    ChangeSet committed;
+    ChangeSet changes() const { return holdsCommits_ ? recorder_.changes() : committed_; }
 
 private:
     KeyName nameOf(KeyHandle parent, std::string_view path, AccessMask access) const {
@@ -340,6 +344,7 @@ private:
     IRegistryStore& real_;
     ChangeRecorder& recorder_;
     bool holdsCommits_;
+    ChangeSet committed_;
     std::map<KeyHandle, KeyName> open_;
 };
 
@@ -451,8 +456,8 @@ RecordedPorts::RecordedPorts(const Ports& real, bool wholeServices, bool holdsCo
 
 RecordedPorts::~RecordedPorts() = default;
 
-const ChangeSet& RecordedPorts::changes() const {
-    return registry_->committed;
+ChangeSet RecordedPorts::changes() const {
+    return registry_->changes();
 }
 
 }  // namespace kz7

@@ -93,8 +93,8 @@ public:
 
     const Ports& ports() const { return ports_; }
 
-    // What was changed up to the last commit that succeeded.
-    const ChangeSet& changes() const;
+    // What was changed up to the last commit that succeeded; with `holdsCommits`, up to now.
+    ChangeSet changes() const;
 
     // As that of a recorder.
     Status status() const { return recorder_.status(); }
