@@ -4,7 +4,6 @@
 
 #include <cstring>
 #include <map>
-#include <regex>
 #include <set>
 #include <sstream>
 
@@ -125,7 +124,9 @@ TEST(FaultSweep, EveryFlowEndsReportsAndTouchesNothingElse) {
                 std::istringstream errors(machine.console_.error);
                 for (std::string line; !forGood && std::getline(errors, line);) {
                     line.erase(0, line.starts_with(kPrefix) ? kPrefix.size() - 1 : 0);
-                    line = std::regex_replace(line, std::regex("rc = (5030|5111)$"), "rc = 5082");
+                    if (line.ends_with("rc = 5030") || line.ends_with("rc = 5111")) {
+                        line.replace(line.size() - 4, 4, "5082");
+                    }
                     if (!line.starts_with(":392:") && !reported[line].ends_with(flow.mark)) {
                         reported[line] += flow.mark;
                     }
