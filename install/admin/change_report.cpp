@@ -71,6 +71,22 @@ bool ChangeRun::isFailed() const {
            std::any_of(errors.begin(), errors.end(), [](const ErrorLine& error) { return error.isFailure; });
 }
 
+Answer fillPreview(Admin& admin, Preview& preview) {
+    std::string key;
+    const Status status = preview.fill(key);
+    return status == kSuccess ? kAnswerYes : admin.storeFault("cannot read: " + shownText(key), status);
+}
+
+Answer showPreview(Admin& admin, const ChangeOptions& options, Preview& preview, ChangeRun& run) {
+    run.changes = preview.changes();
+    run.programs = preview.programs();
+    run.output = preview.console().output;
+    if (!options.json) {
+        admin.platform().console().writeError(preview.console().error);
+    }
+    return showRun(admin, options, run);
+}
+
 Answer showRun(Admin& admin, const ChangeOptions& options, const ChangeRun& run) {
     const Answer written = options.json ? admin.write(runJson(run, options.check), Admin::Form::document)
                                         : admin.write(runText(run, options, admin.output().colours));

@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "install/admin/admin.h"
+#include "install/admin/preview.h"
 #include "install/src/registry/change_set.h"
 #include "install/src/registry/report.h"
 
@@ -34,6 +35,12 @@ struct ChangeRun {
     // A flow may print failures and succeed.
     bool isFailed() const;
 };
+
+// Fills a preview with the machine's state and reports a failure.
+Answer fillPreview(Admin& admin, Preview& preview);
+
+// Shows what a preview foretells; `run` holds what the flow itself returned.
+Answer showPreview(Admin& admin, const ChangeOptions& options, Preview& preview, ChangeRun& run);
 
 // Writes the run as text or JSON. kAnswerNo for a run that failed; with --detailed-exitcode, kAnswerChanged for one
 // that succeeded and changes something.

@@ -6,6 +6,7 @@
 
 #include "install/platform/text.h"
 #include "install/src/registry/copy_layout.h"
+#include "install/src/registry/copy_name.h"
 
 namespace kz7 {
 namespace {
@@ -15,17 +16,20 @@ using nlohmann::json;
 constexpr std::size_t kLongestName = 64;       // characters; longer names make copies that cannot be told apart
 constexpr std::size_t kLongestLocation = 255;  // characters of a copy's record
 
+bool hasControls(const std::string& text) {
+    return std::any_of(text.begin(), text.end(),
+                       [](char c) { return static_cast<unsigned char>(c) < ' ' || c == '\x7F'; });
+}
+
 // What makes a name one that no copy can work with; empty for a good one.
 std::string_view faultOfName(const std::string& name) {
-    const bool isControlled = std::any_of(name.begin(), name.end(),
-                                          [](char c) { return static_cast<unsigned char>(c) < ' ' || c == '\x7F'; });
     if (name.empty()) {
         return "is empty";
     }
     if (!fitsCharacters(name, kLongestName)) {
         return "is longer than 64 characters";
     }
-    if (isControlled || name.find_first_of("\\/") != std::string::npos || name == "." || name == "..") {
+    if (!isOneName(name) || hasControls(name)) {
         return "is not a valid copy name";
     }
     return equalsIgnoreCase(name, layout::kVersion8Copy) ? "stands for a version-8 installation" : "";
@@ -38,9 +42,7 @@ std::string_view faultOfLocation(const std::string& location) {
     if (!fitsCharacters(location, kLongestLocation)) {
         return "is longer than 255 characters";
     }
-    const bool isControlled = std::any_of(location.begin(), location.end(),
-                                          [](char c) { return static_cast<unsigned char>(c) < ' ' || c == '\x7F'; });
-    return isControlled ? "holds a control character" : "";
+    return hasControls(location) ? "holds a control character" : "";
 }
 
 class Reader {

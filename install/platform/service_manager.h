@@ -35,7 +35,10 @@ enum class ServiceState : std::uint32_t {
     running = 4,
 };
 
-// Characters of a service's name. The service manager keeps a service as a key of that name, so the limit is a key's.
+// The service manager keeps a service as a key of its name, here below HKEY_LOCAL_MACHINE.
+inline constexpr std::string_view kServiceKeys = "SYSTEM\\CurrentControlSet\\Services\\";
+
+// Characters of a service's name: those of a key's.
 inline constexpr std::size_t kMaxServiceName = kMaxKeyName;
 
 inline bool isServiceName(std::string_view name) {

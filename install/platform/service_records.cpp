@@ -8,8 +8,6 @@
 namespace kz7 {
 namespace {
 
-constexpr std::string_view kServices = "SYSTEM\\CurrentControlSet\\Services\\";
-
 constexpr std::string_view kStart = "Start";
 constexpr std::string_view kImagePath = "ImagePath";
 constexpr std::string_view kRunState = "CurrentState";  // a number of ServiceState; none: stopped
@@ -100,7 +98,7 @@ Status ServiceRecords::createService(ServiceHandle manager, const ServiceDefinit
     if (!isServiceName(definition.name)) {
         return kInvalidName;
     }
-    const std::string path = std::string(kServices) + std::string(definition.name);
+    const std::string path = std::string(kServiceKeys) + std::string(definition.name);
     const bool stillOpen = std::any_of(open_.begin(), open_.end(), [&](const Open& open) {
         return open.deleted && equalsIgnoreCase(open.recordPath, path);
     });
@@ -136,7 +134,7 @@ Status ServiceRecords::openService(ServiceHandle manager, std::string_view name,
     if (!isServiceName(name)) {
         return kInvalidName;
     }
-    const std::string path = std::string(kServices) + std::string(name);
+    const std::string path = std::string(kServiceKeys) + std::string(name);
     OwnedKey record(registry_);
     const Status status = registry_.openKey(KeyHandle::localMachine, path, kKeyQueryValue, record.receive());
     if (status != kSuccess) {

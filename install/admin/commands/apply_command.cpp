@@ -2,7 +2,7 @@
 
 #include "install/admin/change_report.h"
 #include "install/admin/commands/commands.h"
-#include "install/admin/preview.h"
+#include "install/admin/copy_location.h"
 #include "install/platform/text.h"
 #include "install/src/registry/copy_layout.h"
 #include "install/src/services/management_service.h"
@@ -17,45 +17,32 @@ struct ApplyOptions : ChangeOptions {
 };
 
 // A copy that gets another location keeps the service that it has.
-void noteServices(IRegistryStore& registry, ChangeRun& run) {
-    constexpr std::string_view kRecords = "SYSTEM\\CurrentControlSet\\Services\\";
+void noteServices(IRegistryStore& registry, const ChangeSet& changes, ChangeRun& run) {
     const std::string copies = "HKEY_LOCAL_MACHINE\\" + std::string(layout::kCopies) + '\\';
-    for (const Change& change : run.changes) {
+    for (const Change& change : changes) {
         if (change.isKey() || !change.after || change.name != layout::kPathName ||
             !equalsIgnoreCase(std::string_view(change.key).substr(0, copies.size()), copies)) {
             continue;
         }
         const std::string service(managementServiceName(change.key.substr(copies.size())).view());
-        const std::string location = change.after->data.substr(0, change.after->data.find('\0'));
-        OwnedKey record(registry);
-        std::optional<ValueState> program;
-        if (registry.openKey(KeyHandle::localMachine, std::string(kRecords) + service, kKeyQueryValue,
-                             record.receive()) == kSuccess &&
-            KeyReader(registry).value(record.get(), "ImagePath", program) == kSuccess && program) {
-            const std::string path = program->data.substr(0, program->data.find('\0'));
-            if (!equalsIgnoreCase(std::string_view(path).substr(0, location.size()), location)) {
-                run.notes.push_back("service " + shownText(service) + " stays at " + shownText(path));
-            }
+        const std::string_view location = change.after->text();
+        ValueState program;
+        if (readServiceProgram(registry, service, program) == kSuccess && !program.data.empty() &&
+            !equalsIgnoreCase(program.text().substr(0, location.size()), location)) {
+            run.notes.push_back("service " + shownText(service) + " stays at " + shownText(program.text()));
         }
     }
 }
 
 Answer preview(Admin& admin, const ApplyOptions& options, std::span<const char* const> arguments) {
     Preview preview(admin.platform(), !options.noLevel);
-    std::string key;
-    if (const Status status = preview.fill(key); status != kSuccess) {
-        return admin.storeFault("cannot read: " + shownText(key), status);
+    if (const Answer filled = fillPreview(admin, preview); filled != kAnswerYes) {
+        return filled;
     }
     ChangeRun run;
     run.status = runTool(preview.ports(), arguments, &run.errors);
-    run.changes = preview.changes();
-    run.programs = preview.programs();
-    run.output = preview.console().output;
-    noteServices(*preview.ports().registry, run);
-    if (!options.json) {
-        admin.platform().console().writeError(preview.console().error);
-    }
-    return showRun(admin, options, run);
+    noteServices(*preview.ports().registry, preview.changes(), run);
+    return showPreview(admin, options, preview, run);
 }
 
 // Knows whether the last line that passed was ended.
@@ -92,8 +79,8 @@ Answer run(Admin& admin, const ApplyOptions& options, std::span<const char* cons
     run.changes = recorded.changes();
     run.output = kept.output;
     shown.endLine();
-    noteServices(admin.registry(), run);
-    admin.registry().commit();
+    noteServices(admin.registry(), run.changes, run);
+    admin.registry().commit();  // the end of the transaction of the notes
     return showRun(admin, options, run);
 }
 

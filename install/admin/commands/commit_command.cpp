@@ -7,7 +7,6 @@
 #include "install/admin/copy_location.h"
 #include "install/admin/given_name.h"
 #include "install/admin/input_file.h"
-#include "install/admin/preview.h"
 #include "install/platform/program.h"
 #include "install/platform/text.h"
 #include "install/runtime/config_handler.h"
@@ -25,12 +24,6 @@ struct Words : ChangeOptions {
     std::string logFile;
     bool machine = false;
 };
-
-// Whether a name is one component of registry paths and of host paths.
-bool isOneName(const std::string& name) {
-    return name != "." && name != ".." &&
-           std::none_of(name.begin(), name.end(), [](char c) { return c == '\\' || c == '/' || (c >= 0 && c < ' '); });
-}
 
 Answer readResponses(Admin& admin, const Words& words, ConfigurationRequest& request) {
     InputFile file(admin, words.responseFile);
@@ -99,19 +92,12 @@ Answer findMessages(Admin& admin, const Words&, ConfigurationRequest& request) {
 
 Answer preview(Admin& admin, const Words& words, ConfigurationRequest request) {
     Preview preview(admin.platform(), false);
-    std::string key;
-    if (const Status status = preview.fill(key); status != kSuccess) {
-        return admin.storeFault("cannot read: " + shownText(key), status);
+    if (const Answer filled = fillPreview(admin, preview); filled != kAnswerYes) {
+        return filled;
     }
     ChangeRun run;
     run.status = runConfiguration(preview.ports(), std::move(request)).notSet == 0 ? kSuccess : kParameterNotSet;
-    run.changes = preview.changes();
-    run.programs = preview.programs();
-    run.output = preview.console().output;
-    if (!words.json) {
-        admin.platform().console().writeError(preview.console().error);
-    }
-    return showRun(admin, words, run);
+    return showPreview(admin, words, preview, run);
 }
 
 Answer run(Admin& admin, const Words& words, ConfigurationRequest request) {

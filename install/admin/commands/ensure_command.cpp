@@ -5,8 +5,8 @@
 
 #include "install/admin/change_report.h"
 #include "install/admin/commands/commands.h"
+#include "install/admin/copy_location.h"
 #include "install/admin/input_file.h"
-#include "install/admin/preview.h"
 #include "install/admin/wanted_copies.h"
 #include "install/platform/text.h"
 #include "install/src/add_copy.h"
@@ -25,11 +25,6 @@ struct EnsureOptions : ChangeOptions {
     bool all = false;
     bool services = false;
 };
-
-// Text data up to the first NUL.
-std::string textOf(const std::optional<ValueState>& state) {
-    return state ? state->data.substr(0, state->data.find('\0')) : std::string{};
-}
 
 // Compares copies with what is wanted, and adds and removes them by the flows of the tool.
 class Ensurer {
@@ -137,27 +132,24 @@ private:
 
     // A service elsewhere is as the add leaves it, unless it is to be corrected.
     Status checkService(const std::string& name, const std::string& location) {
-        const std::string record = "SYSTEM\\CurrentControlSet\\Services\\" + name;
-        const std::string program = location + "\\bin\\kz7mgmtsvc.exe";
-        OwnedKey key(*ports_.registry);
-        std::optional<ValueState> state;
-        Status status = ports_.registry->openKey(KeyHandle::localMachine, record, kKeyQueryValue, key.receive());
-        status = status == kSuccess ? reader_.value(key.get(), "ImagePath", state) : status;
-        if (status != kSuccess || textOf(state) == program) {
+        const std::string wanted(managementServiceProgram(location).view());
+        ValueState program;
+        const Status status = readServiceProgram(*ports_.registry, name, program);
+        if (status != kSuccess || program.text() == wanted) {
             return isNotFound(status) ? kSuccess : status;
         }
         if (!options_.services) {
-            run_.notes.push_back("service " + shownText(name) + " stays at " + shownText(textOf(state)) +
+            run_.notes.push_back("service " + shownText(name) + " stays at " + shownText(program.text()) +
                                  " (--services corrects it)");
             return kSuccess;
         }
-        key.reset();
+        const std::string record = std::string(kServiceKeys) + name;
         const ChangeSet change = {{Change::Kind::value,
                                    fullKeyName({KeyHandle::localMachine, record}),
                                    {},
                                    "ImagePath",
-                                   state,
-                                   ValueState{ValueType::expandSz, program + '\0'}}};
+                                   program,
+                                   ValueState{ValueType::expandSz, wanted + '\0'}}};
         std::string failed;
         return applyChangeSet(*ports_.registry, servicesAreRows_ ? nullptr : ports_.services, change, failed);
     }
@@ -170,10 +162,10 @@ private:
         }
         for (const LayoutRow& row : copyRows()) {
             std::optional<ValueState> state;
-            if (row.key == "CurrentVersion" && reader_.value(key.get(), row.name, state) == kSuccess &&
-                textOf(state) != row.data) {
+            if (row.key == "CurrentVersion" && reader_.value(key.get(), row.name, state) == kSuccess && state &&
+                state->text() != row.data) {
                 run_.notes.push_back(
-                    compose("copy %s: %s stays %s", {shownText(name), row.name, shownText(textOf(state))}));
+                    compose("copy %s: %s stays %s", {shownText(name), row.name, shownText(state->text())}));
             }
         }
     }
@@ -201,8 +193,8 @@ Answer ensureOn(Admin& admin, const EnsureOptions& options, const std::vector<Wa
     }
     run.status = ensurer.make(wanted);
     ports.registry->commit();
-    for (const ErrorLine& error : run.errors) {
-        if (!options.json) {
+    if (!options.json) {
+        for (const ErrorLine& error : run.errors) {
             admin.tell(shownText(error.text.substr(0, error.text.find_last_not_of('\n') + 1)));
         }
     }
@@ -225,9 +217,8 @@ Answer ensure(Admin& admin, const EnsureOptions& options) {
     ChangeRun run;
     if (options.check) {
         Preview preview(admin.platform(), false);
-        std::string key;
-        if (const Status status = preview.fill(key); status != kSuccess) {
-            return admin.storeFault("cannot read: " + shownText(key), status);
+        if (const Answer filled = fillPreview(admin, preview); filled != kAnswerYes) {
+            return filled;
         }
         const Answer answer = ensureOn(admin, options, wanted, preview.ports(), run);
         run.changes = preview.changes();

@@ -9,8 +9,6 @@
 namespace kz7 {
 namespace {
 
-constexpr std::string_view kServices = "SYSTEM\\CurrentControlSet\\Services\\";
-
 KeyName parentOf(const KeyName& name) {
     const std::size_t end = name.path.find_last_of('\\');
     return {name.root, end == std::string::npos ? std::string{} : name.path.substr(0, end)};
@@ -47,6 +45,21 @@ ChangeSet ChangeRecorder::changes() const {
         }
     }
     return difference(before, now);
+}
+
+// The values of a key that exists, as they are before the run touches them.
+void ChangeRecorder::Key::noteValues(const std::vector<KeyValue>& existing) {
+    for (const KeyValue& value : existing) {
+        const ValueState state{value.type, value.data};
+        values.try_emplace(foldUpper(value.name), Value{value.name, state, state});
+    }
+}
+
+void ChangeRecorder::Key::remove() {
+    now = false;
+    for (auto& [fold, value] : values) {
+        value.now.reset();
+    }
 }
 
 // Names and classes as the store has them. The last name of a key that does not exist is taken as it is given.
@@ -97,8 +110,8 @@ bool ChangeRecorder::exists(const KeyName& name) {
 }
 
 void ChangeRecorder::beforeCreate(const KeyName& name) {
-    missing_.clear();
-    for (KeyName key = name; !key.path.empty() && !exists(key); key = parentOf(key)) {
+    missing_ = {name};
+    for (KeyName key = parentOf(name); !key.path.empty() && !exists(key); key = parentOf(key)) {
         missing_.push_back(key);
     }
     for (auto key = missing_.rbegin(); key != missing_.rend(); ++key) {
@@ -125,10 +138,7 @@ void ChangeRecorder::list(const KeyName& name, Key& key) {
     Status status = registry_.openKey(name.root, name.path, kKeyWalk | kKeyOpenLink, opened.receive());
     status = status == kSuccess ? reader_.values(opened.get(), values) : status;
     keep(status);
-    for (const KeyValue& value : values) {
-        const ValueState state{value.type, value.data};
-        key.values.try_emplace(foldUpper(value.name), Value{value.name, state, state});
-    }
+    key.noteValues(values);
 }
 
 void ChangeRecorder::beforeDelete(const KeyName& name) {
@@ -140,11 +150,7 @@ void ChangeRecorder::beforeDelete(const KeyName& name) {
 }
 
 void ChangeRecorder::deleted(const KeyName& name) {
-    Key& key = note(name, true);
-    key.now = false;
-    for (auto& [fold, value] : key.values) {
-        value.now.reset();
-    }
+    note(name, true).remove();
 }
 
 void ChangeRecorder::beforeValue(const KeyName& name, std::string_view value) {
@@ -195,10 +201,7 @@ void ChangeRecorder::beforeTree(const KeyName& name) {
             key.before = key.now = true;
         }
         key.isListed = true;
-        for (const KeyValue& value : record.values) {
-            const ValueState state{value.type, value.data};
-            key.values.try_emplace(foldUpper(value.name), Value{value.name, state, state});
-        }
+        key.noteValues(record.values);
     }
 }
 
@@ -207,10 +210,7 @@ void ChangeRecorder::forgetTree(const KeyName& name) {
     const std::string place = walkPlace(fullKeyName(name));
     for (auto key = keys_.lower_bound(place); key != keys_.end() && key->first.starts_with(place); ++key) {
         if (key->first.size() == place.size() || key->first[place.size()] == '\0') {
-            key->second.now = false;
-            for (auto& [fold, value] : key->second.values) {
-                value.now.reset();
-            }
+            key->second.remove();
         }
     }
 }
@@ -395,7 +395,7 @@ private:
         if (!isServiceName(name)) {
             return call();
         }
-        const KeyName key{KeyHandle::localMachine, std::string(kServices) + std::string(name)};
+        const KeyName key{KeyHandle::localMachine, std::string(kServiceKeys) + std::string(name)};
         recorder_.beforeTree(key);
         const Status status = call();
         // The key of a deleted service may stay for as long as a handle is open.

@@ -26,7 +26,7 @@ public:
     // The first failure to read a state before; the record then has gaps.
     Status status() const { return status_; }
 
-    // Before a key is created, and after it was: with its missing parents.
+    // Before a key that does not exist is created, and after it was: with its missing parents.
     void beforeCreate(const KeyName& name);
     void created(const KeyName& name, std::string_view keyClass);
 
@@ -57,6 +57,9 @@ private:
         bool now = false;
         bool isListed = false;                // all values are touched
         std::map<std::string, Value> values;  // the touched ones, by folded name
+
+        void noteValues(const std::vector<KeyValue>& existing);
+        void remove();
     };
 
     struct Spelling {

@@ -30,6 +30,11 @@ void copyOut(std::string_view text, std::uint32_t size, char* output) {
 
 }  // namespace
 
+bool isOneName(std::string_view name) {
+    return name != "." && name != ".." &&
+           std::none_of(name.begin(), name.end(), [](char c) { return c == '\\' || c == '/' || (c >= 0 && c < ' '); });
+}
+
 std::string substituteCopyName(std::string_view text, std::string_view copyName) {
     const std::string_view token = text.find(kCurrentName) != std::string_view::npos ? kCurrentName : kDefaultName;
     std::string result;

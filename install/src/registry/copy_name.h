@@ -10,6 +10,9 @@ namespace kz7 {
 
 inline constexpr std::size_t kSubstitutedSize = 1024;  // characters of a substituted text with its terminator
 
+// Whether a name is one component of registry paths and of host paths, without control characters below U+0020.
+bool isOneName(std::string_view name);
+
 // Replaces every "$CurrentInstallationName$" of `text` by the name, or every "$DefaultInstallationName$" if the text
 // has none of the first. Inserted names are not searched again; an empty name leaves the text unchanged. The result is
 // not cut: callers with kSubstitutedSize bytes check its length.

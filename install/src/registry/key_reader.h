@@ -16,6 +16,9 @@ struct ValueState {
     ValueType type = ValueType::none;
     std::string data;
 
+    // The data up to the first NUL.
+    std::string_view text() const { return std::string_view(data).substr(0, data.find('\0')); }
+
     bool operator==(const ValueState&) const = default;
 };
 

@@ -45,7 +45,7 @@ Status createService(IServiceManager& services, Report& report, std::string_view
     }
     const ServiceName name = managementServiceName(copyName);
     const FixedText<1024> displayName(compose("KZ7 Management Service (%s)", {copyName}));
-    const FilePath program = binPath(location, "kz7mgmtsvc.exe");
+    const FilePath program = managementServiceProgram(location);
     OwnedService service(services);
     // A service that was just removed may still be stopping.
     const ServiceDefinition definition{.name = name.view(),
@@ -122,6 +122,10 @@ Status startService(IServiceManager& services, Report& report, std::string_view 
 
 ServiceName managementServiceName(std::string_view copyName) {
     return ServiceName(compose("KZ7MGMTSVC_%s", {copyName}));
+}
+
+FixedText<261> managementServiceProgram(std::string_view location) {
+    return binPath(location, "kz7mgmtsvc.exe");
 }
 
 Status registerManagementService(IRegistryStore& registry, IServiceManager& services, Report& report,

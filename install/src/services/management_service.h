@@ -14,6 +14,9 @@ using ServiceName = FixedText<1024>;
 
 ServiceName managementServiceName(std::string_view copyName);
 
+// The path of the service's program in a location, as the service gets it.
+FixedText<261> managementServiceProgram(std::string_view location);
+
 // Creates the copy's service and the event-log source, and with `start` starts the service. Succeeds at once if the
 // service exists. Every failure is reported once and returned.
 Status registerManagementService(IRegistryStore& registry, IServiceManager& services, Report& report,
