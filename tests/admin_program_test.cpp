@@ -113,7 +113,7 @@ TEST_F(AdminProgram, ReportsMissingKeysAndFaults) {
         {{"import", store_.path()}, 2, "", adminError(store_.path() + ": Is a directory")},
         {{"import", "/none/such"},  2, "", adminError("/none/such: No such file or directory")},
         {{},                      2, "", adminError("no command (see --help)")},
-        {{"rubbish"},             2, "", adminError("The following argument was not expected: rubbish (see --help)")},
+        {{"rubbish"},             2, "", adminError("unexpected argument: rubbish (see --help)")},
         {{"export", "--json", "--utf16"}, 2, "", adminError("--utf16 excludes --json (see --help)")},
         {{"tree", "--store="},    2, "", adminError("--store: 1 required TEXT missing (see --help)")},
         {{"copies", "--store", "/dev/null"},  2, "", adminError("/dev/null: Not a directory")},

@@ -48,7 +48,7 @@ retype 3329 ProbeRollback DeleteAtRollback ProbeRolledBack  # rollback
 retype 3585 ProbeCommit DeleteAtCommit ProbeCommitted       # commit
 
 # Prints the results of one run. The security identifier of the user varies. Consecutive notes of properties that were
-# read or set are one line with their number.
+# read or set are one line with their number; those of the calls with null arguments are left out.
 run() {
     : >log
     wine "$programs/full_exit_code.exe" msiexec /qn "$@" '/l*v' "$(windows_path "$folder/log")" \
@@ -60,7 +60,7 @@ run() {
     for root in HKEY_CURRENT_USER $(wine reg query HKEY_USERS | tr -d '\r' | grep '^HKEY_'); do
         wine reg query "$root\\SOFTWARE\\NVQ" /s 2>/dev/null || true
     done | tr -d '\r' | sed '/^$/d; /^reg: /d; s/S-1-5[-0-9]*/USER/'
-    tr -d '\r' <log | iconv -f "CP$page" -t UTF-8 | sed -n -E 's/^1: ((probe|Note|WARNING|ERROR).*[^ ]) *$/\1/p' |
+    tr -d '\r' <log | iconv -f "CP$page" -t UTF-8 | sed -n -E '/Property: (\$Cur.*)?, status/d; s/^1: ((probe|Note|WARNING|ERROR).*[^ ]) *$/\1/p' |
         sed -E "s/$letter{1024}/<1024>/; s/$letter{1023}/<1023>/"'; s/(Note: iMsi...Property): .*, status 0/\1/' |
         uniq -c | sed -E 's/^ *([0-9]+) Note: (iMsi...Property)$/\2 x \1/; s/^ *1 //'
 }
@@ -74,6 +74,7 @@ printf '%s\r\n' '* of a user' 'PROD = PROD_ESE' "KZ7.PASSWORD = \"two  $letter w
 printf '%s\r\n' 'LEVEL = 8' 'no keyword' >bad_responses
 good=RSP_FILE_PATH=$(windows_path "$folder/responses")
 bad=RSP_FILE_PATH=$(windows_path "$folder/bad_responses")
+missing=RSP_FILE_PATH=$(windows_path "$folder/no_responses")
 
 # The expected lines. A saved value's size counts its NUL terminator. Wine keeps no property from deferred actions, so
 # one that was not saved reads as it was last set.
@@ -101,6 +102,12 @@ copy_name() { # kind of action, saved or deleted
     done
     printf '%s\n' "iMsiGetProperty x $notes" "probe $1: KZ7_COPY_NAME ${line[0]}, KZ7_COPY_NAME ${line[1]}"
 }
+# Each call with its null arguments: the property read, two substitutions, the property set.
+nulls() { # kind of action, the status of a missing argument
+    local name='$CurrentInstallationName$'
+    echo "probe $1: nulls: $2 null null 87 $2 $name null 0 $2 null null 87 87 COPY null 0" \
+        "$2 null null 87 $2 $name $name 0 $2 null null 87 0 COPY COPY 0"
+}
 immediate() { # the feature BASE_CLIENT.bin selected: Y or N
     cat <<TEXT
 iMsiSetProperty x 1
@@ -118,6 +125,7 @@ iMsiGetProperty x 9
 probe immediate: DEBUG_PROP 3 'new', TABLE_PUBLIC 3 'new', TablePrivate 3 'new', KZ7_COPY_NAME 3 'new', \
 MIGRATION_FILES_PATH 3 'new', INI_FILES_PATH 3 'new', NOT_INSTALL_DOTNET 3 'new', NotSaved 3 'new', \
 BASE_CLIENT_BIN_SELECTED 3 'new'
+$(nulls immediate 5021)
 TEXT
 }
 deferred() { # kind of action, the feature selected; as saved with its size: REMOVE, state of features, a response
@@ -129,16 +137,18 @@ KZ7_COPY_NAME $((length + 1)) '$copy', MIGRATION_FILES_PATH $((1023 * width + 1)
 NotSaved 3 'new', BASE_CLIENT_BIN_SELECTED 2 '$2', REMOVE $3, BASE_CLIENT.bin_SELECT_STATE $4, \
 ODBC_SUPPORT_SELECT_STATE $4, LDAP.bin_SELECT_STATE 0 '', PROP_RSP_KZ7.PASSWORD $5, PROP_RSP_EMPTY 0 '', PROP_RSP_PROD 1 ''
 $(copy_name "$1" saved)
+$(nulls "$1" 87)
 TEXT
 }
 deleted() { # kind of action
     printf '%s\n' 'iMsiGetProperty x 2' "probe $1: opening the key: status 2" 'iMsiGetProperty x 1' \
-        "probe $1: DEBUG_PROP 3 'new'" "$(copy_name "$1" deleted)"
+        "probe $1: DEBUG_PROP 3 'new'" "$(copy_name "$1" deleted)" "$(nulls "$1" 87)"
 }
 committed="probe commit: opening the key: status 0
 iMsiGetProperty x 1
 probe commit: DEBUG_PROP 23 'of the immediate phase'
 $(copy_name commit saved)
+$(nulls commit 87)
 $(deleted commit)"
 installing="iMsiGetProperty x 4
 $(immediate Y)"
@@ -150,10 +160,13 @@ $installing
 $(deferred deferred "${installed[@]}")
 $(deferred rollback "${installed[@]}")
 $(deleted rollback)" /i package.msi "$good" FAIL=1
-check 'an immediate action fails, so nothing is rolled back' "exit code 1603
+check 'an immediate action fails, so nothing is rolled back; its response file is missing' "exit code 1603
 $keys
-$installing
-iMsiGetProperty x 2" /i package.msi "$good" FAIL=early
+iMsiGetProperty x 2
+ERROR: ureReadRspFile, step 10: error 2: RSP_FILE_PATH: ${missing#*=}: it cannot be read
+iMsiGetProperty x 3
+$(immediate Y)
+iMsiGetProperty x 2" /i package.msi "$missing" FAIL=early
 check 'an installation after one that was rolled back' "exit code 0
 ./KZ7 package of the tests/client.txt
 ./KZ7 package of the tests/odbc.txt

@@ -28,20 +28,20 @@ uint32_t iSavePropertiesForDeferred(uint32_t installation);
 uint32_t iDeleteSavedProperties(uint32_t installation);
 
 /* Reads a property in immediate and deferred actions alike. In a deferred action UserSID, CustomActionData and
- * ProductCode are the installer's; a saved value counts only if the installer has none. Every other value comes from a
- * key that the user can write: never use one as the path of a file to run or load. `size` is the buffer's in bytes, and
- * afterwards the value's: without its NUL where the installer gave it, with it where it was saved. 234: the buffer is
- * too small, and `size` a hint, which may be twice what is needed; 1,024 bytes are enough for what was saved. 5021, 87:
- * an argument is missing, in an immediate and in a deferred action. */
+ * ProductCode come from the installer; a saved value counts only if the installer has none. Every other value comes
+ * from a key that the user can write: never use one as the path of a file to run or load. `size` is the size of the
+ * buffer in bytes on entry, and the size of the value on return: a saved value counts its NUL, a value of the installer
+ * does not. 234: the buffer is too small; `size` is then a hint, which may be twice what is needed. 1,024 bytes are
+ * enough for every saved value. 87: an argument is null; 5021: `name` or `buffer` is null in an immediate action. */
 uint32_t iMsiGetProperty(uint32_t installation, const char* name, char* buffer, uint32_t* size);
 
-/* Sets a property; null or an empty text unsets it. */
+/* Sets a property; a null or empty value unsets it. 87: `name` is null. */
 uint32_t iMsiSetProperty(uint32_t installation, const char* name, const char* value);
 
 /* Puts a copy's name in place of "$CurrentInstallationName$", or else of "$DefaultInstallationName$". With a size the
  * result goes to `output`; with 0 to a buffer of the library, which the next call overwrites. Returns `text` itself
- * where nothing was replaced; null where `text` does not fit into `output_size`, or `text` or a needed `output` is
- * null. */
+ * if nothing is replaced, as with a null or empty copy name. Returns null if `text` is null or does not fit into
+ * `output_size`, or if a size is given and `output` is null. */
 const char* iSubstituteCopyName(const char* text, const char* copy_name, uint32_t output_size, char* output);
 
 #ifdef __cplusplus

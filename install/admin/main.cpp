@@ -14,12 +14,14 @@ namespace kz7 {
 namespace {
 
 constexpr const char* kFooter =
-    "The usual state directory is $KZ7_STATE_DIR; else /var/lib/kz7 for root; else $XDG_STATE_HOME/kz7 or\n"
-    "~/.local/state/kz7. On Windows the store is the registry of the machine.\n"
+    "The usual state directory is $KZ7_STATE_DIR; else /var/lib/kz7 for root; else\n"
+    "$XDG_STATE_HOME/kz7 or ~/.local/state/kz7. On Windows the store is the registry\n"
+    "of the machine.\n"
     "\n"
-    "Exit codes: 0 done; 1 no: not there, nothing to show, different, or something failed; 2 fault: a store, file,\n"
-    "key or output that cannot be used, or a wrong command line; 3 with --detailed-exitcode: done, and something\n"
-    "changed. front exits as its program does.\n";
+    "Exit codes: 0 done; 1 not found, nothing to show, different, or something\n"
+    "failed; 2 a store, file, key or output cannot be used, or the command line is\n"
+    "wrong; 3 with --detailed-exitcode: done, and something changed. front exits as\n"
+    "its program does.\n";
 
 // What help prints is output like any other.
 Answer showHelp(const CLI::App& program, const CLI::Success& help) {
@@ -37,10 +39,11 @@ void tellFault(const std::string& reason) {
 
 int run(int argc, char** argv) {
     Admin admin;
-    CLI::App program("Looks at what kz7InstallReg wrote and moves it", "kz7admin");
+    CLI::App program("Inspects and changes the registry data that kz7InstallReg writes", "kz7admin");
     program.add_option("--store", admin.storeDirectory, "The state directory to use instead of the usual one")
         ->check(givenName());
     program.footer(kFooter);
+    program.get_formatter()->column_width(24);  // help fits 80 columns
     program.require_subcommand(0, 1);
     program.fallthrough();
     addAliasesCommand(program, admin);
@@ -59,6 +62,9 @@ int run(int argc, char** argv) {
         program.parse(argc, argv);
     } catch (const CLI::Success& help) {
         return showHelp(program, help);
+    } catch (const CLI::ExtrasError&) {
+        tellFault("unexpected argument: " + shownText(program.remaining(true).front()) + " (see --help)");
+        return kAnswerFault;
     } catch (const CLI::ParseError& error) {
         tellFault(shownText(error.what()) + " (see --help)");
         return kAnswerFault;

@@ -73,6 +73,28 @@ void readProperties(MSIHANDLE installation) {
     log(installation, line);
 }
 
+// The results of the calls with each combination of arguments that are null; the last of each is a call with all.
+void callWithNulls(MSIHANDLE installation) {
+    const auto get = entryPoint<decltype(&iMsiGetProperty)>(installation, "iMsiGetProperty");
+    const auto set = entryPoint<decltype(&iMsiSetProperty)>(installation, "iMsiSetProperty");
+    const auto substitute = entryPoint<decltype(&iSubstituteCopyName)>(installation, "iSubstituteCopyName");
+    const char* const name = "$CurrentInstallationName$";
+    std::string room(kRoom, '\0');
+    std::string line = "nulls:";
+    for (unsigned given = 0; given < 8; ++given) {
+        const auto argument = [given](unsigned bit, auto* value) { return (given & bit) != 0 ? value : nullptr; };
+        std::uint32_t size = kRoom;
+        line +=
+            ' ' + std::to_string(get(installation, argument(1, name), argument(2, room.data()), argument(4, &size)));
+        for (const std::uint32_t outputSize : {std::uint32_t{0}, std::uint32_t{kRoom}}) {
+            const char* text = substitute(argument(1, name), argument(2, "COPY"), outputSize, argument(4, room.data()));
+            line += text == nullptr ? " null" : std::string(" ") + text;
+        }
+        line += ' ' + std::to_string(set(installation, argument(1, name), argument(2, "")));
+    }
+    log(installation, line);
+}
+
 // The copy's name, with room for all of it but the terminator in the test of two-byte characters, and with room for it.
 void readName(MSIHANDLE installation) {
     std::string line;
@@ -94,6 +116,7 @@ __declspec(dllexport) UINT probeRead(MSIHANDLE installation) {
     log(installation, "opening the key: status " + std::to_string(status));
     readProperties(installation);
     readName(installation);
+    callWithNulls(installation);
     return ERROR_SUCCESS;
 }
 
@@ -115,6 +138,7 @@ __declspec(dllexport) UINT probeChange(MSIHANDLE installation) {
     }
     log(installation, line);
     readProperties(installation);
+    callWithNulls(installation);
     return ERROR_SUCCESS;
 }
 

@@ -145,15 +145,16 @@ Answer showAliases(Admin& admin, const std::string& asked) {
         return kAnswerFault;
     }
     const std::string text = aliasesText(rows, asked, missingView, admin.output().columns);
-    return text.empty() ? admin.no("no such alias: " + shownText(admin.platform().storeName())) : admin.show(text);
+    return text.empty() ? admin.no("no such alias: " + shownText(asked.empty() ? admin.platform().storeName() : asked))
+                        : admin.show(text);
 }
 
 }  // namespace
 
 void addAliasesCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("aliases", "Show which copy each version prefix names and should name");
+    auto* command = program.add_subcommand("aliases", "Show the copy of each version prefix");
     auto prefix = std::make_shared<std::string>();
-    command->add_option("PREFIX", *prefix, "Only this prefix and those that go on from it behind a dot");
+    command->add_option("PREFIX", *prefix, "Only this prefix and longer ones, such as 9.7 for 9");
     command->callback([&admin, prefix] { admin.answer = [&admin, prefix] { return showAliases(admin, *prefix); }; });
 }
 

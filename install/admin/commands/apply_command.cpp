@@ -114,8 +114,8 @@ void addApplyCommand(CLI::App& program, Admin& admin) {
     auto* command = program.add_subcommand("apply", "Run a command of kz7InstallReg, or show what it would do");
     auto options = std::make_shared<ApplyOptions>();
     addChangeOptions(*command, *options);
-    command->add_flag("--no-level", options->noLevel, "With --check, do not load the library that knows the level");
-    command->add_option("COMMAND", options->words, "The option of kz7InstallReg with its arguments, after \"--\"")
+    command->add_flag("--no-level", options->noLevel, "With --check, load no level library");
+    command->add_option("COMMAND", options->words, "An option of kz7InstallReg and its arguments, after \"--\"")
         ->required();
     command->callback([&admin, options] { admin.answer = [&admin, options] { return apply(admin, *options); }; });
 }

@@ -153,8 +153,8 @@ void addCommitCommand(CLI::App& program, Admin& admin) {
     command->add_option("--response-file", words->responseFile, "Lines NAME = value; \"-\" is standard input")
         ->required()
         ->check(givenName());
-    command->add_option("--instance", words->instance, "The instance that it is set for; without: all of the copy");
-    command->add_option("--log", words->logFile, "The log; without: kz7msi.log in the state directory");
+    command->add_option("--instance", words->instance, "The instance; the whole copy without it");
+    command->add_option("--log", words->logFile, "The log; kz7msi.log in the state directory without it");
     auto* machine = command->add_flag("--machine", words->machine, "Speak the progress protocol, for a front end");
     addChangeOptions(*command, *words, machine);
     command->callback([&admin, words] { admin.answer = [&admin, words] { return commit(admin, *words); }; });

@@ -74,8 +74,10 @@ void addDiffCommand(CLI::App& program, Admin& admin) {
     auto* command = program.add_subcommand("diff", "Show what differs between two registries");
     auto options = std::make_shared<DiffOptions>();
     command->footer(
-        "A and B are each a state directory, a backup, a file of registry-editor text, or \".\" for this machine.\n"
-        "Exits with 0 if they are the same and with 1 if they differ.");
+        "A and B are each a state directory, a backup, a file of registry-editor text,\n"
+        "or \".\" for this machine.\n"
+        "\n"
+        "Exit codes: 0 they are the same; 1 they differ; 2 one cannot be read.\n");
     command->add_option("A", options->before, "The registry before")->required();
     command->add_option("B", options->after, "The registry after")->required();
     command->add_option("KEY", options->key, "The key to compare; without it everything");

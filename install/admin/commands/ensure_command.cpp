@@ -244,13 +244,12 @@ Answer ensure(Admin& admin, const EnsureOptions& options) {
 }  // namespace
 
 void addEnsureCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("ensure", "Add and remove copies until they are as a file lists them");
+    auto* command = program.add_subcommand("ensure", "Make the copies as a file lists them");
     auto options = std::make_shared<EnsureOptions>();
     addChangeOptions(*command, *options);
     command->add_option("--from", options->file, "A JSON file with the copies; \"-\" is standard input")->required();
     auto* prune = command->add_flag("--prune", options->prune, "Remove the copies that the file does not list");
-    command->add_flag("--all", options->all, "With --prune, remove the last copy too, and the product with it")
-        ->needs(prune);
+    command->add_flag("--all", options->all, "Remove the last copy and the product too")->needs(prune);
     command->add_flag("--services", options->services, "Correct services that belong to another location");
     command->callback([&admin, options] { admin.answer = [&admin, options] { return ensure(admin, *options); }; });
 }

@@ -96,7 +96,7 @@ Answer exportKeys(Admin& admin, const ExportOptions& options) {
 void addExportCommand(CLI::App& program, Admin& admin) {
     auto* command = program.add_subcommand("export", "Write keys as registry-editor text to standard output");
     auto options = std::make_shared<ExportOptions>();
-    command->add_option("KEY", options->key, "The key to begin at; without it everything there is to show");
+    command->add_option("KEY", options->key, "The key to begin at; everything without it");
     auto* utf16 = command->add_flag("--utf16", options->utf16, "Write UTF-16 as Windows' own editor does");
     command->add_flag("--json", options->json, "Write JSON for programs")->excludes(utf16);
     command->callback([&admin, options] { admin.answer = [&admin, options] { return exportKeys(admin, *options); }; });

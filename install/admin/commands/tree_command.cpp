@@ -42,7 +42,7 @@ Answer showTree(Admin& admin, const std::string& key) {
 void addTreeCommand(CLI::App& program, Admin& admin) {
     auto* command = program.add_subcommand("tree", "Show keys and values for reading");
     auto key = std::make_shared<std::string>();
-    command->add_option("KEY", *key, "The key to begin at; without it everything there is to show");
+    command->add_option("KEY", *key, "The key to begin at; everything without it");
     command->callback([&admin, key] { admin.answer = [&admin, key] { return showTree(admin, *key); }; });
 }
 
