@@ -45,7 +45,6 @@ TEST_F(AdminProgram, MovesWhatTheToolWroteToAnotherStore) {
         const StateDirectory other;
         const ProgramResult moved = store_.shell("kz7admin export "s + form + " | " + programPath("kz7admin") +
                                                  " --store '" + other.path() + "' import -");
-        EXPECT_EQ(moved.exitCode, 0) << moved.error;
         EXPECT_EQ(moved.output, "imported standard input into store " + other.file("registry.db") +
                                     ": 27 keys, 28 values\nchanged: 22 values, 26 keys, 1 service\n");
         EXPECT_EQ(admin({"export", "--store", other.path()}).output, exported.output);
@@ -66,30 +65,27 @@ TEST_F(AdminProgram, ShowsForReadingAndForPrograms) {
              "\"d\"=dword:ff\n\"m\"=hex(7):61,00,00,00,62,00,00,00,00,00\n\"q\"=hex(b):00,00,00,00,01,00,00,00\n"
              "\"z\"=hex(63):01,ff\n[HKLM\\K\\Sub]\n");
     ASSERT_EQ(admin({"import", path}).exitCode, 0);
-    const ProgramResult tree = admin({"tree"});
-    EXPECT_EQ(tree.exitCode, 0);
-    EXPECT_EQ(tree.error, storeLine());
-    EXPECT_EQ(tree.output, R"(HKEY_LOCAL_MACHINE
+    EXPECT_EQ(admin({"tree"}), (ProgramResult{0,
+                                              R"(HKEY_LOCAL_MACHINE
   K (class "c\x1b")
     @ REG_SZ "a\b"
     "\x0a" REG_SZ "\x1b\xe9\u202e)"
-                           "\xC3\xA9"
-                           R"(" (no NUL terminator)
+                                              "\xC3\xA9"
+                                              R"(" (no NUL terminator)
     "d" REG_DWORD 255 (0xff)
     "m" REG_MULTI_SZ "a" "b" ""
     "q" REG_QWORD 4294967296 (0x100000000)
     "z" type 99 01 ff
     Sub
-)");
-    const ProgramResult json = admin({"export", "--json", "HKLM\\K"});
-    EXPECT_EQ(json.error, storeLine());
-    EXPECT_EQ(json.output, "{\"store\":\"" + store_.file("registry.db") +
-                               R"(","keys":[
+)",
+                                              storeLine()}));
+    EXPECT_EQ(admin({"export", "--json", "HKLM\\K"}).output, "{\"store\":\"" + store_.file("registry.db") +
+                                                                 R"(","keys":[
 {"key":"HKEY_LOCAL_MACHINE\\K","class":"c\u001b","values":[
   {"name":"","type":1,"bytes":"615c6200","text":"a\\b"},
   {"name":"\u000a","type":1,"bytes":"1be9e280aec3a9","text":"\u001b\udce9)"
-                               "\xE2\x80\xAE\xC3\xA9"
-                               R"("},
+                                                                 "\xE2\x80\xAE\xC3\xA9"
+                                                                 R"("},
   {"name":"d","type":4,"bytes":"ff000000","number":255},
   {"name":"m","type":7,"bytes":"6100620000"},
   {"name":"q","type":11,"bytes":"0000000001000000","number":4294967296},
@@ -122,10 +118,7 @@ TEST_F(AdminProgram, ReportsMissingKeysAndFaults) {
     };
     // clang-format on
     for (const auto& row : rows) {
-        const ProgramResult result = admin(row.arguments);
-        EXPECT_EQ(result.exitCode, row.exitCode) << row.error;
-        EXPECT_EQ(result.output, row.output) << row.error;
-        EXPECT_EQ(result.error, row.error);
+        EXPECT_EQ(admin(row.arguments), (ProgramResult{row.exitCode, row.output, row.error}));
     }
     EXPECT_NE(access(missing.c_str(), F_OK), 0) << "nothing of all this makes a store";
 }
@@ -201,10 +194,8 @@ TEST_F(AdminProgram, BackupReplacesNothingThatItShouldNot) {
     EXPECT_EQ(admin({"backup", ""}).error, adminError("FILE: the name is empty (see --help)"));
     for (const auto& row : rows) {
         const Arguments words = {"backup", row.target, row.force ? "--force" : "--store=" + store_.path()};
-        const ProgramResult result = admin(words, {{}, row.inChild});
-        EXPECT_EQ(result.exitCode, 2) << row.target;
-        EXPECT_EQ(result.error, adminError("cannot write backup: " + row.target + ": " + row.reason));
-        EXPECT_EQ(result.output, "");
+        const std::string error = adminError("cannot write backup: " + row.target + ": " + row.reason);
+        EXPECT_EQ(admin(words, {{}, row.inChild}), (ProgramResult{2, "", error}));
         EXPECT_EQ(contents(old), "old") << row.target;
         EXPECT_EQ(store_.dump(), before) << row.target;
     }
@@ -276,18 +267,14 @@ TEST_F(AdminProgram, KeepsAStoreThatItCannotChange) {
          {std::tuple{"tree >/dev/full", 2, "error 112"},
           {"copies >&-", 2, "error 29"},
           {"export --utf16 | head -c 1 >/dev/null; exit ${PIPESTATUS[0]}", 0, ""}}) {
-        const ProgramResult result = store_.shell("kz7admin "s + command);
-        EXPECT_EQ(result.exitCode, exitCode) << command;
-        EXPECT_EQ(result.error,
-                  storeLine() + (exitCode == 0 ? "" : adminError("cannot write: standard output: "s + said)));
+        const std::string error = exitCode == 0 ? "" : adminError("cannot write: standard output: "s + said);
+        EXPECT_EQ(store_.shell("kz7admin "s + command), (ProgramResult{exitCode, "", storeLine() + error}));
     }
 
     overwrite(store_.file("registry.db"), "rubbish");
     for (const char* const command : {"tree", "import"}) {
-        const ProgramResult damaged = admin({command, "import"s == command ? file(kHead + "[HKLM\\a]\n"s) : "HKLM"s});
-        EXPECT_EQ(damaged.exitCode, 2);
-        EXPECT_EQ(damaged.error, adminError(store_.file("registry.db") + ": file is not a database"));
-        EXPECT_EQ(damaged.output, "");
+        EXPECT_EQ(admin({command, "import"s == command ? file(kHead + "[HKLM\\a]\n"s) : "HKLM"s}),
+                  (ProgramResult{2, "", adminError(store_.file("registry.db") + ": file is not a database")}));
     }
 }
 

@@ -191,28 +191,5 @@ TEST(RegText, ReadsAnySpellingOrReportsTheBadLine) {
     }
 }
 
-TEST(RegText, PassesEveryFaultOfTheStoreOn) {
-    const std::string file =
-        headed("[HKLM\\a\\b]\n\"x\"=\"y\"\n@=-\n[-HKLM\\old]\n[HKU\\c]\n;class=\"c\"\n@=dword:1\n");
-    for (const bool imports : {true, false}) {
-        std::string result;
-        const std::uint64_t calls = test::sweepFaults(
-            false,
-            [](test::FaultyMachine& machine) {
-                set(machine.registry_, "old\\k\\k", "x", ValueType::sz, "\0"sv);
-                set(machine.registry_, "a\\b", {}, ValueType::sz, "\0"sv);
-            },
-            [&](test::FaultyMachine& machine) {
-                result = imports ? importText(machine.registry(), file) : exportAll(machine.registry());
-                return kSuccess;
-            },
-            [&](test::FaultyMachine& machine, Status) {
-                const std::string& failed = machine.faults_.failed();
-                EXPECT_EQ(result.find("error 4321") != std::string::npos, !failed.empty() && failed != "closeKey");
-            });
-        EXPECT_GT(calls, 20U);
-    }
-}
-
 }  // namespace
 }  // namespace kz7

@@ -196,36 +196,5 @@ TEST(RemovalUnderFaults, DeletesByTheListOfCopies) {
     EXPECT_EQ(outcomes, expected);
 }
 
-class Trace final : public ICallObserver {
-public:
-    void after(const PortCall& call) override { text += call.text() + '\n'; }
-    std::string text;
-};
-
-TEST(CallObserver, SeesEveryCallWithItsArgumentsAndResult) {
-    Machine machine;
-    Trace trace;
-    InterceptedRegistry registry(machine.registry_, trace);
-    InterceptedProcesses processes(machine.processes_, trace);
-    FixedBuffer<8> data;
-    ValueType type{};
-    ProcessInformation started;
-    {
-        OwnedKey key(registry);
-        registry.createKey(KeyHandle::localMachine, "A", "c", kKeyFull, key.receive());
-        registry.setValue(key.get(), "n", ValueType::sz, std::string_view("x\0", 2));
-        registry.queryValue(key.get(), "n", &type, data);
-        registry.queryValue(key.get(), "m", nullptr, data);
-    }
-    processes.startProcess({"a b", "", StreamHandle::none, StreamHandle::none}, started);
-    EXPECT_EQ(trace.text,
-              "registry.createKey(0x80000002, \"A\", \"c\", 0xf003f, 0x100000001) = 0\n"
-              "registry.setValue(0x100000001, \"n\", 1, \"x\\x00\") = 0\n"
-              "registry.queryValue(0x100000001, \"n\", 1, \"x\\x00\") = 0\n"
-              "registry.queryValue(0x100000001, \"m\", null, ?) = 2\n"
-              "registry.closeKey(0x100000001) = 0\n"
-              "processes.startProcess(\"a b\", ?) = 2\n");
-}
-
 }  // namespace
 }  // namespace kz7::test

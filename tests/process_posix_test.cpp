@@ -135,20 +135,6 @@ TEST_F(PosixProcess, WaitsWithALimitWhenNoDescriptorIsFree) {
     });
 }
 
-TEST_F(PosixProcess, TheParentsOutputIsUnaffected) {
-    const std::string output = root_ + "/output";
-    inFork([&] {
-        ASSERT_NE(std::freopen(output.c_str(), "w", stdout), nullptr);
-        for (int run = 0; run < 4; ++run) {
-            std::printf("before %d\n", run);
-            outcome(childProgram() + (run == 2 ? " nothing" : " print said cried 0"));
-            // A file that is opened now may get a number that a slot still contains in another form.
-            open("/etc/passwd", O_RDONLY | O_CLOEXEC);
-        }
-    });
-    EXPECT_EQ(contents(output), "before 0\nbefore 1\nbefore 2\nbefore 3\n");
-}
-
 TEST_F(PosixProcess, RunsWithStandardDescriptorsClosedOrChildrenIgnored) {
     for (int closed = 0; closed < 16; ++closed) {
         SCOPED_TRACE(closed);

@@ -87,9 +87,7 @@ TEST_F(CommitProgram, ReportsWhyItCannotBegin) {
     for (const auto& row : rows) {
         std::vector<std::string> words = {"commit", "--copy", row.copy, "--response-file", row.responses};
         words.insert(words.end(), row.more.begin(), row.more.end());
-        const ProgramResult result = store_.run("kz7admin", words);
-        EXPECT_EQ(result.exitCode, 2) << row.why;
-        EXPECT_EQ(result.error, "kz7admin: " + row.error + "\n") << row.why;
+        EXPECT_EQ(store_.run("kz7admin", words), (ProgramResult{2, "", "kz7admin: " + row.error + "\n"})) << row.why;
     }
     const ProgramResult bad = commit("KZ7ACCOUNT = me\nwhat\n", {});
     EXPECT_EQ(bad.exitCode, 2);

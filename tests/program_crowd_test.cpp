@@ -129,6 +129,7 @@ const KilledFlow kFlows[] = {
     {"dotnet", {kAddFirst}, {"-dotnet", kSample}},
     {"ensure", {kAddFirst}, {"ensure", "--from", kList}},
     {"restore", {kAddFirst}, {"restore", kRegistry}},
+    {"import", {kAddFirst}, {"import", kRegistry}},
 };
 
 bool hasUnfinishedStore(const StateDirectory& state) {

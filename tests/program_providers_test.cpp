@@ -29,13 +29,12 @@ TEST_F(ProviderProgram, RegistersWhileItsProgramsUseTheStore) {
     // Each program adds a copy, which it could not do while its parent holds a transaction.
     const std::string hook = programPath("kz7InstallReg") + " -addKZ7Copy CHILD 'C:\\child' && " +
                              programPath("kz7admin") + " tree 'SOFTWARE\\Classes' | grep -q KZ7NMPdata";
-    const ProgramResult result = store_.tool({"-dotnet", "C:\\KZ7\\"}, {{"KZ7_SAMPLE_HOOK=" + hook}, {}});
-    EXPECT_EQ(result.exitCode, 0);
-    EXPECT_EQ(result.output,
-              "Level Returned: 9.1.0.0\n"
-              "C:\\KZ7\\bin\\kz7nmpcfg.exe -register -level 9.1.0 -kz7path C:\\KZ7\\\n"
-              "C:\\KZ7\\bin\\kz7nmpcfg_32.exe -register -level 9.1.0 -kz7path C:\\KZ7\\\n -migratev8 ");
-    EXPECT_EQ(result.error, "");
+    EXPECT_EQ(store_.tool({"-dotnet", "C:\\KZ7\\"}, {{"KZ7_SAMPLE_HOOK=" + hook}, {}}),
+              (ProgramResult{0,
+                             "Level Returned: 9.1.0.0\n"
+                             "C:\\KZ7\\bin\\kz7nmpcfg.exe -register -level 9.1.0 -kz7path C:\\KZ7\\\n"
+                             "C:\\KZ7\\bin\\kz7nmpcfg_32.exe -register -level 9.1.0 -kz7path C:\\KZ7\\\n -migratev8 ",
+                             ""}));
     const std::string records =
         "SOFTWARE\\Classes\\Installer\\Assemblies\\Global : KZ7NMPdata.DLL,level=\"9.1.0\","
         "generation=\"";
@@ -67,9 +66,8 @@ TEST_F(ProviderProgram, ErrorsAreInOrderWithTheOutput) {
 }
 
 TEST_F(ProviderProgram, LostOutputAndHostileTextsAreOneLineEach) {
-    const ProgramResult full = store_.shell("kz7InstallReg -addKZ7Copy C 'C:\\c' >/dev/full");
-    EXPECT_EQ(full.exitCode, 0);
-    EXPECT_EQ(full.error, "kz7InstallReg: cannot write standard output: error 112\n");
+    EXPECT_EQ(store_.shell("kz7InstallReg -addKZ7Copy C 'C:\\c' >/dev/full"),
+              (ProgramResult{0, "", "kz7InstallReg: cannot write standard output: error 112\n"}));
     EXPECT_EQ(store_.shell("kz7InstallReg -removeKZ7Copy NONE 2>&1 | true").error, "") << "a reader that is gone";
     const std::string hostile = store_.file("\x1b[2J\xD8\x9C");
     overwrite(hostile, "");
@@ -92,9 +90,8 @@ TEST_F(ProviderProgram, UsesNothingFromTheCurrentDirectory) {
 
 TEST_F(ProviderProgram, ShowsCopiesWithTheirServicesAndWrongAliases) {
     const std::string storeLine = store_.file("registry.db");
-    const ProgramResult none = store_.run("kz7admin", {"copies"});
-    EXPECT_EQ(none.exitCode, 1);
-    EXPECT_EQ(none.error, "kz7admin: no installed copy: " + storeLine + "\n");
+    EXPECT_EQ(store_.run("kz7admin", {"copies"}),
+              (ProgramResult{1, "", "kz7admin: no installed copy: " + storeLine + "\n"}));
     EXPECT_EQ(store_.run("kz7admin", {"aliases"}).exitCode, 1);
 
     store_.tool({"-addKZ7Copy", "COPY1", "C:\\KZ7"});

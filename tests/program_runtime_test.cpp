@@ -93,32 +93,6 @@ TEST_F(RuntimeProgram, KeepsItsLogWithoutAReaderAndItsReaderWithoutALog) {
     EXPECT_EQ(log(), "precious");
 }
 
-TEST_F(RuntimeProgram, FrontShowsARunAndAnswersIt) {
-    const std::string installer = programPath("kz7_installer");
-    const ProgramResult run = front({installer, "5"}, "/media\n");
-    EXPECT_EQ(run.exitCode, 5);
-    EXPECT_EQ(run.output,
-              "Installing 0%: Copying files\n"
-              "Installing 30%: Copying files, done\n"
-              "The installation medium was not found. Where is it?\n"
-              "Answer, or ABORT [D:\\]: /media\n"
-              "Installing 30%: Registering the copy\n"
-              "Installing 80%: Registering the copy, done\n"
-              "Installing 100%: done\n"
-              "Configuring 0%: Creating the instance\n"
-              "Configuring 100%: Creating the instance, done\n"
-              "The log is " +
-                  path("setup.log") + "\n");
-    EXPECT_EQ(run.error,
-              "error: Install CD not found\n"
-              "error: Installer::configure, step 20: error 5030: The program was not run, or it failed.\n" +
-                  installer + " ended with exit code 5.\n");
-    const ProgramResult aborted = front({installer, "0"});
-    EXPECT_EQ(aborted.exitCode, 1) << "no more answers abort";
-    EXPECT_NE(aborted.output.find("Answer, or ABORT [D:\\]: ABORT\n"), std::string::npos);
-    EXPECT_NE(aborted.output.find("Undoing: done\n"), std::string::npos);
-}
-
 // The end of a program ends its question, although an answer could still arrive.
 TEST_F(RuntimeProgram, FrontEndsWithAProgramThatAskedAndEnded) {
     overwrite(path("script"), "#!/bin/sh\necho 'MESSAGE QUERY CDPATH :: Where? :: '; exit 4\n");
@@ -129,10 +103,8 @@ TEST_F(RuntimeProgram, FrontEndsWithAProgramThatAskedAndEnded) {
             dup2(ends[0], 0);
         }
     };
-    const ProgramResult result =
-        store_.run("kz7admin", {"front", "--", path("script")}, {.environment = {}, .inChild = silent});
-    EXPECT_EQ(result.exitCode, 4);
-    EXPECT_EQ(result.output, "Where?\nAnswer, or ABORT: \n");
+    EXPECT_EQ(store_.run("kz7admin", {"front", "--", path("script")}, {.environment = {}, .inChild = silent}),
+              (ProgramResult{4, "Where?\nAnswer, or ABORT: \n", path("script") + " ended with exit code 4.\n"}));
 }
 
 TEST_F(RuntimeProgram, TheExampleSurvivesAnyAllocationThatFails) {
@@ -168,23 +140,22 @@ TEST_F(RuntimeProgram, FrontHandlesAnyProgram) {
         {"it closes all and goes on", "exec <&- >&- 2>&-; sleep 0.1; exit 9",     9,   "", ""},
         {"it floods both streams",  "i=0; while [ $i -lt 3000 ]; do echo 'PROGRESS TASK START :: INSTALLATION :: 1 :: 1 :: x'; echo y >&2; i=$((i+1)); done; exit 300", 44, bars, complaints},
         {"it echoes its answer",    "echo 'MESSAGE QUERY CDPATH :: x :: '; read a; echo \"$a\"", 0,
-                                    "x\nAnswer, or ABORT: ABORT\nABORT\nDone.\n", ""},
+                                    "x\nAnswer, or ABORT: /media\nRESPONSE :: /media\nDone.\n", ""},
     };
     // clang-format on
     const std::string program = path("script");
     for (const auto& row : rows) {
         overwrite(program, "#!/bin/sh\n" + row.lines + "\n");
         std::filesystem::permissions(program, std::filesystem::perms::owner_all);
-        const ProgramResult result = front({program, path("child"), "a b", "", "\"\\", "\\\\a\\\\", "'$*?"});
-        EXPECT_EQ(result.exitCode, row.exitCode) << row.why;
-        EXPECT_EQ(result.output, row.output) << row.why;
         const std::string ended = program + " ended with exit code " + std::to_string(row.exitCode) + ".\n";
-        EXPECT_EQ(result.error, row.error + (row.exitCode == 0 ? "" : ended)) << row.why;
+        const ProgramResult result =
+            front({program, path("child"), "a b", "", "\"\\", "\\\\a\\\\", "'$*?"}, "/media\n");
+        EXPECT_EQ(result, (ProgramResult{row.exitCode, row.output, row.error + (row.exitCode == 0 ? "" : ended)}))
+            << row.why;
     }
     kill(std::stoi(contents(path("child"))), SIGKILL);
-    const ProgramResult relative = front({"./script"});
-    EXPECT_EQ(relative.exitCode, 127) << "nothing is started from the current folder";
-    EXPECT_EQ(relative.error, "kz7admin: no such program: ./script (a path must be absolute)\n");
+    EXPECT_EQ(front({"./script"}),
+              (ProgramResult{127, "", "kz7admin: no such program: ./script (a path must be absolute)\n"}));
     EXPECT_EQ(front({"kz7 no such program"}).error, "kz7admin: no such program: kz7 no such program\n");
 }
 

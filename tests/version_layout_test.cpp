@@ -57,13 +57,6 @@ TEST(Version8, RestoresTheBackupAndWritesTheDefaults) {
 
 TEST(Version8, WritesTheDefaultsAfterOtherFailures) {
     Machine machine;
-    machine.run({"-v8", "C:\\KZ8"});
-    EXPECT_EQ(machine.console_.both,
-              "Creating version 8 registry\n" + kPrefix +
-                  "1466: Failed to copy copy SOFTWARE\\NVQ\\KZ7BackupV8 to SOFTWARE\\NVQ\\KZ7\n" + kPrefix +
-                  "1467: Create empty version 8 registry\n" + kDefaultLines +
-                  "Version 8 default registry keys created successfully\n" + kPrefix +
-                  "1523: Failed open the Service KZ7MGMTSVC - error code 1060\n");
     machine.set("SOFTWARE\\NVQ\\KZ7BackupV8", "too large", std::string(10001, 'x'));
     machine.addService("KZ7MGMTSVC", true);
     machine.servicesLeftOpen = 3;

@@ -4,6 +4,7 @@
 #include <sys/types.h>
 
 #include <functional>
+#include <ostream>
 #include <string>
 #include <vector>
 
@@ -15,6 +16,11 @@ struct ProgramResult {
     int exitCode = 0;  // or, below 0, the signal that ended it
     std::string output;
     std::string error;
+
+    bool operator==(const ProgramResult&) const = default;
+    friend std::ostream& operator<<(std::ostream& stream, const ProgramResult& result) {
+        return stream << result.exitCode << '|' << result.output << '|' << result.error;
+    }
 };
 
 struct ProgramOptions {
