@@ -4,10 +4,11 @@
 
 #include <random>
 
+#include "install/admin/ensurer.h"
 #include "install/admin/formats/change_text.h"
 #include "install/admin/preview.h"
 #include "install/src/registry/change_recorder.h"
-#include "tests/support/machine.h"
+#include "tests/support/fault_sweep.h"
 #include "tests/support/reg_text_store.h"
 
 namespace kz7::test {
@@ -125,6 +126,44 @@ TEST(ChangeSet, IsTheSameRecordedForetoldAndSeenAfterwards) {
         // Taken back already, it cannot be taken back again.
         EXPECT_EQ(findConflicts(machine.registry_, true, back, conflicts, key), kSuccess);
         EXPECT_EQ(conflicts.empty(), back.empty());
+    }
+}
+
+// Every call of an ensure fails in turn: what was made is recorded, or the record tells that it has gaps, and a run
+// that succeeds has made what a run without a fault makes.
+TEST(ChangeSet, IsRecordedWhateverFails) {
+    const std::vector<WantedCopy> wanted = {{"FIRST", "C:\\moved"}, {"THIRD", "C:\\third"}, {"SECOND", "", false}};
+    const auto prepare = [](FaultyMachine& machine) {
+        machine.run({"-addKZ7Copy", "FIRST", "C:\\first"});
+        machine.run({"-addKZ7Copy", "SECOND", "C:\\second"});
+    };
+    for (const bool forGood : {false, true}) {
+        Snapshot before;
+        ChangeSet recorded;
+        Status gaps = kSuccess;
+        std::string reached;  // by the runs that succeeded
+        const auto ensure = [&](FaultyMachine& machine) {
+            before = snapshotOf(machine.registry_);
+            RecordedPorts ports(machine.ports(), true, true);
+            Ensurer ensurer(ports.ports(), true, {.services = true});
+            const std::string refusal = ensurer.plan(wanted);
+            const Status status = refusal.empty() ? ensurer.make(wanted) : kFailed;
+            recorded = ports.changes();
+            gaps = ports.status();
+            return status;
+        };
+        const auto check = [&](FaultyMachine& machine, Status status) {
+            EXPECT_TRUE(gaps != kSuccess ||
+                        jsonOf(recorded) == jsonOf(difference(before, snapshotOf(machine.registry_))));
+            if (status == kSuccess) {
+                // A failed close of a service changes nothing of what is reached.
+                const std::string found = exportAll(machine.registry_);
+                EXPECT_TRUE(found == reached || reached.empty());
+                reached = found;
+            }
+        };
+        EXPECT_GT(sweepFaults(forGood, prepare, ensure, check), 100U);
+        EXPECT_NE(reached, "");
     }
 }
 

@@ -72,6 +72,33 @@ TEST_F(ChangesProgram, ForetellMakeAndTakeBack) {
     expect({"diff", backup, "."}, "||0");
 }
 
+TEST_F(ChangesProgram, RestoreReplacesAStoreThatIsMissingOrDamaged) {
+    ASSERT_EQ(store_.tool(kAddFirst).exitCode, 0);
+    const std::string backup = files_.path() + "/backup";
+    ASSERT_EQ(store_.run("kz7admin", {"backup", backup}).exitCode, 0);
+    const std::string bytes = std::string(20000, '?');
+
+    overwrite(store_.file("registry.db"), bytes);
+    const std::string damage = "|kz7admin: registry.db: file is not a database\n|0";
+    expect({"restore", "--check", backup}, "would change: 22 values, 26 keys, 1 service\n" + damage);
+    EXPECT_EQ(contents(store_.file("registry.db")), bytes);
+    expect({"restore", backup},
+           "! the store before is kept as registry.db.old\nchanged: 22 values, 26 keys, 1 service\n" + damage);
+    expect({"diff", ".", backup}, "||0");
+    EXPECT_EQ(contents(store_.file("registry.db.old")), bytes);
+
+    // The log of a store that is gone is not applied to the next one.
+    ASSERT_EQ(store_.tool(kAddSecond).exitCode, 0);
+    std::filesystem::remove(store_.file("registry.db"));
+    ASSERT_EQ(store_.tool(kAddFirst).exitCode, 0);
+    expect({"diff", ".", backup}, "||0");
+    std::filesystem::remove(store_.file("registry.db"));
+    expect({"restore", backup},
+           "! the store before is kept as registry.db.old3\n"
+           "changed: 22 values, 26 keys, 1 service\n||0");
+    expect({"diff", ".", backup}, "||0");
+}
+
 TEST_F(ChangesProgram, EnsureMakesTheCopiesOfAList) {
     const auto list = [&](const std::string& copies) { return file("list.json", "{\"copies\": [" + copies + "]}"); };
     const std::string a = R"({"name": "A", "location": "C:\\a"})";

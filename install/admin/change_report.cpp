@@ -67,8 +67,14 @@ void addChangeOptions(CLI::App& command, ChangeOptions& options, CLI::Option* ex
 }
 
 bool ChangeRun::isFailed() const {
-    return status != kSuccess ||
-           std::any_of(errors.begin(), errors.end(), [](const ErrorLine& error) { return error.isFailure; });
+    return status != kSuccess || hasFailure(errors);
+}
+
+void takeChanges(const RecordedPorts& recorded, ChangeRun& run) {
+    run.changes = recorded.changes();
+    if (const Status status = recorded.status(); status != kSuccess) {
+        run.notes.push_back(compose("some changes are not shown: their keys could not be read: error %u", {status}));
+    }
 }
 
 Answer fillPreview(Admin& admin, Preview& preview) {

@@ -36,6 +36,9 @@ struct ChangeRun {
     bool isFailed() const;
 };
 
+// The changes that were recorded, with a note if some of the states before could not be read.
+void takeChanges(const RecordedPorts& recorded, ChangeRun& run);
+
 // Fills a preview with the machine's state and reports a failure.
 Answer fillPreview(Admin& admin, Preview& preview);
 

@@ -1,8 +1,10 @@
 #include "install/admin/copy_location.h"
 
 #include "install/platform/service_manager.h"
+#include "install/platform/text.h"
 #include "install/src/registry/copy_layout.h"
 #include "install/src/registry/registry_access.h"
+#include "install/src/services/management_service.h"
 
 namespace kz7 {
 
@@ -12,6 +14,13 @@ std::string locationOf(IRegistryStore& registry, const std::string& copyPath) {
     const bool read = registry.openKey(KeyHandle::localMachine, copyPath, kKeyRead, key.receive()) == kSuccess &&
                       queryText(registry, key.get(), layout::kPathName, location) == kSuccess;
     return read ? std::string(location.text()) : std::string{};
+}
+
+bool isProgramOf(std::string_view location, std::string_view program) {
+    if (program.size() > 1 && program.front() == '"' && program.back() == '"') {
+        program = program.substr(1, program.size() - 2);
+    }
+    return equalsIgnoreCase(program, managementServiceProgram(location).view());
 }
 
 Status readServiceProgram(IRegistryStore& registry, std::string_view service, ValueState& program) {

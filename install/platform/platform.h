@@ -1,6 +1,7 @@
 // This machine's ports. Each opens what it needs on first use: a run that only prints its usage creates nothing.
 #pragma once
 
+#include <functional>
 #include <memory>
 #include <string>
 
@@ -83,6 +84,15 @@ public:
     // The content of a file that holds the whole store as it is at one moment, also while others write.
     // kFileNotFound: no store exists. kCallNotImplemented: the store is not the programs' own.
     virtual Status storeImage(std::string&) { return kCallNotImplemented; }
+
+    // Whether the store does not exist, or was found to be damaged.
+    virtual bool storeIsLost() { return false; }
+
+    // Puts a new store with what `fill` writes in the place of this one, or creates the missing one. The old one keeps
+    // its content under the name `kept`, empty if there was none. kBusy: somebody has it open. A fault is told.
+    virtual Status replaceStore(const std::function<Status(IRegistryStore&)>&, std::string& /*kept*/) {
+        return kCallNotImplemented;
+    }
 
     // Whether a path, as users of this host write it, names a file of the store, or of another one that has a log.
     virtual bool isStoreFile(const std::string&) { return false; }

@@ -18,6 +18,7 @@ inline constexpr Status kInvalidHandle           = 6;
 inline constexpr Status kInvalidData             = 13;    // a file that holds something else than it should
 inline constexpr Status kOutOfMemory             = 14;
 inline constexpr Status kWriteFault              = 29;    // a stream does not take what is written
+inline constexpr Status kReadFault               = 30;    // a list could not be read whole
 inline constexpr Status kGeneralFailure          = 31;    // a device or resource failed in a way that has no number
 inline constexpr Status kEndOfFile               = 38;    // nothing is left to read
 inline constexpr Status kFileExists              = 80;

@@ -18,7 +18,7 @@ constexpr std::string_view kRemoved  = "The KZ7 Copy %s has been removed";
 }  // namespace
 
 Status removeCopy(IRegistryStore& registry, IServiceManager& services, IDebugOutput& debug, Report& report,
-                  const char* copyName) {
+                  const char* copyName, bool keepsProduct) {
     InstallCopyList copies(registry, debug, false, false);
     if (copies.findByName(copyName) == nullptr) {
         // A store that cannot be read does not tell whether the copy exists.
@@ -28,9 +28,13 @@ Status removeCopy(IRegistryStore& registry, IServiceManager& services, IDebugOut
         report.line(kNotFound, {std::string_view(copyName)});
         return kMissingItem;
     }
+    const bool hasOthers = copies.status() == 0 && copies.count() > 1;
+    if (keepsProduct && !hasOthers) {
+        return kReadFault;
+    }
     // Deliberate: if the list could not be read completely, the whole product is deleted, as for the last copy. The
     // copy's 32-bit key and the values that name it remain.
-    if (copies.status() == 0 && copies.count() > 1) {
+    if (hasOthers) {
         deleteTree(registry, KeyHandle::localMachine, layout::kCopy, 0, copyName, {});
         const std::string copy = substituteCopyName(layout::kCopy, copyName);
         if (succeeded(checkPathLength(copy))) {

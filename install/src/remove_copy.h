@@ -9,8 +9,9 @@
 
 namespace kz7 {
 
-// 0, or kMissingItem if no copy has that name. The results of the deletions do not change it; a failed commit does.
+// 0; kMissingItem if no copy has that name; with `keepsProduct` kReadFault, and nothing is removed, if the list of
+// copies has no other one. The results of the deletions do not change it; a failed commit does.
 Status removeCopy(IRegistryStore& registry, IServiceManager& services, IDebugOutput& debug, Report& report,
-                  const char* copyName);
+                  const char* copyName, bool keepsProduct = false);
 
 }  // namespace kz7

@@ -25,10 +25,9 @@ void noteServices(IRegistryStore& registry, const ChangeSet& changes, ChangeRun&
             continue;
         }
         const std::string service(managementServiceName(change.key.substr(copies.size())).view());
-        const std::string_view location = change.after->text();
         ValueState program;
         if (readServiceProgram(registry, service, program) == kSuccess && !program.data.empty() &&
-            !equalsIgnoreCase(program.text().substr(0, location.size()), location)) {
+            !isProgramOf(change.after->text(), program.text())) {
             run.notes.push_back("service " + shownText(service) + " stays at " + shownText(program.text()));
         }
     }
@@ -76,7 +75,7 @@ Answer run(Admin& admin, const ApplyOptions& options, std::span<const char* cons
     RecordedPorts recorded(ports, admin.platform().storeIsOwn());
     ChangeRun run;
     run.status = runTool(recorded.ports(), arguments, &run.errors);
-    run.changes = recorded.changes();
+    takeChanges(recorded, run);
     run.output = kept.output;
     shown.endLine();
     noteServices(admin.registry(), run.changes, run);

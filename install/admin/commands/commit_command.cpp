@@ -115,7 +115,7 @@ Answer run(Admin& admin, const Words& words, ConfigurationRequest request) {
     }
     ChangeRun run;
     run.status = outcome.notSet == 0 ? kSuccess : kParameterNotSet;
-    run.changes = recorded.changes();
+    takeChanges(recorded, run);
     run.output = kept.output;
     run.heading = compose("%s: %u set, %u not set; the log is %s\n",
                           {shownText(words.copy), outcome.set, outcome.notSet, shownText(log)});

@@ -61,7 +61,7 @@ Answer importFile(Admin& admin, const ImportOptions& options) {
         return answer;
     }
     ChangeRun run;
-    run.changes = recorded.changes();
+    takeChanges(recorded, run);
     std::size_t values = 0;
     for (const KeyChange& change : changes) {
         values += change.values.size();

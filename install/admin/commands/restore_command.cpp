@@ -11,21 +11,19 @@ struct RestoreOptions : ChangeOptions {
     std::string file;
 };
 
-Answer restore(Admin& admin, const RestoreOptions& options) {
-    if (!admin.open(options.check, true)) {
-        return kAnswerFault;
-    }
+Answer nothingToRestore(Admin& admin, const RestoreOptions& options) {
+    return admin.fault("nothing to restore: " + shownText(options.file));
+}
+
+// The product's keys and services, and no others, in one transaction.
+Answer restoreKeys(Admin& admin, const RestoreOptions& options, RegistrySource& file) {
     const bool isOwn = admin.platform().storeIsOwn();
-    RegistrySource file(admin, options.file);
     Snapshot wanted;
-    if (const Answer opened = file.open(); opened != kAnswerYes) {
-        return opened;
-    }
     if (const Answer read = file.readProduct(isOwn, wanted); read != kAnswerYes) {
         return read;
     }
     if (wanted.empty()) {
-        return admin.fault("nothing to restore: " + shownText(options.file));
+        return nothingToRestore(admin, options);
     }
     RegistrySource machine(admin, ".");
     Snapshot live;
@@ -50,6 +48,50 @@ Answer restore(Admin& admin, const RestoreOptions& options) {
         }
     }
     return showRun(admin, options, run);
+}
+
+// A new store with everything that the file holds, in the place of one that is missing or damaged.
+Answer restoreStore(Admin& admin, const RestoreOptions& options, RegistrySource& file) {
+    MemoryRegistry empty;
+    std::vector<KeyStart> roots;
+    Snapshot before;
+    Snapshot wanted;
+    std::string key;
+    findEverything(empty, true, roots);
+    readSnapshot(empty, true, roots, before, key);
+    if (const Answer read = file.read({}, true, wanted); read != kAnswerYes) {
+        return read;
+    }
+    ChangeRun run;
+    run.changes = difference(before, wanted);
+    if (run.changes.empty()) {
+        return nothingToRestore(admin, options);
+    }
+    if (!options.check) {
+        std::string kept;
+        const auto fill = [&](IRegistryStore& store) { return applyChangeSet(store, nullptr, run.changes, key); };
+        if (const Status status = admin.platform().replaceStore(fill, kept); status != kSuccess) {
+            return admin.storeFault("cannot replace store: " + shownText(admin.platform().storeName()), status);
+        }
+        if (!kept.empty()) {
+            run.notes.push_back("the store before is kept as " + shownText(kept));
+        }
+    }
+    return showRun(admin, options, run);
+}
+
+Answer restore(Admin& admin, const RestoreOptions& options) {
+    if (!admin.open(options.check, true)) {
+        return kAnswerFault;
+    }
+    IPlatform& platform = admin.platform();
+    RegistrySource file(admin, options.file);
+    if (const Answer opened = file.open(); opened != kAnswerYes) {
+        return opened;
+    }
+    const Answer answer = platform.storeIsLost() ? kAnswerFault : restoreKeys(admin, options, file);
+    // Damage is found when the store is read or changed.
+    return answer == kAnswerFault && platform.storeIsLost() ? restoreStore(admin, options, file) : answer;
 }
 
 }  // namespace

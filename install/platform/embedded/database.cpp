@@ -54,24 +54,28 @@ int queryNumber(sqlite3* connection, const char* sql, std::int64_t& number) {
     return SQLITE_OK;
 }
 
+int copyDatabase(sqlite3* source, sqlite3* target) {
+    sqlite3_backup* const backup = sqlite3_backup_init(target, "main", source, "main");
+    if (backup == nullptr) {
+        return sqlite3_errcode(target);
+    }
+    const int result = sqlite3_backup_step(backup, -1);
+    const int finished = sqlite3_backup_finish(backup);
+    if (result == SQLITE_DONE) {
+        return SQLITE_OK;
+    }
+    return finished == SQLITE_OK ? result : finished;
+}
+
 int copyToMemory(sqlite3* source, Connection& memory) {
     sqlite3* opened = nullptr;
     int result = sqlite3_open_v2(":memory:", &opened, SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX, nullptr);
     Connection owned(opened);
-    if (result != SQLITE_OK) {
-        return result;
+    result = result == SQLITE_OK ? copyDatabase(source, opened) : result;
+    if (result == SQLITE_OK) {
+        memory = std::move(owned);
     }
-    sqlite3_backup* const backup = sqlite3_backup_init(opened, "main", source, "main");
-    if (backup == nullptr) {
-        return sqlite3_errcode(opened);
-    }
-    result = sqlite3_backup_step(backup, -1);
-    const int finished = sqlite3_backup_finish(backup);
-    if (result != SQLITE_DONE) {
-        return finished == SQLITE_OK ? result : finished;
-    }
-    memory = std::move(owned);
-    return SQLITE_OK;
+    return result;
 }
 
 }  // namespace kz7

@@ -55,7 +55,11 @@ int execute(sqlite3* connection, const char* sql);
 // The first column of the statement's first row, as a number.
 int queryNumber(sqlite3* connection, const char* sql, std::int64_t& number);
 
-// Copies a whole database, as the source's transaction sees it, to a new one in memory. The source has the error.
+// Replaces the content of a database by that of another, as the transaction of the source sees it. The target has the
+// error.
+int copyDatabase(sqlite3* source, sqlite3* target);
+
+// Copies a whole database to a new one in memory. The source has the error.
 int copyToMemory(sqlite3* source, Connection& memory);
 
 }  // namespace kz7

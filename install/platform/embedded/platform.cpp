@@ -29,15 +29,7 @@ public:
         : program_(options.program),
           byDefault_(options.stateDirectory.empty() && std::getenv("KZ7_STATE_DIR") == nullptr),
           directory_(absolute(options.stateDirectory.empty() ? usualStateDirectory() : options.stateDirectory)),
-          registry_(directory_, options.readOnly,
-                    [this](const StoreFault& fault) {
-                        if (!faultTold_) {
-                            console_->writeError(program_ + ": " + shownText(fault.file) + ": " +
-                                                 shownText(fault.reason) + "\n");
-                        }
-                        faultTold_ = true;
-                    },
-                    {options.backup, options.missingIsEmpty}) {
+          registry_(directory_, options.readOnly, listener(), {options.backup, options.missingIsEmpty}) {
         ports_ = {&registry_,        &services_,       console_.get(), debugOutput_.get(),
                   files_.get(),      processes_.get(), threads_.get(), libraries_.get(),
                   assemblies_.get(), host_.get(),      terminal_.get()};
@@ -55,6 +47,14 @@ public:
         return embeddedAssemblies(registry, directory_);
     }
     Status storeImage(std::string& image) override { return registry_.image(image); }
+    bool storeIsLost() override { return isDamaged_ || !registry_.exists(); }
+    Status replaceStore(const std::function<Status(IRegistryStore&)>& fill, std::string& kept) override {
+        faultTold_ = false;
+        EmbeddedRegistry content({}, false, listener(), {.inMemory = true});
+        Status status = fill(content);
+        status = status == kSuccess ? content.commit() : status;
+        return status == kSuccess ? registry_.replaceBy(content, kept) : status;
+    }
     bool isStoreFile(const std::string& path) override { return registry_.isFile(path); }
 
     std::string storeNote() override {
@@ -64,9 +64,20 @@ public:
     }
 
 private:
+    EmbeddedRegistry::FaultListener listener() {
+        return [this](const StoreFault& fault) {
+            if (!faultTold_) {
+                console_->writeError(program_ + ": " + shownText(fault.file) + ": " + shownText(fault.reason) + "\n");
+            }
+            faultTold_ = true;
+            isDamaged_ = isDamaged_ || fault.status == kRegistryCorrupt || fault.status == kNotRegistryFile;
+        };
+    }
+
     std::string program_;
     bool byDefault_;
     bool faultTold_ = false;
+    bool isDamaged_ = false;
     std::string directory_;
     std::unique_ptr<IConsole> console_ = standardConsole();
     std::unique_ptr<IDebugOutput> debugOutput_ = embeddedDebugOutput(*console_);

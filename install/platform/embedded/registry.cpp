@@ -111,6 +111,11 @@ Status EmbeddedRegistry::begin() {
     if (const int result = execute(connection_.get(), readOnly_ ? "BEGIN" : "BEGIN IMMEDIATE"); result != SQLITE_OK) {
         return fail(result);
     }
+    int hasMoved = 0;
+    sqlite3_file_control(connection_.get(), "main", SQLITE_FCNTL_HAS_MOVED, &hasMoved);
+    if (!readOnly_ && hasMoved != 0) {
+        return fail(StoreFault{kBusy, path(), "was replaced by another program while it was open"});
+    }
     inTransaction_ = true;
     ++transaction_;
     childless_ = 0;
@@ -190,6 +195,16 @@ Status EmbeddedRegistry::image(std::string& bytes) {
     }
     bytes.assign(reinterpret_cast<const char*>(content.get()), static_cast<std::size_t>(size));
     return kSuccess;
+}
+
+Status EmbeddedRegistry::replaceBy(EmbeddedRegistry& content, std::string& kept) {
+    endTransaction();
+    statements_ = {};
+    connection_.reset();
+    logPages_ = 0;
+    fault_ = kSuccess;
+    const StoreFault fault = file_.replace(content.connection_.get(), kept);
+    return fault.status == kSuccess ? kSuccess : fail(fault);
 }
 
 Query EmbeddedRegistry::query(Sql which) {

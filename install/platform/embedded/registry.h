@@ -29,10 +29,14 @@ public:
     ~EmbeddedRegistry() override;
 
     const std::string& path() const { return file_.path(); }
+    bool exists() const { return file_.exists(); }
     bool isFile(const std::string& path) const { return file_.isPart(path); }
 
     // The content of a file with the whole store, in this transaction. kFileNotFound: no store exists.
     Status image(std::string& bytes);
+
+    // Puts the content of another store in the place of this one; see StoreFile::replace(). Keys must not be open.
+    Status replaceBy(EmbeddedRegistry& content, std::string& kept);
 
     Status openKey(KeyHandle parent, std::string_view path, AccessMask access, KeyHandle& key) override;
     Status createKey(KeyHandle parent, std::string_view path, std::string_view keyClass, AccessMask access,

@@ -6,6 +6,7 @@
 #include <sys/random.h>
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <array>
 #include <chrono>
 #include <cstdlib>
@@ -116,6 +117,44 @@ bool randomName(const std::string& prefix, std::string& name) {
 
 bool unfinishedStoreName(std::string& name) {
     return randomName(unfinishedPrefix(), name);
+}
+
+int setAside(const std::string& directory, std::string& kept) {
+    constexpr std::string_view kLogs[] = {"-wal", "-journal"};
+    const std::string store = directory + '/' + kStoreName;
+    const auto exists = [](const std::string& path) {
+        struct stat found {};
+        return lstat(path.c_str(), &found) == 0;
+    };
+    const auto isUsed = [&](const std::string& path) {
+        return exists(path) || std::any_of(std::begin(kLogs), std::end(kLogs),
+                                           [&](std::string_view log) { return exists(path + std::string(log)); });
+    };
+    kept.clear();
+    if (!isUsed(store)) {
+        return 0;
+    }
+    std::string name = store + ".old";
+    for (int number = 2; isUsed(name); ++number) {
+        name = store + ".old" + std::to_string(number);
+    }
+    for (const std::string_view log : kLogs) {
+        const std::string path = store + std::string(log);
+        if (rename(path.c_str(), (name + std::string(log)).c_str()) != 0 && errno != ENOENT) {
+            return errno;
+        }
+    }
+    if (unlink((store + "-shm").c_str()) != 0 && errno != ENOENT) {
+        return errno;
+    }
+    if (link(store.c_str(), name.c_str()) != 0 && errno != ENOENT) {
+        const bool hasNoLinks = errno == EPERM || errno == EOPNOTSUPP;
+        if (!hasNoLinks || rename(store.c_str(), name.c_str()) != 0) {
+            return errno;
+        }
+    }
+    kept = std::move(name);
+    return 0;
 }
 
 void removeUnfinishedStores(const std::string& path) {

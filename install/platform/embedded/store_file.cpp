@@ -124,6 +124,9 @@ StoreFault StoreFile::stayedLocked() const {
 }
 
 StoreFault StoreFile::openForWriting(Connection& connection) {
+    if (reading_.inMemory) {
+        return openEmpty(connection);
+    }
     if (!exists()) {
         if (StoreFault fault = make(); fault.status != kSuccess) {
             return fault;
@@ -181,30 +184,72 @@ StoreFault StoreFile::openCopy(Connection& connection) const {
 // under another name, the others find it finished. A killed process leaves at most a file that the next one removes.
 // (Switching a shared new file to a write-ahead log fails regardless of the busy timeout.)
 StoreFault StoreFile::make() {
+    OwnedDescriptor folder;
+    StoreFault fault = lock(folder);
+    // If the name exists, even as a link without a target, the open decides.
+    struct stat found {};
+    if (fault.status != kSuccess || lstat(path_.c_str(), &found) == 0) {
+        return fault;
+    }
+    std::string kept;
+    return put(folder, nullptr, kept);
+}
+
+StoreFault StoreFile::lock(OwnedDescriptor& folder) const {
     if (directory_.empty()) {
         return checkDirectory();
     }
     if (const int error = makeFolder(directory_); error != 0) {
         return refused(kCannotOpen, directory_, error);
     }
-    OwnedDescriptor folder;
-    if (const int error = lockFolder(directory_, kBusyTimeout, folder); error != 0) {
-        return error == EWOULDBLOCK ? stayedLocked() : refused(kCannotOpen, directory_, error);
+    const int error = lockFolder(directory_, kBusyTimeout, folder);
+    if (error == EWOULDBLOCK) {
+        return stayedLocked();
     }
-    // If the name exists, even as a link without a target, the open decides.
+    return error == 0 ? StoreFault{} : refused(kCannotOpen, directory_, error);
+}
+
+StoreFault StoreFile::replace(sqlite3* content, std::string& kept) {
+    OwnedDescriptor folder;
+    OwnedDescriptor store;
+    StoreFault fault = lock(folder);
+    fault = fault.status == kSuccess ? lockOut(store) : fault;
+    return fault.status == kSuccess ? put(folder, content, kept) : fault;
+}
+
+// SQLite holds a lock of a store in use. One that opened the store before and reads it later finds that it has moved.
+StoreFault StoreFile::lockOut(OwnedDescriptor& store) const {
+    OwnedDescriptor opened(::open(path_.c_str(), O_RDWR | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
     struct stat found {};
-    if (fstatat(folder.get(), kStoreName, &found, AT_SYMLINK_NOFOLLOW) == 0) {
+    if (!opened && errno == ENOENT) {
         return {};
     }
+    if (!opened || fstat(opened.get(), &found) != 0) {
+        return refused(kCannotOpen, path_, errno);
+    }
+    struct flock whole {};
+    whole.l_type = F_WRLCK;
+    if (!S_ISREG(found.st_mode)) {
+        return {kCannotOpen, path_, "is not a regular file"};
+    }
+    if (fcntl(opened.get(), F_OFD_SETLK, &whole) != 0) {
+        return errno == EAGAIN || errno == EACCES ? StoreFault{kBusy, path_, "is in use by another program"}
+                                                  : refused(kCannotOpen, path_, errno);
+    }
+    store = std::move(opened);
+    return {};
+}
+
+StoreFault StoreFile::put(const OwnedDescriptor& folder, sqlite3* content, std::string& kept) {
     removeUnfinishedStores(directory_);
-    StoreFault fault = build(folder);
+    StoreFault fault = build(folder, content, kept);
     if (fault.status != kSuccess) {
         removeUnfinishedStores(directory_);
     }
     return fault;
 }
 
-StoreFault StoreFile::build(const OwnedDescriptor& folder) {
+StoreFault StoreFile::build(const OwnedDescriptor& folder, sqlite3* content, std::string& kept) {
     std::string name;
     if (!unfinishedStoreName(name)) {
         return refused(kCannotOpen, path_, errno);
@@ -219,19 +264,20 @@ StoreFault StoreFile::build(const OwnedDescriptor& folder) {
     int result = connect(name, SQLITE_OPEN_READWRITE, connection);
     // The schema is written first: in rollback mode a small file is written once, and the switch then only changes its
     // header.
-    for (const char* sql :
-         {"PRAGMA page_size = 4096; PRAGMA synchronous = OFF; BEGIN", kSchema, "COMMIT", "PRAGMA journal_mode = WAL"}) {
-        if (result == SQLITE_OK) {
-            result = execute(connection.get(), sql);
-        }
+    for (const char* sql : {"PRAGMA page_size = 4096; PRAGMA synchronous = OFF; BEGIN", kSchema, "COMMIT"}) {
+        result = result == SQLITE_OK ? execute(connection.get(), sql) : result;
     }
+    if (result == SQLITE_OK && content != nullptr) {
+        result = copyDatabase(content, connection.get());
+    }
+    result = result == SQLITE_OK ? execute(connection.get(), "PRAGMA journal_mode = WAL") : result;
     if (result != SQLITE_OK) {
         return explain(connection.get(), result);
     }
     connection.reset();
     // The lock makes this safe on file systems without hard links and without a rename that does not replace.
-    if (fsync(file.get()) != 0 || renameat(folder.get(), name.c_str(), folder.get(), kStoreName) != 0 ||
-        fsync(folder.get()) != 0) {
+    if (fsync(file.get()) != 0 || (errno = setAside(directory_, kept)) != 0 ||
+        renameat(folder.get(), name.c_str(), folder.get(), kStoreName) != 0 || fsync(folder.get()) != 0) {
         return refused(kCannotOpen, path_, errno);
     }
     return {};

@@ -18,8 +18,9 @@ struct StoreFault {
 
 // How a store is read.
 struct StoreReading {
-    std::string backup;           // a file that is read instead of the store
+    std::string backup = {};      // a file that is read instead of the store
     bool missingIsEmpty = false;  // a state directory that does not exist reads as empty
+    bool inMemory = false;        // no file: an empty store that can be written
 };
 
 class StoreFile {
@@ -40,6 +41,10 @@ public:
     // reads as empty. Close the connection before this object is destroyed.
     StoreFault openForReading(Connection& connection);
 
+    // Puts a new store with the content of a database in the place of this one, which may be damaged or missing, and
+    // sets this one aside. kBusy: another process has it open. This process must not.
+    StoreFault replace(sqlite3* content, std::string& kept);
+
     // Describes a failed SQLite call on this store.
     StoreFault explain(sqlite3* connection, int result) const;
 
@@ -50,7 +55,10 @@ private:
     StoreFault openEmpty(Connection& connection) const;
     StoreFault checkVersion(sqlite3* connection, int result) const;
     StoreFault make();
-    StoreFault build(const OwnedDescriptor& folder);
+    StoreFault lock(OwnedDescriptor& folder) const;
+    StoreFault lockOut(OwnedDescriptor& store) const;
+    StoreFault put(const OwnedDescriptor& folder, sqlite3* content, std::string& kept);
+    StoreFault build(const OwnedDescriptor& folder, sqlite3* content, std::string& kept);
     // Opens the file of that name in the state directory; the connection is set on failure too, for its message.
     int connect(const std::string& name, int flags, Connection& connection);
     StoreFault refused(Status status, const std::string& file, int error) const;

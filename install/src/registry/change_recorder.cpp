@@ -73,11 +73,14 @@ ChangeRecorder::Spelling ChangeRecorder::spell(const KeyName& name, bool exists)
         const auto [known, isNew] = spelled_.try_emplace(walkPlace(spelling.name + '\\' + std::string(part)));
         if (isNew) {
             Subkey found{std::string(part), {}};
-            OwnedKey key(registry_);
-            if ((!rest.empty() || exists) &&
-                registry_.openKey(parent.root, parent.path, kKeyWalk | kKeyOpenLink, key.receive()) == kSuccess &&
-                reader_.subkey(key.get(), part, found) != kSuccess) {
-                found = {std::string(part), {}};
+            if (!rest.empty() || exists) {
+                OwnedKey key(registry_);
+                Status status = registry_.openKey(parent.root, parent.path, kKeyWalk | kKeyOpenLink, key.receive());
+                status = status == kSuccess ? reader_.subkey(key.get(), part, found) : status;
+                keep(isNotFound(status) ? kSuccess : status);
+                if (status != kSuccess) {
+                    found = {std::string(part), {}};
+                }
             }
             known->second = {spelling.name + '\\' + found.name, std::move(found.keyClass)};
         }
@@ -266,7 +269,9 @@ public:
                 recorder_.created(name, keyClass);
             }
         } else if (status != kSuccess) {
+            const Status unread = status;
             status = real_.createKey(parent, path, keyClass, access, key);
+            recorder_.keep(status == kSuccess ? unread : kSuccess);
         }
         return opened(status, name, key);
     }

@@ -25,6 +25,7 @@ public:
 
     // The first failure to read a state before; the record then has gaps.
     Status status() const { return status_; }
+    void keep(Status status) { status_ = status_ == kSuccess ? status : status_; }
 
     // Before a key that does not exist is created, and after it was: with its missing parents.
     void beforeCreate(const KeyName& name);
@@ -72,8 +73,6 @@ private:
     Key& note(const KeyName& name, bool exists);
     bool exists(const KeyName& name);
     void list(const KeyName& name, Key& key);
-    void keep(Status status) { status_ = status_ == kSuccess ? status : status_; }
-
     IRegistryStore& registry_;
     bool wholeServices_;
     KeyReader reader_;

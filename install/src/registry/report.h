@@ -2,6 +2,7 @@
 // the line number that support knows the error by.
 #pragma once
 
+#include <algorithm>
 #include <cstdint>
 #include <initializer_list>
 #include <string>
@@ -32,6 +33,10 @@ struct ErrorLine {
     std::string text;
     bool isFailure = true;
 };
+
+inline bool hasFailure(const std::vector<ErrorLine>& errors) {
+    return std::any_of(errors.begin(), errors.end(), [](const ErrorLine& error) { return error.isFailure; });
+}
 
 class Report {
 public:
