@@ -55,7 +55,7 @@ Status KeyReader::all(std::vector<Item>& found, Read read) {
 
 Status KeyReader::subkeyAt(KeyHandle key, std::uint32_t index, Subkey& found) {
     return grow(class_, [&](Buffer& keyClass) {
-        Buffer name(name_.data(), static_cast<std::uint32_t>(name_.size()));
+        Buffer name(name_.get(), kNameRoom);
         const Status status = registry_.enumerateKey(key, index, name, &keyClass);
         found = {std::string(name.view()), std::string(keyClass.view())};
         return status;
@@ -64,7 +64,7 @@ Status KeyReader::subkeyAt(KeyHandle key, std::uint32_t index, Subkey& found) {
 
 Status KeyReader::valueAt(KeyHandle key, std::uint32_t index, KeyValue& found) {
     return grow(data_, [&](Buffer& data) {
-        Buffer name(name_.data(), static_cast<std::uint32_t>(name_.size()));
+        Buffer name(name_.get(), kNameRoom);
         ValueType type{};
         const Status status = registry_.enumerateValue(key, index, name, &type, &data);
         found = {std::string(name.view()), type, std::string(data.view())};

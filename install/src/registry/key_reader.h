@@ -2,6 +2,7 @@
 // they are given.
 #pragma once
 
+#include <memory>
 #include <optional>
 #include <string>
 #include <vector>
@@ -63,8 +64,9 @@ private:
     Status valueAt(KeyHandle key, std::uint32_t index, KeyValue& found);
 
     IRegistryStore& registry_;
-    std::string name_ =
-        std::string(std::size_t{4} * (kMaxValueName + 1), '\0');  // bytes of a name in any narrow encoding
+    // Bytes of a name in any narrow encoding; not initialized, because many readers read one value only.
+    static constexpr std::uint32_t kNameRoom = 4 * (kMaxValueName + 1);
+    std::unique_ptr<char[]> name_ = std::make_unique_for_overwrite<char[]>(kNameRoom);
     std::string class_ = std::string(256, '\0');
     std::string data_ = std::string(4096, '\0');
 };

@@ -1,0 +1,129 @@
+// Check mode and wanted copies on the embedded store, compared with reading or writing the same rows.
+#include <benchmark/benchmark.h>
+
+#include "bench/bare_store.h"
+#include "install/admin/ensurer.h"
+#include "install/admin/preview.h"
+#include "install/src/registry/change_recorder.h"
+#include "install/src/registry/change_set.h"
+#include "install/src/uselvlkz7reg.h"
+
+namespace kz7 {
+namespace {
+
+std::unique_ptr<IPlatform> platformOf(const Scratch& scratch) {
+    return hostPlatform({.program = "bench", .stateDirectory = scratch.path(), .ownProcess = false});
+}
+
+std::vector<WantedCopy> copies(std::int64_t count) {
+    std::vector<WantedCopy> wanted;
+    for (std::int64_t copy = 0; copy < count; ++copy) {
+        wanted.push_back({"COPY" + std::to_string(copy), "C:\\KZ7"});
+    }
+    return wanted;
+}
+
+// As the command does it, without the reading of its file.
+std::size_t ensure(IPlatform& platform, const std::vector<WantedCopy>& wanted) {
+    MemoryConsole console;
+    Ports ports = platform.ports();
+    ports.console = &console;
+    RecordedPorts recorded(ports, true, true);
+    Ensurer ensurer(recorded.ports(), true, {});
+    require(ensurer.plan(wanted).empty() && ensurer.make(wanted) == kSuccess);
+    const std::size_t changes = recorded.changes().size();
+    require(platform.registry().commit() == kSuccess);
+    return changes;
+}
+
+Snapshot readProduct(IRegistryStore& registry) {
+    std::vector<KeyStart> starts;
+    Snapshot snapshot;
+    std::string key;
+    require(findEverything(registry, false, starts) == kSuccess &&
+            readSnapshot(registry, true, starts, snapshot, key) == kSuccess);
+    return snapshot;
+}
+
+// A store with that many copies; the last one is kept.
+const Scratch& storeWith(std::int64_t count) {
+    static std::unique_ptr<Scratch> kept;
+    static std::int64_t size = -1;
+    if (std::exchange(size, count) != count) {
+        kept = std::make_unique<Scratch>();
+        ensure(*platformOf(*kept), copies(count));
+    }
+    return *kept;
+}
+
+void sizes(benchmark::internal::Benchmark* bench) {
+    bench->ArgName("copies")->Arg(1000)->Arg(5000)->Arg(10000)->Arg(100000);
+    bench->Iterations(1)->Repetitions(3)->ReportAggregatesOnly()->Unit(benchmark::kMillisecond);
+}
+
+void checkOfAnAdd(benchmark::State& state) {
+    const std::unique_ptr<IPlatform> platform = platformOf(storeWith(state.range(0)));
+    const char* const add[] = {"kz7InstallReg", "-addKZ7Copy", "NEW", "C:\\KZ7"};
+    for (auto step : state) {
+        Preview preview(*platform, false);
+        std::string key;
+        require(preview.fill(key) == kSuccess && runTool(preview.ports(), add) == kSuccess);
+        require(!preview.changes().empty());
+    }
+}
+BENCHMARK(checkOfAnAdd)->Apply(sizes);
+
+void ensureOfUnchangedCopies(benchmark::State& state) {
+    const std::unique_ptr<IPlatform> platform = platformOf(storeWith(state.range(0)));
+    const std::vector<WantedCopy> wanted = copies(state.range(0));
+    for (auto step : state) {
+        require(ensure(*platform, wanted) == 0);
+    }
+}
+BENCHMARK(ensureOfUnchangedCopies)->Apply(sizes);
+
+// The floor of both.
+void readingOfTheProduct(benchmark::State& state) {
+    const std::unique_ptr<IPlatform> platform = platformOf(storeWith(state.range(0)));
+    for (auto step : state) {
+        require(!readProduct(platform->registry()).empty());
+        platform->registry().commit();
+    }
+}
+BENCHMARK(readingOfTheProduct)->Apply(sizes);
+
+void ensureOfNewCopies(benchmark::State& state) {
+    const Scratch scratch;
+    const std::unique_ptr<IPlatform> platform = platformOf(scratch);
+    const std::vector<WantedCopy> wanted = copies(state.range(0));
+    for (auto step : state) {
+        require(ensure(*platform, wanted) != 0);
+    }
+}
+BENCHMARK(ensureOfNewCopies)->Apply(sizes);
+
+// The floor: the same rows, whose places are known.
+void bareWritesOfNewCopies(benchmark::State& state) {
+    const Snapshot rows = readProduct(platformOf(storeWith(state.range(0)))->registry());
+    const Scratch scratch;
+    BareStore store(scratch);
+    for (auto step : state) {
+        store.run("BEGIN IMMEDIATE");
+        std::vector<std::int64_t> parents;  // by depth
+        for (const KeyRecord& row : rows) {
+            parents.resize(row.depth);
+            const std::string name = row.depth == 0 ? row.name : row.name.substr(row.name.find_last_of('\\') + 1);
+            const std::int64_t key = store.addKey(parents.empty() ? 1 : parents.back(), name);
+            parents.push_back(key);
+            std::int64_t place = 0;
+            for (const KeyValue& value : row.values) {
+                store.addValue(key, value.name, value.data, ++place);
+            }
+        }
+        store.run("COMMIT");
+    }
+}
+BENCHMARK(bareWritesOfNewCopies)->Apply(sizes);
+
+}  // namespace
+}  // namespace kz7
