@@ -79,7 +79,7 @@ TEST_F(AdminProgram, ShowsForReadingAndForPrograms) {
     Sub
 )",
                                               storeLine()}));
-    EXPECT_EQ(admin({"export", "--json", "HKLM\\K"}).output, "{\"store\":\"" + store_.file("registry.db") +
+    EXPECT_EQ(admin({"export", "--json", "HKLM\\K"}).output, "{\"schema\":1,\"store\":\"" + store_.file("registry.db") +
                                                                  R"(","keys":[
 {"key":"HKEY_LOCAL_MACHINE\\K","class":"c\u001b","values":[
   {"name":"","type":1,"bytes":"615c6200","text":"a\\b"},
@@ -212,17 +212,15 @@ TEST_F(AdminProgram, FitsTheTerminalAndEscapesControlCharacters) {
             "stty -opost cols 80; " + columns + ' ' + programPath("kz7admin") + ' ' + command + " 2>/dev/null";
         return runProgram({"/usr/bin/script", "-qec", line, "/dev/null"}, {{"KZ7_STATE_DIR=" + store_.path()}, {}});
     };
-    const std::string table = R"(NAME   VIEW    VERSION    VALID  LOCATION              SERVICE
-PLAIN  native  9.7.800.0  yes    C:\KZ7                KZ7MGMTSVC_PLAIN stopped
-PLAIN  32-bit  9.7.800.0  yes    C:\KZ7                KZ7MGMTSVC_PLAIN stopped
-東京   native  9.7.800.0  yes    C:\Program Files\KZ7  KZ7MGMTSVC_東京 stopped
-東京   32-bit  9.7.800.0  yes    C:\Program Files\KZ7  KZ7MGMTSVC_東京 stopped
+    const std::string table = R"(NAME   VIEW  VERSION    VALID  LOCATION              SERVICE
+PLAIN  both  9.7.800.0  yes    C:\KZ7                KZ7MGMTSVC_PLAIN stopped
+東京   both  9.7.800.0  yes    C:\Program Files\KZ7  KZ7MGMTSVC_東京 stopped
 )";
     EXPECT_EQ(onTerminal("", "copies").output, table);
     EXPECT_EQ(admin({"copies"}, {{"COLUMNS=40"}, {}}).output, table) << "nothing is wrapped in a pipe";
     const std::string list = onTerminal("COLUMNS=40", "copies").output;
     EXPECT_EQ(list.substr(0, list.find("\n\n")), R"(NAME      PLAIN
-VIEW      native
+VIEW      both
 VERSION   9.7.800.0
 VALID     yes
 LOCATION  C:\KZ7

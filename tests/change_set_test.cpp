@@ -7,6 +7,7 @@
 #include "install/admin/ensurer.h"
 #include "install/admin/formats/change_text.h"
 #include "install/admin/preview.h"
+#include "install/admin/repair.h"
 #include "install/src/registry/change_recorder.h"
 #include "tests/support/fault_sweep.h"
 #include "tests/support/reg_text_store.h"
@@ -21,12 +22,16 @@ int levelOfCopy(std::uint32_t, void* info) {
 
 class RandomMachine : public Machine {
 public:
-    explicit RandomMachine(unsigned seed) : random_(seed) {
+    // In order, with a location that has everything.
+    RandomMachine() {
         servicesLeftOpen = 1000;
         libraries_.libraries["C:\\a\\bin\\kz7install64.dll"]["sqleGetLevelInfo"] =
             reinterpret_cast<LibraryFunction>(levelOfCopy);
         files_.add("C:\\a\\bin\\kz7mgmtsvc.exe");
         assemblies_.files = {"kz7nmpx.dll"};
+    }
+    explicit RandomMachine(unsigned seed) : RandomMachine() {
+        random_.seed(seed);
         for (std::size_t step = random_() % 12; step > 0; --step) {
             if (random_() % 3 == 0) {
                 addRow();
@@ -46,6 +51,47 @@ public:
                                                {"-v9", location},
                                                {"-v8", location},
                                                {"-dotnet", location}});
+    }
+
+    // What a flow never leaves: rows that are gone, changed or foreign.
+    void damage() {
+        for (std::size_t step = random_() % 8; step > 0; --step) {
+            const std::string view =
+                pick({"SOFTWARE\\NVQ\\KZ7\\InstalledCopies", "SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies"});
+            const std::string copy = view + '\\' + pick({"A", "b", "kz7build", "two words", "debris"});
+            const std::string key =
+                copy + pick({"", "\\Components", "\\CurrentVersion", "\\GLOBAL_PROFILE", "\\PROFILES"});
+            const std::string service = "SYSTEM\\CurrentControlSet\\Services\\KZ7MGMTSVC_" + pick({"A", "b", "ghost"});
+            switch (random_() % 7) {
+                case 0:
+                    deleteTree(registry_, KeyHandle::localMachine, pick({key, view, service}), 0, {}, {});
+                    break;
+                case 1:
+                    set(key,
+                        pick({"KZ7 Path Name", "KZ7PATH", "Version", "Release", "Service Level", "Fix Level", "own"}),
+                        pick({"", "10", "C:\\other place", std::string(300, 'p')}));
+                    break;
+                case 2:
+                    setRaw(view, pick({"9", "9.7", "9.6", "8", std::string(100, '9'), std::string(101, 'x')}),
+                           pick({std::string(), std::string("B"), std::string(120, 'n'), std::string("GONE\0", 5)}),
+                           pick<ValueType>({ValueType::sz, ValueType::binary}));
+                    break;
+                case 3:
+                    set(service, "ImagePath", pick({"C:\\a b\\x.exe", "C:\\a\\bin\\kz7mgmtsvc.exe"}));
+                    files_.add("C:\\a.exe");
+                    break;
+                case 4:
+                    setRaw(service, "Start", std::string("\4\0\0\0", 4), ValueType::dword);
+                    break;
+                case 5:
+                    setText(registry_, "SOFTWARE\\NVQ\\KZ7BackupV8\\PROFILES", "v", "8");
+                    break;
+                default:
+                    OwnedKey saved(registry_);
+                    registry_.createKey(KeyHandle::users, "S-1\\SOFTWARE\\NVQ\\KZ7\\TEMP\\PROPERTIES95", {}, kKeyFull,
+                                        saved.receive());
+            }
+        }
     }
 
 private:
@@ -165,6 +211,107 @@ TEST(ChangeSet, IsRecordedWhateverFails) {
         EXPECT_GT(sweepFaults(forGood, prepare, ensure, check), 100U);
         EXPECT_NE(reached, "");
     }
+}
+
+MachineState stateOf(IRegistryStore& registry) {
+    MachineState state;
+    std::string key;
+    EXPECT_EQ(readMachine(registry, Depth::whole, state, key), kSuccess) << key;
+    return state;
+}
+
+// After a repair the check finds nothing of its kind but what no record can tell, and the inverse brings the damage
+// back.
+TEST(Repair, LeavesNothingOfItsKindAndCanBeTakenBack) {
+    std::map<std::string_view, std::size_t> repaired;
+    for (unsigned seed = 0; seed < 1500; ++seed) {
+        const std::string_view group =
+            std::array<std::string_view, 5>{"aliases", "copies", "services", "properties", "migration"}[seed % 5];
+        SCOPED_TRACE(std::string(group) + ", seed " + std::to_string(seed));
+        RandomMachine machine(seed);
+        machine.damage();
+        const std::string damaged = exportAll(machine.registry_);
+        const auto isOfGroup = [&](const Finding& finding) { return finding.kind().group == group; };
+        const auto found = findFindings(stateOf(machine.registry_), machine.files_, false);
+        ChangeSet changes;
+        std::vector<Finding> rest;
+        std::string key;
+        {
+            RecordedPorts ports(machine.ports(), true, true);
+            const RepairRequest request{{group}, {}, {}, {}, group == "migration"};
+            ASSERT_EQ(repairMachine(ports.ports(), true, request, rest, key), kSuccess) << key;
+            changes = ports.changes();
+        }
+        EXPECT_TRUE(machine.processes_.started.empty());
+        repaired[group] += std::any_of(found.begin(), found.end(), isOfGroup) ? 1 : 0;
+        const MachineState after = stateOf(machine.registry_);
+        for (const Finding& finding : findFindings(after, machine.files_, false)) {
+            const CopyRow* const copy = after.find(finding.copy);
+            const bool isKnown = copy == nullptr || !copy->shown().location.empty();
+            EXPECT_FALSE(isOfGroup(finding) && isKnown) << findingLine(finding);
+        }
+        ASSERT_EQ(applyChangeSet(machine.registry_, nullptr, inverse(changes), key), kSuccess) << key;
+        ASSERT_EQ(exportAll(machine.registry_), damaged);
+    }
+    for (const auto& [group, count] : repaired) {
+        EXPECT_GT(count, 20U) << group;
+    }
+}
+
+// Installers give a copy one location, and go back to version 8 before they remove copies.
+TEST(Check, IsSilentAfterEveryOptionOnAMachineInOrder) {
+    for (unsigned seed = 0; seed < 300; ++seed) {
+        std::mt19937 random(seed);
+        RandomMachine machine;
+        std::string shown;
+        for (int step = 0; step < 12; ++step) {
+            const std::string name = std::array{"A", "B", "COPY9", "COPY10"}[random() % 4];
+            const std::vector<std::string> commands[] = {{"-addKZ7Copy", name, "C:\\Program Files\\" + name},
+                                                         {"-addKZ7Copy", name, "C:\\Program Files\\" + name},
+                                                         {"-removeKZ7Copy", name},
+                                                         {"-dotnet", "C:\\a"},
+                                                         {"-v9", "C:\\a"},
+                                                         {"-removeKZ7Copy", "kz7build"},
+                                                         {"-addv9", name, "C:\\Program Files\\" + name}};
+            const auto& command =
+                step == 0 && seed % 2 == 0 ? std::vector<std::string>{"-v8", "C:\\8"} : commands[random() % 7];
+            machine.run(command);
+            shown += command[0] + ' ' + command[1] + "; ";
+            std::string lines;
+            for (const Finding& finding : findFindings(stateOf(machine.registry_), machine.files_, false)) {
+                lines += findingLine(finding);
+            }
+            ASSERT_EQ(lines, "") << shown;
+        }
+    }
+}
+
+// A call that fails ends the check and a repair with a status; a walk over the aliases that fails counts as ended.
+TEST(RepairUnderFaults, EndsWithAStatus) {
+    const auto prepare = [](FaultyMachine& machine) {
+        machine.run({"-addKZ7Copy", "A", "C:\\a"});
+        machine.set(std::string(layout::kCopies), "9", "GONE");
+        deleteTree(machine.registry_, KeyHandle::localMachine, "SYSTEM\\CurrentControlSet\\Services\\KZ7MGMTSVC_A", 0,
+                   {}, {});
+        deleteTree(machine.registry_, KeyHandle::localMachine, std::string(layout::kCopies) + "\\A\\PROFILES", 0, {},
+                   {});
+    };
+    const auto repair = [](FaultyMachine& machine) {
+        RecordedPorts ports(machine.ports(), true, true);
+        const RepairRequest request{{"aliases", "copies", "services"}, {}, {}, {}, false};
+        std::vector<Finding> rest;
+        std::string key;
+        return repairMachine(ports.ports(), true, request, rest, key);
+    };
+    const auto check = [](FaultyMachine& machine, Status status) {
+        const std::string& failed = machine.faults_.failed();
+        const bool mayPass = failed.empty() || failed.starts_with("close") || failed.starts_with("enumerate") ||
+                             failed == "probe" || failed == "openKey" || failed == "queryValue";
+        EXPECT_TRUE(mayPass || status != kSuccess) << failed;
+        EXPECT_TRUE(!failed.empty() || status == kSuccess);
+    };
+    EXPECT_GT(sweepFaults(false, prepare, repair, check), 100U);
+    EXPECT_GT(sweepFaults(true, prepare, repair, check), 100U);
 }
 
 }  // namespace

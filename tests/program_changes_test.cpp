@@ -2,6 +2,8 @@
 #include <gtest/gtest.h>
 
 #include <filesystem>
+#include <regex>
+#include <set>
 
 #include "tests/support/state_directory.h"
 
@@ -117,6 +119,168 @@ TEST_F(ChangesProgram, EnsureMakesTheCopiesOfAList) {
            "|kz7admin: cannot remove A: the last copy takes the whole product along (--prune --all removes it)\n|2");
     EXPECT_EQ(store_.run("kz7admin", {"ensure", "--prune", "--all", "--from", list("")}).exitCode, 0);
     EXPECT_EQ(told({"copies"}).find("native"), std::string::npos);
+}
+
+TEST_F(ChangesProgram, CheckReportsRepairCorrectsAndResolveAnswers) {
+    expect({"check"}, "||0");
+    ASSERT_EQ(store_.tool(kAddFirst).exitCode, 0);
+    ASSERT_EQ(store_.tool(kAddSecond).exitCode, 0);
+    store_.tool({"-dotnet", KZ7_SAMPLE});
+    expect({"check"}, "||0");
+    expect({"resolve", "9.7"},
+           "   NAME    VERSION    LOCATION       WHY\n"
+           "*  SECOND  9.7.800.0  C:\\KZ7\\second  the highest that begins with 9.7\n"
+           "   FIRST   9.7.800.0  C:\\KZ7\\first   lower\n||0");
+    expect({"resolve", "9", "--field", "location", "--view", "32-bit"}, "C:\\KZ7\\second\n||0");
+    expect({"resolve", "8"}, "|kz7admin: alias 8 (native view): does not exist\n|1");
+    ASSERT_EQ(store_.tool({"-removeKZ7Copy", "SECOND"}).exitCode, 0);
+    expect({"check"}, "||0");
+    EXPECT_NE(told({"check", "--all"}).find("removed-copy (deliberate): copy SECOND (32-bit view): "),
+              std::string::npos);
+    EXPECT_TRUE(told({"resolve", "9"})
+                    .ends_with("|kz7admin: alias 9 (native view): names SECOND, which was removed; the next -dotnet "
+                               "rewrites the aliases; "
+                               "repair: kz7admin repair aliases\n|1"));
+    expect({"copies"},
+           "NAME    VIEW     VERSION    VALID  LOCATION       SERVICE\n"
+           "FIRST   both     9.7.800.0  yes    C:\\KZ7\\first   KZ7MGMTSVC_FIRST stopped\n"
+           "SECOND  removed  9.7.800.0  yes    C:\\KZ7\\second  none\n|kz7admin: store registry.db\n|0");
+
+    const std::string copies = "[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies";
+    ASSERT_EQ(store_
+                  .run("kz7admin",
+                       {"import",
+                        file("damage.reg",
+                             "Windows Registry Editor Version 5.00\n" + copies + "]\n\"9.7\"=\"GONE\"\n@=\"FIRST\"\n" +
+                                 copies + "\\FIRST]\n\"KZ7 Path Name\"=\"C:\\\\b\"\n" + copies +
+                                 "\\x<script>]\n[HKEY_LOCAL_MACHINE\\SYSTEM\\CurrentControlSet\\Services\\KZ7MGMTSVC_"
+                                 "OLD]\n\"Start\"=dword:2\n")})
+                  .exitCode,
+              0);
+    const std::string damaged = store_.dump();
+    const std::string services =
+        "service-elsewhere: service KZ7MGMTSVC_FIRST: runs C:\\KZ7\\first\\bin\\kz7mgmtsvc.exe, but its copy is at "
+        "C:\\b; "
+        "repair: kz7admin repair services FIRST\n"
+        "orphan-service: service KZ7MGMTSVC_OLD: its copy does not exist: a removal did not end; repair: kz7admin "
+        "repair "
+        "services OLD\n";
+    expect(
+        {"check"},
+        "stale-alias: alias 9.7 (native view): names GONE, which is not installed; it should name FIRST; repair: "
+        "kz7admin repair aliases\n"
+        "views-differ: copy FIRST: is at C:\\b (KZ7PATH C:\\KZ7\\first) for 64-bit programs and at C:\\KZ7\\first for "
+        "32-bit programs; repair: kz7admin repair copies FIRST\n"
+        "half-copy: copy x<script> (native view): lacks everything: an add or a removal did not end; repair: kz7admin "
+        "repair copies \"x<script>\", or kz7InstallReg -removeKZ7Copy \"x<script>\"\n"
+        "half-copy: copy x<script> (32-bit view): lacks everything: an add or a removal did not end; repair: kz7admin "
+        "repair copies \"x<script>\", or kz7InstallReg -removeKZ7Copy \"x<script>\"\n" +
+            services + "||1");
+    const std::string page = store_.run("kz7admin", {"report"}).output;
+    EXPECT_NE(page.find("x&lt;script&gt;"), std::string::npos);
+    EXPECT_EQ(page.find("<script"), std::string::npos);
+    expect({"report", "-o", file("page.html", "old")},
+           "|kz7admin: cannot write report: page.html: file exists (--force replaces it)\n|2");
+    expect({"check", "NONE"}, "|kz7admin: no such copy: NONE (see kz7admin copies)\n|1");
+    expect({"copies", "--default", "--columns", "name,location", "--format", "tsv", "--version", "[9.7,9.8)"},
+           "FIRST\tC:\\b\n|kz7admin: store registry.db\n|0");
+    expect({"copies", "--version", "[9.8"}, "|kz7admin: not a range of versions: [9.8 (write [9.7,9.8) or 9.7)\n|2");
+
+    expect({"repair", "--check", "aliases"}, "would change: 8 values\n||0");
+    EXPECT_EQ(store_.dump(), damaged);
+    expect({"repair", "rubbish"}, "|kz7admin: neither a kind of finding nor a copy: rubbish (see kz7admin check)\n|2");
+    expect({"repair", "aliases", "FIRST", "services"},
+           "|kz7admin: not a kind of finding: FIRST (see kz7admin repair --help)\n|2");
+    expect({"repair"}, "changed: 9 values, 1 key\n||0");
+    expect({"check"}, services + "||1");
+    expect({"repair", "services", "OLD"}, "changed: 1 service\n||0");
+    expect({"repair", "services"}, "changed: 1 service\n||0");
+    expect({"check"}, "||0");
+}
+
+// One row for each error line and each status of the sources.
+TEST_F(ChangesProgram, ExplainsEveryErrorLineAndStatus) {
+    const std::string install = KZ7_SOURCE "/install/";
+    std::set<std::string> numbers;
+    const auto gather = [&](const std::string& path, const std::regex& pattern) {
+        const std::string text = contents(path);
+        for (std::sregex_iterator match(text.begin(), text.end(), pattern), end; match != end; ++match) {
+            numbers.insert((*match)[1]);
+        }
+    };
+    gather(install + "platform/status.h", std::regex("constexpr Status k\\w+ += (\\w+);"));
+    EXPECT_GT(numbers.size(), 60U);
+    for (const auto& entry : std::filesystem::recursive_directory_iterator(install + "src")) {
+        gather(entry.path(), std::regex("(?:ErrorText k\\w+ *\\{|^ +\\{)\\s*(\\d+), +\"", std::regex::multiline));
+    }
+    EXPECT_GT(numbers.size(), 90U);
+    Arguments words = {"explain"};
+    words.insert(words.end(), numbers.begin(), numbers.end());
+    const ProgramResult explained = store_.run("kz7admin", words);
+    EXPECT_EQ(explained.exitCode, 0) << explained.error;
+    EXPECT_TRUE(
+        store_.run("kz7admin", {"explain", "157"}).output.starts_with("status 5021 (seen as 157 in a POSIX shell): "));
+    expect({"explain", "123456"}, "|kz7admin: neither an error line nor a status of this system: 123456\n|1");
+    expect({"explain", "nonsense"},
+           "|kz7admin: not a number: nonsense (give a status, an error line's number or -)\n|2");
+    const std::string pasted =
+        store_.shell("kz7InstallReg -v8 'C:\\8' 2>&1 | " + programPath("kz7admin") + " explain -").output;
+    for (const char* const part : {"error line 1466 of -v8\n", "error line 1523 of -v8 -v9\n", "status 1060: "}) {
+        EXPECT_NE(pasted.find(part), std::string::npos) << pasted;
+    }
+}
+
+// Every field that a command prints is in the page about the JSON, and every field of the page is printed.
+TEST_F(ChangesProgram, JsonFieldsAreThoseOfThePage) {
+    store_.tool(kAddFirst);
+    store_.tool({"-dotnet", KZ7_SAMPLE});
+    const std::string reg =
+        file("x.reg",
+             "Windows Registry Editor Version "
+             "5.00\n[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies\\half]\n\"n\"=dword:1\n");
+    const std::string list = file("list.json", R"({"copies": [{"name": "A", "location": "C:\\a"}]})");
+    const std::string responses = file("r.rsp", "KZ7COMM = TCPIP\n");
+    const std::string backup = files_.path() + "/backup";
+    std::string printed;
+    for (const Arguments& command :
+         {Arguments{"backup", backup},
+          {"apply", "--", "-v8", "C:\\8"},
+          {"import", reg},
+          {"commit", "--copy", "FIRST", "--response-file", responses, "--log", files_.path() + "/log"},
+          {"ensure", "--from", list},
+          {"copies"},
+          {"aliases"},
+          {"check", "--all"},
+          {"resolve", "9"},
+          {"explain", "392", "5021"},
+          {"facts"},
+          {"tree", "SOFTWARE\\NVQ"},
+          {"export"},
+          {"report", "-o", files_.path() + "/page.html"},
+          {"front", "/bin/true"},
+          {"diff", backup, "."},
+          {"repair", "--check"},
+          {"restore", backup}}) {
+        Arguments words = command;
+        words.insert(words.begin() + 1, "--json");
+        const ProgramResult result = store_.run("kz7admin", words);
+        EXPECT_LT(result.exitCode, 2) << command[0] << result.error;
+        EXPECT_TRUE(result.output.starts_with("{\"schema\":1,")) << command[0] << result.output;
+        printed += result.output;
+    }
+    const auto names = [](const std::string& text, const std::regex& pattern) {
+        std::set<std::string> found;
+        for (std::sregex_iterator match(text.begin(), text.end(), pattern), end; match != end; ++match) {
+            found.insert((*match)[1]);
+        }
+        return found;
+    };
+    std::string page;
+    for (const std::string& cell :
+         names(contents(KZ7_SOURCE "/docs/json.md"), std::regex("^\\| (`[^|]*`) \\|", std::regex::multiline))) {
+        page += cell;
+    }
+    EXPECT_EQ(names(printed, std::regex("[{,\n]\"([A-Za-z0-9]+)\":")), names(page, std::regex("`(\\w+)`")));
 }
 
 TEST_F(ChangesProgram, BadInputIsOneLineAndChangesNothing) {

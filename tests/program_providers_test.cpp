@@ -113,17 +113,17 @@ TEST_F(ProviderProgram, ShowsCopiesWithTheirServicesAndWrongAliases) {
     ASSERT_EQ(store_.run("kz7admin", {"import", store_.file("more.reg")}).exitCode, 0);
 
     EXPECT_EQ(store_.run("kz7admin", {"copies"}).output,
-              "NAME   VIEW    VERSION    VALID  LOCATION  SERVICE\n"
-              "COPY1  native  9.7.800.0  yes    C:\\KZ7    KZ7MGMTSVC_COPY1 stopped\n"
-              "COPY1  32-bit  9.7.800.0  yes    C:\\KZ7    KZ7MGMTSVC_COPY1 stopped\n"
-              "five   native  9.8.0.0.1  yes    none      none\n"
-              "half   native  ...0       no     C:\\h      none\n"
-              "vee    native  v9.8.0.0   yes    none      none\n");
+              "NAME   VIEW         VERSION    VALID  LOCATION  SERVICE\n"
+              "COPY1  both         9.7.800.0  yes    C:\\KZ7    KZ7MGMTSVC_COPY1 stopped\n"
+              "five   native only  9.8.0.0.1  yes    none      none\n"
+              "half   native only  ...0       no     C:\\h      none\n"
+              "vee    native only  v9.8.0.0   yes    none      none\n");
     const std::string json = store_.run("kz7admin", {"copies", "--json"}).output;
     EXPECT_EQ(json.substr(0, json.find(",\n")),
-              "{\"store\":\"" + storeLine +
+              "{\"schema\":1,\"store\":\"" + storeLine +
                   "\",\"copies\":[\n{\"name\":\"COPY1\",\"view\":\"native\",\"version\":\"9.7.800.0\",\"valid\":true,"
-                  "\"location\":\"C:\\\\KZ7\",\"service\":\"KZ7MGMTSVC_COPY1\",\"state\":\"stopped\"}");
+                  "\"location\":\"C:\\\\KZ7\",\"service\":\"KZ7MGMTSVC_COPY1\",\"state\":\"stopped\",\"default\":false,"
+                  "\"removed\":false}");
     EXPECT_EQ(store_.run("kz7admin", {"aliases", "9.8"}).output,
               "PREFIX     NATIVE  32-BIT  SHOULD BE  WHY\n"
               "9.8        -       -       five       9.8.0.0.1 is the highest that begins with it\n"

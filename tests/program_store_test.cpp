@@ -64,7 +64,18 @@ TEST(StoreFaults, BadStoresEndWithAStatusAndOneLineThatNamesTheFile) {
             ":941: Unable to add a new copy of KZ7 to this machine : rc = " + std::to_string(row.status) + "\n"))
             << result.error;
         EXPECT_EQ(result.output.find("added successfully"), std::string::npos) << row.why;
-        EXPECT_EQ(state.run("kz7admin", {"copies"}).error, "kz7admin: " + path + ": " + row.said + "\n") << row.why;
+        for (const Arguments& command : {Arguments{"copies"},
+                                         {"aliases"},
+                                         {"check"},
+                                         {"resolve", "9"},
+                                         {"facts"},
+                                         {"report"},
+                                         {"repair"},
+                                         {"repair", "--check"}}) {
+            const ProgramResult refused = state.run("kz7admin", command);
+            EXPECT_EQ(refused.error, "kz7admin: " + path + ": " + row.said + "\n") << row.why << command[0];
+            EXPECT_EQ(refused.exitCode, 2) << row.why << command[0];
+        }
     }
 }
 

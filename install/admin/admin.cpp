@@ -133,6 +133,30 @@ Answer Admin::storeFault(std::string_view what, Status status) {
     return kAnswerFault;
 }
 
+Answer Admin::findFile(std::string_view what, const std::string& file, std::string& path) {
+    const Status status = platform_->files().productPath(file, path);
+    if (status != kSuccess || platform_->isStoreFile(file)) {
+        return fault(compose("cannot write %s: %s: %s",
+                             {what, shownText(file), status != kSuccess ? reasonOf(status) : "part of a store"}));
+    }
+    return kAnswerYes;
+}
+
+Answer Admin::checkFile(std::string_view what, const std::string& file) {
+    std::string path;
+    return findFile(what, file, path);
+}
+
+Answer Admin::writeFile(std::string_view what, const std::string& file, std::string_view content, bool replace) {
+    std::string path;
+    if (const Answer found = findFile(what, file, path); found != kAnswerYes) {
+        return found;
+    }
+    const Status status = platform_->files().writeFile(path, content, replace);
+    return status == kSuccess ? kAnswerYes
+                              : fault(compose("cannot write %s: %s: %s", {what, shownText(file), reasonOf(status)}));
+}
+
 std::string reasonOf(Status status) {
     // clang-format off
     static constexpr std::array<std::pair<Status, std::string_view>, 7> kReasons = {{

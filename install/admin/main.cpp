@@ -49,13 +49,19 @@ int run(int argc, char** argv) {
     addAliasesCommand(program, admin);
     addApplyCommand(program, admin);
     addBackupCommand(program, admin);
+    addCheckCommand(program, admin);
     addCommitCommand(program, admin);
     addCopiesCommand(program, admin);
     addDiffCommand(program, admin);
     addEnsureCommand(program, admin);
+    addExplainCommand(program, admin);
     addExportCommand(program, admin);
+    addFactsCommand(program, admin);
     addFrontCommand(program, admin);
     addImportCommand(program, admin);
+    addRepairCommand(program, admin);
+    addReportCommand(program, admin);
+    addResolveCommand(program, admin);
     addRestoreCommand(program, admin);
     addTreeCommand(program, admin);
     try {

@@ -4,6 +4,7 @@
 #include <functional>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "install/platform/assembly_cache.h"
 #include "install/platform/console.h"
@@ -93,6 +94,9 @@ public:
     virtual Status replaceStore(const std::function<Status(IRegistryStore&)>&, std::string& /*kept*/) {
         return kCallNotImplemented;
     }
+
+    // Lists the damages of a store that is the programs' own; other stores are the host's to examine.
+    virtual Status examineStore(std::vector<std::string>&) { return kSuccess; }
 
     // Whether a path, as users of this host write it, names a file of the store, or of another one that has a log.
     virtual bool isStoreFile(const std::string&) { return false; }

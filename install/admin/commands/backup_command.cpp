@@ -2,6 +2,7 @@
 #include <memory>
 
 #include "install/admin/commands/commands.h"
+#include "install/admin/formats/json_text.h"
 #include "install/admin/formats/reg_text.h"
 #include "install/admin/given_name.h"
 #include "install/platform/text.h"
@@ -12,11 +13,8 @@ namespace {
 struct BackupOptions {
     std::string file;
     bool force = false;
+    bool json = false;
 };
-
-Answer fail(Admin& admin, const BackupOptions& options, std::string_view reason) {
-    return admin.fault(compose("cannot write backup: %s: %s", {shownText(options.file), reason}));
-}
 
 // The product's keys in the registry of a machine, as its own editor reads them. A key that cannot be read fails the
 // backup.
@@ -55,20 +53,21 @@ Answer backUp(Admin& admin, const BackupOptions& options) {
     if (!admin.open(true)) {
         return kAnswerFault;
     }
-    IFileSystem& files = admin.platform().files();
-    std::string path;
-    if (const Status status = files.productPath(options.file, path); status != kSuccess) {
-        return fail(admin, options, reasonOf(status));
-    }
-    if (admin.platform().isStoreFile(options.file)) {
-        return fail(admin, options, "part of a store");
+    if (const Answer free = admin.checkFile("backup", options.file); free != kAnswerYes) {
+        return free;
     }
     std::string content;
     if (const Answer read = readStore(admin, content); read != kAnswerYes) {
         return read;
     }
-    if (const Status status = files.writeFile(path, content, options.force); status != kSuccess) {
-        return fail(admin, options, reasonOf(status));
+    const Answer written = admin.writeFile("backup", options.file, content, options.force);
+    if (written != kAnswerYes) {
+        return written;
+    }
+    if (options.json) {
+        JsonWriter json;
+        json.beginObject().field("schema", std::uint64_t{1}).field("store", admin.platform().storeName());
+        return admin.write(json.field("file", options.file).end().take(), Admin::Form::document);
     }
     return admin.write(compose("backed up %s to %s\n", {admin.storeLine(), shownText(options.file)}));
 }
@@ -80,6 +79,7 @@ void addBackupCommand(CLI::App& program, Admin& admin) {
     auto options = std::make_shared<BackupOptions>();
     command->add_option("FILE", options->file, "The file to make")->required()->check(givenName());
     command->add_flag("--force", options->force, "Replace an existing file");
+    command->add_flag("--json", options->json, "Write JSON for programs");
     command->callback([&admin, options] { admin.answer = [&admin, options] { return backUp(admin, *options); }; });
 }
 

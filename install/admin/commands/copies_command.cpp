@@ -1,181 +1,103 @@
 #include <CLI/CLI.hpp>
-#include <array>
-#include <map>
-#include <optional>
 
 #include "install/admin/commands/commands.h"
-#include "install/admin/copy_location.h"
-#include "install/admin/formats/json_text.h"
-#include "install/admin/formats/text_table.h"
-#include "install/platform/text.h"
-#include "install/src/copies/copy_records.h"
-#include "install/src/registry/copy_layout.h"
-#include "install/src/services/management_service.h"
+#include "install/admin/copy_table.h"
+#include "install/admin/open_machine.h"
 
 namespace kz7 {
 namespace {
 
-struct View {
-    const char* name;
-    std::string_view copies;
-};
-constexpr std::array kViews = {View{"native", layout::kCopies}, View{"32-bit", layout::kCopies32}};
-
-struct CopyInView {
-    std::string location;
-    InstallCopyInfo info;
+struct CopiesOptions {
+    CopyFilter filter;
+    std::string versions;
+    std::vector<std::string> columns;
+    std::string format = "table";
+    bool json = false;
 };
 
-struct CopyRow {
-    std::string name;
-    std::array<std::optional<CopyInView>, kViews.size()> views;
-    std::string service;
-    std::string state;  // of the service, in words; empty: there is no such service
-};
-
-using CopyRows = std::map<std::string, CopyRow>;  // by upper-cased name
-
-// A view without its key has no copies.
-Status readView(Admin& admin, std::size_t view, CopyRows& rows) {
-    IRegistryStore& registry = admin.registry();
-    const std::string_view copies = kViews[view].copies;
-    RegistryValues values(registry, admin.platform().debugOutput(), kKeyRead);
-    OwnedKey key(registry);
-    Status status = registry.openKey(KeyHandle::localMachine, copies, kKeyRead, key.receive());
-    TextBuffer<kMaxKeyName + 1> name;
-    for (std::uint32_t index = 0;
-         succeeded(status) && succeeded(status = registry.enumerateKey(key.get(), index, name, nullptr)); ++index) {
-        CopyRow& row = rows[foldUpper(name.text())];
-        row.name = row.name.empty() ? std::string(name.text()) : row.name;
-        row.views[view] = {locationOf(registry, compose("%s\\%s", {copies, name.text()})),
-                           InstallCopyInfo(values, name.text(), copies)};
-    }
-    return isNotFound(status) || isEndOfItems(status) ? kSuccess : status;
+std::string copiesJson(const std::vector<CopyLine>& lines, const CopiesOptions& options, const std::string& store) {
+    JsonWriter json;
+    json.beginObject().field("schema", std::uint64_t{1}).field("store", store);
+    appendCopies(lines, options.columns, json.field("copies"));
+    return json.end().take();
 }
 
-std::string stateText(ServiceState state) {
-    switch (state) {
-        case ServiceState::stopped:
-            return "stopped";
-        case ServiceState::startPending:
-            return "starting";
-        case ServiceState::stopPending:
-            return "stopping";
-        case ServiceState::running:
-            return "running";
-    }
-    return "state " + std::to_string(static_cast<std::uint32_t>(state));
-}
-
-std::string stateOf(IServiceManager& services, ServiceHandle manager, const std::string& name) {
-    OwnedService service(services);
-    ServiceState state{};
-    Status status = services.openService(manager, name, kServiceQueryStatus, service.receive());
-    if (succeeded(status)) {
-        status = services.queryState(service.get(), state);
-    }
-    if (status == kServiceDoesNotExist || status == kInvalidName) {
-        return {};
-    }
-    return succeeded(status) ? stateText(state) : compose("unknown, error %u", {status});
-}
-
-Answer readCopies(Admin& admin, CopyRows& rows) {
-    for (std::size_t view = 0; view < kViews.size(); ++view) {
-        if (const Status status = readView(admin, view, rows); !succeeded(status)) {
-            return admin.storeFault("cannot read copies", status);
+// One line for each copy: an object, or texts between tabs.
+std::string copiesLines(const std::vector<CopyLine>& lines, const CopiesOptions& options) {
+    const std::vector<std::string> all(kCopyColumns.begin(), kCopyColumns.end());
+    std::string text;
+    for (const CopyLine& line : lines) {
+        if (options.format == "jsonl") {
+            JsonWriter json;
+            appendCopy(line, options.columns, json);
+            text += json.take();
+            continue;
         }
-    }
-    IServiceManager& services = admin.platform().services();
-    OwnedService manager(services);
-    const Status opened = services.openManager(kServiceManagerConnect, manager.receive());
-    for (auto& [fold, row] : rows) {
-        row.service = managementServiceName(row.name).view();
-        row.state =
-            succeeded(opened) ? stateOf(services, manager.get(), row.service) : compose("unknown, error %u", {opened});
-    }
-    return admin.platform().storeFaultTold() ? kAnswerFault : kAnswerYes;
-}
-
-TableRow tableRow(const CopyRow& row, std::size_t view) {
-    const CopyInView& copy = *row.views[view];
-    return {shownText(row.name),
-            kViews[view].name,
-            shownText(copy.info.getVersion()),
-            copy.info.isValid() ? "yes" : "no",
-            copy.location.empty() ? "none" : shownText(copy.location),
-            row.state.empty() ? "none" : shownText(row.service) + " " + row.state};
-}
-
-std::string copiesText(const CopyRows& copies, std::uint32_t columns) {
-    std::vector<TableRow> table = {{"NAME", "VIEW", "VERSION", "VALID", "LOCATION", "SERVICE"}};
-    for (const auto& [fold, row] : copies) {
-        for (std::size_t view = 0; view < kViews.size(); ++view) {
-            if (row.views[view]) {
-                table.push_back(tableRow(row, view));
-            }
+        std::string_view separator;
+        for (const std::string& column : options.columns.empty() ? all : options.columns) {
+            text.append(separator).append(shownText(copyField(line, column)));
+            separator = "\t";
         }
+        text += '\n';
     }
-    return tableText(table, columns);
+    return text;
 }
 
-void appendMember(const char* name, std::string_view text, std::string& json) {
-    json += ",\"";
-    json += name;
-    json += "\":";
-    appendJsonText(text, json);
-}
-
-std::string copiesJson(const CopyRows& copies, const std::string& store) {
-    std::string json = "{\"store\":";
-    appendJsonText(store, json);
-    json += ",\"copies\":[";
-    std::string_view separator = "\n";
-    for (const auto& [fold, row] : copies) {
-        for (std::size_t view = 0; view < kViews.size(); ++view) {
-            const auto& copy = row.views[view];
-            if (!copy) {
-                continue;
-            }
-            json += separator;
-            json += "{\"name\":";
-            appendJsonText(row.name, json);
-            appendMember("view", kViews[view].name, json);
-            appendMember("version", copy->info.getVersion(), json);
-            json += copy->info.isValid() ? ",\"valid\":true" : ",\"valid\":false";
-            appendMember("location", copy->location, json);
-            appendMember("service", row.state.empty() ? "" : row.service, json);
-            appendMember("state", row.state, json);
-            json += '}';
-            separator = ",\n";
+Answer showCopies(Admin& admin, CopiesOptions options) {
+    options.format = options.json ? "json" : options.format;
+    if (VersionRange range; !options.versions.empty()) {
+        if (!range.parse(options.versions)) {
+            return admin.open(true) ? admin.fault("not a range of versions: " + shownText(options.versions) +
+                                                  " (write [9.7,9.8) or 9.7)")
+                                    : kAnswerFault;
         }
+        options.filter.versions = range;
     }
-    return json + "]}\n";
-}
-
-Answer showCopies(Admin& admin, bool json) {
-    CopyRows copies;
-    if (!admin.open(true)) {
-        return kAnswerFault;
-    }
-    if (const Answer read = readCopies(admin, copies); read != kAnswerYes) {
+    MachineState machine;
+    if (const Answer read = openMachine(admin, Depth::copies, machine); read != kAnswerYes) {
         return read;
     }
+    const bool isJson = options.format.starts_with("json");
+    const std::vector<CopyLine> lines = copyLines(machine, admin.platform().services(), options.filter, isJson);
+    if (admin.platform().storeFaultTold()) {
+        return kAnswerFault;
+    }
     const std::string store = admin.platform().storeName();
-    const Answer shown = admin.show(json             ? copiesJson(copies, store)
-                                    : copies.empty() ? std::string{}
-                                                     : copiesText(copies, admin.output().columns),
-                                    json ? Admin::Form::document : Admin::Form::text);
-    return shown != kAnswerYes || !copies.empty() ? shown : admin.no("no installed copy: " + shownText(store));
+    Answer shown = kAnswerYes;
+    if (options.format == "table") {
+        shown = admin.show(copiesText(lines, options.columns, admin.output().columns));
+    } else {
+        shown = admin.show(options.format == "json" ? copiesJson(lines, options, store) : copiesLines(lines, options),
+                           Admin::Form::document);
+    }
+    if (shown != kAnswerYes || !lines.empty()) {
+        return shown;
+    }
+    return admin.no((machine.copies.empty() ? "no installed copy: " : "no such copy: ") + shownText(store));
 }
 
 }  // namespace
 
 void addCopiesCommand(CLI::App& program, Admin& admin) {
     auto* command = program.add_subcommand("copies", "Show the installed copies and their services");
-    auto json = std::make_shared<bool>(false);
-    command->add_flag("--json", *json, "Write JSON for programs");
-    command->callback([&admin, json] { admin.answer = [&admin, json] { return showCopies(admin, *json); }; });
+    auto options = std::make_shared<CopiesOptions>();
+    command->footer(
+        "\"*\" marks the default copy. VIEW is \"both\" if the copy is the same for 64-bit and 32-bit programs, and\n"
+        "\"removed\" if only the key is left that a removal leaves for 32-bit programs.");
+    command->add_option("NAME", options->filter.name, "Only this copy");
+    command->add_option("--version", options->versions,
+                        "Only versions of a range such as [9.7,9.8), or that begin with a text; compared as texts");
+    command->add_option("--view", options->filter.view, "Only this view: native or 32-bit")
+        ->check(CLI::IsMember({"native", "32-bit"}));
+    command->add_flag("--valid", options->filter.valid, "Only copies with a valid version");
+    command->add_flag("--default", options->filter.isDefault, "Only the default copy");
+    command->add_option("--columns", options->columns, "What is shown of a copy, in order, separated by commas")
+        ->delimiter(',')
+        ->check(CLI::IsMember(std::vector<std::string>(kCopyColumns.begin(), kCopyColumns.end())));
+    auto* format = command->add_option("--format", options->format, "table, tsv, json or jsonl")
+                       ->check(CLI::IsMember({"table", "tsv", "json", "jsonl"}));
+    command->add_flag("--json", options->json, "Write JSON for programs")->excludes(format);
+    command->callback([&admin, options] { admin.answer = [&admin, options] { return showCopies(admin, *options); }; });
 }
 
 }  // namespace kz7

@@ -1,9 +1,8 @@
 #include <CLI/CLI.hpp>
 
 #include "install/admin/commands/commands.h"
-#include "install/admin/formats/json_text.h"
 #include "install/admin/formats/reg_text.h"
-#include "install/admin/formats/value_type.h"
+#include "install/admin/key_json.h"
 #include "install/platform/text.h"
 
 namespace kz7 {
@@ -15,33 +14,6 @@ struct ExportOptions {
     bool json = false;
 };
 
-void appendJsonValue(const KeyValue& value, std::string& json) {
-    json += "{\"name\":";
-    appendJsonText(value.name, json);
-    json += ',';
-    appendJsonData(value.type, value.data, json);
-    json += '}';
-}
-
-void appendJsonKey(const KeyRecord& key, std::string& json) {
-    json += "{\"key\":";
-    appendJsonText(key.name, json);
-    json += ",\"class\":";
-    appendJsonText(key.keyClass, json);
-    json += ",\"values\":[";
-    std::string_view separator = "\n  ";
-    for (const KeyValue& value : key.values) {
-        json += separator;
-        appendJsonValue(value, json);
-        separator = ",\n  ";
-    }
-    json += ']';
-    if (key.status != kSuccess) {
-        json += compose(",\"error\":%u", {key.status});
-    }
-    json += '}';
-}
-
 // Lines for a terminal. What is escaped here is not read back by an import.
 std::string shownLines(std::string_view text) {
     std::string shown;
@@ -51,27 +23,12 @@ std::string shownLines(std::string_view text) {
     return shown;
 }
 
-Answer exportJson(Admin& admin, const std::string& key) {
-    std::string separator = "\n";
-    std::string head = "{\"store\":";
-    appendJsonText(admin.platform().storeName(), head);
-    return admin.showKeys(
-        key, head + ",\"keys\":[",
-        [&](const KeyRecord& record, std::string& json) {
-            if (!isBareRoot(record) || record.status != kSuccess) {
-                json += std::exchange(separator, ",\n");
-                appendJsonKey(record, json);
-            }
-        },
-        "]}\n", Admin::Reading::snapshot);
-}
-
 Answer exportKeys(Admin& admin, const ExportOptions& options) {
     if (!admin.open(true)) {
         return kAnswerFault;
     }
     if (options.json) {
-        return exportJson(admin, options.key);
+        return showKeysJson(admin, options.key);
     }
     const bool isTerminal = admin.output().terminal;
     if (isTerminal && options.utf16) {

@@ -2,8 +2,10 @@
 #include <memory>
 
 #include "install/admin/commands/commands.h"
+#include "install/admin/formats/json_text.h"
 #include "install/admin/front/front.h"
 #include "install/platform/command_line.h"
+#include "install/platform/memory/small_ports.h"
 #include "install/platform/text.h"
 
 namespace kz7 {
@@ -11,7 +13,7 @@ namespace {
 
 constexpr int kNotStarted = 127;  // as in shells; all other codes are the program's
 
-Answer runProgram(Admin& admin, const std::vector<std::string>& command) {
+Answer runProgram(Admin& admin, const std::vector<std::string>& command, bool isJson) {
     if (!admin.open(true)) {
         return kAnswerFault;
     }
@@ -21,10 +23,16 @@ Answer runProgram(Admin& admin, const std::vector<std::string>& command) {
         return static_cast<Answer>(kNotStarted);
     }
     IPlatform& platform = admin.platform();
+    MemoryConsole kept;
     const FrontPorts ports{platform.processes(), platform.threads(), platform.files(), platform.terminal(),
-                           platform.console()};
+                           isJson ? static_cast<IConsole&>(kept) : platform.console()};
     std::uint32_t exitCode = 0;
     const Status status = runFront(ports, command, exitCode);
+    if (isJson && status == kSuccess) {
+        JsonWriter json;
+        json.beginObject().field("schema", std::uint64_t{1}).field("exitCode", std::uint64_t{exitCode});
+        admin.write(json.field("output", kept.output).end().take(), Admin::Form::document);
+    }
     if (status == kSuccess) {
         return static_cast<Answer>(exitCode);
     }
@@ -45,7 +53,10 @@ void addFrontCommand(CLI::App& program, Admin& admin) {
     auto words = std::make_shared<std::vector<std::string>>();
     command->add_option("PROGRAM", *words, "The program and its arguments, best after --")->required();
     command->positionals_at_end();
-    command->callback([&admin, words] { admin.answer = [&admin, words] { return runProgram(admin, *words); }; });
+    auto json = std::make_shared<bool>(false);
+    command->add_flag("--json", *json, "Show no progress; write the result as JSON for programs");
+    command->callback(
+        [&admin, words, json] { admin.answer = [&admin, words, json] { return runProgram(admin, *words, *json); }; });
 }
 
 }  // namespace kz7

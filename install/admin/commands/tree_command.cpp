@@ -2,6 +2,7 @@
 
 #include "install/admin/commands/commands.h"
 #include "install/admin/formats/value_type.h"
+#include "install/admin/key_json.h"
 #include "install/platform/text.h"
 
 namespace kz7 {
@@ -30,11 +31,11 @@ void appendTreeKey(const KeyRecord& key, std::string& text) {
     }
 }
 
-Answer showTree(Admin& admin, const std::string& key) {
+Answer showTree(Admin& admin, const std::string& key, bool isJson) {
     if (!admin.open(true)) {
         return kAnswerFault;
     }
-    return admin.showKeys(key, {}, appendTreeKey, {}, Admin::Reading::pages);
+    return isJson ? showKeysJson(admin, key) : admin.showKeys(key, {}, appendTreeKey, {}, Admin::Reading::pages);
 }
 
 }  // namespace
@@ -43,7 +44,10 @@ void addTreeCommand(CLI::App& program, Admin& admin) {
     auto* command = program.add_subcommand("tree", "Show keys and values for reading");
     auto key = std::make_shared<std::string>();
     command->add_option("KEY", *key, "The key to begin at; everything without it");
-    command->callback([&admin, key] { admin.answer = [&admin, key] { return showTree(admin, *key); }; });
+    auto json = std::make_shared<bool>(false);
+    command->add_flag("--json", *json, "Write JSON for programs");
+    command->callback(
+        [&admin, key, json] { admin.answer = [&admin, key, json] { return showTree(admin, *key, *json); }; });
 }
 
 }  // namespace kz7

@@ -67,6 +67,18 @@ int copyDatabase(sqlite3* source, sqlite3* target) {
     return finished == SQLITE_OK ? result : finished;
 }
 
+int queryTexts(sqlite3* connection, const char* sql, std::vector<std::string>& texts) {
+    sqlite3_stmt* prepared = nullptr;
+    int result = sqlite3_prepare_v2(connection, sql, -1, &prepared, nullptr);
+    const Statement owner(prepared);
+    while (result == SQLITE_OK && (result = sqlite3_step(prepared)) == SQLITE_ROW) {
+        const auto* const text = reinterpret_cast<const char*>(sqlite3_column_text(prepared, 0));
+        texts.emplace_back(text == nullptr ? "" : text);
+        result = SQLITE_OK;
+    }
+    return result == SQLITE_DONE ? SQLITE_OK : result;
+}
+
 int copyToMemory(sqlite3* source, Connection& memory) {
     sqlite3* opened = nullptr;
     int result = sqlite3_open_v2(":memory:", &opened, SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX, nullptr);

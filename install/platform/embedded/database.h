@@ -8,6 +8,7 @@
 #include <memory>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace kz7 {
 
@@ -54,6 +55,9 @@ int execute(sqlite3* connection, const char* sql);
 
 // The first column of the statement's first row, as a number.
 int queryNumber(sqlite3* connection, const char* sql, std::int64_t& number);
+
+// The first column of every row of a statement, as texts.
+int queryTexts(sqlite3* connection, const char* sql, std::vector<std::string>& texts);
 
 // Replaces the content of a database by that of another, as the transaction of the source sees it. The target has the
 // error.

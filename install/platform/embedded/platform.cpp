@@ -55,6 +55,7 @@ public:
         status = status == kSuccess ? content.commit() : status;
         return status == kSuccess ? registry_.replaceBy(content, kept) : status;
     }
+    Status examineStore(std::vector<std::string>& damages) override { return registry_.examine(damages); }
     bool isStoreFile(const std::string& path) override { return registry_.isFile(path); }
 
     std::string storeNote() override {

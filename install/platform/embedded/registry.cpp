@@ -207,6 +207,20 @@ Status EmbeddedRegistry::replaceBy(EmbeddedRegistry& content, std::string& kept)
     return fault.status == kSuccess ? kSuccess : fail(fault);
 }
 
+Status EmbeddedRegistry::examine(std::vector<std::string>& damages) {
+    if (const Status status = begin(); status != kSuccess) {
+        return status;
+    }
+    std::vector<std::string> lines;
+    const int result = queryTexts(connection_.get(), "PRAGMA integrity_check(10)", lines);
+    if (result != SQLITE_OK) {
+        return fail(result);
+    }
+    std::erase(lines, "ok");
+    damages = std::move(lines);
+    return kSuccess;
+}
+
 Query EmbeddedRegistry::query(Sql which) {
     Statement& owner = statements_[static_cast<std::size_t>(which)];
     int result = SQLITE_OK;

@@ -38,6 +38,9 @@ public:
     // Puts the content of another store in the place of this one; see StoreFile::replace(). Keys must not be open.
     Status replaceBy(EmbeddedRegistry& content, std::string& kept);
 
+    // The damages that SQLite finds in the store, at most ten.
+    Status examine(std::vector<std::string>& damages);
+
     Status openKey(KeyHandle parent, std::string_view path, AccessMask access, KeyHandle& key) override;
     Status createKey(KeyHandle parent, std::string_view path, std::string_view keyClass, AccessMask access,
                      KeyHandle& key) override;

@@ -100,6 +100,16 @@ bool isWholeVersion(std::string_view prefix) {
     return static_cast<std::size_t>(std::count(prefix.begin(), prefix.end(), '.')) + 1 == kWholeVersion;
 }
 
+AliasMap computeAliases(const CopiesByVersion& copies) {
+    AliasMap aliases;
+    AliasComputation computation(aliases, copies.size());
+    for (auto version = copies.rbegin(); version != copies.rend(); ++version) {
+        computation.add(version->first, version->second);
+    }
+    computation.finish();
+    return aliases;
+}
+
 std::vector<std::string> listAliases(IRegistryStore& registry, KeyHandle key) {
     std::vector<std::string> names;
     TextBuffer<kAliasNameRoom> name;
@@ -172,12 +182,7 @@ Status InstallCopiesProfile::generateInstallCopiesList() {
 }
 
 Status InstallCopiesProfile::generateProfileInfo() {
-    profileInfo_.clear();
-    AliasComputation computation(profileInfo_, copiesByVersion_.size());
-    for (auto version = copiesByVersion_.rbegin(); version != copiesByVersion_.rend(); ++version) {
-        computation.add(version->first, version->second);
-    }
-    computation.finish();
+    profileInfo_ = computeAliases(copiesByVersion_);
     tellProfile();
     return kSuccess;
 }

@@ -28,11 +28,13 @@ inline constexpr std::uint32_t kAliasNameRoom = 100;
 // characters or more; aliases after it are left alone.
 std::vector<std::string> listAliases(IRegistryStore& registry, KeyHandle key);
 
+// The aliases of copies in the order of their versions. A prefix that no copy matches has an empty name.
+AliasMap computeAliases(const CopiesByVersion& copies);
+
 // Statuses are kSuccess or kFailed; failures are described on the debugger output. An object may be run again.
 class InstallCopiesProfile {
 public:
-    InstallCopiesProfile(IRegistryStore& registry, IDebugOutput& debug, AccessMask readAccess = kKeyReadSet)
-        : values_(registry, debug, readAccess) {}
+    InstallCopiesProfile(IRegistryStore& registry, IDebugOutput& debug) : values_(registry, debug) {}
 
     // The whole rewrite. A failure before the first deletion changes nothing; a failed deletion restores the old
     // aliases; failed writes leave the aliases that could be written.

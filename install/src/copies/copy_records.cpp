@@ -9,21 +9,29 @@ namespace {
 
 constexpr std::uint32_t kCopyNameRoom = 256;  // characters, the terminator included
 
+// The name of a copy's four fields, in the order of its version text.
+constexpr std::array<std::string_view, 4> kFields = {"Version", "Release", "Modification", "Fix Level"};
+
+std::array<std::string, 4> readFields(RegistryValues& values, const std::string& key) {
+    std::array<std::string, 4> fields;
+    for (std::size_t field = 0; field < fields.size(); ++field) {
+        fields[field] = values.getValue(key, kFields[field]);
+    }
+    return fields;
+}
+
 }  // namespace
 
-InstallCopyInfo::InstallCopyInfo(RegistryValues& values, std::string_view name, std::string_view copiesKey)
-    : name_(name) {
-    const std::string key = compose("%s\\%s\\CurrentVersion", {copiesKey, name});
-    version_ = values.getValue(key, "Version");
-    release_ = values.getValue(key, "Release");
-    modification_ = values.getValue(key, "Modification");
-    fixLevel_ = values.getValue(key, "Fix Level");
+InstallCopyInfo::InstallCopyInfo(RegistryValues& values, std::string_view name)
+    : InstallCopyInfo(name, readFields(values, compose("%s\\%s\\CurrentVersion", {layout::kCopies, name}))) {}
+
+InstallCopyInfo::InstallCopyInfo(std::string_view name, std::array<std::string, 4> fields) : name_(name) {
     // Deliberate: set before the copy is judged, so that a missing fix level never makes it invalid.
-    if (fixLevel_.empty()) {
-        fixLevel_.push_back('0');
+    if (fields[3].empty()) {
+        fields[3].push_back('0');
     }
-    versionText_ = version_ + '.' + release_ + '.' + modification_ + '.' + fixLevel_;
-    valid_ = !version_.empty() && !release_.empty() && !modification_.empty();
+    versionText_ = fields[0] + '.' + fields[1] + '.' + fields[2] + '.' + fields[3];
+    valid_ = !fields[0].empty() && !fields[1].empty() && !fields[2].empty();
 }
 
 Status readInstallCopies(RegistryValues& values, CopiesByName& byName, CopiesByVersion& byVersion) {
@@ -31,7 +39,7 @@ Status readInstallCopies(RegistryValues& values, CopiesByName& byName, CopiesByV
     byVersion.clear();
     IRegistryStore& registry = values.registry();
     OwnedKey key(registry);
-    if (!succeeded(registry.openKey(KeyHandle::localMachine, layout::kCopies, values.readAccess(), key.receive()))) {
+    if (!succeeded(registry.openKey(KeyHandle::localMachine, layout::kCopies, kKeyReadSet, key.receive()))) {
         values.tell("Failed to open the registry key:%s", {layout::kCopies});
         return kFailed;
     }
@@ -45,12 +53,16 @@ Status readInstallCopies(RegistryValues& values, CopiesByName& byName, CopiesByV
         values.tell("%s version info of Install Copy '%s'",
                     {std::string_view(copy.isValid() ? "Valid" : "Invalid"), copy.getName()});
     }
-    std::stable_sort(byVersion.begin(), byVersion.end(),
-                     [](const auto& left, const auto& right) { return left.first < right.first; });
-    const auto first = std::unique(byVersion.rbegin(), byVersion.rend(),
-                                   [](const auto& left, const auto& right) { return left.first == right.first; });
-    byVersion.erase(byVersion.begin(), first.base());
+    orderByVersion(byVersion);
     return kSuccess;
+}
+
+void orderByVersion(CopiesByVersion& copies) {
+    std::stable_sort(copies.begin(), copies.end(),
+                     [](const auto& left, const auto& right) { return left.first < right.first; });
+    const auto first = std::unique(copies.rbegin(), copies.rend(),
+                                   [](const auto& left, const auto& right) { return left.first == right.first; });
+    copies.erase(copies.begin(), first.base());
 }
 
 std::size_t commonLength(std::string_view left, std::string_view right) {

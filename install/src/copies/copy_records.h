@@ -2,6 +2,7 @@
 // query for the copy with the highest version that begins with a prefix.
 #pragma once
 
+#include <array>
 #include <map>
 #include <string>
 #include <string_view>
@@ -19,8 +20,11 @@ class InstallCopyInfo {
 public:
     InstallCopyInfo() = default;
 
-    // Reads the copy below `copiesKey`. Never fails: a field that cannot be read is empty.
-    InstallCopyInfo(RegistryValues& values, std::string_view name, std::string_view copiesKey = layout::kCopies);
+    // Reads the copy of the native view. Never fails: a field that cannot be read is empty.
+    InstallCopyInfo(RegistryValues& values, std::string_view name);
+
+    // The same from the four fields, in the order of the version text.
+    InstallCopyInfo(std::string_view name, std::array<std::string, 4> fields);
 
     const std::string& getName() const { return name_; }
     const std::string& getVersion() const { return versionText_; }
@@ -31,10 +35,6 @@ public:
 private:
     std::string name_;
     std::string versionText_;
-    std::string version_;
-    std::string release_;
-    std::string modification_;
-    std::string fixLevel_;
     bool valid_ = false;
 };
 
@@ -43,6 +43,10 @@ using CopiesByName = std::map<std::string, InstallCopyInfo>;
 // The version texts and names of the valid copies, ordered by the texts, whose bytes compare as unsigned. Contiguous in
 // memory, since the aliases are computed in one pass over them.
 using CopiesByVersion = std::vector<std::pair<std::string, std::string>>;
+
+// Sorts valid copies, which are in registry order, by their version texts; of two with the same text the later one
+// stays.
+void orderByVersion(CopiesByVersion& copies);
 
 // Reads the copies of the native view in registry order: of two copies with the same version text the later one is
 // kept. kFailed if the key cannot be opened; both containers are then empty.

@@ -19,7 +19,7 @@ Status RegistryValues::open(std::string_view path, AccessMask access, OwnedKey& 
 
 std::string RegistryValues::query(std::string_view path, std::string_view name, std::string_view complaint) {
     OwnedKey key(registry_);
-    if (!succeeded(open(path, readAccess_, key))) {
+    if (!succeeded(open(path, kKeyReadSet, key))) {
         return {};
     }
     // Deliberate: a value that does not fit reads as empty, in a backup of an alias as well; aliases name copies, whose

@@ -15,9 +15,7 @@ namespace kz7 {
 // Key paths hold no placeholder. Statuses are kSuccess or kFailed.
 class RegistryValues {
 public:
-    // `readAccess` is the access for reading; kz7admin needs less than the flows ask for.
-    RegistryValues(IRegistryStore& registry, IDebugOutput& debug, AccessMask readAccess = kKeyReadSet)
-        : registry_(registry), debug_(debug), readAccess_(readAccess) {}
+    RegistryValues(IRegistryStore& registry, IDebugOutput& debug) : registry_(registry), debug_(debug) {}
 
     // The value's data up to the first NUL, of any type. Empty on any failure and for 100 characters and more. The two
     // differ in their debugger text only.
@@ -38,7 +36,6 @@ public:
     }
 
     IRegistryStore& registry() { return registry_; }
-    AccessMask readAccess() const { return readAccess_; }
 
 private:
     Status open(std::string_view path, AccessMask access, OwnedKey& key);
@@ -46,7 +43,6 @@ private:
 
     IRegistryStore& registry_;
     IDebugOutput& debug_;
-    AccessMask readAccess_;
 };
 
 }  // namespace kz7

@@ -48,7 +48,6 @@ Status KeyReader::all(std::vector<Item>& found, Read read) {
     if (!isEndOfItems(status)) {
         return status;
     }
-    sortByName(items);
     found = std::move(items);
     return kSuccess;
 }
@@ -73,10 +72,22 @@ Status KeyReader::valueAt(KeyHandle key, std::uint32_t index, KeyValue& found) {
 }
 
 Status KeyReader::subkeys(KeyHandle key, std::vector<Subkey>& found) {
-    return all(found, [&](std::uint32_t index, Subkey& subkey) { return subkeyAt(key, index, subkey); });
+    const Status status = all(found, [&](std::uint32_t index, Subkey& subkey) { return subkeyAt(key, index, subkey); });
+    if (status == kSuccess) {
+        sortByName(found);
+    }
+    return status;
 }
 
 Status KeyReader::values(KeyHandle key, std::vector<KeyValue>& found) {
+    const Status status = valuesInOrder(key, found);
+    if (status == kSuccess) {
+        sortByName(found);
+    }
+    return status;
+}
+
+Status KeyReader::valuesInOrder(KeyHandle key, std::vector<KeyValue>& found) {
     return all(found, [&](std::uint32_t index, KeyValue& value) { return valueAt(key, index, value); });
 }
 

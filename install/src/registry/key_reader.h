@@ -42,6 +42,9 @@ public:
     Status subkeys(KeyHandle key, std::vector<Subkey>& found);
     Status values(KeyHandle key, std::vector<KeyValue>& found);
 
+    // The same in registry order.
+    Status valuesInOrder(KeyHandle key, std::vector<KeyValue>& found);
+
     // Opens a key, not what it may link to, and reads its values and the names of its subkeys.
     Status key(KeyHandle parent, std::string_view path, OwnedKey& key, std::vector<KeyValue>& values,
                std::vector<Subkey>& subkeys);

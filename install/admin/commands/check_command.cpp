@@ -1,0 +1,72 @@
+#include <CLI/CLI.hpp>
+#include <algorithm>
+
+#include "install/admin/commands/commands.h"
+#include "install/admin/findings.h"
+#include "install/admin/open_machine.h"
+
+namespace kz7 {
+namespace {
+
+struct CheckOptions {
+    std::string copy;
+    bool all = false;
+    bool json = false;
+};
+
+Answer examineStore(Admin& admin, MachineState& machine) {
+    const Status status = admin.platform().examineStore(machine.damages);
+    return status == kSuccess ? kAnswerYes : admin.storeFault("cannot examine store", status);
+}
+
+std::string findingsText(const std::vector<Finding>& findings) {
+    std::string text;
+    for (const Finding& finding : findings) {
+        text += findingLine(finding);
+    }
+    return text;
+}
+
+std::string findingsJson(Admin& admin, const std::vector<Finding>& findings) {
+    JsonWriter json;
+    json.beginObject().field("schema", std::uint64_t{1}).field("store", admin.platform().storeName());
+    appendFindings(findings, json.field("findings"));
+    return json.end().take();
+}
+
+Answer check(Admin& admin, const CheckOptions& options) {
+    MachineState machine;
+    if (const Answer read = openMachine(admin, Depth::whole, machine); read != kAnswerYes) {
+        return read;
+    }
+    if (const Answer examined = examineStore(admin, machine); examined != kAnswerYes) {
+        return examined;
+    }
+    std::vector<Finding> findings = findFindings(machine, admin.platform().files(), options.all);
+    if (!options.copy.empty()) {
+        std::erase_if(findings, [&](const Finding& one) { return !equalsIgnoreCase(one.copy, options.copy); });
+        if (findings.empty() && machine.find(options.copy) == nullptr) {
+            return admin.no("no such copy: " + shownText(options.copy) + " (see kz7admin copies)");
+        }
+    }
+    const Answer written = options.json ? admin.write(findingsJson(admin, findings), Admin::Form::document)
+                                        : admin.write(findingsText(findings));
+    const bool isInOrder = std::none_of(findings.begin(), findings.end(),
+                                        [](const Finding& one) { return one.kind().mark == Mark::fault; });
+    return written != kAnswerYes || isInOrder ? written : kAnswerNo;
+}
+
+}  // namespace
+
+void addCheckCommand(CLI::App& program, Admin& admin) {
+    auto* command = program.add_subcommand("check", "Report what is not in order, and what repairs it");
+    auto options = std::make_shared<CheckOptions>();
+    command->footer("Prints nothing and exits with 0 if all is in order, else with 1. Notes do not count.");
+    command->add_option("NAME", options->copy, "Only what belongs to this copy");
+    command->add_flag("--all", options->all,
+                      "Also what the tool leaves behind on purpose and what is not installed yet");
+    command->add_flag("--json", options->json, "Write JSON for programs");
+    command->callback([&admin, options] { admin.answer = [&admin, options] { return check(admin, *options); }; });
+}
+
+}  // namespace kz7

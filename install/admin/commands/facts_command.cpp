@@ -1,0 +1,66 @@
+#include <CLI/CLI.hpp>
+
+#include "install/admin/commands/commands.h"
+#include "install/admin/copy_table.h"
+#include "install/admin/findings.h"
+#include "install/admin/open_machine.h"
+
+namespace kz7 {
+namespace {
+
+void appendPrograms(JsonWriter& json) {
+    json.beginArray();
+    for (const std::string_view program : {"kz7InstallReg", "kz7admin", "kz7runtime"}) {
+        json.beginObject().field("name", program).field("version", KZ7_VERSION).end();
+    }
+    json.end();
+}
+
+void appendHost(IHostInformation& host, JsonWriter& json) {
+    OperatingSystem system;
+    host.operatingSystem(system);
+    json.beginObject().field("name", system.name).field("version", system.version);
+    json.field("release", system.release).end();
+}
+
+void appendServices(const MachineState& machine, JsonWriter& json) {
+    json.beginArray();
+    for (const ServiceRow& service : machine.services) {
+        json.beginObject().field("name", service.name).field("copy", service.copy);
+        json.field("program", service.program).field("start", std::uint64_t{service.start}).end();
+    }
+    json.end();
+}
+
+Answer showFacts(Admin& admin) {
+    MachineState machine;
+    if (const Answer read = openMachine(admin, Depth::whole, machine); read != kAnswerYes) {
+        return read;
+    }
+    if (const Status status = admin.platform().examineStore(machine.damages); status != kSuccess) {
+        return admin.storeFault("cannot examine store", status);
+    }
+    const std::vector<CopyLine> copies = copyLines(machine, admin.platform().services(), {}, true);
+    JsonWriter json;
+    json.beginObject().field("schema", std::uint64_t{1}).field("store", admin.platform().storeName());
+    appendHost(admin.platform().host(), json.field("host"));
+    appendPrograms(json.field("programs"));
+    json.field("backup", machine.hasBackup);
+    appendCopies(copies, {}, json.field("copies"));
+    appendAliases(aliasRows(machine), json.field("aliases"));
+    appendServices(machine, json.field("services"));
+    appendFindings(findFindings(machine, admin.platform().files(), true), json.field("findings"));
+    const std::string text = json.end().take();
+    return admin.platform().storeFaultTold() ? kAnswerFault : admin.write(text, Admin::Form::document);
+}
+
+}  // namespace
+
+void addFactsCommand(CLI::App& program, Admin& admin) {
+    auto* command = program.add_subcommand("facts", "Write all that is known of this machine as one JSON object");
+    auto json = std::make_shared<bool>(true);
+    command->add_flag("--json", *json, "The same: facts has no other form");
+    command->callback([&admin, json] { admin.answer = [&admin] { return showFacts(admin); }; });
+}
+
+}  // namespace kz7

@@ -1,0 +1,139 @@
+#include <CLI/CLI.hpp>
+#include <algorithm>
+
+#include "install/admin/change_report.h"
+#include "install/admin/commands/commands.h"
+#include "install/admin/given_name.h"
+#include "install/admin/repair.h"
+
+namespace kz7 {
+namespace {
+
+struct RepairOptions : ChangeOptions {
+    std::vector<std::string> words;
+    RepairRequest request;
+};
+
+// Sorts the words into kinds and the name of a copy; the last word may be one. A fault is returned as text.
+std::string readWords(const std::vector<std::string>& words, RepairRequest& request) {
+    for (const std::string& word : words) {
+        bool isKind = false;
+        for (const FindingKind& kind : findingKinds()) {
+            if (!kind.group.empty() && kind.group == word) {
+                request.groups.insert(kind.group);
+                isKind = true;
+            } else if (!kind.group.empty() && kind.name == word) {
+                request.kinds.insert(kind.name);
+                isKind = true;
+            }
+        }
+        if (!isKind && (&word != &words.back() || word.empty())) {
+            return "not a kind of finding: " + shownText(word);
+        }
+        request.copy = isKind ? request.copy : word;
+    }
+    return {};
+}
+
+Status copySavedProperties(Admin& admin, Preview& preview, std::string& key) {
+    MachineState machine;
+    const Status status = readMachine(admin.registry(), Depth::whole, machine, key);
+    std::vector<KeyChange> keys;
+    for (const std::string& path : machine.savedProperties) {
+        keys.push_back({.name = {KeyHandle::users, path}, .keyClass = {}, .remove = true, .values = {}});
+    }
+    return status == kSuccess ? preview.fill(keys, key) : status;
+}
+
+// The name of a copy that nothing belongs to is a mistake.
+Answer checkName(Admin& admin, const RepairRequest& request) {
+    MachineState machine;
+    std::string key;
+    if (const Status status = readMachine(admin.registry(), Depth::whole, machine, key); status != kSuccess) {
+        return admin.storeFault("cannot read: " + shownText(key), status);
+    }
+    const bool hasService = std::any_of(machine.services.begin(), machine.services.end(), [&](const ServiceRow& row) {
+        return equalsIgnoreCase(row.copy, request.copy);
+    });
+    return request.copy.empty() || hasService || machine.find(request.copy) != nullptr
+               ? kAnswerYes
+               : admin.fault("neither a kind of finding nor a copy: " + shownText(request.copy) +
+                             " (see kz7admin check)");
+}
+
+Answer repairOn(Admin& admin, const RepairOptions& options, const Ports& ports, ChangeRun& run) {
+    std::vector<Finding> rest;
+    std::string key;
+    run.status = repairMachine(ports, admin.platform().storeIsOwn(), options.request, rest, key);
+    if (admin.platform().storeFaultTold()) {
+        return kAnswerFault;
+    }
+    if (run.status != kSuccess) {
+        return admin.storeFault("cannot repair: " + shownText(key), run.status);
+    }
+    for (const Finding& finding : rest) {
+        const std::string line = findingLine(finding);
+        run.notes.push_back("not repaired: " + line.substr(0, line.size() - 1));
+        run.status = kFailed;
+    }
+    return kAnswerYes;
+}
+
+Answer preview(Admin& admin, const RepairOptions& options) {
+    Preview preview(admin.platform(), true);
+    if (const Answer filled = fillPreview(admin, preview); filled != kAnswerYes) {
+        return filled;
+    }
+    std::string key;
+    if (const Status status = copySavedProperties(admin, preview, key); status != kSuccess) {
+        return admin.storeFault("cannot read: " + shownText(key), status);
+    }
+    ChangeRun run;
+    const Answer answer = repairOn(admin, options, preview.ports(), run);
+    run.changes = preview.changes();
+    return answer == kAnswerYes ? showRun(admin, options, run) : answer;
+}
+
+Answer repair(Admin& admin, RepairOptions options) {
+    if (!admin.open(options.check, true)) {
+        return kAnswerFault;
+    }
+    if (const std::string fault = readWords(options.words, options.request); !fault.empty()) {
+        return admin.fault(fault + " (see kz7admin repair --help)");
+    }
+    if (const Answer answer = checkName(admin, options.request); answer != kAnswerYes) {
+        return answer;
+    }
+    if (options.check) {
+        return preview(admin, options);
+    }
+    RecordedPorts recorded(admin.platform().ports(), admin.platform().storeIsOwn(), true);
+    ChangeRun run;
+    if (const Answer answer = repairOn(admin, options, recorded.ports(), run); answer != kAnswerYes) {
+        return answer;
+    }
+    run.changes = recorded.changes();
+    if (const Status status = admin.registry().commit(); status != kSuccess) {
+        return admin.storeFault("cannot save changes", status);
+    }
+    return showRun(admin, options, run);
+}
+
+}  // namespace
+
+void addRepairCommand(CLI::App& program, Admin& admin) {
+    auto* command = program.add_subcommand("repair", "Repair what check reports");
+    auto options = std::make_shared<RepairOptions>();
+    command->footer(
+        "A KIND is the first word of a line of check, or a group of them: aliases, copies, services, properties,\n"
+        "migration. Without one, all but services and migration is repaired. No program is started.");
+    addChangeOptions(*command, *options);
+    command->add_option("KIND", options->words, "What to repair; the last word may be the name of a copy instead");
+    auto* on = command->add_option("--on", options->request.location,
+                                   "Finish a migration that did not end, for the copy at this location");
+    on->check(givenName());
+    command->add_flag("--back", options->request.isBack, "Return to the registry before that migration")->excludes(on);
+    command->callback([&admin, options] { admin.answer = [&admin, options] { return repair(admin, *options); }; });
+}
+
+}  // namespace kz7

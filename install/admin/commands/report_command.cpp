@@ -1,0 +1,70 @@
+#include <CLI/CLI.hpp>
+
+#include "install/admin/commands/commands.h"
+#include "install/admin/formats/html_report.h"
+#include "install/admin/given_name.h"
+#include "install/admin/open_machine.h"
+
+namespace kz7 {
+namespace {
+
+struct ReportOptions {
+    std::string file;
+    bool force = false;
+    bool json = false;
+};
+
+std::string timeNow(IHostInformation& host) {
+    TextBuffer<128> time;
+    return host.localTime(TimeText::dateAndZone, time) == kSuccess ? std::string(time.text()) : std::string{};
+}
+
+Answer readReport(Admin& admin, std::string& html) {
+    MachineState machine;
+    if (const Answer read = openMachine(admin, Depth::whole, machine); read != kAnswerYes) {
+        return read;
+    }
+    IPlatform& platform = admin.platform();
+    if (const Status status = platform.examineStore(machine.damages); status != kSuccess) {
+        return admin.storeFault("cannot examine store", status);
+    }
+    OperatingSystem system;
+    platform.host().operatingSystem(system);
+    html = htmlReport({platform.storeName(), compose("%s %s %s", {system.name, system.version, system.release}),
+                       timeNow(platform.host()), machine, copyLines(machine, platform.services(), {}, false),
+                       findFindings(machine, platform.files(), true)});
+    return platform.storeFaultTold() ? kAnswerFault : kAnswerYes;
+}
+
+Answer report(Admin& admin, const ReportOptions& options) {
+    std::string html;
+    if (const Answer read = readReport(admin, html); read != kAnswerYes) {
+        return read;
+    }
+    if (options.file.empty()) {
+        return admin.write(html, Admin::Form::document);
+    }
+    if (const Answer written = admin.writeFile("report", options.file, html, options.force); written != kAnswerYes) {
+        return written;
+    }
+    if (options.json) {
+        JsonWriter json;
+        json.beginObject().field("schema", std::uint64_t{1}).field("store", admin.platform().storeName());
+        return admin.write(json.field("file", options.file).end().take(), Admin::Form::document);
+    }
+    return admin.write("wrote " + shownText(options.file) + '\n');
+}
+
+}  // namespace
+
+void addReportCommand(CLI::App& program, Admin& admin) {
+    auto* command = program.add_subcommand("report", "Write one HTML page about the machine");
+    auto options = std::make_shared<ReportOptions>();
+    auto* file = command->add_option("-o,--output", options->file, "The file to make; without: standard output");
+    file->check(givenName());
+    command->add_flag("--force", options->force, "Replace an existing file")->needs(file);
+    command->add_flag("--json", options->json, "Write JSON for programs about the file")->needs(file);
+    command->callback([&admin, options] { admin.answer = [&admin, options] { return report(admin, *options); }; });
+}
+
+}  // namespace kz7

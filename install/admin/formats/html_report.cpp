@@ -1,0 +1,260 @@
+#include "install/admin/formats/html_report.h"
+
+#include <algorithm>
+#include <map>
+
+#include "install/platform/shown_text.h"
+#include "install/platform/text.h"
+
+namespace kz7 {
+namespace {
+
+constexpr std::size_t kDrawn = 120;        // prefixes in the drawing; all are in the table
+constexpr std::size_t kDrawnName = 22;     // characters of a name in the drawing
+constexpr std::uint32_t kLineHeight = 22;  // of the drawing, in its own units
+
+constexpr std::string_view kHead =
+    "<!DOCTYPE html>\n<html lang=\"en\">\n<head>\n<meta charset=\"utf-8\">\n"
+    "<meta name=\"viewport\" content=\"width=device-width, initial-scale=1\">\n"
+    "<meta http-equiv=\"Content-Security-Policy\" content=\"default-src 'none'; style-src 'unsafe-inline'\">\n"
+    "<meta name=\"color-scheme\" content=\"light dark\">\n<title>Installed copies</title>\n<style>\n"
+    ":root{--ink:#1b1f24;--soft:#57606a;--page:#fff;--band:#f3f5f7;--line:#c8ced4;--bad:#b3202a;--good:#1a6b3c}\n"
+    "@media "
+    "(prefers-color-scheme:dark){:root{--ink:#e6e9ec;--soft:#a2abb5;--page:#14171a;--band:#1e2328;--line:#3d454d;"
+    "--bad:#ff8a80;--good:#7fd6a0}}\n"
+    "*{box-sizing:border-box}\n"
+    "body{margin:0 auto;max-width:76rem;padding:1rem;background:var(--page);color:var(--ink);"
+    "font:1rem/1.5 system-ui,sans-serif}\n"
+    "h1{font-size:1.5rem;margin:.5rem 0}h2{font-size:1.15rem;margin:2rem 0 .5rem}\n"
+    "header p,.note{color:var(--soft);overflow-wrap:anywhere}\n"
+    ".scroll{overflow-x:auto}\n"
+    "table{border-collapse:collapse;width:100%}\n"
+    "th,td{text-align:left;vertical-align:top;padding:.3rem .7rem;border-bottom:1px solid var(--line)}\n"
+    "thead th{background:var(--band)}td{overflow-wrap:anywhere}tbody th{font-weight:600}\n"
+    "code{font-family:ui-monospace,monospace;font-size:.92em}\n"
+    ".bad{color:var(--bad);font-weight:600}.good{color:var(--good);font-weight:600}\n"
+    "svg{display:block;width:100%;max-width:44rem;min-width:20rem}svg text{fill:var(--ink);font-size:12px}\n"
+    "svg line{stroke:var(--soft);stroke-width:1.2}svg line.stale{stroke:var(--bad);stroke-width:2.2;stroke-dasharray:6 "
+    "3}\n"
+    "svg text.stale{fill:var(--bad);font-weight:600}\n"
+    "a.skip{position:absolute;left:-99rem}a.skip:focus{position:static}\n"
+    "@media (max-width:40rem){th,td{padding:.3rem .4rem;font-size:.9rem}}\n"
+    "@media print{body{max-width:none}.scroll{overflow:visible}details{display:block}}\n"
+    "</style>\n</head>\n<body>\n<a class=\"skip\" href=\"#findings\">Skip to the findings</a>\n";
+
+std::string escaped(std::string_view foreign) {
+    std::string html;
+    for (const char c : shownText(foreign)) {
+        // clang-format off
+        switch (c) {
+            case '&':  html += "&amp;";  break;
+            case '<':  html += "&lt;";   break;
+            case '>':  html += "&gt;";   break;
+            case '"':  html += "&quot;"; break;
+            case '\'': html += "&#39;";  break;
+            default:   html += c;        break;
+        }
+        // clang-format on
+    }
+    return html;
+}
+
+std::string orNone(const std::string& html) {
+    return html.empty() ? "<span class=\"note\">none</span>" : html;
+}
+
+// Cells are HTML; the first cell of a row is its header.
+void appendTable(std::string_view caption, const std::vector<std::string_view>& headings,
+                 const std::vector<std::vector<std::string>>& rows, std::string& html) {
+    html.append("<div class=\"scroll\" role=\"region\" tabindex=\"0\" aria-label=\"").append(caption);
+    html += "\"><table>\n<thead><tr>";
+    for (const std::string_view heading : headings) {
+        html.append("<th scope=\"col\">").append(heading).append("</th>");
+    }
+    html += "</tr></thead>\n<tbody>\n";
+    for (const std::vector<std::string>& row : rows) {
+        html.append("<tr><th scope=\"row\">").append(row.front()).append("</th>");
+        for (std::size_t cell = 1; cell < row.size(); ++cell) {
+            html.append("<td>").append(row[cell]).append("</td>");
+        }
+        html += "</tr>\n";
+    }
+    html += "</tbody></table></div>\n";
+}
+
+void beginSection(std::string_view id, std::string_view title, std::string& html) {
+    html.append("<section aria-labelledby=\"").append(id).append("\">\n<h2 id=\"").append(id).append("\">");
+    html.append(title).append("</h2>\n");
+}
+
+void appendFindings(const ReportSource& source, std::string& html) {
+    beginSection("findings", "Findings", html);
+    std::vector<std::vector<std::string>> rows;
+    bool isInOrder = true;
+    for (const Finding& finding : source.findings) {
+        const bool isFault = finding.kind().mark == Mark::fault;
+        isInOrder = isInOrder && !isFault;
+        const std::string kind(finding.kind().name);
+        rows.push_back({isFault ? "<span class=\"bad\">" + kind + "</span>" : kind,
+                        std::string(markName(finding.kind().mark)), escaped(finding.what()), escaped(finding.why()),
+                        "<code>" + escaped(finding.repair()) + "</code>"});
+    }
+    html += isInOrder ? "<p class=\"good\">All is in order.</p>\n" : "<p class=\"bad\">Not all is in order.</p>\n";
+    if (!rows.empty()) {
+        appendTable("Findings", {"Kind", "Mark", "What", "Why", "Repair"}, rows, html);
+    }
+    html += "</section>\n";
+}
+
+void appendCopies(const ReportSource& source, std::string& html) {
+    beginSection("copies", "Copies", html);
+    std::vector<std::vector<std::string>> rows;
+    for (const CopyLine& line : source.copies) {
+        rows.push_back(
+            {escaped(line.shown->name) + (line.isDefault ? " (default)" : ""), line.view,
+             escaped(line.shown->info.getVersion()),
+             line.shown->info.isValid() ? "yes" : "<span class=\"bad\">no</span>",
+             orNone(escaped(line.shown->location)),
+             orNone(line.service.empty() ? std::string{} : escaped(line.service) + ' ' + escaped(line.state))});
+    }
+    if (rows.empty()) {
+        html += "<p>No copy is installed.</p>\n";
+    } else {
+        appendTable("Copies", {"Name", "View", "Version", "Valid", "Location", "Service"}, rows, html);
+    }
+    html += "</section>\n";
+}
+
+// An alias of a view, and whether it is not as it should be.
+struct DrawnAlias {
+    std::string prefix;
+    std::string target;  // empty: none
+    std::string why;     // not empty: stale
+};
+
+std::vector<DrawnAlias> aliasesOf(const ReportSource& source, std::size_t view) {
+    std::vector<DrawnAlias> aliases;
+    for (const AliasRow* const row : aliasRows(source.machine)) {
+        if (row->values[view] || row->should) {
+            const auto finding = judgeAlias(source.machine, *row, view, true);
+            aliases.push_back({row->prefix, row->values[view] ? row->values[view]->text : std::string{},
+                               finding ? finding->why() : std::string{}});
+        }
+    }
+    return aliases;
+}
+
+std::string number(std::size_t value) {
+    return std::to_string(value);
+}
+
+void appendText(std::size_t x, std::size_t y, bool isStale, std::string_view text, std::string& svg) {
+    svg += "<text x=\"" + number(x) + "\" y=\"" + number(y) + (isStale ? "\" class=\"stale\">" : "\">");
+    const bool isLong = !fitsCharacters(text, kDrawnName);
+    svg += escaped(isLong ? cutText(text, kDrawnName - 1) : text) + (isLong ? "\xE2\x80\xA6" : "");
+    svg += "<title>" + escaped(text) + "</title></text>\n";
+}
+
+// Prefixes on the left, the copies that they name on the right; what is stale comes first.
+void appendDrawing(std::vector<DrawnAlias> aliases, std::string_view view, std::string& html) {
+    std::stable_sort(aliases.begin(), aliases.end(), [](const DrawnAlias& left, const DrawnAlias& right) {
+        return !left.why.empty() && right.why.empty();
+    });
+    aliases.resize(std::min(aliases.size(), kDrawn));
+    std::map<std::string, std::size_t> targets;  // with their places
+    for (const DrawnAlias& alias : aliases) {
+        targets.try_emplace(foldUpper(alias.target), targets.size());
+    }
+    const auto stale =
+        std::count_if(aliases.begin(), aliases.end(), [](const DrawnAlias& one) { return !one.why.empty(); });
+    const std::size_t height = (std::max(aliases.size(), targets.size()) + 1) * kLineHeight;
+    html += "<div class=\"scroll\"><svg role=\"img\" viewBox=\"0 0 420 " + number(height) + "\" aria-label=\"";
+    html += compose("%s view: %u aliases drawn to their copies, %u of them stale\">\n",
+                    {view, static_cast<std::uint32_t>(aliases.size()), static_cast<std::uint32_t>(stale)});
+    std::vector<bool> isDrawn(targets.size(), false);
+    for (std::size_t row = 0; row < aliases.size(); ++row) {
+        const DrawnAlias& alias = aliases[row];
+        const std::size_t target = targets.at(foldUpper(alias.target));
+        const std::size_t y = (row + 1) * kLineHeight;
+        const std::size_t step = std::max<std::size_t>(aliases.size() / std::max<std::size_t>(targets.size(), 1), 1);
+        const std::size_t end = (target * step + 1) * kLineHeight;
+        const bool isStale = !alias.why.empty();
+        appendText(4, y, isStale, alias.prefix, html);
+        html += "<line x1=\"150\" y1=\"" + number(y - 4) + "\" x2=\"246\" y2=\"" + number(end - 4) +
+                (isStale ? "\" class=\"stale\">" : "\">");
+        html += "<title>" + escaped(alias.prefix + " -> " + (alias.target.empty() ? "none" : alias.target)) +
+                (isStale ? ": " + escaped(alias.why) : std::string{}) + "</title></line>\n";
+        if (!isDrawn[target]) {
+            isDrawn[target] = true;
+            appendText(252, end, false, alias.target.empty() ? "(none)" : alias.target, html);
+        }
+    }
+    html += "</svg></div>\n";
+}
+
+void appendAliases(const ReportSource& source, std::string& html) {
+    beginSection("aliases", "Version aliases", html);
+    for (std::size_t view = 0; view < kViews.size(); ++view) {
+        const std::vector<DrawnAlias> aliases = aliasesOf(source, view);
+        html.append("<h3>").append(kViews[view].name).append(" view</h3>\n");
+        if (aliases.empty()) {
+            html += "<p>No alias exists.</p>\n";
+            continue;
+        }
+        appendDrawing(aliases, kViews[view].name, html);
+        if (aliases.size() > kDrawn) {
+            html += compose(
+                "<p class=\"note\">The drawing has %u of %u aliases, stale ones first; the table has all.</p>\n",
+                {static_cast<std::uint32_t>(kDrawn), static_cast<std::uint32_t>(aliases.size())});
+        }
+        std::vector<std::vector<std::string>> rows;
+        for (const DrawnAlias& alias : aliases) {
+            rows.push_back({escaped(alias.prefix), orNone(escaped(alias.target)),
+                            alias.why.empty() ? "right" : "<span class=\"bad\">" + escaped(alias.why) + "</span>"});
+        }
+        html += "<details><summary>All aliases of this view as a table</summary>\n";
+        appendTable("Aliases", {"Prefix", "Copy", "State"}, rows, html);
+        html += "</details>\n";
+    }
+    html += "</section>\n";
+}
+
+void appendServices(const ReportSource& source, std::string& html) {
+    beginSection("services", "Services", html);
+    std::vector<std::vector<std::string>> rows;
+    for (const ServiceRow& service : source.machine.services) {
+        rows.push_back({escaped(service.name), escaped(service.copy), orNone(escaped(service.program)),
+                        service.start == 2   ? "automatic"
+                        : service.start == 3 ? "on demand"
+                        : service.start == 4 ? "<span class=\"bad\">disabled</span>"
+                                             : number(service.start)});
+    }
+    if (rows.empty()) {
+        html += "<p>No service is registered.</p>\n";
+    } else {
+        appendTable("Services", {"Name", "Copy", "Program", "Start"}, rows, html);
+    }
+    html += "</section>\n";
+}
+
+}  // namespace
+
+std::string htmlReport(const ReportSource& source) {
+    std::string html(kHead);
+    html += "<header><h1>Installed copies</h1>\n<p>" + escaped(source.store) + "<br>" + escaped(source.host) + "<br>" +
+            escaped(source.time) + "</p></header>\n<nav aria-label=\"Sections\"><p>";
+    for (const auto& [id, title] : {std::pair("findings", "Findings"),
+                                    {"copies", "Copies"},
+                                    {"aliases", "Version aliases"},
+                                    {"services", "Services"}}) {
+        html += "<a href=\"#" + std::string(id) + "\">" + title + "</a> ";
+    }
+    html += "</p></nav>\n<main>\n";
+    appendFindings(source, html);
+    appendCopies(source, html);
+    appendAliases(source, html);
+    appendServices(source, html);
+    return html + "</main>\n</body>\n</html>\n";
+}
+
+}  // namespace kz7
