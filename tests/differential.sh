@@ -234,6 +234,9 @@ echo '{"copies": [{"name": "A", "location": "C:\\a"}, {"name": "Zoë", "location
 echo '{"copies": [{"name": "a", "location": "C:\\b"}, {"name": "Zoë", "state": "absent"}]}' >others.json
 same 'a copy for the export'                 -addKZ7Copy FIRST 'C:\KZ7\first'
 "$linux/kz7admin" export >wanted.reg 2>/dev/null
+copies='HKEY_LOCAL_MACHINE\SOFTWARE\NVQ\KZ7\InstalledCopies'
+printf '%s\n' REGEDIT4 "[$copies]" '"9.7"="GONE"' "[$copies\FIRST]" '"KZ7 Path Name"="D:\\b"' \
+    "[-$copies\FIRST\PROFILES]" "[$copies\FIRST\CurrentVersion]" '"Release"=""' >damage.reg
 program=kz7admin
 same 'copies of a list'                      ensure --from copies.json
 same 'nothing to do'                         ensure --from copies.json --detailed-exitcode
@@ -242,6 +245,18 @@ same 'what the list leaves out'              ensure --from others.json --prune
 same 'no last copy'                          ensure --from /dev/null --prune
 same 'back to the export'                    restore wanted.reg --detailed-exitcode
 same 'it is there'                           restore wanted.reg --detailed-exitcode
+# A machine in order, one that is not, and its repair.
+same 'a machine in order'                    check
+same 'a copy without a location'             import damage.reg
+same 'what is not in order'                  check
+same 'and what is deliberate'                check --all FIRST
+same 'a prefix that names no copy'           resolve 9.7
+same 'its repair, foretold'                  repair --check --diff
+same 'its repair'                            repair services aliases copies --detailed-exitcode
+same 'all is in order again'                 check
+same 'the copies'                            copies --format tsv
+same 'the copy of a prefix'                  resolve 9 --json
+same 'a status and an error line'            explain 5021 392
 program=kz7InstallReg
 
 # Two at once, on Windows only, where no transaction keeps them apart: they leave what one after the other would have.

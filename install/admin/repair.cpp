@@ -17,6 +17,7 @@
 namespace kz7 {
 namespace {
 
+constexpr int kRounds = 3;
 constexpr std::string_view kServiceProgram = "\\bin\\kz7mgmtsvc.exe";
 
 class Repairer {
@@ -32,10 +33,8 @@ public:
                                           {"services", &Repairer::repairServices},
                                           {"properties", &Repairer::repairProperties},
                                           {"aliases", &Repairer::repairAliases}}) {
-            const bool isAsked = std::any_of(findings_.begin(), findings_.end(), [&](const Finding& finding) {
-                return finding.kind().group == group && request_.covers(finding);
-            });
-            if (status == kSuccess && isAsked) {
+            // What is repaired may uncover more: the views of a half copy differ once it is whole.
+            for (int round = 0; round < kRounds && status == kSuccess && isAsked(group); ++round) {
                 status = (this->*step)();
                 status = status == kSuccess ? read() : status;
             }
@@ -49,6 +48,12 @@ public:
     }
 
 private:
+    bool isAsked(std::string_view group) const {
+        return std::any_of(findings_.begin(), findings_.end(), [&](const Finding& finding) {
+            return finding.kind().group == group && request_.covers(finding);
+        });
+    }
+
     Status read() {
         machine_ = {};
         const Status status = readMachine(registry_, Depth::whole, machine_, key_);

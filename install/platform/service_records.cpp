@@ -180,7 +180,11 @@ Status ServiceRecords::startService(ServiceHandle service) {
     TextBuffer<1024> program;
     status = registry_.queryValue(record.get(), kImagePath, nullptr, program);
     if (status == kSuccess) {
-        status = files_.probe(program.text());
+        std::string_view path = program.text();
+        if (path.starts_with('"')) {
+            path = path.substr(1, path.find('"', 1) - 1);
+        }
+        status = files_.probe(path);
     }
     return status != kSuccess ? status
                               : registry_.setValue(record.get(), kRunState, ValueType::dword,

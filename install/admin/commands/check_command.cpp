@@ -59,12 +59,11 @@ Answer check(Admin& admin, const CheckOptions& options) {
 }  // namespace
 
 void addCheckCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("check", "Report what is not in order, and what repairs it");
+    auto* command = program.add_subcommand("check", "Report what is not in order and its repair");
     auto options = std::make_shared<CheckOptions>();
-    command->footer("Prints nothing and exits with 0 if all is in order, else with 1. Notes do not count.");
+    command->footer("Prints nothing and exits with 0 if all is in order, else with 1. Notes do not\ncount.");
     command->add_option("NAME", options->copy, "Only what belongs to this copy");
-    command->add_flag("--all", options->all,
-                      "Also what the tool leaves behind on purpose and what is not installed yet");
+    command->add_flag("--all", options->all, "Also what is deliberate or not installed yet");
     command->add_flag("--json", options->json, "Write JSON for programs");
     command->callback([&admin, options] { admin.answer = [&admin, options] { return check(admin, *options); }; });
 }

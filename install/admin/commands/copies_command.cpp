@@ -82,16 +82,15 @@ void addCopiesCommand(CLI::App& program, Admin& admin) {
     auto* command = program.add_subcommand("copies", "Show the installed copies and their services");
     auto options = std::make_shared<CopiesOptions>();
     command->footer(
-        "\"*\" marks the default copy. VIEW is \"both\" if the copy is the same for 64-bit and 32-bit programs, and\n"
-        "\"removed\" if only the key is left that a removal leaves for 32-bit programs.");
+        "\"*\" marks the default copy. VIEW is \"both\" if 64-bit and 32-bit programs see the\n"
+        "same, and \"removed\" if only the key is left that a removal leaves behind.");
     command->add_option("NAME", options->filter.name, "Only this copy");
-    command->add_option("--version", options->versions,
-                        "Only versions of a range such as [9.7,9.8), or that begin with a text; compared as texts");
+    command->add_option("--version", options->versions, "Only a range such as [9.7,9.8), compared as texts");
     command->add_option("--view", options->filter.view, "Only this view: native or 32-bit")
         ->check(CLI::IsMember({"native", "32-bit"}));
     command->add_flag("--valid", options->filter.valid, "Only copies with a valid version");
     command->add_flag("--default", options->filter.isDefault, "Only the default copy");
-    command->add_option("--columns", options->columns, "What is shown of a copy, in order, separated by commas")
+    command->add_option("--columns", options->columns, "What is shown, in order, separated by commas")
         ->delimiter(',')
         ->check(CLI::IsMember(std::vector<std::string>(kCopyColumns.begin(), kCopyColumns.end())));
     auto* format = command->add_option("--format", options->format, "table, tsv, json or jsonl")

@@ -57,7 +57,7 @@ Answer showFacts(Admin& admin) {
 }  // namespace
 
 void addFactsCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("facts", "Write all that is known of this machine as one JSON object");
+    auto* command = program.add_subcommand("facts", "Write what is known of the machine as JSON");
     auto json = std::make_shared<bool>(true);
     command->add_flag("--json", *json, "The same: facts has no other form");
     command->callback([&admin, json] { admin.answer = [&admin] { return showFacts(admin); }; });

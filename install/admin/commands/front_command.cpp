@@ -54,7 +54,7 @@ void addFrontCommand(CLI::App& program, Admin& admin) {
     command->add_option("PROGRAM", *words, "The program and its arguments, best after --")->required();
     command->positionals_at_end();
     auto json = std::make_shared<bool>(false);
-    command->add_flag("--json", *json, "Show no progress; write the result as JSON for programs");
+    command->add_flag("--json", *json, "Write the result as JSON, show no progress");
     command->callback(
         [&admin, words, json] { admin.answer = [&admin, words, json] { return runProgram(admin, *words, *json); }; });
 }

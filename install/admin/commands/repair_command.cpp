@@ -125,14 +125,14 @@ void addRepairCommand(CLI::App& program, Admin& admin) {
     auto* command = program.add_subcommand("repair", "Repair what check reports");
     auto options = std::make_shared<RepairOptions>();
     command->footer(
-        "A KIND is the first word of a line of check, or a group of them: aliases, copies, services, properties,\n"
-        "migration. Without one, all but services and migration is repaired. No program is started.");
+        "A KIND is the first word of a line of check, or a group of kinds: aliases, copies,\n"
+        "services, properties, migration. Without one, all but services and migration is\n"
+        "repaired. No program is started.");
     addChangeOptions(*command, *options);
-    command->add_option("KIND", options->words, "What to repair; the last word may be the name of a copy instead");
-    auto* on = command->add_option("--on", options->request.location,
-                                   "Finish a migration that did not end, for the copy at this location");
+    command->add_option("KIND", options->words, "What to repair; the last word may name a copy");
+    auto* on = command->add_option("--on", options->request.location, "Finish a half-done migration to this location");
     on->check(givenName());
-    command->add_flag("--back", options->request.isBack, "Return to the registry before that migration")->excludes(on);
+    command->add_flag("--back", options->request.isBack, "Take a half-done migration back")->excludes(on);
     command->callback([&admin, options] { admin.answer = [&admin, options] { return repair(admin, *options); }; });
 }
 

@@ -63,7 +63,7 @@ void addReportCommand(CLI::App& program, Admin& admin) {
     auto* file = command->add_option("-o,--output", options->file, "The file to make; without: standard output");
     file->check(givenName());
     command->add_flag("--force", options->force, "Replace an existing file")->needs(file);
-    command->add_flag("--json", options->json, "Write JSON for programs about the file")->needs(file);
+    command->add_flag("--json", options->json, "Write JSON about the file for programs")->needs(file);
     command->callback([&admin, options] { admin.answer = [&admin, options] { return report(admin, *options); }; });
 }
 

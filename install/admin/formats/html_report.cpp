@@ -25,12 +25,13 @@ constexpr std::string_view kHead =
     "*{box-sizing:border-box}\n"
     "body{margin:0 auto;max-width:76rem;padding:1rem;background:var(--page);color:var(--ink);"
     "font:1rem/1.5 system-ui,sans-serif}\n"
-    "h1{font-size:1.5rem;margin:.5rem 0}h2{font-size:1.15rem;margin:2rem 0 .5rem}\n"
+    "h1{font-size:1.5rem;margin:.5rem 0}h2{font-size:1.15rem;margin:2rem 0 .5rem}h3{font-size:1rem;margin:1rem 0 "
+    ".3rem}nav a{margin-right:1rem}\n"
     "header p,.note{color:var(--soft);overflow-wrap:anywhere}\n"
     ".scroll{overflow-x:auto}\n"
     "table{border-collapse:collapse;width:100%}\n"
     "th,td{text-align:left;vertical-align:top;padding:.3rem .7rem;border-bottom:1px solid var(--line)}\n"
-    "thead th{background:var(--band)}td{overflow-wrap:anywhere}tbody th{font-weight:600}\n"
+    "thead th{background:var(--band)}td{overflow-wrap:break-word}tbody th{font-weight:600}\n"
     "code{font-family:ui-monospace,monospace;font-size:.92em}\n"
     ".bad{color:var(--bad);font-weight:600}.good{color:var(--good);font-weight:600}\n"
     "svg{display:block;width:100%;max-width:44rem;min-width:20rem}svg text{fill:var(--ink);font-size:12px}\n"
@@ -87,21 +88,31 @@ void beginSection(std::string_view id, std::string_view title, std::string& html
     html.append(title).append("</h2>\n");
 }
 
+std::vector<std::string> findingRow(const Finding& finding) {
+    const bool isFault = finding.kind().mark == Mark::fault;
+    const std::string kind(finding.kind().name);
+    return {isFault ? "<span class=\"bad\">" + kind + "</span>" : kind, std::string(markName(finding.kind().mark)),
+            escaped(finding.what()), escaped(finding.why()), "<code>" + escaped(finding.repair()) + "</code>"};
+}
+
 void appendFindings(const ReportSource& source, std::string& html) {
     beginSection("findings", "Findings", html);
-    std::vector<std::vector<std::string>> rows;
+    std::vector<std::vector<std::string>> shown;
+    std::vector<std::vector<std::string>> others;
     bool isInOrder = true;
     for (const Finding& finding : source.findings) {
-        const bool isFault = finding.kind().mark == Mark::fault;
-        isInOrder = isInOrder && !isFault;
-        const std::string kind(finding.kind().name);
-        rows.push_back({isFault ? "<span class=\"bad\">" + kind + "</span>" : kind,
-                        std::string(markName(finding.kind().mark)), escaped(finding.what()), escaped(finding.why()),
-                        "<code>" + escaped(finding.repair()) + "</code>"});
+        (finding.kind().isShown ? shown : others).push_back(findingRow(finding));
+        isInOrder = isInOrder && finding.kind().mark != Mark::fault;
     }
+    const std::vector<std::string_view> headings = {"Kind", "Mark", "What", "Why", "Repair"};
     html += isInOrder ? "<p class=\"good\">All is in order.</p>\n" : "<p class=\"bad\">Not all is in order.</p>\n";
-    if (!rows.empty()) {
-        appendTable("Findings", {"Kind", "Mark", "What", "Why", "Repair"}, rows, html);
+    if (!shown.empty()) {
+        appendTable("Findings", headings, shown, html);
+    }
+    if (!others.empty()) {
+        html += "<details><summary>What is deliberate or not installed yet</summary>\n";
+        appendTable("What is deliberate or absent", headings, others, html);
+        html += "</details>\n";
     }
     html += "</section>\n";
 }
