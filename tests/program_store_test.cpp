@@ -178,7 +178,7 @@ TEST(ScarceResources, AFullDiskChangesNothing) {
     EXPECT_EQ(done.exitCode, 0) << done.error;
 }
 
-// The add is in the test of failing calls; these must not crash. The first two hundred allocations are those of
+// The add is in the test of failing calls; these must not crash. The first three hundred allocations are those of
 // kz7admin's libraries.
 TEST(ScarceResources, NoProgramCrashesWithoutMemory) {
 #if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
@@ -189,7 +189,7 @@ TEST(ScarceResources, NoProgramCrashesWithoutMemory) {
     const std::string preloaded = "LD_PRELOAD=" + std::string(KZ7_FAILING_CALLS);
     for (const char* forGood : {"KZ7_FAIL_FOR_GOOD=0", "KZ7_FAIL_FOR_GOOD=1"}) {
         for (const Arguments& command : {Arguments{"kz7InstallReg", "-dotnet", KZ7_SAMPLE}, {"kz7admin", "export"}}) {
-            for (int count = 200; count < 1100; count += 9) {
+            for (int count = 300; count < 1200; count += 9) {
                 const std::string row = "KZ7_FAIL_AT=" + std::to_string(count);
                 const ProgramResult result = state.run(command[0], {command.begin() + 1, command.end()},
                                                        {{preloaded, "KZ7_FAIL_CALL=malloc", row, forGood}, {}});

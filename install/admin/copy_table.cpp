@@ -59,6 +59,23 @@ bool fits(const CopyLine& line, const CopyFilter& filter) {
            (filter.name.empty() || equalsIgnoreCase(filter.name, line.shown->name));
 }
 
+void addLines(const MachineState& machine, const CopyRow& copy, const CopyFilter& filter, bool perView,
+              std::vector<CopyLine>& lines) {
+    CopyLine line{&copy, &copy.shown(), viewsOf(copy), {}, {}, machine.isDefault(copy)};
+    if (!perView && fits(line, filter)) {
+        lines.push_back(line);
+    }
+    for (std::size_t view = 0; perView && view < kViews.size(); ++view) {
+        if (copy.views[view]) {
+            line.shown = &*copy.views[view];
+            line.view = kViews[view].name;
+        }
+        if (copy.views[view] && fits(line, filter)) {
+            lines.push_back(line);
+        }
+    }
+}
+
 TableRow tableRow(const CopyLine& line) {
     return {shownText(line.shown->name) + (line.isDefault ? " *" : ""),
             line.view,
@@ -104,45 +121,39 @@ std::vector<CopyLine> copyLines(const MachineState& machine, IServiceManager& se
     const Status opened = services.openManager(kServiceManagerConnect, manager.receive());
     std::vector<CopyLine> lines;
     for (const CopyRow& copy : machine.copies) {
-        CopyLine line{&copy, &copy.shown(), viewsOf(copy), {}, {}, machine.isDefault(copy)};
-        std::vector<CopyLine> ofCopy;
-        for (std::size_t view = 0; view < kViews.size(); ++view) {
-            if ((perView || !filter.view.empty()) && copy.views[view]) {
-                line.shown = &*copy.views[view];
-                line.view = kViews[view].name;
-                ofCopy.push_back(line);
-            }
+        const std::size_t first = lines.size();
+        addLines(machine, copy, filter, perView || !filter.view.empty(), lines);
+        if (first == lines.size() || copy.service == std::string::npos) {
+            continue;
         }
-        if (!perView && filter.view.empty()) {
-            ofCopy.push_back(line);
-        }
-        std::erase_if(ofCopy, [&](const CopyLine& one) { return !fits(one, filter); });
-        if (!ofCopy.empty() && copy.service != std::string::npos) {
-            line.service = machine.services[copy.service].name;
-            line.state = succeeded(opened) ? stateOf(services, manager.get(), line.service)
-                                           : compose("unknown, error %u", {opened});
-        }
-        for (CopyLine& one : ofCopy) {
-            one.service = line.service;
-            one.state = line.state;
-            lines.push_back(std::move(one));
+        const std::string& service = machine.services[copy.service].name;
+        const std::string state =
+            succeeded(opened) ? stateOf(services, manager.get(), service) : compose("unknown, error %u", {opened});
+        for (std::size_t line = first; line < lines.size(); ++line) {
+            lines[line].service = service;
+            lines[line].state = state;
         }
     }
     return lines;
 }
 
 std::string copyField(const CopyLine& line, std::string_view name) {
-    const auto yes = [](bool value) { return std::string(value ? "yes" : "no"); };
+    static constexpr auto yes = [](bool value) { return std::string(value ? "yes" : "no"); };
     // clang-format off
-    return name == "name"     ? line.shown->name
-         : name == "view"     ? line.view
-         : name == "version"  ? line.shown->info.getVersion()
-         : name == "valid"    ? yes(line.shown->info.isValid())
-         : name == "location" ? line.shown->location
-         : name == "service"  ? line.service
-         : name == "state"    ? line.state
-                              : yes(line.isDefault);
+    static const std::array<std::string (*)(const CopyLine&), kCopyColumns.size()> kFields = {
+        [](const CopyLine& one) { return one.shown->name; },
+        [](const CopyLine& one) { return one.view; },
+        [](const CopyLine& one) { return one.shown->info.getVersion(); },
+        [](const CopyLine& one) { return yes(one.shown->info.isValid()); },
+        [](const CopyLine& one) { return one.shown->location; },
+        [](const CopyLine& one) { return one.service; },
+        [](const CopyLine& one) { return one.state; },
+        [](const CopyLine& one) { return yes(one.isDefault); },
+    };
     // clang-format on
+    const auto* const column = std::find(kCopyColumns.begin(), kCopyColumns.end(), name);
+    return column == kCopyColumns.end() ? std::string{}
+                                        : kFields[static_cast<std::size_t>(column - kCopyColumns.begin())](line);
 }
 
 std::string copiesText(const std::vector<CopyLine>& lines, const std::vector<std::string>& columns,

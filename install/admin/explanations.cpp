@@ -176,6 +176,27 @@ std::string_view leadingNumber(std::string_view text) {
     return text.substr(0, text.find_first_not_of("-0123456789abcdefxABCDEFX"));
 }
 
+// Calls `add` with each number of a line that follows the mark, or begins with it.
+template <typename Add>
+void addAfter(std::string_view line, std::string_view mark, bool isPart, Add add) {
+    for (std::size_t at = line.find(mark); at != std::string_view::npos; at = line.find(mark, at + 1)) {
+        if (const auto number = numberOf(leadingNumber(line.substr(isPart ? at : at + mark.size())))) {
+            add(*number);
+        }
+    }
+}
+
+void addMentioned(std::string_view line, Meanings& meanings) {
+    for (const std::string_view source : {"uselvlkz7reg.cpp:", "uselvlkz7reg:"}) {
+        addAfter(line, source, false, [&](std::uint32_t number) { addLine(number, meanings); });
+    }
+    const auto status = [&](std::uint32_t number) { addStatus(number, meanings); };
+    for (const std::string_view mark : {"rc =", "rc=", "error code", "error ", "exit code", "status", "value "}) {
+        addAfter(line, mark, false, status);
+    }
+    addAfter(line, "0x", true, status);
+}
+
 }  // namespace
 
 std::span<const LineExplanation> lineExplanations() {
@@ -206,29 +227,8 @@ Meanings findMentioned(std::string_view text) {
     Meanings meanings;
     for (std::size_t begin = 0; begin < text.size();) {
         const std::size_t end = std::min(text.find('\n', begin), text.size());
-        const std::string_view line = text.substr(begin, end - begin);
+        addMentioned(text.substr(begin, end - begin), meanings);
         begin = end + 1;
-        constexpr std::string_view kSource = "uselvlkz7reg";
-        if (const std::size_t source = line.find(kSource); source != std::string_view::npos) {
-            const std::size_t colon = line.find(':', source);
-            const std::string_view number =
-                colon == std::string_view::npos ? "" : leadingNumber(line.substr(colon + 1));
-            if (const auto found = numberOf(number)) {
-                addLine(*found, meanings);
-            }
-        }
-        for (const std::string_view mark : {"rc =", "rc=", "error code", "error ", "exit code", "status", "value "}) {
-            for (std::size_t at = line.find(mark); at != std::string_view::npos; at = line.find(mark, at + 1)) {
-                if (const auto found = numberOf(leadingNumber(line.substr(at + mark.size())))) {
-                    addStatus(*found, meanings);
-                }
-            }
-        }
-        for (std::size_t at = line.find("0x"); at != std::string_view::npos; at = line.find("0x", at + 2)) {
-            if (const auto found = numberOf(leadingNumber(line.substr(at)))) {
-                addStatus(*found, meanings);
-            }
-        }
     }
     return meanings;
 }

@@ -75,34 +75,74 @@ std::string shownOr(std::string_view text, std::string_view otherwise) {
     return text.empty() ? std::string(otherwise) : shownText(text);
 }
 
+bool isDigit(char c) {
+    return c >= '0' && c <= '9';
+}
+
+// Takes a number off a text, without its leading zeros.
+std::string_view takeNumber(std::string_view& text) {
+    text.remove_prefix(std::min(text.find_first_not_of('0'), text.size()));
+    const auto* const end = std::find_if_not(text.begin(), text.end(), isDigit);
+    const std::string_view number = text.substr(0, static_cast<std::size_t>(end - text.begin()));
+    text.remove_prefix(number.size());
+    return number;
+}
+
+// Takes a number or a character off both texts and compares them.
+int takeAndCompare(std::string_view& left, std::string_view& right) {
+    if (isDigit(left.front()) && isDigit(right.front())) {
+        const std::string_view one = takeNumber(left);
+        const std::string_view two = takeNumber(right);
+        return one.size() == two.size() ? one.compare(two) : one.size() < two.size() ? -1 : 1;
+    }
+    const int order = foldUpper(left.front()) - foldUpper(right.front());
+    left.remove_prefix(1);
+    right.remove_prefix(1);
+    return order;
+}
+
 // Compares as people count: runs of digits by their value.
 int compareAsNumbers(std::string_view left, std::string_view right) {
-    const auto isDigit = [](char c) { return c >= '0' && c <= '9'; };
-    while (!left.empty() && !right.empty()) {
-        if (!isDigit(left.front()) || !isDigit(right.front())) {
-            if (foldUpper(left.front()) != foldUpper(right.front())) {
-                return foldUpper(left.front()) < foldUpper(right.front()) ? -1 : 1;
-            }
-            left.remove_prefix(1);
-            right.remove_prefix(1);
-            continue;
-        }
-        const auto take = [&](std::string_view& text) {
-            text.remove_prefix(std::min(text.find_first_not_of('0'), text.size()));
-            const std::size_t end =
-                static_cast<std::size_t>(std::find_if_not(text.begin(), text.end(), isDigit) - text.begin());
-            const std::string_view number = text.substr(0, end);
-            text.remove_prefix(end);
-            return number;
-        };
-        const std::string_view one = take(left);
-        const std::string_view two = take(right);
-        if (one != two) {
-            return one.size() != two.size() ? (one.size() < two.size() ? -1 : 1) : one.compare(two);
-        }
+    int order = 0;
+    while (order == 0 && !left.empty() && !right.empty()) {
+        order = takeAndCompare(left, right);
     }
-    return left.empty() ? (right.empty() ? 0 : -1) : 1;
+    return order != 0 ? order : static_cast<int>(!left.empty()) - static_cast<int>(!right.empty());
 }
+
+void addWord(std::string& list, std::string_view word) {
+    list.append(list.empty() ? "" : ", ").append(word);
+}
+
+bool isVersionRow(const LayoutRow& row) {
+    return row.key == "CurrentVersion" && row.name != "Service Level";
+}
+
+// What of a copy's layout a view lacks. Missing versions alone, or a missing location, are kinds of their own.
+struct Missing {
+    explicit Missing(const CopyInView& copy) {
+        for (std::size_t row = 0; row < copy.rows.size(); ++row) {
+            const LayoutRow& layout = copyRows()[row];
+            const std::optional<std::string>& text = copy.rows[row];
+            if (isVersionRow(layout) && (!text || text->empty())) {
+                addWord(versions, layout.name);
+            }
+            if (text) {
+                isBare = false;
+                continue;
+            }
+            isHalf = isHalf || (!isVersionRow(layout) && !layout.key.empty());
+            const bool isBoth = !layout.key.empty() && !layout.name.empty();
+            addWord(rows, std::string(layout.key) + (isBoth ? "\\" : "") + std::string(layout.name));
+        }
+        rows = isBare ? "everything" : rows;
+    }
+
+    std::string versions;
+    std::string rows;
+    bool isHalf = false;
+    bool isBare = true;
+};
 
 class Checker {
 public:
@@ -171,48 +211,26 @@ private:
         }
     }
 
-    // What of a copy's layout a view lacks. Missing versions alone, or a missing location, are kinds of their own.
     void checkRows(const CopyRow& copy, std::size_t view) {
         const std::string& name = copy.name();
         if (!copy.views[view]) {
             add({Reason::halfCopy, name, name, view, "everything"});
             return;
         }
-        const CopyInView& found = *copy.views[view];
-        std::string versions;
-        std::string missing;
-        bool isHalf = false;
-        for (std::size_t row = 0; row < found.rows.size(); ++row) {
-            const LayoutRow& layout = copyRows()[row];
-            const bool isVersion = isVersionRow(layout);
-            const std::optional<std::string>& text = found.rows[row];
-            if (isVersion && (!text || text->empty())) {
-                versions.append(versions.empty() ? "" : ", ").append(layout.name);
-            }
-            if (!text) {
-                isHalf = isHalf || (!isVersion && !layout.key.empty());
-                missing.append(missing.empty() ? "" : ", ").append(layout.key);
-                missing.append(layout.key.empty() || layout.name.empty() ? "" : "\\").append(layout.name);
-            }
-        }
-        if (isHalf) {
-            const bool isBare =
-                std::none_of(found.rows.begin(), found.rows.end(), [](const auto& row) { return row.has_value(); });
-            add({Reason::halfCopy, name, name, view, isBare ? "everything" : missing});
+        const Missing missing(*copy.views[view]);
+        if (missing.isHalf) {
+            add({Reason::halfCopy, name, name, view, missing.rows});
             return;
         }
-        if (!versions.empty()) {
-            add({Reason::invalidVersion, name, name, view, versions});
+        if (!missing.versions.empty()) {
+            add({Reason::invalidVersion, name, name, view, missing.versions});
         }
-        if (found.location.empty()) {
+        const std::string& location = copy.views[view]->location;
+        if (location.empty()) {
             add({Reason::noLocation, name, name, view});
-        } else if (!fitsCharacters(found.location, kLocationLimit)) {
+        } else if (!fitsCharacters(location, kLocationLimit)) {
             add({Reason::locationTooLong, name, name, view});
         }
-    }
-
-    static bool isVersionRow(const LayoutRow& row) {
-        return row.key == "CurrentVersion" && row.name != "Service Level";
     }
 
     void compareViews(const CopyRow& copy) {
@@ -346,6 +364,26 @@ private:
     std::unordered_map<std::string, bool> probed_;
 };
 
+// An alias that does not name the copy that it should name.
+std::optional<Finding> judgeNamed(const AliasRow& row, std::size_t view, const CopyRow* named) {
+    const AliasValue& value = *row.values[view];
+    const std::string should = row.should.value_or(std::string{});
+    if (!value.isText) {
+        return Finding{Reason::aliasUnreadable, {}, row.prefix, view};
+    }
+    if (named == nullptr) {
+        return Finding{Reason::aliasGone, {}, row.prefix, view, value.text, should};
+    }
+    if (should.empty()) {
+        return Finding{Reason::aliasUnmatched, {}, row.prefix, view, value.text};
+    }
+    // Of two equal versions either may have it: an add does not rewrite the aliases.
+    if (named->isValid() && named->shown().info.getVersion() == row.version) {
+        return {};
+    }
+    return Finding{Reason::aliasLower, {}, row.prefix, view, value.text, should};
+}
+
 }  // namespace
 
 const FindingKind& Finding::kind() const {
@@ -371,39 +409,22 @@ std::vector<FindingKind> findingKinds() {
 
 std::optional<Finding> judgeAlias(const MachineState& machine, const AliasRow& row, std::size_t view, bool hasAliases) {
     const std::optional<AliasValue>& value = row.values[view];
-    const std::string should = row.should.value_or(std::string{});
-    if (value && !fitsCharacters(row.prefix, kAliasNameRoom - 1)) {
+    if (!value) {
+        const bool isMissing = hasAliases && isAliasName(row.prefix) && row.should && !row.should->empty();
+        return isMissing ? std::optional(Finding{Reason::aliasMissing, {}, row.prefix, view, *row.should})
+                         : std::nullopt;
+    }
+    if (!fitsCharacters(row.prefix, kAliasNameRoom - 1)) {
         return Finding{isAliasName(row.prefix) ? Reason::aliasNameTooLong : Reason::walkEnds, {}, row.prefix, view};
     }
-    const CopyRow* const named = value ? machine.find(value->text) : nullptr;
-    if (value && named != nullptr && named->isRemoved()) {
+    const CopyRow* const named = machine.find(value->text);
+    if (named != nullptr && named->isRemoved()) {
         return Finding{Reason::aliasOfRemoved, {}, row.prefix, view, value->text};
     }
-    if (!isAliasName(row.prefix)) {
+    if (!isAliasName(row.prefix) || (value->isText && row.should && equalsIgnoreCase(value->text, *row.should))) {
         return {};
     }
-    if (!value) {
-        const bool isMissing = hasAliases && !should.empty();
-        return isMissing ? std::optional(Finding{Reason::aliasMissing, {}, row.prefix, view, should}) : std::nullopt;
-    }
-    if (!value->isText) {
-        return Finding{Reason::aliasUnreadable, {}, row.prefix, view};
-    }
-    if (row.should && equalsIgnoreCase(value->text, should)) {
-        return {};
-    }
-    if (named == nullptr) {
-        return Finding{Reason::aliasGone, {}, row.prefix, view, value->text, should};
-    }
-    if (should.empty()) {
-        return Finding{Reason::aliasUnmatched, {}, row.prefix, view, value->text};
-    }
-    // Of two equal versions either may have it: an add does not rewrite the aliases.
-    const std::string& version = named->shown().info.getVersion();
-    if (named->isValid() && version == row.version) {
-        return {};
-    }
-    return Finding{Reason::aliasLower, {}, row.prefix, view, value->text, should};
+    return judgeNamed(row, view, named);
 }
 
 std::vector<Finding> findFindings(const MachineState& machine, IFileSystem& files, bool all) {

@@ -100,38 +100,50 @@ private:
         OwnedKey key(registry_);
         OwnedKey below(registry_);
         Status status = open(view, copy.name, key);
-        std::array<std::string, 4> fields;
         copy.rows.resize(copyRows().size());
-        const std::string_view* last = nullptr;
+        std::string_view opened;
         for (std::size_t row = 0; status == kSuccess && row < copy.rows.size(); ++row) {
             const LayoutRow& layout = copyRows()[row];
-            const bool isVersion = layout.key == kVersionKey;
-            if (depth_ == Depth::copies && !isVersion && !layout.key.empty()) {
-                continue;
+            if (isRead(layout) && layout.key != opened) {
+                status = present(open(key.get(), layout.key, below));
+                opened = layout.key;
             }
-            if (!layout.key.empty() && (last == nullptr || *last != layout.key)) {
-                status = open(key.get(), layout.key, below);
-                last = &layout.key;
-                if (isVersion && status == kSuccess) {
-                    status = readText(below.get(), "Fix Level", kFieldRoom, copy.fixLevel);
-                }
-                status = present(status);
-            }
-            if (status == kSuccess && (layout.key.empty() || below)) {
-                const bool isLocation = layout.data == kLocation;
-                status = present(readText(layout.key.empty() ? key.get() : below.get(), layout.name,
-                                          isLocation ? kLocationRoom : kFieldRoom, copy.rows[row]));
-            }
-            for (std::size_t field = 0; isVersion && field < kFields.size(); ++field) {
-                if (layout.name == kFields[field]) {
-                    fields[field] = copy.rows[row].value_or(std::string{});
-                }
+            if (status == kSuccess && isRead(layout)) {
+                status = readRow((layout.key.empty() ? key : below).get(), row, copy);
             }
         }
-        fields[3] = copy.fixLevel.value_or(std::string{});
         copy.location = copy.rows.front().value_or(std::string{});
-        copy.info = InstallCopyInfo(copy.name, std::move(fields));
+        copy.info = InstallCopyInfo(copy.name, fieldsOf(copy));
         return status;
+    }
+
+    // Of a key that does not exist, none.
+    Status readRow(KeyHandle key, std::size_t row, CopyInView& copy) {
+        const LayoutRow& layout = copyRows()[row];
+        if (key == KeyHandle::none) {
+            return kSuccess;
+        }
+        const Status status =
+            readText(key, layout.name, layout.data == kLocation ? kLocationRoom : kFieldRoom, copy.rows[row]);
+        return status == kSuccess && layout.name == "Version" ? readText(key, "Fix Level", kFieldRoom, copy.fixLevel)
+                                                              : present(status);
+    }
+
+    bool isRead(const LayoutRow& layout) const {
+        return depth_ == Depth::whole || layout.key.empty() || layout.key == "CurrentVersion";
+    }
+
+    static std::array<std::string, 4> fieldsOf(const CopyInView& copy) {
+        constexpr std::array<std::string_view, 3> kFields = {"Version", "Release", "Modification"};
+        std::array<std::string, 4> fields;
+        for (std::size_t row = 0; row < copy.rows.size(); ++row) {
+            const auto* const field = std::find(kFields.begin(), kFields.end(), copyRows()[row].name);
+            if (field != kFields.end()) {
+                fields[static_cast<std::size_t>(field - kFields.begin())] = copy.rows[row].value_or(std::string{});
+            }
+        }
+        fields.back() = copy.fixLevel.value_or(std::string{});
+        return fields;
     }
 
     Status readText(KeyHandle key, std::string_view name, std::size_t room, std::optional<std::string>& text) {
@@ -266,9 +278,6 @@ private:
         }
         return status;
     }
-
-    static constexpr std::string_view kVersionKey = "CurrentVersion";
-    static constexpr std::array<std::string_view, 3> kFields = {"Version", "Release", "Modification"};
 
     IRegistryStore& registry_;
     Depth depth_;

@@ -219,6 +219,7 @@ void appendAliases(const ReportSource& source, std::string& html) {
                 {static_cast<std::uint32_t>(kDrawn), static_cast<std::uint32_t>(aliases.size())});
         }
         std::vector<std::vector<std::string>> rows;
+        rows.reserve(aliases.size());
         for (const DrawnAlias& alias : aliases) {
             rows.push_back({escaped(alias.prefix), orNone(escaped(alias.target)),
                             alias.why.empty() ? "right" : "<span class=\"bad\">" + escaped(alias.why) + "</span>"});
