@@ -43,6 +43,14 @@ std::string copiesLines(const std::vector<CopyLine>& lines, const CopiesOptions&
     return text;
 }
 
+Answer show(Admin& admin, const std::vector<CopyLine>& lines, const CopiesOptions& options, const std::string& store) {
+    if (options.format == "table") {
+        return admin.show(copiesText(lines, options.columns, admin.output().columns));
+    }
+    return admin.show(options.format == "json" ? copiesJson(lines, options, store) : copiesLines(lines, options),
+                      Admin::Form::document);
+}
+
 Answer showCopies(Admin& admin, CopiesOptions options) {
     options.format = options.json ? "json" : options.format;
     if (VersionRange range; !options.versions.empty()) {
@@ -63,13 +71,7 @@ Answer showCopies(Admin& admin, CopiesOptions options) {
         return kAnswerFault;
     }
     const std::string store = admin.platform().storeName();
-    Answer shown = kAnswerYes;
-    if (options.format == "table") {
-        shown = admin.show(copiesText(lines, options.columns, admin.output().columns));
-    } else {
-        shown = admin.show(options.format == "json" ? copiesJson(lines, options, store) : copiesLines(lines, options),
-                           Admin::Form::document);
-    }
+    const Answer shown = show(admin, lines, options, store);
     if (shown != kAnswerYes || !lines.empty()) {
         return shown;
     }
