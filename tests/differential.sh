@@ -247,14 +247,14 @@ same 'back to the export'                    restore wanted.reg --detailed-exitc
 same 'it is there'                           restore wanted.reg --detailed-exitcode
 # A machine in order, one that is not, and its repair.
 same 'a machine in order'                    check
-same 'a copy without a location'             import damage.reg
+same 'damage'                                import damage.reg
 same 'what is not in order'                  check
 same 'and what is deliberate'                check --all FIRST
 same 'a prefix that names no copy'           resolve 9.7
 same 'its repair, foretold'                  repair --check --diff
 same 'its repair'                            repair services aliases copies --detailed-exitcode
 same 'all is in order again'                 check
-same 'the copies'                            copies --format tsv
+same 'the copy'                              copies FIRST --format tsv
 same 'the copy of a prefix'                  resolve 9 --json
 same 'a status and an error line'            explain 5021 392
 program=kz7InstallReg

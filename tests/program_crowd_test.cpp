@@ -104,6 +104,7 @@ std::vector<Arguments> manyAdds() {
 const TemporaryDirectory kDocuments;
 const std::string kList = kDocuments.path() + "/copies.json";
 const std::string kRegistry = kDocuments.path() + "/wanted.reg";
+const std::string kDamage = kDocuments.path() + "/damage.reg";
 
 void writeDocuments() {
     std::string list = "{\"copies\": [";
@@ -116,6 +117,9 @@ void writeDocuments() {
         other.tool({"-addKZ7Copy", copyName(2, copy), "C:\\KZ7"});
     }
     overwrite(kRegistry, other.tool({"export"}).output);
+    const std::string copies = "[HKLM\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies";
+    overwrite(kDamage, "REGEDIT4\n" + copies + "]\n\"9.7\"=\"GONE\"\n[-" + copies.substr(1) +
+                           "\\FIRST\\PROFILES]\n[-HKLM\\SYSTEM\\CurrentControlSet\\Services\\KZ7MGMTSVC_FIRST]\n");
 }
 
 const KilledFlow kFlows[] = {
@@ -131,6 +135,7 @@ const KilledFlow kFlows[] = {
     {"ensure", {kAddFirst}, {"ensure", "--from", kList}},
     {"restore", {kAddFirst}, {"restore", kRegistry}},
     {"import", {kAddFirst}, {"import", kRegistry}},
+    {"repair", {kAddFirst, {"import", kDamage}}, {"repair", "aliases", "copies", "services"}},
     {"restoreADamagedStore", {kAddFirst}, {"restore", kRegistry}, true},
 };
 

@@ -41,7 +41,7 @@ struct CopyLine {
     const CopyRow* copy = nullptr;
     const CopyInView* shown = nullptr;
     std::string view;
-    std::string service = {};  // empty: there is none
+    std::string service = {};  // empty: the copy has no service
     std::string state = {};    // of the service, in words
     bool isDefault = false;
 };

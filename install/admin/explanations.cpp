@@ -73,6 +73,7 @@ constexpr std::array kStatuses = {
     StatusExplanation{kInvalidData,            "invalid data",                false, "A file holds something else than it should.", kRuntime},
     StatusExplanation{kOutOfMemory,            "out of memory",               true,  "No memory was left. Nothing that was not committed is on disk.", "Free memory and run the command again."},
     StatusExplanation{kWriteFault,             "write fault",                 false, "A stream does not take what is written.", "See where the output is redirected to."},
+    StatusExplanation{kReadFault,              "read fault",                  false, "The list of copies could not be read whole, so nothing is removed.", "kz7admin check shows what cannot be read."},
     StatusExplanation{kGeneralFailure,         "general failure",             false, "A device or resource failed in a way that has no number.", kRuntime},
     StatusExplanation{kEndOfFile,              "end of file",                 false, "Nothing is left to read.", "Give the input that is asked for."},
     StatusExplanation{kFileExists,             "file exists",                 false, "The file to write exists.", "Choose another name, or --force."},

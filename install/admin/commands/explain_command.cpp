@@ -90,8 +90,8 @@ void addExplainCommand(CLI::App& program, Admin& admin) {
     auto* command = program.add_subcommand("explain", "Explain a status, an exit code or an error line");
     auto options = std::make_shared<ExplainOptions>();
     command->footer(
-        "WHAT is a status (5021, 0x870F0104), an exit code as a POSIX shell shows it (157),\n"
-        "the number of an error line (392), or \"-\" for pasted output or a log.");
+        "WHAT is a status (5021, 0x870F0104), an exit code as a POSIX shell shows it\n"
+        "(157), the number of an error line (392), or \"-\" for pasted output or a log.");
     command->add_option("WHAT", options->words, "What to explain")->required();
     command->add_flag("--json", options->json, "Write JSON for programs");
     command->callback([&admin, options] { admin.answer = [&admin, options] { return explain(admin, *options); }; });

@@ -112,7 +112,7 @@ Answer repair(Admin& admin, RepairOptions options) {
     if (const Answer answer = repairOn(admin, options, recorded.ports(), run); answer != kAnswerYes) {
         return answer;
     }
-    run.changes = recorded.changes();
+    takeChanges(recorded, run);
     if (const Status status = admin.registry().commit(); status != kSuccess) {
         return admin.storeFault("cannot save changes", status);
     }
@@ -125,9 +125,9 @@ void addRepairCommand(CLI::App& program, Admin& admin) {
     auto* command = program.add_subcommand("repair", "Repair what check reports");
     auto options = std::make_shared<RepairOptions>();
     command->footer(
-        "A KIND is the first word of a line of check, or a group of kinds: aliases, copies,\n"
-        "services, properties, migration. Without one, all but services and migration is\n"
-        "repaired. No program is started.");
+        "A KIND is the first word of a line of check, or a group of kinds: aliases,\n"
+        "copies, services, properties, migration. Without one, all but services and\n"
+        "migration is repaired. No program is started.");
     addChangeOptions(*command, *options);
     command->add_option("KIND", options->words, "What to repair; the last word may name a copy");
     auto* on = command->add_option("--on", options->request.location, "Finish a half-done migration to this location");
