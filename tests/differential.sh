@@ -254,8 +254,7 @@ same 'a prefix that names no copy'           resolve 9.7
 same 'its repair, foretold'                  repair --check --diff
 same 'its repair'                            repair services aliases copies --detailed-exitcode
 same 'all is in order again'                 check
-same 'the copy'                              copies FIRST --format tsv
-same 'the copy of a prefix'                  resolve 9 --json
+same 'the version of a prefix'               resolve 9 --field version
 same 'a status and an error line'            explain 5021 392
 program=kz7InstallReg
 
