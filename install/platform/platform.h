@@ -90,7 +90,8 @@ public:
     virtual bool storeIsLost() { return false; }
 
     // Puts a new store with what `fill` writes in the place of this one, or creates the missing one. The old one keeps
-    // its content under the name `kept`, empty if there was none. kBusy: somebody has it open. A fault is told.
+    // its content under the name `kept`, empty if there was none. kBusy: another program has it open. A fault is
+    // reported.
     virtual Status replaceStore(const std::function<Status(IRegistryStore&)>&, std::string& /*kept*/) {
         return kCallNotImplemented;
     }
