@@ -1,6 +1,6 @@
 #include "install/admin/change_report.h"
 
-#include <algorithm>
+#include <sstream>
 
 #include "install/admin/formats/change_text.h"
 #include "install/admin/formats/json_text.h"
@@ -83,12 +83,21 @@ Answer fillPreview(Admin& admin, Preview& preview) {
     return status == kSuccess ? kAnswerYes : admin.storeFault("cannot read: " + shownText(key), status);
 }
 
+void takeErrorLines(const std::string& text, ChangeRun& run) {
+    std::istringstream lines(text);
+    for (std::string line; std::getline(lines, line);) {
+        run.errors.push_back({0, run.status, line});
+    }
+}
+
 Answer showPreview(Admin& admin, const ChangeOptions& options, Preview& preview, ChangeRun& run) {
     run.changes = preview.changes();
     run.programs = preview.programs();
     run.output = preview.console().output;
     if (!options.json) {
         admin.platform().console().writeError(preview.console().error);
+    } else if (run.errors.empty()) {
+        takeErrorLines(preview.console().error, run);
     }
     return showRun(admin, options, run);
 }

@@ -39,6 +39,9 @@ struct ChangeRun {
 // The changes that were recorded, with a note if some of the states before could not be read.
 void takeChanges(const RecordedPorts& recorded, ChangeRun& run);
 
+// Adds what a run that keeps no list of its error lines wrote on standard error.
+void takeErrorLines(const std::string& text, ChangeRun& run);
+
 // Fills a preview with the machine's state and reports a failure.
 Answer fillPreview(Admin& admin, Preview& preview);
 

@@ -18,6 +18,9 @@
 namespace kz7 {
 
 std::string Ensurer::plan(const std::vector<WantedCopy>& wanted) {
+    if (std::string other = otherSpelling(wanted); !other.empty()) {
+        return other;
+    }
     InstallCopyList list(*ports_.registry, *ports_.debugOutput, false, false);
     left_ = findRemovals(list, wanted);
     const auto absent =
@@ -32,6 +35,27 @@ std::string Ensurer::plan(const std::vector<WantedCopy>& wanted) {
     }
     return "cannot remove " + shownText(removals_.back()) +
            ": the last copy takes the whole product along (--prune --all removes it)";
+}
+
+// A host that folds the case of more letters than we do has one copy where we see two.
+std::string Ensurer::otherSpelling(const std::vector<WantedCopy>& wanted) {
+    std::set<std::string> subkeys;  // folded
+    OwnedKey copies(*ports_.registry);
+    std::vector<Subkey> found;
+    if (ports_.registry->openKey(KeyHandle::localMachine, layout::kCopies, kKeyWalk, copies.receive()) == kSuccess &&
+        reader_.subkeys(copies.get(), found) == kSuccess) {
+        for (const Subkey& key : found) {
+            subkeys.insert(foldUpper(key.name));
+        }
+        for (const WantedCopy& copy : wanted) {
+            OwnedKey key(*ports_.registry);
+            if (!subkeys.contains(foldUpper(copy.name)) &&
+                ports_.registry->openKey(copies.get(), copy.name, kKeyQueryValue, key.receive()) == kSuccess) {
+                return "copy " + shownText(copy.name) + " is installed under another spelling of its name";
+            }
+        }
+    }
+    return {};
 }
 
 // Why the list is not known to be whole; empty if it is.
@@ -138,14 +162,13 @@ Status Ensurer::hasService(const std::string& name, bool& exists) {
     return status == kServiceDoesNotExist ? kSuccess : status;
 }
 
-// A removal that could not delete something succeeds all the same.
+// The deletions do not report their failures.
 Status Ensurer::makeAbsent(const std::string& name) {
-    Report report(*ports_.console, &errors);
-    Status status = removeCopy(*ports_.registry, *ports_.services, *ports_.debugOutput, report, name.c_str(),
-                               left_ != 0 || name != removals_.back());
+    // Not by the flow, which reads the list of all copies for each of them.
+    deleteCopy(*ports_.registry, *ports_.services, name, left_ == 0 && name == removals_.back());
     OwnedKey key(*ports_.registry);
     bool hasRest = false;
-    status = status == kSuccess ? hasService(std::string(managementServiceName(name).view()), hasRest) : status;
+    Status status = hasService(std::string(managementServiceName(name).view()), hasRest);
     if (status == kSuccess && !hasRest) {
         status = ports_.registry->openKey(KeyHandle::localMachine, substituteCopyName(layout::kCopy, name),
                                           kKeyQueryValue, key.receive());

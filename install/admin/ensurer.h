@@ -36,6 +36,7 @@ public:
 private:
     // Returns the number of copies that are left.
     std::size_t findRemovals(InstallCopyList& list, const std::vector<WantedCopy>& wanted);
+    std::string otherSpelling(const std::vector<WantedCopy>& wanted);
     std::string unreadCopy(InstallCopyList& list);
     Status makePresent(const WantedCopy& copy);
     Status makeAbsent(const std::string& name);

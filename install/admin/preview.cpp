@@ -1,6 +1,7 @@
 #include "install/admin/preview.h"
 
 #include "install/platform/assembly_records.h"
+#include "install/platform/registry_path.h"
 
 namespace kz7 {
 
@@ -27,23 +28,25 @@ Ports Preview::memoryPorts(bool asksLevel) {
     return ports;
 }
 
-// What exists above a key is not created by a flow.
+// What exists above a key is not created by a flow. Spelled as the machine spells it.
 Status Preview::copyParents(const KeyName& name) {
-    Status status = kSuccess;
-    for (std::size_t end = name.path.find('\\'); status == kSuccess && end != std::string::npos;
-         end = name.path.find('\\', end + 1)) {
-        OwnedKey key(machine_.registry());
-        OwnedKey copied(registry_);
-        const std::string path = name.path.substr(0, end);
-        status = machine_.registry().openKey(name.root, path, kKeyQueryValue, key.receive());
-        if (isNotFound(status)) {
-            return kSuccess;
-        }
+    IRegistryStore& live = machine_.registry();
+    KeyReader reader(live);
+    OwnedKey parent(live);
+    OwnedKey copy(registry_);
+    Status status = live.openKey(name.root, {}, kKeyWalk, parent.receive());
+    std::string_view rest = name.path;
+    std::string path;
+    for (std::string_view part; status == kSuccess && takeName(rest, part) && !rest.empty();) {
+        Subkey found;
+        status = reader.subkey(parent.get(), part, found);
         if (status == kSuccess) {
-            status = registry_.createKey(name.root, path, {}, kKeySetValue, copied.receive());
+            path += (path.empty() ? "" : "\\") + found.name;
+            status = registry_.createKey(name.root, path, found.keyClass, kKeySetValue, copy.receive());
         }
+        status = status == kSuccess ? live.openKey(name.root, path, kKeyWalk, parent.receive()) : status;
     }
-    return status;
+    return isNotFound(status) ? kSuccess : status;
 }
 
 Status Preview::copyKeys(const Snapshot& keys) {

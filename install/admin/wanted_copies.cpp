@@ -138,12 +138,28 @@ private:
 
 bool parseWantedCopies(std::string_view text, std::vector<WantedCopy>& copies, std::string& fault) {
     json document;
+    std::vector<std::set<std::string>> open;  // the names of the fields of each open object
+    std::string twice;
+    const auto watch = [&](int, json::parse_event_t event, json& parsed) {
+        if (event == json::parse_event_t::object_start) {
+            open.emplace_back();
+        } else if (event == json::parse_event_t::object_end) {
+            open.pop_back();
+        } else if (event == json::parse_event_t::key && !open.back().insert(parsed.get<std::string>()).second) {
+            twice = parsed.get<std::string>();
+        }
+        return true;
+    };
     try {
-        document = json::parse(text);
+        document = json::parse(text, watch);
     } catch (const json::parse_error& error) {
         const std::size_t read = std::min(error.byte, text.size());
         const auto line = 1 + std::count(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(read), '\n');
         fault = compose("line %u: not valid JSON", {static_cast<std::uint32_t>(line)});
+        return false;
+    }
+    if (!twice.empty()) {
+        fault = twice + ": is twice in one object";
         return false;
     }
     return Reader(copies, fault).document(document);

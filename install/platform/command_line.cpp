@@ -13,6 +13,15 @@ constexpr bool isBlank(char c) {
     return c == ' ' || c == '\t';
 }
 
+// Neither a splitter nor a command interpreter acts upon any character of such a word.
+bool isPlain(std::string_view word) {
+    constexpr std::string_view kPlain = "-_./\\:+@";
+    return !word.empty() && std::all_of(word.begin(), word.end(), [&](char c) {
+        const char letter = static_cast<char>(c | 0x20);
+        return (c >= '0' && c <= '9') || (letter >= 'a' && letter <= 'z') || kPlain.find(c) != std::string_view::npos;
+    });
+}
+
 std::size_t takeBackslashes(std::string_view& text) {
     const std::size_t count = std::min(text.find_first_not_of('\\'), text.size());
     text.remove_prefix(count);
@@ -96,6 +105,11 @@ std::string joinArguments(const std::vector<std::string>& words) {
         // The program's own word ends at its closing quote, whatever stands before that.
         if (line.empty()) {
             line += '"' + word + '"';
+            continue;
+        }
+        // Command interpreters know their options without quotation marks only.
+        if (isPlain(word)) {
+            line += ' ' + word;
             continue;
         }
         line += " \"";

@@ -17,8 +17,22 @@ constexpr std::string_view kRemoved  = "The KZ7 Copy %s has been removed";
 
 }  // namespace
 
+void deleteCopy(IRegistryStore& registry, IServiceManager& services, std::string_view copyName, bool isLast) {
+    if (isLast) {
+        deleteTree(registry, KeyHandle::localMachine, layout::kProduct, 0, {}, {});
+    } else {
+        // Deliberate: the copy's 32-bit key and the values that name it remain.
+        deleteTree(registry, KeyHandle::localMachine, layout::kCopy, 0, copyName, {});
+        const std::string copy = substituteCopyName(layout::kCopy, copyName);
+        if (succeeded(checkPathLength(copy))) {
+            registry.deleteKey(KeyHandle::localMachine, copy, 0);
+        }
+    }
+    deleteServiceByName(services, managementServiceName(copyName).view());
+}
+
 Status removeCopy(IRegistryStore& registry, IServiceManager& services, IDebugOutput& debug, Report& report,
-                  const char* copyName, bool keepsProduct) {
+                  const char* copyName) {
     InstallCopyList copies(registry, debug, false, false);
     if (copies.findByName(copyName) == nullptr) {
         // A store that cannot be read does not tell whether the copy exists.
@@ -28,22 +42,8 @@ Status removeCopy(IRegistryStore& registry, IServiceManager& services, IDebugOut
         report.line(kNotFound, {std::string_view(copyName)});
         return kMissingItem;
     }
-    const bool hasOthers = copies.status() == 0 && copies.count() > 1;
-    if (keepsProduct && !hasOthers) {
-        return kReadFault;
-    }
-    // Deliberate: if the list could not be read completely, the whole product is deleted, as for the last copy. The
-    // copy's 32-bit key and the values that name it remain.
-    if (hasOthers) {
-        deleteTree(registry, KeyHandle::localMachine, layout::kCopy, 0, copyName, {});
-        const std::string copy = substituteCopyName(layout::kCopy, copyName);
-        if (succeeded(checkPathLength(copy))) {
-            registry.deleteKey(KeyHandle::localMachine, copy, 0);
-        }
-    } else {
-        deleteTree(registry, KeyHandle::localMachine, layout::kProduct, 0, {}, {});
-    }
-    deleteServiceByName(services, managementServiceName(copyName).view());
+    // Deliberate: if the list could not be read completely, the whole product is deleted, as for the last copy.
+    deleteCopy(registry, services, copyName, copies.status() != 0 || copies.count() <= 1);
     if (const Status committed = registry.commit(); !succeeded(committed)) {
         return committed;
     }

@@ -9,9 +9,12 @@
 
 namespace kz7 {
 
-// 0; kMissingItem if no copy has that name; with `keepsProduct` kReadFault, and nothing is removed, if the list of
-// copies has no other one. The results of the deletions do not change it; a failed commit does.
+// 0, or kMissingItem if no copy has that name. The results of the deletions do not change it; a failed commit does.
 Status removeCopy(IRegistryStore& registry, IServiceManager& services, IDebugOutput& debug, Report& report,
-                  const char* copyName, bool keepsProduct = false);
+                  const char* copyName);
+
+// Deletes the keys and the service of a copy that is known to be installed, or with `isLast` the whole product tree and
+// the service. Without a commit; failures are not reported.
+void deleteCopy(IRegistryStore& registry, IServiceManager& services, std::string_view copyName, bool isLast);
 
 }  // namespace kz7

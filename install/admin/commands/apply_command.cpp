@@ -33,6 +33,13 @@ void noteServices(IRegistryStore& registry, const ChangeSet& changes, ChangeRun&
     }
 }
 
+// The tool does not write a line on standard error for every status.
+void tellStatus(Admin& admin, const ApplyOptions& options, const ChangeRun& run) {
+    if (run.status != kSuccess && run.errors.empty()) {
+        admin.tell(compose("kz7InstallReg %s with %u", {options.check ? "would exit" : "exited", run.status}));
+    }
+}
+
 Answer preview(Admin& admin, const ApplyOptions& options, std::span<const char* const> arguments) {
     Preview preview(admin.platform(), !options.noLevel);
     if (const Answer filled = fillPreview(admin, preview); filled != kAnswerYes) {
@@ -41,6 +48,7 @@ Answer preview(Admin& admin, const ApplyOptions& options, std::span<const char* 
     ChangeRun run;
     run.status = runTool(preview.ports(), arguments, &run.errors);
     noteServices(*preview.ports().registry, preview.changes(), run);
+    tellStatus(admin, options, run);
     return showPreview(admin, options, preview, run);
 }
 
@@ -80,6 +88,7 @@ Answer run(Admin& admin, const ApplyOptions& options, std::span<const char* cons
     shown.endLine();
     noteServices(admin.registry(), run.changes, run);
     admin.registry().commit();  // the end of the transaction of the notes
+    tellStatus(admin, options, run);
     return showRun(admin, options, run);
 }
 

@@ -117,6 +117,7 @@ Answer run(Admin& admin, const Words& words, ConfigurationRequest request) {
     run.status = outcome.notSet == 0 ? kSuccess : kParameterNotSet;
     takeChanges(recorded, run);
     run.output = kept.output;
+    takeErrorLines(kept.error, run);
     run.heading = compose("%s: %u set, %u not set; the log is %s\n",
                           {shownText(words.copy), outcome.set, outcome.notSet, shownText(log)});
     // Text that cannot be written is reported and does not change the exit status: the values are set.

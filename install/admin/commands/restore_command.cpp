@@ -15,8 +15,8 @@ Answer nothingToRestore(Admin& admin, const RestoreOptions& options) {
     return admin.fault("nothing to restore: " + shownText(options.file));
 }
 
-// The product's keys and services, and no others, in one transaction.
-Answer restoreKeys(Admin& admin, const RestoreOptions& options, RegistrySource& file) {
+// What turns the product's keys and services into those of the file.
+Answer findChanges(Admin& admin, const RestoreOptions& options, RegistrySource& file, ChangeSet& changes) {
     const bool isOwn = admin.platform().storeIsOwn();
     Snapshot wanted;
     if (const Answer read = file.readProduct(isOwn, wanted); read != kAnswerYes) {
@@ -30,15 +30,29 @@ Answer restoreKeys(Admin& admin, const RestoreOptions& options, RegistrySource& 
     if (const Answer opened = machine.open(); opened != kAnswerYes) {
         return opened;
     }
-    if (const Answer read = machine.readProduct(isOwn, live); read != kAnswerYes) {
-        return read;
-    }
+    const Answer read = machine.readProduct(isOwn, live);
+    changes = difference(live, wanted);
+    return read;
+}
+
+// The product's keys and services, and no others, in one transaction.
+Answer restoreKeys(Admin& admin, const RestoreOptions& options, RegistrySource& file) {
+    const bool isOwn = admin.platform().storeIsOwn();
     ChangeRun run;
-    run.changes = difference(live, wanted);
+    if (const Answer found = findChanges(admin, options, file, run.changes); found != kAnswerYes) {
+        return found;
+    }
+    // A host that folds the case of more letters than we do has one key where the difference sees two.
+    std::vector<const Change*> conflicts;
+    std::string key;
+    Status status = findConflicts(admin.registry(), isOwn, run.changes, conflicts, key);
+    if (status != kSuccess || !conflicts.empty()) {
+        return status != kSuccess ? admin.storeFault("cannot read: " + shownText(key), status)
+                                  : admin.fault("cannot restore: " + shownText(conflicts.front()->key) +
+                                                " was changed, or exists under another spelling of its name");
+    }
     if (!options.check) {
-        std::string key;
-        Status status =
-            applyChangeSet(admin.registry(), isOwn ? nullptr : &admin.platform().services(), run.changes, key);
+        status = applyChangeSet(admin.registry(), isOwn ? nullptr : &admin.platform().services(), run.changes, key);
         if (status != kSuccess) {
             return admin.storeFault("cannot change: " + shownText(key), status);
         }

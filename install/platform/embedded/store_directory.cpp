@@ -19,6 +19,7 @@
 namespace kz7 {
 namespace {
 
+constexpr std::string_view kLogs[] = {"-wal", "-journal"};
 constexpr std::size_t kNoiseSize = 16;  // bytes of randomness in the name of an unfinished store
 
 std::string environment(const char* name) {
@@ -120,7 +121,6 @@ bool unfinishedStoreName(std::string& name) {
 }
 
 int setAside(const std::string& directory, std::string& kept) {
-    constexpr std::string_view kLogs[] = {"-wal", "-journal"};
     const std::string store = directory + '/' + kStoreName;
     const auto exists = [](const std::string& path) {
         struct stat found {};
@@ -138,12 +138,8 @@ int setAside(const std::string& directory, std::string& kept) {
     for (int number = 2; isUsed(name); ++number) {
         name = store + ".old" + std::to_string(number);
     }
-    for (const std::string_view log : kLogs) {
-        const std::string path = store + std::string(log);
-        if (rename(path.c_str(), (name + std::string(log)).c_str()) != 0 && errno != ENOENT) {
-            return errno;
-        }
-    }
+    kept = name;
+    // The store first: a log that a kill leaves behind belongs to the store of its name.
     if (unlink((store + "-shm").c_str()) != 0 && errno != ENOENT) {
         return errno;
     }
@@ -153,8 +149,29 @@ int setAside(const std::string& directory, std::string& kept) {
             return errno;
         }
     }
-    kept = std::move(name);
+    for (const std::string_view log : kLogs) {
+        const std::string path = store + std::string(log);
+        if (rename(path.c_str(), (name + std::string(log)).c_str()) != 0 && errno != ENOENT) {
+            const int error = errno;
+            takeBack(directory, name);
+            return error;
+        }
+    }
     return 0;
+}
+
+void takeBack(const std::string& directory, const std::string& kept) {
+    if (kept.empty()) {
+        return;
+    }
+    const std::string store = directory + '/' + kStoreName;
+    for (const std::string_view log : kLogs) {
+        rename((kept + std::string(log)).c_str(), (store + std::string(log)).c_str());
+    }
+    // This does nothing to two names of one file.
+    if (rename(kept.c_str(), store.c_str()) == 0) {
+        unlink(kept.c_str());
+    }
 }
 
 void removeUnfinishedStores(const std::string& path) {

@@ -29,8 +29,11 @@ bool unfinishedStoreName(std::string& name);
 // Gives a store and its log another name, `registry.db.old` or the next free one; a log without a store too, which
 // would be applied to the next store. `kept` is empty if there is neither. The caller holds the lock of the directory.
 // The store itself keeps its first name as well, until another file gets it, where the file system has hard links.
-// 0 or an error number.
+// 0 or an error number, and then nothing has changed.
 int setAside(const std::string& directory, std::string& kept);
+
+// Gives them their first names again.
+void takeBack(const std::string& directory, const std::string& kept);
 
 // Removes what builders of a store have left in a directory. The caller holds its lock, so all of them are dead.
 void removeUnfinishedStores(const std::string& path);

@@ -276,11 +276,15 @@ StoreFault StoreFile::build(const OwnedDescriptor& folder, sqlite3* content, std
     }
     connection.reset();
     // The lock makes this safe on file systems without hard links and without a rename that does not replace.
-    if (fsync(file.get()) != 0 || (errno = setAside(directory_, kept)) != 0 ||
-        renameat(folder.get(), name.c_str(), folder.get(), kStoreName) != 0 || fsync(folder.get()) != 0) {
+    if (fsync(file.get()) != 0 || (errno = setAside(directory_, kept)) != 0) {
         return refused(kCannotOpen, path_, errno);
     }
-    return {};
+    if (renameat(folder.get(), name.c_str(), folder.get(), kStoreName) != 0) {
+        const int error = errno;
+        takeBack(directory_, kept);
+        return refused(kCannotOpen, path_, error);
+    }
+    return fsync(folder.get()) == 0 ? StoreFault{} : refused(kCannotOpen, path_, errno);
 }
 
 int StoreFile::connect(const std::string& name, int flags, Connection& connection) {
