@@ -103,8 +103,13 @@ Answer restore(Admin& admin, const RestoreOptions& options) {
     if (const Answer opened = file.open(); opened != kAnswerYes) {
         return opened;
     }
+    std::vector<std::string> damages;
+    if (!platform.storeIsLost() && platform.examineStore(damages) == kSuccess && !damages.empty()) {
+        admin.tell(compose("%s: %s", {shownText(platform.storeName()), shownText(damages.front())}));
+        return restoreStore(admin, options, file);
+    }
     const Answer answer = platform.storeIsLost() ? kAnswerFault : restoreKeys(admin, options, file);
-    // Damage is found when the store is read or changed.
+    // Damage is found when the store is examined, read or changed.
     return answer == kAnswerFault && platform.storeIsLost() ? restoreStore(admin, options, file) : answer;
 }
 

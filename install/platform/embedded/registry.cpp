@@ -211,14 +211,8 @@ Status EmbeddedRegistry::examine(std::vector<std::string>& damages) {
     if (const Status status = begin(); status != kSuccess) {
         return status;
     }
-    std::vector<std::string> lines;
-    const int result = queryTexts(connection_.get(), "PRAGMA integrity_check(10)", lines);
-    if (result != SQLITE_OK) {
-        return fail(result);
-    }
-    std::erase(lines, "ok");
-    damages = std::move(lines);
-    return kSuccess;
+    const int result = StoreFile::examine(connection_.get(), damages);
+    return result == SQLITE_OK ? kSuccess : fail(result);
 }
 
 Query EmbeddedRegistry::query(Sql which) {
@@ -609,6 +603,10 @@ Status EmbeddedRegistry::readAhead(const OpenKey& open, std::uint32_t skip, std:
     for (; result == SQLITE_ROW; result = next.step()) {
         if (const Status status = checkBelow(next.number(0)); status != kSuccess) {
             return status;
+        }
+        // An index that disagrees with its table would never let the enumeration end.
+        if (next.bytes(1) < open.keys.fold || (!rows.empty() && next.bytes(1) <= rows.back().fold)) {
+            return fail(StoreFault{kRegistryCorrupt, path(), "an index disagrees with its table"});
         }
         rows.push_back(
             {next.number(0), std::string(next.bytes(1)), std::string(next.bytes(2)), std::string(next.bytes(3))});

@@ -31,6 +31,14 @@ constexpr const char* kSchema =
     " (2, 0, 'HKEY_USERS', 'HKEY_USERS', '');"
     "PRAGMA user_version = 1;";
 
+// What SQLite cannot know: that the keys are a tree and are found by their names.
+constexpr const char* kExamination =
+    "SELECT 'a root is missing' WHERE (SELECT count(*) FROM key WHERE id IN (1, 2) AND parent = 0) <> 2"
+    " UNION ALL SELECT 'no parent of key ' || id FROM key WHERE id > 2 AND parent NOT IN (SELECT id FROM key)"
+    " UNION ALL SELECT 'wrong name of key ' || id FROM key WHERE fold <> upper(name)"
+    " UNION ALL SELECT 'wrong name of a value of key ' || key FROM value WHERE fold <> upper(name)"
+    " UNION ALL SELECT 'values of no key ' || key FROM value WHERE key NOT IN (SELECT id FROM key) LIMIT 10";
+
 // SQLite's own file system, except that names are used unchanged. SQLite's resolves links and so would replace the
 // short name of a directory by the long one.
 const char* fileSystemOfGivenNames() {
@@ -213,8 +221,19 @@ StoreFault StoreFile::replace(sqlite3* content, std::string& kept) {
     OwnedDescriptor folder;
     OwnedDescriptor store;
     StoreFault fault = lock(folder);
+    if (fault.status == kSuccess && isWhole()) {
+        return {kBusy, path_, "was replaced by another program"};
+    }
     fault = fault.status == kSuccess ? lockOut(store) : fault;
     return fault.status == kSuccess ? put(folder, content, kept) : fault;
+}
+
+// Two programs may have found the same damage; the second must not replace what the first has made.
+bool StoreFile::isWhole() {
+    Connection connection;
+    std::vector<std::string> damages;
+    return exists() && open(SQLITE_OPEN_READONLY, connection).status == kSuccess &&
+           examine(connection.get(), damages) == SQLITE_OK && damages.empty();
 }
 
 // SQLite holds a lock of a store in use. One that opened the store before and reads it later finds that it has moved.
@@ -358,6 +377,17 @@ StoreFault StoreFile::openEmpty(Connection& connection) const {
     return {};
 }
 
+int StoreFile::examine(sqlite3* connection, std::vector<std::string>& damages) {
+    std::vector<std::string> lines;
+    int result = queryTexts(connection, "PRAGMA integrity_check(10)", lines);
+    std::erase(lines, "ok");
+    if (result == SQLITE_OK && lines.empty()) {
+        result = queryTexts(connection, kExamination, lines);
+    }
+    damages = std::move(lines);
+    return result;
+}
+
 StoreFault StoreFile::explain(sqlite3* connection, int result) const {
     const std::string said = connection == nullptr ? sqlite3_errstr(result) : sqlite3_errmsg(connection);
     switch (result & 0xFF) {
@@ -367,6 +397,7 @@ StoreFault StoreFile::explain(sqlite3* connection, int result) const {
         case SQLITE_FULL:
             return {kDiskFull, path_, said};
         case SQLITE_CORRUPT:
+        case SQLITE_ERROR:  // the tables are others than ours
             return {kRegistryCorrupt, path_, said};
         case SQLITE_NOTADB:
             return {kNotRegistryFile, path_, said};

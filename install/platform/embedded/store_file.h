@@ -42,8 +42,11 @@ public:
     StoreFault openForReading(Connection& connection);
 
     // Puts a new store with the content of a database in the place of this one, which may be damaged or missing, and
-    // sets this one aside. kBusy: another process has it open. This process must not.
+    // sets this one aside. kBusy: another process has it open, or has replaced it. This process must not have it open.
     StoreFault replace(sqlite3* content, std::string& kept);
+
+    // Lists up to 10 damages of an open store. SQLITE_OK, or the result of a query that failed.
+    static int examine(sqlite3* connection, std::vector<std::string>& damages);
 
     // Describes a failed SQLite call on this store.
     StoreFault explain(sqlite3* connection, int result) const;
@@ -54,6 +57,7 @@ private:
     StoreFault openCopy(Connection& connection) const;
     StoreFault openEmpty(Connection& connection) const;
     StoreFault checkVersion(sqlite3* connection, int result) const;
+    bool isWhole();
     StoreFault make();
     StoreFault lock(OwnedDescriptor& folder) const;
     StoreFault lockOut(OwnedDescriptor& store) const;
