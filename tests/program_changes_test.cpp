@@ -1,5 +1,6 @@
 // kz7admin's commands that foretell, make and take back changes, run as a user runs them.
 #include <gtest/gtest.h>
+#include <sys/wait.h>
 
 #include <filesystem>
 #include <regex>
@@ -99,6 +100,33 @@ TEST_F(ChangesProgram, RestoreReplacesAStoreThatIsMissingOrDamaged) {
            "! the store before is kept as registry.db.old3\n"
            "changed: 22 values, 26 keys, 1 service\n||0");
     expect({"diff", ".", backup}, "||0");
+}
+
+TEST_F(ChangesProgram, RestoreMendsADamageOfAnyPage) {
+    std::string list;
+    for (int copy = 0; copy < 12; ++copy) {
+        list +=
+            std::string(copy == 0 ? "" : ",") + R"({"name": "C)" + std::to_string(copy) + R"(", "location": "C:\\a"})";
+    }
+    const std::string copies = file("list.json", "{\"copies\": [" + list + "]}");
+    ASSERT_EQ(store_.run("kz7admin", {"ensure", "--from", copies}).exitCode, 0);
+    const std::string backup = files_.path() + "/backup";
+    ASSERT_EQ(store_.run("kz7admin", {"backup", backup}).exitCode, 0);
+    const std::string whole = contents(backup);
+    ASSERT_GT(whole.size(), 8U * 4096);
+    for (std::size_t page = 0; page < whole.size() / 4096; ++page) {
+        const StateDirectory damaged;
+        const std::string bytes = std::string(whole).replace(4096 * page, 4096, 4096, '\0');
+        overwrite(damaged.file("registry.db"), bytes);
+        // Of two at once only one replaces the store.
+        const pid_t other = damaged.start({"restore", backup});
+        damaged.run("kz7admin", {"restore", backup});
+        waitpid(other, nullptr, 0);
+        EXPECT_EQ(damaged.run("kz7admin", {"diff", damaged.path(), backup}).exitCode, 0) << "page " << page;
+        EXPECT_EQ(damaged.integrity(), "ok") << "page " << page;
+        EXPECT_EQ(contents(damaged.file("registry.db.old")), bytes) << "page " << page;
+        EXPECT_FALSE(std::filesystem::exists(damaged.file("registry.db.old2"))) << "page " << page;
+    }
 }
 
 TEST_F(ChangesProgram, EnsureMakesTheCopiesOfAList) {
@@ -292,6 +320,7 @@ TEST_F(ChangesProgram, BadInputIsOneLineAndChangesNothing) {
         {"[]", "document: is not an object"},
         {"{}", "copies: is missing"},
         {R"({"copies": 1})", "copies: is not an array"},
+        {R"({"copies": [], "copies": []})", "copies: is twice in one object"},
         {R"({"copies": [], "more": 1})", "more: is an unknown field"},
         {copy + "1]}", "copies[1]: is not an object"},
         {copy + R"({"name": "B", "path": "x"}]})", "copies[1].path: is an unknown field"},
