@@ -153,7 +153,7 @@ TEST(ChangeSet, IsTheSameRecordedForetoldAndSeenAfterwards) {
 
         ChangeSet recorded;
         {
-            RecordedPorts ports(machine.ports(), true);
+            RecordedPorts ports(machine.ports(), {.wholeServices = true});
             runTool(ports.ports(), arguments);
             EXPECT_EQ(ports.status(), kSuccess);
             recorded = ports.changes();

@@ -162,11 +162,11 @@ TEST(ScarceResources, AFullDiskChangesNothing) {
     const StateDirectory start;
     ASSERT_EQ(start.tool(kAddFirst).exitCode, 0);
     const StateDirectory state;
-    if (mount("tmpfs", state.path().c_str(), "tmpfs", 0, "size=128k") != 0) {
+    if (mount("tmpfs", state.path().c_str(), "tmpfs", 0, "size=192k") != 0) {
         GTEST_SKIP() << "no small file system can be mounted here";
     }
     state.copyFrom(start);
-    overwrite(state.file("ballast"), std::string(std::size_t{128} * 1024, 'x'));
+    overwrite(state.file("ballast"), std::string(std::size_t{192} * 1024, 'x'));
     const ProgramResult refused = state.tool(kAddSecond);
     std::filesystem::remove(state.file("ballast"));
     const std::string found = state.dump();

@@ -28,6 +28,19 @@ bool Admin::open(bool readOnly, bool missingIsEmpty) {
     return true;
 }
 
+void Admin::beginRun(bool startsPrograms, std::uint64_t undoes) {
+    if (IHistory* const history = platform_->history(); history != nullptr) {
+        HistoryStart start{std::string(kProgram), arguments, startsPrograms, undoes};
+        history->begin(start);
+    }
+}
+
+void Admin::endRun(Answer result) {
+    if (platform_ != nullptr && platform_->history() != nullptr && !readOnly_) {
+        platform_->history()->end(static_cast<Status>(result == kAnswerChanged ? kAnswerYes : result));
+    }
+}
+
 Answer Admin::selectKeys(const std::string& key, std::vector<KeyStart>& starts) {
     if (key.empty()) {
         const Status status = findEverything(registry(), platform_->storeIsOwn(), starts);

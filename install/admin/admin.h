@@ -24,8 +24,9 @@ enum Answer : int {
 
 class Admin {
 public:
-    std::string storeDirectory;      // empty: the usual one
-    std::function<Answer()> answer;  // runs the chosen subcommand
+    std::string storeDirectory;          // empty: the usual one
+    std::vector<std::string> arguments;  // of this program
+    std::function<Answer()> answer;      // runs the chosen subcommand
 
     // Opens the ports, once. False, with a message: a store directory was given, and this machine's store is its
     // registry. `missingIsEmpty`: see PlatformOptions.
@@ -34,6 +35,10 @@ public:
     // Only after open().
     IPlatform& platform() { return *platform_; }
     IRegistryStore& registry() { return platform_->registry(); }
+
+    // Describes the run that changes the store, for the history; `undoes` is the run that it takes back.
+    void beginRun(bool startsPrograms = false, std::uint64_t undoes = 0);
+    void endRun(Answer result);
 
     // What standard output is.
     TerminalView output() { return platform_->terminal().look(TerminalStream::output); }

@@ -38,7 +38,9 @@ std::string runJson(const ChangeRun& run, bool isCheck) {
         json += '}';
         separator = ",";
     }
-    return json + "]}\n";
+    json += "],\"conflicts\":";
+    appendChangesJson(run.conflicts, json);
+    return json + "}\n";
 }
 
 std::string runText(const ChangeRun& run, const ChangeOptions& options, bool isColoured) {
@@ -48,6 +50,9 @@ std::string runText(const ChangeRun& run, const ChangeOptions& options, bool isC
     }
     for (const std::string& program : run.programs) {
         text += markedLine('>', "would run " + shownText(program), isColoured);
+    }
+    for (const Change& change : run.conflicts) {
+        text += markedLine('!', shownRow(change), isColoured);
     }
     return text + changeSummary(run.changes, options.check ? "would change" : "changed") + '\n';
 }
@@ -67,7 +72,7 @@ void addChangeOptions(CLI::App& command, ChangeOptions& options, CLI::Option* ex
 }
 
 bool ChangeRun::isFailed() const {
-    return status != kSuccess || hasFailure(errors);
+    return status != kSuccess || !conflicts.empty() || hasFailure(errors);
 }
 
 void takeChanges(const RecordedPorts& recorded, ChangeRun& run) {

@@ -31,6 +31,7 @@ struct ChangeRun {
     std::vector<std::string> notes;     // what stays otherwise than one may expect
     std::string output;                 // of the flow, where it was not written
     std::vector<ErrorLine> errors;
+    ChangeSet conflicts;  // rows that others changed, so that nothing was done
 
     // A flow may print failures and succeed.
     bool isFailed() const;

@@ -39,6 +39,7 @@ void tellFault(const std::string& reason) {
 
 int run(int argc, char** argv) {
     Admin admin;
+    admin.arguments.assign(argv + (argc == 0 ? 0 : 1), argv + argc);
     CLI::App program("Inspects and changes the registry data that kz7InstallReg writes", "kz7admin");
     program.add_option("--store", admin.storeDirectory, "The state directory to use instead of the usual one")
         ->check(givenName());
@@ -58,12 +59,14 @@ int run(int argc, char** argv) {
     addExportCommand(program, admin);
     addFactsCommand(program, admin);
     addFrontCommand(program, admin);
+    addHistoryCommand(program, admin);
     addImportCommand(program, admin);
     addRepairCommand(program, admin);
     addReportCommand(program, admin);
     addResolveCommand(program, admin);
     addRestoreCommand(program, admin);
     addTreeCommand(program, admin);
+    addUndoCommand(program, admin);
     try {
         program.parse(argc, argv);
     } catch (const CLI::Success& help) {
@@ -79,7 +82,9 @@ int run(int argc, char** argv) {
         std::fputs("kz7admin: no command (see --help)\n", stderr);
         return kAnswerFault;
     }
-    return admin.answer();
+    const Answer answer = admin.answer();
+    admin.endRun(answer);
+    return answer;
 }
 
 }  // namespace

@@ -9,7 +9,7 @@ Preview::Preview(IPlatform& machine, bool asksLevel)
     : machine_(machine),
       services_(registry_, machine.files()),
       assemblies_(machine.assembliesOn(registry_)),
-      recorded_(memoryPorts(asksLevel), machine.storeIsOwn(), true) {
+      recorded_(memoryPorts(asksLevel), {.wholeServices = machine.storeIsOwn(), .holdsCommits = true}) {
     processes_.otherPrograms = ScriptedProgram{};
 }
 
@@ -22,6 +22,7 @@ Ports Preview::memoryPorts(bool asksLevel) {
     ports.processes = &processes_;
     ports.threads = &threads_;
     ports.assemblies = assemblies_.get();
+    ports.history = nullptr;
     if (!asksLevel) {
         ports.libraries = &noLibraries_;
     }

@@ -10,6 +10,7 @@
 #include "install/platform/console.h"
 #include "install/platform/debug_output.h"
 #include "install/platform/file_system.h"
+#include "install/platform/history.h"
 #include "install/platform/host_information.h"
 #include "install/platform/library_loader.h"
 #include "install/platform/process_host.h"
@@ -43,6 +44,7 @@ struct Ports {
     IAssemblyCache* assemblies = nullptr;
     IHostInformation* host = nullptr;
     ITerminal* terminal = nullptr;
+    IHistory* history = nullptr;  // null: nothing is recorded
 };
 
 // The references stay valid as long as the platform. One thread.
@@ -62,6 +64,9 @@ public:
     IAssemblyCache& assemblies() { return *ports_.assemblies; }
     IHostInformation& host() { return *ports_.host; }
     ITerminal& terminal() { return *ports_.terminal; }
+
+    // Null: the machine has none.
+    IHistory* history() { return ports_.history; }
 
     // The folder of what the programs keep for themselves, as a product path; created if it is missing.
     virtual Status ownFolder(std::string& path) = 0;

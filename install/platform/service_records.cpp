@@ -10,7 +10,6 @@ namespace {
 
 constexpr std::string_view kStart = "Start";
 constexpr std::string_view kImagePath = "ImagePath";
-constexpr std::string_view kRunState = "CurrentState";  // a number of ServiceState; none: stopped
 
 std::string bytesOf(std::uint32_t number) {
     std::string bytes(sizeof number, '\0');
@@ -26,11 +25,18 @@ std::string terminated(std::string_view text) {
 }
 
 Status writeRecord(IRegistryStore& registry, KeyHandle record, const ServiceDefinition& definition) {
-    const struct {
-        std::string_view name;
-        ValueType type;
-        std::string data;
-    } rows[] = {
+    Status status = kSuccess;
+    for (const ServiceValue& value : serviceValues(definition)) {
+        status = status == kSuccess ? registry.setValue(record, value.name, value.type, value.data) : status;
+    }
+    return status;
+}
+
+}  // namespace
+
+std::vector<ServiceValue> serviceValues(const ServiceDefinition& definition,
+                                        std::initializer_list<std::string_view> names) {
+    std::vector<ServiceValue> values = {
         {"Type", ValueType::dword, bytesOf(definition.type)},
         {kStart, ValueType::dword, bytesOf(static_cast<std::uint32_t>(definition.start))},
         {"ErrorControl", ValueType::dword, bytesOf(definition.errorControl)},
@@ -38,14 +44,11 @@ Status writeRecord(IRegistryStore& registry, KeyHandle record, const ServiceDefi
         {"DisplayName", ValueType::sz, terminated(definition.displayName)},
         {"ObjectName", ValueType::sz, terminated("LocalSystem")},
     };
-    Status status = kSuccess;
-    for (const auto& row : rows) {
-        status = status == kSuccess ? registry.setValue(record, row.name, row.type, row.data) : status;
-    }
-    return status;
+    std::erase_if(values, [&](const ServiceValue& value) {
+        return names.size() != 0 && std::find(names.begin(), names.end(), value.name) == names.end();
+    });
+    return values;
 }
-
-}  // namespace
 
 ServiceHandle ServiceRecords::giveOut(std::string recordPath, std::uint32_t access) {
     std::size_t slot = 0;
@@ -157,7 +160,7 @@ Status ServiceRecords::recordOf(ServiceHandle handle, std::uint32_t needed, Owne
         return status;
     }
     FixedBuffer<4> number;
-    const Status status = registry_.queryValue(record.get(), kRunState, nullptr, number);
+    const Status status = registry_.queryValue(record.get(), kServiceRunState, nullptr, number);
     if (status != kSuccess && !isNotFound(status) && status != kMoreData) {
         return status;
     }
@@ -187,7 +190,7 @@ Status ServiceRecords::startService(ServiceHandle service) {
         status = files_.probe(path);
     }
     return status != kSuccess ? status
-                              : registry_.setValue(record.get(), kRunState, ValueType::dword,
+                              : registry_.setValue(record.get(), kServiceRunState, ValueType::dword,
                                                    bytesOf(static_cast<std::uint32_t>(ServiceState::running)));
 }
 
@@ -198,7 +201,7 @@ Status ServiceRecords::stopService(ServiceHandle service) {
     if (status != kSuccess) {
         return status;
     }
-    return now == ServiceState::running ? registry_.deleteValue(record.get(), kRunState) : kServiceNotActive;
+    return now == ServiceState::running ? registry_.deleteValue(record.get(), kServiceRunState) : kServiceNotActive;
 }
 
 // No service here changes its state by itself.

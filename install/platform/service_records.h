@@ -2,7 +2,9 @@
 // tools show services and everything else. No process is started for a service: its run state is a value of its record.
 #pragma once
 
+#include <initializer_list>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "install/platform/file_system.h"
@@ -10,6 +12,20 @@
 #include "install/platform/service_manager.h"
 
 namespace kz7 {
+
+// The value of a record that is the run state of its service: a number of ServiceState; none: stopped.
+inline constexpr std::string_view kServiceRunState = "CurrentState";
+
+// A value of a service's record.
+struct ServiceValue {
+    std::string_view name;
+    ValueType type;
+    std::string data;
+};
+
+// The values that a definition has in the record; with `names`, only those.
+std::vector<ServiceValue> serviceValues(const ServiceDefinition& definition,
+                                        std::initializer_list<std::string_view> names = {});
 
 class ServiceRecords final : public IServiceManager {
 public:

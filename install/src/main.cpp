@@ -3,12 +3,24 @@
 
 #include "install/platform/program.h"
 #include "install/platform/text.h"
+#include "install/src/registry/change_recorder.h"
 #include "install/src/uselvlkz7reg.h"
 
 int kz7::programMain(int argc, char** argv) {
     try {
         const auto platform = hostPlatform({.program = "kz7InstallReg"});
-        const Status status = runTool(platform->ports(), {argv, static_cast<std::size_t>(argc)});
+        const std::span<const char* const> arguments(argv, static_cast<std::size_t>(argc));
+        Status status = kSuccess;
+        if (IHistory* const history = platform->history(); history != nullptr && history->isOn()) {
+            history->begin({.program = "kz7InstallReg",
+                            .arguments = {arguments.begin() + (argc == 0 ? 0 : 1), arguments.end()},
+                            .startsPrograms = startsPrograms(arguments)});
+            const RecordedPorts recorded(platform->ports(), {.wholeServices = platform->storeIsOwn()});
+            status = runTool(recorded.ports(), arguments);
+            history->end(status);
+        } else {
+            status = runTool(platform->ports(), arguments);
+        }
         // The exit code remains that of the flow. A reader that has gone, as in "| head -1", does not need the rest.
         const Status written = platform->console().flush();
         if (!succeeded(written) && written != kPipeClosing) {

@@ -33,16 +33,17 @@ struct OptionRow {
     std::string_view word;
     std::size_t arguments;  // after it
     Option option;
+    bool startsPrograms;
 };
 
 // clang-format off
 constexpr std::array kOptions = {
-    OptionRow{"-v9",            1, Option::version9},
-    OptionRow{"-v8",            1, Option::version8},
-    OptionRow{"-dotnet",        1, Option::providers},
-    OptionRow{"-removeKZ7Copy", 1, Option::remove},
-    OptionRow{"-addKZ7Copy",    2, Option::add},
-    OptionRow{"-addv9",         2, Option::addVersion9},
+    OptionRow{"-v9",            1, Option::version9,    true},
+    OptionRow{"-v8",            1, Option::version8,    false},
+    OptionRow{"-dotnet",        1, Option::providers,   true},
+    OptionRow{"-removeKZ7Copy", 1, Option::remove,      false},
+    OptionRow{"-addKZ7Copy",    2, Option::add,         false},
+    OptionRow{"-addv9",         2, Option::addVersion9, true},
 };
 // clang-format on
 
@@ -119,6 +120,11 @@ private:
 
 bool isToolCommand(std::span<const char* const> arguments) {
     return findOption(arguments) != nullptr;
+}
+
+bool startsPrograms(std::span<const char* const> arguments) {
+    const OptionRow* const row = findOption(arguments);
+    return row != nullptr && row->startsPrograms;
 }
 
 Status runTool(const Ports& ports, std::span<const char* const> arguments, std::vector<ErrorLine>* errors) {

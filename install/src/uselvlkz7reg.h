@@ -17,4 +17,7 @@ Status runTool(const Ports& ports, std::span<const char* const> arguments, std::
 // Whether the arguments are one of the options and do not bring out the usage text.
 bool isToolCommand(std::span<const char* const> arguments);
 
+// Whether they start other programs.
+bool startsPrograms(std::span<const char* const> arguments);
+
 }  // namespace kz7

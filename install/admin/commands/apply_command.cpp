@@ -76,11 +76,12 @@ private:
 };
 
 Answer run(Admin& admin, const ApplyOptions& options, std::span<const char* const> arguments) {
+    admin.beginRun(startsPrograms(arguments));
     MemoryConsole kept;
     LineConsole shown(admin.platform().console());
     Ports ports = admin.platform().ports();
     ports.console = options.json ? static_cast<IConsole*>(&kept) : &shown;
-    RecordedPorts recorded(ports, admin.platform().storeIsOwn());
+    RecordedPorts recorded(ports, {.wholeServices = admin.platform().storeIsOwn()});
     ChangeRun run;
     run.status = runTool(recorded.ports(), arguments, &run.errors);
     takeChanges(recorded, run);

@@ -22,12 +22,14 @@ void addExplainCommand(CLI::App& program, Admin& admin);
 void addExportCommand(CLI::App& program, Admin& admin);
 void addFactsCommand(CLI::App& program, Admin& admin);
 void addFrontCommand(CLI::App& program, Admin& admin);
+void addHistoryCommand(CLI::App& program, Admin& admin);
 void addImportCommand(CLI::App& program, Admin& admin);
 void addRepairCommand(CLI::App& program, Admin& admin);
 void addReportCommand(CLI::App& program, Admin& admin);
 void addResolveCommand(CLI::App& program, Admin& admin);
 void addRestoreCommand(CLI::App& program, Admin& admin);
 void addTreeCommand(CLI::App& program, Admin& admin);
+void addUndoCommand(CLI::App& program, Admin& admin);
 // clang-format on
 
 }  // namespace kz7

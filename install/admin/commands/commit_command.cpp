@@ -102,10 +102,11 @@ Answer preview(Admin& admin, const Words& words, ConfigurationRequest request) {
 
 Answer run(Admin& admin, const Words& words, ConfigurationRequest request) {
     const std::string log = admin.platform().files().shownPath(request.logFile);
+    admin.beginRun(true);
     MemoryConsole kept;
     Ports ports = admin.platform().ports();
     ports.console = words.json ? &kept : ports.console;
-    RecordedPorts recorded(ports, admin.platform().storeIsOwn());
+    RecordedPorts recorded(ports, {.wholeServices = admin.platform().storeIsOwn()});
     const ConfigurationOutcome outcome = runConfiguration(recorded.ports(), std::move(request));
     if (outcome.kept != kSuccess) {
         return admin.storeFault("cannot save changes: " + shownText(words.copy), outcome.kept);

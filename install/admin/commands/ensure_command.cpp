@@ -54,17 +54,18 @@ Answer ensure(Admin& admin, const EnsureOptions& options) {
         run.changes = preview.changes();
         return answer == kAnswerYes ? showRun(admin, options, run) : answer;
     }
+    admin.beginRun();
     MemoryConsole lines;
     Ports ports = admin.platform().ports();
     ports.console = &lines;
     const bool isOwn = admin.platform().storeIsOwn();
-    RecordedPorts recorded(ports, isOwn, true);
+    RecordedPorts recorded(ports, {.wholeServices = isOwn, .holdsCommits = true});
     if (const Answer answer = ensureOn(admin, options, wanted, recorded.ports(), run); answer != kAnswerYes) {
         return answer;
     }
     if (!isOwn || run.status == kSuccess) {
         takeChanges(recorded, run);
-        if (const Status status = admin.registry().commit(); status != kSuccess) {
+        if (const Status status = recorded.commit(); status != kSuccess) {
             return admin.storeFault("cannot save changes: " + file.shown(), status);
         }
     }

@@ -56,7 +56,9 @@ Answer importFile(Admin& admin, const ImportOptions& options) {
     if (options.check) {
         return preview(admin, options, file, changes);
     }
-    RecordedPorts recorded(admin.platform().ports(), admin.platform().storeIsOwn());
+    admin.beginRun();
+    RecordedPorts recorded(admin.platform().ports(),
+                           {.wholeServices = admin.platform().storeIsOwn(), .everyKey = true});
     if (const Answer answer = importOn(admin, file, changes, *recorded.ports().registry); answer != kAnswerYes) {
         return answer;
     }

@@ -52,11 +52,14 @@ Answer restoreKeys(Admin& admin, const RestoreOptions& options, RegistrySource& 
                                                 " was changed, or exists under another spelling of its name");
     }
     if (!options.check) {
-        status = applyChangeSet(admin.registry(), isOwn ? nullptr : &admin.platform().services(), run.changes, key);
+        admin.beginRun();
+        RecordedPorts recorded(admin.platform().ports(), {.wholeServices = isOwn, .holdsCommits = true});
+        status =
+            applyChangeSet(*recorded.ports().registry, isOwn ? nullptr : recorded.ports().services, run.changes, key);
         if (status != kSuccess) {
             return admin.storeFault("cannot change: " + shownText(key), status);
         }
-        status = admin.registry().commit();
+        status = recorded.commit();
         if (status != kSuccess) {
             return admin.storeFault("cannot save changes: " + shownText(options.file), status);
         }

@@ -140,6 +140,10 @@ void appendState(std::string_view field, const std::optional<ValueState>& state,
 
 }  // namespace
 
+std::string shownRow(const Change& change) {
+    return shownKey(change.key) + (change.isKey() ? "" : ' ' + shownName(change.name));
+}
+
 std::string markedLine(char mark, const std::string& text, bool isColoured) {
     // clang-format off
     static constexpr std::array<std::pair<char, std::string_view>, 3> kColours = {{
@@ -173,8 +177,7 @@ std::string changeText(const ChangeSet& changes, bool isColoured) {
         if (both) {
             folded.insert(other->second);
         }
-        std::string line = shownKey(change.key);
-        line += change.isKey() ? "" : ' ' + shownName(change.name) + ' ' + shownStates(change);
+        const std::string line = shownRow(change) + (change.isKey() ? "" : ' ' + shownStates(change));
         text += markedLine(markOf(change), line + (both ? "  (both views)" : ""), isColoured);
     }
     return text + serviceText(changes, isColoured);

@@ -11,6 +11,9 @@ namespace kz7 {
 // ~ (different); a change that is the same in both registry views is one line. `isColoured`: for a terminal.
 std::string changeText(const ChangeSet& changes, bool isColoured);
 
+// The key of a change, with the name of its value.
+std::string shownRow(const Change& change);
+
 // One line of such a text.
 std::string markedLine(char mark, const std::string& text, bool isColoured);
 

@@ -8,6 +8,7 @@
 #include <cstdlib>
 #include <filesystem>
 
+#include "install/platform/embedded/history.h"
 #include "install/platform/embedded/ports.h"
 #include "install/platform/embedded/registry.h"
 #include "install/platform/service_records.h"
@@ -32,7 +33,7 @@ public:
           registry_(directory_, options.readOnly, listener(), {options.backup, options.missingIsEmpty}) {
         ports_ = {&registry_,        &services_,       console_.get(), debugOutput_.get(),
                   files_.get(),      processes_.get(), threads_.get(), libraries_.get(),
-                  assemblies_.get(), host_.get(),      terminal_.get()};
+                  assemblies_.get(), host_.get(),      terminal_.get(), &history_};
     }
 
     const std::string& directory() const { return directory_; }
@@ -84,6 +85,7 @@ private:
     std::unique_ptr<IDebugOutput> debugOutput_ = embeddedDebugOutput(*console_);
     std::unique_ptr<IFileSystem> files_ = embeddedFiles(directory_);
     EmbeddedRegistry registry_;
+    EmbeddedHistory history_{registry_};
     ServiceRecords services_{registry_, *files_};
     std::unique_ptr<IProcessHost> processes_ = embeddedProcesses(directory_);
     std::unique_ptr<IThreads> threads_ = embeddedThreads();

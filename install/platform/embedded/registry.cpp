@@ -215,6 +215,23 @@ Status EmbeddedRegistry::examine(std::vector<std::string>& damages) {
     return result == SQLITE_OK ? kSuccess : fail(result);
 }
 
+Status EmbeddedRegistry::use(const Work& work) {
+    if (const Status status = begin(); status != kSuccess) {
+        return status;
+    }
+    const int result = work(connection_.get());
+    return result == SQLITE_OK ? kSuccess : fail(result);
+}
+
+void EmbeddedRegistry::useQuietly(const Work& work) {
+    endTransaction();
+    if (connection_ != nullptr && execute(connection_.get(), "BEGIN IMMEDIATE") == SQLITE_OK) {
+        work(connection_.get());
+        commitFailed_ = execute(connection_.get(), "COMMIT") != SQLITE_OK;
+        endTransaction();
+    }
+}
+
 Query EmbeddedRegistry::query(Sql which) {
     Statement& owner = statements_[static_cast<std::size_t>(which)];
     int result = SQLITE_OK;

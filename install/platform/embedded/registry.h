@@ -41,6 +41,14 @@ public:
     // The damages that SQLite finds in the store, at most ten.
     Status examine(std::vector<std::string>& damages);
 
+    // Reads or writes other tables of the store in this transaction. `work` returns SQLITE_OK or an error.
+    using Work = std::function<int(sqlite3*)>;
+    Status use(const Work& work);
+
+    // Does the same in a transaction of its own, without a word about a fault. Changes that are not committed are
+    // dropped.
+    void useQuietly(const Work& work);
+
     Status openKey(KeyHandle parent, std::string_view path, AccessMask access, KeyHandle& key) override;
     Status createKey(KeyHandle parent, std::string_view path, std::string_view keyClass, AccessMask access,
                      KeyHandle& key) override;

@@ -1,5 +1,6 @@
 #include "install/src/registry/change_recorder.h"
 
+#include <algorithm>
 #include <utility>
 
 #include "install/platform/assembly_records.h"
@@ -20,91 +21,50 @@ bool isRoot(KeyHandle key) {
 
 }  // namespace
 
-ChangeSet ChangeRecorder::changes() const {
-    Snapshot before;
-    Snapshot now;
-    for (const auto& [place, key] : keys_) {
-        KeyRecord was;
-        was.name = key.name;
-        KeyRecord is = was;
-        was.keyClass = key.classBefore;
-        is.keyClass = key.classNow;
-        for (const auto& [fold, value] : key.values) {
-            if (value.before) {
-                was.values.push_back({value.name, value.before->type, value.before->data});
-            }
-            if (value.now) {
-                is.values.push_back({value.name, value.now->type, value.now->data});
-            }
-        }
-        if (key.before) {
-            before.push_back(std::move(was));
-        }
-        if (key.now) {
-            now.push_back(std::move(is));
+// The name and the class as the store has them. The last name of a key that does not exist is taken as it is given.
+std::string ChangeRecorder::spell(const KeyName& name, bool exists, std::string& keyClass) {
+    if (name.path.empty()) {
+        return fullKeyName(name);
+    }
+    const std::string place = walkPlace(fullKeyName(name));
+    if (const auto known = spelled_.find(place); known != spelled_.end()) {
+        keyClass = known->second.keyClass;
+        return known->second.name;
+    }
+    const KeyName parent = parentOf(name);
+    const std::string last = name.path.substr(parent.path.empty() ? 0 : parent.path.size() + 1);
+    std::string ignored;
+    Spelling spelling{spell(parent, true, ignored) + '\\', {}};
+    Subkey found{last, {}};
+    if (exists) {
+        OwnedKey key(registry_);
+        Status status = registry_.openKey(parent.root, parent.path, kKeyWalk | kKeyOpenLink, key.receive());
+        status = status == kSuccess ? reader_.subkey(key.get(), last, found) : status;
+        keep(isNotFound(status) ? kSuccess : status);
+        if (status != kSuccess) {
+            found = {last, {}};
         }
     }
-    return difference(before, now);
-}
-
-// The values of a key that exists, as they are before the run touches them.
-void ChangeRecorder::Key::noteValues(const std::vector<KeyValue>& existing) {
-    for (const KeyValue& value : existing) {
-        const ValueState state{value.type, value.data};
-        values.try_emplace(foldUpper(value.name), Value{value.name, state, state});
-    }
-}
-
-void ChangeRecorder::Key::remove() {
-    now = false;
-    for (auto& [fold, value] : values) {
-        value.now.reset();
-    }
-}
-
-// Names and classes as the store has them. The last name of a key that does not exist is taken as it is given.
-ChangeRecorder::Spelling ChangeRecorder::spell(const KeyName& name, bool exists) {
-    Spelling spelling{fullKeyName({name.root, {}}), {}};
-    std::string_view rest = name.path;
-    std::size_t end = 0;  // of the parent in the path
-    for (std::string_view part; takeName(rest, part);) {
-        const KeyName parent{name.root, name.path.substr(0, end)};
-        end += part.size() + (end == 0 ? 0 : 1);
-        const auto [known, isNew] = spelled_.try_emplace(walkPlace(spelling.name + '\\' + std::string(part)));
-        if (isNew) {
-            Subkey found{std::string(part), {}};
-            if (!rest.empty() || exists) {
-                OwnedKey key(registry_);
-                Status status = registry_.openKey(parent.root, parent.path, kKeyWalk | kKeyOpenLink, key.receive());
-                status = status == kSuccess ? reader_.subkey(key.get(), part, found) : status;
-                keep(isNotFound(status) ? kSuccess : status);
-                if (status != kSuccess) {
-                    found = {std::string(part), {}};
-                }
-            }
-            known->second = {spelling.name + '\\' + found.name, std::move(found.keyClass)};
-        }
-        spelling = known->second;
-    }
-    return spelling;
+    spelling.name += found.name;
+    spelling.keyClass = std::move(found.keyClass);
+    keyClass = spelling.keyClass;
+    return spelled_.emplace(place, std::move(spelling)).first->second.name;
 }
 
 ChangeRecorder::Key& ChangeRecorder::note(const KeyName& name, bool exists) {
-    const auto [place, isNew] = keys_.try_emplace(walkPlace(fullKeyName(name)));
-    Key& key = place->second;
+    bool isNew = false;
+    Key& key = rows_.key(fullKeyName(name), isNew);
     if (isNew) {
-        Spelling spelling = spell(name, exists);
-        key.name = std::move(spelling.name);
-        key.classBefore = key.classNow = spelling.keyClass;
+        key.name = spell(name, exists, key.classBefore);
+        key.classNow = key.classBefore;
         key.before = key.now = exists;
     }
     return key;
 }
 
 bool ChangeRecorder::exists(const KeyName& name) {
-    const auto known = keys_.find(walkPlace(fullKeyName(name)));
-    if (known != keys_.end()) {
-        return known->second.now;
+    if (const Key* const known = rows_.find(fullKeyName(name)); known != nullptr) {
+        return known->now;
     }
     OwnedKey key(registry_);
     const Status status = registry_.openKey(name.root, name.path, kKeyQueryValue | kKeyOpenLink, key.receive());
@@ -112,23 +72,59 @@ bool ChangeRecorder::exists(const KeyName& name) {
     return !isNotFound(status);
 }
 
-void ChangeRecorder::beforeCreate(const KeyName& name) {
-    missing_ = {name};
+// The key and those above it that do not exist, the highest last.
+std::vector<KeyName> ChangeRecorder::missingKeys(const KeyName& name) {
+    std::vector<KeyName> missing = {name};
     for (KeyName key = parentOf(name); !key.path.empty() && !exists(key); key = parentOf(key)) {
-        missing_.push_back(key);
+        missing.push_back(key);
     }
-    for (auto key = missing_.rbegin(); key != missing_.rend(); ++key) {
-        note(*key, false);
-    }
+    return missing;
 }
 
-void ChangeRecorder::created(const KeyName& name, std::string_view keyClass) {
-    for (const KeyName& key : std::exchange(missing_, {})) {
-        Key& missing = note(key, false);
-        missing.now = true;
-        missing.classNow.clear();
+void ChangeRecorder::write(const std::vector<const Key*>& keys, TouchedForm form) {
+    std::string part;
+    for (const Key* const key : keys) {
+        std::vector<const Row*> rows;
+        for (const Row& row : key->rows) {
+            rows.push_back(&row);
+        }
+        appendTouched(*key, rows, form, part);
     }
-    note(name, false).classNow = keyClass;
+    journal_->append(part);
+}
+
+void ChangeRecorder::write(const Key& key, const Row& row) {
+    std::string part;
+    appendTouched(key, {&row}, TouchedForm::step, part);
+    journal_->append(part);
+}
+
+template <typename Call>
+Status ChangeRecorder::createKey(const KeyName& name, std::string_view keyClass, Call call) {
+    if (!isRecorded(name)) {
+        return call();
+    }
+    std::vector<Key*> keys;
+    const std::vector<KeyName> missing = missingKeys(name);
+    for (auto key = missing.rbegin(); key != missing.rend(); ++key) {
+        keys.push_back(&note(*key, false));
+        rows_.create(*keys.back(), {});
+    }
+    rows_.create(*keys.back(), keyClass);
+    const std::vector<const Key*> created(keys.begin(), keys.end());
+    if (journal_ != nullptr) {
+        write(created, TouchedForm::step);
+    }
+    const Status status = call();
+    if (status != kSuccess) {
+        for (Key* const key : keys) {
+            key->now = false;
+        }
+        if (journal_ != nullptr) {
+            write(created, TouchedForm::step);
+        }
+    }
+    return status;
 }
 
 // Notes the values of a key that exists.
@@ -141,29 +137,43 @@ void ChangeRecorder::list(const KeyName& name, Key& key) {
     Status status = registry_.openKey(name.root, name.path, kKeyWalk | kKeyOpenLink, opened.receive());
     status = status == kSuccess ? reader_.values(opened.get(), values) : status;
     keep(status);
-    key.noteValues(values);
-}
-
-void ChangeRecorder::beforeDelete(const KeyName& name) {
-    rest();
-    if (!exists(name)) {
-        return;
+    for (KeyValue& value : values) {
+        if (key.find(value.name) == nullptr) {
+            key.add(std::move(value));
+        }
     }
-    list(name, note(name, true));
 }
 
-void ChangeRecorder::deleted(const KeyName& name) {
-    note(name, true).remove();
-}
-
-void ChangeRecorder::beforeValue(const KeyName& name, std::string_view value) {
+template <typename Call>
+Status ChangeRecorder::deleteKey(const KeyName& name, Call call) {
+    rest();
+    if (!isRecorded(name) || !exists(name)) {
+        return call();
+    }
     Key& key = note(name, true);
-    if (key.isListed || !key.before || key.values.contains(foldUpper(value))) {
-        return;
+    if (key.before) {
+        list(name, key);
+    }
+    if (journal_ != nullptr) {
+        write({&key}, TouchedForm::removal);
+    }
+    const Status status = call();
+    if (status == kSuccess) {
+        rows_.remove(key);
+    } else if (journal_ != nullptr) {
+        write({&key}, TouchedForm::whole);
+    }
+    return status;
+}
+
+ChangeRecorder::Row& ChangeRecorder::beforeValue(const KeyName& name, Key& key, std::string_view value) {
+    Row* const known = key.isListed || !key.before ? &key.row(value) : key.find(value);
+    if (known != nullptr) {
+        return *known;
     }
     Status status = kSuccess;
-    if (!open_ || openName_ != key.name) {
-        openName_ = key.name;
+    if (!open_ || opened_ != &key) {
+        opened_ = &key;
         status = registry_.openKey(name.root, name.path, kKeyQueryValue | kKeyOpenLink, open_.receive());
     }
     std::optional<ValueState> state;
@@ -172,58 +182,101 @@ void ChangeRecorder::beforeValue(const KeyName& name, std::string_view value) {
     if (state) {
         // The only way to find out how the store spells the name.
         list(name, key);
-    } else {
-        key.values.try_emplace(foldUpper(value), Value{std::string(value), {}, {}});
     }
+    return key.row(value);
 }
 
-void ChangeRecorder::valueSet(const KeyName& name, std::string_view value, std::optional<ValueState> state) {
-    auto& values = note(name, true).values;
-    values.try_emplace(foldUpper(value), Value{std::string(value), {}, {}}).first->second.now = std::move(state);
+template <typename Call>
+Status ChangeRecorder::changeValue(Place& place, std::string_view value, std::optional<ValueState> now, Call call) {
+    if (place.key == nullptr) {
+        if (!isRecorded(place.name)) {
+            return call();
+        }
+        place.key = &note(place.name, true);
+    }
+    Key& key = *place.key;
+    Row& row = beforeValue(place.name, key, value);
+    const bool wasTouched = row.isTouched;
+    const bool isChange = row.current() != now;
+    std::optional<ValueState> previous = std::move(row.now);
+    rows_.set(key, row, std::move(now));
+    if (journal_ != nullptr && isChange) {
+        write(key, row);
+    }
+    const Status status = call();
+    if (status != kSuccess) {
+        row.isTouched = wasTouched;
+        row.now = std::move(previous);
+        if (journal_ != nullptr && isChange) {
+            write(key, row);
+        }
+    }
+    return status;
 }
 
 void ChangeRecorder::beforeTree(const KeyName& name) {
     rest();
+    missing_.clear();
     if (!exists(name)) {
-        beforeCreate(name);
+        missing_ = missingKeys(name);
+        for (const KeyName& key : missing_) {
+            note(key, false);
+        }
         return;
     }
-    missing_.clear();
     KeyStart start;
     Snapshot tree;
     std::string unread;
     Status status = findKey(registry_, name, start);
     status = status == kSuccess ? readSnapshot(registry_, wholeServices_, {start}, tree, unread) : status;
     keep(status);
-    for (const KeyRecord& record : tree) {
-        const auto [place, isNew] = keys_.try_emplace(walkPlace(record.name));
-        Key& key = place->second;
+    for (KeyRecord& record : tree) {
+        bool isNew = false;
+        Key& key = rows_.key(record.name, isNew);
         if (isNew) {
-            key.name = record.name;
             key.classBefore = key.classNow = record.keyClass;
             key.before = key.now = true;
         }
-        key.isListed = true;
-        key.noteValues(record.values);
-    }
-}
-
-// As if a key and everything below it were gone.
-void ChangeRecorder::forgetTree(const KeyName& name) {
-    const std::string place = walkPlace(fullKeyName(name));
-    for (auto key = keys_.lower_bound(place); key != keys_.end() && key->first.starts_with(place); ++key) {
-        if (key->first.size() == place.size() || key->first[place.size()] == '\0') {
-            key->second.remove();
+        if (!std::exchange(key.isListed, true)) {
+            for (KeyValue& value : record.values) {
+                if (key.find(value.name) == nullptr) {
+                    key.add(std::move(value));
+                }
+            }
         }
     }
 }
 
+// Tells the journal what is going to be.
+void ChangeRecorder::expectTree(const KeyName& name, bool isDeletion, const std::vector<ServiceValue>& expected) {
+    std::vector<const Key*> keys;
+    if (isDeletion) {
+        rows_.visitTree(fullKeyName(name), [&](const Key& key) { keys.insert(keys.begin(), &key); });
+        write(keys, TouchedForm::removal);
+        return;
+    }
+    for (const KeyName& missing : missing_) {
+        Key& key = note(missing, false);
+        rows_.create(key, {});
+        keys.insert(keys.begin(), &key);
+    }
+    Key& key = note(name, true);
+    for (const ServiceValue& value : expected) {
+        rows_.set(key, key.row(value.name), ValueState{value.type, value.data});
+    }
+    if (missing_.empty()) {
+        keys.push_back(&key);
+    }
+    write(keys, TouchedForm::step);
+}
+
 void ChangeRecorder::afterTree(const KeyName& name, bool isDeleted) {
-    forgetTree(name);
+    // As if a key and everything below it were gone.
+    rows_.visitTree(fullKeyName(name), [&](Key& key) { rows_.remove(key); });
     OwnedKey opened(registry_);
-    for (const KeyName& key : std::exchange(missing_, {})) {
-        note(key, false).now =
-            registry_.openKey(key.root, key.path, kKeyQueryValue | kKeyOpenLink, opened.receive()) == kSuccess;
+    for (const KeyName& missing : std::exchange(missing_, {})) {
+        rows_.exists(note(missing, false), registry_.openKey(missing.root, missing.path, kKeyQueryValue | kKeyOpenLink,
+                                                             opened.receive()) == kSuccess);
     }
     if (isDeleted) {
         return;
@@ -237,43 +290,61 @@ void ChangeRecorder::afterTree(const KeyName& name, bool isDeleted) {
     const Status status = readSnapshot(registry_, wholeServices_, {start}, tree, unread);
     keep(isNotFound(status) ? kSuccess : status);
     for (const KeyRecord& record : tree) {
-        Key& key = keys_[walkPlace(record.name)];
-        key.name = key.name.empty() ? record.name : key.name;
+        bool isNew = false;
+        Key& key = rows_.key(record.name, isNew);
         key.classNow = record.keyClass;
-        key.now = true;
+        rows_.exists(key, true);
         for (const KeyValue& value : record.values) {
-            key.values.try_emplace(foldUpper(value.name), Value{value.name, {}, {}}).first->second.now =
-                ValueState{value.type, value.data};
+            rows_.set(key, key.row(value.name), ValueState{value.type, value.data});
         }
     }
+}
+
+template <typename Call>
+Status ChangeRecorder::changeTree(const KeyName& name, bool isDeletion, const std::vector<ServiceValue>& expected,
+                                  Call call) {
+    if (!isRecorded(name)) {
+        return call();
+    }
+    beforeTree(name);
+    const bool isWritten = journal_ != nullptr && (isDeletion || !expected.empty());
+    if (isWritten) {
+        expectTree(name, isDeletion, expected);
+    }
+    const Status status = call();
+    // The key of a deleted service may stay for as long as a handle is open.
+    afterTree(name, isDeletion && status == kSuccess);
+    if (isWritten) {
+        std::vector<const Key*> keys;
+        rows_.visitTree(fullKeyName(name), [&](const Key& key) { keys.push_back(&key); });
+        write(keys, TouchedForm::whole);
+    }
+    return status;
 }
 
 // Knows the name of every open key.
 class RecordedPorts::Registry final : public IRegistryStore {
 public:
-    Registry(IRegistryStore& real, ChangeRecorder& recorder, bool holdsCommits)
-        : real_(real), recorder_(recorder), holdsCommits_(holdsCommits) {}
+    Registry(IRegistryStore& real, ChangeRecorder& recorder, IHistory* history, bool holdsCommits)
+        : real_(real), recorder_(recorder), history_(history), holdsCommits_(holdsCommits) {}
 
     Status openKey(KeyHandle parent, std::string_view path, AccessMask access, KeyHandle& key) override {
-        const KeyName name = nameOf(parent, path, access);
-        return opened(real_.openKey(parent, path, access, key), name, key);
+        const Status status = real_.openKey(parent, path, access, key);
+        return status == kSuccess ? opened(nameOf(parent, path, access), key) : status;
     }
     Status createKey(KeyHandle parent, std::string_view path, std::string_view keyClass, AccessMask access,
                      KeyHandle& key) override {
         const KeyName name = nameOf(parent, path, access);
         Status status = real_.openKey(parent, path, access, key);
         if (isNotFound(status)) {
-            recorder_.beforeCreate(name);
-            status = real_.createKey(parent, path, keyClass, access, key);
-            if (status == kSuccess) {
-                recorder_.created(name, keyClass);
-            }
+            status = recorder_.createKey(
+                name, keyClass, [&] { return real_.createKey(parent, path, keyClass, access, key); });
         } else if (status != kSuccess) {
             const Status unread = status;
             status = real_.createKey(parent, path, keyClass, access, key);
             recorder_.keep(status == kSuccess ? unread : kSuccess);
         }
-        return opened(status, name, key);
+        return status == kSuccess ? opened(name, key) : status;
     }
     Status closeKey(KeyHandle key) override {
         open_.erase(key);
@@ -283,22 +354,11 @@ public:
         return real_.queryValue(key, name, type, data);
     }
     Status setValue(KeyHandle key, std::string_view name, ValueType type, std::string_view data) override {
-        const KeyName of = nameOf(key, {}, 0);
-        recorder_.beforeValue(of, name);
-        const Status status = real_.setValue(key, name, type, data);
-        if (status == kSuccess) {
-            recorder_.valueSet(of, name, ValueState{type, std::string(data)});
-        }
-        return status;
+        return recorder_.changeValue(placeOf(key), name, ValueState{type, std::string(data)},
+                                     [&] { return real_.setValue(key, name, type, data); });
     }
     Status deleteValue(KeyHandle key, std::string_view name) override {
-        const KeyName of = nameOf(key, {}, 0);
-        recorder_.beforeValue(of, name);
-        const Status status = real_.deleteValue(key, name);
-        if (status == kSuccess) {
-            recorder_.valueSet(of, name, std::nullopt);
-        }
-        return status;
+        return recorder_.changeValue(placeOf(key), name, std::nullopt, [&] { return real_.deleteValue(key, name); });
     }
     Status enumerateKey(KeyHandle key, std::uint32_t index, Buffer& name, Buffer* keyClass) override {
         return real_.enumerateKey(key, index, name, keyClass);
@@ -307,30 +367,54 @@ public:
         return real_.enumerateValue(key, index, name, type, data);
     }
     Status deleteKey(KeyHandle parent, std::string_view path, AccessMask view) override {
-        const KeyName name = nameOf(parent, path, view);
-        recorder_.beforeDelete(name);
-        const Status status = real_.deleteKey(parent, path, view);
-        if (status == kSuccess) {
-            recorder_.deleted(name);
-        }
-        return status;
+        return recorder_.deleteKey(nameOf(parent, path, view), [&] { return real_.deleteKey(parent, path, view); });
     }
     Status commit() override {
         recorder_.rest();
-        const Status status = holdsCommits_ ? kSuccess : real_.commit();
+        return holdsCommits_ ? kSuccess : save();
+    }
+
+    Status save() {
+        recorder_.rest();
+        std::string part = recorder_.rows().takePart();
+        Status status = kSuccess;
+        if (history_ != nullptr) {
+            status = history_->takesEachChange() || part.empty() ? kSuccess : history_->append(part);
+            status = status == kSuccess ? history_->settle(recorder_.rows().counts()) : status;
+        }
+        // Ends the transaction in any case.
+        const Status committed = real_.commit();
+        status = status == kSuccess ? committed : status;
         if (status == kSuccess && !holdsCommits_) {
-            committed_ = recorder_.changes();
+            saved_.push_back(std::move(part));
         }
         return status;
     }
 
-    ChangeSet changes() const { return holdsCommits_ ? recorder_.changes() : committed_; }
+    ChangeSet changes() const {
+        if (holdsCommits_) {
+            return recorder_.rows().changes();
+        }
+        TouchedRows rows;
+        for (const std::string& part : saved_) {
+            rows.add(part);
+        }
+        return rows.changes();
+    }
 
 private:
+    ChangeRecorder::Place& placeOf(KeyHandle key) {
+        ChangeRecorder::Place& place = open_[key];
+        if (place.name.root == KeyHandle::none) {
+            place.name.root = key;
+        }
+        return place;
+    }
+
     KeyName nameOf(KeyHandle parent, std::string_view path, AccessMask access) const {
         KeyName name{parent, {}};
         if (const auto open = open_.find(parent); open != open_.end()) {
-            name = open->second;
+            name = open->second.name;
         }
         const std::string plain = plainKeyPath(parent, path, access);
         std::string_view rest = plain;
@@ -339,18 +423,19 @@ private:
         }
         return name;
     }
-    Status opened(Status status, const KeyName& name, const KeyHandle& key) {
-        if (status == kSuccess && !isRoot(key)) {
-            open_.insert_or_assign(key, name);
+    Status opened(KeyName name, KeyHandle key) {
+        if (!isRoot(key)) {
+            open_.insert_or_assign(key, ChangeRecorder::Place{std::move(name), nullptr});
         }
-        return status;
+        return kSuccess;
     }
 
     IRegistryStore& real_;
     ChangeRecorder& recorder_;
+    IHistory* history_;
     bool holdsCommits_;
-    ChangeSet committed_;
-    std::map<KeyHandle, KeyName> open_;
+    std::vector<std::string> saved_;  // parts
+    std::unordered_map<KeyHandle, ChangeRecorder::Place> open_;
 };
 
 // A service is recorded as the key of its record, which every service manager keeps in the same place.
@@ -362,8 +447,8 @@ public:
         return real_.openManager(access, manager);
     }
     Status createService(ServiceHandle manager, const ServiceDefinition& definition, ServiceHandle& service) override {
-        const Status status =
-            change(definition.name, false, [&] { return real_.createService(manager, definition, service); });
+        const Status status = change(definition.name, false, serviceValues(definition),
+                                     [&] { return real_.createService(manager, definition, service); });
         return opened(status, definition.name, service);
     }
     Status openService(ServiceHandle manager, std::string_view name, std::uint32_t access,
@@ -371,23 +456,25 @@ public:
         return opened(real_.openService(manager, name, access, service), name, service);
     }
     Status changeStartType(ServiceHandle service, ServiceStart start) override {
-        return change(open_[service], false, [&] { return real_.changeStartType(service, start); });
+        return change(open_[service], false, serviceValues({{}, {}, {}, kServiceOwnProcess, start}, {"Start"}),
+                      [&] { return real_.changeStartType(service, start); });
     }
     Status configureService(ServiceHandle service, const ServiceDefinition& definition) override {
-        return change(open_[service], false, [&] { return real_.configureService(service, definition); });
+        return change(open_[service], false, serviceValues(definition),
+                      [&] { return real_.configureService(service, definition); });
     }
     Status startService(ServiceHandle service) override {
-        return change(open_[service], false, [&] { return real_.startService(service); });
+        return change(open_[service], false, {}, [&] { return real_.startService(service); });
     }
     Status stopService(ServiceHandle service) override {
-        return change(open_[service], false, [&] { return real_.stopService(service); });
+        return change(open_[service], false, {}, [&] { return real_.stopService(service); });
     }
     Status waitForStop(ServiceHandle service, std::uint32_t milliseconds) override {
         return real_.waitForStop(service, milliseconds);
     }
     Status queryState(ServiceHandle service, ServiceState& state) override { return real_.queryState(service, state); }
     Status deleteService(ServiceHandle service) override {
-        return change(open_[service], true, [&] { return real_.deleteService(service); });
+        return change(open_[service], true, {}, [&] { return real_.deleteService(service); });
     }
     Status closeHandle(ServiceHandle handle) override {
         open_.erase(handle);
@@ -396,16 +483,12 @@ public:
 
 private:
     template <typename Call>
-    Status change(std::string_view name, bool isDeletion, Call call) {
+    Status change(std::string_view name, bool isDeletion, const std::vector<ServiceValue>& expected, Call call) {
         if (!isServiceName(name)) {
             return call();
         }
-        const KeyName key{KeyHandle::localMachine, std::string(kServiceKeys) + std::string(name)};
-        recorder_.beforeTree(key);
-        const Status status = call();
-        // The key of a deleted service may stay for as long as a handle is open.
-        recorder_.afterTree(key, isDeletion && status == kSuccess);
-        return status;
+        return recorder_.changeTree({KeyHandle::localMachine, std::string(kServiceKeys) + std::string(name)},
+                                    isDeletion, expected, call);
     }
     Status opened(Status status, std::string_view name, const ServiceHandle& service) {
         if (status == kSuccess) {
@@ -416,50 +499,102 @@ private:
 
     IServiceManager& real_;
     ChangeRecorder& recorder_;
-    std::map<ServiceHandle, std::string> open_;  // names
+    std::unordered_map<ServiceHandle, std::string> open_;  // names
 };
 
 // Writes to the registry only where that holds the cache's records.
 class RecordedPorts::Assemblies final : public IAssemblyCache {
 public:
-    Assemblies(IAssemblyCache& real, ChangeRecorder& recorder) : real_(real), recorder_(recorder) {}
+    // `outside`: gets a note of what is registered elsewhere; else null.
+    Assemblies(IAssemblyCache& real, ChangeRecorder& recorder, IHistory* outside)
+        : real_(real), recorder_(recorder), outside_(outside) {}
 
     Status deregisterProviders(std::string_view level) override {
-        return change([&] { return real_.deregisterProviders(level); });
+        return change("removed data providers from the assembly cache",
+                      [&] { return real_.deregisterProviders(level); });
     }
     Status registerProviders(std::string_view location, std::string_view level,
                              FrameworkGenerations generations) override {
-        return change([&] { return real_.registerProviders(location, level, generations); });
+        return change("added data providers to the assembly cache",
+                      [&] { return real_.registerProviders(location, level, generations); });
     }
 
 private:
     template <typename Call>
-    Status change(Call call) {
-        const KeyName key{KeyHandle::localMachine, std::string(kAssemblyRecords)};
-        recorder_.beforeTree(key);
-        const Status status = call();
-        recorder_.afterTree(key, false);
-        return status;
+    Status change(std::string_view what, Call call) {
+        if (outside_ != nullptr) {
+            outside_->note(what);
+            return call();
+        }
+        return recorder_.changeTree({KeyHandle::localMachine, std::string(kAssemblyRecords)}, false, {}, call);
     }
 
     IAssemblyCache& real_;
     ChangeRecorder& recorder_;
+    IHistory* outside_;
 };
 
-RecordedPorts::RecordedPorts(const Ports& real, bool wholeServices, bool holdsCommits)
-    : recorder_(*real.registry, wholeServices),
+// Notes the programs that are started. The operations on streams are called on other threads and from destructors.
+class RecordedPorts::Programs final : public IProcessHost {
+public:
+    Programs(IProcessHost& real, IHistory& history) : real_(real), history_(history) {}
+
+    Status startProcess(const ProcessStart& start, ProcessInformation& started) override {
+        const Status status = real_.startProcess(start, started);
+        if (status == kSuccess) {
+            history_.note("ran " + std::string(start.commandLine));
+        }
+        return status;
+    }
+
+    // clang-format off
+    Status getSlot(StandardSlot slot, StreamHandle& stream) override { return real_.getSlot(slot, stream); }
+    Status setSlot(StandardSlot slot, StreamHandle stream) override { return real_.setSlot(slot, stream); }
+    Status createPipe(StreamHandle& readEnd, StreamHandle& writeEnd) override { return real_.createPipe(readEnd, writeEnd); }
+    Status duplicate(StreamHandle stream, StreamHandle& copy) override { return real_.duplicate(stream, copy); }
+    Status read(StreamHandle stream, Buffer& data) override { return real_.read(stream, data); }
+    Status write(StreamHandle stream, std::string_view data) override { return real_.write(stream, data); }
+    Status closeStream(StreamHandle stream) override { return real_.closeStream(stream); }
+    Status waitProcess(ProcessHandle process, std::uint32_t milliseconds) override { return real_.waitProcess(process, milliseconds); }
+    Status exitCode(ProcessHandle process, std::uint32_t& code) override { return real_.exitCode(process, code); }
+    Status closeProcess(ProcessHandle process) override { return real_.closeProcess(process); }
+    Status shortPath(std::string_view path, Buffer& shortened) override { return real_.shortPath(path, shortened); }
+    // clang-format on
+
+private:
+    IProcessHost& real_;
+    IHistory& history_;
+};
+
+RecordedPorts::RecordedPorts(const Ports& real, const RecordOptions& options)
+    : history_(real.history != nullptr && real.history->isOn() ? real.history : nullptr),
+      recorder_(*real.registry, options, history_),
       ports_(real),
-      registry_(std::make_unique<Registry>(*real.registry, recorder_, holdsCommits)),
+      registry_(std::make_unique<Registry>(*real.registry, recorder_, history_, options.holdsCommits)),
       services_(std::make_unique<Services>(*real.services, recorder_)) {
     ports_.registry = registry_.get();
     ports_.services = services_.get();
-    if (wholeServices) {
-        assemblies_ = std::make_unique<Assemblies>(*real.assemblies, recorder_);
+    if (options.wholeServices || history_ != nullptr) {
+        assemblies_ =
+            std::make_unique<Assemblies>(*real.assemblies, recorder_, options.wholeServices ? nullptr : history_);
         ports_.assemblies = assemblies_.get();
+    }
+    if (history_ != nullptr) {
+        programs_ = std::make_unique<Programs>(*real.processes, *history_);
+        ports_.processes = programs_.get();
     }
 }
 
-RecordedPorts::~RecordedPorts() = default;
+// A run that fails where every change is final ends without a commit point.
+RecordedPorts::~RecordedPorts() {
+    if (history_ != nullptr && history_->takesEachChange()) {
+        history_->settle(recorder_.rows().counts());
+    }
+}
+
+Status RecordedPorts::commit() {
+    return registry_->save();
+}
 
 ChangeSet RecordedPorts::changes() const {
     return registry_->changes();

@@ -5,6 +5,7 @@
 #include <map>
 #include <set>
 
+#include "install/platform/service_records.h"
 #include "install/platform/text.h"
 
 namespace kz7 {
@@ -121,6 +122,9 @@ public:
         if (status == kSuccess) {
             status = reader_.subkeys(key_.get(), allSubkeys);
         }
+        std::erase_if(allValues, [&](const KeyValue& value) {
+            return isRunState({Change::Kind::value, name_, {}, value.name, {}, {}});
+        });
         exactly = allValues.size() == values && allSubkeys.size() == subkeys;
         return status;
     }
@@ -400,6 +404,10 @@ Status applyChangeSet(IRegistryStore& registry, IServiceManager* services, const
         status = applyService(*services, service->second);
     }
     return status;
+}
+
+bool isRunState(const Change& change) {
+    return !change.isKey() && equalsIgnoreCase(change.name, kServiceRunState) && !serviceOf(change.key).empty();
 }
 
 std::string_view serviceOf(std::string_view fullKeyName) {

@@ -6,6 +6,7 @@
 #include <string>
 #include <vector>
 
+#include "install/platform/history.h"
 #include "install/platform/service_manager.h"
 #include "install/src/registry/key_walk.h"
 
@@ -40,7 +41,7 @@ ChangeSet difference(const Snapshot& before, const Snapshot& after);
 ChangeSet inverse(const ChangeSet& changes);
 
 // The changes whose row is not in its state before any more. That of a removed key includes that it has no other values
-// and subkeys than those that are removed with it. On failure `key` names the key that cannot be read.
+// and subkeys than those that are removed with it; the run state of a service does not count. On failure `key` names the key that cannot be read.
 Status findConflicts(IRegistryStore& registry, bool wholeServices, const ChangeSet& changes,
                      std::vector<const Change*>& conflicts, std::string& key);
 
@@ -49,15 +50,13 @@ Status findConflicts(IRegistryStore& registry, bool wholeServices, const ChangeS
 // cannot be changed; what comes before it is made.
 Status applyChangeSet(IRegistryStore& registry, IServiceManager* services, const ChangeSet& changes, std::string& key);
 
+// Whether a row is the run state of a service, which no one takes back.
+bool isRunState(const Change& change);
+
 // The name of the management service whose record the key belongs to; empty for other keys.
 std::string_view serviceOf(std::string_view fullKeyName);
 
 // How many services, and keys and values apart from those, a change set changes.
-struct ChangeCounts {
-    std::size_t values = 0;
-    std::size_t keys = 0;
-    std::size_t services = 0;
-};
 ChangeCounts countChanges(const ChangeSet& changes);
 
 // Reads the keys with everything below them. On failure `key` names the key that cannot be read.

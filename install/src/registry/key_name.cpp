@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "install/platform/assembly_records.h"
 #include "install/platform/registry_path.h"
 #include "install/platform/text.h"
 
@@ -62,6 +63,21 @@ std::string walkPlace(std::string_view fullName) {
     std::string place = foldUpper(fullName);
     std::replace(place.begin(), place.end(), '\\', '\0');
     return place;
+}
+
+bool isProductKey(const KeyName& name) {
+    const auto covers = [&](std::string_view key) {
+        const bool isPrefix = key.ends_with('*');
+        key.remove_suffix(isPrefix ? 1 : 0);
+        const std::size_t common = std::min(key.size(), name.path.size());
+        if (!equalsIgnoreCase(key.substr(0, common), std::string_view(name.path).substr(0, common))) {
+            return false;
+        }
+        return name.path.size() == key.size() || (name.path.size() < key.size() && key[common] == '\\') ||
+               (name.path.size() > key.size() && (isPrefix || name.path[common] == '\\'));
+    };
+    return name.root == KeyHandle::localMachine &&
+           (covers(kAssemblyRecords) || std::any_of(kProductKeys.begin(), kProductKeys.end(), covers));
 }
 
 }  // namespace kz7

@@ -41,4 +41,7 @@ inline constexpr std::array<std::string_view, 6> kProductKeys = {
 };
 // clang-format on
 
+// Whether a key is one of those, below one of them, or above one of them.
+bool isProductKey(const KeyName& name);
+
 }  // namespace kz7

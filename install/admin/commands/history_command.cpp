@@ -1,0 +1,156 @@
+#include <CLI/CLI.hpp>
+#include <algorithm>
+
+#include "install/admin/commands/commands.h"
+#include "install/admin/formats/change_text.h"
+#include "install/admin/formats/reg_text.h"
+#include "install/admin/formats/text_table.h"
+#include "install/admin/run_history.h"
+#include "install/platform/text.h"
+#include "install/src/registry/copy_layout.h"
+#include "install/src/registry/copy_name.h"
+#include "install/src/services/management_service.h"
+
+namespace kz7 {
+namespace {
+
+struct HistoryOptions {
+    std::string copy;
+    std::uint64_t number = 0;
+    std::uint64_t keep = 0;
+    std::string before;
+    bool json = false;
+    bool diff = false;
+    bool reg = false;
+};
+
+// Whether a run changed a key of the copy or its service.
+bool concerns(const ChangeSet& changes, const std::string& copy) {
+    std::vector<std::string> trees = {std::string(kServiceKeys) + std::string(managementServiceName(copy).view())};
+    for (const std::string_view root : {layout::kCopy, layout::kCopy32}) {
+        trees.push_back(substituteCopyName(root, copy));
+    }
+    return std::any_of(changes.begin(), changes.end(), [&](const Change& change) {
+        return std::any_of(trees.begin(), trees.end(), [&](const std::string& tree) {
+            const std::string key = fullKeyName({KeyHandle::localMachine, tree}) + '\\';
+            return equalsIgnoreCase((change.key + '\\').substr(0, key.size()), key);
+        });
+    });
+}
+
+Answer selectRuns(Admin& admin, const std::string& copy, std::vector<HistoryRun>& runs) {
+    Answer answer = listRuns(admin, runs);
+    std::reverse(runs.begin(), runs.end());
+    if (!copy.empty()) {
+        std::erase_if(runs, [&](const HistoryRun& run) {
+            ChangeSet changes;
+            answer = answer == kAnswerYes ? readRun(admin, run, changes) : answer;
+            return !concerns(changes, copy);
+        });
+    }
+    return answer;
+}
+
+std::string runsText(const std::vector<HistoryRun>& runs, std::uint32_t columns) {
+    std::vector<TableRow> table = {{"RUN", "TIME", "USER", "COMMAND", "STATUS", "ROWS"}};
+    for (const HistoryRun& run : runs) {
+        table.push_back({std::to_string(run.number), utcTime(run.begun), shownText(run.user), commandOf(run),
+                         stateOf(run),
+                         std::to_string(run.counts.values + run.counts.keys + run.counts.services)});
+    }
+    return tableText(table, columns);
+}
+
+std::string runsJson(const std::vector<HistoryRun>& runs) {
+    std::string json = "{\"schema\":1,\"runs\":[";
+    std::string_view separator = "\n";
+    for (const HistoryRun& run : runs) {
+        json.append(separator).append("{");
+        appendRunJson(run, json);
+        json += '}';
+        separator = ",\n";
+    }
+    return json + "]}\n";
+}
+
+Answer showHistory(Admin& admin, const HistoryOptions& options) {
+    std::vector<HistoryRun> runs;
+    if (!admin.open(true)) {
+        return kAnswerFault;
+    }
+    if (const Answer selected = selectRuns(admin, options.copy, runs); selected != kAnswerYes) {
+        return selected;
+    }
+    if (options.json) {
+        return admin.show(runsJson(runs), Admin::Form::document);
+    }
+    return runs.empty() ? admin.no("no run is recorded: " + shownText(admin.platform().storeName()))
+                        : admin.show(runsText(runs, admin.output().columns));
+}
+
+std::string runText(const HistoryRun& run, const ChangeSet& changes, bool withChanges, bool isColoured) {
+    std::string text = "run " + std::to_string(run.number) + ": " + commandOf(run) + '\n';
+    text += "begun " + utcTime(run.begun) + (run.ended == 0 ? "" : ", ended " + utcTime(run.ended)) + ", by " +
+            shownText(run.user) + " on " + shownText(run.host) + ", status " + stateOf(run) + '\n';
+    if (run.parent != 0) {
+        text += "started by run " + std::to_string(run.parent) + '\n';
+    }
+    text += withChanges ? changeText(changes, isColoured) : std::string{};
+    for (const std::string& outside : run.outside) {
+        text += markedLine('!', shownText(outside), isColoured);
+    }
+    return text + changeSummary(changes) + '\n';
+}
+
+Answer showOne(Admin& admin, const HistoryOptions& options) {
+    HistoryRun run;
+    ChangeSet changes;
+    if (!admin.open(true)) {
+        return kAnswerFault;
+    }
+    Answer answer = findRun(admin, options.number, run);
+    answer = answer == kAnswerYes ? readRun(admin, run, changes) : answer;
+    if (answer != kAnswerYes) {
+        return answer;
+    }
+    if (options.reg) {
+        return admin.write(regTextHeader() + changeRegText(changes), Admin::Form::document);
+    }
+    if (!options.json) {
+        return admin.write(runText(run, changes, options.diff, admin.output().colours));
+    }
+    std::string json = "{\"schema\":1,";
+    appendRunJson(run, json);
+    json += ",\"changes\":";
+    appendChangesJson(changes, json);
+    return admin.write(json + "}\n", Admin::Form::document);
+}
+
+void answerWith(CLI::App* command, Admin& admin, const std::shared_ptr<HistoryOptions>& options,
+                Answer (*function)(Admin&, const HistoryOptions&)) {
+    command->callback([&admin, options, function] {
+        if (admin.answer == nullptr) {
+            admin.answer = [&admin, options, function] { return function(admin, *options); };
+        }
+    });
+}
+
+}  // namespace
+
+void addHistoryCommand(CLI::App& program, Admin& admin) {
+    auto* command = program.add_subcommand("history", "Show the runs that changed the store, and what each changed");
+    auto options = std::make_shared<HistoryOptions>();
+    command->require_subcommand(0, 1);
+    command->add_option("NAME", options->copy, "Only the runs that changed this copy");
+    command->add_flag("--json", options->json, "Write JSON for programs");
+    answerWith(command, admin, options, showHistory);
+
+    auto* show = command->add_subcommand("show", "Show one run");
+    show->add_option("N", options->number, "Its number")->required();
+    auto* diff = show->add_flag("--diff", options->diff, "Show each change");
+    show->add_flag("--reg", options->reg, "Write its changes as registry-editor text")->excludes(diff);
+    show->add_flag("--json", options->json, "Write JSON for programs")->excludes(diff);
+    answerWith(show, admin, options, showOne);
+}
+
+}  // namespace kz7

@@ -1,0 +1,332 @@
+#include "install/platform/embedded/history.h"
+
+#include <fcntl.h>
+#include <pwd.h>
+#include <sys/utsname.h>
+#include <unistd.h>
+
+#include <array>
+#include <charconv>
+#include <cstdlib>
+#include <ctime>
+#include <utility>
+
+namespace kz7 {
+namespace {
+
+constexpr const char* kRunVariable = "KZ7_RUN";  // for the programs that a run starts: its number
+constexpr std::int64_t kMostRuns = 1000;
+constexpr std::int64_t kMostBytes = std::int64_t{256} << 20;
+
+// A run's status is null until it has ended. The parts of a run are found from its first one on; `total` counts the bytes
+// of all parts up to and with that one. Older programs ignore these tables.
+constexpr const char* kTables =
+    "CREATE TABLE IF NOT EXISTS run (number INTEGER PRIMARY KEY AUTOINCREMENT, parent INTEGER NOT NULL,"
+    " undoes INTEGER NOT NULL, begun INTEGER NOT NULL, ended INTEGER NOT NULL, status INTEGER, user TEXT NOT NULL,"
+    " host TEXT NOT NULL, program TEXT NOT NULL, arguments TEXT NOT NULL, outside TEXT NOT NULL,"
+    " nvalues INTEGER NOT NULL, nkeys INTEGER NOT NULL, nservices INTEGER NOT NULL, firstpart INTEGER NOT NULL);"
+    "CREATE TABLE IF NOT EXISTS runpart (id INTEGER PRIMARY KEY, run INTEGER NOT NULL, total INTEGER NOT NULL,"
+    " changes BLOB NOT NULL)";
+
+// A statement that is used once.
+class Once {
+public:
+    Once(sqlite3* connection, const char* sql) : Once(connection, sql, nullptr) {}
+
+    Query& query() { return query_; }
+
+private:
+    Once(sqlite3* connection, const char* sql, sqlite3_stmt* statement)
+        : error_(sqlite3_prepare_v2(connection, sql, -1, &statement, nullptr)),
+          statement_(statement),
+          query_(statement, error_) {}
+
+    int error_;
+    Statement statement_;
+    Query query_;
+};
+
+// Texts in one, each with a NUL behind it: no argument holds one.
+std::string joined(const std::vector<std::string>& texts) {
+    std::string all;
+    for (const std::string& text : texts) {
+        all.append(text).append(1, '\0');
+    }
+    return all;
+}
+
+std::vector<std::string> split(std::string_view all) {
+    std::vector<std::string> texts;
+    for (std::size_t end = 0; (end = all.find('\0')) != std::string_view::npos; all.remove_prefix(end + 1)) {
+        texts.emplace_back(all.substr(0, end));
+    }
+    return texts;
+}
+
+// Only the number is written: looking the name up takes longer than the whole run.
+std::string userName(std::string_view number) {
+    uid_t id = 0;
+    const auto [end, error] = std::from_chars(number.data(), number.data() + number.size(), id);
+    const passwd* const user = error == std::errc{} && end == number.data() + number.size() ? getpwuid(id) : nullptr;
+    return user == nullptr ? std::string(number) : user->pw_name;
+}
+
+std::string hostName() {
+    utsname found{};
+    return uname(&found) == 0 ? found.nodename : "";
+}
+
+bool hasTables(sqlite3* connection) {
+    std::int64_t count = 0;
+    return queryNumber(connection, "SELECT count(*) FROM sqlite_master WHERE name IN ('run', 'runpart')", count) ==
+               SQLITE_OK &&
+           count == 2;
+}
+
+struct flock byteOf(std::uint64_t number) {
+    struct flock lock {};
+    lock.l_type = F_WRLCK;
+    lock.l_whence = SEEK_SET;
+    lock.l_start = static_cast<off_t>(number);
+    lock.l_len = 1;
+    return lock;
+}
+
+HistoryRun runOf(const Query& row) {
+    HistoryRun run;
+    run.number = static_cast<std::uint64_t>(row.number(0));
+    run.parent = static_cast<std::uint64_t>(row.number(1));
+    run.undoes = static_cast<std::uint64_t>(row.number(2));
+    run.begun = row.number(3);
+    run.ended = row.number(4);
+    run.status = static_cast<Status>(row.number(5));
+    run.user = userName(row.bytes(6));
+    run.host = row.bytes(7);
+    run.program = row.bytes(8);
+    run.arguments = split(row.bytes(9));
+    run.outside = split(row.bytes(10));
+    run.counts = {static_cast<std::size_t>(row.number(11)), static_cast<std::size_t>(row.number(12)),
+                  static_cast<std::size_t>(row.number(13))};
+    run.state = row.number(14) == 0 ? RunState::ended : RunState::interrupted;
+    return run;
+}
+
+// Both tables, up to the run before `number`.
+int removeBefore(sqlite3* connection, std::int64_t number) {
+    Once runs(connection, "DELETE FROM run WHERE number < ?");
+    int result = runs.query().bind(number).step();
+    if (result == SQLITE_DONE && sqlite3_changes(connection) != 0) {
+        result = execute(connection,
+                         "DELETE FROM runpart WHERE id < coalesce((SELECT firstpart FROM run ORDER BY number LIMIT 1),"
+                         " (SELECT max(id) + 1 FROM runpart))");
+        return result;
+    }
+    return result == SQLITE_DONE ? SQLITE_OK : result;
+}
+
+// Leaves the newest runs, as many as fit.
+int removeOldest(sqlite3* connection, std::int64_t newest) {
+    const int result = removeBefore(connection, newest - kMostRuns + 1);
+    if (result != SQLITE_OK) {
+        return result;
+    }
+    std::int64_t bytes = 0;
+    if (queryNumber(connection,
+                    "SELECT (SELECT total FROM runpart ORDER BY id DESC LIMIT 1) -"
+                    " (SELECT total - length(changes) FROM runpart ORDER BY id LIMIT 1)",
+                    bytes) != SQLITE_OK ||
+        bytes <= kMostBytes) {
+        return SQLITE_OK;
+    }
+    Once first(connection,
+               "SELECT run FROM runpart WHERE total - length(changes) >="
+               " (SELECT total FROM runpart ORDER BY id DESC LIMIT 1) - ? ORDER BY id LIMIT 1");
+    return first.query().bind(kMostBytes).step() == SQLITE_ROW ? removeBefore(connection, first.query().number(0))
+                                                               : SQLITE_OK;
+}
+
+}  // namespace
+
+void EmbeddedHistory::begin(const HistoryStart& run) {
+    start_ = run;
+    begun_ = std::time(nullptr);
+}
+
+Status EmbeddedHistory::append(std::string_view part) {
+    part_ = part;
+    return kSuccess;
+}
+
+Status EmbeddedHistory::settle(const ChangeCounts& counts) {
+    counts_ = counts;
+    if (part_.empty() || (number_ == 0 && counts.isEmpty())) {
+        part_.clear();
+        return kSuccess;
+    }
+    const Status status = registry_.use([&](sqlite3* connection) { return write(connection, counts); });
+    part_.clear();
+    return status;
+}
+
+// A part over the limit would push out everything else, and itself.
+int EmbeddedHistory::write(sqlite3* connection, const ChangeCounts& counts) {
+    if (part_.size() > static_cast<std::size_t>(kMostBytes)) {
+        return SQLITE_OK;
+    }
+    int result = execute(connection, kTables);
+    bool isThere = number_ != 0;
+    result = result == SQLITE_OK && isThere ? writeRun(connection, counts, isThere) : result;
+    result = result == SQLITE_OK && !isThere ? addRun(connection) : result;
+    result = result == SQLITE_OK && !isThere ? writeRun(connection, counts, isThere) : result;
+    if (result == SQLITE_OK) {
+        Once add(connection,
+                 "INSERT INTO runpart (run, total, changes) SELECT ?, length(part) + coalesce((SELECT total FROM"
+                 " runpart ORDER BY id DESC LIMIT 1), 0), part FROM (SELECT ? AS part)");
+        result = add.query().bind(static_cast<std::int64_t>(number_)).bindBytes(part_).step();
+    }
+    result = result == SQLITE_DONE ? removeOldest(connection, static_cast<std::int64_t>(number_)) : result;
+    // Tables of that name that are not ours: the run is more important than its entry.
+    return result == SQLITE_ERROR ? SQLITE_OK : result;
+}
+
+int EmbeddedHistory::addRun(sqlite3* connection) {
+    Once add(connection,
+             "INSERT INTO run (parent, undoes, begun, ended, user, host, program, arguments, outside, nvalues, nkeys,"
+             " nservices, firstpart) SELECT ?, ?, ?, 0, ?, ?, ?, ?, '', 0, 0, 0, coalesce(max(id), 0) + 1 FROM runpart");
+    const std::string user = std::to_string(geteuid());
+    const std::string host = hostName();
+    const std::string arguments = joined(start_.arguments);
+    const int result = add.query()
+                           .bind(static_cast<std::int64_t>(parentOf(connection)))
+                           .bind(static_cast<std::int64_t>(start_.undoes))
+                           .bind(begun_)
+                           .bind(std::string_view(user))
+                           .bind(std::string_view(host))
+                           .bind(std::string_view(start_.program))
+                           .bind(std::string_view(arguments))
+                           .step();
+    if (result != SQLITE_DONE) {
+        return result;
+    }
+    number_ = static_cast<std::uint64_t>(sqlite3_last_insert_rowid(connection));
+    if (start_.startsPrograms) {
+        setenv(kRunVariable, std::to_string(number_).c_str(), 1);
+        locks_.receive() = open((registry_.path() + "-runs").c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0600);
+        struct flock lock = byteOf(number_);
+        fcntl(locks_.get(), F_OFD_SETLK, &lock);
+    }
+    return SQLITE_OK;
+}
+
+// A run that starts no programs has one commit point, which ends it.
+int EmbeddedHistory::writeRun(sqlite3* connection, const ChangeCounts& counts, bool& isThere) {
+    Once update(connection,
+                start_.startsPrograms
+                    ? "UPDATE run SET nvalues = ?, nkeys = ?, nservices = ?, outside = ?, ended = 0, status = NULL"
+                      " WHERE number = ?"
+                    : "UPDATE run SET nvalues = ?, nkeys = ?, nservices = ?, outside = ?, ended = unixepoch(),"
+                      " status = 0 WHERE number = ?");
+    const std::string outside = joined(outside_);
+    const int result = update.query()
+                           .bind(static_cast<std::int64_t>(counts.values))
+                           .bind(static_cast<std::int64_t>(counts.keys))
+                           .bind(static_cast<std::int64_t>(counts.services))
+                           .bind(std::string_view(outside))
+                           .bind(static_cast<std::int64_t>(number_))
+                           .step();
+    // Not there: the transaction that wrote it was taken back.
+    isThere = sqlite3_changes(connection) != 0;
+    return result == SQLITE_DONE ? SQLITE_OK : result;
+}
+
+std::uint64_t EmbeddedHistory::parentOf(sqlite3* connection) {
+    const char* const given = std::getenv(kRunVariable);
+    const std::string text = given == nullptr ? "" : given;
+    std::uint64_t number = 0;
+    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
+    if (text.empty() || error != std::errc{} || end != text.data() + text.size()) {
+        return 0;
+    }
+    Once find(connection, "SELECT 1 FROM run WHERE number = ? AND status IS NULL");
+    const bool isThere = find.query().bind(static_cast<std::int64_t>(number)).step() == SQLITE_ROW;
+    return isThere && isLocked(number) ? number : 0;
+}
+
+bool EmbeddedHistory::isLocked(std::uint64_t number) {
+    const OwnedDescriptor file(open((registry_.path() + "-runs").c_str(), O_RDONLY | O_CLOEXEC));
+    struct flock lock = byteOf(number);
+    lock.l_type = F_WRLCK;
+    return file && fcntl(file.get(), F_OFD_GETLK, &lock) == 0 && lock.l_type != F_UNLCK;
+}
+
+// Without an error: what the run was to do is done, and an entry that cannot be ended is seen as interrupted.
+void EmbeddedHistory::end(Status status) {
+    const bool isEnded = !start_.startsPrograms && status == kSuccess;
+    if (number_ != 0 && (!isEnded || counts_.isEmpty())) {
+        registry_.useQuietly([&](sqlite3* connection) {
+            // All of it may have been taken back by a later part.
+            Once remove(connection, "DELETE FROM run WHERE number = ?");
+            Once update(connection, "UPDATE run SET status = ?, ended = unixepoch(), outside = ? WHERE number = ?");
+            const std::string outside = joined(outside_);
+            const auto number = static_cast<std::int64_t>(number_);
+            return counts_.isEmpty() ? remove.query().bind(number).step()
+                                     : update.query().bind(static_cast<std::int64_t>(status)).bind(std::string_view(outside)).bind(number)
+                                           .step();
+        });
+    }
+    number_ = 0;
+    locks_.reset();
+}
+
+Status EmbeddedHistory::list(std::vector<HistoryRun>& runs) {
+    std::vector<HistoryRun> found;
+    const Status status = registry_.use([&](sqlite3* connection) {
+        if (!hasTables(connection)) {
+            return SQLITE_OK;
+        }
+        Once all(connection,
+                 "SELECT number, parent, undoes, begun, ended, status, user, host, program, arguments, outside, nvalues,"
+                 " nkeys, nservices, status IS NULL FROM run ORDER BY number");
+        int result = 0;
+        while ((result = all.query().step()) == SQLITE_ROW) {
+            found.push_back(runOf(all.query()));
+        }
+        return result == SQLITE_DONE ? SQLITE_OK : result;
+    });
+    for (HistoryRun& run : found) {
+        if (run.state == RunState::interrupted && isLocked(run.number)) {
+            run.state = RunState::running;
+        }
+    }
+    if (status == kSuccess) {
+        runs = std::move(found);
+    }
+    return status;
+}
+
+Status EmbeddedHistory::read(std::uint64_t number, HistoryChanges& changes) {
+    HistoryChanges found;
+    const Status status = registry_.use([&](sqlite3* connection) {
+        Once parts(connection,
+                   "SELECT changes FROM runpart WHERE id >= (SELECT firstpart FROM run WHERE number = ?1) AND run = ?1"
+                   " ORDER BY id");
+        int result = 0;
+        parts.query().bind(static_cast<std::int64_t>(number));
+        while ((result = parts.query().step()) == SQLITE_ROW) {
+            found.parts.emplace_back(parts.query().bytes(0));
+        }
+        return result == SQLITE_DONE ? SQLITE_OK : result;
+    });
+    if (status == kSuccess) {
+        changes = std::move(found);
+    }
+    return status;
+}
+
+Status EmbeddedHistory::trim(std::uint64_t number) {
+    return registry_.use([&](sqlite3* connection) {
+        return hasTables(connection) ? removeBefore(connection, static_cast<std::int64_t>(number)) : SQLITE_OK;
+    });
+}
+
+}  // namespace kz7
