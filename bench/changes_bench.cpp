@@ -28,11 +28,11 @@ std::size_t ensure(IPlatform& platform, const std::vector<WantedCopy>& wanted) {
     MemoryConsole console;
     Ports ports = platform.ports();
     ports.console = &console;
-    RecordedPorts recorded(ports, true, true);
+    RecordedPorts recorded(ports, {.wholeServices = true, .holdsCommits = true});
     Ensurer ensurer(recorded.ports(), true, {});
     require(ensurer.plan(wanted).empty() && ensurer.make(wanted) == kSuccess);
     const std::size_t changes = recorded.changes().size();
-    require(platform.registry().commit() == kSuccess);
+    require(recorded.commit() == kSuccess);
     return changes;
 }
 

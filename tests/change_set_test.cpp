@@ -128,6 +128,36 @@ Snapshot snapshotOf(IRegistryStore& registry) {
     return snapshot;
 }
 
+// Keeps what it is given.
+class KeptHistory final : public IHistory {
+public:
+    explicit KeptHistory(bool takesEach) : takesEach_(takesEach) {}
+
+    bool isOn() override { return true; }
+    Status turn(bool) override { return kSuccess; }
+    void begin(const HistoryStart&) override {}
+    bool takesEachChange() override { return takesEach_; }
+    Status append(std::string_view part) override {
+        EXPECT_TRUE(rows.add(part));
+        return kSuccess;
+    }
+    Status settle(const ChangeCounts& given) override {
+        counts = given;
+        return kSuccess;
+    }
+    void note(std::string_view) override {}
+    void end(Status) override {}
+    Status list(std::vector<HistoryRun>&) override { return kSuccess; }
+    Status read(std::uint64_t, HistoryChanges&) override { return kSuccess; }
+    Status trim(std::uint64_t) override { return kSuccess; }
+
+    TouchedRows rows;
+    ChangeCounts counts;
+
+private:
+    bool takesEach_;
+};
+
 TEST(ChangeSet, IsTheSameRecordedForetoldAndSeenAfterwards) {
     for (unsigned seed = 0; seed < 1500; ++seed) {
         RandomMachine machine(seed);
@@ -152,8 +182,11 @@ TEST(ChangeSet, IsTheSameRecordedForetoldAndSeenAfterwards) {
         EXPECT_EQ(exportAll(machine.registry_), exported) << "a preview changed something";
 
         ChangeSet recorded;
+        KeptHistory history(seed % 2 == 0);
         {
-            RecordedPorts ports(machine.ports(), {.wholeServices = true});
+            Ports real = machine.ports();
+            real.history = &history;
+            RecordedPorts ports(real, {.wholeServices = true});
             runTool(ports.ports(), arguments);
             EXPECT_EQ(ports.status(), kSuccess);
             recorded = ports.changes();
@@ -161,17 +194,29 @@ TEST(ChangeSet, IsTheSameRecordedForetoldAndSeenAfterwards) {
         const std::string seen = jsonOf(difference(before, snapshotOf(machine.registry_)));
         ASSERT_EQ(jsonOf(recorded), seen);
         ASSERT_EQ(jsonOf(foretold), seen);
+        ASSERT_EQ(jsonOf(history.rows.changes()), seen);
+        const ChangeCounts counts = countChanges(recorded);
+        EXPECT_EQ(std::tie(history.counts.values, history.counts.keys, history.counts.services),
+                  std::tie(counts.values, counts.keys, counts.services));
+        const std::string after = exportAll(machine.registry_);
 
         const ChangeSet back = inverse(recorded);
         std::vector<const Change*> conflicts;
         EXPECT_EQ(findConflicts(machine.registry_, true, back, conflicts, key), kSuccess) << key;
         EXPECT_TRUE(conflicts.empty()) << conflicts.front()->key;
-        EXPECT_EQ(applyChangeSet(machine.registry_, nullptr, back, key), kSuccess) << key;
+        RecordedPorts undo(machine.ports(), {.wholeServices = true, .holdsCommits = true});
+        EXPECT_EQ(applyChangeSet(*undo.ports().registry, nullptr, back, key), kSuccess) << key;
         ASSERT_EQ(exportAll(machine.registry_), exported);
 
         // Taken back already, it cannot be taken back again.
         EXPECT_EQ(findConflicts(machine.registry_, true, back, conflicts, key), kSuccess);
         EXPECT_EQ(conflicts.empty(), back.empty());
+
+        const ChangeSet redo = inverse(undo.changes());
+        EXPECT_EQ(findConflicts(machine.registry_, true, redo, conflicts = {}, key), kSuccess);
+        EXPECT_TRUE(conflicts.empty());
+        EXPECT_EQ(applyChangeSet(machine.registry_, nullptr, redo, key), kSuccess) << key;
+        ASSERT_EQ(exportAll(machine.registry_), after);
     }
 }
 
@@ -190,7 +235,7 @@ TEST(ChangeSet, IsRecordedWhateverFails) {
         std::string reached;  // by the runs that succeeded
         const auto ensure = [&](FaultyMachine& machine) {
             before = snapshotOf(machine.registry_);
-            RecordedPorts ports(machine.ports(), true, true);
+            RecordedPorts ports(machine.ports(), {.wholeServices = true, .holdsCommits = true});
             Ensurer ensurer(ports.ports(), true, {.services = true});
             const std::string refusal = ensurer.plan(wanted);
             const Status status = refusal.empty() ? ensurer.make(wanted) : kFailed;

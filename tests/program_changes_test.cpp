@@ -310,6 +310,36 @@ TEST_F(ChangesProgram, JsonFieldsAreThoseOfThePage) {
         page += cell;
     }
     EXPECT_EQ(names(printed, std::regex("[{,\n]\"([A-Za-z0-9]+)\":")), names(page, std::regex("`(\\w+)`")));
+TEST_F(ChangesProgram, TakeRunsBackAndDoThemAgain) {
+    const auto state = [&] { return store_.run("kz7admin", {"export"}).output; };
+    expect({"history"}, "|kz7admin: no run is recorded: registry.db\n|1");
+    ASSERT_EQ(store_.tool(kAddFirst).exitCode, 0);
+    ASSERT_EQ(store_.tool(kAddFirst).exitCode, 0);  // changes nothing
+    const std::string first = state();
+    ASSERT_EQ(store_.tool({"-v9", KZ7_SAMPLE}).exitCode, 0);
+    const std::string second = state();
+    expect({"undo", "1"},
+           "! HKLM\\SYSTEM\\CurrentControlSet\\Services\\EventLog\\Application\\KZ7 Management Service "
+           "\"EventMessageFile\"\n! HKLM\\SYSTEM\\CurrentControlSet\\Services\n"
+           "! HKLM\\SOFTWARE\\Wow6432Node\\NVQ\\KZ7\\InstalledCopies\n"
+           "! HKLM\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies\n! HKLM\\SOFTWARE\\NVQ\nunchanged\n"
+           "|kz7admin: cannot take back run 1: its rows were changed since\n|1");
+    EXPECT_EQ(state(), second);
+    expect({"diff", "--stat", "@2", "."}, "differ: 45 values, 20 keys, 1 service\n||1");
+    EXPECT_TRUE(told({"undo", "2", "--check"}).ends_with("would change: 45 values, 20 keys, 1 service\n||0"));
+    EXPECT_EQ(state(), second);
+    EXPECT_TRUE(told({"undo", "2"}).starts_with("! not taken back: ran \"" KZ7_SAMPLE));
+    EXPECT_EQ(state(), first);
+    EXPECT_TRUE(told({"undo", "2"}).ends_with("unchanged\n|kz7admin: cannot take back run 2: run 3 took it back\n|1"));
+    EXPECT_EQ(store_.run("kz7admin", {"undo", "3"}).exitCode, 0);
+    EXPECT_EQ(state(), second);
+    expect({"diff", "@3", "."}, "||0");
+    expect({"undo", "9"}, "|kz7admin: no such run: 9 (see kz7admin history)\n|1");
+    expect({"history", "trim", "--keep", "1", "--check"}, "would remove: 3 runs\n||0");
+    expect({"history", "trim", "--keep", "1"}, "removed: 3 runs\n||0");
+    expect({"diff", "@3", "."}, "|kz7admin: no such run: 3 (see kz7admin history)\n|1");
+    ASSERT_EQ(store_.tool({"-removeKZ7Copy", "FIRST"}).exitCode, 0);
+    EXPECT_NE(told({"history", "FIRST"}).find("5    "), std::string::npos);
 }
 
 TEST_F(ChangesProgram, BadInputIsOneLineAndChangesNothing) {

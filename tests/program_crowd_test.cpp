@@ -137,6 +137,8 @@ const KilledFlow kFlows[] = {
     {"import", {kAddFirst}, {"import", kRegistry}},
     {"repair", {kAddFirst, {"import", kDamage}}, {"repair", "aliases", "copies", "services"}},
     {"restoreADamagedStore", {kAddFirst}, {"restore", kRegistry}, true},
+    {"undo", {kAddFirst, kAddSecond}, {"undo", "2"}},
+    {"undoOfAMigration", {{"-v8", "C:\\KZ8"}, {"-v9", kSample}}, {"undo", "2"}},
 };
 
 // Two commands at once leave what one after the other leaves, in one of the two orders.
@@ -186,7 +188,7 @@ std::set<std::string> statesOfChildren(const StateDirectory& start, const Argume
     EXPECT_EQ(state.tool(command, {{hook}, {}}).exitCode, 0);
     std::set<std::string> states;
     for (const auto& entry : std::filesystem::directory_iterator(seen.path())) {
-        states.insert(StateDirectory::dumpOf(entry.path()));
+        states.insert(StateDirectory::wholeOf(entry.path()));
     }
     return states;
 }
@@ -205,10 +207,10 @@ protected:
         const auto begun = std::chrono::steady_clock::now();
         ASSERT_EQ(done_.tool(flow_.command).exitCode, 0);
         usual_ = std::chrono::steady_clock::now() - begun;
-        after_ = done_.dump();
-        ASSERT_NE(start_.dump(), after_);
+        after_ = StateDirectory::wholeOf(done_.path());
+        ASSERT_NE(StateDirectory::wholeOf(start_.path()), after_);
         unfinished_ = statesOfChildren(start_, flow_.command);
-        unfinished_.insert(start_.dump());
+        unfinished_.insert(StateDirectory::wholeOf(start_.path()));
         unfinished_.erase(after_);
     }
 
@@ -237,7 +239,7 @@ TEST_P(Kills, LeaveAStateThatWasCommitted) {
         kill(child, SIGKILL);
         int status = 0;
         waitpid(child, &status, 0);
-        const std::string found = state.dump();
+        const std::string found = StateDirectory::wholeOf(state.path());
         killed += WIFSIGNALED(status) ? 1 : 0;
         EXPECT_TRUE(found == after_ || (WIFSIGNALED(status) && unfinished_.contains(found)))
             << "round " << round << found;
@@ -270,7 +272,7 @@ TEST_P(Kills, FailedCallsLeaveTheStateThatTheExitCodeTells) {
                                                 "KZ7_FAIL_AT=" + std::to_string(call), "KZ7_FAIL_FOR_GOOD=" + forGood},
                                                {}});
                 failed = result.error.find("a call fails\n") != std::string::npos;
-                const std::string found = state.dump();
+                const std::string found = StateDirectory::wholeOf(state.path());
                 const bool isLate = (kind == "malloc" || (flow_.isDamaged && kind == "sync")) && found == after_;
                 EXPECT_TRUE(result.exitCode == 0 ? found == after_ : failed && (unfinished_.contains(found) || isLate))
                     << row << ": " << result.exitCode << found << result.error;

@@ -9,6 +9,7 @@
 #include <thread>
 
 #include "install/platform/intercept/ports.h"
+#include "install/platform/windows/run_journal.h"
 #include "install/src/registry/key_walk.h"
 #include "install/src/registry/registry_access.h"
 #include "install/src/services/management_service.h"
@@ -268,6 +269,40 @@ TEST_F(OnWindows, ProgramsThatChangeSomethingHaveTheirTurns) {
     EXPECT_EQ(open(), kSuccess);
     key.reset();
     EXPECT_EQ(other->registry().commit(), kSuccess);
+}
+
+// However a journal is cut or changed, what is read of it is what was written, or nothing.
+TEST(RunJournal, IsReadAsItWasWritten) {
+    HistoryRun run;
+    run.program = "kz7InstallReg";
+    run.arguments = {"-v9", "C:\\a b"};
+    JournalWriter writer;
+    std::string journal = journalHead(writer, run, "this");
+    const std::vector<std::string> parts = {"first", std::string("se\0ond", 6), std::string(300, 'x')};
+    for (const std::string& part : parts) {
+        journal += writer.record(JournalRecord::change, part);
+    }
+    journal += journalEnd(writer, 7, 1000, {1, 2, 3});
+    const auto isPrefix = [&](const HistoryChanges& changes) {
+        return changes.parts.size() <= parts.size() &&
+               std::equal(changes.parts.begin(), changes.parts.end(), parts.begin());
+    };
+    HistoryRun read;
+    HistoryChanges changes;
+    ASSERT_EQ(readJournal(journal, "this", read, changes), kSuccess);
+    EXPECT_EQ(changes.parts, parts);
+    EXPECT_EQ(read.arguments, run.arguments);
+    EXPECT_EQ(read.status, 7U);
+    EXPECT_FALSE(read.isForeign || changes.isLastUncertain);
+    for (std::size_t at = 0; at < journal.size(); ++at) {
+        const Status torn = readJournal(journal.substr(0, at), "that", read, changes);
+        EXPECT_TRUE(isPrefix(changes) && torn == (changes.parts.empty() ? kFileNotFound : kSuccess)) << at;
+        EXPECT_TRUE(changes.isLastUncertain && (torn != kSuccess || read.isForeign)) << at;
+        std::string changed = journal;
+        changed[at] = static_cast<char>(changed[at] ^ 1);
+        const Status status = readJournal(changed, "this", read, changes);
+        EXPECT_TRUE(isPrefix(changes) && (status == kInvalidData || changes.isLastUncertain)) << at;
+    }
 }
 
 }  // namespace

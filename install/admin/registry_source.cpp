@@ -1,9 +1,11 @@
 #include "install/admin/registry_source.h"
 
+#include <charconv>
 #include <filesystem>
 
 #include "install/admin/formats/reg_text.h"
 #include "install/admin/input_file.h"
+#include "install/admin/run_history.h"
 #include "install/platform/registry_path.h"
 #include "install/platform/text.h"
 
@@ -19,6 +21,12 @@ Answer RegistrySource::open() {
         registry_ = &admin_.registry();
         isOwn_ = admin_.platform().storeIsOwn();
         return kAnswerYes;
+    }
+    if (std::uint64_t number = 0; place_.starts_with('@')) {
+        const char* const end = place_.data() + place_.size();
+        const auto [stop, error] = std::from_chars(place_.data() + 1, end, number);
+        return error == std::errc{} && stop == end ? openBefore(number)
+                                                   : admin_.fault("not a run: " + shownText(place_));
     }
     if (std::error_code ignored; std::filesystem::is_directory(place_, ignored)) {
         return openStore({.program = "kz7admin", .stateDirectory = place_, .readOnly = true, .ownProcess = false});
@@ -40,6 +48,38 @@ Answer RegistrySource::open() {
     registry_ = &memory_;
     return status == kSuccess ? kAnswerYes
                               : admin_.fault(compose("cannot read: %s:%u: error %u", {file.shown(), line, status}));
+}
+
+// Takes the runs back in memory, the last one first.
+Answer RegistrySource::openBefore(std::uint64_t number) {
+    isOwn_ = admin_.platform().storeIsOwn();
+    registry_ = &admin_.registry();
+    HistoryRun run;
+    std::vector<HistoryRun> runs;
+    Snapshot now;
+    Answer answer = findRun(admin_, number, run);
+    answer = answer == kAnswerYes ? listRuns(admin_, runs) : answer;
+    answer = answer == kAnswerYes ? (isOwn_ ? read({}, true, now) : readProduct(false, now)) : answer;
+    if (answer != kAnswerYes) {
+        return answer;
+    }
+    registry_ = &memory_;
+    std::string key;
+    Status status = applyChangeSet(memory_, nullptr, difference({}, now), key);
+    for (auto each = runs.rbegin(); status == kSuccess && each != runs.rend() && each->number >= number; ++each) {
+        ChangeSet changes;
+        std::vector<const Change*> conflicts;
+        answer = readInverse(admin_, *each, changes);
+        status = answer == kAnswerYes ? findConflicts(memory_, isOwn_, changes, conflicts, key) : kSuccess;
+        if (answer != kAnswerYes || !conflicts.empty()) {
+            return answer != kAnswerYes
+                       ? answer
+                       : admin_.no("the history does not reach back to run " + std::to_string(number) +
+                                   ": other programs changed what run " + std::to_string(each->number) + " changed");
+        }
+        status = applyChangeSet(memory_, nullptr, changes, key);
+    }
+    return status == kSuccess ? kAnswerYes : admin_.storeFault("cannot go back: " + shownText(key), status);
 }
 
 Answer RegistrySource::openStore(const PlatformOptions& options) {

@@ -1,4 +1,5 @@
-// What a command line can name as a registry: "." for this machine's store, the state directory of another store, a
+// What a command line can name as a registry: "." for this machine's store, "@N" for it as it was before run N of the
+// history, the state directory of another store, a
 // backup, or a file of registry-editor text. Errors are reported here.
 #pragma once
 
@@ -32,6 +33,7 @@ public:
     Answer readProduct(bool wholeServices, Snapshot& snapshot);
 
 private:
+    Answer openBefore(std::uint64_t number);
     Answer openStore(const PlatformOptions& options);
     Answer readFrom(const std::vector<KeyStart>& starts, Status found, bool wholeServices, Snapshot& snapshot);
 

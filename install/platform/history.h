@@ -89,4 +89,8 @@ public:
     virtual Status trim(std::uint64_t number) = 0;
 };
 
+// Texts in one, each with a NUL behind it, for the implementations.
+std::string joinTexts(const std::vector<std::string>& texts);
+std::vector<std::string> splitTexts(std::string_view all);
+
 }  // namespace kz7

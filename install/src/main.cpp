@@ -15,8 +15,8 @@ int kz7::programMain(int argc, char** argv) {
             history->begin({.program = "kz7InstallReg",
                             .arguments = {arguments.begin() + (argc == 0 ? 0 : 1), arguments.end()},
                             .startsPrograms = startsPrograms(arguments)});
-            const RecordedPorts recorded(platform->ports(), {.wholeServices = platform->storeIsOwn()});
-            status = runTool(recorded.ports(), arguments);
+            status =
+                runTool(RecordedPorts(platform->ports(), {.wholeServices = platform->storeIsOwn()}).ports(), arguments);
             history->end(status);
         } else {
             status = runTool(platform->ports(), arguments);

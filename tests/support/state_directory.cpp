@@ -4,6 +4,7 @@
 
 #include <filesystem>
 
+#include "install/platform/embedded/history.h"
 #include "install/platform/embedded/registry.h"
 #include "tests/support/registry_dump.h"
 
@@ -26,6 +27,17 @@ std::string StateDirectory::dumpOf(const std::string& folder) {
                               [&](const StoreFault& fault) { faults += "fault: " + fault.reason + "\n"; });
     std::string text = dumpRegistry(registry);
     return faults + text;
+}
+
+std::string StateDirectory::wholeOf(const std::string& folder) {
+    std::string text = dumpOf(folder);
+    EmbeddedRegistry registry(folder, true, [](const StoreFault&) {});
+    std::vector<HistoryRun> runs;
+    EmbeddedHistory(registry).list(runs);
+    for (const HistoryRun& run : runs) {
+        text += "run " + std::to_string(run.number) + ": " + std::to_string(run.counts.values) + " values\n";
+    }
+    return text;
 }
 
 std::string StateDirectory::integrity() const {

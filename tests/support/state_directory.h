@@ -38,6 +38,9 @@ public:
     static std::string dumpOf(const std::string& folder);
     std::string dump() const { return dumpOf(path()); }
 
+    // The same with the runs of its history.
+    static std::string wholeOf(const std::string& folder);
+
     // The result of SQLite's integrity check.
     std::string integrity() const;
 

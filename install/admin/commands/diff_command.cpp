@@ -75,7 +75,7 @@ void addDiffCommand(CLI::App& program, Admin& admin) {
     auto options = std::make_shared<DiffOptions>();
     command->footer(
         "A and B are each a state directory, a backup, a file of registry-editor text,\n"
-        "or \".\" for this machine.\n"
+        "\".\" for this machine, or \"@N\" for this machine before run N of its history.\n"
         "\n"
         "Exit codes: 0 they are the same; 1 they differ; 2 one cannot be read.\n");
     command->add_option("A", options->before, "The registry before")->required();

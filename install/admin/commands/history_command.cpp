@@ -18,7 +18,9 @@ struct HistoryOptions {
     std::string copy;
     std::uint64_t number = 0;
     std::uint64_t keep = 0;
-    std::string before;
+    std::string before;  // a date; empty: `keep` counts
+    bool check = false;
+    bool on = false;
     bool json = false;
     bool diff = false;
     bool reg = false;
@@ -55,8 +57,7 @@ std::string runsText(const std::vector<HistoryRun>& runs, std::uint32_t columns)
     std::vector<TableRow> table = {{"RUN", "TIME", "USER", "COMMAND", "STATUS", "ROWS"}};
     for (const HistoryRun& run : runs) {
         table.push_back({std::to_string(run.number), utcTime(run.begun), shownText(run.user), commandOf(run),
-                         stateOf(run),
-                         std::to_string(run.counts.values + run.counts.keys + run.counts.services)});
+                         stateOf(run), std::to_string(run.counts.values + run.counts.keys + run.counts.services)});
     }
     return tableText(table, columns);
 }
@@ -126,6 +127,83 @@ Answer showOne(Admin& admin, const HistoryOptions& options) {
     return admin.write(json + "}\n", Admin::Form::document);
 }
 
+// The number of the first run that stays.
+std::uint64_t firstLeft(const std::vector<HistoryRun>& runs, const HistoryOptions& options) {
+    const auto first = std::find_if(runs.begin(), runs.end(), [&](const HistoryRun& run) {
+        const auto left = static_cast<std::uint64_t>(&runs.back() - &run) + 1;
+        return options.before.empty() ? left <= options.keep : utcTime(run.begun) >= options.before;
+    });
+    return first == runs.end() ? runs.back().number + 1 : first->number;
+}
+
+Answer trim(Admin& admin, const HistoryOptions& options) {
+    std::vector<HistoryRun> runs;
+    if (!admin.open(options.check, true)) {
+        return kAnswerFault;
+    }
+    if (const Answer listed = listRuns(admin, runs); listed != kAnswerYes) {
+        return listed;
+    }
+    const std::uint64_t first = runs.empty() ? 0 : firstLeft(runs, options);
+    const auto removed = static_cast<std::uint32_t>(
+        std::count_if(runs.begin(), runs.end(), [first](const HistoryRun& run) { return run.number < first; }));
+    Status status = kSuccess;
+    if (removed != 0 && !options.check) {
+        status = admin.platform().history()->trim(first);
+        const Status committed = admin.registry().commit();
+        status = status == kSuccess ? committed : status;
+    }
+    if (status != kSuccess) {
+        return admin.storeFault("cannot trim the history", status);
+    }
+    if (options.json) {
+        return admin.write(compose("{\"schema\":1,\"check\":%s,\"changed\":%s,\"removed\":%u}\n",
+                                   {options.check ? "true" : "false", removed == 0 ? "false" : "true", removed}),
+                           Admin::Form::document);
+    }
+    return admin.write(removed == 0 ? "unchanged\n"
+                                    : compose("%s: %u run%s\n", {options.check ? "would remove" : "removed", removed,
+                                                                 removed == 1 ? "" : "s"}));
+}
+
+Answer turn(Admin& admin, const HistoryOptions& options) {
+    if (!admin.open(false)) {
+        return kAnswerFault;
+    }
+    IHistory* const history = admin.platform().history();
+    const bool wasOn = history->isOn();
+    const Status status = history->turn(options.on);
+    if (status == kCallNotImplemented && !options.on) {
+        return admin.no("the history is part of the store and always on");
+    }
+    if (status != kSuccess && status != kCallNotImplemented) {
+        return admin.storeFault(
+            options.on ? "cannot start the history in %ProgramData%\\KZ7\\history, which only administrators may own"
+                       : "cannot stop the history",
+            status);
+    }
+    if (options.json) {
+        return admin.write(compose("{\"schema\":1,\"changed\":%s,\"on\":%s}\n",
+                                   {wasOn != options.on ? "true" : "false", options.on ? "true" : "false"}),
+                           Admin::Form::document);
+    }
+    return admin.write(status == kCallNotImplemented ? "the history is always on\n"
+                       : options.on                  ? "the history is on\n"
+                                                     : "the history is off\n");
+}
+
+CLI::Validator isDate() {
+    return {[](const std::string& text) {
+                constexpr std::string_view kForm = "dddd-dd-ddTdd:dd:ddZ";
+                bool fits = text.size() == 10 || text.size() == kForm.size();
+                for (std::size_t at = 0; fits && at < text.size(); ++at) {
+                    fits = kForm[at] == 'd' ? text[at] >= '0' && text[at] <= '9' : text[at] == kForm[at];
+                }
+                return fits ? "" : "not a date of the form 2026-01-31 or 2026-01-31T12:00:00Z";
+            },
+            {}};
+}
+
 void answerWith(CLI::App* command, Admin& admin, const std::shared_ptr<HistoryOptions>& options,
                 Answer (*function)(Admin&, const HistoryOptions&)) {
     command->callback([&admin, options, function] {
@@ -151,6 +229,29 @@ void addHistoryCommand(CLI::App& program, Admin& admin) {
     show->add_flag("--reg", options->reg, "Write its changes as registry-editor text")->excludes(diff);
     show->add_flag("--json", options->json, "Write JSON for programs")->excludes(diff);
     answerWith(show, admin, options, showOne);
+
+    auto* trimmed = command->add_subcommand("trim", "Remove the oldest runs from the history");
+    auto* keep = trimmed->add_option("--keep", options->keep, "Keep that many runs");
+    auto* before = trimmed->add_option("--before", options->before, "Keep the runs since a date (UTC)");
+    before->check(isDate())->excludes(keep);
+    trimmed->add_flag("--check", options->check, "Change nothing; tell what would be removed");
+    trimmed->add_flag("--json", options->json, "Write JSON for programs");
+    trimmed->callback([&admin, options, keep, before] {
+        if (keep->empty() && before->empty()) {
+            throw CLI::RequiredError("--keep or --before");
+        }
+        admin.answer = [&admin, options] { return trim(admin, *options); };
+    });
+
+    for (const bool on : {true, false}) {
+        auto* switched = command->add_subcommand(
+            on ? "start" : "stop", on ? "Record runs from now on (Windows)" : "Record no more runs (Windows)");
+        switched->add_flag("--json", options->json, "Write JSON for programs");
+        switched->callback([&admin, options, on] {
+            options->on = on;
+            admin.answer = [&admin, options] { return turn(admin, *options); };
+        });
+    }
 }
 
 }  // namespace kz7

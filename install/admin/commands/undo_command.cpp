@@ -1,4 +1,5 @@
 #include <CLI/CLI.hpp>
+#include <algorithm>
 
 #include "install/admin/change_report.h"
 #include "install/admin/commands/commands.h"
@@ -35,11 +36,20 @@ Answer addNotes(Admin& admin, const HistoryRun& run, ChangeRun& shown) {
     return listed;
 }
 
+// What changed the rows of a run since it ended.
+std::string since(Admin& admin, std::uint64_t number) {
+    std::vector<HistoryRun> runs;
+    listRuns(admin, runs);
+    const auto later =
+        std::find_if(runs.rbegin(), runs.rend(), [number](const HistoryRun& run) { return run.undoes == number; });
+    return later == runs.rend() ? "its rows were changed since"
+                                : "run " + std::to_string(later->number) + " took it back";
+}
+
 Answer takeBack(Admin& admin, const UndoOptions& options, const ChangeSet& changes) {
     const bool isOwn = admin.platform().storeIsOwn();
     admin.beginRun(false, options.number);
-    RecordedPorts recorded(admin.platform().ports(),
-                           {.wholeServices = isOwn, .holdsCommits = true, .everyKey = true});
+    RecordedPorts recorded(admin.platform().ports(), {.wholeServices = isOwn, .holdsCommits = true, .everyKey = true});
     std::string key;
     Status status =
         applyChangeSet(*recorded.ports().registry, isOwn ? nullptr : recorded.ports().services, changes, key);
@@ -66,8 +76,7 @@ Answer undo(Admin& admin, const UndoOptions& options) {
     }
     std::vector<const Change*> conflicts;
     std::string key;
-    const Status status =
-        findConflicts(admin.registry(), admin.platform().storeIsOwn(), shown.changes, conflicts, key);
+    const Status status = findConflicts(admin.registry(), admin.platform().storeIsOwn(), shown.changes, conflicts, key);
     if (status != kSuccess) {
         return admin.storeFault("cannot read: " + shownText(key), status);
     }
@@ -77,7 +86,7 @@ Answer undo(Admin& admin, const UndoOptions& options) {
         }
         shown.changes.clear();
         shown.notes.clear();
-        admin.tell("cannot take back run " + std::to_string(run.number) + ": its rows were changed since");
+        admin.tell("cannot take back run " + std::to_string(run.number) + ": " + since(admin, run.number));
         return showRun(admin, options, shown);
     }
     if (!options.check) {

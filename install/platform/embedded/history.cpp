@@ -18,8 +18,8 @@ constexpr const char* kRunVariable = "KZ7_RUN";  // for the programs that a run 
 constexpr std::int64_t kMostRuns = 1000;
 constexpr std::int64_t kMostBytes = std::int64_t{256} << 20;
 
-// A run's status is null until it has ended. The parts of a run are found from its first one on; `total` counts the bytes
-// of all parts up to and with that one. Older programs ignore these tables.
+// A run's status is null until it has ended. The parts of a run are found from its first one on; `total` counts the
+// bytes of all parts up to and with that one. Older programs ignore these tables.
 constexpr const char* kTables =
     "CREATE TABLE IF NOT EXISTS run (number INTEGER PRIMARY KEY AUTOINCREMENT, parent INTEGER NOT NULL,"
     " undoes INTEGER NOT NULL, begun INTEGER NOT NULL, ended INTEGER NOT NULL, status INTEGER, user TEXT NOT NULL,"
@@ -45,23 +45,6 @@ private:
     Statement statement_;
     Query query_;
 };
-
-// Texts in one, each with a NUL behind it: no argument holds one.
-std::string joined(const std::vector<std::string>& texts) {
-    std::string all;
-    for (const std::string& text : texts) {
-        all.append(text).append(1, '\0');
-    }
-    return all;
-}
-
-std::vector<std::string> split(std::string_view all) {
-    std::vector<std::string> texts;
-    for (std::size_t end = 0; (end = all.find('\0')) != std::string_view::npos; all.remove_prefix(end + 1)) {
-        texts.emplace_back(all.substr(0, end));
-    }
-    return texts;
-}
 
 // Only the number is written: looking the name up takes longer than the whole run.
 std::string userName(std::string_view number) {
@@ -103,8 +86,8 @@ HistoryRun runOf(const Query& row) {
     run.user = userName(row.bytes(6));
     run.host = row.bytes(7);
     run.program = row.bytes(8);
-    run.arguments = split(row.bytes(9));
-    run.outside = split(row.bytes(10));
+    run.arguments = splitTexts(row.bytes(9));
+    run.outside = splitTexts(row.bytes(10));
     run.counts = {static_cast<std::size_t>(row.number(11)), static_cast<std::size_t>(row.number(12)),
                   static_cast<std::size_t>(row.number(13))};
     run.state = row.number(14) == 0 ? RunState::ended : RunState::interrupted;
@@ -190,12 +173,13 @@ int EmbeddedHistory::write(sqlite3* connection, const ChangeCounts& counts) {
 }
 
 int EmbeddedHistory::addRun(sqlite3* connection) {
-    Once add(connection,
-             "INSERT INTO run (parent, undoes, begun, ended, user, host, program, arguments, outside, nvalues, nkeys,"
-             " nservices, firstpart) SELECT ?, ?, ?, 0, ?, ?, ?, ?, '', 0, 0, 0, coalesce(max(id), 0) + 1 FROM runpart");
+    Once add(
+        connection,
+        "INSERT INTO run (parent, undoes, begun, ended, user, host, program, arguments, outside, nvalues, nkeys,"
+        " nservices, firstpart) SELECT ?, ?, ?, 0, ?, ?, ?, ?, '', 0, 0, 0, coalesce(max(id), 0) + 1 FROM runpart");
     const std::string user = std::to_string(geteuid());
     const std::string host = hostName();
-    const std::string arguments = joined(start_.arguments);
+    const std::string arguments = joinTexts(start_.arguments);
     const int result = add.query()
                            .bind(static_cast<std::int64_t>(parentOf(connection)))
                            .bind(static_cast<std::int64_t>(start_.undoes))
@@ -226,7 +210,7 @@ int EmbeddedHistory::writeRun(sqlite3* connection, const ChangeCounts& counts, b
                       " WHERE number = ?"
                     : "UPDATE run SET nvalues = ?, nkeys = ?, nservices = ?, outside = ?, ended = unixepoch(),"
                       " status = 0 WHERE number = ?");
-    const std::string outside = joined(outside_);
+    const std::string outside = joinTexts(outside_);
     const int result = update.query()
                            .bind(static_cast<std::int64_t>(counts.values))
                            .bind(static_cast<std::int64_t>(counts.keys))
@@ -267,10 +251,13 @@ void EmbeddedHistory::end(Status status) {
             // All of it may have been taken back by a later part.
             Once remove(connection, "DELETE FROM run WHERE number = ?");
             Once update(connection, "UPDATE run SET status = ?, ended = unixepoch(), outside = ? WHERE number = ?");
-            const std::string outside = joined(outside_);
+            const std::string outside = joinTexts(outside_);
             const auto number = static_cast<std::int64_t>(number_);
             return counts_.isEmpty() ? remove.query().bind(number).step()
-                                     : update.query().bind(static_cast<std::int64_t>(status)).bind(std::string_view(outside)).bind(number)
+                                     : update.query()
+                                           .bind(static_cast<std::int64_t>(status))
+                                           .bind(std::string_view(outside))
+                                           .bind(number)
                                            .step();
         });
     }
@@ -284,9 +271,10 @@ Status EmbeddedHistory::list(std::vector<HistoryRun>& runs) {
         if (!hasTables(connection)) {
             return SQLITE_OK;
         }
-        Once all(connection,
-                 "SELECT number, parent, undoes, begun, ended, status, user, host, program, arguments, outside, nvalues,"
-                 " nkeys, nservices, status IS NULL FROM run ORDER BY number");
+        Once all(
+            connection,
+            "SELECT number, parent, undoes, begun, ended, status, user, host, program, arguments, outside, nvalues,"
+            " nkeys, nservices, status IS NULL FROM run ORDER BY number");
         int result = 0;
         while ((result = all.query().step()) == SQLITE_ROW) {
             found.push_back(runOf(all.query()));

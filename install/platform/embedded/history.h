@@ -34,7 +34,7 @@ private:
     HistoryStart start_;
     std::int64_t begun_ = 0;
     std::vector<std::string> outside_;
-    std::string part_;  // not written yet
+    std::string part_;          // not written yet
     std::uint64_t number_ = 0;  // 0: no entry was written
     ChangeCounts counts_;
     OwnedDescriptor locks_;  // holds the lock of the run

@@ -20,9 +20,9 @@ public:
         : program_(options.program),
           // The library in an installer changes keys of one user only.
           lock_(options.ownProcess && !options.readOnly, [this] { tellBusy(); }) {
-        ports_ = {registry_.get(),   services_.get(),  console_.get(), debugOutput_.get(),
-                  files_.get(),      processes_.get(), threads_.get(), libraries_.get(),
-                  assemblies_.get(), host_.get(),      terminal_.get()};
+        ports_ = {registry_.get(),   services_.get(),  console_.get(),  debugOutput_.get(),
+                  files_.get(),      processes_.get(), threads_.get(),  libraries_.get(),
+                  assemblies_.get(), host_.get(),      terminal_.get(), history_.get()};
     }
 
     // In the user's profile, where no other user can place a file or a link first.
@@ -64,6 +64,7 @@ private:
     std::unique_ptr<IAssemblyCache> assemblies_ = windowsAssemblies(false);
     std::unique_ptr<IHostInformation> host_ = windowsHost();
     std::unique_ptr<ITerminal> terminal_ = windowsTerminal();
+    std::unique_ptr<IHistory> history_ = windowsHistory(*debugOutput_);
 };
 
 }  // namespace

@@ -23,5 +23,6 @@ std::unique_ptr<IAssemblyCache> windowsAssemblies(bool isPreview);
 
 std::unique_ptr<IHostInformation> windowsHost();
 std::unique_ptr<ITerminal> windowsTerminal();
+std::unique_ptr<IHistory> windowsHistory(IDebugOutput& debugOutput);
 
 }  // namespace kz7

@@ -307,15 +307,18 @@ Status ChangeRecorder::changeTree(const KeyName& name, bool isDeletion, const st
         return call();
     }
     beforeTree(name);
-    const bool isWritten = journal_ != nullptr && (isDeletion || !expected.empty());
-    if (isWritten) {
+    if (journal_ != nullptr && (isDeletion || !expected.empty())) {
         expectTree(name, isDeletion, expected);
     }
+    const std::vector<KeyName> missing = missing_;
     const Status status = call();
     // The key of a deleted service may stay for as long as a handle is open.
     afterTree(name, isDeletion && status == kSuccess);
-    if (isWritten) {
+    if (journal_ != nullptr) {
         std::vector<const Key*> keys;
+        for (auto key = missing.rbegin(); key != missing.rend(); ++key) {
+            keys.push_back(&note(*key, false));
+        }
         rows_.visitTree(fullKeyName(name), [&](const Key& key) { keys.push_back(&key); });
         write(keys, TouchedForm::whole);
     }
@@ -337,8 +340,8 @@ public:
         const KeyName name = nameOf(parent, path, access);
         Status status = real_.openKey(parent, path, access, key);
         if (isNotFound(status)) {
-            status = recorder_.createKey(
-                name, keyClass, [&] { return real_.createKey(parent, path, keyClass, access, key); });
+            status = recorder_.createKey(name, keyClass,
+                                         [&] { return real_.createKey(parent, path, keyClass, access, key); });
         } else if (status != kSuccess) {
             const Status unread = status;
             status = real_.createKey(parent, path, keyClass, access, key);

@@ -41,7 +41,8 @@ ChangeSet difference(const Snapshot& before, const Snapshot& after);
 ChangeSet inverse(const ChangeSet& changes);
 
 // The changes whose row is not in its state before any more. That of a removed key includes that it has no other values
-// and subkeys than those that are removed with it; the run state of a service does not count. On failure `key` names the key that cannot be read.
+// and subkeys than those that are removed with it; the run state of a service does not count. On failure `key` names
+// the key that cannot be read.
 Status findConflicts(IRegistryStore& registry, bool wholeServices, const ChangeSet& changes,
                      std::vector<const Change*>& conflicts, std::string& key);
 

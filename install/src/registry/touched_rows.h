@@ -86,7 +86,7 @@ public:
 private:
     void change(Key& key);
 
-    std::map<std::string, Key> keys_;             // by their place in a walk
+    std::map<std::string, Key> keys_;  // by their place in a walk
     std::map<std::string, Key>::iterator last_ = keys_.end();
     std::vector<Key*> changed_;
 };
