@@ -125,5 +125,96 @@ void bareWritesOfNewCopies(benchmark::State& state) {
 }
 BENCHMARK(bareWritesOfNewCopies)->Apply(sizes);
 
+// A version-8 registry with that many values below its profiles, a hundred to a key.
+void fillVersion8(IPlatform& platform, std::int64_t values) {
+    for (std::int64_t key = 0; key < values / 100; ++key) {
+        const std::string path =
+            "SOFTWARE\\NVQ\\KZ7\\PROFILES\\" + std::to_string(key / 30) + "\\P" + std::to_string(key);
+        OwnedKey opened(platform.registry());
+        require(platform.registry().createKey(KeyHandle::localMachine, path, {}, kKeySetValue, opened.receive()) ==
+                kSuccess);
+        for (std::int64_t value = 0; value < 100; ++value) {
+            require(platform.registry().setValue(opened.get(), "VALUE" + std::to_string(value), ValueType::sz,
+                                                 std::string_view("some text of a value\0", 21)) == kSuccess);
+        }
+    }
+    require(platform.registry().commit() == kSuccess);
+}
+
+Status runRecorded(IPlatform& platform, std::span<const char* const> arguments, bool isRecorded) {
+    MemoryConsole console;
+    Ports ports = platform.ports();
+    ports.console = &console;
+    if (!isRecorded) {
+        return runTool(ports, arguments);
+    }
+    platform.history()->begin(
+        {"kz7InstallReg", {arguments.begin() + 1, arguments.end()}, startsPrograms(arguments), 0});
+    const Status status = runTool(RecordedPorts(ports, {.wholeServices = true}).ports(), arguments);
+    platform.history()->end(status);
+    return status;
+}
+
+// With its record and without it, the floor.
+void migration(benchmark::State& state) {
+    const Scratch scratch;
+    fillVersion8(*platformOf(scratch), state.range(1));
+    const char* const v9[] = {"kz7InstallReg", "-v9", "C:\\KZ9"};
+    for (auto step : state) {
+        const std::unique_ptr<IPlatform> platform = platformOf(scratch);
+        runRecorded(*platform, v9, state.range(0) != 0);
+    }
+}
+BENCHMARK(migration)
+    ->ArgNames({"recorded", "values"})
+    ->ArgsProduct({{0, 1}, {100000}})
+    ->Iterations(1)
+    ->Repetitions(3)
+    ->Unit(benchmark::kMillisecond);
+
+// What undo does, with its own record; the floor is the recorded migration.
+void undoOfAMigration(benchmark::State& state) {
+    const Scratch scratch;
+    fillVersion8(*platformOf(scratch), state.range(0));
+    const char* const v9[] = {"kz7InstallReg", "-v9", "C:\\KZ9"};
+    runRecorded(*platformOf(scratch), v9, true);
+    for (auto step : state) {
+        const std::unique_ptr<IPlatform> platform = platformOf(scratch);
+        HistoryChanges kept;
+        require(platform->history()->read(1, kept) == kSuccess);
+        TouchedRows rows;
+        for (const std::string& part : kept.parts) {
+            require(rows.add(part));
+        }
+        const ChangeSet back = inverse(rows.changes());
+        std::vector<const Change*> conflicts;
+        std::string key;
+        require(findConflicts(platform->registry(), true, back, conflicts, key) == kSuccess && conflicts.empty());
+        platform->history()->begin({"kz7admin", {"undo", "1"}, false, 1});
+        RecordedPorts recorded(platform->ports(), {.wholeServices = true, .holdsCommits = true, .everyKey = true});
+        require(applyChangeSet(*recorded.ports().registry, nullptr, back, key) == kSuccess);
+        require(recorded.commit() == kSuccess);
+    }
+}
+BENCHMARK(undoOfAMigration)
+    ->ArgName("values")
+    ->Arg(100000)
+    ->Iterations(1)
+    ->Repetitions(3)
+    ->Unit(benchmark::kMillisecond);
+
+// An add of another location in an open store, with its record and without it.
+void addOfTheTool(benchmark::State& state) {
+    const Scratch scratch;
+    std::int64_t round = 0;
+    for (auto step : state) {
+        const std::unique_ptr<IPlatform> platform = platformOf(scratch);
+        const std::string location = "C:\\KZ7" + std::to_string(++round);
+        const char* const add[] = {"kz7InstallReg", "-addKZ7Copy", "COPY1", location.c_str()};
+        require(runRecorded(*platform, add, state.range(0) != 0) == kSuccess);
+    }
+}
+BENCHMARK(addOfTheTool)->ArgName("recorded")->Arg(0)->Arg(1)->Iterations(2000)->Unit(benchmark::kMicrosecond);
+
 }  // namespace
 }  // namespace kz7

@@ -297,6 +297,38 @@ at_once 'an add and the removal of the last copy'
 before=(-addKZ7Copy LAST 'C:\KZ7') one=(-dotnet 'C:\sample') two=(-dotnet 'C:\sample')
 at_once 'two registrations of providers'
 
+# A migration that is killed at any moment is taken back by its journal.
+killed_runs() {
+    local round run
+    fresh
+    { echo REGEDIT4; for ((round = 0; round < 150; round++)); do
+        printf '[HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7\\PROFILES\\P%d]\n"a"="b"\n"c"="%d"\n' $round $round
+    done; } | wine "$windows/kz7admin.exe" import - >/dev/null
+    wine "$windows/kz7admin.exe" history start >/dev/null
+    left >before
+    for ((round = 0; round < ${KZ7_KILLS:-10}; round++)); do
+        rows=$((rows + 1))
+        wine "$windows/kz7InstallReg.exe" -v9 'C:\sample' >/dev/null 2>&1 &
+        sleep "0.$(printf '%03d' $((RANDOM % 500)))"
+        kill -9 $! 2>/dev/null || true
+        wait $! 2>/dev/null || true
+        run=$(wine "$windows/kz7admin.exe" history 2>/dev/null | tr -d '\r' | awk '$4 == "kz7InstallReg" { print $1; exit }')
+        left >killed
+        if ! cmp -s before killed && ! wine "$windows/kz7admin.exe" undo "$run" >undone 2>&1; then
+            cat undone
+        fi
+        left >both
+        if ! diff before both >difference; then
+            echo "FAILED: undo of a killed migration, round $round"
+            head -20 difference
+            failed=$((failed + 1))
+            break
+        fi
+    done
+    wine "$windows/kz7admin.exe" history stop >/dev/null
+}
+killed_runs
+
 # A log that a folder leads elsewhere.
 mkdir "$WINEPREFIX/drive_c/elsewhere"
 ln -s elsewhere "$WINEPREFIX/drive_c/link"

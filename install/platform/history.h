@@ -20,7 +20,7 @@ struct ChangeCounts {
     bool isEmpty() const { return values + keys + services == 0; }
 };
 
-// What the history is told of a run when it begins.
+// What is known of a run when it begins.
 struct HistoryStart {
     std::string program;
     std::vector<std::string> arguments;

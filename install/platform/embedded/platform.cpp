@@ -31,8 +31,8 @@ public:
           byDefault_(options.stateDirectory.empty() && std::getenv("KZ7_STATE_DIR") == nullptr),
           directory_(absolute(options.stateDirectory.empty() ? usualStateDirectory() : options.stateDirectory)),
           registry_(directory_, options.readOnly, listener(), {options.backup, options.missingIsEmpty}) {
-        ports_ = {&registry_,        &services_,       console_.get(), debugOutput_.get(),
-                  files_.get(),      processes_.get(), threads_.get(), libraries_.get(),
+        ports_ = {&registry_,        &services_,       console_.get(),  debugOutput_.get(),
+                  files_.get(),      processes_.get(), threads_.get(),  libraries_.get(),
                   assemblies_.get(), host_.get(),      terminal_.get(), &history_};
     }
 

@@ -11,7 +11,7 @@ namespace kz7 {
 // %ProgramData%\KZ7; empty if the system does not know the folder.
 std::wstring ownProgramData();
 
-// Opens a folder so that nobody can rename or replace it, with `create` after creating it. Null: there is none, or its
+// Opens a folder so that nobody can rename or replace it, with `create` after creating it. Null: it does not exist, or its
 // owner is neither an administrator nor the system, or it is a link.
 NativeHandle openTrustedFolder(const std::wstring& folder, bool create);
 

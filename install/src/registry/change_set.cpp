@@ -157,6 +157,11 @@ Contents removedContents(const ChangeSet& changes) {
     return contents;
 }
 
+// The type of a value of a service's configuration. That of the program is chosen by the service manager.
+ValueType serviceType(std::string_view name, ValueType found) {
+    return equalsIgnoreCase(name, "ImagePath") ? ValueType::expandSz : found;
+}
+
 Status isAsBefore(RowReader& reader, const Change& change, const Contents& contents, bool wholeServices,
                   bool& asBefore) {
     const auto found = contents.find(foldUpper(change.key));
@@ -186,6 +191,9 @@ Status isAsBefore(RowReader& reader, const Change& change, const Contents& conte
     }
     std::optional<ValueState> state;
     status = reader.value(change.name, state);
+    if (state && !wholeServices && !serviceOf(change.key).empty()) {
+        state->type = serviceType(change.name, state->type);
+    }
     asBefore = state == change.before;
     return status;
 }
@@ -444,8 +452,7 @@ Status readSnapshot(IRegistryStore& registry, bool wholeServices, const std::vec
             auto& values = snapshot.back().values;
             std::erase_if(values, [](const KeyValue& value) { return !isServiceValue(value.name); });
             for (KeyValue& value : values) {
-                // The service manager chooses the type.
-                value.type = equalsIgnoreCase(value.name, "ImagePath") ? ValueType::expandSz : value.type;
+                value.type = serviceType(value.name, value.type);
             }
         }
         return record.status;

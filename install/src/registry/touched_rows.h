@@ -40,7 +40,7 @@ public:
         bool isKept = false;      // in a part that was taken
         std::vector<Row> rows;
 
-        // The row of that name, without regard to case; null if there is none.
+        // The row of that name, without regard to case; null without one.
         Row* find(std::string_view value);
         Row& row(std::string_view value);
 
