@@ -18,16 +18,6 @@ constexpr const char* kRunVariable = "KZ7_RUN";  // for the programs that a run 
 constexpr std::int64_t kMostRuns = 1000;
 constexpr std::int64_t kMostBytes = std::int64_t{256} << 20;
 
-// A run's status is null until it has ended. The parts of a run are found from its first one on; `total` counts the
-// bytes of all parts up to and with that one. Older programs ignore these tables.
-constexpr const char* kTables =
-    "CREATE TABLE IF NOT EXISTS run (number INTEGER PRIMARY KEY AUTOINCREMENT, parent INTEGER NOT NULL,"
-    " undoes INTEGER NOT NULL, begun INTEGER NOT NULL, ended INTEGER NOT NULL, status INTEGER, user TEXT NOT NULL,"
-    " host TEXT NOT NULL, program TEXT NOT NULL, arguments TEXT NOT NULL, outside TEXT NOT NULL,"
-    " nvalues INTEGER NOT NULL, nkeys INTEGER NOT NULL, nservices INTEGER NOT NULL, firstpart INTEGER NOT NULL);"
-    "CREATE TABLE IF NOT EXISTS runpart (id INTEGER PRIMARY KEY, run INTEGER NOT NULL, total INTEGER NOT NULL,"
-    " changes BLOB NOT NULL)";
-
 // A statement that is used once.
 class Once {
 public:
@@ -156,7 +146,7 @@ int EmbeddedHistory::write(sqlite3* connection, const ChangeCounts& counts) {
     if (part_.size() > static_cast<std::size_t>(kMostBytes)) {
         return SQLITE_OK;
     }
-    int result = execute(connection, kTables);
+    int result = execute(connection, kHistoryTables);
     bool isThere = number_ != 0;
     result = result == SQLITE_OK && isThere ? writeRun(connection, counts, isThere) : result;
     result = result == SQLITE_OK && !isThere ? addRun(connection) : result;

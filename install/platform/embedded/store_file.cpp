@@ -283,7 +283,8 @@ StoreFault StoreFile::build(const OwnedDescriptor& folder, sqlite3* content, std
     int result = connect(name, SQLITE_OPEN_READWRITE, connection);
     // The schema is written first: in rollback mode a small file is written once, and the switch then only changes its
     // header.
-    for (const char* sql : {"PRAGMA page_size = 4096; PRAGMA synchronous = OFF; BEGIN", kSchema, "COMMIT"}) {
+    for (const char* sql :
+         {"PRAGMA page_size = 4096; PRAGMA synchronous = OFF; BEGIN", kSchema, kHistoryTables, "COMMIT"}) {
         result = result == SQLITE_OK ? execute(connection.get(), sql) : result;
     }
     if (result == SQLITE_OK && content != nullptr) {

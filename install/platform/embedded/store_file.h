@@ -23,6 +23,17 @@ struct StoreReading {
     bool inMemory = false;        // no file: an empty store that can be written
 };
 
+// A run's status is null until it has ended. The parts of a run are found from its first one on; `total` counts the
+// bytes of all parts up to and with that one. Stores of older programs get these tables by the
+// first run that is recorded, and those programs ignore them.
+inline constexpr const char* kHistoryTables =
+    "CREATE TABLE IF NOT EXISTS run (number INTEGER PRIMARY KEY AUTOINCREMENT, parent INTEGER NOT NULL,"
+    " undoes INTEGER NOT NULL, begun INTEGER NOT NULL, ended INTEGER NOT NULL, status INTEGER, user TEXT NOT NULL,"
+    " host TEXT NOT NULL, program TEXT NOT NULL, arguments TEXT NOT NULL, outside TEXT NOT NULL,"
+    " nvalues INTEGER NOT NULL, nkeys INTEGER NOT NULL, nservices INTEGER NOT NULL, firstpart INTEGER NOT NULL);"
+    "CREATE TABLE IF NOT EXISTS runpart (id INTEGER PRIMARY KEY, run INTEGER NOT NULL, total INTEGER NOT NULL,"
+    " changes BLOB NOT NULL)";
+
 class StoreFile {
 public:
     StoreFile(std::string directory, const StoreReading& reading);

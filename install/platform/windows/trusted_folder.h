@@ -11,8 +11,8 @@ namespace kz7 {
 // %ProgramData%\KZ7; empty if the system does not know the folder.
 std::wstring ownProgramData();
 
-// Opens a folder so that nobody can rename or replace it, with `create` after creating it. Null: it does not exist, or its
-// owner is neither an administrator nor the system, or it is a link.
+// Opens a folder so that nobody can rename or replace it, with `create` after creating it. Null: it does not exist, or
+// its owner is neither an administrator nor the system, or it is a link.
 NativeHandle openTrustedFolder(const std::wstring& folder, bool create);
 
 // Opens a file in a trusted folder, or creates it for administrators and the system only. Null on failure, with
