@@ -113,6 +113,7 @@ std::string journalEnd(JournalWriter& writer, Status status, std::int64_t ended,
 Status readJournal(std::string_view bytes, std::string_view machine, HistoryRun& run, HistoryChanges& changes) {
     run.state = RunState::interrupted;
     changes = {};
+    changes.isLastUncertain = true;
     if (!bytes.starts_with(kMark)) {
         return kMark.starts_with(bytes) ? kFileNotFound : kInvalidData;
     }
