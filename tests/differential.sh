@@ -312,7 +312,7 @@ killed_runs() {
         sleep "0.$(printf '%03d' $((RANDOM % 500)))"
         kill -9 $! 2>/dev/null || true
         wait $! 2>/dev/null || true
-        run=$(wine "$windows/kz7admin.exe" history 2>/dev/null | tr -d '\r' | awk '$4 == "kz7InstallReg" { print $1; exit }')
+        run=$(wine "$windows/kz7admin.exe" history 2>/dev/null | tr -d '\r' | awk '$4 == "kz7InstallReg" && !seen++ { print $1 }')
         left >killed
         if ! cmp -s before killed && ! wine "$windows/kz7admin.exe" undo "$run" >undone 2>&1; then
             cat undone
