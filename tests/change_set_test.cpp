@@ -282,7 +282,7 @@ TEST(Repair, LeavesNothingOfItsKindAndCanBeTakenBack) {
         std::vector<Finding> rest;
         std::string key;
         {
-            RecordedPorts ports(machine.ports(), true, true);
+            RecordedPorts ports(machine.ports(), {.wholeServices = true, .holdsCommits = true});
             const RepairRequest request{{group}, {}, {}, {}, group == "migration"};
             ASSERT_EQ(repairMachine(ports.ports(), true, request, rest, key), kSuccess) << key;
             changes = ports.changes();
@@ -342,7 +342,7 @@ TEST(RepairUnderFaults, EndsWithAStatus) {
                    {});
     };
     const auto repair = [](FaultyMachine& machine) {
-        RecordedPorts ports(machine.ports(), true, true);
+        RecordedPorts ports(machine.ports(), {.wholeServices = true, .holdsCommits = true});
         const RepairRequest request{{"aliases", "copies", "services"}, {}, {}, {}, false};
         std::vector<Finding> rest;
         std::string key;

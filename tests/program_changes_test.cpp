@@ -367,14 +367,6 @@ TEST_F(ChangesProgram, BadInputIsOneLineAndChangesNothing) {
     for (const auto& [text, reason] : rows) {
         expect({"ensure", "--from", file("list.json", text)}, "|kz7admin: list.json: " + reason + "\n|2");
     }
-    expect({"diff", ".", files_.path() + "/none"}, "|kz7admin: none: No such file or directory\n|2");
-    expect({"diff", ".", "/usr"}, "|kz7admin: no store: /usr\n|2");
-    expect({"restore", file("empty.reg", "Windows Registry Editor Version 5.00\n")},
-           "|kz7admin: nothing to restore: empty.reg\n|2");
-    expect({"apply", "--", "-addKZ7Copy", "A"},
-           "|kz7admin: not a command of kz7InstallReg: -addKZ7Copy A (see kz7admin apply --help)\n|2");
-    EXPECT_EQ(store_.dump(), "");
-}
 
 }  // namespace
 }  // namespace kz7::test

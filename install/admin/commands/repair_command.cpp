@@ -107,13 +107,15 @@ Answer repair(Admin& admin, RepairOptions options) {
     if (options.check) {
         return preview(admin, options);
     }
-    RecordedPorts recorded(admin.platform().ports(), admin.platform().storeIsOwn(), true);
+    admin.beginRun();
+    RecordedPorts recorded(admin.platform().ports(),
+                           {.wholeServices = admin.platform().storeIsOwn(), .holdsCommits = true});
     ChangeRun run;
     if (const Answer answer = repairOn(admin, options, recorded.ports(), run); answer != kAnswerYes) {
         return answer;
     }
     takeChanges(recorded, run);
-    if (const Status status = admin.registry().commit(); status != kSuccess) {
+    if (const Status status = recorded.commit(); status != kSuccess) {
         return admin.storeFault("cannot save changes", status);
     }
     return showRun(admin, options, run);
