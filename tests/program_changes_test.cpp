@@ -288,6 +288,10 @@ TEST_F(ChangesProgram, JsonFieldsAreThoseOfThePage) {
           {"report", "-o", files_.path() + "/page.html"},
           {"front", "/bin/true"},
           {"diff", backup, "."},
+          {"history"},
+          {"history", "show", "1"},
+          {"history", "start"},
+          {"history", "trim", "--keep", "1000"},
           {"repair", "--check"},
           {"restore", backup}}) {
         Arguments words = command;
@@ -310,6 +314,8 @@ TEST_F(ChangesProgram, JsonFieldsAreThoseOfThePage) {
         page += cell;
     }
     EXPECT_EQ(names(printed, std::regex("[{,\n]\"([A-Za-z0-9]+)\":")), names(page, std::regex("`(\\w+)`")));
+}
+
 TEST_F(ChangesProgram, TakeRunsBackAndDoThemAgain) {
     const auto state = [&] { return store_.run("kz7admin", {"export"}).output; };
     expect({"history"}, "|kz7admin: no run is recorded: registry.db\n|1");
@@ -367,6 +373,14 @@ TEST_F(ChangesProgram, BadInputIsOneLineAndChangesNothing) {
     for (const auto& [text, reason] : rows) {
         expect({"ensure", "--from", file("list.json", text)}, "|kz7admin: list.json: " + reason + "\n|2");
     }
+    expect({"diff", ".", files_.path() + "/none"}, "|kz7admin: none: No such file or directory\n|2");
+    expect({"diff", ".", "/usr"}, "|kz7admin: no store: /usr\n|2");
+    expect({"restore", file("empty.reg", "Windows Registry Editor Version 5.00\n")},
+           "|kz7admin: nothing to restore: empty.reg\n|2");
+    expect({"apply", "--", "-addKZ7Copy", "A"},
+           "|kz7admin: not a command of kz7InstallReg: -addKZ7Copy A (see kz7admin apply --help)\n|2");
+    EXPECT_EQ(store_.dump(), "");
+}
 
 }  // namespace
 }  // namespace kz7::test

@@ -150,7 +150,7 @@ Contents removedContents(const ChangeSet& changes) {
         if (change.kind == Change::Kind::keyRemoved) {
             ++contents[foldUpper(change.key.substr(0, change.key.find_last_of('\\')))].subkeys;
             contents[foldUpper(change.key)].isRemoved = true;
-        } else if (change.kind == Change::Kind::value && change.before) {
+        } else if (!change.isKey() && change.before && !isRunState(change)) {
             ++contents[foldUpper(change.key)].values;
         }
     }
