@@ -114,6 +114,7 @@ TEST_F(ChangesProgram, RestoreMendsADamageOfAnyPage) {
     ASSERT_EQ(store_.run("kz7admin", {"backup", backup}).exitCode, 0);
     const std::string whole = contents(backup);
     ASSERT_GT(whole.size(), 8U * 4096);
+    int unnoticed = 0;
     for (std::size_t page = 0; page < whole.size() / 4096; ++page) {
         const StateDirectory damaged;
         const std::string bytes = std::string(whole).replace(4096 * page, 4096, 4096, '\0');
@@ -124,9 +125,12 @@ TEST_F(ChangesProgram, RestoreMendsADamageOfAnyPage) {
         waitpid(other, nullptr, 0);
         EXPECT_EQ(damaged.run("kz7admin", {"diff", damaged.path(), backup}).exitCode, 0) << "page " << page;
         EXPECT_EQ(damaged.integrity(), "ok") << "page " << page;
-        EXPECT_EQ(contents(damaged.file("registry.db.old")), bytes) << "page " << page;
+        const std::string kept = contents(damaged.file("registry.db.old"));
+        unnoticed += kept.empty() ? 1 : 0;
+        EXPECT_TRUE(kept.empty() || kept == bytes) << "page " << page;
         EXPECT_FALSE(std::filesystem::exists(damaged.file("registry.db.old2"))) << "page " << page;
     }
+    EXPECT_EQ(unnoticed, 1) << "the last page of what a run changed has no structure that a zero would break";
 }
 
 TEST_F(ChangesProgram, EnsureMakesTheCopiesOfAList) {
