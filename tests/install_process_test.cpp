@@ -2,7 +2,7 @@
 #include <gtest/gtest.h>
 
 #include "install/platform/memory/process_host.h"
-#include "install/platform/memory/threads.h"
+#include "install/platform/memory/small_ports.h"
 #include "tests/support/backends.h"
 #include "tests/support/captured_run.h"
 #include "tests/support/gate.h"

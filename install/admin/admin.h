@@ -26,7 +26,7 @@ class Admin {
 public:
     std::string storeDirectory;          // empty: the usual one
     std::vector<std::string> arguments;  // of this program
-    std::function<Answer()> answer;      // runs the chosen subcommand
+    std::function<int()> answer;         // runs the chosen subcommand; the exit code
 
     // Opens the ports, once. False, with a message: a store directory was given, and this machine's store is its
     // registry. `missingIsEmpty`: see PlatformOptions.
@@ -40,12 +40,12 @@ public:
     void beginRun(bool startsPrograms = false, std::uint64_t undoes = 0);
     void endRun(Answer result);
 
-    // What standard output is.
+    // The properties of standard output.
     TerminalView output() { return platform_->terminal().look(TerminalStream::output); }
 
-    // Writes a key and its subkeys, or without a name everything, between a head and a tail. `append` formats a key,
-    // also one that cannot be read, which is reported. Pages are written while the store is read, and other programs
-    // may write in between; a snapshot is a document.
+    // Writes a key and its subkeys, or without a name everything, between a head and a tail. `append` formats each key;
+    // a key that cannot be read is reported too. Reading::pages writes while it reads, so other programs may change the
+    // store meanwhile; Reading::snapshot writes one state as a document.
     using Appender = std::function<void(const KeyRecord&, std::string&)>;
     enum class Reading { snapshot, pages };
     Answer showKeys(const std::string& key, std::string text, const Appender& append, std::string_view tail,

@@ -20,14 +20,14 @@ struct ConfigurationRequest {
     std::string instance;  // at most 8 characters; empty: all of the copy
     std::vector<ResponseKeyword> responses;
     std::string logFile;      // one of the product's paths; empty: no log
-    std::string messageFile;  // the same; empty: the built-in texts
+    std::string messageFile;  // one of the product's paths; empty: the built-in texts
     bool machine = false;     // speaks the progress protocol
 };
 
 struct ConfigurationOutcome {
     std::uint32_t set = 0;
-    std::uint32_t notSet = 0;  // names that nothing has among them
-    Status kept = kSuccess;    // what keeping the copy's variables came to
+    std::uint32_t notSet = 0;  // unknown names included
+    Status kept = kSuccess;    // the status of committing the variables
 };
 
 ConfigurationOutcome runConfiguration(const Ports& ports, ConfigurationRequest request);

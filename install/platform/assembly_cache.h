@@ -1,5 +1,5 @@
-// The assembly-cache port: the .NET framework's machine-wide cache, where the data providers of a copy are
-// placed for every program to find.
+// The assembly-cache port: the machine-wide cache of the .NET framework, in which every program finds the data
+// providers of a copy.
 #pragma once
 
 #include <cstdint>

@@ -17,8 +17,8 @@ inline constexpr std::string_view kAssemblyRecords = "SOFTWARE\\Classes\\Install
 // Whether a file of a bin folder is a data provider.
 bool isProviderFile(std::string_view file);
 
-// Records every file for every generation in `generations`; the data is the file's path. Without files nothing is
-// created, not even the key.
+// Records every file for every generation in `generations`; the data is the path of the file. Without files the key is
+// not created either.
 Status recordProviders(IRegistryStore& registry, std::string_view location, std::string_view level,
                        FrameworkGenerations generations, const std::vector<std::string>& files);
 

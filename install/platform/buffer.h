@@ -1,5 +1,5 @@
-// Buffers that a caller lends to a port. Their sizes are behaviour (a value that does not fit answers
-// kMoreData), so they are handed over as they are and never grown behind the caller's back.
+// Buffers that a caller passes to a port. Their sizes are behaviour: a value that does not fit is kMoreData. So no
+// operation makes a buffer larger.
 #pragma once
 
 #include <array>
@@ -10,13 +10,13 @@
 
 namespace kz7 {
 
-// Room lent to an operation, and how much of it was filled. A text must fit by its characters (UTF-16 units, its NUL
-// included), other data by its bytes; both limits are one number.
+// A caller's buffer, and how much of it an operation filled. For a text the limit counts characters (UTF-16 units,
+// with the NUL), for other data bytes.
 struct Buffer {
     Buffer(char* room, std::uint32_t bytes) : Buffer(room, bytes, bytes) {}
     Buffer(char* room, std::uint32_t bytes, std::uint32_t most) : data(room), capacity(bytes), limit(most) {}
 
-    // What was filled in; nothing after kMoreData, since `size` then is the room that was missing.
+    // The filled part; empty after kMoreData, when `size` is the size needed.
     std::string_view view() const { return {data, refused || size > capacity ? 0 : size}; }
 
     // The filled bytes up to the first NUL.
@@ -26,7 +26,7 @@ struct Buffer {
     std::uint32_t capacity;  // bytes
     std::uint32_t limit;     // characters of a text, bytes of other data
     std::uint32_t size = 0;  // bytes filled, a name without its NUL; after kMoreData the bytes needed
-    bool refused = false;    // by the limit
+    bool refused = false;    // the data exceed the limit
 };
 
 // Room for that many bytes, texts included.

@@ -102,7 +102,7 @@ std::vector<std::string> splitArguments(std::string_view arguments) {
 std::string joinArguments(const std::vector<std::string>& words) {
     std::string line;
     for (const std::string& word : words) {
-        // The program's own word ends at its closing quote, whatever stands before that.
+        // The word of the program ends at its closing quotation mark, even after a backslash.
         if (line.empty()) {
             line += '"' + word + '"';
             continue;

@@ -14,22 +14,23 @@ struct CommandReading {
     std::string_view arguments;
 };
 
-// The ways to read it, in the order they are tried. A program in quotes has one; without quotes the program
-// ends at the first blank, or at the second, and so on to the end. None for a command line of blanks.
+// The ways to read a command line, in the order in which they are tried. A program in quotation marks has one;
+// without them the program ends at the first blank, or at the second, and so on. Empty for a line of blanks.
 std::vector<CommandReading> commandReadings(std::string_view commandLine);
 
-// Splits at blanks and tabs outside quotes. 2n backslashes and a quote are n backslashes and a quote that
-// groups, one more backslash makes the quote a literal one; two quotes inside quotes are a literal one.
+// Splits at blanks and tabs outside quotation marks. 2n backslashes before a quotation mark are n backslashes, and the
+// mark begins or ends a quotation; 2n+1 are n backslashes and a literal mark. Two marks inside a quotation are a
+// literal one.
 std::vector<std::string> splitArguments(std::string_view arguments);
 
 // The command line that splits into these words, the program first.
 std::string joinArguments(const std::vector<std::string>& words);
 
-// Whether these words reach the program as they are. A batch file is run by a command interpreter, which acts upon
-// quotation marks, percent signs, line ends and other control characters before the file sees them.
+// Whether these words reach the program unchanged. The command interpreter that runs a batch file interprets
+// quotation marks, percent signs, line ends and other control characters before the file gets them.
 bool canPassWords(const std::vector<std::string>& words);
 
-// A name without folder or drive, to be searched for.
+// Whether a program is a name without folder or drive, which is searched for.
 bool isBareName(std::string_view program);
 
 }  // namespace kz7

@@ -9,8 +9,8 @@
 
 namespace kz7 {
 
-// Texts are written whole and uncut, to a file or pipe in the narrow encoding of the host; a line feed ends a line in
-// the host's own way. kPipeClosing: the reader is gone, which is never a signal. One thread.
+// Texts are never cut. Files and pipes get the narrow encoding and the line ends of the host. kPipeClosing: the reader
+// has closed the pipe, which raises no signal. One thread.
 class IConsole {
 public:
     virtual ~IConsole() = default;
@@ -20,10 +20,10 @@ public:
     // Flushes standard output first, so that both in one file keep their order.
     virtual Status writeError(std::string_view text) = 0;
 
-    // Standard output that programs read: UTF-8, or the bytes as they are, in a file or pipe on every host.
+    // Writes output for programs: files and pipes get the bytes unchanged on every host.
     virtual Status writeDocument(std::string_view text) { return writeOutput(text); }
 
-    // The first failure of standard output so far, if any: kPipeClosing for a reader that is gone.
+    // Returns the first failure of standard output so far: kPipeClosing if the reader has closed the pipe.
     virtual Status flush() = 0;
 };
 

@@ -1,7 +1,10 @@
 // The debugger output port: diagnostic texts that are not for the console.
 #pragma once
 
+#include <memory>
 #include <string_view>
+
+#include "install/platform/console.h"
 
 namespace kz7 {
 
@@ -15,5 +18,8 @@ public:
     // False if nobody can see the messages, so that a caller with many of them need not compose them.
     virtual bool isHeard() const { return true; }
 };
+
+// `debugger` passes a text to the debugger of this host; null on a host without one.
+std::unique_ptr<IDebugOutput> hostDebugOutput(IConsole& console, void (*debugger)(std::string_view text));
 
 }  // namespace kz7

@@ -54,21 +54,14 @@ void appendUtf16(std::u16string& text, char32_t character) {
 }
 
 void appendUtf8(std::string& text, char32_t character) {
-    const auto trail = [&](unsigned shift) { text += static_cast<char>(0x80 | (character >> shift & 0x3F)); };
-    if (character < 0x80) {
-        text += static_cast<char>(character);
-    } else if (character < 0x800) {
-        text += static_cast<char>(0xC0 | character >> 6);
-        trail(0);
-    } else if (character < 0x10000) {
-        text += static_cast<char>(0xE0 | character >> 12);
-        trail(6);
-        trail(0);
-    } else {
-        text += static_cast<char>(0xF0 | character >> 18);
-        trail(12);
-        trail(6);
-        trail(0);
+    const int more = character < 0x80      ? 0
+                     : character < 0x800   ? 1
+                     : character < 0x10000 ? 2
+                                           : 3;  // bytes after the first
+    static constexpr std::array<char32_t, 4> kLeads = {0x00, 0xC0, 0xE0, 0xF0};
+    text += static_cast<char>(kLeads[more] | character >> 6 * more);
+    for (int left = more - 1; left >= 0; --left) {
+        text += static_cast<char>(0x80 | (character >> 6 * left & 0x3F));
     }
 }
 

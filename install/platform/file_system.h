@@ -1,4 +1,4 @@
-// The file-system port: probes and reads files, and appends to log files.
+// The file-system port: tests, reads and writes whole files, and appends to log files.
 #pragma once
 
 #include <cstdint>
@@ -43,8 +43,8 @@ public:
     // names a link, a folder or a device.
     virtual Status writeFile(std::string_view path, std::string_view content, bool replace) = 0;
 
-    // Finds the first file, in name order, that matches a pattern: a path in whose last name '?' stands for any one
-    // character. `name` is without the folder. kFileNotFound: none.
+    // Finds the first file, in name order, that matches a pattern: a path whose last name may contain '?' for any one
+    // character. `name` is without the folder. kFileNotFound: no file matches.
     virtual Status findFile(std::string_view pattern, std::string& name) = 0;
 
     // Converts a path as users of this host write it; a relative one starts in the current directory.

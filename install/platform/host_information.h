@@ -1,4 +1,4 @@
-// The host port: the local time as text, and which operating system this is.
+// The host port: the local time as text, and the name and version of the operating system.
 #pragma once
 
 #include <ctime>
@@ -29,9 +29,12 @@ public:
     // The time now, without a NUL. kMoreData: the text and a NUL do not fit.
     virtual Status localTime(TimeText form, Buffer& text) = 0;
 
-    // Asks the system itself and starts no program. `system` is written on success only.
+    // Starts no program. `system` is written on success only.
     virtual Status operatingSystem(OperatingSystem& system) = 0;
 };
+
+// A variable of this process's environment; empty if it is not set.
+std::string environmentText(const char* name);
 
 // Formats a time, for the implementations. kMoreData as above.
 Status giveTime(const std::tm& time, TimeText form, Buffer& text);

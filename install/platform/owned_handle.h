@@ -42,8 +42,7 @@ public:
         }
     }
 
-    // Releases the handle without closing it: it stays open until the process ends. Only for a flow that leaves it
-    // open intentionally; the caller states the reason.
+    // Releases the handle without closing it: it stays open until the process ends. The caller states the reason.
     void leaveOpen() { handle_ = Traits::kNone; }
 
 private:

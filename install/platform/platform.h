@@ -27,8 +27,8 @@ struct PlatformOptions {
     std::string backup = {};          // a copy of an embedded store that is read instead of a store
     bool readOnly = false;            // reads what is there, takes no writer's lock, creates nothing
     bool missingIsEmpty = false;      // with readOnly: a state directory that does not exist reads as empty
-    bool plainStreams = false;        // standard input and output carry bytes, their line ends stay as they are
-    bool ownProcess = true;           // false: a library in somebody else's, which leaves the process as it is
+    bool plainStreams = false;        // standard input and output are bytes; line ends are not converted
+    bool ownProcess = true;           // false: in a library, which must not change the state of the process
 };
 
 // The ports of one machine, none of them owned.
@@ -68,35 +68,33 @@ public:
     // Null: the machine has none.
     IHistory* history() { return ports_.history; }
 
-    // The folder of what the programs keep for themselves, as a product path; created if it is missing.
+    // The folder for the programs' own files, such as logs, as a product path; created if it is missing.
     virtual Status ownFolder(std::string& path) = 0;
 
     // The store's name for people: its file, or the machine's registry.
     virtual std::string storeName() = 0;
 
-    // What a person who looks at that store should know about its choice: a sentence without a full stop, usually
-    // empty.
+    // A remark for people on why this store was chosen, without a full stop; usually empty.
     virtual std::string storeNote() { return {}; }
 
-    // Whether the store is the programs' own and holds nothing else. Otherwise it is that of the whole machine.
+    // Whether the store has only data of these programs. False: it is the registry of the machine.
     virtual bool storeIsOwn() { return true; }
 
-    // Whether a fault of the store was reported on standard error, so that its status needs no further line.
+    // Whether a fault of the store was reported on standard error, so that callers do not report it again.
     virtual bool storeFaultTold() { return false; }
 
     // The assembly cache of this machine as it would act on another registry, without a change to the machine.
     virtual std::unique_ptr<IAssemblyCache> assembliesOn(IRegistryStore& registry) = 0;
 
-    // The content of a file that holds the whole store as it is at one moment, also while others write.
-    // kFileNotFound: no store exists. kCallNotImplemented: the store is not the programs' own.
+    // A consistent copy of the whole store as the content of a file; other programs may write meanwhile.
+    // kFileNotFound: no store exists. kCallNotImplemented: the store is the registry of the machine.
     virtual Status storeImage(std::string&) { return kCallNotImplemented; }
 
     // Whether the store does not exist, or was found to be damaged.
     virtual bool storeIsLost() { return false; }
 
-    // Puts a new store with what `fill` writes in the place of this one, or creates the missing one. The old one keeps
-    // its content under the name `kept`, empty if there was none. kBusy: another program has it open. A fault is
-    // reported.
+    // Replaces the store by a new one that `fill` writes, or creates a missing one. The old file is renamed to `kept`,
+    // which is empty without one. kBusy: another program has the store open. Faults are reported on standard error.
     virtual Status replaceStore(const std::function<Status(IRegistryStore&)>&, std::string& /*kept*/) {
         return kCallNotImplemented;
     }
@@ -113,8 +111,7 @@ protected:
 
 std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options);
 
-// The number a process exits with for a status. Where the host keeps only 8 bits of it, a failure whose
-// low 8 bits are 0 exits with 1, so that it is never read as success.
+// The exit code for a status. On hosts that keep only 8 bits of it, a failure whose low 8 bits are 0 exits with 1.
 int hostExitCode(Status status);
 
 }  // namespace kz7

@@ -1,5 +1,5 @@
-// The process port: child programs with captured output, at the level of the platform's calls. One operation
-// for each call that can fail on its own; what is odd about running a program hangs on single calls.
+// The process port: child programs with captured output. One operation for each platform call that can fail on its own,
+// because the runtime treats the failure of each in its own way.
 #pragma once
 
 #include <cstdint>
@@ -11,14 +11,14 @@
 
 namespace kz7 {
 
-// One end of a pipe, or whatever a standard-handle slot holds.
+// One end of a pipe, or the value of a standard-handle slot.
 enum class StreamHandle : std::uint64_t { none = 0 };
 
-// A started program or its main thread; they are closed alike.
+// A started program or its main thread; closeProcess() closes both.
 enum class ProcessHandle : std::uint64_t { none = 0 };
 
-// The standard handles of this process that it may exchange. They are numbers only: what a slot holds may be
-// closed long since, and nothing written to the console ever follows a slot.
+// The standard-handle slots of this process. Their values are numbers that may belong to closed handles; console output
+// does not use them.
 enum class StandardSlot { output, error };
 
 inline constexpr std::uint32_t kInfiniteWait = 0xFFFFFFFF;  // a timeout, in milliseconds
@@ -49,7 +49,7 @@ public:
 
     virtual Status getSlot(StandardSlot slot, StreamHandle& stream) = 0;
 
-    // Takes any number, open or not.
+    // The handle need not be open.
     virtual Status setSlot(StandardSlot slot, StreamHandle stream) = 0;
 
     // A pipe whose ends a child can inherit. The caller closes both.
@@ -59,26 +59,26 @@ public:
     virtual Status duplicate(StreamHandle stream, StreamHandle& copy) = 0;
 
     // Waits for bytes and returns those that are available, up to the capacity. kBrokenPipe: every write end is
-    // closed and all was read. A success with 0 bytes is a write of nothing at the other end.
+    // closed and all was read. A success with 0 bytes is an empty write at the other end.
     virtual Status read(StreamHandle stream, Buffer& data) = 0;
 
-    // Writes all of it, waiting for room. kPipeClosing: the read end is closed, also while waiting.
+    // Writes all bytes and waits while the pipe is full. kPipeClosing: the read end is closed or was closed meanwhile.
     virtual Status write(StreamHandle stream, std::string_view data) = 0;
 
     virtual Status closeStream(StreamHandle stream) = 0;
 
-    // Starts a program, hidden, with this process's environment and the streams; it inherits no other handle.
+    // Starts a program without a window, with this process's environment and the streams; it inherits no other handle.
     // A program path with blanks and without quotation marks is tried up to each blank in turn. kFileNotFound: no such
-    // program; also, where the host has no drives, one it cannot execute. kBadDirectory: no such working directory.
+    // program; on POSIX also one that cannot be executed. kBadDirectory: no such working directory.
     virtual Status startProcess(const ProcessStart& start, ProcessInformation& started) = 0;
 
-    // Waits for the program's end. kWaitTimedOut: it runs on.
+    // Waits for the end of the program. kWaitTimedOut: it still runs.
     virtual Status waitProcess(ProcessHandle process, std::uint32_t milliseconds) = 0;
 
     // kExitCodeRunning while it runs; 128 and the signal's number for a program that a signal ended.
     virtual Status exitCode(ProcessHandle process, std::uint32_t& code) = 0;
 
-    // A program that still runs is left running, and nothing of it is left over once it ends.
+    // A program that still runs continues, and becomes no zombie when it ends.
     virtual Status closeProcess(ProcessHandle process) = 0;
 
     // The short form of the path of an existing file, without its NUL. kMoreData: it does not fit with its

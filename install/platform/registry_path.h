@@ -1,5 +1,5 @@
-// Key paths and names as every store understands them. The registry of Windows judges most of this itself, its
-// versions differently; what is checked here is answered alike everywhere.
+// The rules for key paths and names. Windows checks most of them itself, but its versions differ; what is checked here
+// has the same result on every store.
 #pragma once
 
 #include <string>
@@ -19,22 +19,23 @@ Status checkKeyPath(std::string_view path);
 // kSuccess, or kInvalidParameter for more than 16,383 characters or a NUL.
 Status checkValueName(std::string_view name);
 
-// The plain path that `path` below `parent` stands for: the 32-bit view bit leads SOFTWARE of the machine
-// to its Wow6432Node, unless the path goes there already.
+// Resolves the 32-bit view bit: inserts Wow6432Node after SOFTWARE in a path below HKEY_LOCAL_MACHINE, unless the path
+// has it already.
 std::string plainKeyPath(KeyHandle parent, std::string_view path, AccessMask access);
 
-// The rights of a handle on a store whose callers may do everything.
+// The rights of a handle on a store without access control.
 constexpr AccessMask grantedAccess(AccessMask access) {
     return (access & kKeyMaximumAllowed) == 0 ? access : access | kKeyFull;
 }
 
-// Gives a name to a lent buffer with its NUL: kMoreData when that does not fit.
+// Copies a name with its NUL into a caller's buffer. kMoreData: it does not fit.
 Status giveName(std::string_view name, Buffer& buffer);
 
-// Gives data to a lent buffer: kMoreData with the bytes needed when they do not fit.
+// Copies data into a caller's buffer. kMoreData: they do not fit, and the buffer's size is the size needed.
 Status giveData(ValueType type, std::string_view data, Buffer& buffer);
 
-// The same for the answer to a query, which gets whole units of an odd text. `type` is set on success, unless null.
+// The same for the result of a query; a text of odd size loses its last byte. `type` may be null, and is set on success
+// only.
 Status giveQueried(ValueType stored, std::string_view data, ValueType* type, Buffer& buffer);
 
 }  // namespace kz7

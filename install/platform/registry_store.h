@@ -1,5 +1,5 @@
-// The registry port: a tree of keys with typed values. One operation for each platform call that the
-// flows make; nothing here prints, retries or substitutes.
+// The registry port: a tree of keys with typed values. One operation for each platform call that the flows make; none
+// prints, retries or replaces placeholders.
 #pragma once
 
 #include <cstdint>
@@ -66,15 +66,14 @@ inline constexpr std::uint32_t kMaxKeyName = 255;      // characters of one key 
 inline constexpr std::uint32_t kMaxValueName = 16383;  // characters of a value name
 
 // Paths are texts below a key, parts separated by backslashes; the empty path is the key itself.
-// Names preserve their case and compare without it (ASCII). Subkeys enumerate in the order of their
-// upper-cased names, values in the order they were first set; the first spelling of a name is kept.
+// Names compare without case (ASCII), and keep their first spelling. Subkeys enumerate in the order of their
+// upper-cased names, values in the order in which they were first set.
 // On Windows a key may be a link to another; paths follow it unless the access for their last name says otherwise.
 // Outputs are written on success only, but for Buffer::size, which kMoreData fills.
 //
-// Common results: kFileNotFound no such key or value; kAccessDenied a right that the handle was not
-// opened with; kInvalidHandle not an open key; kKeyDeleted the key behind the handle was deleted;
-// kInvalidParameter a key name over 255 or a value name over 16,383 characters; any other number is a
-// fault of the store itself. One store belongs to one thread.
+// Common results: kFileNotFound: no such key or value; kAccessDenied: the handle was opened without the necessary
+// right; kInvalidHandle: not an open key; kKeyDeleted: the key of the handle was deleted; kInvalidParameter: a key name
+// over 255 or a value name over 16,383 characters; any other number: a fault of the store itself. One thread.
 class IRegistryStore {
 public:
     virtual ~IRegistryStore() = default;
@@ -90,8 +89,8 @@ public:
     // kInvalidHandle for one that is not open; closing a root does nothing.
     virtual Status closeKey(KeyHandle key) = 0;
 
-    // Reads a value's type (where asked for) and its bytes as stored; of an odd text, the whole units as any other
-    // text. kMoreData: `data` is too small, its size tells the bytes needed and its content is not to be read.
+    // Reads the type of a value, if `type` is not null, and its bytes as stored; a text of odd size loses its last
+    // byte. kMoreData: `data` is too small; its size is then the size needed, and its content is undefined.
     virtual Status queryValue(KeyHandle key, std::string_view name, ValueType* type, Buffer& data) = 0;
 
     // Stores exactly the bytes given. The empty name is the key's default value.
@@ -99,22 +98,21 @@ public:
 
     virtual Status deleteValue(KeyHandle key, std::string_view name) = 0;
 
-    // The index-th subkey's name, NUL-terminated, and its class where `keyClass` is given. kNoMoreItems
-    // past the last; kMoreData when the name or the class with its NUL does not fit.
+    // The name of the index-th subkey, NUL-terminated, and its class if `keyClass` is not null. kNoMoreItems: past the
+    // last. kMoreData: the name or the class with its NUL does not fit.
     virtual Status enumerateKey(KeyHandle key, std::uint32_t index, Buffer& name, Buffer* keyClass) = 0;
 
-    // The index-th value's name, NUL-terminated; its type and bytes, also those of an odd text, where `type` and `data`
-    // are given.
-    // kNoMoreItems past the last; kMoreData when the name with its NUL or the data does not fit, `data`
-    // then tells the bytes needed.
+    // The name of the index-th value, NUL-terminated, and its type and bytes if `type` and `data` are not null; all
+    // bytes of a text of odd size. kNoMoreItems: past the last. kMoreData: the name with its NUL or the data do not
+    // fit; the size of `data` is then the size needed.
     virtual Status enumerateValue(KeyHandle key, std::uint32_t index, Buffer& name, ValueType* type, Buffer* data) = 0;
 
     // Deletes a key and its values. kAccessDenied: it has subkeys. `view` is 0 or one of the view bits.
-    // Of a link, the link itself is deleted. Handles that are open on it stay and answer kKeyDeleted.
+    // Of a link, the link itself is deleted. Open handles of the key remain; operations on them return kKeyDeleted.
     virtual Status deleteKey(KeyHandle parent, std::string_view path, AccessMask view) = 0;
 
-    // A mark of the flow: what was done since the last one is now to be seen by others, and whole. Success
-    // means that it is on disk; on failure nothing of it is. Without marks a store may drop the changes.
+    // A commit point: makes all changes since the last one visible to other programs at once. On success they are on
+    // disk, on failure none of them is. Changes that are never committed may be dropped.
     virtual Status commit() = 0;
 };
 

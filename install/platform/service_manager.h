@@ -11,7 +11,7 @@
 
 namespace kz7 {
 
-// The manager or one service, open; they are closed alike.
+// The manager or one service; closeHandle() closes both.
 enum class ServiceHandle : std::uint64_t { none = 0 };
 
 inline constexpr std::uint32_t kServiceManagerConnect = 0x0001;
@@ -35,10 +35,10 @@ enum class ServiceState : std::uint32_t {
     running = 4,
 };
 
-// The service manager keeps a service as a key of its name, here below HKEY_LOCAL_MACHINE.
+// The key of each service is below this key of HKEY_LOCAL_MACHINE.
 inline constexpr std::string_view kServiceKeys = "SYSTEM\\CurrentControlSet\\Services\\";
 
-// Characters of a service's name: those of a key's.
+// Characters of a service's name: the name is a key's.
 inline constexpr std::size_t kMaxServiceName = kMaxKeyName;
 
 inline bool isServiceName(std::string_view name) {
@@ -79,15 +79,14 @@ public:
     // Sets the start type and leaves everything else of the service unchanged.
     virtual Status changeStartType(ServiceHandle service, ServiceStart start) = 0;
 
-    // Sets everything that a definition holds but the name.
+    // Sets everything in the definition except the name.
     virtual Status configureService(ServiceHandle service, const ServiceDefinition& definition) = 0;
 
     // Starts without arguments. kServiceAlreadyRunning; kFileNotFound when the program is missing.
     virtual Status startService(ServiceHandle service) = 0;
 
-    // Sends the stop control. kSuccess when the control was taken, which the platform's call reports as a
-    // non-zero result: callers of that raw result see 1 for success and 0 for failure.
-    // kServiceNotActive when it does not run; kServiceTakesNoControl while it is starting or stopping.
+    // Sends the stop control; succeeds if the service accepted it. kServiceNotActive: the service does not run.
+    // kServiceTakesNoControl: it is starting or stopping.
     virtual Status stopService(ServiceHandle service) = 0;
 
     // Waits until the service has stopped. kWaitTimedOut: it has not.

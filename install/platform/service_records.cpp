@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <vector>
 
 #include "install/platform/text.h"
 
@@ -51,20 +52,15 @@ std::vector<ServiceValue> serviceValues(const ServiceDefinition& definition,
 }
 
 ServiceHandle ServiceRecords::giveOut(std::string recordPath, std::uint32_t access) {
-    std::size_t slot = 0;
-    while (slot < open_.size() && open_[slot].used) {
-        ++slot;
-    }
-    if (slot == open_.size()) {
-        open_.emplace_back();
-    }
-    open_[slot] = {true, std::move(recordPath), access};
-    return static_cast<ServiceHandle>(slot + 1);
+    const ServiceHandle handle{lastHandle_ + 1};
+    open_[handle] = {std::move(recordPath), access};
+    ++lastHandle_;
+    return handle;
 }
 
 ServiceRecords::Open* ServiceRecords::slotOf(ServiceHandle handle) {
-    const auto number = static_cast<std::size_t>(handle);
-    return number == 0 || number > open_.size() || !open_[number - 1].used ? nullptr : &open_[number - 1];
+    const auto found = open_.find(handle);
+    return found == open_.end() ? nullptr : &found->second;
 }
 
 Status ServiceRecords::managerOf(ServiceHandle handle) {
@@ -102,8 +98,8 @@ Status ServiceRecords::createService(ServiceHandle manager, const ServiceDefinit
         return kInvalidName;
     }
     const std::string path = std::string(kServiceKeys) + std::string(definition.name);
-    const bool stillOpen = std::any_of(open_.begin(), open_.end(), [&](const Open& open) {
-        return open.deleted && equalsIgnoreCase(open.recordPath, path);
+    const bool stillOpen = std::any_of(open_.begin(), open_.end(), [&](const auto& open) {
+        return open.second.deleted && equalsIgnoreCase(open.second.recordPath, path);
     });
     if (stillOpen) {
         return kServiceMarkedForDelete;
@@ -244,7 +240,7 @@ Status ServiceRecords::deleteService(ServiceHandle service) {
     const std::string path = slotOf(service)->recordPath;
     status = deleteRecord(path);
     if (status == kSuccess) {
-        for (Open& open : open_) {
+        for (auto& [handle, open] : open_) {
             open.deleted = open.deleted || equalsIgnoreCase(open.recordPath, path);
         }
     }
@@ -252,17 +248,7 @@ Status ServiceRecords::deleteService(ServiceHandle service) {
 }
 
 Status ServiceRecords::closeHandle(ServiceHandle handle) {
-    Open* open = slotOf(handle);
-    if (open == nullptr) {
-        return kInvalidHandle;
-    }
-    *open = {};
-    return kSuccess;
-}
-
-std::size_t ServiceRecords::openHandles() const {
-    return static_cast<std::size_t>(
-        std::count_if(open_.begin(), open_.end(), [](const Open& open) { return open.used; }));
+    return open_.erase(handle) != 0 ? kSuccess : kInvalidHandle;
 }
 
 }  // namespace kz7

@@ -1,8 +1,9 @@
-// The service port as records in the registry, where the machine's own service manager keeps them, so that the same
-// tools show services and everything else. No process is started for a service: its run state is a value of its record.
+// The service port as records in a registry store, in the keys in which Windows keeps its services. No process is
+// started for a service: its run state is a value of its record.
 #pragma once
 
 #include <initializer_list>
+#include <map>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -45,12 +46,10 @@ public:
     Status deleteService(ServiceHandle service) override;
     Status closeHandle(ServiceHandle handle) override;
 
-    // Handles that were given out and are not closed yet.
-    std::size_t openHandles() const;
+    std::size_t openHandles() const { return open_.size(); }
 
 private:
     struct Open {
-        bool used = false;
         std::string recordPath;  // empty: the manager
         std::uint32_t access = 0;
         bool deleted = false;
@@ -59,15 +58,16 @@ private:
     ServiceHandle giveOut(std::string recordPath, std::uint32_t access);
     Open* slotOf(ServiceHandle handle);
     Status managerOf(ServiceHandle handle);
-    // The record behind a handle that has the right needed.
+    // The record of a handle that has the required rights.
     Status recordOf(ServiceHandle handle, std::uint32_t needed, OwnedKey& record);
-    // The same, with the state that it has.
+    // The same, with the state of the service.
     Status recordOf(ServiceHandle handle, std::uint32_t needed, OwnedKey& record, ServiceState& state);
     Status deleteRecord(const std::string& path);
 
     IRegistryStore& registry_;
     IFileSystem& files_;
-    std::vector<Open> open_;
+    std::map<ServiceHandle, Open> open_;
+    std::uint64_t lastHandle_ = 0;
 };
 
 }  // namespace kz7

@@ -1,4 +1,4 @@
-// Foreign text on its way to a terminal.
+// Escapes foreign text for terminals.
 #pragma once
 
 #include <string>
@@ -6,7 +6,7 @@
 
 namespace kz7 {
 
-// Foreign text for a line of ours: control characters, and what turns the direction of writing, are escaped.
+// The text with control characters, and characters that change the direction of writing, escaped.
 std::string shownText(std::string_view foreign);
 
 }  // namespace kz7

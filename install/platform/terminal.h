@@ -1,5 +1,5 @@
-// The terminal port: lines of standard input, what people see the standard streams on, and what their interrupt key
-// does. The other end may be a program at two pipes as well as a person. Output goes through the console port.
+// The terminal port: lines of standard input, properties of the terminal, and the interrupt key. Standard input and
+// output may be pipes. Output goes through the console port.
 #pragma once
 
 #include <cstdint>
@@ -13,31 +13,30 @@ namespace kz7 {
 enum class TerminalStream { input, output, error };
 
 struct TerminalView {
-    bool terminal = false;      // else a file, a pipe or nothing
-    bool redraws = false;       // a terminal on which a line can be drawn again
-    bool colours = false;       // and colours are welcome
-    std::uint32_t columns = 0;  // of a terminal; on POSIX $COLUMNS overrules its size
+    bool terminal = false;      // false: a file, a pipe or a closed stream
+    bool redraws = false;       // a line of the terminal can be redrawn
+    bool colours = false;       // the terminal shows colours, and NO_COLOR is not set
+    std::uint32_t columns = 0;  // width of the terminal; on POSIX $COLUMNS overrides it
 };
 
 class ITerminal {
 public:
     virtual ~ITerminal() = default;
 
-    // Reads one line of standard input without its line end; a carriage return before it belongs to the line end.
-    // What does not fit is read and dropped, so that it never passes for a line of its own. kEndOfFile: nothing is
-    // left. kOperationAborted: endReading() was called.
+    // Reads one line of standard input without its line end, LF or CR LF. The part of a line that does not fit is
+    // dropped. kEndOfFile: nothing is left. kOperationAborted: endReading() was called.
     virtual Status readLine(Buffer& line) = 0;
 
-    // Ends a readLine() that waits on another thread; every later one ends at once.
+    // Ends a readLine() that waits on another thread; every later one returns at once.
     virtual void endReading() = 0;
 
-    // While on, a line feed on standard output is written as that one byte on every host.
+    // While on, standard output does not convert line feeds.
     virtual void keepLineFeeds(bool on) = 0;
 
-    // The stream as it is now: people change the width of a window.
+    // The current properties of the stream; the width of a window can change.
     virtual TerminalView look(TerminalStream stream) = 0;
 
-    // While on, the interrupt key does not end this process. The programs on the same terminal get it as ever.
+    // While on, the interrupt key does not end this process. Other programs on the same terminal still receive it.
     virtual void leaveInterruptsToOthers(bool on) = 0;
 };
 

@@ -58,13 +58,18 @@ bool isIn(std::span<const CharacterRange> ranges, char32_t character) {
     });
 }
 
-// Takes a character off a text that is not empty; the result is its units.
-std::size_t takeCharacter(std::string_view& text) {
+// Takes a character off a text that is not empty; 0 for an ASCII character and for a byte that is part of none.
+char32_t takeCharacter(std::string_view& text) {
     char32_t character = 0;
     if (static_cast<unsigned char>(text.front()) < 0x80 || !takeUtf8(text, character)) {
         text.remove_prefix(1);
     }
-    return character < 0x10000 ? 1 : 2;
+    return character;
+}
+
+// The same; the result is its UTF-16 units.
+std::size_t takeUnits(std::string_view& text) {
+    return takeCharacter(text) < 0x10000 ? 1 : 2;
 }
 
 }  // namespace
@@ -72,7 +77,7 @@ std::size_t takeCharacter(std::string_view& text) {
 std::size_t textLength(std::string_view text) {
     std::size_t length = 0;
     while (!text.empty()) {
-        length += takeCharacter(text);
+        length += takeUnits(text);
     }
     return length;
 }
@@ -83,7 +88,7 @@ std::string_view cutText(std::string_view text, std::size_t limit) {
     }
     std::string_view rest = text;
     std::string_view next = text;
-    for (std::size_t length = 0; !next.empty() && (length += takeCharacter(next)) <= limit;) {
+    for (std::size_t length = 0; !next.empty() && (length += takeUnits(next)) <= limit;) {
         rest = next;
     }
     return text.substr(0, text.size() - rest.size());
@@ -118,11 +123,7 @@ std::string compose(std::string_view pattern, std::initializer_list<Insert> inse
 }
 
 std::uint32_t takeColumns(std::string_view& text) {
-    char32_t character = 0;
-    if (static_cast<unsigned char>(text.front()) < 0x80 || !takeUtf8(text, character)) {
-        text.remove_prefix(1);
-        return 1;
-    }
+    const char32_t character = takeCharacter(text);
     return isIn(kWithoutColumn, character) ? 0 : isIn(kOfTwoColumns, character) ? 2 : 1;
 }
 

@@ -1,5 +1,5 @@
-// Text as the whole system handles it: UTF-8 whose limits count UTF-16 units, the characters of Windows. Case folds in
-// ASCII only, fixed buffers cut and always terminate, and only the system's own message texts are ever patterns.
+// Text: UTF-8 whose limits count UTF-16 units, as those of Windows do. Case folds in ASCII only. Fixed buffers truncate
+// and always terminate. Only this system's own message texts are patterns.
 #pragma once
 
 #include <cstdint>
@@ -21,10 +21,10 @@ std::string foldUpper(std::string_view text);
 
 bool equalsIgnoreCase(std::string_view left, std::string_view right);
 
-// Bytes of a character in UTF-8 at most; one of two units has four bytes.
+// The most bytes of a UTF-16 unit in UTF-8; a character of two units has four bytes.
 inline constexpr std::uint32_t kBytesOfCharacter = 3;
 
-// The characters of a text. A byte that is part of none counts as one.
+// The UTF-16 units of a text. A byte that is not part of a character counts as one.
 std::size_t textLength(std::string_view text);
 
 // Whether a text has at most that many characters.
@@ -32,11 +32,10 @@ inline bool fitsCharacters(std::string_view text, std::size_t limit) {
     return text.size() <= limit || textLength(text) <= limit;
 }
 
-// The text up to that many characters; one of two units is taken whole or not at all.
+// The first `limit` characters of a text; a character of two units is never divided.
 std::string_view cutText(std::string_view text, std::size_t limit);
 
-// A text kept in room for `Size` characters, its terminator included. What does not fit is cut; the terminator never
-// is.
+// A text of at most `Size` - 1 characters and its terminator. A longer text is truncated.
 template <std::size_t Size>
 class FixedText {
 public:
@@ -50,7 +49,7 @@ public:
         return *this;
     }
 
-    // False when the text was cut.
+    // False: the text was truncated.
     bool assign(std::string_view text) {
         length_ = 0;
         return append(text);
@@ -77,7 +76,7 @@ private:
 };
 
 // Takes a character off a text that is not empty and returns the columns that it takes on a terminal: 0 for a combining
-// mark, 2 for a wide character of East Asia and for most emoji. A byte that is part of no character takes one.
+// mark, 2 for a wide character of East Asia and for most emoji. A byte that is not part of a character takes one.
 std::uint32_t takeColumns(std::string_view& text);
 
 std::uint32_t columnsOf(std::string_view text);
@@ -89,16 +88,15 @@ std::string_view takeWrappedLine(std::string_view& text, std::uint32_t columns);
 // Appends the last `digits` hexadecimal digits of a number, in lower case.
 void appendHex(std::uint64_t number, int digits, std::string& text);
 
-// The value of a placeholder: %s takes a text, %d and %u a number (%d shows it signed, as the
-// messages always did with a status).
+// The value of a placeholder: a text for %s, a number for %u and %d; %d shows it as signed.
 using Insert = std::variant<std::string_view, std::uint32_t>;
 
 // The pattern with its placeholders replaced in order. Patterns are message texts of this system, never
 // foreign text; inserts are not interpreted. "%%" is a percent sign.
 std::string compose(std::string_view pattern, std::initializer_list<Insert> inserts);
 
-// The same into room of the caller's, cut to it, without a terminator; the result is the length of the whole.
-// A placeholder without an insert comes out empty, an insert without a placeholder is left out.
+// The same into a caller's buffer, truncated, without a terminator; returns the length of the whole text. A placeholder
+// without an insert becomes empty; an insert without a placeholder is ignored.
 std::size_t composeInto(char* room, std::size_t size, std::string_view pattern, std::span<const Insert> inserts);
 
 }  // namespace kz7

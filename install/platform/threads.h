@@ -10,7 +10,7 @@ namespace kz7 {
 
 enum class ThreadHandle : std::uint64_t { none = 0 };
 
-// What a new thread calls.
+// The function of a new thread and its argument.
 struct ThreadStart {
     void (*function)(void*) = nullptr;
     void* argument = nullptr;
@@ -22,7 +22,7 @@ struct ThreadStart {
     }
 };
 
-// kInvalidHandle: a closed handle or none. All calls come from one thread.
+// kInvalidHandle: the null handle or one that is not open. One thread.
 class IThreads {
 public:
     virtual ~IThreads() = default;
@@ -33,7 +33,7 @@ public:
     virtual Status startThread(std::unique_ptr<ThreadStart>& record, std::uint32_t stackBytes, std::uint32_t& id,
                                ThreadHandle& thread) = 0;
 
-    // Waits until the thread has ended; its writes are then visible. May be called again.
+    // Waits until the thread has ended. May be called again.
     virtual Status waitThread(ThreadHandle thread) = 0;
 
     // A thread that has not ended continues to run.

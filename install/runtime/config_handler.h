@@ -30,7 +30,7 @@ struct ConfigurationTarget {
 // No exception leaves an operation; kNoMemory: memory ran out, and the object stays usable.
 class KZ7CfgHandler {
 public:
-    // The engine, which knows where the copy lies, and the profile registry outlive it.
+    // The engine, which has the location of the copy, and the profile registry outlive it.
     KZ7CfgHandler(URE& ure, ProfileRegistry& profile, const ConfigurationTarget& target)
         : ure_(ure), profile_(profile), target_(target) {}
 

@@ -17,8 +17,8 @@
 namespace kz7 {
 
 inline constexpr std::size_t kCommandLineSize = 780;          // characters of a command line with its terminator
-inline constexpr std::uint32_t kStandardOutputMessage = 997;  // posts what a program wrote
-inline constexpr std::uint32_t kStandardErrorMessage = 999;   // posts what a program wrote on standard error
+inline constexpr std::uint32_t kStandardOutputMessage = 997;  // the message with a program's standard output
+inline constexpr std::uint32_t kStandardErrorMessage = 999;   // the message with its standard error
 inline constexpr std::uint32_t kPostedByProcess = 0x4000000;  // added to the flags of either post
 
 using CommandLine = FixedText<kCommandLineSize>;

@@ -21,24 +21,24 @@ struct Installation {
     URE& ure;
 };
 
-// Reads a property into a buffer that may count characters; as below, but name and room are given.
+// As below, for a buffer whose limit may count characters; the name and the buffer are not null.
 Status readProperty(const Installation& at, const char* name, Buffer& value);
 
 // Reads a property into `size` bytes. A deferred action reads the saved value first, but kReadableWhenScheduled first
-// from the installer: the user can write the saved values. On success the value is terminated and `size` is what it
-// took: without the NUL where the installer answered, with it where a deferred action read what was saved.
-// kMissingItem: an immediate action gave no name or no buffer; kInvalidParameter: a deferred one gave no name, buffer
-// or size; else the installer's status, kMoreData with its hint in `size`.
+// from the installer: the user can write the saved values. On success the value is terminated and `size` is its size:
+// with the NUL for a saved value, without it for a value of the installer. kInvalidParameter: an argument is null;
+// kMissingItem: the name or the buffer is null in an immediate action; else the installer's status, for kMoreData with
+// its hint in `size`.
 Status iMsiGetProperty(const Installation& at, const char* name, char* buffer, std::uint32_t* size);
 
-// The installer's status. Null for a value unsets the property.
+// Returns the installer's status. A null value unsets the property.
 Status iMsiSetProperty(const Installation& at, const char* name, const char* value);
 
 // Deletes what an earlier installation saved, then saves the properties of the installation's table, those of
 // kSavedPropertyNames, the states of some features and the keywords of the response file; values that cannot be read or
 // have kPropertySize characters and more are left out. The engine's product abbreviation becomes that of the property
 // kProductKeyword, if it is set.
-// kNoInstallationDatabase, or the first failure of the installer in giving the table.
+// Returns kNoInstallationDatabase, or the first failure to read the table.
 Status iSavePropertiesForDeferred(const Installation& at);
 
 // Deletes the saved values; succeeds if none exist.

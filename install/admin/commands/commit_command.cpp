@@ -7,7 +7,7 @@
 #include "install/admin/copy_location.h"
 #include "install/admin/given_name.h"
 #include "install/admin/input_file.h"
-#include "install/platform/program.h"
+#include "install/platform/host_information.h"
 #include "install/platform/text.h"
 #include "install/runtime/config_handler.h"
 #include "install/runtime/observers/log_observer.h"

@@ -13,14 +13,15 @@ namespace {
 
 constexpr int kNotStarted = 127;  // as in shells; all other codes are the program's
 
-Answer runProgram(Admin& admin, const std::vector<std::string>& command, bool isJson) {
+// The exit code, which may be any number.
+int runProgram(Admin& admin, const std::vector<std::string>& command, bool isJson) {
     if (!admin.open(true)) {
         return kAnswerFault;
     }
     if (!canPassWords(command)) {
         admin.tell(shownText(command.front()) +
                    ": a batch file is given no argument with a quotation mark, a percent sign or a control character");
-        return static_cast<Answer>(kNotStarted);
+        return kNotStarted;
     }
     IPlatform& platform = admin.platform();
     MemoryConsole kept;
@@ -34,7 +35,7 @@ Answer runProgram(Admin& admin, const std::vector<std::string>& command, bool is
         admin.write(json.field("output", kept.output).end().take(), Admin::Form::document);
     }
     if (status == kSuccess) {
-        return static_cast<Answer>(exitCode);
+        return static_cast<int>(exitCode);
     }
     const std::string program = shownText(command.front());
     if (isNotFound(status)) {
@@ -43,7 +44,7 @@ Answer runProgram(Admin& admin, const std::vector<std::string>& command, bool is
     } else {
         admin.tell(compose("cannot run program: %s: error %u", {program, status}));
     }
-    return static_cast<Answer>(kNotStarted);
+    return kNotStarted;
 }
 
 }  // namespace

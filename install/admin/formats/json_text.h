@@ -1,4 +1,4 @@
-// JSON for what programs read. Texts are UTF-8; a lone surrogate, which UTF-8 has no form for, is written as its
+// JSON for what programs read. Texts are UTF-8; a lone surrogate, which UTF-8 cannot represent, is written as its
 // escape.
 #pragma once
 

@@ -35,8 +35,8 @@ struct TextFault {
     std::string reason;
 };
 
-// Takes a whole file: UTF-8 with or without a mark, or UTF-16LE with one; the older form with the header
-// REGEDIT4 in the machine's narrow encoding. False at the first bad line, with nothing given but `fault`.
+// Parses a whole file: UTF-8 with or without a byte order mark, or UTF-16LE with one; the older form with the header
+// REGEDIT4 in the machine's narrow encoding. False at the first bad line; only `fault` is then set.
 bool parseRegText(std::string_view file, std::vector<KeyChange>& changes, TextFault& fault);
 
 }  // namespace kz7

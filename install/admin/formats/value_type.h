@@ -14,7 +14,7 @@ std::string typeName(ValueType type);
 // The number in a dword of 4 bytes or a qword of 8 bytes; false for all other data.
 bool numberOf(ValueType type, std::string_view data, std::uint64_t& number);
 
-// The data for a person, with a blank before each part.
+// The data for people, with a blank before each part.
 std::string shownData(ValueType type, std::string_view data);
 
 // The members of a JSON object that hold the data: "type", "bytes", and "text" or "number" where it is one.

@@ -24,14 +24,14 @@ public:
     void takeIds(const std::vector<std::string_view>& fields);
     void takeTimes(const std::vector<std::string_view>& fields);
 
-    // What is done so far belongs to earlier phases. `now` is in seconds, from any origin.
+    // The tasks that have ended belong to earlier phases. `now` is in seconds, from any origin.
     void beginPhase();
     void startTask(std::int32_t task, std::uint64_t now);
     void endTask(std::int32_t task, std::uint64_t now);
     void completePhase();
 
-    // Of the phase, which is taken to be all that is left; it never goes back in a phase. Below 0: no task was
-    // announced.
+    // Percentage of the current phase, which is assumed to be the last; it never decreases within a phase. Below 0: no
+    // task was announced.
     int percent();
 
     // Estimated seconds until all announced tasks have ended; 0: unknown, or overdue. An announced time counts as

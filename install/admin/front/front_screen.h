@@ -29,14 +29,14 @@ public:
     // Redraws the current bar with another time.
     void showTime(std::string_view time);
 
-    // Leaves the bar where it stands: the next one begins below.
+    // Ends the current bar: the next one begins on a new line.
     void leaveBar();
 
     void showLine(std::string_view text);       // on standard output
     void showErrorLine(std::string_view text);  // on standard error
     void showFailure(std::string_view text);    // the same, so that it is seen
 
-    // A question, and where the answer is typed, at the end of a line that is left open.
+    // Shows a question with a prompt, without a line feed at the end.
     void showQuestion(std::string_view text, std::string_view prompt);
 
     // Shows an answer that was not typed on the terminal.

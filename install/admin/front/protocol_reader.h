@@ -1,5 +1,5 @@
-// Reads the progress protocol of an installer program, line by line, and takes anything for a line: what is
-// no line of the protocol is a text of the program's.
+// Parses the progress protocol of an installer program line by line. A line that is not part of the protocol is text of
+// the program.
 #pragma once
 
 #include <cstdint>
@@ -37,11 +37,11 @@ struct ProtocolEvent {
     std::vector<std::string_view> fields = {};
 };
 
-// A line without its line feed. The last field of a line is all that is left of it; only a query, which ends
-// with the proposed answer, is split at its last separator.
+// Parses a line without its line feed. The last field extends to the end of the line; only a query, which ends with the
+// proposed answer, is split at its last separator.
 ProtocolEvent readProtocolLine(std::string_view line);
 
-// Cuts what comes in pieces into lines. A line of more than kMaxLine bytes loses its end.
+// Divides a stream of bytes into lines. A line of more than kMaxLine bytes is truncated.
 class LineCutter {
 public:
     static constexpr std::size_t kMaxLine = std::size_t{64} * 1024;
@@ -49,7 +49,7 @@ public:
     using Taker = std::function<void(std::string_view line)>;
     void add(std::string_view piece, const Taker& take);
 
-    // Gives a last line that has no line feed.
+    // Passes on a last line without a line feed.
     void end(const Taker& take);
 
 private:

@@ -1,5 +1,6 @@
 #include <sys/utsname.h>
 
+#include <cstdlib>
 #include <ctime>
 
 #include "install/platform/embedded/ports.h"
@@ -26,6 +27,11 @@ public:
 };
 
 }  // namespace
+
+std::string environmentText(const char* name) {
+    const char* const value = std::getenv(name);
+    return value == nullptr ? std::string{} : value;
+}
 
 std::unique_ptr<IHostInformation> embeddedHost() {
     return std::make_unique<EmbeddedHost>();

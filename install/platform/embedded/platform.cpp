@@ -82,7 +82,7 @@ private:
     bool isDamaged_ = false;
     std::string directory_;
     std::unique_ptr<IConsole> console_ = standardConsole();
-    std::unique_ptr<IDebugOutput> debugOutput_ = embeddedDebugOutput(*console_);
+    std::unique_ptr<IDebugOutput> debugOutput_ = hostDebugOutput(*console_, nullptr);
     std::unique_ptr<IFileSystem> files_ = embeddedFiles(directory_);
     EmbeddedRegistry registry_;
     EmbeddedHistory history_{registry_};

@@ -12,9 +12,6 @@ namespace kz7 {
 // that no file gets their number, and stops ignoring the end of children.
 void settleInheritedState();
 
-// Writes its texts to standard error if KZ7_DEBUG=1 is set: this host has no debugger that listens.
-std::unique_ptr<IDebugOutput> embeddedDebugOutput(IConsole& console);
-
 std::unique_ptr<IFileSystem> embeddedFiles(std::string stateDirectory);
 std::unique_ptr<IProcessHost> embeddedProcesses(std::string stateDirectory);
 std::unique_ptr<IThreads> embeddedThreads();

@@ -9,11 +9,11 @@
 #include <algorithm>
 #include <array>
 #include <chrono>
-#include <cstdlib>
 #include <string_view>
 #include <vector>
 
 #include "install/platform/embedded/paths.h"
+#include "install/platform/host_information.h"
 #include "install/platform/text.h"
 
 namespace kz7 {
@@ -21,11 +21,6 @@ namespace {
 
 constexpr std::string_view kLogs[] = {"-wal", "-journal"};
 constexpr std::size_t kNoiseSize = 16;  // bytes of randomness in the name of an unfinished store
-
-std::string environment(const char* name) {
-    const char* value = std::getenv(name);
-    return value == nullptr ? std::string{} : value;
-}
 
 std::string unfinishedPrefix() {
     return std::string(kStoreName) + '.';
@@ -66,16 +61,16 @@ int makeOne(const std::string& path) {
 }  // namespace
 
 std::string usualStateDirectory() {
-    if (std::string named = environment("KZ7_STATE_DIR"); !named.empty()) {
+    if (std::string named = environmentText("KZ7_STATE_DIR"); !named.empty()) {
         return named;
     }
     if (geteuid() == 0) {
         return kMachineStateDirectory;
     }
-    if (const std::string state = environment("XDG_STATE_HOME"); !state.empty()) {
+    if (const std::string state = environmentText("XDG_STATE_HOME"); !state.empty()) {
         return state + "/kz7";
     }
-    const std::string home = environment("HOME");
+    const std::string home = environmentText("HOME");
     return home.empty() ? std::string{} : home + "/.local/state/kz7";
 }
 

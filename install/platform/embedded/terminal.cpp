@@ -8,8 +8,7 @@
 #include <charconv>
 #include <csignal>
 #include <cstdio>
-#include <cstdlib>
-#include <string_view>
+#include <string>
 
 #include "install/platform/embedded/ports.h"
 
@@ -19,14 +18,9 @@ namespace {
 constexpr std::uint32_t kUsualColumns = 80;
 constexpr int kPollInterval = 100;  // milliseconds between two checks of endReading()
 
-std::string_view environment(const char* name) {
-    const char* value = std::getenv(name);
-    return value == nullptr ? std::string_view{} : value;
-}
-
 // $COLUMNS, which overrides the terminal, or the width of its window.
 std::uint32_t columnsOf(int descriptor) {
-    const std::string_view named = environment("COLUMNS");
+    const std::string named = environmentText("COLUMNS");
     std::uint32_t columns = 0;
     if (std::from_chars(named.data(), named.data() + named.size(), columns).ec == std::errc{} && columns != 0) {
         return columns;
@@ -55,9 +49,9 @@ public:
         view.terminal = isatty(descriptor) == 1;
         if (view.terminal) {
             view.columns = columnsOf(descriptor);
-            const std::string_view kind = environment("TERM");
+            const std::string kind = environmentText("TERM");
             view.redraws = !kind.empty() && kind != "dumb";
-            view.colours = view.redraws && environment("NO_COLOR").empty();
+            view.colours = view.redraws && environmentText("NO_COLOR").empty();
         }
         return view;
     }

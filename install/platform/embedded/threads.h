@@ -7,8 +7,8 @@
 
 namespace kz7 {
 
-// Prepares a thread that receives no signals and has a stack of that many bytes (0: the default size). Returns an error
-// number, or 0 and attributes that the caller destroys.
+// Attributes of a thread that receives no signals and has a stack of that many bytes (0: the default size). Returns 0
+// or an error number. The caller destroys the attributes.
 int makeThreadAttributes(std::size_t stackBytes, pthread_attr_t& attributes);
 
 }  // namespace kz7

@@ -28,9 +28,8 @@ class ICallObserver {
 public:
     virtual ~ICallObserver() = default;
 
-    // Called before each call that returns a status. Any result but kSuccess becomes the result of the call, which is
-    // then not made. A close is always made, so that a handle that remains open was left open by the caller of the
-    // port.
+    // Called before each call that returns a status. Any result but kSuccess becomes the result of the call, and the
+    // port is not called. Only handles are closed in any case, so that a leak of a handle is always the caller's.
     virtual Status before() { return kSuccess; }
 
     // Called after each call, on the thread that made it.

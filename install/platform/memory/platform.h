@@ -5,7 +5,6 @@
 #include "install/platform/memory/process_host.h"
 #include "install/platform/memory/registry.h"
 #include "install/platform/memory/small_ports.h"
-#include "install/platform/memory/threads.h"
 #include "install/platform/platform.h"
 #include "install/platform/service_records.h"
 

@@ -1,4 +1,4 @@
-// The registry port in memory, for tests and for dry runs. Handles are numbers in a table, so that closed handles and
+// The registry port in memory, for tests and check mode. Handles are numbers in a table, so that closed handles and
 // handles of deleted keys return the same results as elsewhere.
 #pragma once
 

@@ -1,7 +1,7 @@
 // The small ports in memory. Tests set up and read their public members.
 #pragma once
 
-#include <algorithm>
+#include <cstdio>
 #include <map>
 #include <string>
 #include <vector>
@@ -13,6 +13,7 @@
 #include "install/platform/library_loader.h"
 #include "install/platform/registry_path.h"
 #include "install/platform/terminal.h"
+#include "install/platform/threads.h"
 
 namespace kz7 {
 
@@ -66,15 +67,11 @@ public:
 class MemoryTerminal final : public ITerminal {
 public:
     Status readLine(Buffer& line) override {
-        if (input.empty()) {
-            return kEndOfFile;
-        }
-        const std::size_t end = std::min(input.find('\n'), input.size());
-        std::string_view text(input.data(), end);
-        text.remove_suffix(text.ends_with('\r') ? 1 : 0);
-        line.size = static_cast<std::uint32_t>(cutText(text, line.limit).copy(line.data, line.capacity));
-        input.erase(0, end + 1);
-        return kSuccess;
+        std::size_t taken = 0;
+        const auto next = [&] { return taken < input.size() ? static_cast<unsigned char>(input[taken++]) : EOF; };
+        const Status status = readLineOf(next, line);
+        input.erase(0, taken);
+        return status;
     }
     void endReading() override {}  // no read waits
     void keepLineFeeds(bool on) override { keepsLineFeeds = on; }
@@ -85,6 +82,40 @@ public:
     TerminalView view;
     bool keepsLineFeeds = false;
     bool leavesInterrupts = false;
+};
+
+// Threads that never run on their own: the function of a thread runs when the thread is waited for or closed, in the
+// calling thread, so that tests always run in the same order.
+class MemoryThreads final : public IThreads {
+public:
+    Status startThread(std::unique_ptr<ThreadStart>& record, std::uint32_t, std::uint32_t& id,
+                       ThreadHandle& thread) override {
+        id = ++lastId_;
+        thread = ThreadHandle{lastId_};
+        threads_.emplace(thread, std::move(record));
+        return kSuccess;
+    }
+    Status waitThread(ThreadHandle thread) override {
+        const auto found = threads_.find(thread);
+        if (found == threads_.end()) {
+            return kInvalidHandle;
+        }
+        if (found->second != nullptr) {
+            ThreadStart::run(found->second.release());
+        }
+        return kSuccess;
+    }
+    Status closeThread(ThreadHandle thread) override {
+        const Status status = waitThread(thread);
+        threads_.erase(thread);
+        return status;
+    }
+
+    std::size_t openHandles() const { return threads_.size(); }
+
+private:
+    std::map<ThreadHandle, std::unique_ptr<ThreadStart>> threads_;  // null: it has run
+    std::uint32_t lastId_ = 0;
 };
 
 // Entry points of this program, by the path of their library and their name.

@@ -64,14 +64,7 @@ public:
             return;
         }
         const std::string path = windows + "\\Microsoft.NET\\Framework64\\" + generation.folder + "\\fusion.dll";
-        library_ = LoadLibraryExW(WideText(path).c_str(), nullptr, LOAD_WITH_ALTERED_SEARCH_PATH);
-    }
-    Fusion(const Fusion&) = delete;
-    Fusion& operator=(const Fusion&) = delete;
-    ~Fusion() {
-        if (library_ != nullptr) {
-            FreeLibrary(library_);
-        }
+        library_.reset(LoadLibraryExW(WideText(path).c_str(), nullptr, LOAD_WITH_ALTERED_SEARCH_PATH));
     }
 
     explicit operator bool() const { return library_ != nullptr; }
@@ -96,11 +89,11 @@ public:
 private:
     template <typename Function, typename... Arguments>
     Status call(const char* name, Arguments... arguments) const {
-        const FARPROC entry = GetProcAddress(library_, name);
+        const FARPROC entry = GetProcAddress(library_.get(), name);
         return entry == nullptr ? kProcedureNotFound : statusOf(std::bit_cast<Function>(entry)(arguments...));
     }
 
-    HMODULE library_ = nullptr;
+    NativeLibrary library_;
 };
 
 // Whether a cached assembly is a provider of a level: version 9.1.0.x belongs to level 9.1.0.

@@ -26,7 +26,7 @@ public:
     Status release();
 
 private:
-    // False: another program has it. True: this program has it, or goes on without one.
+    // False: another program has the lock. True: this program has it, or continues without it.
     bool tryHold();
 
     bool isWanted_;

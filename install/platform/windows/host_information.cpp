@@ -5,8 +5,8 @@
 
 #include <ctime>
 
-#include "install/platform/encoding.h"
 #include "install/platform/registry_path.h"
+#include "install/platform/windows/wide_text.h"
 
 namespace kz7 {
 namespace {
@@ -44,6 +44,11 @@ public:
 };
 
 }  // namespace
+
+std::string environmentText(const char* name) {
+    const WideText wide(name);
+    return textOf([&](wchar_t* room, DWORD size) { return GetEnvironmentVariableW(wide.c_str(), room, size); });
+}
 
 std::unique_ptr<IHostInformation> windowsHost() {
     return std::make_unique<WindowsHost>();

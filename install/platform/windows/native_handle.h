@@ -21,6 +21,12 @@ Owner owned(HANDLE handle) {
     return Owner(handle == INVALID_HANDLE_VALUE ? nullptr : handle);
 }
 
+struct FreeModule {
+    using pointer = HMODULE;
+    void operator()(HMODULE library) const { FreeLibrary(library); }
+};
+using NativeLibrary = std::unique_ptr<void, FreeModule>;
+
 struct FreeLocal {
     void operator()(void* memory) const { LocalFree(memory); }
 };

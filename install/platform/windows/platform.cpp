@@ -27,8 +27,7 @@ public:
 
     // In the user's profile, where no other user can place a file or a link first.
     Status ownFolder(std::string& path) override {
-        const std::string folder =
-            textOf([](wchar_t* room, DWORD size) { return GetEnvironmentVariableW(L"LOCALAPPDATA", room, size); });
+        const std::string folder = environmentText("LOCALAPPDATA");
         const std::string own = folder + "\\KZ7";
         if (folder.empty() ||
             (CreateDirectoryW(WideText(own).c_str(), nullptr) == FALSE && GetLastError() != ERROR_ALREADY_EXISTS)) {
@@ -53,7 +52,8 @@ private:
     std::string program_;
     bool faultTold_ = false;
     std::unique_ptr<IConsole> console_ = windowsConsole();
-    std::unique_ptr<IDebugOutput> debugOutput_ = windowsDebugOutput(*console_);
+    std::unique_ptr<IDebugOutput> debugOutput_ =
+        hostDebugOutput(*console_, [](std::string_view text) { OutputDebugStringW(WideText(text).c_str()); });
     std::unique_ptr<IFileSystem> files_ = windowsFiles();
     ChangeLock lock_;
     std::unique_ptr<IRegistryStore> registry_ = windowsRegistry(lock_);

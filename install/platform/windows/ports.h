@@ -12,7 +12,6 @@ class ChangeLock;
 std::unique_ptr<IRegistryStore> windowsRegistry(ChangeLock& lock);
 std::unique_ptr<IServiceManager> windowsServices(ChangeLock& lock);
 std::unique_ptr<IConsole> windowsConsole();
-std::unique_ptr<IDebugOutput> windowsDebugOutput(IConsole& console);
 std::unique_ptr<IFileSystem> windowsFiles();
 std::unique_ptr<IProcessHost> windowsProcesses();
 std::unique_ptr<IThreads> windowsThreads();

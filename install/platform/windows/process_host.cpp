@@ -103,14 +103,13 @@ bool isFoundByName(std::string_view program) {
     for (const auto systemFolder : {GetSystemDirectoryW, GetWindowsDirectoryW}) {
         folders.append(";").append(textOf(systemFolder));
     }
-    folders.append(";").append(
-        textOf([](wchar_t* room, DWORD size) { return GetEnvironmentVariableW(L"PATH", room, size); }));
+    folders.append(";").append(environmentText("PATH"));
     return SearchPathW(WideText(folders).c_str(), WideText(program).c_str(), L".exe", 0, nullptr, nullptr) != 0;
 }
 
 // Whether the program that the system would choose depends on the current folder or drive. The system takes the first
 // reading of which a file exists; after a bare name that is not found it may be "a b\c.exe".
-bool hangsOnCurrentFolder(const std::vector<CommandReading>& readings) {
+bool dependsOnCurrentFolder(const std::vector<CommandReading>& readings) {
     for (const CommandReading& reading : readings) {
         if (!isBareName(reading.program)) {
             return !isAbsolutePath(reading.program);
@@ -218,7 +217,7 @@ public:
     Status startProcess(const ProcessStart& start, ProcessInformation& started) override {
         const std::vector<CommandReading> readings = commandReadings(start.commandLine);
         const SearchWithoutCurrentFolder search;
-        if (readings.empty() || hangsOnCurrentFolder(readings)) {
+        if (readings.empty() || dependsOnCurrentFolder(readings)) {
             return kFileNotFound;
         }
         const std::string directory(start.workingDirectory);

@@ -13,11 +13,6 @@ std::FILE* openInput(const char* path) {
     return _wfopen(WideText(path).c_str(), L"rb");
 }
 
-std::string environmentText(const char* name) {
-    const WideText wide(name);
-    return textOf([&](wchar_t* room, DWORD size) { return GetEnvironmentVariableW(wide.c_str(), room, size); });
-}
-
 }  // namespace kz7
 
 // Takes the wide vector of the C runtime. CommandLineToArgvW() splits `"a""b" c` differently, and the narrow vector is

@@ -6,7 +6,6 @@
 
 #include <atomic>
 #include <cstdio>
-#include <cstdlib>
 #include <string>
 #include <vector>
 
@@ -87,8 +86,7 @@ public:
             if (view.redraws && (mode & ENABLE_VIRTUAL_TERMINAL_PROCESSING) == 0) {
                 changed_.push_back({handle, mode});
             }
-            const char* noColour = std::getenv("NO_COLOR");
-            view.colours = view.redraws && (noColour == nullptr || *noColour == '\0');
+            view.colours = view.redraws && environmentText("NO_COLOR").empty();
         }
         return view;
     }

@@ -19,6 +19,6 @@ inline constexpr std::string_view kCopy32            = "SOFTWARE\\Wow6432Node\\N
 
 inline constexpr std::string_view kPathName = "KZ7 Path Name";                // a copy's install location
 inline constexpr std::string_view kVersion9Marker = "MULTI_VERSION_SUPPORT";  // a value of a copy's components
-inline constexpr std::string_view kVersion8Copy = "KZ7V8";                    // stands for a version-8 installation
+inline constexpr std::string_view kVersion8Copy = "KZ7V8";  // the name of a version-8 installation in lists of copies
 
 }  // namespace kz7::layout

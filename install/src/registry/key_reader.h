@@ -1,5 +1,4 @@
-// Reads keys whole: all values, all subkeys, data of any size. Its buffers are kept for many keys and grow with what
-// they are given.
+// Reads whole keys: all values, all subkeys, data of any size. Its buffers are used for many keys and grow as needed.
 #pragma once
 
 #include <memory>

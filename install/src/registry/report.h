@@ -15,7 +15,7 @@
 
 namespace kz7 {
 
-// When an error line tells of no failure: with this status only, never, or always.
+// When an error line reports no failure: with this status only, never, or always.
 inline constexpr Status kNever = kSuccess;
 inline constexpr Status kAlways = kFailed;
 
