@@ -52,7 +52,7 @@ on_windows() {
     compare_foretold wine "$windows/kz7admin.exe"
     local code
     code=$(tr -d '\r' <told | sed -n '$s/^exit code //p')
-    tr -d '\r' <told | head -c "-$((${#code} + 12))" | iconv -f "CP$page" -t UTF-8 >output
+    tr -d '\r' <told | head -c "-$((${#code} + 12))" | iconv -f "CP$page" -t UTF-8 | spell >output
     tr -d '\r' <error_told | iconv -f "CP$page" -t UTF-8 >error
     local seen=$((code & 255))
     [ "$code" -eq 0 ] || [ $seen -ne 0 ] || seen=1
@@ -76,7 +76,9 @@ show() {
 }
 
 # What check mode foretells is what the run then changes: foretell KZ7ADMIN -- COMMAND, the run, compare_foretold KZ7ADMIN.
-product_lines() { tr -d '\r' | grep -aE '^[-+~] (service |.*\\(NVQ\\KZ7|KZ7 Management Service))' || true; }
+product_lines() { tr -d '\r' | { grep -aE '^[-+~] (service |.*\\(NVQ\\KZ7|KZ7 Management Service))' || true; } | spell; }
+# Keys above the product's are spelled as Windows has them, or as the product names them.
+spell() { LC_ALL=C sed 's/HKLM\\Software\\/HKLM\\SOFTWARE\\/; s/HKLM\\System\\/HKLM\\SYSTEM\\/; s/\\Eventlog\\/\\EventLog\\/'; }
 foretell() {
     [ "$program" = kz7InstallReg ] || return 0
     local admin=()

@@ -1,4 +1,5 @@
 #include <CLI/CLI.hpp>
+#include <algorithm>
 
 #include "install/admin/change_report.h"
 #include "install/admin/commands/commands.h"
@@ -46,10 +47,12 @@ Answer restoreKeys(Admin& admin, const RestoreOptions& options, RegistrySource& 
     std::vector<const Change*> conflicts;
     std::string key;
     Status status = findConflicts(admin.registry(), isOwn, run.changes, conflicts, key);
-    if (status != kSuccess || !conflicts.empty()) {
+    const auto twin = std::find_if(conflicts.begin(), conflicts.end(),
+                                   [](const Change* conflict) { return conflict->kind == Change::Kind::keyCreated; });
+    if (status != kSuccess || twin != conflicts.end()) {
         return status != kSuccess ? admin.storeFault("cannot read: " + shownText(key), status)
-                                  : admin.fault("cannot restore: " + shownText(conflicts.front()->key) +
-                                                " was changed, or exists under another spelling of its name");
+                                  : admin.fault("cannot restore: " + shownText((*twin)->key) +
+                                                " exists under another spelling of its name");
     }
     if (!options.check) {
         admin.beginRun();
