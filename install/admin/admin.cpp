@@ -35,7 +35,7 @@ void Admin::beginRun(bool startsPrograms, std::uint64_t undoes) {
     }
 }
 
-void Admin::endRun(Answer result) {
+void Admin::endRun(int result) {
     if (platform_ != nullptr && platform_->history() != nullptr && !readOnly_) {
         platform_->history()->end(static_cast<Status>(result == kAnswerChanged ? kAnswerYes : result));
     }

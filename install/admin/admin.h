@@ -38,7 +38,7 @@ public:
 
     // Describes the run that changes the store, for the history; `undoes` is the run that it takes back.
     void beginRun(bool startsPrograms = false, std::uint64_t undoes = 0);
-    void endRun(Answer result);
+    void endRun(int result);
 
     // The properties of standard output.
     TerminalView output() { return platform_->terminal().look(TerminalStream::output); }

@@ -82,7 +82,7 @@ int run(int argc, char** argv) {
         std::fputs("kz7admin: no command (see --help)\n", stderr);
         return kAnswerFault;
     }
-    const Answer answer = admin.answer();
+    const int answer = admin.answer();
     admin.endRun(answer);
     return answer;
 }
