@@ -314,7 +314,8 @@ killed_runs() {
         sleep "0.$(printf '%03d' $((RANDOM % 500)))"
         kill -9 $! 2>/dev/null || true
         wait $! 2>/dev/null || true
-        run=$(wine "$windows/kz7admin.exe" history 2>/dev/null | tr -d '\r' | awk '$4 == "kz7InstallReg" && !seen++ { print $1 }')
+        # Nothing is recorded of a run that is killed before its first change.
+        run=$({ wine "$windows/kz7admin.exe" history 2>/dev/null || true; } | tr -d '\r' | awk '$4 == "kz7InstallReg" && !seen++ { print $1 }')
         left >killed
         if ! cmp -s before killed && ! wine "$windows/kz7admin.exe" undo "$run" >undone 2>&1; then
             cat undone

@@ -34,6 +34,7 @@ enum class Reason {
     migrationUnfinished,
     migrationIgnored,
     storeDamaged,
+    runInterrupted,
     versionOrder,
     nameOrder,
     copyRemoved,

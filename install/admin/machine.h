@@ -70,6 +70,11 @@ struct AliasRow {
     bool exact = false;
 };
 
+struct InterruptedRun {
+    std::string number;
+    std::string command;
+};
+
 struct MachineState {
     std::array<bool, kViews.size()> hasView{};           // the key of the copies exists
     std::array<std::string, kViews.size()> defaultCopy;  // the default value of that key
@@ -80,6 +85,7 @@ struct MachineState {
     bool hasBackup = false;                              // of a migration
     bool hasMarker = false;                              // of version 9, in the product's own components
     std::vector<std::string> damages;                    // of the store, if it was examined
+    std::vector<InterruptedRun> interruptedRuns;         // those that nobody took back or repeated; the same
 
     const CopyRow* find(std::string_view name) const;
     bool isDefault(const CopyRow& copy) const { return equalsIgnoreCase(copy.name(), defaultCopy[kNative]); }

@@ -6,16 +6,9 @@
 
 namespace kz7 {
 
-inline Answer openMachine(Admin& admin, Depth depth, MachineState& machine) {
-    if (!admin.open(true)) {
-        return kAnswerFault;
-    }
-    std::string key;
-    const Status status = readMachine(admin.registry(), depth, machine, key);
-    if (status != kSuccess || admin.platform().storeFaultTold()) {
-        return admin.storeFault("cannot read: " + shownText(key), status);
-    }
-    return kAnswerYes;
-}
+Answer openMachine(Admin& admin, Depth depth, MachineState& machine);
+
+// All of it, with the damages of its store and the runs that did not end.
+Answer openWholeMachine(Admin& admin, MachineState& machine);
 
 }  // namespace kz7

@@ -30,6 +30,21 @@ Answer listRuns(Admin& admin, std::vector<HistoryRun>& runs) {
     return status == kSuccess ? kAnswerYes : admin.storeFault("cannot read the history", status);
 }
 
+std::vector<HistoryRun> unfinishedRuns(const std::vector<HistoryRun>& runs) {
+    std::vector<HistoryRun> unfinished;
+    for (const HistoryRun& run : runs) {
+        std::erase_if(unfinished, [&](const HistoryRun& earlier) {
+            return run.state == RunState::ended &&
+                   (run.undoes == earlier.number ||
+                    (run.status == kSuccess && run.program == earlier.program && run.arguments == earlier.arguments));
+        });
+        if (run.state == RunState::interrupted) {
+            unfinished.push_back(run);
+        }
+    }
+    return unfinished;
+}
+
 Answer findRun(Admin& admin, std::uint64_t number, HistoryRun& run) {
     std::vector<HistoryRun> runs;
     if (const Answer listed = listRuns(admin, runs); listed != kAnswerYes) {

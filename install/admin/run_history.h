@@ -13,6 +13,9 @@ namespace kz7 {
 
 Answer listRuns(Admin& admin, std::vector<HistoryRun>& runs);
 
+// The interrupted runs that no later run took back or repeated.
+std::vector<HistoryRun> unfinishedRuns(const std::vector<HistoryRun>& runs);
+
 // kAnswerNo: no run has that number.
 Answer findRun(Admin& admin, std::uint64_t number, HistoryRun& run);
 

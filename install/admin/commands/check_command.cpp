@@ -14,11 +14,6 @@ struct CheckOptions {
     bool json = false;
 };
 
-Answer examineStore(Admin& admin, MachineState& machine) {
-    const Status status = admin.platform().examineStore(machine.damages);
-    return status == kSuccess ? kAnswerYes : admin.storeFault("cannot examine store", status);
-}
-
 std::string findingsText(const std::vector<Finding>& findings) {
     std::string text;
     for (const Finding& finding : findings) {
@@ -36,11 +31,8 @@ std::string findingsJson(Admin& admin, const std::vector<Finding>& findings) {
 
 Answer check(Admin& admin, const CheckOptions& options) {
     MachineState machine;
-    if (const Answer read = openMachine(admin, Depth::whole, machine); read != kAnswerYes) {
+    if (const Answer read = openWholeMachine(admin, machine); read != kAnswerYes) {
         return read;
-    }
-    if (const Answer examined = examineStore(admin, machine); examined != kAnswerYes) {
-        return examined;
     }
     std::vector<Finding> findings = findFindings(machine, admin.platform().files(), options.all);
     if (!options.copy.empty()) {

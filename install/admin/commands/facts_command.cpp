@@ -34,11 +34,8 @@ void appendServices(const MachineState& machine, JsonWriter& json) {
 
 Answer showFacts(Admin& admin) {
     MachineState machine;
-    if (const Answer read = openMachine(admin, Depth::whole, machine); read != kAnswerYes) {
+    if (const Answer read = openWholeMachine(admin, machine); read != kAnswerYes) {
         return read;
-    }
-    if (const Status status = admin.platform().examineStore(machine.damages); status != kSuccess) {
-        return admin.storeFault("cannot examine store", status);
     }
     const std::vector<CopyLine> copies = copyLines(machine, admin.platform().services(), {}, true);
     JsonWriter json;

@@ -1,9 +1,11 @@
 #include <CLI/CLI.hpp>
 
 #include "install/admin/commands/commands.h"
+#include "install/admin/formats/change_text.h"
 #include "install/admin/formats/html_report.h"
 #include "install/admin/given_name.h"
 #include "install/admin/open_machine.h"
+#include "install/admin/run_history.h"
 
 namespace kz7 {
 namespace {
@@ -19,20 +21,39 @@ std::string timeNow(IHostInformation& host) {
     return host.localTime(TimeText::dateAndZone, time) == kSuccess ? std::string(time.text()) : std::string{};
 }
 
+Answer readLastRuns(Admin& admin, std::vector<ReportedRun>& reported) {
+    constexpr std::size_t kRuns = 10;
+    std::vector<HistoryRun> runs;
+    if (const Answer listed = listRuns(admin, runs); listed != kAnswerYes) {
+        return listed;
+    }
+    for (auto run = runs.rbegin(); run != runs.rend() && reported.size() < kRuns; ++run) {
+        ChangeSet changes;
+        if (const Answer read = readRun(admin, *run, changes); read != kAnswerYes) {
+            return read;
+        }
+        reported.push_back(
+            {compose("%s %s: %s, status %s", {utcTime(run->begun), run->user, commandOf(*run), stateOf(*run)}),
+             changeText(changes, false)});
+    }
+    return kAnswerYes;
+}
+
 Answer readReport(Admin& admin, std::string& html) {
     MachineState machine;
-    if (const Answer read = openMachine(admin, Depth::whole, machine); read != kAnswerYes) {
+    if (const Answer read = openWholeMachine(admin, machine); read != kAnswerYes) {
+        return read;
+    }
+    std::vector<ReportedRun> runs;
+    if (const Answer read = readLastRuns(admin, runs); read != kAnswerYes) {
         return read;
     }
     IPlatform& platform = admin.platform();
-    if (const Status status = platform.examineStore(machine.damages); status != kSuccess) {
-        return admin.storeFault("cannot examine store", status);
-    }
     OperatingSystem system;
     platform.host().operatingSystem(system);
     html = htmlReport({platform.storeName(), compose("%s %s %s", {system.name, system.version, system.release}),
                        timeNow(platform.host()), machine, copyLines(machine, platform.services(), {}, false),
-                       findFindings(machine, platform.files(), true)});
+                       findFindings(machine, platform.files(), true), std::move(runs)});
     return platform.storeFaultTold() ? kAnswerFault : kAnswerYes;
 }
 

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <map>
+#include <sstream>
 
 #include "install/platform/shown_text.h"
 #include "install/platform/text.h"
@@ -249,6 +250,28 @@ void appendServices(const ReportSource& source, std::string& html) {
     html += "</section>\n";
 }
 
+void appendRuns(const ReportSource& source, std::string& html) {
+    constexpr std::size_t kLongestText = 20000;  // bytes of the changes of a run
+    beginSection("runs", "Last runs", html);
+    if (source.runs.empty()) {
+        html += "<p>No run is recorded.</p>\n";
+    }
+    for (const ReportedRun& run : source.runs) {
+        std::string text = run.changes;
+        if (text.size() > kLongestText) {
+            text.resize(text.rfind('\n', kLongestText) + 1);
+            text += "... (kz7admin history shows all)\n";
+        }
+        html += "<details><summary>" + escaped(run.title) + "</summary>\n<pre class=\"scroll\" tabindex=\"0\">";
+        std::istringstream lines(text);
+        for (std::string line; std::getline(lines, line);) {
+            html += escaped(line) + '\n';
+        }
+        html += "</pre></details>\n";
+    }
+    html += "</section>\n";
+}
+
 }  // namespace
 
 std::string htmlReport(const ReportSource& source) {
@@ -258,7 +281,8 @@ std::string htmlReport(const ReportSource& source) {
     for (const auto& [id, title] : {std::pair("findings", "Findings"),
                                     {"copies", "Copies"},
                                     {"aliases", "Version aliases"},
-                                    {"services", "Services"}}) {
+                                    {"services", "Services"},
+                                    {"runs", "Last runs"}}) {
         html += "<a href=\"#" + std::string(id) + "\">" + title + "</a> ";
     }
     html += "</p></nav>\n<main>\n";
@@ -266,6 +290,7 @@ std::string htmlReport(const ReportSource& source) {
     appendCopies(source, html);
     appendAliases(source, html);
     appendServices(source, html);
+    appendRuns(source, html);
     return html + "</main>\n</body>\n</html>\n";
 }
 

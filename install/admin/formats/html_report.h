@@ -9,6 +9,11 @@
 
 namespace kz7 {
 
+struct ReportedRun {
+    std::string title;
+    std::string changes;  // a line each
+};
+
 struct ReportSource {
     std::string store;
     std::string host;
@@ -16,6 +21,7 @@ struct ReportSource {
     const MachineState& machine;
     std::vector<CopyLine> copies;
     std::vector<Finding> findings;  // also those that are in order
+    std::vector<ReportedRun> runs;  // the last one first
 };
 
 std::string htmlReport(const ReportSource& source);
