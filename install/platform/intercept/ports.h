@@ -150,8 +150,8 @@ public:
           terminal_(*real.terminal, observer) {}
 
     Ports ports() {
-        return {&registry_, &services_,  &console_,    real_.debugOutput, &files_,    &processes_,
-                &threads_,  &libraries_, &assemblies_, &host_,            &terminal_, real_.history};
+        return {&registry_,  &services_,   &console_, real_.debugOutput, &files_,      &processes_, &threads_,
+                &libraries_, &assemblies_, &host_,    &terminal_,        real_.history};
     }
 
 private:

@@ -19,6 +19,15 @@ bool isRoot(KeyHandle key) {
     return key == KeyHandle::localMachine || key == KeyHandle::users || key == KeyHandle::currentUser;
 }
 
+// The values that the run has not touched yet, as they are before it.
+void addValues(TouchedRows::Key& key, std::vector<KeyValue>& values) {
+    for (KeyValue& value : values) {
+        if (key.find(value.name) == nullptr) {
+            key.add(std::move(value));
+        }
+    }
+}
+
 }  // namespace
 
 // The name and the class as the store has them. The last name of a key that does not exist is taken as it is given.
@@ -137,11 +146,7 @@ void ChangeRecorder::list(const KeyName& name, Key& key) {
     Status status = registry_.openKey(name.root, name.path, kKeyWalk | kKeyOpenLink, opened.receive());
     status = status == kSuccess ? reader_.values(opened.get(), values) : status;
     keep(status);
-    for (KeyValue& value : values) {
-        if (key.find(value.name) == nullptr) {
-            key.add(std::move(value));
-        }
-    }
+    addValues(key, values);
 }
 
 template <typename Call>
@@ -238,11 +243,7 @@ void ChangeRecorder::beforeTree(const KeyName& name) {
             key.before = key.now = true;
         }
         if (!std::exchange(key.isListed, true)) {
-            for (KeyValue& value : record.values) {
-                if (key.find(value.name) == nullptr) {
-                    key.add(std::move(value));
-                }
-            }
+            addValues(key, record.values);
         }
     }
 }
