@@ -136,6 +136,17 @@ std::uint64_t firstLeft(const std::vector<HistoryRun>& runs, const HistoryOption
     return first == runs.end() ? runs.back().number + 1 : first->number;
 }
 
+Answer showTrimmed(Admin& admin, const HistoryOptions& options, std::uint32_t removed) {
+    if (options.json) {
+        return admin.write(compose("{\"schema\":1,\"check\":%s,\"changed\":%s,\"removed\":%u}\n",
+                                   {options.check ? "true" : "false", removed == 0 ? "false" : "true", removed}),
+                           Admin::Form::document);
+    }
+    return admin.write(removed == 0 ? "unchanged\n"
+                                    : compose("%s: %u run%s\n", {options.check ? "would remove" : "removed", removed,
+                                                                 removed == 1 ? "" : "s"}));
+}
+
 Answer trim(Admin& admin, const HistoryOptions& options) {
     std::vector<HistoryRun> runs;
     if (!admin.open(options.check, true)) {
@@ -153,17 +164,8 @@ Answer trim(Admin& admin, const HistoryOptions& options) {
         const Status committed = admin.registry().commit();
         status = status == kSuccess ? committed : status;
     }
-    if (status != kSuccess) {
-        return admin.storeFault("cannot trim the history", status);
-    }
-    if (options.json) {
-        return admin.write(compose("{\"schema\":1,\"check\":%s,\"changed\":%s,\"removed\":%u}\n",
-                                   {options.check ? "true" : "false", removed == 0 ? "false" : "true", removed}),
-                           Admin::Form::document);
-    }
-    return admin.write(removed == 0 ? "unchanged\n"
-                                    : compose("%s: %u run%s\n", {options.check ? "would remove" : "removed", removed,
-                                                                 removed == 1 ? "" : "s"}));
+    return status == kSuccess ? showTrimmed(admin, options, removed)
+                              : admin.storeFault("cannot trim the history", status);
 }
 
 Answer turn(Admin& admin, const HistoryOptions& options) {
