@@ -25,7 +25,7 @@ using SortedCopies = std::map<std::string, std::string>;  // version text -> nam
 // The debugger output of this machine, which nobody reads.
 struct Debug {
     const std::unique_ptr<IConsole> console = standardConsole();
-    const std::unique_ptr<IDebugOutput> output = embeddedDebugOutput(*console);
+    const std::unique_ptr<IDebugOutput> output = hostDebugOutput(*console, nullptr);
 };
 
 void require(bool condition, const char* what) {

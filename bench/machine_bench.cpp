@@ -118,10 +118,14 @@ void report(benchmark::State& state) {
     Copies& copies = copiesOf(state.range(0));
     for (auto _ : state) {
         const MachineState machine = copies.read(Depth::whole);
-        benchmark::DoNotOptimize(
-            htmlReport({"store", "host", "time", machine, copyLines(machine, copies.services_, {}, false),
-                        findFindings(machine, *copies.files_, true)})
-                .size());
+        benchmark::DoNotOptimize(htmlReport({"store",
+                                             "host",
+                                             "time",
+                                             machine,
+                                             copyLines(machine, copies.services_, {}, false),
+                                             findFindings(machine, *copies.files_, true),
+                                             {}})
+                                     .size());
         copies.registry_.commit();
     }
 }

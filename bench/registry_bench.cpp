@@ -201,7 +201,7 @@ void copiesList(benchmark::State& state) {
                 setText(registry, path + "\\Components", "BASE_CLIENT", "") == kSuccess);
     }
     const std::unique_ptr<IConsole> console = standardConsole();
-    const std::unique_ptr<IDebugOutput> debug = embeddedDebugOutput(*console);
+    const std::unique_ptr<IDebugOutput> debug = hostDebugOutput(*console, nullptr);
     for (auto step : state) {
         InstallCopyList copies(registry, *debug, false, false);
         require(copies.count() == state.range(0) && copies.findByName("copy9") != nullptr);

@@ -37,16 +37,7 @@ void tellFault(const std::string& reason) {
     std::fputs(narrowFromText("kz7admin: " + reason + '\n').c_str(), stderr);
 }
 
-int run(int argc, char** argv) {
-    Admin admin;
-    admin.arguments.assign(argv + (argc == 0 ? 0 : 1), argv + argc);
-    CLI::App program("Inspects and changes the registry data that kz7InstallReg writes", "kz7admin");
-    program.add_option("--store", admin.storeDirectory, "The state directory to use instead of the usual one")
-        ->check(givenName());
-    program.footer(kFooter);
-    program.get_formatter()->column_width(24);  // help fits 80 columns
-    program.require_subcommand(0, 1);
-    program.fallthrough();
+void addCommands(CLI::App& program, Admin& admin) {
     addAliasesCommand(program, admin);
     addApplyCommand(program, admin);
     addBackupCommand(program, admin);
@@ -67,6 +58,19 @@ int run(int argc, char** argv) {
     addRestoreCommand(program, admin);
     addTreeCommand(program, admin);
     addUndoCommand(program, admin);
+}
+
+int run(int argc, char** argv) {
+    Admin admin;
+    admin.arguments.assign(argv + (argc == 0 ? 0 : 1), argv + argc);
+    CLI::App program("Inspects and changes the registry data that kz7InstallReg writes", "kz7admin");
+    program.add_option("--store", admin.storeDirectory, "The state directory to use instead of the usual one")
+        ->check(givenName());
+    program.footer(kFooter);
+    program.get_formatter()->column_width(24);  // help fits 80 columns
+    program.require_subcommand(0, 1);
+    program.fallthrough();
+    addCommands(program, admin);
     try {
         program.parse(argc, argv);
     } catch (const CLI::Success& help) {

@@ -65,20 +65,28 @@ Answer RegistrySource::openBefore(std::uint64_t number) {
     }
     registry_ = &memory_;
     std::string key;
-    Status status = applyChangeSet(memory_, nullptr, difference({}, now), key);
-    for (auto each = runs.rbegin(); status == kSuccess && each != runs.rend() && each->number >= number; ++each) {
-        ChangeSet changes;
-        std::vector<const Change*> conflicts;
-        answer = readInverse(admin_, *each, changes);
-        status = answer == kAnswerYes ? findConflicts(memory_, isOwn_, changes, conflicts, key) : kSuccess;
-        if (answer != kAnswerYes || !conflicts.empty()) {
-            return answer != kAnswerYes
-                       ? answer
-                       : admin_.no("the history does not reach back to run " + std::to_string(number) +
-                                   ": other programs changed what run " + std::to_string(each->number) + " changed");
-        }
-        status = applyChangeSet(memory_, nullptr, changes, key);
+    const Status status = applyChangeSet(memory_, nullptr, difference({}, now), key);
+    answer = status == kSuccess ? kAnswerYes : admin_.storeFault("cannot go back: " + shownText(key), status);
+    for (auto each = runs.rbegin(); answer == kAnswerYes && each != runs.rend() && each->number >= number; ++each) {
+        answer = takeBack(*each, number);
     }
+    return answer;
+}
+
+// One of the runs from `number` on.
+Answer RegistrySource::takeBack(const HistoryRun& run, std::uint64_t number) {
+    ChangeSet changes;
+    std::vector<const Change*> conflicts;
+    std::string key;
+    if (const Answer read = readInverse(admin_, run, changes); read != kAnswerYes) {
+        return read;
+    }
+    Status status = findConflicts(memory_, isOwn_, changes, conflicts, key);
+    if (!conflicts.empty()) {
+        return admin_.no("the history does not reach back to run " + std::to_string(number) +
+                         ": other programs changed what run " + std::to_string(run.number) + " changed");
+    }
+    status = status == kSuccess ? applyChangeSet(memory_, nullptr, changes, key) : status;
     return status == kSuccess ? kAnswerYes : admin_.storeFault("cannot go back: " + shownText(key), status);
 }
 

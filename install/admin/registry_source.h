@@ -7,6 +7,7 @@
 #include <string>
 
 #include "install/admin/admin.h"
+#include "install/platform/history.h"
 #include "install/platform/memory/registry.h"
 #include "install/src/registry/change_set.h"
 
@@ -34,6 +35,7 @@ public:
 
 private:
     Answer openBefore(std::uint64_t number);
+    Answer takeBack(const HistoryRun& run, std::uint64_t number);
     Answer openStore(const PlatformOptions& options);
     Answer readFrom(const std::vector<KeyStart>& starts, Status found, bool wholeServices, Snapshot& snapshot);
 

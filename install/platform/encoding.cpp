@@ -59,7 +59,7 @@ void appendUtf8(std::string& text, char32_t character) {
                      : character < 0x10000 ? 2
                                            : 3;  // bytes after the first
     static constexpr std::array<char32_t, 4> kLeads = {0x00, 0xC0, 0xE0, 0xF0};
-    text += static_cast<char>(kLeads[more] | character >> 6 * more);
+    text += static_cast<char>(kLeads[static_cast<std::size_t>(more)] | character >> 6 * more);
     for (int left = more - 1; left >= 0; --left) {
         text += static_cast<char>(0x80 | (character >> 6 * left & 0x3F));
     }
