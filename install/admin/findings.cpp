@@ -388,6 +388,21 @@ std::optional<Finding> judgeNamed(const AliasRow& row, std::size_t view, const C
     return Finding{Reason::aliasLower, {}, row.prefix, view, value.text, should};
 }
 
+// A text of the table has up to two placeholders.
+std::string fill(std::string_view pattern, const std::array<std::string, 2>& inserts) {
+    std::string text(pattern);
+    std::size_t from = 0;
+    for (const std::string& insert : inserts) {
+        const std::size_t at = text.find("%s", from);
+        if (at == std::string::npos) {
+            break;
+        }
+        text.replace(at, 2, insert);
+        from = at + insert.size();
+    }
+    return text;
+}
+
 }  // namespace
 
 const FindingKind& Finding::kind() const {
@@ -395,16 +410,16 @@ const FindingKind& Finding::kind() const {
 }
 
 std::string Finding::what() const {
-    return compose(kind().what, {shownText(subject), kViews[view].name});
+    return fill(kind().what, {shownText(subject), std::string(kViews[view].name)});
 }
 
 std::string Finding::why() const {
-    return compose(kind().why, {shownOr(detail, "nothing"), shownOr(other, "nothing")});
+    return fill(kind().why, {shownOr(detail, "nothing"), shownOr(other, "nothing")});
 }
 
 std::string Finding::repair() const {
     const std::string word = shownText(quotedWord(copy));
-    return compose(kind().repair, {word, word});
+    return fill(kind().repair, {word, word});
 }
 
 std::vector<FindingKind> findingKinds() {
