@@ -23,6 +23,27 @@ constexpr const char* kFooter =
     "wrong; 3 with --detailed-exitcode: done, and something changed. front exits as\n"
     "its program does.\n";
 
+std::vector<unsigned long> numbersOf(const std::string& version) {
+    std::vector<unsigned long> numbers;
+    std::istringstream parts(version);
+    for (std::string part; std::getline(parts, part, '.');) {
+        numbers.push_back(std::strtoul(part.c_str(), nullptr, 10));
+    }
+    return numbers;
+}
+
+// The check of a version that the caller needs. Nothing is done by a program that is older.
+CLI::Validator notOlder() {
+    return {[](const std::string& needed) {
+                if (needed.empty() || needed.find_first_not_of("0123456789.") != std::string::npos) {
+                    return "not a version: " + shownText(needed);
+                }
+                const bool isOlder = numbersOf(KZ7_VERSION) < numbersOf(needed);
+                return isOlder ? "this is version " KZ7_VERSION ", older than " + needed : std::string{};
+            },
+            {}};
+}
+
 // What help prints is output like any other.
 Answer showHelp(const CLI::App& program, const CLI::Success& help) {
     std::ostringstream text;
@@ -66,6 +87,7 @@ int run(int argc, char** argv) {
     CLI::App program("Inspects and changes the registry data that kz7InstallReg writes", "kz7admin");
     program.add_option("--store", admin.storeDirectory, "The state directory to use instead of the usual one")
         ->check(givenName());
+    program.add_option("--at-least", "Do nothing if this program is older")->check(notOlder())->type_name("VERSION");
     program.footer(kFooter);
     program.get_formatter()->column_width(24);  // help fits 80 columns
     program.require_subcommand(0, 1);
