@@ -2,8 +2,10 @@
 
 #include "install/admin/commands/commands.h"
 #include "install/admin/formats/change_text.h"
+#include "install/admin/formats/fleet_page.h"
 #include "install/admin/formats/html_report.h"
 #include "install/admin/given_name.h"
+#include "install/admin/input_file.h"
 #include "install/admin/open_machine.h"
 #include "install/admin/run_history.h"
 
@@ -11,6 +13,7 @@ namespace kz7 {
 namespace {
 
 struct ReportOptions {
+    std::vector<std::string> fleet;  // files with facts
     std::string file;
     bool force = false;
     bool json = false;
@@ -57,11 +60,42 @@ Answer readReport(Admin& admin, std::string& html) {
     return platform.storeFaultTold() ? kAnswerFault : kAnswerYes;
 }
 
-Answer report(Admin& admin, const ReportOptions& options) {
-    std::string html;
-    if (const Answer read = readReport(admin, html); read != kAnswerYes) {
-        return read;
+// A machine is named by its file, not by itself.
+std::string machineName(std::string_view file) {
+    file.remove_prefix(file.find_last_of("/\\") + 1);
+    file.remove_suffix(file.ends_with(".json") ? 5 : 0);
+    return std::string(file);
+}
+
+// A file that cannot be used is a row of the page, and the answer is no.
+Answer readFleet(Admin& admin, const std::vector<std::string>& files, std::string& html) {
+    if (!admin.open(true)) {
+        return kAnswerFault;
     }
+    std::map<std::string, std::string> byName;
+    for (const std::string& file : files) {
+        if (const auto [other, isNew] = byName.try_emplace(machineName(file), file); !isNew) {
+            return admin.fault("two files for one machine: " + shownText(other->second) + " and " + shownText(file));
+        }
+    }
+    Fleet fleet;
+    Answer answer = kAnswerYes;
+    for (const auto& [machine, path] : byName) {
+        InputFile file(admin, path);
+        const bool isRead = file.read() == kAnswerYes;
+        std::string& fault = fleet.add(machine, file.bytes()).fault;
+        if (!isRead) {
+            fault = "its file cannot be read";
+        } else if (!fault.empty()) {
+            admin.tell(file.shown() + ": " + fault);
+        }
+        answer = fault.empty() ? answer : kAnswerNo;
+    }
+    html = fleetPage(fleet, timeNow(admin.platform().host()));
+    return answer;
+}
+
+Answer writeReport(Admin& admin, const ReportOptions& options, const std::string& html) {
     if (options.file.empty()) {
         return admin.write(html, Admin::Form::document);
     }
@@ -70,10 +104,23 @@ Answer report(Admin& admin, const ReportOptions& options) {
     }
     if (options.json) {
         JsonWriter json;
-        json.beginObject().field("schema", std::uint64_t{1}).field("store", admin.platform().storeName());
+        json.beginObject().field("schema", std::uint64_t{1});
+        if (options.fleet.empty()) {
+            json.field("store", admin.platform().storeName());
+        }
         return admin.write(json.field("file", options.file).end().take(), Admin::Form::document);
     }
     return admin.write("wrote " + shownText(options.file) + '\n');
+}
+
+Answer report(Admin& admin, const ReportOptions& options) {
+    std::string html;
+    const Answer read = options.fleet.empty() ? readReport(admin, html) : readFleet(admin, options.fleet, html);
+    if (html.empty() || read == kAnswerFault) {
+        return read;
+    }
+    const Answer written = writeReport(admin, options, html);
+    return written == kAnswerYes ? read : written;
 }
 
 }  // namespace
@@ -83,6 +130,7 @@ void addReportCommand(CLI::App& program, Admin& admin) {
     auto options = std::make_shared<ReportOptions>();
     auto* file = command->add_option("-o,--output", options->file, "The file to make; without: standard output");
     file->check(givenName());
+    command->add_option("--fleet", options->fleet, "Describe many machines instead, by files that facts wrote there");
     command->add_flag("--force", options->force, "Replace an existing file")->needs(file);
     command->add_flag("--json", options->json, "Write JSON about the file for programs")->needs(file);
     command->callback([&admin, options] { admin.answer = [&admin, options] { return report(admin, *options); }; });
