@@ -24,8 +24,16 @@ if(KZ7_FUZZ)
 endif()
 
 if(WIN32)
-  # The programs need no installed runtime library.
   target_compile_definitions(kz7_options INTERFACE NOMINMAX WIN32_LEAN_AND_MEAN _WIN32_WINNT=0x0601)
+endif()
+
+# The rest is for the programs.
+if(NOT KZ7_PROGRAMS)
+  return()
+endif()
+
+if(WIN32)
+  # They need no installed runtime library.
   target_link_options(kz7_options INTERFACE -static)
 elseif(NOT KZ7_SANITIZERS)
   # A shared libstdc++ adds half a millisecond to every start; a fully static program could not load a level library.
@@ -48,3 +56,20 @@ foreach(library IN ITEMS CLI11::CLI11 nlohmann_json::nlohmann_json)
 endforeach()
 add_library(kz7_headers INTERFACE)
 target_include_directories(kz7_headers SYSTEM INTERFACE ${PROJECT_BINARY_DIR}/headers)
+
+# Gives a Windows program or library its version resource.
+function(kz7_version_resource target description)
+  if(WIN32)
+    set(suffix .exe)
+    set(type 1) # an application
+    get_target_property(kind ${target} TYPE)
+    if(kind STREQUAL SHARED_LIBRARY)
+      set(suffix .dll)
+      set(type 2)
+    endif()
+    configure_file(${PROJECT_SOURCE_DIR}/cmake/version.rc.in ${target}.rc @ONLY)
+    # Apart, because the resource compiler does not know the options of the target.
+    add_library(${target}_version OBJECT ${CMAKE_CURRENT_BINARY_DIR}/${target}.rc)
+    target_link_libraries(${target} PRIVATE ${target}_version)
+  endif()
+endfunction()

@@ -5,9 +5,9 @@
 #include <new>
 #include <string>
 
-#include "install/platform/platform.h"
-#include "install/runtime/observers/observers_end.h"
-#include "install/runtime/runtime_ports.h"
+#include "kz7/platform/platform.h"
+#include "kz7/runtime/observers/observers_end.h"
+#include "kz7/runtime/runtime_ports.h"
 
 namespace kz7 {
 namespace {

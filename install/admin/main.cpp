@@ -88,6 +88,7 @@ int run(int argc, char** argv) {
     program.add_option("--store", admin.storeDirectory, "The state directory to use instead of the usual one")
         ->check(givenName());
     program.add_option("--at-least", "Do nothing if this program is older")->check(notOlder())->type_name("VERSION");
+    program.set_version_flag("--version", "kz7admin " KZ7_VERSION, "Print the version");
     program.footer(kFooter);
     program.get_formatter()->column_width(24);  // help fits 80 columns
     program.require_subcommand(0, 1);
