@@ -59,15 +59,15 @@ std::string runText(const ChangeRun& run, const ChangeOptions& options, bool isC
 
 }  // namespace
 
-void addChangeOptions(CLI::App& command, ChangeOptions& options, CLI::Option* excluded) {
-    auto* check = command.add_flag("--check", options.check, "Change nothing; tell what would change");
-    auto* diff = command.add_flag("--diff", options.diff, "Show each change");
-    auto* json = command.add_flag("--json", options.json, "Write JSON for programs");
-    command.add_flag("--detailed-exitcode", options.detailedExitCode, "Exit with 3 if something changed");
-    for (CLI::Option* const option : {check, diff, json}) {
-        if (excluded != nullptr) {
-            option->excludes(excluded);
-        }
+void addChangeOptions(Command& command, ChangeOptions& options, const Option* excluded) {
+    auto check = command.flag("--check", options.check, "Change nothing; tell what would change");
+    auto diff = command.flag("--diff", options.diff, "Show each change");
+    auto json = command.flag("--json", options.json, "Write JSON for programs");
+    command.flag("--detailed-exitcode", options.detailedExitCode, "Exit with 3 if something changed");
+    if (excluded != nullptr) {
+        check.excludes(*excluded);
+        diff.excludes(*excluded);
+        json.excludes(*excluded);
     }
 }
 

@@ -1,11 +1,10 @@
 // What the commands that change a store have in common: their options, and how they tell what changed or would change.
 #pragma once
 
-#include <CLI/CLI.hpp>
 #include <string>
 #include <vector>
 
-#include "install/admin/admin.h"
+#include "install/admin/command_line.h"
 #include "install/admin/preview.h"
 #include "install/src/registry/change_set.h"
 #include "install/src/registry/report.h"
@@ -20,7 +19,7 @@ struct ChangeOptions {
 };
 
 // Adds --check, --diff, --json and --detailed-exitcode; the first three cannot stand beside `excluded`.
-void addChangeOptions(CLI::App& command, ChangeOptions& options, CLI::Option* excluded = nullptr);
+void addChangeOptions(Command& command, ChangeOptions& options, const Option* excluded = nullptr);
 
 // What a run did, or would do.
 struct ChangeRun {

@@ -5,7 +5,6 @@
 #include <sstream>
 
 #include "install/admin/commands/commands.h"
-#include "install/admin/given_name.h"
 #include "install/platform/console.h"
 #include "install/platform/encoding.h"
 #include "install/platform/program.h"
@@ -58,7 +57,7 @@ void tellFault(const std::string& reason) {
     std::fputs(narrowFromText("kz7admin: " + reason + '\n').c_str(), stderr);
 }
 
-void addCommands(CLI::App& program, Admin& admin) {
+void addCommands(Command& program, Admin& admin) {
     addAliasesCommand(program, admin);
     addApplyCommand(program, admin);
     addBackupCommand(program, admin);
@@ -85,15 +84,14 @@ int run(int argc, char** argv) {
     Admin admin;
     admin.arguments.assign(argv + (argc == 0 ? 0 : 1), argv + argc);
     CLI::App program("Inspects and changes the registry data that kz7InstallReg writes", "kz7admin");
-    program.add_option("--store", admin.storeDirectory, "The state directory to use instead of the usual one")
-        ->check(givenName());
+    Command command(program);
+    command.text("--store", admin.storeDirectory, "The state directory to use instead of the usual one").isFileName();
     program.add_option("--at-least", "Do nothing if this program is older")->check(notOlder())->type_name("VERSION");
     program.set_version_flag("--version", "kz7admin " KZ7_VERSION, "Print the version");
     program.footer(kFooter);
     program.get_formatter()->column_width(24);  // help fits 80 columns
-    program.require_subcommand(0, 1);
     program.fallthrough();
-    addCommands(program, admin);
+    addCommands(command, admin);
     try {
         program.parse(argc, argv);
     } catch (const CLI::Success& help) {

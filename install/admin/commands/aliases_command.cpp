@@ -1,5 +1,3 @@
-#include <CLI/CLI.hpp>
-
 #include "install/admin/commands/commands.h"
 #include "install/admin/copy_table.h"
 #include "install/admin/open_machine.h"
@@ -62,36 +60,37 @@ std::string aliasesJson(const std::vector<const AliasRow*>& rows, const std::str
     return json.end().take();
 }
 
-Answer showAliases(Admin& admin, const std::string& asked, bool isJson) {
+struct AliasesOptions {
+    std::string prefix;
+    bool json = false;
+};
+
+Answer showAliases(Admin& admin, const AliasesOptions& options) {
     MachineState machine;
     if (const Answer read = openMachine(admin, Depth::copies, machine); read != kAnswerYes) {
         return read;
     }
-    const std::vector<const AliasRow*> rows = aliasRows(machine, asked);
+    const std::vector<const AliasRow*> rows = aliasRows(machine, options.prefix);
     const std::string store = admin.platform().storeName();
     const std::string_view missingView = missingViewOf(machine);
     Answer shown = kAnswerYes;
-    if (isJson) {
+    if (options.json) {
         shown = admin.show(aliasesJson(rows, store), Admin::Form::document);
     } else if (!rows.empty()) {
         shown = admin.show(aliasesText(rows, missingView, admin.output().columns));
     }
     return shown != kAnswerYes || !rows.empty()
                ? shown
-               : admin.no("no such alias: " + shownText(asked.empty() ? store : asked));
+               : admin.no("no such alias: " + shownText(options.prefix.empty() ? store : options.prefix));
 }
 
 }  // namespace
 
-void addAliasesCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("aliases", "Show the copy of each version prefix");
-    auto prefix = std::make_shared<std::string>();
-    auto json = std::make_shared<bool>(false);
-    command->add_option("PREFIX", *prefix, "Only this prefix and longer ones, such as 9.7 for 9");
-    command->add_flag("--json", *json, "Write JSON for programs");
-    command->callback([&admin, prefix, json] {
-        admin.answer = [&admin, prefix, json] { return showAliases(admin, *prefix, *json); };
-    });
+void addAliasesCommand(Command& program, Admin& admin) {
+    auto command = program.add("aliases", "Show the copy of each version prefix");
+    auto& options = command.answerWith(admin, showAliases);
+    command.text("PREFIX", options.prefix, "Only this prefix and longer ones, such as 9.7 for 9");
+    command.flag("--json", options.json, "Write JSON for programs");
 }
 
 }  // namespace kz7

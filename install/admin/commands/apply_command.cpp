@@ -1,5 +1,3 @@
-#include <CLI/CLI.hpp>
-
 #include "install/admin/change_report.h"
 #include "install/admin/commands/commands.h"
 #include "install/admin/copy_location.h"
@@ -119,14 +117,12 @@ Answer apply(Admin& admin, const ApplyOptions& options) {
 
 }  // namespace
 
-void addApplyCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("apply", "Run a command of kz7InstallReg, or show what it would do");
-    auto options = std::make_shared<ApplyOptions>();
-    addChangeOptions(*command, *options);
-    command->add_flag("--no-level", options->noLevel, "With --check, load no level library");
-    command->add_option("COMMAND", options->words, "An option of kz7InstallReg and its arguments, after \"--\"")
-        ->required();
-    command->callback([&admin, options] { admin.answer = [&admin, options] { return apply(admin, *options); }; });
+void addApplyCommand(Command& program, Admin& admin) {
+    auto command = program.add("apply", "Run a command of kz7InstallReg, or show what it would do");
+    auto& options = command.answerWith(admin, apply);
+    addChangeOptions(command, options);
+    command.flag("--no-level", options.noLevel, "With --check, load no level library");
+    command.texts("COMMAND", options.words, "An option of kz7InstallReg and its arguments, after \"--\"").isRequired();
 }
 
 }  // namespace kz7

@@ -1,10 +1,8 @@
-#include <CLI/CLI.hpp>
 #include <memory>
 
 #include "install/admin/commands/commands.h"
 #include "install/admin/formats/json_text.h"
 #include "install/admin/formats/reg_text.h"
-#include "install/admin/given_name.h"
 #include "install/platform/text.h"
 
 namespace kz7 {
@@ -74,13 +72,12 @@ Answer backUp(Admin& admin, const BackupOptions& options) {
 
 }  // namespace
 
-void addBackupCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("backup", "Write the whole store to one file");
-    auto options = std::make_shared<BackupOptions>();
-    command->add_option("FILE", options->file, "The file to make")->required()->check(givenName());
-    command->add_flag("--force", options->force, "Replace an existing file");
-    command->add_flag("--json", options->json, "Write JSON for programs");
-    command->callback([&admin, options] { admin.answer = [&admin, options] { return backUp(admin, *options); }; });
+void addBackupCommand(Command& program, Admin& admin) {
+    auto command = program.add("backup", "Write the whole store to one file");
+    auto& options = command.answerWith(admin, backUp);
+    command.text("FILE", options.file, "The file to make").isRequired().isFileName();
+    command.flag("--force", options.force, "Replace an existing file");
+    command.flag("--json", options.json, "Write JSON for programs");
 }
 
 }  // namespace kz7

@@ -1,4 +1,3 @@
-#include <CLI/CLI.hpp>
 #include <algorithm>
 
 #include "install/admin/commands/commands.h"
@@ -50,14 +49,13 @@ Answer check(Admin& admin, const CheckOptions& options) {
 
 }  // namespace
 
-void addCheckCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("check", "Report what is not in order and its repair");
-    auto options = std::make_shared<CheckOptions>();
-    command->footer("Prints nothing and exits with 0 if all is in order, else with 1. Notes do not\ncount.");
-    command->add_option("NAME", options->copy, "Only what belongs to this copy");
-    command->add_flag("--all", options->all, "Also what is deliberate or not installed yet");
-    command->add_flag("--json", options->json, "Write JSON for programs");
-    command->callback([&admin, options] { admin.answer = [&admin, options] { return check(admin, *options); }; });
+void addCheckCommand(Command& program, Admin& admin) {
+    auto command = program.add("check", "Report what is not in order and its repair");
+    auto& options = command.answerWith(admin, check);
+    command.describe("Prints nothing and exits with 0 if all is in order, else with 1. Notes do not\ncount.");
+    command.text("NAME", options.copy, "Only what belongs to this copy");
+    command.flag("--all", options.all, "Also what is deliberate or not installed yet");
+    command.flag("--json", options.json, "Write JSON for programs");
 }
 
 }  // namespace kz7

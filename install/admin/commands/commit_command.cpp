@@ -1,11 +1,9 @@
-#include <CLI/CLI.hpp>
 #include <algorithm>
 
 #include "install/admin/change_report.h"
 #include "install/admin/commands/commands.h"
 #include "install/admin/configuration_run.h"
 #include "install/admin/copy_location.h"
-#include "install/admin/given_name.h"
 #include "install/admin/input_file.h"
 #include "install/platform/host_information.h"
 #include "install/platform/text.h"
@@ -148,18 +146,17 @@ Answer commit(Admin& admin, const Words& words) {
 
 }  // namespace
 
-void addCommitCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("commit", "Set what a response file says for a copy");
-    auto words = std::make_shared<Words>();
-    command->add_option("--copy", words->copy, "The copy's name")->required();
-    command->add_option("--response-file", words->responseFile, "Lines NAME = value; \"-\" is standard input")
-        ->required()
-        ->check(givenName());
-    command->add_option("--instance", words->instance, "The instance; the whole copy without it");
-    command->add_option("--log", words->logFile, "The log; kz7msi.log in the state directory without it");
-    auto* machine = command->add_flag("--machine", words->machine, "Speak the progress protocol, for a front end");
-    addChangeOptions(*command, *words, machine);
-    command->callback([&admin, words] { admin.answer = [&admin, words] { return commit(admin, *words); }; });
+void addCommitCommand(Command& program, Admin& admin) {
+    auto command = program.add("commit", "Set what a response file says for a copy");
+    auto& words = command.answerWith(admin, commit);
+    command.text("--copy", words.copy, "The copy's name").isRequired();
+    command.text("--response-file", words.responseFile, "Lines NAME = value; \"-\" is standard input")
+        .isRequired()
+        .isFileName();
+    command.text("--instance", words.instance, "The instance; the whole copy without it");
+    command.text("--log", words.logFile, "The log; kz7msi.log in the state directory without it");
+    auto machine = command.flag("--machine", words.machine, "Speak the progress protocol, for a front end");
+    addChangeOptions(command, words, &machine);
 }
 
 }  // namespace kz7

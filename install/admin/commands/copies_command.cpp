@@ -1,5 +1,3 @@
-#include <CLI/CLI.hpp>
-
 #include "install/admin/commands/commands.h"
 #include "install/admin/copy_table.h"
 #include "install/admin/open_machine.h"
@@ -80,25 +78,23 @@ Answer showCopies(Admin& admin, CopiesOptions options) {
 
 }  // namespace
 
-void addCopiesCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("copies", "Show the installed copies and their services");
-    auto options = std::make_shared<CopiesOptions>();
-    command->footer(
+void addCopiesCommand(Command& program, Admin& admin) {
+    auto command = program.add("copies", "Show the installed copies and their services");
+    auto& options = command.answerWith(admin, showCopies);
+    command.describe(
         "\"*\" marks the default copy. VIEW is \"both\" if 64-bit and 32-bit programs see the\n"
         "same, and \"removed\" if only the key is left that a removal leaves behind.");
-    command->add_option("NAME", options->filter.name, "Only this copy");
-    command->add_option("--version", options->versions, "Only a range such as [9.7,9.8), compared as texts");
-    command->add_option("--view", options->filter.view, "Only this view: native or 32-bit")
-        ->check(CLI::IsMember({"native", "32-bit"}));
-    command->add_flag("--valid", options->filter.valid, "Only copies with a valid version");
-    command->add_flag("--default", options->filter.isDefault, "Only the default copy");
-    command->add_option("--columns", options->columns, "What is shown, in order, separated by commas")
-        ->delimiter(',')
-        ->check(CLI::IsMember(std::vector<std::string>(kCopyColumns.begin(), kCopyColumns.end())));
-    auto* format = command->add_option("--format", options->format, "table, tsv, json or jsonl")
-                       ->check(CLI::IsMember({"table", "tsv", "json", "jsonl"}));
-    command->add_flag("--json", options->json, "Write JSON for programs")->excludes(format);
-    command->callback([&admin, options] { admin.answer = [&admin, options] { return showCopies(admin, *options); }; });
+    command.text("NAME", options.filter.name, "Only this copy");
+    command.text("--version", options.versions, "Only a range such as [9.7,9.8), compared as texts");
+    command.text("--view", options.filter.view, "Only this view: native or 32-bit").isOneOf({"native", "32-bit"});
+    command.flag("--valid", options.filter.valid, "Only copies with a valid version");
+    command.flag("--default", options.filter.isDefault, "Only the default copy");
+    command.texts("--columns", options.columns, "What is shown, in order, separated by commas")
+        .isSplitAt(',')
+        .isOneOf({kCopyColumns.begin(), kCopyColumns.end()});
+    auto format = command.text("--format", options.format, "table, tsv, json or jsonl")
+                      .isOneOf({"table", "tsv", "json", "jsonl"});
+    command.flag("--json", options.json, "Write JSON for programs").excludes(format);
 }
 
 }  // namespace kz7

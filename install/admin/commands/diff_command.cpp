@@ -1,5 +1,3 @@
-#include <CLI/CLI.hpp>
-
 #include "install/admin/commands/commands.h"
 #include "install/admin/formats/change_text.h"
 #include "install/admin/formats/json_text.h"
@@ -70,21 +68,20 @@ Answer diff(Admin& admin, const DiffOptions& options) {
 
 }  // namespace
 
-void addDiffCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("diff", "Show what differs between two registries");
-    auto options = std::make_shared<DiffOptions>();
-    command->footer(
+void addDiffCommand(Command& program, Admin& admin) {
+    auto command = program.add("diff", "Show what differs between two registries");
+    auto& options = command.answerWith(admin, diff);
+    command.describe(
         "A and B are each a state directory, a backup, a file of registry-editor text,\n"
         "\".\" for this machine, or \"@N\" for this machine before run N of its history.\n"
         "\n"
         "Exit codes: 0 they are the same; 1 they differ; 2 one cannot be read.\n");
-    command->add_option("A", options->before, "The registry before")->required();
-    command->add_option("B", options->after, "The registry after")->required();
-    command->add_option("KEY", options->key, "The key to compare; without it everything");
-    auto* reg = command->add_flag("--reg", options->reg, "Write the file whose import turns A into B");
-    auto* json = command->add_flag("--json", options->json, "Write JSON for programs")->excludes(reg);
-    command->add_flag("--stat", options->stat, "Count the differences")->excludes(reg)->excludes(json);
-    command->callback([&admin, options] { admin.answer = [&admin, options] { return diff(admin, *options); }; });
+    command.text("A", options.before, "The registry before").isRequired();
+    command.text("B", options.after, "The registry after").isRequired();
+    command.text("KEY", options.key, "The key to compare; without it everything");
+    auto reg = command.flag("--reg", options.reg, "Write the file whose import turns A into B");
+    auto json = command.flag("--json", options.json, "Write JSON for programs").excludes(reg);
+    command.flag("--stat", options.stat, "Count the differences").excludes(reg).excludes(json);
 }
 
 }  // namespace kz7

@@ -1,5 +1,3 @@
-#include <CLI/CLI.hpp>
-
 #include "install/admin/change_report.h"
 #include "install/admin/commands/commands.h"
 #include "install/admin/ensurer.h"
@@ -74,15 +72,14 @@ Answer ensure(Admin& admin, const EnsureOptions& options) {
 
 }  // namespace
 
-void addEnsureCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("ensure", "Make the copies as a file lists them");
-    auto options = std::make_shared<EnsureOptions>();
-    addChangeOptions(*command, *options);
-    command->add_option("--from", options->file, "A JSON file with the copies; \"-\" is standard input")->required();
-    auto* prune = command->add_flag("--prune", options->prune, "Remove the copies that the file does not list");
-    command->add_flag("--all", options->all, "Remove the last copy and the product too")->needs(prune);
-    command->add_flag("--services", options->services, "Correct services that belong to another location");
-    command->callback([&admin, options] { admin.answer = [&admin, options] { return ensure(admin, *options); }; });
+void addEnsureCommand(Command& program, Admin& admin) {
+    auto command = program.add("ensure", "Make the copies as a file lists them");
+    auto& options = command.answerWith(admin, ensure);
+    addChangeOptions(command, options);
+    command.text("--from", options.file, "A JSON file with the copies; \"-\" is standard input").isRequired();
+    auto prune = command.flag("--prune", options.prune, "Remove the copies that the file does not list");
+    command.flag("--all", options.all, "Remove the last copy and the product too").needs(prune);
+    command.flag("--services", options.services, "Correct services that belong to another location");
 }
 
 }  // namespace kz7

@@ -1,5 +1,3 @@
-#include <CLI/CLI.hpp>
-
 #include "install/admin/commands/commands.h"
 #include "install/admin/explanations.h"
 #include "install/admin/formats/json_text.h"
@@ -86,15 +84,14 @@ Answer explain(Admin& admin, const ExplainOptions& options) {
 
 }  // namespace
 
-void addExplainCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("explain", "Explain a status, an exit code or an error line");
-    auto options = std::make_shared<ExplainOptions>();
-    command->footer(
+void addExplainCommand(Command& program, Admin& admin) {
+    auto command = program.add("explain", "Explain a status, an exit code or an error line");
+    auto& options = command.answerWith(admin, explain);
+    command.describe(
         "WHAT is a status (5021, 0x870F0104), an exit code as a POSIX shell shows it\n"
         "(157), the number of an error line (392), or \"-\" for pasted output or a log.");
-    command->add_option("WHAT", options->words, "What to explain")->required();
-    command->add_flag("--json", options->json, "Write JSON for programs");
-    command->callback([&admin, options] { admin.answer = [&admin, options] { return explain(admin, *options); }; });
+    command.texts("WHAT", options.words, "What to explain").isRequired();
+    command.flag("--json", options.json, "Write JSON for programs");
 }
 
 }  // namespace kz7

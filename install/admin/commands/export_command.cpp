@@ -1,5 +1,3 @@
-#include <CLI/CLI.hpp>
-
 #include "install/admin/commands/commands.h"
 #include "install/admin/formats/reg_text.h"
 #include "install/admin/key_json.h"
@@ -50,13 +48,12 @@ Answer exportKeys(Admin& admin, const ExportOptions& options) {
 
 }  // namespace
 
-void addExportCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("export", "Write keys as registry-editor text to standard output");
-    auto options = std::make_shared<ExportOptions>();
-    command->add_option("KEY", options->key, "The key to begin at; everything without it");
-    auto* utf16 = command->add_flag("--utf16", options->utf16, "Write UTF-16 as Windows' own editor does");
-    command->add_flag("--json", options->json, "Write JSON for programs")->excludes(utf16);
-    command->callback([&admin, options] { admin.answer = [&admin, options] { return exportKeys(admin, *options); }; });
+void addExportCommand(Command& program, Admin& admin) {
+    auto command = program.add("export", "Write keys as registry-editor text to standard output");
+    auto& options = command.answerWith(admin, exportKeys);
+    command.text("KEY", options.key, "The key to begin at; everything without it");
+    auto utf16 = command.flag("--utf16", options.utf16, "Write UTF-16 as Windows' own editor does");
+    command.flag("--json", options.json, "Write JSON for programs").excludes(utf16);
 }
 
 }  // namespace kz7

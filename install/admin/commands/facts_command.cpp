@@ -1,5 +1,3 @@
-#include <CLI/CLI.hpp>
-
 #include "install/admin/commands/commands.h"
 #include "install/admin/copy_table.h"
 #include "install/admin/findings.h"
@@ -32,7 +30,11 @@ void appendServices(const MachineState& machine, JsonWriter& json) {
     json.end();
 }
 
-Answer showFacts(Admin& admin) {
+struct FactsOptions {
+    bool json = true;
+};
+
+Answer showFacts(Admin& admin, const FactsOptions& /*options*/) {
     MachineState machine;
     if (const Answer read = openWholeMachine(admin, machine); read != kAnswerYes) {
         return read;
@@ -53,11 +55,10 @@ Answer showFacts(Admin& admin) {
 
 }  // namespace
 
-void addFactsCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("facts", "Write what is known of the machine as JSON");
-    auto json = std::make_shared<bool>(true);
-    command->add_flag("--json", *json, "The same: facts has no other form");
-    command->callback([&admin, json] { admin.answer = [&admin] { return showFacts(admin); }; });
+void addFactsCommand(Command& program, Admin& admin) {
+    auto command = program.add("facts", "Write what is known of the machine as JSON");
+    auto& options = command.answerWith(admin, showFacts);
+    command.flag("--json", options.json, "The same: facts has no other form");
 }
 
 }  // namespace kz7

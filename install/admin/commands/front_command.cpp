@@ -1,4 +1,3 @@
-#include <CLI/CLI.hpp>
 #include <memory>
 
 #include "install/admin/commands/commands.h"
@@ -13,8 +12,14 @@ namespace {
 
 constexpr int kNotStarted = 127;  // as in shells; all other codes are the program's
 
+struct FrontOptions {
+    std::vector<std::string> words;  // the program and its arguments
+    bool json = false;
+};
+
 // The exit code, which may be any number.
-int runProgram(Admin& admin, const std::vector<std::string>& command, bool isJson) {
+int runProgram(Admin& admin, const FrontOptions& options) {
+    const std::vector<std::string>& command = options.words;
     if (!admin.open(true)) {
         return kAnswerFault;
     }
@@ -26,10 +31,10 @@ int runProgram(Admin& admin, const std::vector<std::string>& command, bool isJso
     IPlatform& platform = admin.platform();
     MemoryConsole kept;
     const FrontPorts ports{platform.processes(), platform.threads(), platform.files(), platform.terminal(),
-                           isJson ? static_cast<IConsole&>(kept) : platform.console()};
+                           options.json ? static_cast<IConsole&>(kept) : platform.console()};
     std::uint32_t exitCode = 0;
     const Status status = runFront(ports, command, exitCode);
-    if (isJson && status == kSuccess) {
+    if (options.json && status == kSuccess) {
         JsonWriter json;
         json.beginObject().field("schema", std::uint64_t{1}).field("exitCode", std::uint64_t{exitCode});
         admin.write(json.field("output", kept.output).end().take(), Admin::Form::document);
@@ -49,15 +54,12 @@ int runProgram(Admin& admin, const std::vector<std::string>& command, bool isJso
 
 }  // namespace
 
-void addFrontCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("front", "Run an installer program and show its progress");
-    auto words = std::make_shared<std::vector<std::string>>();
-    command->add_option("PROGRAM", *words, "The program and its arguments, best after --")->required();
-    command->positionals_at_end();
-    auto json = std::make_shared<bool>(false);
-    command->add_flag("--json", *json, "Write the result as JSON, show no progress");
-    command->callback(
-        [&admin, words, json] { admin.answer = [&admin, words, json] { return runProgram(admin, *words, *json); }; });
+void addFrontCommand(Command& program, Admin& admin) {
+    auto command = program.add("front", "Run an installer program and show its progress");
+    auto& options = command.answerWith(admin, runProgram);
+    command.texts("PROGRAM", options.words, "The program and its arguments, best after --").isRequired();
+    command.endsWithArguments();
+    command.flag("--json", options.json, "Write the result as JSON, show no progress");
 }
 
 }  // namespace kz7

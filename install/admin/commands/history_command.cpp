@@ -1,4 +1,3 @@
-#include <CLI/CLI.hpp>
 #include <algorithm>
 
 #include "install/admin/commands/commands.h"
@@ -20,7 +19,6 @@ struct HistoryOptions {
     std::uint64_t keep = 0;
     std::string before;  // a date; empty: `keep` counts
     bool check = false;
-    bool on = false;
     bool json = false;
     bool diff = false;
     bool reg = false;
@@ -168,92 +166,84 @@ Answer trim(Admin& admin, const HistoryOptions& options) {
                               : admin.storeFault("cannot trim the history", status);
 }
 
-Answer turn(Admin& admin, const HistoryOptions& options) {
+Answer turn(Admin& admin, const HistoryOptions& options, bool on) {
     if (!admin.open(false)) {
         return kAnswerFault;
     }
     IHistory* const history = admin.platform().history();
     const bool wasOn = history->isOn();
-    const Status status = history->turn(options.on);
-    if (status == kCallNotImplemented && !options.on) {
+    const Status status = history->turn(on);
+    if (status == kCallNotImplemented && !on) {
         return admin.no("the history is part of the store and always on");
     }
     if (status != kSuccess && status != kCallNotImplemented) {
         return admin.storeFault(
-            options.on ? "cannot start the history in %ProgramData%\\KZ7\\history, which only administrators may own"
-                       : "cannot stop the history",
+            on ? "cannot start the history in %ProgramData%\\KZ7\\history, which only administrators may own"
+               : "cannot stop the history",
             status);
     }
     if (options.json) {
         return admin.write(compose("{\"schema\":1,\"changed\":%s,\"on\":%s}\n",
-                                   {wasOn != options.on ? "true" : "false", options.on ? "true" : "false"}),
+                                   {wasOn != on ? "true" : "false", on ? "true" : "false"}),
                            Admin::Form::document);
     }
     return admin.write(status == kCallNotImplemented ? "the history is always on\n"
-                       : options.on                  ? "the history is on\n"
+                       : on                          ? "the history is on\n"
                                                      : "the history is off\n");
 }
 
-CLI::Validator isDate() {
-    return {[](const std::string& text) {
-                constexpr std::string_view kForm = "dddd-dd-ddTdd:dd:ddZ";
-                bool fits = text.size() == 10 || text.size() == kForm.size();
-                for (std::size_t at = 0; fits && at < text.size(); ++at) {
-                    fits = kForm[at] == 'd' ? text[at] >= '0' && text[at] <= '9' : text[at] == kForm[at];
-                }
-                return fits ? "" : "not a date of the form 2026-01-31 or 2026-01-31T12:00:00Z";
-            },
-            {}};
+Answer turnOn(Admin& admin, const HistoryOptions& options) {
+    return turn(admin, options, true);
 }
 
-void answerWith(CLI::App* command, Admin& admin, const std::shared_ptr<HistoryOptions>& options,
-                Answer (*function)(Admin&, const HistoryOptions&)) {
-    command->callback([&admin, options, function] {
-        if (admin.answer == nullptr) {
-            admin.answer = [&admin, options, function] { return function(admin, *options); };
-        }
-    });
+Answer turnOff(Admin& admin, const HistoryOptions& options) {
+    return turn(admin, options, false);
+}
+
+std::string dateFault(const std::string& text) {
+    constexpr std::string_view kForm = "dddd-dd-ddTdd:dd:ddZ";
+    bool fits = text.size() == 10 || text.size() == kForm.size();
+    for (std::size_t at = 0; fits && at < text.size(); ++at) {
+        fits = kForm[at] == 'd' ? text[at] >= '0' && text[at] <= '9' : text[at] == kForm[at];
+    }
+    return fits ? "" : "not a date of the form 2026-01-31 or 2026-01-31T12:00:00Z";
+}
+
+void addShow(Command& history, Admin& admin, HistoryOptions& options) {
+    auto show = history.add("show", "Show one run");
+    show.answerWith(admin, showOne, options);
+    show.number("N", options.number, "Its number").isRequired();
+    auto diff = show.flag("--diff", options.diff, "Show each change");
+    show.flag("--reg", options.reg, "Write its changes as registry-editor text").excludes(diff);
+    show.flag("--json", options.json, "Write JSON for programs").excludes(diff);
+}
+
+void addTrim(Command& history, Admin& admin, HistoryOptions& options) {
+    auto trimmed = history.add("trim", "Remove the oldest runs from the history");
+    trimmed.answerWith(admin, trim, options);
+    auto keep = trimmed.number("--keep", options.keep, "Keep that many runs");
+    auto before = trimmed.text("--before", options.before, "Keep the runs since a date (UTC)");
+    before.check(dateFault).excludes(keep);
+    trimmed.needsOneOf(keep, before);
+    trimmed.flag("--check", options.check, "Change nothing; tell what would be removed");
+    trimmed.flag("--json", options.json, "Write JSON for programs");
 }
 
 }  // namespace
 
-void addHistoryCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("history", "Show the runs that changed the store, and what each changed");
-    auto options = std::make_shared<HistoryOptions>();
-    command->require_subcommand(0, 1);
-    command->add_option("NAME", options->copy, "Only the runs that changed this copy");
-    command->add_flag("--json", options->json, "Write JSON for programs");
-    answerWith(command, admin, options, showHistory);
-
-    auto* show = command->add_subcommand("show", "Show one run");
-    show->add_option("N", options->number, "Its number")->required();
-    auto* diff = show->add_flag("--diff", options->diff, "Show each change");
-    show->add_flag("--reg", options->reg, "Write its changes as registry-editor text")->excludes(diff);
-    show->add_flag("--json", options->json, "Write JSON for programs")->excludes(diff);
-    answerWith(show, admin, options, showOne);
-
-    auto* trimmed = command->add_subcommand("trim", "Remove the oldest runs from the history");
-    auto* keep = trimmed->add_option("--keep", options->keep, "Keep that many runs");
-    auto* before = trimmed->add_option("--before", options->before, "Keep the runs since a date (UTC)");
-    before->check(isDate())->excludes(keep);
-    trimmed->add_flag("--check", options->check, "Change nothing; tell what would be removed");
-    trimmed->add_flag("--json", options->json, "Write JSON for programs");
-    trimmed->callback([&admin, options, keep, before] {
-        if (keep->empty() && before->empty()) {
-            throw CLI::RequiredError("--keep or --before");
-        }
-        admin.answer = [&admin, options] { return trim(admin, *options); };
-    });
-
-    for (const bool on : {true, false}) {
-        auto* switched = command->add_subcommand(
-            on ? "start" : "stop", on ? "Record runs from now on (Windows)" : "Record no more runs (Windows)");
-        switched->add_flag("--json", options->json, "Write JSON for programs");
-        switched->callback([&admin, options, on] {
-            options->on = on;
-            admin.answer = [&admin, options] { return turn(admin, *options); };
-        });
-    }
+void addHistoryCommand(Command& program, Admin& admin) {
+    auto command = program.add("history", "Show the runs that changed the store, and what each changed");
+    auto& options = command.answerWith(admin, showHistory);
+    command.text("NAME", options.copy, "Only the runs that changed this copy");
+    command.flag("--json", options.json, "Write JSON for programs");
+    addShow(command, admin, options);
+    addTrim(command, admin, options);
+    auto start = command.add("start", "Record runs from now on (Windows)");
+    start.answerWith(admin, turnOn, options);
+    start.flag("--json", options.json, "Write JSON for programs");
+    auto stop = command.add("stop", "Record no more runs (Windows)");
+    stop.answerWith(admin, turnOff, options);
+    stop.flag("--json", options.json, "Write JSON for programs");
 }
 
 }  // namespace kz7

@@ -1,9 +1,6 @@
-#include <CLI/CLI.hpp>
-
 #include "install/admin/change_report.h"
 #include "install/admin/commands/commands.h"
 #include "install/admin/formats/reg_text.h"
-#include "install/admin/given_name.h"
 #include "install/admin/input_file.h"
 #include "install/admin/preview.h"
 #include "install/platform/text.h"
@@ -76,12 +73,11 @@ Answer importFile(Admin& admin, const ImportOptions& options) {
 
 }  // namespace
 
-void addImportCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("import", "Do what a file of registry-editor text asks for");
-    auto options = std::make_shared<ImportOptions>();
-    addChangeOptions(*command, *options);
-    command->add_option("FILE", options->file, "The file; \"-\" is standard input")->required();
-    command->callback([&admin, options] { admin.answer = [&admin, options] { return importFile(admin, *options); }; });
+void addImportCommand(Command& program, Admin& admin) {
+    auto command = program.add("import", "Do what a file of registry-editor text asks for");
+    auto& options = command.answerWith(admin, importFile);
+    addChangeOptions(command, options);
+    command.text("FILE", options.file, "The file; \"-\" is standard input").isRequired();
 }
 
 }  // namespace kz7

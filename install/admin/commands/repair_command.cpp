@@ -1,9 +1,7 @@
-#include <CLI/CLI.hpp>
 #include <algorithm>
 
 #include "install/admin/change_report.h"
 #include "install/admin/commands/commands.h"
-#include "install/admin/given_name.h"
 #include "install/admin/repair.h"
 
 namespace kz7 {
@@ -123,19 +121,18 @@ Answer repair(Admin& admin, RepairOptions options) {
 
 }  // namespace
 
-void addRepairCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("repair", "Repair what check reports");
-    auto options = std::make_shared<RepairOptions>();
-    command->footer(
+void addRepairCommand(Command& program, Admin& admin) {
+    auto command = program.add("repair", "Repair what check reports");
+    auto& options = command.answerWith(admin, repair);
+    command.describe(
         "A KIND is the first word of a line of check, or a group of kinds: aliases,\n"
         "copies, services, properties, migration. Without one, all but services and\n"
         "migration is repaired. No program is started.");
-    addChangeOptions(*command, *options);
-    command->add_option("KIND", options->words, "What to repair; the last word may name a copy");
-    auto* on = command->add_option("--on", options->request.location, "Finish a half-done migration to this location");
-    on->check(givenName());
-    command->add_flag("--back", options->request.isBack, "Take a half-done migration back")->excludes(on);
-    command->callback([&admin, options] { admin.answer = [&admin, options] { return repair(admin, *options); }; });
+    addChangeOptions(command, options);
+    command.texts("KIND", options.words, "What to repair; the last word may name a copy");
+    auto on = command.text("--on", options.request.location, "Finish a half-done migration to this location");
+    on.isFileName();
+    command.flag("--back", options.request.isBack, "Take a half-done migration back").excludes(on);
 }
 
 }  // namespace kz7

@@ -1,10 +1,7 @@
-#include <CLI/CLI.hpp>
-
 #include "install/admin/commands/commands.h"
 #include "install/admin/formats/change_text.h"
 #include "install/admin/formats/fleet_page.h"
 #include "install/admin/formats/html_report.h"
-#include "install/admin/given_name.h"
 #include "install/admin/input_file.h"
 #include "install/admin/open_machine.h"
 #include "install/admin/run_history.h"
@@ -125,15 +122,14 @@ Answer report(Admin& admin, const ReportOptions& options) {
 
 }  // namespace
 
-void addReportCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("report", "Write one HTML page about the machine");
-    auto options = std::make_shared<ReportOptions>();
-    auto* file = command->add_option("-o,--output", options->file, "The file to make; without: standard output");
-    file->check(givenName());
-    command->add_option("--fleet", options->fleet, "Describe many machines instead, by files that facts wrote there");
-    command->add_flag("--force", options->force, "Replace an existing file")->needs(file);
-    command->add_flag("--json", options->json, "Write JSON about the file for programs")->needs(file);
-    command->callback([&admin, options] { admin.answer = [&admin, options] { return report(admin, *options); }; });
+void addReportCommand(Command& program, Admin& admin) {
+    auto command = program.add("report", "Write one HTML page about the machine");
+    auto& options = command.answerWith(admin, report);
+    auto file = command.text("-o,--output", options.file, "The file to make; without: standard output");
+    file.isFileName();
+    command.texts("--fleet", options.fleet, "Describe many machines instead, by files that facts wrote there");
+    command.flag("--force", options.force, "Replace an existing file").needs(file);
+    command.flag("--json", options.json, "Write JSON about the file for programs").needs(file);
 }
 
 }  // namespace kz7

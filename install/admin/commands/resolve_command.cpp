@@ -1,4 +1,3 @@
-#include <CLI/CLI.hpp>
 #include <algorithm>
 
 #include "install/admin/commands/commands.h"
@@ -113,18 +112,15 @@ Answer showResolved(Admin& admin, const ResolveOptions& options) {
 
 }  // namespace
 
-void addResolveCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("resolve", "Show the copy that a version prefix names");
-    auto options = std::make_shared<ResolveOptions>();
-    command->footer("Exits with 1 if the prefix names no copy or one that it should not name.");
-    command->add_option("PREFIX", options->prefix, "A version or the beginning of one: 9, 9.7")->required();
-    command->add_option("--view", options->view, "The view to ask: native or 32-bit")
-        ->check(CLI::IsMember({"native", "32-bit"}));
-    auto* field = command->add_option("--field", options->field, "Only this: name, location or version")
-                      ->check(CLI::IsMember({"name", "location", "version"}));
-    command->add_flag("--json", options->json, "Write JSON for programs")->excludes(field);
-    command->callback(
-        [&admin, options] { admin.answer = [&admin, options] { return showResolved(admin, *options); }; });
+void addResolveCommand(Command& program, Admin& admin) {
+    auto command = program.add("resolve", "Show the copy that a version prefix names");
+    auto& options = command.answerWith(admin, showResolved);
+    command.describe("Exits with 1 if the prefix names no copy or one that it should not name.");
+    command.text("PREFIX", options.prefix, "A version or the beginning of one: 9, 9.7").isRequired();
+    command.text("--view", options.view, "The view to ask: native or 32-bit").isOneOf({"native", "32-bit"});
+    auto field = command.text("--field", options.field, "Only this: name, location or version")
+                     .isOneOf({"name", "location", "version"});
+    command.flag("--json", options.json, "Write JSON for programs").excludes(field);
 }
 
 }  // namespace kz7

@@ -1,4 +1,3 @@
-#include <CLI/CLI.hpp>
 #include <algorithm>
 
 #include "install/admin/change_report.h"
@@ -121,12 +120,11 @@ Answer restore(Admin& admin, const RestoreOptions& options) {
 
 }  // namespace
 
-void addRestoreCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("restore", "Bring the product's keys and services back to a backup");
-    auto options = std::make_shared<RestoreOptions>();
-    addChangeOptions(*command, *options);
-    command->add_option("FILE", options->file, "A backup, or an export as registry-editor text")->required();
-    command->callback([&admin, options] { admin.answer = [&admin, options] { return restore(admin, *options); }; });
+void addRestoreCommand(Command& program, Admin& admin) {
+    auto command = program.add("restore", "Bring the product's keys and services back to a backup");
+    auto& options = command.answerWith(admin, restore);
+    addChangeOptions(command, options);
+    command.text("FILE", options.file, "A backup, or an export as registry-editor text").isRequired();
 }
 
 }  // namespace kz7

@@ -1,5 +1,3 @@
-#include <CLI/CLI.hpp>
-
 #include "install/admin/commands/commands.h"
 #include "install/admin/formats/value_type.h"
 #include "install/admin/key_json.h"
@@ -31,23 +29,26 @@ void appendTreeKey(const KeyRecord& key, std::string& text) {
     }
 }
 
-Answer showTree(Admin& admin, const std::string& key, bool isJson) {
+struct TreeOptions {
+    std::string key;
+    bool json = false;
+};
+
+Answer showTree(Admin& admin, const TreeOptions& options) {
     if (!admin.open(true)) {
         return kAnswerFault;
     }
-    return isJson ? showKeysJson(admin, key) : admin.showKeys(key, {}, appendTreeKey, {}, Admin::Reading::pages);
+    return options.json ? showKeysJson(admin, options.key)
+                        : admin.showKeys(options.key, {}, appendTreeKey, {}, Admin::Reading::pages);
 }
 
 }  // namespace
 
-void addTreeCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("tree", "Show keys and values for reading");
-    auto key = std::make_shared<std::string>();
-    command->add_option("KEY", *key, "The key to begin at; everything without it");
-    auto json = std::make_shared<bool>(false);
-    command->add_flag("--json", *json, "Write JSON for programs");
-    command->callback(
-        [&admin, key, json] { admin.answer = [&admin, key, json] { return showTree(admin, *key, *json); }; });
+void addTreeCommand(Command& program, Admin& admin) {
+    auto command = program.add("tree", "Show keys and values for reading");
+    auto& options = command.answerWith(admin, showTree);
+    command.text("KEY", options.key, "The key to begin at; everything without it");
+    command.flag("--json", options.json, "Write JSON for programs");
 }
 
 }  // namespace kz7

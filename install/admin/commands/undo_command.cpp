@@ -1,4 +1,3 @@
-#include <CLI/CLI.hpp>
 #include <algorithm>
 
 #include "install/admin/change_report.h"
@@ -97,12 +96,11 @@ Answer undo(Admin& admin, const UndoOptions& options) {
 
 }  // namespace
 
-void addUndoCommand(CLI::App& program, Admin& admin) {
-    auto* command = program.add_subcommand("undo", "Take a run back, or do again what an undo took back");
-    auto options = std::make_shared<UndoOptions>();
-    addChangeOptions(*command, *options);
-    command->add_option("N", options->number, "The number of the run in the history")->required();
-    command->callback([&admin, options] { admin.answer = [&admin, options] { return undo(admin, *options); }; });
+void addUndoCommand(Command& program, Admin& admin) {
+    auto command = program.add("undo", "Take a run back, or do again what an undo took back");
+    auto& options = command.answerWith(admin, undo);
+    addChangeOptions(command, options);
+    command.number("N", options.number, "The number of the run in the history").isRequired();
 }
 
 }  // namespace kz7

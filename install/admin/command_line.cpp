@@ -1,0 +1,87 @@
+#include "install/admin/command_line.h"
+
+#include <CLI/CLI.hpp>
+
+namespace kz7 {
+
+Option& Option::isRequired() {
+    option_->required();
+    return *this;
+}
+
+Option& Option::isOneOf(const std::vector<std::string>& words) {
+    option_->check(CLI::IsMember(words));
+    return *this;
+}
+
+Option& Option::isFileName() {
+    return check([](const std::string& text) { return std::string(text.empty() ? "the name is empty" : ""); });
+}
+
+Option& Option::isSplitAt(char separator) {
+    option_->delimiter(separator);
+    return *this;
+}
+
+Option& Option::check(const std::function<std::string(const std::string&)>& fault) {
+    option_->check(CLI::Validator(fault, {}));
+    return *this;
+}
+
+Option& Option::excludes(const Option& other) {
+    option_->excludes(other.option_);
+    return *this;
+}
+
+Option& Option::needs(const Option& other) {
+    option_->needs(other.option_);
+    return *this;
+}
+
+Command Command::add(const std::string& name, const std::string& description) {
+    app_->require_subcommand(0, 1);
+    return Command(*app_->add_subcommand(name, description));
+}
+
+void Command::describe(const std::string& footer) {
+    app_->footer(footer);
+}
+
+Option Command::flag(const std::string& name, bool& value, const std::string& description) {
+    return Option(app_->add_flag(name, value, description));
+}
+
+Option Command::text(const std::string& name, std::string& value, const std::string& description) {
+    return Option(app_->add_option(name, value, description));
+}
+
+Option Command::texts(const std::string& name, std::vector<std::string>& values, const std::string& description) {
+    return Option(app_->add_option(name, values, description));
+}
+
+Option Command::number(const std::string& name, std::uint64_t& value, const std::string& description) {
+    return Option(app_->add_option(name, value, description));
+}
+
+void Command::needsOneOf(const Option& one, const Option& other) {
+    app_->parse_complete_callback([first = one.option_, second = other.option_] {
+        if (first->empty() && second->empty()) {
+            throw CLI::RequiredError(first->get_name() + " or " + second->get_name());
+        }
+    });
+}
+
+void Command::endsWithArguments() {
+    app_->positionals_at_end();
+}
+
+void Command::answerWith(Admin& admin, const std::function<int()>& function) {
+    // The command below it, which is asked first, answers.
+    app_->callback([&admin, function] {
+        if (admin.answer == nullptr) {
+            admin.answer = function;
+        }
+    });
+}
+
+}  // namespace kz7
