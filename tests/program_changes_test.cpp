@@ -119,6 +119,12 @@ TEST_F(ChangesProgram, RestoreMendsADamageOfAnyPage) {
         const StateDirectory damaged;
         const std::string bytes = std::string(whole).replace(4096 * page, 4096, 4096, '\0');
         overwrite(damaged.file("registry.db"), bytes);
+        // A damaged store is neither backed up over the last backup nor restored.
+        const std::string last = file("last.db", whole);
+        const int status = damaged.run("kz7admin", {"backup", "--force", last}).exitCode;
+        EXPECT_TRUE(status == 2 ? contents(last) == whole : status == 0) << "page " << page;
+        EXPECT_EQ(store_.run("kz7admin", {"restore", file("bad.db", bytes)}).exitCode, status) << "page " << page;
+        expect({"diff", ".", backup}, "||0");
         // Of two at once only one replaces the store.
         const pid_t other = damaged.start({"restore", backup});
         damaged.run("kz7admin", {"restore", backup});

@@ -38,6 +38,8 @@ Answer RegistrySource::open() {
     if (file.bytes().starts_with(kStoreMark)) {
         return openStore({.program = "kz7admin", .backup = place_, .readOnly = true, .ownProcess = false});
     }
+    using namespace std::string_view_literals;
+    isCutOff_ = !file.bytes().ends_with('\n') && !file.bytes().ends_with("\n\0"sv);
     std::vector<KeyChange> changes;
     TextFault bad;
     if (!parseRegText(file.bytes(), changes, bad)) {
@@ -48,6 +50,21 @@ Answer RegistrySource::open() {
     registry_ = &memory_;
     return status == kSuccess ? kAnswerYes
                               : admin_.fault(compose("cannot read: %s:%u: error %u", {file.shown(), line, status}));
+}
+
+Answer RegistrySource::examine() {
+    if (isCutOff_) {
+        return admin_.fault(shownText(place_) + ": the last line has no end: the file was cut off");
+    }
+    std::vector<std::string> damages;
+    const Status status = platform_ == nullptr ? kSuccess : platform_->examineStore(damages);
+    if (platform_ != nullptr) {
+        registry().commit();  // the end of its transaction
+    }
+    if (status != kSuccess) {
+        return kAnswerFault;  // told by the platform
+    }
+    return damages.empty() ? kAnswerYes : admin_.fault(shownText(place_) + ": damaged: " + shownText(damages.front()));
 }
 
 // Takes the runs back in memory, the last one first.

@@ -1,6 +1,5 @@
 // What a command line can name as a registry: "." for this machine's store, "@N" for it as it was before run N of the
-// history, the state directory of another store, a
-// backup, or a file of registry-editor text. Errors are reported here.
+// history, the state directory of another store, a backup, or a file of registry-editor text. Errors are reported here.
 #pragma once
 
 #include <memory>
@@ -19,6 +18,10 @@ public:
 
     // For reading; after admin.open().
     Answer open();
+
+    // Reports why the registry may lack a part of what it had: a damaged store, or a text that was cut off. After
+    // open().
+    Answer examine();
 
     // Only after open().
     IRegistryStore& registry() { return *registry_; }
@@ -45,6 +48,7 @@ private:
     MemoryRegistry memory_;                // of a file
     IRegistryStore* registry_ = nullptr;
     bool isOwn_ = true;
+    bool isCutOff_ = false;
 };
 
 }  // namespace kz7

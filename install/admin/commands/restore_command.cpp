@@ -105,15 +105,17 @@ Answer restore(Admin& admin, const RestoreOptions& options) {
     }
     IPlatform& platform = admin.platform();
     RegistrySource file(admin, options.file);
-    if (const Answer opened = file.open(); opened != kAnswerYes) {
-        return opened;
+    Answer answer = file.open();
+    answer = answer == kAnswerYes ? file.examine() : answer;
+    if (answer != kAnswerYes) {
+        return answer;
     }
     std::vector<std::string> damages;
     if (!platform.storeIsLost() && platform.examineStore(damages) == kSuccess && !damages.empty()) {
         admin.tell(compose("%s: %s", {shownText(platform.storeName()), shownText(damages.front())}));
         return restoreStore(admin, options, file);
     }
-    const Answer answer = platform.storeIsLost() ? kAnswerFault : restoreKeys(admin, options, file);
+    answer = platform.storeIsLost() ? kAnswerFault : restoreKeys(admin, options, file);
     // Damage is found when the store is examined, read or changed.
     return answer == kAnswerFault && platform.storeIsLost() ? restoreStore(admin, options, file) : answer;
 }

@@ -183,9 +183,16 @@ Status EmbeddedRegistry::image(std::string& bytes) {
     }
     // Not serialized directly: pages that cannot be read would become zeros.
     Connection memory;
-    const int result = copyToMemory(connection_.get(), memory);
+    int result = copyToMemory(connection_.get(), memory);
+    std::vector<std::string> damages;
+    if (result == SQLITE_OK) {
+        result = StoreFile::examine(memory.get(), damages);
+    }
     if (result != SQLITE_OK) {
         return fail(result);
+    }
+    if (!damages.empty()) {
+        return fail(StoreFault{kRegistryCorrupt, path(), damages.front()});
     }
     sqlite3_int64 size = 0;
     const std::unique_ptr<unsigned char, void (*)(void*)> content(sqlite3_serialize(memory.get(), "main", &size, 0),
