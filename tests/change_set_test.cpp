@@ -116,9 +116,9 @@ private:
 };
 
 std::string jsonOf(const ChangeSet& changes) {
-    std::string json;
-    appendChangesJson(changes, json);
-    return json;
+    JsonWriter json;
+    appendChanges(changes, json);
+    return json.take();
 }
 
 Snapshot snapshotOf(IRegistryStore& registry) {

@@ -317,13 +317,27 @@ TEST_F(ChangesProgram, JsonFieldsAreThoseOfThePage) {
           {"history", "start"},
           {"history", "trim", "--keep", "1000"},
           {"repair", "--check"},
-          {"restore", backup}}) {
+          {"restore", backup},
+          {"undo", "1"},
+          {"undo", "99"},
+          {"restore", "/none"},
+          {"import", list},
+          {"ensure", "--from", reg},
+          {"copies", "--store", "/dev/null"},
+          {"aliases", "77"},
+          {"front", "/none"},
+          {"tree", "--rubbish"}}) {
         Arguments words = command;
         words.insert(words.begin() + 1, "--json");
         const ProgramResult result = store_.run("kz7admin", words);
-        EXPECT_LT(result.exitCode, 2) << command[0] << result.error;
-        EXPECT_TRUE(result.output.starts_with("{\"schema\":1,")) << command[0] << result.output;
-        printed += result.output;
+        const bool isTold =
+            std::regex_match(result.error, std::regex("\\{\"schema\":1,\"error\":\"[^\n]*\",\"exitCode\":" +
+                                                      std::to_string(result.exitCode) + "\\}\n"));
+        EXPECT_EQ(isTold, !result.error.empty()) << command[0] << result.error;
+        EXPECT_TRUE(result.output.empty() ? isTold && result.exitCode != 0
+                                          : result.output.starts_with("{\"schema\":1,") && result.exitCode < 2)
+            << command[0] << result.output << result.error;
+        printed += result.output + result.error;
     }
     const auto names = [](const std::string& text, const std::regex& pattern) {
         std::set<std::string> found;

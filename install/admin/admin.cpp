@@ -1,8 +1,10 @@
 #include "install/admin/admin.h"
 
 #include <array>
+#include <cstdio>
 #include <utility>
 
+#include "install/platform/encoding.h"
 #include "install/platform/registry_path.h"
 #include "install/platform/text.h"
 
@@ -16,16 +18,21 @@ constexpr std::size_t kPage = 1 << 16;  // bytes that are shown at once
 
 bool Admin::open(bool readOnly, bool missingIsEmpty) {
     readOnly_ = readOnly;
-    platform_ = hostPlatform({.program = std::string(kProgram),
-                              .stateDirectory = storeDirectory,
-                              .readOnly = readOnly,
-                              .missingIsEmpty = missingIsEmpty,
-                              .plainStreams = true});
+    PlatformOptions options = platformOptions();
+    options.stateDirectory = storeDirectory;
+    options.readOnly = readOnly;
+    options.missingIsEmpty = missingIsEmpty;
+    options.plainStreams = true;
+    platform_ = hostPlatform(options);
     if (!storeDirectory.empty() && !platform_->storeIsOwn()) {
         fault("cannot open store: --store: the store of this machine is its registry");
         return false;
     }
     return true;
+}
+
+PlatformOptions Admin::platformOptions() {
+    return {.program = std::string(kProgram), .tellFault = [this](const std::string& line) { tell(line); }};
 }
 
 void Admin::beginRun(bool startsPrograms, std::uint64_t undoes) {
@@ -111,7 +118,7 @@ Answer Admin::showKeys(const std::string& key, std::string text, const Appender&
 }
 
 Answer Admin::show(std::string_view text, Form form) {
-    if (!text.empty() && !std::exchange(storeTold_, true)) {
+    if (!text.empty() && !isJson && !std::exchange(storeTold_, true)) {
         tell(storeLine());
     }
     return write(text, form);
@@ -126,7 +133,26 @@ std::string Admin::storeLine() {
 }
 
 void Admin::tell(std::string_view message) {
-    platform_->console().writeError(compose("%s: %s\n", {kProgram, message}));
+    const std::string line = compose("%s: %s\n", {kProgram, message});
+    if (isJson) {
+        told_.append(told_.empty() ? "" : "\n").append(message);
+    } else if (platform_ != nullptr) {
+        platform_->console().writeError(line);
+    } else {
+        std::fputs(narrowFromText(line).c_str(), stderr);
+    }
+}
+
+void Admin::endErrors(int exitCode) {
+    if (!told_.empty()) {
+        JsonWriter json = beginDocument();
+        json.field("error", told_).field("exitCode", static_cast<std::uint32_t>(exitCode)).end();
+        std::fputs(json.take().c_str(), stderr);
+    }
+}
+
+Answer Admin::writeJson(JsonWriter& json) {
+    return write(json.end().take(), Form::document);
 }
 
 Answer Admin::no(std::string_view message) {

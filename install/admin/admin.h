@@ -8,6 +8,7 @@
 #include <string_view>
 #include <vector>
 
+#include "install/admin/formats/json_text.h"
 #include "install/platform/platform.h"
 #include "install/platform/shown_text.h"
 #include "install/src/registry/key_walk.h"
@@ -27,10 +28,14 @@ public:
     std::string storeDirectory;          // empty: the usual one
     std::vector<std::string> arguments;  // of this program
     std::function<int()> answer;         // runs the chosen subcommand; the exit code
+    bool isJson = false;                 // --json: all output is for programs
 
     // Opens the ports, once. False, with a message: a store directory was given, and this machine's store is its
     // registry. `missingIsEmpty`: see PlatformOptions.
     bool open(bool readOnly, bool missingIsEmpty = false);
+
+    // The options of every store that this program opens; each adds its own.
+    PlatformOptions platformOptions();
 
     // Only after open().
     IPlatform& platform() { return *platform_; }
@@ -39,6 +44,9 @@ public:
     // Describes the run that changes the store, for the history; `undoes` is the run that it takes back.
     void beginRun(bool startsPrograms = false, std::uint64_t undoes = 0);
     void endRun(int result);
+
+    // With --json, writes what was told as one object on standard error.
+    void endErrors(int exitCode);
 
     // The properties of standard output.
     TerminalView output() { return platform_->terminal().look(TerminalStream::output); }
@@ -54,13 +62,16 @@ public:
     // Text for people, or a document for programs: UTF-8 or bytes on every host.
     enum class Form { text, document };
 
-    // Writes to standard output; names the store on standard error before the first text.
+    // Writes to standard output; names the store on standard error before the first text for people.
     Answer show(std::string_view text, Form form = Form::text);
 
     // The name of the open store, with its note.
     std::string storeLine();
 
-    // One line on standard error.
+    // Writes a document, whose outermost object is still open, to standard output.
+    Answer writeJson(JsonWriter& json);
+
+    // One line on standard error, in any state of this object.
     void tell(std::string_view message);
     Answer no(std::string_view message);
     Answer fault(std::string_view message);
@@ -87,6 +98,7 @@ private:
     std::unique_ptr<IPlatform> platform_;
     bool readOnly_ = false;
     bool storeTold_ = false;
+    std::string told_;  // with --json
     bool readerGone_ = false;
 };
 

@@ -3,44 +3,27 @@
 #include <sstream>
 
 #include "install/admin/formats/change_text.h"
-#include "install/admin/formats/json_text.h"
 #include "install/platform/text.h"
 
 namespace kz7 {
 namespace {
 
-void appendTexts(std::string_view name, const std::vector<std::string>& texts, std::string& json) {
-    std::string_view separator;
-    json.append(",\"").append(name).append("\":[");
-    for (const std::string& text : texts) {
-        json += separator;
-        appendJsonText(text, json);
-        separator = ",";
-    }
-    json += ']';
+std::string_view withoutLineEnd(std::string_view line) {
+    return line.substr(0, line.find_last_not_of('\n') + 1);
 }
 
-std::string runJson(const ChangeRun& run, bool isCheck) {
-    std::string json = compose("{\"schema\":1,\"check\":%s,\"changed\":%s,\"status\":%u,\"changes\":",
-                               {isCheck ? "true" : "false", run.changes.empty() ? "false" : "true", run.status});
-    appendChangesJson(run.changes, json);
-    appendTexts("programs", run.programs, json);
-    appendTexts("notes", run.notes, json);
-    json += ",\"output\":";
-    appendJsonText(run.output, json);
-    std::string_view separator;
-    json += ",\"errors\":[";
+Answer showJson(Admin& admin, const ChangeRun& run, bool isCheck) {
+    JsonWriter json = beginDocument();
+    json.field("check", isCheck).field("changed", !run.changes.empty()).field("status", run.status);
+    appendChanges(run.changes, json.field("changes"));
+    json.field("programs", run.programs).field("notes", run.notes).field("output", run.output);
+    json.field("errors").beginArray();
     for (const ErrorLine& error : run.errors) {
-        json += separator;
-        json += compose("{\"line\":%u,\"status\":%u,\"failure\":%s,\"text\":",
-                        {error.line, error.status, error.isFailure ? "true" : "false"});
-        appendJsonText(std::string_view(error.text).substr(0, error.text.find_last_not_of('\n') + 1), json);
-        json += '}';
-        separator = ",";
+        json.beginObject().field("line", error.line).field("status", error.status).field("failure", error.isFailure);
+        json.field("text", withoutLineEnd(error.text)).end();
     }
-    json += "],\"conflicts\":";
-    appendChangesJson(run.conflicts, json);
-    return json + "}\n";
+    appendChanges(run.conflicts, json.end().field("conflicts"));
+    return admin.writeJson(json);
 }
 
 std::string runText(const ChangeRun& run, const ChangeOptions& options, bool isColoured) {
@@ -59,10 +42,10 @@ std::string runText(const ChangeRun& run, const ChangeOptions& options, bool isC
 
 }  // namespace
 
-void addChangeOptions(Command& command, ChangeOptions& options, const Option* excluded) {
+void addChangeOptions(Command& command, Admin& admin, ChangeOptions& options, const Option* excluded) {
     auto check = command.flag("--check", options.check, "Change nothing; tell what would change");
     auto diff = command.flag("--diff", options.diff, "Show each change");
-    auto json = command.flag("--json", options.json, "Write JSON for programs");
+    auto json = command.json(admin);
     command.flag("--detailed-exitcode", options.detailedExitCode, "Exit with 3 if something changed");
     if (excluded != nullptr) {
         check.excludes(*excluded);
@@ -99,7 +82,7 @@ Answer showPreview(Admin& admin, const ChangeOptions& options, Preview& preview,
     run.changes = preview.changes();
     run.programs = preview.programs();
     run.output = preview.console().output;
-    if (!options.json) {
+    if (!admin.isJson) {
         admin.platform().console().writeError(preview.console().error);
     } else if (run.errors.empty()) {
         takeErrorLines(preview.console().error, run);
@@ -108,8 +91,8 @@ Answer showPreview(Admin& admin, const ChangeOptions& options, Preview& preview,
 }
 
 Answer showRun(Admin& admin, const ChangeOptions& options, const ChangeRun& run) {
-    const Answer written = options.json ? admin.write(runJson(run, options.check), Admin::Form::document)
-                                        : admin.write(runText(run, options, admin.output().colours));
+    const Answer written =
+        admin.isJson ? showJson(admin, run, options.check) : admin.write(runText(run, options, admin.output().colours));
     if (written != kAnswerYes || run.isFailed()) {
         return written != kAnswerYes ? written : kAnswerNo;
     }

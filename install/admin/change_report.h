@@ -14,12 +14,11 @@ namespace kz7 {
 struct ChangeOptions {
     bool check = false;
     bool diff = false;
-    bool json = false;
     bool detailedExitCode = false;
 };
 
 // Adds --check, --diff, --json and --detailed-exitcode; the first three cannot stand beside `excluded`.
-void addChangeOptions(Command& command, ChangeOptions& options, const Option* excluded = nullptr);
+void addChangeOptions(Command& command, Admin& admin, ChangeOptions& options, const Option* excluded = nullptr);
 
 // What a run did, or would do.
 struct ChangeRun {

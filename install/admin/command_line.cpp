@@ -51,6 +51,10 @@ Option Command::flag(const std::string& name, bool& value, const std::string& de
     return Option(app_->add_flag(name, value, description));
 }
 
+Option Command::json(Admin& admin, const std::string& description) {
+    return flag("--json", admin.isJson, description);
+}
+
 Option Command::text(const std::string& name, std::string& value, const std::string& description) {
     return Option(app_->add_option(name, value, description));
 }

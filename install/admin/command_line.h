@@ -51,6 +51,7 @@ public:
     Option flag(const std::string& name, bool& value, const std::string& description);
     Option text(const std::string& name, std::string& value, const std::string& description);
     Option texts(const std::string& name, std::vector<std::string>& values, const std::string& description);
+    Option json(Admin& admin, const std::string& description = "Write JSON for programs");
     Option number(const std::string& name, std::uint64_t& value, const std::string& description);
 
     void needsOneOf(const Option& one, const Option& other);
@@ -72,9 +73,9 @@ public:
         answerWith(admin, [&admin, &options, function] { return static_cast<int>(function(admin, options)); });
     }
 
-private:
     void answerWith(Admin& admin, const std::function<int()>& function);
 
+private:
     CLI::App* app_;
 };
 

@@ -388,18 +388,11 @@ std::optional<Finding> judgeNamed(const AliasRow& row, std::size_t view, const C
     return Finding{Reason::aliasLower, {}, row.prefix, view, value.text, should};
 }
 
-// A text of the table has up to two placeholders.
-std::string fill(std::string_view pattern, const std::array<std::string, 2>& inserts) {
-    std::string text(pattern);
-    std::size_t from = 0;
-    for (const std::string& insert : inserts) {
-        const std::size_t at = text.find("%s", from);
-        if (at == std::string::npos) {
-            break;
-        }
-        text.replace(at, 2, insert);
-        from = at + insert.size();
-    }
+// A text of the table may have fewer placeholders.
+std::string fill(std::string_view pattern, const std::string& first, const std::string& second) {
+    const std::array<Insert, 2> inserts = {first, second};
+    std::string text(composeInto(nullptr, 0, pattern, inserts), '\0');
+    composeInto(text.data(), text.size(), pattern, inserts);
     return text;
 }
 
@@ -410,16 +403,16 @@ const FindingKind& Finding::kind() const {
 }
 
 std::string Finding::what() const {
-    return fill(kind().what, {shownText(subject), std::string(kViews[view].name)});
+    return fill(kind().what, shownText(subject), std::string(kViews[view].name));
 }
 
 std::string Finding::why() const {
-    return fill(kind().why, {shownOr(detail, "nothing"), shownOr(other, "nothing")});
+    return fill(kind().why, shownOr(detail, "nothing"), shownOr(other, "nothing"));
 }
 
 std::string Finding::repair() const {
     const std::string word = shownText(quotedWord(copy));
-    return fill(kind().repair, {word, word});
+    return fill(kind().repair, word, word);
 }
 
 std::vector<FindingKind> findingKinds() {

@@ -1,53 +1,35 @@
 #include "install/admin/key_json.h"
 
-#include <utility>
-
 #include "install/admin/formats/json_text.h"
 #include "install/admin/formats/value_type.h"
-#include "install/platform/text.h"
 
 namespace kz7 {
 namespace {
 
-void appendJsonValue(const KeyValue& value, std::string& json) {
-    json += "{\"name\":";
-    appendJsonText(value.name, json);
-    json += ',';
-    appendJsonData(value.type, value.data, json);
-    json += '}';
-}
-
-void appendJsonKey(const KeyRecord& key, std::string& json) {
-    json += "{\"key\":";
-    appendJsonText(key.name, json);
-    json += ",\"class\":";
-    appendJsonText(key.keyClass, json);
-    json += ",\"values\":[";
-    std::string_view separator = "\n  ";
+void appendKey(const KeyRecord& key, JsonWriter& json) {
+    json.beginObject().field("key", key.name).field("class", key.keyClass).field("values").beginArray();
     for (const KeyValue& value : key.values) {
-        json += separator;
-        appendJsonValue(value, json);
-        separator = ",\n  ";
+        appendData(value.type, value.data, json.beginObject().field("name", value.name));
+        json.end();
     }
-    json += ']';
+    json.end();
     if (key.status != kSuccess) {
-        json += compose(",\"error\":%u", {key.status});
+        json.field("error", key.status);
     }
-    json += '}';
+    json.end();
 }
 
 }  // namespace
 
 Answer showKeysJson(Admin& admin, const std::string& key) {
-    std::string separator = "\n";
-    std::string head = "{\"schema\":1,\"store\":";
-    appendJsonText(admin.platform().storeName(), head);
+    JsonWriter json = beginDocument();
+    json.field("store", admin.platform().storeName()).field("keys").beginArray();
     return admin.showKeys(
-        key, head + ",\"keys\":[",
-        [&](const KeyRecord& record, std::string& json) {
+        key, json.take(),
+        [&](const KeyRecord& record, std::string& text) {
             if (!isBareRoot(record) || record.status != kSuccess) {
-                json += std::exchange(separator, ",\n");
-                appendJsonKey(record, json);
+                appendKey(record, json);
+                text += json.take();
             }
         },
         "]}\n", Admin::Reading::snapshot);

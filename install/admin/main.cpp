@@ -1,4 +1,5 @@
 #include <CLI/CLI.hpp>
+#include <algorithm>
 #include <cstdio>
 #include <exception>
 #include <new>
@@ -6,7 +7,6 @@
 
 #include "install/admin/commands/commands.h"
 #include "install/platform/console.h"
-#include "install/platform/encoding.h"
 #include "install/platform/program.h"
 
 namespace kz7 {
@@ -52,9 +52,10 @@ Answer showHelp(const CLI::App& program, const CLI::Success& help) {
     return written ? kAnswerYes : kAnswerFault;
 }
 
-// Before there are ports, or without them.
-void tellFault(const std::string& reason) {
-    std::fputs(narrowFromText("kz7admin: " + reason + '\n').c_str(), stderr);
+// Whether the words ask for JSON, where they cannot be parsed. What follows "--" belongs to another program.
+bool asksForJson(const std::vector<std::string>& words) {
+    const auto end = std::find(words.begin(), words.end(), "--");
+    return std::find(words.begin(), end, "--json") != end;
 }
 
 void addCommands(Command& program, Admin& admin) {
@@ -80,8 +81,7 @@ void addCommands(Command& program, Admin& admin) {
     addUndoCommand(program, admin);
 }
 
-int run(int argc, char** argv) {
-    Admin admin;
+int run(Admin& admin, int argc, char** argv) {
     admin.arguments.assign(argv + (argc == 0 ? 0 : 1), argv + argc);
     CLI::App program("Inspects and changes the registry data that kz7InstallReg writes", "kz7admin");
     Command command(program);
@@ -97,15 +97,14 @@ int run(int argc, char** argv) {
     } catch (const CLI::Success& help) {
         return showHelp(program, help);
     } catch (const CLI::ExtrasError&) {
-        tellFault("unexpected argument: " + shownText(program.remaining(true).front()) + " (see --help)");
-        return kAnswerFault;
+        admin.isJson = asksForJson(admin.arguments);
+        return admin.fault("unexpected argument: " + shownText(program.remaining(true).front()) + " (see --help)");
     } catch (const CLI::ParseError& error) {
-        tellFault(shownText(error.what()) + " (see --help)");
-        return kAnswerFault;
+        admin.isJson = asksForJson(admin.arguments);
+        return admin.fault(shownText(error.what()) + " (see --help)");
     }
     if (admin.answer == nullptr) {
-        std::fputs("kz7admin: no command (see --help)\n", stderr);
-        return kAnswerFault;
+        return admin.fault("no command (see --help)");
     }
     const int answer = admin.answer();
     admin.endRun(answer);
@@ -117,12 +116,18 @@ int run(int argc, char** argv) {
 
 int kz7::programMain(int argc, char** argv) {
     // What was not committed is dropped with the platform.
+    Admin admin;
     try {
-        return run(argc, argv);
+        const int answer = run(admin, argc, argv);
+        admin.endErrors(answer);
+        return answer;
     } catch (const std::bad_alloc&) {
-        std::fputs("kz7admin: out of memory\n", stderr);
+        std::fputs(
+            admin.isJson ? "{\"schema\":1,\"error\":\"out of memory\",\"exitCode\":2}\n" : "kz7admin: out of memory\n",
+            stderr);
     } catch (const std::exception& error) {
-        tellFault(shownText(error.what()));
+        admin.tell(shownText(error.what()));
+        admin.endErrors(kAnswerFault);
     }
     return kAnswerFault;
 }

@@ -29,14 +29,14 @@ Answer RegistrySource::open() {
                                                    : admin_.fault("not a run: " + shownText(place_));
     }
     if (std::error_code ignored; std::filesystem::is_directory(place_, ignored)) {
-        return openStore({.program = "kz7admin", .stateDirectory = place_, .readOnly = true, .ownProcess = false});
+        return openStore(&PlatformOptions::stateDirectory);
     }
     InputFile file(admin_, place_);
     if (const Answer answer = file.read(); answer != kAnswerYes) {
         return answer;
     }
     if (file.bytes().starts_with(kStoreMark)) {
-        return openStore({.program = "kz7admin", .backup = place_, .readOnly = true, .ownProcess = false});
+        return openStore(&PlatformOptions::backup);
     }
     using namespace std::string_view_literals;
     isCutOff_ = !file.bytes().ends_with('\n') && !file.bytes().ends_with("\n\0"sv);
@@ -107,7 +107,11 @@ Answer RegistrySource::takeBack(const HistoryRun& run, std::uint64_t number) {
     return status == kSuccess ? kAnswerYes : admin_.storeFault("cannot go back: " + shownText(key), status);
 }
 
-Answer RegistrySource::openStore(const PlatformOptions& options) {
+Answer RegistrySource::openStore(std::string PlatformOptions::*place) {
+    PlatformOptions options = admin_.platformOptions();
+    options.*place = place_;
+    options.readOnly = true;
+    options.ownProcess = false;
     platform_ = hostPlatform(options);
     if (!platform_->storeIsOwn()) {
         return admin_.fault(shownText(place_) + ": a store of another platform");

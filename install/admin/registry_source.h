@@ -39,7 +39,7 @@ public:
 private:
     Answer openBefore(std::uint64_t number);
     Answer takeBack(const HistoryRun& run, std::uint64_t number);
-    Answer openStore(const PlatformOptions& options);
+    Answer openStore(std::string PlatformOptions::*place);
     Answer readFrom(const std::vector<KeyStart>& starts, Status found, bool wholeServices, Snapshot& snapshot);
 
     Admin& admin_;

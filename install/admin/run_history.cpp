@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <chrono>
 
-#include "install/admin/formats/json_text.h"
 #include "install/platform/text.h"
 #include "install/src/registry/touched_rows.h"
 
@@ -120,38 +119,15 @@ std::string stateOf(const HistoryRun& run) {
                                                 : std::to_string(run.status);
 }
 
-void appendRunJson(const HistoryRun& run, std::string& json) {
-    const auto text = [&](std::string_view name, std::string_view value) {
-        json.append(",\"").append(name).append("\":");
-        appendJsonText(value, json);
-    };
-    const auto texts = [&](std::string_view name, const std::vector<std::string>& values) {
-        json.append(",\"").append(name).append("\":[");
-        std::string_view separator;
-        for (const std::string& value : values) {
-            json += separator;
-            appendJsonText(value, json);
-            separator = ",";
-        }
-        json += ']';
-    };
-    const auto number = [&](std::string_view name, std::uint64_t value) {
-        json.append(",\"").append(name).append("\":").append(value == 0 ? "null" : std::to_string(value));
-    };
-    json += "\"number\":" + std::to_string(run.number);
-    number("parent", run.parent);
-    number("undoes", run.undoes);
-    text("begun", utcTime(run.begun));
-    text("ended", run.ended == 0 ? "" : utcTime(run.ended));
-    text("user", run.user);
-    text("host", run.host);
-    text("program", run.program);
-    texts("arguments", run.arguments);
-    text("state", run.state == RunState::ended ? "ended" : stateOf(run));
-    json += ",\"status\":" + std::to_string(run.status);
-    json += ",\"values\":" + std::to_string(run.counts.values) + ",\"keys\":" + std::to_string(run.counts.keys) +
-            ",\"services\":" + std::to_string(run.counts.services);
-    texts("outside", run.outside);
+void appendRun(const HistoryRun& run, JsonWriter& json) {
+    const auto number = [](std::uint64_t value) { return value == 0 ? std::string("null") : std::to_string(value); };
+    json.field("number", run.number);
+    json.field("parent").raw(number(run.parent)).field("undoes").raw(number(run.undoes));
+    json.field("begun", utcTime(run.begun)).field("ended", run.ended == 0 ? "" : utcTime(run.ended));
+    json.field("user", run.user).field("host", run.host).field("program", run.program);
+    json.field("arguments", run.arguments).field("state", run.state == RunState::ended ? "ended" : stateOf(run));
+    json.field("status", run.status).field("values", run.counts.values).field("keys", run.counts.keys);
+    json.field("services", run.counts.services).field("outside", run.outside);
 }
 
 }  // namespace kz7

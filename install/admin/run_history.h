@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "install/admin/admin.h"
+#include "install/admin/formats/json_text.h"
 #include "install/platform/history.h"
 #include "install/src/registry/change_set.h"
 
@@ -36,6 +37,6 @@ std::string commandOf(const HistoryRun& run);
 std::string stateOf(const HistoryRun& run);
 
 // Its fields without the braces.
-void appendRunJson(const HistoryRun& run, std::string& json);
+void appendRun(const HistoryRun& run, JsonWriter& json);
 
 }  // namespace kz7

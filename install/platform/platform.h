@@ -29,6 +29,9 @@ struct PlatformOptions {
     bool missingIsEmpty = false;      // with readOnly: a state directory that does not exist reads as empty
     bool plainStreams = false;        // standard input and output are bytes; line ends are not converted
     bool ownProcess = true;           // false: in a library, which must not change the state of the process
+
+    // Gets the line about a fault of the store, without the program's name; empty: it goes to standard error.
+    std::function<void(const std::string&)> tellFault = {};
 };
 
 // The ports of one machine, none of them owned.

@@ -53,16 +53,8 @@ std::string aliasesText(const std::vector<const AliasRow*>& rows, std::string_vi
     return tableText(table, columns);
 }
 
-std::string aliasesJson(const std::vector<const AliasRow*>& rows, const std::string& store) {
-    JsonWriter json;
-    json.beginObject().field("schema", std::uint64_t{1}).field("store", store);
-    appendAliases(rows, json.field("aliases"));
-    return json.end().take();
-}
-
 struct AliasesOptions {
     std::string prefix;
-    bool json = false;
 };
 
 Answer showAliases(Admin& admin, const AliasesOptions& options) {
@@ -74,8 +66,10 @@ Answer showAliases(Admin& admin, const AliasesOptions& options) {
     const std::string store = admin.platform().storeName();
     const std::string_view missingView = missingViewOf(machine);
     Answer shown = kAnswerYes;
-    if (options.json) {
-        shown = admin.show(aliasesJson(rows, store), Admin::Form::document);
+    if (admin.isJson) {
+        JsonWriter json = beginDocument();
+        appendAliases(rows, json.field("store", store).field("aliases"));
+        shown = admin.writeJson(json);
     } else if (!rows.empty()) {
         shown = admin.show(aliasesText(rows, missingView, admin.output().columns));
     }
@@ -90,7 +84,7 @@ void addAliasesCommand(Command& program, Admin& admin) {
     auto command = program.add("aliases", "Show the copy of each version prefix");
     auto& options = command.answerWith(admin, showAliases);
     command.text("PREFIX", options.prefix, "Only this prefix and longer ones, such as 9.7 for 9");
-    command.flag("--json", options.json, "Write JSON for programs");
+    command.json(admin);
 }
 
 }  // namespace kz7

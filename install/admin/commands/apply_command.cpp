@@ -78,7 +78,7 @@ Answer run(Admin& admin, const ApplyOptions& options, std::span<const char* cons
     MemoryConsole kept;
     LineConsole shown(admin.platform().console());
     Ports ports = admin.platform().ports();
-    ports.console = options.json ? static_cast<IConsole*>(&kept) : &shown;
+    ports.console = admin.isJson ? static_cast<IConsole*>(&kept) : &shown;
     RecordedPorts recorded(ports, {.wholeServices = admin.platform().storeIsOwn()});
     ChangeRun run;
     run.status = runTool(recorded.ports(), arguments, &run.errors);
@@ -120,7 +120,7 @@ Answer apply(Admin& admin, const ApplyOptions& options) {
 void addApplyCommand(Command& program, Admin& admin) {
     auto command = program.add("apply", "Run a command of kz7InstallReg, or show what it would do");
     auto& options = command.answerWith(admin, apply);
-    addChangeOptions(command, options);
+    addChangeOptions(command, admin, options);
     command.flag("--no-level", options.noLevel, "With --check, load no level library");
     command.texts("COMMAND", options.words, "An option of kz7InstallReg and its arguments, after \"--\"").isRequired();
 }

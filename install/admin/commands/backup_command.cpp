@@ -1,7 +1,6 @@
 #include <memory>
 
 #include "install/admin/commands/commands.h"
-#include "install/admin/formats/json_text.h"
 #include "install/admin/formats/reg_text.h"
 #include "install/platform/text.h"
 
@@ -11,7 +10,6 @@ namespace {
 struct BackupOptions {
     std::string file;
     bool force = false;
-    bool json = false;
 };
 
 // The product's keys in the registry of a machine, as its own editor reads them. A key that cannot be read fails the
@@ -62,10 +60,9 @@ Answer backUp(Admin& admin, const BackupOptions& options) {
     if (written != kAnswerYes) {
         return written;
     }
-    if (options.json) {
-        JsonWriter json;
-        json.beginObject().field("schema", std::uint64_t{1}).field("store", admin.platform().storeName());
-        return admin.write(json.field("file", options.file).end().take(), Admin::Form::document);
+    if (admin.isJson) {
+        JsonWriter json = beginDocument();
+        return admin.writeJson(json.field("store", admin.platform().storeName()).field("file", options.file));
     }
     return admin.write(compose("backed up %s to %s\n", {admin.storeLine(), shownText(options.file)}));
 }
@@ -77,7 +74,7 @@ void addBackupCommand(Command& program, Admin& admin) {
     auto& options = command.answerWith(admin, backUp);
     command.text("FILE", options.file, "The file to make").isRequired().isFileName();
     command.flag("--force", options.force, "Replace an existing file");
-    command.flag("--json", options.json, "Write JSON for programs");
+    command.json(admin);
 }
 
 }  // namespace kz7

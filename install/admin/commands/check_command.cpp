@@ -10,7 +10,6 @@ namespace {
 struct CheckOptions {
     std::string copy;
     bool all = false;
-    bool json = false;
 };
 
 std::string findingsText(const std::vector<Finding>& findings) {
@@ -21,11 +20,10 @@ std::string findingsText(const std::vector<Finding>& findings) {
     return text;
 }
 
-std::string findingsJson(Admin& admin, const std::vector<Finding>& findings) {
-    JsonWriter json;
-    json.beginObject().field("schema", std::uint64_t{1}).field("store", admin.platform().storeName());
-    appendFindings(findings, json.field("findings"));
-    return json.end().take();
+Answer showJson(Admin& admin, const std::vector<Finding>& findings) {
+    JsonWriter json = beginDocument();
+    appendFindings(findings, json.field("store", admin.platform().storeName()).field("findings"));
+    return admin.writeJson(json);
 }
 
 Answer check(Admin& admin, const CheckOptions& options) {
@@ -40,8 +38,7 @@ Answer check(Admin& admin, const CheckOptions& options) {
             return admin.no("no such copy: " + shownText(options.copy) + " (see kz7admin copies)");
         }
     }
-    const Answer written = options.json ? admin.write(findingsJson(admin, findings), Admin::Form::document)
-                                        : admin.write(findingsText(findings));
+    const Answer written = admin.isJson ? showJson(admin, findings) : admin.write(findingsText(findings));
     const bool isInOrder = std::none_of(findings.begin(), findings.end(),
                                         [](const Finding& one) { return one.kind().mark == Mark::fault; });
     return written != kAnswerYes || isInOrder ? written : kAnswerNo;
@@ -55,7 +52,7 @@ void addCheckCommand(Command& program, Admin& admin) {
     command.describe("Prints nothing and exits with 0 if all is in order, else with 1. Notes do not\ncount.");
     command.text("NAME", options.copy, "Only what belongs to this copy");
     command.flag("--all", options.all, "Also what is deliberate or not installed yet");
-    command.flag("--json", options.json, "Write JSON for programs");
+    command.json(admin);
 }
 
 }  // namespace kz7

@@ -103,7 +103,7 @@ Answer run(Admin& admin, const Words& words, ConfigurationRequest request) {
     admin.beginRun(true);
     MemoryConsole kept;
     Ports ports = admin.platform().ports();
-    ports.console = words.json ? &kept : ports.console;
+    ports.console = admin.isJson ? &kept : ports.console;
     RecordedPorts recorded(ports, {.wholeServices = admin.platform().storeIsOwn()});
     const ConfigurationOutcome outcome = runConfiguration(recorded.ports(), std::move(request));
     if (outcome.kept != kSuccess) {
@@ -156,7 +156,7 @@ void addCommitCommand(Command& program, Admin& admin) {
     command.text("--instance", words.instance, "The instance; the whole copy without it");
     command.text("--log", words.logFile, "The log; kz7msi.log in the state directory without it");
     auto machine = command.flag("--machine", words.machine, "Speak the progress protocol, for a front end");
-    addChangeOptions(command, words, &machine);
+    addChangeOptions(command, admin, words, &machine);
 }
 
 }  // namespace kz7

@@ -10,15 +10,7 @@ struct CopiesOptions {
     std::string versions;
     std::vector<std::string> columns;
     std::string format = "table";
-    bool json = false;
 };
-
-std::string copiesJson(const std::vector<CopyLine>& lines, const CopiesOptions& options, const std::string& store) {
-    JsonWriter json;
-    json.beginObject().field("schema", std::uint64_t{1}).field("store", store);
-    appendCopies(lines, options.columns, json.field("copies"));
-    return json.end().take();
-}
 
 // One line for each copy: an object, or texts between tabs.
 std::string copiesLines(const std::vector<CopyLine>& lines, const CopiesOptions& options) {
@@ -45,12 +37,17 @@ Answer show(Admin& admin, const std::vector<CopyLine>& lines, const CopiesOption
     if (options.format == "table") {
         return admin.show(copiesText(lines, options.columns, admin.output().columns));
     }
-    return admin.show(options.format == "json" ? copiesJson(lines, options, store) : copiesLines(lines, options),
-                      Admin::Form::document);
+    if (options.format == "json") {
+        JsonWriter json = beginDocument();
+        appendCopies(lines, options.columns, json.field("store", store).field("copies"));
+        return admin.writeJson(json);
+    }
+    return admin.show(copiesLines(lines, options), Admin::Form::document);
 }
 
 Answer showCopies(Admin& admin, CopiesOptions options) {
-    options.format = options.json ? "json" : options.format;
+    options.format = admin.isJson ? "json" : options.format;
+    admin.isJson = options.format.starts_with("json");
     if (VersionRange range; !options.versions.empty()) {
         if (!range.parse(options.versions)) {
             return admin.open(true) ? admin.fault("not a range of versions: " + shownText(options.versions) +
@@ -63,8 +60,7 @@ Answer showCopies(Admin& admin, CopiesOptions options) {
     if (const Answer read = openMachine(admin, Depth::copies, machine); read != kAnswerYes) {
         return read;
     }
-    const bool isJson = options.format.starts_with("json");
-    const std::vector<CopyLine> lines = copyLines(machine, admin.platform().services(), options.filter, isJson);
+    const std::vector<CopyLine> lines = copyLines(machine, admin.platform().services(), options.filter, admin.isJson);
     if (admin.platform().storeFaultTold()) {
         return kAnswerFault;
     }
@@ -94,7 +90,7 @@ void addCopiesCommand(Command& program, Admin& admin) {
         .isOneOf({kCopyColumns.begin(), kCopyColumns.end()});
     auto format = command.text("--format", options.format, "table, tsv, json or jsonl")
                       .isOneOf({"table", "tsv", "json", "jsonl"});
-    command.flag("--json", options.json, "Write JSON for programs").excludes(format);
+    command.json(admin).excludes(format);
 }
 
 }  // namespace kz7

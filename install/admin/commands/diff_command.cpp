@@ -1,6 +1,5 @@
 #include "install/admin/commands/commands.h"
 #include "install/admin/formats/change_text.h"
-#include "install/admin/formats/json_text.h"
 #include "install/admin/formats/reg_text.h"
 #include "install/admin/registry_source.h"
 
@@ -12,16 +11,8 @@ struct DiffOptions {
     std::string after;
     std::string key;
     bool reg = false;
-    bool json = false;
     bool stat = false;
 };
-
-std::string diffJson(const ChangeSet& changes) {
-    std::string json = changes.empty() ? "{\"schema\":1,\"changed\":false,\"changes\":"
-                                       : "{\"schema\":1,\"changed\":true,\"changes\":";
-    appendChangesJson(changes, json);
-    return json + "}\n";
-}
 
 Answer readBoth(Admin& admin, const DiffOptions& options, Snapshot& old, Snapshot& now) {
     RegistrySource before(admin, options.before);
@@ -54,15 +45,17 @@ Answer diff(Admin& admin, const DiffOptions& options) {
         return read;
     }
     const ChangeSet changes = difference(old, now);
-    std::string text;
-    if (options.json) {
-        text = diffJson(changes);
+    Answer written = kAnswerYes;
+    if (admin.isJson) {
+        JsonWriter json = beginDocument();
+        appendChanges(changes, json.field("changed", !changes.empty()).field("changes"));
+        written = admin.writeJson(json);
     } else if (options.reg) {
-        text = regTextHeader() + changeRegText(changes);
+        written = admin.write(regTextHeader() + changeRegText(changes), Admin::Form::document);
     } else {
-        text = options.stat ? changeSummary(changes, "differ") + '\n' : changeText(changes, admin.output().colours);
+        written = admin.write(options.stat ? changeSummary(changes, "differ") + '\n'
+                                           : changeText(changes, admin.output().colours));
     }
-    const Answer written = admin.write(text, options.json || options.reg ? Admin::Form::document : Admin::Form::text);
     return written != kAnswerYes || changes.empty() ? written : kAnswerNo;
 }
 
@@ -80,7 +73,7 @@ void addDiffCommand(Command& program, Admin& admin) {
     command.text("B", options.after, "The registry after").isRequired();
     command.text("KEY", options.key, "The key to compare; without it everything");
     auto reg = command.flag("--reg", options.reg, "Write the file whose import turns A into B");
-    auto json = command.flag("--json", options.json, "Write JSON for programs").excludes(reg);
+    auto json = command.json(admin).excludes(reg);
     command.flag("--stat", options.stat, "Count the differences").excludes(reg).excludes(json);
 }
 

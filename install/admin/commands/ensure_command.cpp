@@ -21,7 +21,7 @@ Answer ensureOn(Admin& admin, const EnsureOptions& options, const std::vector<Wa
     run.errors = std::move(ensurer.errors);
     run.notes = std::move(ensurer.notes);
     ports.registry->commit();
-    if (!options.json) {
+    if (!admin.isJson) {
         for (const ErrorLine& error : run.errors) {
             admin.tell(shownText(error.text.substr(0, error.text.find_last_not_of('\n') + 1)));
         }
@@ -75,7 +75,7 @@ Answer ensure(Admin& admin, const EnsureOptions& options) {
 void addEnsureCommand(Command& program, Admin& admin) {
     auto command = program.add("ensure", "Make the copies as a file lists them");
     auto& options = command.answerWith(admin, ensure);
-    addChangeOptions(command, options);
+    addChangeOptions(command, admin, options);
     command.text("--from", options.file, "A JSON file with the copies; \"-\" is standard input").isRequired();
     auto prune = command.flag("--prune", options.prune, "Remove the copies that the file does not list");
     command.flag("--all", options.all, "Remove the last copy and the product too").needs(prune);

@@ -1,6 +1,5 @@
 #include "install/admin/commands/commands.h"
 #include "install/admin/explanations.h"
-#include "install/admin/formats/json_text.h"
 #include "install/admin/input_file.h"
 
 namespace kz7 {
@@ -8,7 +7,6 @@ namespace {
 
 struct ExplainOptions {
     std::vector<std::string> words;
-    bool json = false;
 };
 
 std::string lineText(const LineExplanation& row) {
@@ -38,13 +36,13 @@ std::string meaningsText(const Meanings& meanings, std::string_view word) {
 
 void appendMeanings(const Meanings& meanings, JsonWriter& json) {
     for (const LineExplanation* const row : meanings.lines) {
-        json.beginObject().field("line", std::uint64_t{row->line}).field("options", row->options);
+        json.beginObject().field("line", row->line).field("options", row->options);
         json.field("step", row->step).field("cause", row->cause).field("left", row->left);
         json.field("next", row->next).end();
     }
     for (const auto* const statuses : {&meanings.statuses, &meanings.seenInShell}) {
         for (const StatusExplanation* const row : *statuses) {
-            json.beginObject().field("status", std::uint64_t{row->status}).field("name", row->name);
+            json.beginObject().field("status", row->status).field("name", row->name);
             json.field("cause", row->cause).field("next", row->next);
             json.field("exitCode", row->isExitCode).end();
         }
@@ -55,8 +53,8 @@ Answer explain(Admin& admin, const ExplainOptions& options) {
     if (!admin.open(true, true)) {
         return kAnswerFault;
     }
-    JsonWriter json;
-    json.beginObject().field("schema", std::uint64_t{1}).field("meanings").beginArray();
+    JsonWriter json = beginDocument();
+    json.field("meanings").beginArray();
     std::string text;
     Answer answer = kAnswerYes;
     for (const std::string& word : options.words) {
@@ -77,8 +75,7 @@ Answer explain(Admin& admin, const ExplainOptions& options) {
                                           : "neither an error line nor a status of this system: " + shownText(word));
         }
     }
-    const Answer written =
-        options.json ? admin.write(json.end().end().take(), Admin::Form::document) : admin.write(text);
+    const Answer written = admin.isJson ? admin.writeJson(json.end()) : admin.write(text);
     return written != kAnswerYes ? written : answer;
 }
 
@@ -91,7 +88,7 @@ void addExplainCommand(Command& program, Admin& admin) {
         "WHAT is a status (5021, 0x870F0104), an exit code as a POSIX shell shows it\n"
         "(157), the number of an error line (392), or \"-\" for pasted output or a log.");
     command.texts("WHAT", options.words, "What to explain").isRequired();
-    command.flag("--json", options.json, "Write JSON for programs");
+    command.json(admin);
 }
 
 }  // namespace kz7

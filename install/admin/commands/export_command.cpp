@@ -9,7 +9,6 @@ namespace {
 struct ExportOptions {
     std::string key;
     bool utf16 = false;
-    bool json = false;
 };
 
 // Lines for a terminal. What is escaped here is not read back by an import.
@@ -25,7 +24,7 @@ Answer exportKeys(Admin& admin, const ExportOptions& options) {
     if (!admin.open(true)) {
         return kAnswerFault;
     }
-    if (options.json) {
+    if (admin.isJson) {
         return showKeysJson(admin, options.key);
     }
     const bool isTerminal = admin.output().terminal;
@@ -53,7 +52,7 @@ void addExportCommand(Command& program, Admin& admin) {
     auto& options = command.answerWith(admin, exportKeys);
     command.text("KEY", options.key, "The key to begin at; everything without it");
     auto utf16 = command.flag("--utf16", options.utf16, "Write UTF-16 as Windows' own editor does");
-    command.flag("--json", options.json, "Write JSON for programs").excludes(utf16);
+    command.json(admin).excludes(utf16);
 }
 
 }  // namespace kz7

@@ -25,23 +25,19 @@ void appendServices(const MachineState& machine, JsonWriter& json) {
     json.beginArray();
     for (const ServiceRow& service : machine.services) {
         json.beginObject().field("name", service.name).field("copy", service.copy);
-        json.field("program", service.program).field("start", std::uint64_t{service.start}).end();
+        json.field("program", service.program).field("start", service.start).end();
     }
     json.end();
 }
 
-struct FactsOptions {
-    bool json = true;
-};
-
-Answer showFacts(Admin& admin, const FactsOptions& /*options*/) {
+Answer showFacts(Admin& admin) {
     MachineState machine;
     if (const Answer read = openWholeMachine(admin, machine); read != kAnswerYes) {
         return read;
     }
     const std::vector<CopyLine> copies = copyLines(machine, admin.platform().services(), {}, true);
-    JsonWriter json;
-    json.beginObject().field("schema", std::uint64_t{1}).field("store", admin.platform().storeName());
+    JsonWriter json = beginDocument();
+    json.field("store", admin.platform().storeName());
     appendHost(admin.platform().host(), json.field("host"));
     appendPrograms(json.field("programs"));
     json.field("backup", machine.hasBackup);
@@ -49,16 +45,15 @@ Answer showFacts(Admin& admin, const FactsOptions& /*options*/) {
     appendAliases(aliasRows(machine), json.field("aliases"));
     appendServices(machine, json.field("services"));
     appendFindings(findFindings(machine, admin.platform().files(), true), json.field("findings"));
-    const std::string text = json.end().take();
-    return admin.platform().storeFaultTold() ? kAnswerFault : admin.write(text, Admin::Form::document);
+    return admin.platform().storeFaultTold() ? kAnswerFault : admin.writeJson(json);
 }
 
 }  // namespace
 
 void addFactsCommand(Command& program, Admin& admin) {
     auto command = program.add("facts", "Write what is known of the machine as JSON");
-    auto& options = command.answerWith(admin, showFacts);
-    command.flag("--json", options.json, "The same: facts has no other form");
+    command.answerWith(admin, [&admin] { return showFacts(admin); });
+    command.json(admin, "The same, and errors as JSON too");
 }
 
 }  // namespace kz7

@@ -1,7 +1,6 @@
 #include <memory>
 
 #include "install/admin/commands/commands.h"
-#include "install/admin/formats/json_text.h"
 #include "install/admin/front/front.h"
 #include "install/platform/command_line.h"
 #include "install/platform/memory/small_ports.h"
@@ -14,7 +13,6 @@ constexpr int kNotStarted = 127;  // as in shells; all other codes are the progr
 
 struct FrontOptions {
     std::vector<std::string> words;  // the program and its arguments
-    bool json = false;
 };
 
 // The exit code, which may be any number.
@@ -31,13 +29,12 @@ int runProgram(Admin& admin, const FrontOptions& options) {
     IPlatform& platform = admin.platform();
     MemoryConsole kept;
     const FrontPorts ports{platform.processes(), platform.threads(), platform.files(), platform.terminal(),
-                           options.json ? static_cast<IConsole&>(kept) : platform.console()};
+                           admin.isJson ? static_cast<IConsole&>(kept) : platform.console()};
     std::uint32_t exitCode = 0;
     const Status status = runFront(ports, command, exitCode);
-    if (options.json && status == kSuccess) {
-        JsonWriter json;
-        json.beginObject().field("schema", std::uint64_t{1}).field("exitCode", std::uint64_t{exitCode});
-        admin.write(json.field("output", kept.output).end().take(), Admin::Form::document);
+    if (admin.isJson && status == kSuccess) {
+        JsonWriter json = beginDocument();
+        admin.writeJson(json.field("exitCode", exitCode).field("output", kept.output));
     }
     if (status == kSuccess) {
         return static_cast<int>(exitCode);
@@ -59,7 +56,7 @@ void addFrontCommand(Command& program, Admin& admin) {
     auto& options = command.answerWith(admin, runProgram);
     command.texts("PROGRAM", options.words, "The program and its arguments, best after --").isRequired();
     command.endsWithArguments();
-    command.flag("--json", options.json, "Write the result as JSON, show no progress");
+    command.json(admin, "Write the result as JSON, show no progress");
 }
 
 }  // namespace kz7

@@ -19,7 +19,6 @@ struct HistoryOptions {
     std::uint64_t keep = 0;
     std::string before;  // a date; empty: `keep` counts
     bool check = false;
-    bool json = false;
     bool diff = false;
     bool reg = false;
 };
@@ -60,16 +59,14 @@ std::string runsText(const std::vector<HistoryRun>& runs, std::uint32_t columns)
     return tableText(table, columns);
 }
 
-std::string runsJson(const std::vector<HistoryRun>& runs) {
-    std::string json = "{\"schema\":1,\"runs\":[";
-    std::string_view separator = "\n";
+Answer showJson(Admin& admin, const std::vector<HistoryRun>& runs) {
+    JsonWriter json = beginDocument();
+    json.field("runs").beginArray();
     for (const HistoryRun& run : runs) {
-        json.append(separator).append("{");
-        appendRunJson(run, json);
-        json += '}';
-        separator = ",\n";
+        appendRun(run, json.beginObject());
+        json.end();
     }
-    return json + "]}\n";
+    return admin.writeJson(json.end());
 }
 
 Answer showHistory(Admin& admin, const HistoryOptions& options) {
@@ -80,8 +77,8 @@ Answer showHistory(Admin& admin, const HistoryOptions& options) {
     if (const Answer selected = selectRuns(admin, options.copy, runs); selected != kAnswerYes) {
         return selected;
     }
-    if (options.json) {
-        return admin.show(runsJson(runs), Admin::Form::document);
+    if (admin.isJson) {
+        return showJson(admin, runs);
     }
     return runs.empty() ? admin.no("no run is recorded: " + shownText(admin.platform().storeName()))
                         : admin.show(runsText(runs, admin.output().columns));
@@ -115,14 +112,13 @@ Answer showOne(Admin& admin, const HistoryOptions& options) {
     if (options.reg) {
         return admin.write(regTextHeader() + changeRegText(changes), Admin::Form::document);
     }
-    if (!options.json) {
+    if (!admin.isJson) {
         return admin.write(runText(run, changes, options.diff, admin.output().colours));
     }
-    std::string json = "{\"schema\":1,";
-    appendRunJson(run, json);
-    json += ",\"changes\":";
-    appendChangesJson(changes, json);
-    return admin.write(json + "}\n", Admin::Form::document);
+    JsonWriter json = beginDocument();
+    appendRun(run, json);
+    appendChanges(changes, json.field("changes"));
+    return admin.writeJson(json);
 }
 
 // The number of the first run that stays.
@@ -135,10 +131,10 @@ std::uint64_t firstLeft(const std::vector<HistoryRun>& runs, const HistoryOption
 }
 
 Answer showTrimmed(Admin& admin, const HistoryOptions& options, std::uint32_t removed) {
-    if (options.json) {
-        return admin.write(compose("{\"schema\":1,\"check\":%s,\"changed\":%s,\"removed\":%u}\n",
-                                   {options.check ? "true" : "false", removed == 0 ? "false" : "true", removed}),
-                           Admin::Form::document);
+    if (admin.isJson) {
+        JsonWriter json = beginDocument();
+        json.field("check", options.check).field("changed", removed != 0);
+        return admin.writeJson(json.field("removed", removed));
     }
     return admin.write(removed == 0 ? "unchanged\n"
                                     : compose("%s: %u run%s\n", {options.check ? "would remove" : "removed", removed,
@@ -166,7 +162,7 @@ Answer trim(Admin& admin, const HistoryOptions& options) {
                               : admin.storeFault("cannot trim the history", status);
 }
 
-Answer turn(Admin& admin, const HistoryOptions& options, bool on) {
+Answer turn(Admin& admin, bool on) {
     if (!admin.open(false)) {
         return kAnswerFault;
     }
@@ -182,22 +178,13 @@ Answer turn(Admin& admin, const HistoryOptions& options, bool on) {
                : "cannot stop the history",
             status);
     }
-    if (options.json) {
-        return admin.write(compose("{\"schema\":1,\"changed\":%s,\"on\":%s}\n",
-                                   {wasOn != on ? "true" : "false", on ? "true" : "false"}),
-                           Admin::Form::document);
+    if (admin.isJson) {
+        JsonWriter json = beginDocument();
+        return admin.writeJson(json.field("changed", wasOn != on).field("on", on));
     }
     return admin.write(status == kCallNotImplemented ? "the history is always on\n"
                        : on                          ? "the history is on\n"
                                                      : "the history is off\n");
-}
-
-Answer turnOn(Admin& admin, const HistoryOptions& options) {
-    return turn(admin, options, true);
-}
-
-Answer turnOff(Admin& admin, const HistoryOptions& options) {
-    return turn(admin, options, false);
 }
 
 std::string dateFault(const std::string& text) {
@@ -215,7 +202,7 @@ void addShow(Command& history, Admin& admin, HistoryOptions& options) {
     show.number("N", options.number, "Its number").isRequired();
     auto diff = show.flag("--diff", options.diff, "Show each change");
     show.flag("--reg", options.reg, "Write its changes as registry-editor text").excludes(diff);
-    show.flag("--json", options.json, "Write JSON for programs").excludes(diff);
+    show.json(admin).excludes(diff);
 }
 
 void addTrim(Command& history, Admin& admin, HistoryOptions& options) {
@@ -226,7 +213,7 @@ void addTrim(Command& history, Admin& admin, HistoryOptions& options) {
     before.check(dateFault).excludes(keep);
     trimmed.needsOneOf(keep, before);
     trimmed.flag("--check", options.check, "Change nothing; tell what would be removed");
-    trimmed.flag("--json", options.json, "Write JSON for programs");
+    trimmed.json(admin);
 }
 
 }  // namespace
@@ -235,15 +222,15 @@ void addHistoryCommand(Command& program, Admin& admin) {
     auto command = program.add("history", "Show the runs that changed the store, and what each changed");
     auto& options = command.answerWith(admin, showHistory);
     command.text("NAME", options.copy, "Only the runs that changed this copy");
-    command.flag("--json", options.json, "Write JSON for programs");
+    command.json(admin);
     addShow(command, admin, options);
     addTrim(command, admin, options);
     auto start = command.add("start", "Record runs from now on (Windows)");
-    start.answerWith(admin, turnOn, options);
-    start.flag("--json", options.json, "Write JSON for programs");
+    start.answerWith(admin, [&admin] { return turn(admin, true); });
+    start.json(admin);
     auto stop = command.add("stop", "Record no more runs (Windows)");
-    stop.answerWith(admin, turnOff, options);
-    stop.flag("--json", options.json, "Write JSON for programs");
+    stop.answerWith(admin, [&admin] { return turn(admin, false); });
+    stop.json(admin);
 }
 
 }  // namespace kz7

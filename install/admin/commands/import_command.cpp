@@ -76,7 +76,7 @@ Answer importFile(Admin& admin, const ImportOptions& options) {
 void addImportCommand(Command& program, Admin& admin) {
     auto command = program.add("import", "Do what a file of registry-editor text asks for");
     auto& options = command.answerWith(admin, importFile);
-    addChangeOptions(command, options);
+    addChangeOptions(command, admin, options);
     command.text("FILE", options.file, "The file; \"-\" is standard input").isRequired();
 }
 

@@ -128,7 +128,7 @@ void addRepairCommand(Command& program, Admin& admin) {
         "A KIND is the first word of a line of check, or a group of kinds: aliases,\n"
         "copies, services, properties, migration. Without one, all but services and\n"
         "migration is repaired. No program is started.");
-    addChangeOptions(command, options);
+    addChangeOptions(command, admin, options);
     command.texts("KIND", options.words, "What to repair; the last word may name a copy");
     auto on = command.text("--on", options.request.location, "Finish a half-done migration to this location");
     on.isFileName();

@@ -13,7 +13,6 @@ struct ReportOptions {
     std::vector<std::string> fleet;  // files with facts
     std::string file;
     bool force = false;
-    bool json = false;
 };
 
 std::string timeNow(IHostInformation& host) {
@@ -99,13 +98,12 @@ Answer writeReport(Admin& admin, const ReportOptions& options, const std::string
     if (const Answer written = admin.writeFile("report", options.file, html, options.force); written != kAnswerYes) {
         return written;
     }
-    if (options.json) {
-        JsonWriter json;
-        json.beginObject().field("schema", std::uint64_t{1});
+    if (admin.isJson) {
+        JsonWriter json = beginDocument();
         if (options.fleet.empty()) {
             json.field("store", admin.platform().storeName());
         }
-        return admin.write(json.field("file", options.file).end().take(), Admin::Form::document);
+        return admin.writeJson(json.field("file", options.file));
     }
     return admin.write("wrote " + shownText(options.file) + '\n');
 }
@@ -129,7 +127,7 @@ void addReportCommand(Command& program, Admin& admin) {
     file.isFileName();
     command.texts("--fleet", options.fleet, "Describe many machines instead, by files that facts wrote there");
     command.flag("--force", options.force, "Replace an existing file").needs(file);
-    command.flag("--json", options.json, "Write JSON about the file for programs").needs(file);
+    command.json(admin, "Write JSON about the file for programs").needs(file);
 }
 
 }  // namespace kz7

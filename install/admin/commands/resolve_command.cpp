@@ -12,7 +12,6 @@ struct ResolveOptions {
     std::string prefix;
     std::string view = "native";
     std::string field;
-    bool json = false;
 };
 
 // What a view answers for a prefix.
@@ -75,9 +74,9 @@ void appendCopy(const CopyInView& copy, JsonWriter& json) {
     json.field("name", copy.name).field("version", copy.info.getVersion()).field("location", copy.location);
 }
 
-std::string resolvedJson(const Resolved& resolved, const ResolveOptions& options, std::size_t view) {
-    JsonWriter json;
-    json.beginObject().field("schema", std::uint64_t{1}).field("prefix", options.prefix).field("view", options.view);
+Answer showJson(Admin& admin, const Resolved& resolved, const ResolveOptions& options, std::size_t view) {
+    JsonWriter json = beginDocument();
+    json.field("prefix", options.prefix).field("view", options.view);
     json.field("names", resolved.named).field("right", resolved.fault.empty()).field("why", resolved.fault);
     if (resolved.copy != nullptr) {
         appendCopy(*resolved.copy, json);
@@ -88,7 +87,7 @@ std::string resolvedJson(const Resolved& resolved, const ResolveOptions& options
         appendCopy(candidate->views[view] ? *candidate->views[view] : candidate->shown(), json);
         json.end();
     }
-    return json.end().end().take();
+    return admin.writeJson(json.end());
 }
 
 Answer showResolved(Admin& admin, const ResolveOptions& options) {
@@ -99,8 +98,8 @@ Answer showResolved(Admin& admin, const ResolveOptions& options) {
     const std::size_t view = options.view == kViews[kOther].name ? kOther : kNative;
     const Resolved resolved = resolve(machine, options.prefix, view);
     Answer written = kAnswerYes;
-    if (options.json) {
-        written = admin.write(resolvedJson(resolved, options, view), Admin::Form::document);
+    if (admin.isJson) {
+        written = showJson(admin, resolved, options, view);
     } else if (options.field.empty()) {
         written = admin.write(resolvedText(resolved, options.prefix, view, admin.output().columns));
     } else if (resolved.copy != nullptr) {
@@ -120,7 +119,7 @@ void addResolveCommand(Command& program, Admin& admin) {
     command.text("--view", options.view, "The view to ask: native or 32-bit").isOneOf({"native", "32-bit"});
     auto field = command.text("--field", options.field, "Only this: name, location or version")
                      .isOneOf({"name", "location", "version"});
-    command.flag("--json", options.json, "Write JSON for programs").excludes(field);
+    command.json(admin).excludes(field);
 }
 
 }  // namespace kz7

@@ -125,7 +125,7 @@ Answer restore(Admin& admin, const RestoreOptions& options) {
 void addRestoreCommand(Command& program, Admin& admin) {
     auto command = program.add("restore", "Bring the product's keys and services back to a backup");
     auto& options = command.answerWith(admin, restore);
-    addChangeOptions(command, options);
+    addChangeOptions(command, admin, options);
     command.text("FILE", options.file, "A backup, or an export as registry-editor text").isRequired();
 }
 

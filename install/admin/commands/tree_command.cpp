@@ -31,14 +31,13 @@ void appendTreeKey(const KeyRecord& key, std::string& text) {
 
 struct TreeOptions {
     std::string key;
-    bool json = false;
 };
 
 Answer showTree(Admin& admin, const TreeOptions& options) {
     if (!admin.open(true)) {
         return kAnswerFault;
     }
-    return options.json ? showKeysJson(admin, options.key)
+    return admin.isJson ? showKeysJson(admin, options.key)
                         : admin.showKeys(options.key, {}, appendTreeKey, {}, Admin::Reading::pages);
 }
 
@@ -48,7 +47,7 @@ void addTreeCommand(Command& program, Admin& admin) {
     auto command = program.add("tree", "Show keys and values for reading");
     auto& options = command.answerWith(admin, showTree);
     command.text("KEY", options.key, "The key to begin at; everything without it");
-    command.flag("--json", options.json, "Write JSON for programs");
+    command.json(admin);
 }
 
 }  // namespace kz7

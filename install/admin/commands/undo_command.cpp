@@ -99,7 +99,7 @@ Answer undo(Admin& admin, const UndoOptions& options) {
 void addUndoCommand(Command& program, Admin& admin) {
     auto command = program.add("undo", "Take a run back, or do again what an undo took back");
     auto& options = command.answerWith(admin, undo);
-    addChangeOptions(command, options);
+    addChangeOptions(command, admin, options);
     command.number("N", options.number, "The number of the run in the history").isRequired();
 }
 

@@ -6,7 +6,6 @@
 #include <set>
 #include <unordered_map>
 
-#include "install/admin/formats/json_text.h"
 #include "install/admin/formats/reg_text.h"
 #include "install/admin/formats/value_type.h"
 #include "install/platform/shown_text.h"
@@ -130,11 +129,10 @@ private:
     std::set<std::string> keys_;  // folded
 };
 
-void appendState(std::string_view field, const std::optional<ValueState>& state, std::string& json) {
+void appendState(std::string_view field, const std::optional<ValueState>& state, JsonWriter& json) {
     if (state) {
-        json.append(",\"").append(field).append("\":{");
-        appendJsonData(state->type, state->data, json);
-        json += '}';
+        appendData(state->type, state->data, json.field(field).beginObject());
+        json.end();
     }
 }
 
@@ -195,23 +193,19 @@ std::string changeSummary(const ChangeSet& changes, std::string_view verb) {
     return summary.empty() ? "unchanged" : summary;
 }
 
-void appendChangesJson(const ChangeSet& changes, std::string& json) {
-    std::string_view separator = "\n  ";
-    json += '[';
+void appendChanges(const ChangeSet& changes, JsonWriter& json) {
+    json.beginArray();
     for (const Change& change : changes) {
         const bool isGone = markOf(change) == '-';
-        json.append(separator).append("{\"kind\":\"");
-        json += change.isKey() ? (isGone ? "key-removed" : "key-created") : (isGone ? "value-removed" : "value-set");
-        json += "\",\"key\":";
-        appendJsonText(change.key, json);
-        json += change.isKey() ? ",\"class\":" : ",\"name\":";
-        appendJsonText(change.isKey() ? change.keyClass : change.name, json);
+        const char* const kind =
+            change.isKey() ? (isGone ? "key-removed" : "key-created") : (isGone ? "value-removed" : "value-set");
+        json.beginObject().field("kind", kind).field("key", change.key);
+        json.field(change.isKey() ? "class" : "name", change.isKey() ? change.keyClass : change.name);
         appendState("before", change.before, json);
         appendState("after", change.after, json);
-        json += '}';
-        separator = ",\n  ";
+        json.end();
     }
-    json += ']';
+    json.end();
 }
 
 std::string changeRegText(const ChangeSet& changes) {

@@ -3,6 +3,7 @@
 
 #include <string>
 
+#include "install/admin/formats/json_text.h"
 #include "install/src/registry/change_set.h"
 
 namespace kz7 {
@@ -21,7 +22,7 @@ std::string markedLine(char mark, const std::string& text, bool isColoured);
 std::string changeSummary(const ChangeSet& changes, std::string_view verb = "changed");
 
 // A JSON array; docs/json.md has the fields.
-void appendChangesJson(const ChangeSet& changes, std::string& json);
+void appendChanges(const ChangeSet& changes, JsonWriter& json);
 
 // The body of a registry-editor file that makes these changes.
 std::string changeRegText(const ChangeSet& changes);

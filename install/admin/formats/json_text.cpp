@@ -6,7 +6,9 @@
 #include "install/platform/text.h"
 
 namespace kz7 {
+namespace {
 
+// A text in quotation marks.
 void appendJsonText(std::string_view text, std::string& json) {
     const std::u16string utf16 = utf16FromText(text);
     json += '"';
@@ -25,10 +27,10 @@ void appendJsonText(std::string_view text, std::string& json) {
     json += '"';
 }
 
+}  // namespace
+
 JsonWriter& JsonWriter::field(std::string_view name) {
-    json_ += isFirst_ ? "" : ",";
-    appendJsonText(name, json_);
-    json_ += ':';
+    json_.append(isFirst_ ? "\"" : ",\"").append(name).append("\":");
     isFirst_ = false;
     afterField_ = true;
     return *this;
@@ -64,18 +66,28 @@ JsonWriter& JsonWriter::text(std::string_view text) {
     return *this;
 }
 
-JsonWriter& JsonWriter::number(std::uint64_t number) {
-    return raw(std::to_string(number));
-}
-
 JsonWriter& JsonWriter::raw(std::string_view json) {
     beginValue(false);
     json_ += json;
     return *this;
 }
 
+JsonWriter& JsonWriter::field(std::string_view name, const std::vector<std::string>& values) {
+    field(name).beginArray();
+    for (const std::string& value : values) {
+        text(value);
+    }
+    return end();
+}
+
 std::string JsonWriter::take() {
-    return std::move(json_) + '\n';
+    return std::exchange(json_, {}) + (ends_.empty() ? "\n" : "");
+}
+
+JsonWriter beginDocument() {
+    JsonWriter json;
+    json.beginObject().field("schema", 1U);
+    return json;
 }
 
 }  // namespace kz7

@@ -2,19 +2,17 @@
 // escape.
 #pragma once
 
-#include <cstdint>
+#include <concepts>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace kz7 {
-
-// A text in quotation marks.
-void appendJsonText(std::string_view text, std::string& json);
 
 // Writes a document piece by piece. Objects in an array begin on lines of their own.
 class JsonWriter {
 public:
-    // The next value belongs to the field `name` of the open object.
+    // The next value belongs to the field `name` of the open object. The names are ours and plain.
     JsonWriter& field(std::string_view name);
 
     JsonWriter& beginObject() { return open('{', '}'); }
@@ -22,18 +20,19 @@ public:
     JsonWriter& end();
 
     JsonWriter& text(std::string_view text);
-    JsonWriter& number(std::uint64_t number);
-    JsonWriter& boolean(bool value) { return raw(value ? "true" : "false"); }
 
     // A value that is JSON already.
     JsonWriter& raw(std::string_view json);
 
     JsonWriter& field(std::string_view name, std::string_view value) { return field(name).text(value); }
     JsonWriter& field(std::string_view name, const char* value) { return field(name).text(value); }
-    JsonWriter& field(std::string_view name, bool value) { return field(name).boolean(value); }
-    JsonWriter& field(std::string_view name, std::uint64_t value) { return field(name).number(value); }
+    JsonWriter& field(std::string_view name, bool value) { return field(name).raw(value ? "true" : "false"); }
+    JsonWriter& field(std::string_view name, std::unsigned_integral auto value) {
+        return field(name).raw(std::to_string(value));
+    }
+    JsonWriter& field(std::string_view name, const std::vector<std::string>& values);
 
-    // The whole document, with a line end.
+    // What was written since the last call, with a line end behind a whole document.
     std::string take();
 
 private:
@@ -45,5 +44,8 @@ private:
     bool isFirst_ = true;  // of the innermost array or object
     bool afterField_ = false;
 };
+
+// The beginning of each document: an object with the version of its format.
+JsonWriter beginDocument();
 
 }  // namespace kz7

@@ -3,8 +3,8 @@
 #include <array>
 #include <cstdio>
 
-#include "install/admin/formats/json_text.h"
 #include "install/platform/shown_text.h"
+#include "install/platform/text.h"
 
 namespace kz7 {
 namespace {
@@ -76,18 +76,17 @@ std::string shownData(ValueType type, std::string_view data) {
     return shown;
 }
 
-void appendJsonData(ValueType type, std::string_view data, std::string& json) {
-    json += "\"type\":" + std::to_string(static_cast<std::uint32_t>(type)) + ",\"bytes\":\"";
+void appendData(ValueType type, std::string_view data, JsonWriter& json) {
+    std::string bytes = "\"";
     for (const char c : data) {
-        appendHex(static_cast<unsigned char>(c), 2, json);
+        appendHex(static_cast<unsigned char>(c), 2, bytes);
     }
-    json += '"';
+    json.field("type", static_cast<std::uint32_t>(type)).field("bytes").raw(bytes + '"');
     std::uint64_t number = 0;
     if (type == ValueType::sz || type == ValueType::expandSz) {
-        json += ",\"text\":";
-        appendJsonText(data.substr(0, data.find('\0')), json);
+        json.field("text", data.substr(0, data.find('\0')));
     } else if (numberOf(type, data, number)) {
-        json += ",\"number\":" + std::to_string(number);
+        json.field("number", number);
     }
 }
 

@@ -4,6 +4,7 @@
 #include <string>
 #include <string_view>
 
+#include "install/admin/formats/json_text.h"
 #include "install/platform/registry_store.h"
 
 namespace kz7 {
@@ -17,7 +18,7 @@ bool numberOf(ValueType type, std::string_view data, std::uint64_t& number);
 // The data for people, with a blank before each part.
 std::string shownData(ValueType type, std::string_view data);
 
-// The members of a JSON object that hold the data: "type", "bytes", and "text" or "number" where it is one.
-void appendJsonData(ValueType type, std::string_view data, std::string& json);
+// The fields of a JSON object that hold the data: "type", "bytes", and "text" or "number" where it is one.
+void appendData(ValueType type, std::string_view data, JsonWriter& json);
 
 }  // namespace kz7

@@ -28,6 +28,7 @@ class EmbeddedPlatform final : public IPlatform {
 public:
     explicit EmbeddedPlatform(const PlatformOptions& options)
         : program_(options.program),
+          tellFault_(options.tellFault),
           byDefault_(options.stateDirectory.empty() && std::getenv("KZ7_STATE_DIR") == nullptr),
           directory_(absolute(options.stateDirectory.empty() ? usualStateDirectory() : options.stateDirectory)),
           registry_(directory_, options.readOnly, listener(), {options.backup, options.missingIsEmpty}) {
@@ -68,8 +69,11 @@ public:
 private:
     EmbeddedRegistry::FaultListener listener() {
         return [this](const StoreFault& fault) {
-            if (!faultTold_) {
-                console_->writeError(program_ + ": " + shownText(fault.file) + ": " + shownText(fault.reason) + "\n");
+            const std::string line = shownText(fault.file) + ": " + shownText(fault.reason);
+            if (!faultTold_ && tellFault_) {
+                tellFault_(line);
+            } else if (!faultTold_) {
+                console_->writeError(program_ + ": " + line + "\n");
             }
             faultTold_ = true;
             isDamaged_ = isDamaged_ || fault.status == kRegistryCorrupt || fault.status == kNotRegistryFile;
@@ -77,6 +81,7 @@ private:
     }
 
     std::string program_;
+    std::function<void(const std::string&)> tellFault_;
     bool byDefault_;
     bool faultTold_ = false;
     bool isDamaged_ = false;

@@ -18,6 +18,7 @@ class WindowsPlatform final : public IPlatform {
 public:
     explicit WindowsPlatform(const PlatformOptions& options)
         : program_(options.program),
+          tellFault_(options.tellFault),
           // The library in an installer changes keys of one user only.
           lock_(options.ownProcess && !options.readOnly, [this] { tellBusy(); }) {
         ports_ = {registry_.get(),   services_.get(),  console_.get(),  debugOutput_.get(),
@@ -42,14 +43,17 @@ public:
 
 private:
     void tellBusy() {
-        if (!faultTold_) {
-            console_->writeError(program_ +
-                                 ": %ProgramData%\\KZ7\\lock: stayed locked by another program for 5 seconds\n");
+        const std::string line = "%ProgramData%\\KZ7\\lock: stayed locked by another program for 5 seconds";
+        if (!faultTold_ && tellFault_) {
+            tellFault_(line);
+        } else if (!faultTold_) {
+            console_->writeError(program_ + ": " + line + "\n");
         }
         faultTold_ = true;
     }
 
     std::string program_;
+    std::function<void(const std::string&)> tellFault_;
     bool faultTold_ = false;
     std::unique_ptr<IConsole> console_ = windowsConsole();
     std::unique_ptr<IDebugOutput> debugOutput_ =
