@@ -12,6 +12,24 @@ install(FILES cmake/kz7Config.cmake ${PROJECT_BINARY_DIR}/kz7ConfigVersion.cmake
   DESTINATION ${CMAKE_INSTALL_LIBDIR}/cmake/kz7 COMPONENT kz7install-dev)
 install(DIRECTORY examples/consumer examples/installer DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples COMPONENT kz7install-dev)
 
+foreach(section 1 5 7)
+  file(GLOB pages CONFIGURE_DEPENDS docs/man/*.${section})
+  install(FILES ${pages} DESTINATION ${CMAKE_INSTALL_MANDIR}/man${section} COMPONENT kz7install)
+endforeach()
+if(NOT WIN32)
+  foreach(shell bash zsh)
+    set(completions ${PROJECT_BINARY_DIR}/completions/${shell})
+    add_custom_command(OUTPUT ${completions} DEPENDS kz7admin VERBATIM COMMAND kz7admin completion ${shell} > ${completions})
+    list(APPEND all_completions ${completions})
+  endforeach()
+  file(MAKE_DIRECTORY ${PROJECT_BINARY_DIR}/completions)
+  add_custom_target(kz7_completions ALL DEPENDS ${all_completions})
+  install(FILES ${PROJECT_BINARY_DIR}/completions/bash RENAME kz7admin
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions COMPONENT kz7install)
+  install(FILES ${PROJECT_BINARY_DIR}/completions/zsh RENAME _kz7admin
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/zsh/vendor-completions COMPONENT kz7install)
+endif()
+
 if(WIN32)
   set(system_libraries "-lmsi -lntdll -lole32 -luuid")
   install(TARGETS kz7actions64 RUNTIME COMPONENT kz7install ARCHIVE COMPONENT kz7install-dev)

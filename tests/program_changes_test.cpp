@@ -307,6 +307,7 @@ TEST_F(ChangesProgram, JsonFieldsAreThoseOfThePage) {
           {"resolve", "9"},
           {"explain", "392", "5021"},
           {"facts"},
+          {"completion", "zsh"},
           {"tree", "SOFTWARE\\NVQ"},
           {"export"},
           {"report", "-o", files_.path() + "/page.html"},

@@ -3,6 +3,45 @@
 #include <CLI/CLI.hpp>
 
 namespace kz7 {
+namespace {
+
+// The words of a description such as "TEXT:{native,32-bit}".
+std::vector<std::string> choicesOf(const CLI::Option& option) {
+    const std::string type = option.get_type_name();
+    const std::size_t begin = type.find('{');
+    const std::size_t end = type.find('}');
+    return end == std::string::npos ? std::vector<std::string>{}
+                                    : CLI::detail::split(type.substr(begin + 1, end - begin - 1), ',');
+}
+
+OptionShape shapeOf(const CLI::Option& option) {
+    OptionShape shape{{}, option.get_description(), choicesOf(option), option.get_positional()};
+    for (const std::string& name : option.get_snames()) {
+        shape.names.push_back('-' + name);
+    }
+    for (const std::string& name : option.get_lnames()) {
+        shape.names.push_back("--" + name);
+    }
+    if (shape.isArgument) {
+        shape.names.push_back(option.get_name(true));
+    }
+    shape.takesValue = option.get_items_expected_max() > 0;
+    shape.isRepeated = option.get_items_expected_max() > 1;
+    return shape;
+}
+
+CommandShape shapeOf(const CLI::App& app) {
+    CommandShape shape{app.get_name(), app.get_description(), {}, {}};
+    for (const CLI::Option* const option : app.get_options()) {
+        shape.options.push_back(shapeOf(*option));
+    }
+    for (const CLI::App* const command : app.get_subcommands([](const CLI::App*) { return true; })) {
+        shape.commands.push_back(shapeOf(*command));
+    }
+    return shape;
+}
+
+}  // namespace
 
 Option& Option::isRequired() {
     option_->required();
@@ -65,6 +104,10 @@ Option Command::texts(const std::string& name, std::vector<std::string>& values,
 
 Option Command::number(const std::string& name, std::uint64_t& value, const std::string& description) {
     return Option(app_->add_option(name, value, description));
+}
+
+CommandShape Command::shape() const {
+    return shapeOf(*app_);
 }
 
 void Command::needsOneOf(const Option& one, const Option& other) {

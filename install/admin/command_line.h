@@ -39,6 +39,22 @@ private:
     CLI::Option* option_;
 };
 
+// What a command takes, for programs that complete its command line.
+struct OptionShape {
+    std::vector<std::string> names;  // the last one is the longest; an argument has one, without hyphens
+    std::string description;
+    std::vector<std::string> choices;  // of the value, if only some words are possible
+    bool isArgument = false;
+    bool takesValue = false;
+    bool isRepeated = false;
+};
+struct CommandShape {
+    std::string name;
+    std::string description;
+    std::vector<OptionShape> options;
+    std::vector<CommandShape> commands;
+};
+
 // The program or one of its commands. A copy names the same one; a variable that receives a value must live until the
 // command line was read.
 class Command {
@@ -53,6 +69,8 @@ public:
     Option texts(const std::string& name, std::vector<std::string>& values, const std::string& description);
     Option json(Admin& admin, const std::string& description = "Write JSON for programs");
     Option number(const std::string& name, std::uint64_t& value, const std::string& description);
+
+    CommandShape shape() const;
 
     void needsOneOf(const Option& one, const Option& other);
 

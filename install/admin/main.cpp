@@ -64,6 +64,7 @@ void addCommands(Command& program, Admin& admin) {
     addBackupCommand(program, admin);
     addCheckCommand(program, admin);
     addCommitCommand(program, admin);
+    addCompletionCommand(program, admin);
     addCopiesCommand(program, admin);
     addDiffCommand(program, admin);
     addEnsureCommand(program, admin);

@@ -118,6 +118,14 @@ private:
 
 }  // namespace
 
+std::vector<std::string_view> toolOptions() {
+    std::vector<std::string_view> words;
+    for (const OptionRow& option : kOptions) {
+        words.push_back(option.word);
+    }
+    return words;
+}
+
 bool isToolCommand(std::span<const char* const> arguments) {
     return findOption(arguments) != nullptr;
 }

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <span>
+#include <string_view>
 #include <vector>
 
 #include "install/platform/platform.h"
@@ -13,6 +14,9 @@ namespace kz7 {
 // or kInvalidParameter after the usage text. With `errors`, also
 // keeps the error lines there.
 Status runTool(const Ports& ports, std::span<const char* const> arguments, std::vector<ErrorLine>* errors = nullptr);
+
+// The words of the options.
+std::vector<std::string_view> toolOptions();
 
 // Whether the arguments are one of the options and do not bring out the usage text.
 bool isToolCommand(std::span<const char* const> arguments);

@@ -11,6 +11,7 @@ void addApplyCommand(Command& program, Admin& admin);
 void addBackupCommand(Command& program, Admin& admin);
 void addCheckCommand(Command& program, Admin& admin);
 void addCommitCommand(Command& program, Admin& admin);
+void addCompletionCommand(Command& program, Admin& admin);
 void addCopiesCommand(Command& program, Admin& admin);
 void addDiffCommand(Command& program, Admin& admin);
 void addEnsureCommand(Command& program, Admin& admin);
