@@ -100,6 +100,18 @@ TEST_F(ChangesProgram, RestoreReplacesAStoreThatIsMissingOrDamaged) {
            "! the store before is kept as registry.db.old3\n"
            "changed: 22 values, 26 keys, 1 service\n||0");
     expect({"diff", ".", backup}, "||0");
+
+    // A restore that was killed before it moved the log goes on. Until then nothing reads the log without its store.
+    ASSERT_EQ(store_.tool(kAddSecond).exitCode, 0);
+    const std::string log = contents(store_.file("registry.db-wal"));
+    std::filesystem::rename(store_.file("registry.db"), store_.file("registry.db.old4"));
+    overwrite(store_.file("registry.db"), "The store is moved to registry.db.old4\n");
+    const std::string moved = "|kz7admin: registry.db: file is not a database\n|";
+    expect({"copies"}, moved + "2");
+    EXPECT_EQ(store_.tool(kAddFirst).exitCode, 249);
+    expect({"restore", backup},
+           "! the store before is kept as registry.db.old4\nchanged: 22 values, 26 keys, 1 service\n" + moved + "0");
+    EXPECT_EQ(contents(store_.file("registry.db.old4-wal")), log);
 }
 
 TEST_F(ChangesProgram, RestoreMendsADamageOfAnyPage) {

@@ -43,13 +43,15 @@ CLI::Validator notOlder() {
             {}};
 }
 
-// What help prints is output like any other.
+// What help prints is output like any other. It opens no store.
 Answer showHelp(const CLI::App& program, const CLI::Success& help) {
     std::ostringstream text;
     program.exit(help, text, text);
-    const auto console = standardConsole();
-    const bool written = console->writeOutput(text.str()) == kSuccess && console->flush() == kSuccess;
-    return written ? kAnswerYes : kAnswerFault;
+    const auto platform = hostPlatform({.program = "kz7admin"});
+    IConsole& console = platform->console();
+    Status status = console.writeOutput(text.str());
+    status = status == kSuccess ? console.flush() : status;
+    return status == kSuccess || status == kPipeClosing ? kAnswerYes : kAnswerFault;
 }
 
 // Whether the words ask for JSON, where they cannot be parsed. What follows "--" belongs to another program.

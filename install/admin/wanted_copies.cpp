@@ -157,6 +157,9 @@ bool parseWantedCopies(std::string_view text, std::vector<WantedCopy>& copies, s
         const auto line = 1 + std::count(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(read), '\n');
         fault = compose("line %u: not valid JSON", {static_cast<std::uint32_t>(line)});
         return false;
+    } catch (const json::out_of_range&) {
+        fault = "a number is out of range";
+        return false;
     }
     if (!twice.empty()) {
         fault = twice + ": is twice in one object";

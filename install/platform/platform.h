@@ -97,7 +97,7 @@ public:
     virtual bool storeIsLost() { return false; }
 
     // Replaces the store by a new one that `fill` writes, or creates a missing one. The old file is renamed to `kept`,
-    // which is empty without one. kBusy: another program has the store open. Faults are reported on standard error.
+    // which is empty without one; also after a failure that comes later. kBusy: another program has the store open. Faults are reported on standard error.
     virtual Status replaceStore(const std::function<Status(IRegistryStore&)>&, std::string& /*kept*/) {
         return kCallNotImplemented;
     }

@@ -62,6 +62,9 @@ Answer findLog(Admin& admin, const Words& words, ConfigurationRequest& request) 
         status = admin.platform().ownFolder(request.logFile);
         request.logFile.append("\\").append(kLogFileName);
     } else {
+        if (const Answer free = admin.checkFile("log", words.logFile); free != kAnswerYes) {
+            return free;
+        }
         status = files.productPath(words.logFile, request.logFile);
     }
     if (status == kSuccess && !fitsCharacters(request.logFile, kPathSize - 1)) {

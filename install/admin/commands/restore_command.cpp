@@ -89,11 +89,15 @@ Answer restoreStore(Admin& admin, const RestoreOptions& options, RegistrySource&
     if (!options.check) {
         std::string kept;
         const auto fill = [&](IRegistryStore& store) { return applyChangeSet(store, nullptr, run.changes, key); };
-        if (const Status status = admin.platform().replaceStore(fill, kept); status != kSuccess) {
-            return admin.storeFault("cannot replace store: " + shownText(admin.platform().storeName()), status);
-        }
+        const Status status = admin.platform().replaceStore(fill, kept);
         if (!kept.empty()) {
             run.notes.push_back("the store before is kept as " + shownText(kept));
+        }
+        if (status != kSuccess) {
+            if (!kept.empty()) {
+                admin.tell(run.notes.back());
+            }
+            return admin.storeFault("cannot replace store: " + shownText(admin.platform().storeName()), status);
         }
     }
     return showRun(admin, options, run);

@@ -9,6 +9,7 @@
 #include <algorithm>
 #include <array>
 #include <chrono>
+#include <fstream>
 #include <string_view>
 #include <vector>
 
@@ -56,6 +57,68 @@ int makeOne(const std::string& path) {
         return error == EEXIST ? errno : error;
     }
     return S_ISDIR(found.st_mode) ? 0 : ENOTDIR;
+}
+
+constexpr std::string_view kMovedTo = "The store is moved to ";
+
+// The name that an interrupted replacement has given the store, or nothing.
+std::string movedTo(const std::string& directory) {
+    struct stat found {};
+    const std::string store = directory + '/' + kStoreName;
+    if (stat(store.c_str(), &found) != 0 || !S_ISREG(found.st_mode) || found.st_size >= kSmallestStore) {
+        return {};
+    }
+    std::string line;
+    std::getline(std::ifstream(store), line);
+    const std::string name = line.starts_with(kMovedTo) ? line.substr(kMovedTo.size()) : "";
+    return name.starts_with(kStoreName) && name.find('/') == std::string::npos ? directory + '/' + name : "";
+}
+
+// Puts a file that no program takes for a store in its place. 0 or an error number.
+int putNotice(const std::string& directory, const std::string& kept) {
+    std::string name;
+    if (!unfinishedStoreName(name)) {
+        return errno;
+    }
+    name = directory + '/' + name;
+    const std::string text = std::string(kMovedTo) + kept.substr(directory.size() + 1) + '\n';
+    const OwnedDescriptor file(open(name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
+    const bool isPut = file && writeAll(file.get(), text) && fsync(file.get()) == 0 &&
+                       rename(name.c_str(), (directory + '/' + kStoreName).c_str()) == 0;
+    return isPut ? 0 : errno;
+}
+
+bool exists(const std::string& path) {
+    struct stat found {};
+    return lstat(path.c_str(), &found) == 0;
+}
+
+bool isUsed(const std::string& path) {
+    return exists(path) || std::any_of(std::begin(kLogs), std::end(kLogs),
+                                       [&](std::string_view log) { return exists(path + std::string(log)); });
+}
+
+// Gives the store, but not its log, the first name that is free, and puts a notice in its place: a log that a kill
+// leaves behind must not be applied to another store, nor the store be read without it. 0 or an error number.
+int moveStore(const std::string& directory, const std::string& store, std::string& kept) {
+    if (!isUsed(store)) {
+        return 0;
+    }
+    std::string name = store + ".old";
+    for (int number = 2; isUsed(name); ++number) {
+        name = store + ".old" + std::to_string(number);
+    }
+    if (unlink((store + "-shm").c_str()) != 0 && errno != ENOENT) {
+        return errno;
+    }
+    if (link(store.c_str(), name.c_str()) != 0) {
+        const bool hasNoLinks = errno == EPERM || errno == EOPNOTSUPP;
+        if (errno != ENOENT && (!hasNoLinks || rename(store.c_str(), name.c_str()) != 0)) {
+            return errno;
+        }
+    }
+    kept = name;
+    return exists(name) ? putNotice(directory, kept) : 0;
 }
 
 }  // namespace
@@ -117,42 +180,20 @@ bool unfinishedStoreName(std::string& name) {
 
 int setAside(const std::string& directory, std::string& kept) {
     const std::string store = directory + '/' + kStoreName;
-    const auto exists = [](const std::string& path) {
-        struct stat found {};
-        return lstat(path.c_str(), &found) == 0;
-    };
-    const auto isUsed = [&](const std::string& path) {
-        return exists(path) || std::any_of(std::begin(kLogs), std::end(kLogs),
-                                           [&](std::string_view log) { return exists(path + std::string(log)); });
-    };
-    kept.clear();
-    if (!isUsed(store)) {
-        return 0;
-    }
-    std::string name = store + ".old";
-    for (int number = 2; isUsed(name); ++number) {
-        name = store + ".old" + std::to_string(number);
-    }
-    kept = name;
-    // The store first: a log that a kill leaves behind belongs to the store of its name.
-    if (unlink((store + "-shm").c_str()) != 0 && errno != ENOENT) {
-        return errno;
-    }
-    if (link(store.c_str(), name.c_str()) != 0 && errno != ENOENT) {
-        const bool hasNoLinks = errno == EPERM || errno == EOPNOTSUPP;
-        if (!hasNoLinks || rename(store.c_str(), name.c_str()) != 0) {
-            return errno;
-        }
-    }
+    kept = movedTo(directory);
+    int error = kept.empty() ? moveStore(directory, store, kept) : 0;
     for (const std::string_view log : kLogs) {
         const std::string path = store + std::string(log);
-        if (rename(path.c_str(), (name + std::string(log)).c_str()) != 0 && errno != ENOENT) {
-            const int error = errno;
-            takeBack(directory, name);
-            return error;
+        if (error == 0 && !kept.empty() && rename(path.c_str(), (kept + std::string(log)).c_str()) != 0 &&
+            errno != ENOENT) {
+            error = errno;
         }
     }
-    return 0;
+    if (error != 0) {
+        takeBack(directory, kept);
+        kept.clear();
+    }
+    return error;
 }
 
 void takeBack(const std::string& directory, const std::string& kept) {

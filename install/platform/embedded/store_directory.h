@@ -10,6 +10,7 @@ namespace kz7 {
 
 inline constexpr const char* kMachineStateDirectory = "/var/lib/kz7";
 inline constexpr const char* kStoreName = "registry.db";
+inline constexpr int kSmallestStore = 512;  // bytes of the smallest SQLite database that is not empty
 
 // $KZ7_STATE_DIR; else /var/lib/kz7 for root; else $XDG_STATE_HOME/kz7 or ~/.local/state/kz7; else empty.
 std::string usualStateDirectory();
@@ -28,8 +29,8 @@ bool unfinishedStoreName(std::string& name);
 
 // Gives a store and its log another name, `registry.db.old` or the next free one; a log without a store too, which
 // would be applied to the next store. `kept` is empty if there is neither. The caller holds the lock of the directory.
-// The store itself keeps its first name as well, until another file gets it, where the file system has hard links.
-// 0 or an error number, and then nothing has changed.
+// A file smaller than kSmallestStore is in its place until another store gets it; a call after a process that was killed
+// meanwhile goes on. 0 or an error number, and then nothing has changed.
 int setAside(const std::string& directory, std::string& kept);
 
 // Gives them their first names again.

@@ -302,6 +302,7 @@ StoreFault StoreFile::build(const OwnedDescriptor& folder, sqlite3* content, std
     if (renameat(folder.get(), name.c_str(), folder.get(), kStoreName) != 0) {
         const int error = errno;
         takeBack(directory_, kept);
+        kept.clear();
         return refused(kCannotOpen, path_, error);
     }
     return fsync(folder.get()) == 0 ? StoreFault{} : refused(kCannotOpen, path_, errno);
@@ -328,6 +329,10 @@ StoreFault StoreFile::open(int flags, Connection& connection) {
     struct stat found {};
     if (stat(path_.c_str(), &found) == 0 && !S_ISREG(found.st_mode)) {
         return {kCannotOpen, path_, "is not a regular file"};
+    }
+    // SQLite would take its pages from a log next to it.
+    if (S_ISREG(found.st_mode) && found.st_size > 0 && found.st_size < kSmallestStore) {
+        return {kNotRegistryFile, path_, sqlite3_errstr(SQLITE_NOTADB)};
     }
     Connection owned;
     int result = connect(kStoreName, flags, owned);

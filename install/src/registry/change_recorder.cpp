@@ -36,6 +36,7 @@ std::string ChangeRecorder::spell(const KeyName& name, bool exists, std::string&
         return fullKeyName(name);
     }
     const std::string place = walkPlace(fullKeyName(name));
+    // Deliberate: a key that the run deletes and creates again keeps its first spelling.
     if (const auto known = spelled_.find(place); known != spelled_.end()) {
         keyClass = known->second.keyClass;
         return known->second.name;
