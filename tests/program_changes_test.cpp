@@ -68,6 +68,18 @@ TEST_F(ChangesProgram, ForetellMakeAndTakeBack) {
     expect({"restore", "--detailed-exitcode", backup}, "unchanged\n||0");
     expect({"diff", store_.path(), backup}, "||0");
 
+    // The native name may sort after that of the 32-bit view. A restore shows the parents that it creates.
+    const std::string head = "Windows Registry Editor Version 5.00\n";
+    const std::string zoo = "[HKLM\\SOFTWARE\\Zoo]\n[HKLM\\SOFTWARE\\WOW6432NODE\\Zoo]\n[-HKLM\\SOFTWARE\\NVQ]\n";
+    EXPECT_TRUE(told({"import", "--diff", file("zoo.reg", head + zoo)})
+                    .ends_with("\n+ HKLM\\SOFTWARE\\Zoo  (both views)\nchanged: 10 values, 11 keys\n||0"));
+    const std::string named = R"("kind":"key-created","key":"HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ",)";
+    EXPECT_NE(told({"restore", "--check", "--json", backup}).find(named), std::string::npos);
+    EXPECT_NE(told({"restore", "--json", backup}).find(named), std::string::npos);
+    expect({"import", file("no.reg", head + "[-HKLM\\SOFTWARE\\Zoo]\n[-HKLM\\SOFTWARE\\WOW6432NODE\\Zoo]\n")},
+           "imported no.reg into store registry.db: 2 keys, 0 values\nchanged: 2 keys\n||0");
+    expect({"diff", backup, "."}, "||0");
+
     // What `diff --reg` writes makes one registry of the other.
     ASSERT_EQ(store_.tool({"-v9", KZ7_SAMPLE}).exitCode, 0);
     const std::string reg = file("steps.reg", store_.run("kz7admin", {"diff", "--reg", ".", backup}).output);
@@ -407,6 +419,7 @@ TEST_F(ChangesProgram, BadInputIsOneLineAndChangesNothing) {
         {"[]", "document: is not an object"},
         {"{}", "copies: is missing"},
         {R"({"copies": 1})", "copies: is not an array"},
+        {R"({"copies": [], "$schema": 5})", "$schema: is not a string"},
         {R"({"copies": [], "copies": []})", "copies: is twice in one object"},
         {R"({"copies": [], "more": 1})", "more: is an unknown field"},
         {copy + "1]}", "copies[1]: is not an object"},
@@ -426,6 +439,7 @@ TEST_F(ChangesProgram, BadInputIsOneLineAndChangesNothing) {
     }
     expect({"diff", ".", files_.path() + "/none"}, "|kz7admin: none: No such file or directory\n|2");
     expect({"diff", ".", "/usr"}, "|kz7admin: no store: /usr\n|2");
+    expect({"diff", ".", ".", "HKLM\\NONE"}, "|kz7admin: no such key: HKEY_LOCAL_MACHINE\\NONE\n|2");
     expect({"restore", file("empty.reg", "Windows Registry Editor Version 5.00\n")},
            "|kz7admin: nothing to restore: empty.reg\n|2");
     expect({"apply", "--", "-addKZ7Copy", "A"},

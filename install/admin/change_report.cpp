@@ -65,6 +65,19 @@ void takeChanges(const RecordedPorts& recorded, ChangeRun& run) {
     }
 }
 
+Answer makeChanges(Admin& admin, const Ports& ports, const ChangeSet& changes) {
+    std::string key;
+    const Status status =
+        applyChangeSet(*ports.registry, admin.platform().storeIsOwn() ? nullptr : ports.services, changes, key);
+    return status == kSuccess ? kAnswerYes : admin.storeFault("cannot change: " + shownText(key), status);
+}
+
+Answer commitRun(Admin& admin, RecordedPorts& recorded, const std::string& name, ChangeRun& run) {
+    takeChanges(recorded, run);
+    const Status status = recorded.commit();
+    return status == kSuccess ? kAnswerYes : admin.storeFault("cannot save changes: " + name, status);
+}
+
 Answer fillPreview(Admin& admin, Preview& preview) {
     std::string key;
     const Status status = preview.fill(key);

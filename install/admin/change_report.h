@@ -38,6 +38,12 @@ struct ChangeRun {
 // The changes that were recorded, with a note if some of the states before could not be read.
 void takeChanges(const RecordedPorts& recorded, ChangeRun& run);
 
+// Makes changes on the ports of a run.
+Answer makeChanges(Admin& admin, const Ports& ports, const ChangeSet& changes);
+
+// Commits a run that holds its commits, and takes its changes.
+Answer commitRun(Admin& admin, RecordedPorts& recorded, const std::string& name, ChangeRun& run);
+
 // Adds what a run that keeps no list of its error lines wrote on standard error.
 void takeErrorLines(const std::string& text, ChangeRun& run);
 

@@ -1,6 +1,7 @@
 #include "install/admin/ensurer.h"
 
 #include <algorithm>
+#include <array>
 #include <optional>
 #include <set>
 
@@ -18,7 +19,10 @@
 namespace kz7 {
 
 std::string Ensurer::plan(const std::vector<WantedCopy>& wanted) {
-    if (std::string other = otherSpelling(wanted); !other.empty()) {
+    OwnedKey copies(*ports_.registry);
+    listed_ = ports_.registry->openKey(KeyHandle::localMachine, layout::kCopies, kKeyWalk, copies.receive());
+    listed_ = listed_ == kSuccess ? reader_.subkeys(copies.get(), subkeys_) : listed_;
+    if (std::string other = otherSpelling(copies.get(), wanted); !other.empty()) {
         return other;
     }
     InstallCopyList list(*ports_.registry, *ports_.debugOutput, false, false);
@@ -38,21 +42,16 @@ std::string Ensurer::plan(const std::vector<WantedCopy>& wanted) {
 }
 
 // A host that folds the case of more letters than we do has one copy where we see two.
-std::string Ensurer::otherSpelling(const std::vector<WantedCopy>& wanted) {
-    std::set<std::string> subkeys;  // folded
-    OwnedKey copies(*ports_.registry);
-    std::vector<Subkey> found;
-    if (ports_.registry->openKey(KeyHandle::localMachine, layout::kCopies, kKeyWalk, copies.receive()) == kSuccess &&
-        reader_.subkeys(copies.get(), found) == kSuccess) {
-        for (const Subkey& key : found) {
-            subkeys.insert(foldUpper(key.name));
-        }
-        for (const WantedCopy& copy : wanted) {
-            OwnedKey key(*ports_.registry);
-            if (!subkeys.contains(foldUpper(copy.name)) &&
-                ports_.registry->openKey(copies.get(), copy.name, kKeyQueryValue, key.receive()) == kSuccess) {
-                return "copy " + shownText(copy.name) + " is installed under another spelling of its name";
-            }
+std::string Ensurer::otherSpelling(KeyHandle copies, const std::vector<WantedCopy>& wanted) {
+    std::set<std::string> names;  // folded
+    for (const Subkey& key : subkeys_) {
+        names.insert(foldUpper(key.name));
+    }
+    for (const WantedCopy& copy : wanted) {
+        OwnedKey key(*ports_.registry);
+        if (listed_ == kSuccess && !names.contains(foldUpper(copy.name)) &&
+            ports_.registry->openKey(copies, copy.name, kKeyQueryValue, key.receive()) == kSuccess) {
+            return "copy " + shownText(copy.name) + " is installed under another spelling of its name";
         }
     }
     return {};
@@ -60,21 +59,17 @@ std::string Ensurer::otherSpelling(const std::vector<WantedCopy>& wanted) {
 
 // Why the list is not known to be whole; empty if it is.
 std::string Ensurer::unreadCopy(InstallCopyList& list) {
-    OwnedKey copies(*ports_.registry);
-    std::vector<Subkey> subkeys;
-    Status status = ports_.registry->openKey(KeyHandle::localMachine, layout::kCopies, kKeyWalk, copies.receive());
-    if (isNotFound(status)) {
+    if (isNotFound(listed_)) {
         return {};
     }
-    status = status == kSuccess ? reader_.subkeys(copies.get(), subkeys) : status;
-    if (status != kSuccess || list.status() != 0) {
+    if (listed_ != kSuccess || list.status() != 0) {
         return "the list of copies cannot be read whole";
     }
     std::set<std::string> listed;  // folded
     for (const InstallCopy* copy = list.first(); copy != nullptr; copy = list.next()) {
         listed.insert(foldUpper(copy->name()));
     }
-    for (const Subkey& copy : subkeys) {
+    for (const Subkey& copy : subkeys_) {
         if (!listed.contains(foldUpper(copy.name))) {
             return "copy " + copy.name + " cannot be read";
         }
@@ -113,8 +108,11 @@ std::size_t Ensurer::findRemovals(InstallCopyList& list, const std::vector<Wante
 
 Status Ensurer::makePresent(const WantedCopy& copy) {
     bool isInOrder = true;
-    for (const std::string_view root : {layout::kCopy, layout::kCopy32}) {
-        const Status status = compare(substituteCopyName(root, copy.name), copy.location, isInOrder);
+    std::vector<std::string> kept;
+    // The native view last: its versions are the copy's.
+    for (const std::string_view root : {layout::kCopy32, layout::kCopy}) {
+        kept.clear();
+        const Status status = compare(substituteCopyName(root, copy.name), copy, isInOrder, kept);
         if (status != kSuccess) {
             return status;
         }
@@ -122,14 +120,28 @@ Status Ensurer::makePresent(const WantedCopy& copy) {
     const std::string service(managementServiceName(copy.name).view());
     Status status = isInOrder ? hasService(service, isInOrder) : kSuccess;
     if (status == kSuccess && isInOrder) {
-        noteVersion(copy.name);
+        notes.insert(notes.end(), kept.begin(), kept.end());
     } else if (status == kSuccess) {
-        status = runTool({"-addKZ7Copy", copy.name.c_str(), copy.location.c_str()});
+        status = add(copy);
     }
     return status == kSuccess ? checkService(service, copy.location) : status;
 }
 
-Status Ensurer::compare(const std::string& root, const std::string& location, bool& isInOrder) {
+namespace {
+
+// A version that is not the one of an add is kept.
+bool isAsWanted(const LayoutRow& row, const std::optional<ValueState>& state, const WantedCopy& copy,
+                std::vector<std::string>& kept) {
+    if (row.key == "CurrentVersion" && state && state->text() != row.data) {
+        kept.push_back(compose("copy %s: %s stays %s", {shownText(copy.name), row.name, shownText(state->text())}));
+    }
+    return state && (row.data != kLocation || state == ValueState{ValueType::sz, copy.location + '\0'});
+}
+
+}  // namespace
+
+Status Ensurer::compare(const std::string& root, const WantedCopy& copy, bool& isInOrder,
+                        std::vector<std::string>& kept) {
     OwnedKey key(*ports_.registry);
     std::string open;
     Status status = kSuccess;
@@ -145,8 +157,7 @@ Status Ensurer::compare(const std::string& root, const std::string& location, bo
             isInOrder = false;
             return isNotFound(status) ? kSuccess : status;
         }
-        const bool isWanted = row.data != kLocation || state == ValueState{ValueType::sz, location + '\0'};
-        isInOrder = isInOrder && state && isWanted;
+        isInOrder = isInOrder && isAsWanted(row, state, copy, kept);
     }
     return kSuccess;
 }
@@ -206,24 +217,9 @@ Status Ensurer::checkService(const std::string& name, const std::string& locatio
     return applyChangeSet(*ports_.registry, servicesAreRows_ ? nullptr : ports_.services, change, failed);
 }
 
-void Ensurer::noteVersion(const std::string& name) {
-    const std::string path = substituteCopyName(layout::kCopy, name) + "\\CurrentVersion";
-    OwnedKey key(*ports_.registry);
-    if (ports_.registry->openKey(KeyHandle::localMachine, path, kKeyQueryValue, key.receive()) != kSuccess) {
-        return;
-    }
-    for (const LayoutRow& row : copyRows()) {
-        std::optional<ValueState> state;
-        if (row.key == "CurrentVersion" && reader_.value(key.get(), row.name, state) == kSuccess && state &&
-            state->text() != row.data) {
-            notes.push_back(compose("copy %s: %s stays %s", {shownText(name), row.name, shownText(state->text())}));
-        }
-    }
-}
-
-Status Ensurer::runTool(std::vector<const char*> words) {
-    words.insert(words.begin(), "kz7InstallReg");
-    const Status status = kz7::runTool(ports_, words, &errors);
+Status Ensurer::add(const WantedCopy& copy) {
+    const std::array words = {"kz7InstallReg", "-addKZ7Copy", copy.name.c_str(), copy.location.c_str()};
+    const Status status = runTool(ports_, words, &errors);
     return status == kSuccess && hasFailure(errors) ? kFailed : status;
 }
 

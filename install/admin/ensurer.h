@@ -36,21 +36,22 @@ public:
 private:
     // Returns the number of copies that are left.
     std::size_t findRemovals(InstallCopyList& list, const std::vector<WantedCopy>& wanted);
-    std::string otherSpelling(const std::vector<WantedCopy>& wanted);
+    std::string otherSpelling(KeyHandle copies, const std::vector<WantedCopy>& wanted);
     std::string unreadCopy(InstallCopyList& list);
     Status makePresent(const WantedCopy& copy);
     Status makeAbsent(const std::string& name);
-    // Both locations must be as wanted, of the other rows only the existence counts.
-    Status compare(const std::string& root, const std::string& location, bool& isInOrder);
+    // Both locations must be as wanted, of the other rows only the existence counts. `kept` gets other versions.
+    Status compare(const std::string& root, const WantedCopy& copy, bool& isInOrder, std::vector<std::string>& kept);
     Status hasService(const std::string& name, bool& exists);
     Status checkService(const std::string& name, const std::string& location);
-    void noteVersion(const std::string& name);
-    Status runTool(std::vector<const char*> words);
+    Status add(const WantedCopy& copy);
 
     const Ports& ports_;
     bool servicesAreRows_;
     EnsureChoices choices_;
     KeyReader reader_;
+    Status listed_ = kSuccess;
+    std::vector<Subkey> subkeys_;  // of the key of the copies
     std::vector<std::string> removals_;
     std::size_t left_ = 0;  // copies after the removals
 };

@@ -10,6 +10,8 @@
 namespace kz7 {
 namespace {
 
+constexpr std::size_t kLongest = std::size_t{1} << 30;  // bytes, so that an endless file does not take all memory
+
 // 0 or an error number.
 int readInput(const std::string& path, std::string& bytes) {
     std::FILE* file = path == "-" ? stdin : openInput(path.c_str());
@@ -18,10 +20,10 @@ int readInput(const std::string& path, std::string& bytes) {
     }
     char piece[1 << 14];
     errno = 0;
-    for (std::size_t size = 0; (size = std::fread(piece, 1, sizeof piece, file)) != 0;) {
+    for (std::size_t size = 0; bytes.size() <= kLongest && (size = std::fread(piece, 1, sizeof piece, file)) != 0;) {
         bytes.append(piece, size);
     }
-    const int error = std::ferror(file) == 0 ? 0 : errno;
+    const int error = bytes.size() > kLongest ? EFBIG : std::ferror(file) == 0 ? 0 : errno;
     if (file != stdin) {
         std::fclose(file);
     }

@@ -59,6 +59,9 @@ public:
         if (document.value("schema", json(1)) != 1) {
             return fail("schema", "is not 1");
         }
+        if (const auto link = document.find("$schema"); link != document.end() && !link->is_string()) {
+            return fail("$schema", "is not a string");
+        }
         const auto list = document.find("copies");
         if (list == document.end() || !list->is_array()) {
             return fail("copies", list == document.end() ? "is missing" : "is not an array");

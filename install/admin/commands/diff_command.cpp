@@ -32,7 +32,9 @@ Answer readBoth(Admin& admin, const DiffOptions& options, Snapshot& old, Snapsho
             return read;
         }
     }
-    return kAnswerYes;
+    return options.key.empty() || !old.empty() || !now.empty()
+               ? kAnswerYes
+               : admin.fault("no such key: " + shownText(fullKeyName(typedKeyName(options.key))));
 }
 
 Answer diff(Admin& admin, const DiffOptions& options) {

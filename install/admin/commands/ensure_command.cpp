@@ -62,9 +62,8 @@ Answer ensure(Admin& admin, const EnsureOptions& options) {
         return answer;
     }
     if (!isOwn || run.status == kSuccess) {
-        takeChanges(recorded, run);
-        if (const Status status = recorded.commit(); status != kSuccess) {
-            return admin.storeFault("cannot save changes: " + file.shown(), status);
+        if (const Answer answer = commitRun(admin, recorded, file.shown(), run); answer != kAnswerYes) {
+            return answer;
         }
     }
     return showRun(admin, options, run);

@@ -109,14 +109,9 @@ Answer repair(Admin& admin, RepairOptions options) {
     RecordedPorts recorded(admin.platform().ports(),
                            {.wholeServices = admin.platform().storeIsOwn(), .holdsCommits = true});
     ChangeRun run;
-    if (const Answer answer = repairOn(admin, options, recorded.ports(), run); answer != kAnswerYes) {
-        return answer;
-    }
-    takeChanges(recorded, run);
-    if (const Status status = recorded.commit(); status != kSuccess) {
-        return admin.storeFault("cannot save changes", status);
-    }
-    return showRun(admin, options, run);
+    Answer answer = repairOn(admin, options, recorded.ports(), run);
+    answer = answer == kAnswerYes ? commitRun(admin, recorded, "repair", run) : answer;
+    return answer == kAnswerYes ? showRun(admin, options, run) : answer;
 }
 
 }  // namespace

@@ -1,4 +1,5 @@
 #include <algorithm>
+#include <iterator>
 
 #include "install/admin/change_report.h"
 #include "install/admin/commands/commands.h"
@@ -35,38 +36,44 @@ Answer findChanges(Admin& admin, const RestoreOptions& options, RegistrySource& 
     return read;
 }
 
+// A host that folds the case of more letters than we do has one key where the difference sees two.
+Answer findTwins(Admin& admin, const ChangeSet& changes) {
+    ChangeSet created;
+    std::copy_if(changes.begin(), changes.end(), std::back_inserter(created),
+                 [](const Change& change) { return change.kind == Change::Kind::keyCreated; });
+    std::vector<const Change*> twins;
+    std::string key;
+    const Status status = findConflicts(admin.registry(), admin.platform().storeIsOwn(), created, twins, key);
+    if (status != kSuccess) {
+        return admin.storeFault("cannot read: " + shownText(key), status);
+    }
+    return twins.empty() ? kAnswerYes
+                         : admin.fault("cannot restore: " + shownText(twins.front()->key) +
+                                       " exists under another spelling of its name");
+}
+
 // The product's keys and services, and no others, in one transaction.
 Answer restoreKeys(Admin& admin, const RestoreOptions& options, RegistrySource& file) {
-    const bool isOwn = admin.platform().storeIsOwn();
+    ChangeSet changes;
+    Answer answer = findChanges(admin, options, file, changes);
+    answer = answer == kAnswerYes ? findTwins(admin, changes) : answer;
+    if (answer != kAnswerYes) {
+        return answer;
+    }
     ChangeRun run;
-    if (const Answer found = findChanges(admin, options, file, run.changes); found != kAnswerYes) {
-        return found;
+    if (options.check) {
+        Preview preview(admin.platform(), false);
+        answer = fillPreview(admin, preview);
+        answer = answer == kAnswerYes ? makeChanges(admin, preview.ports(), changes) : answer;
+        run.changes = preview.changes();
+        return answer == kAnswerYes ? showRun(admin, options, run) : answer;
     }
-    // A host that folds the case of more letters than we do has one key where the difference sees two.
-    std::vector<const Change*> conflicts;
-    std::string key;
-    Status status = findConflicts(admin.registry(), isOwn, run.changes, conflicts, key);
-    const auto twin = std::find_if(conflicts.begin(), conflicts.end(),
-                                   [](const Change* conflict) { return conflict->kind == Change::Kind::keyCreated; });
-    if (status != kSuccess || twin != conflicts.end()) {
-        return status != kSuccess ? admin.storeFault("cannot read: " + shownText(key), status)
-                                  : admin.fault("cannot restore: " + shownText((*twin)->key) +
-                                                " exists under another spelling of its name");
-    }
-    if (!options.check) {
-        admin.beginRun();
-        RecordedPorts recorded(admin.platform().ports(), {.wholeServices = isOwn, .holdsCommits = true});
-        status =
-            applyChangeSet(*recorded.ports().registry, isOwn ? nullptr : recorded.ports().services, run.changes, key);
-        if (status != kSuccess) {
-            return admin.storeFault("cannot change: " + shownText(key), status);
-        }
-        status = recorded.commit();
-        if (status != kSuccess) {
-            return admin.storeFault("cannot save changes: " + shownText(options.file), status);
-        }
-    }
-    return showRun(admin, options, run);
+    admin.beginRun();
+    RecordedPorts recorded(admin.platform().ports(),
+                           {.wholeServices = admin.platform().storeIsOwn(), .holdsCommits = true});
+    answer = makeChanges(admin, recorded.ports(), changes);
+    answer = answer == kAnswerYes ? commitRun(admin, recorded, shownText(options.file), run) : answer;
+    return answer == kAnswerYes ? showRun(admin, options, run) : answer;
 }
 
 // A new store with everything that the file holds, in the place of one that is missing or damaged.

@@ -49,13 +49,10 @@ Answer takeBack(Admin& admin, const UndoOptions& options, const ChangeSet& chang
     const bool isOwn = admin.platform().storeIsOwn();
     admin.beginRun(false, options.number);
     RecordedPorts recorded(admin.platform().ports(), {.wholeServices = isOwn, .holdsCommits = true, .everyKey = true});
-    std::string key;
-    Status status =
-        applyChangeSet(*recorded.ports().registry, isOwn ? nullptr : recorded.ports().services, changes, key);
-    if (status != kSuccess) {
-        return admin.storeFault("cannot change: " + shownText(key), status);
+    if (const Answer made = makeChanges(admin, recorded.ports(), changes); made != kAnswerYes) {
+        return made;
     }
-    status = recorded.commit();
+    const Status status = recorded.commit();
     return status == kSuccess ? kAnswerYes
                               : admin.storeFault("cannot take back run " + std::to_string(options.number), status);
 }

@@ -76,6 +76,36 @@ std::set<std::string> keysWithValues(const ChangeSet& changes) {
     return keys;
 }
 
+// The changes that are lines of their own: values name their keys.
+std::vector<const Change*> linesOf(const ChangeSet& changes) {
+    const std::set<std::string> withValues = keysWithValues(changes);
+    std::vector<const Change*> lines;
+    for (const Change& change : changes) {
+        if (serviceOf(change.key).empty() && !(change.isKey() && withValues.contains(foldUpper(change.key)))) {
+            lines.push_back(&change);
+        }
+    }
+    return lines;
+}
+
+// The changes of the native view that the 32-bit view has too, each with the other one.
+std::map<const Change*, const Change*> sameInBothViews(const std::vector<const Change*>& lines) {
+    std::unordered_map<std::string, const Change*> in32BitView;
+    for (const Change* const change : lines) {
+        if (const std::string native = nativeName(change->key); native != change->key) {
+            in32BitView.emplace(identityOf(native, *change), change);
+        }
+    }
+    std::map<const Change*, const Change*> same;
+    for (const Change* const change : lines) {
+        const auto other = in32BitView.find(identityOf(change->key, *change));
+        if (other != in32BitView.end() && sameIn32BitView(*change, *other->second)) {
+            same.emplace(change, other->second);
+        }
+    }
+    return same;
+}
+
 // The changes of services as lines of their own: the program of one that is new or gone, each value that differs else.
 std::string serviceText(const ChangeSet& changes, bool isColoured) {
     std::map<std::string, char> services;  // by upper-cased name, with the mark of the whole service
@@ -155,28 +185,18 @@ std::string markedLine(char mark, const std::string& text, bool isColoured) {
 }
 
 std::string changeText(const ChangeSet& changes, bool isColoured) {
-    std::unordered_map<std::string, const Change*> in32BitView;
-    for (const Change& change : changes) {
-        if (const std::string native = nativeName(change.key); native != change.key) {
-            in32BitView.emplace(identityOf(native, change), &change);
-        }
-    }
-    const std::set<std::string> withValues = keysWithValues(changes);
+    const std::vector<const Change*> lines = linesOf(changes);
+    const auto both = sameInBothViews(lines);
     std::set<const Change*> folded;
+    for (const auto& [native, other] : both) {
+        folded.insert(other);
+    }
     std::string text;
-    for (const Change& change : changes) {
-        // Values name their keys.
-        if (!serviceOf(change.key).empty() || folded.contains(&change) ||
-            (change.isKey() && withValues.contains(foldUpper(change.key)))) {
-            continue;
+    for (const Change* const change : lines) {
+        if (!folded.contains(change)) {
+            const std::string line = shownRow(*change) + (change->isKey() ? "" : ' ' + shownStates(*change));
+            text += markedLine(markOf(*change), line + (both.contains(change) ? "  (both views)" : ""), isColoured);
         }
-        const auto other = in32BitView.find(identityOf(change.key, change));
-        const bool both = other != in32BitView.end() && sameIn32BitView(change, *other->second);
-        if (both) {
-            folded.insert(other->second);
-        }
-        const std::string line = shownRow(change) + (change.isKey() ? "" : ' ' + shownStates(change));
-        text += markedLine(markOf(change), line + (both ? "  (both views)" : ""), isColoured);
     }
     return text + serviceText(changes, isColoured);
 }

@@ -140,6 +140,7 @@ Status MemoryRegistry::queryValue(KeyHandle key, std::string_view name, ValueTyp
     if (const Status status = nodeForValue(key, kKeyQueryValue, name, node); status != kSuccess) {
         return status;
     }
+    // Deliberate: only ASCII letters compare without case, also in a preview on Windows, which compares all letters so.
     const auto found = node->byName.find(foldUpper(name));
     if (found == node->byName.end()) {
         return kFileNotFound;
