@@ -28,6 +28,9 @@ if(NOT WIN32)
     DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions COMPONENT kz7install)
   install(FILES ${PROJECT_BINARY_DIR}/completions/zsh RENAME _kz7admin
     DESTINATION ${CMAKE_INSTALL_DATADIR}/zsh/vendor-completions COMPONENT kz7install)
+  install(PROGRAMS packaging/systemd/log_check DESTINATION ${CMAKE_INSTALL_LIBEXECDIR}/kz7install COMPONENT kz7install)
+  install(FILES packaging/systemd/kz7-check.service packaging/systemd/kz7-check.timer
+    DESTINATION lib/systemd/system COMPONENT kz7install)
 endif()
 
 if(WIN32)
@@ -38,3 +41,4 @@ else()
 endif()
 configure_file(cmake/kz7.pc.in kz7.pc @ONLY)
 install(FILES ${PROJECT_BINARY_DIR}/kz7.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT kz7install-dev)
+include(packaging/cpack.cmake)

@@ -188,6 +188,7 @@ std::vector<OptionShape> optionsOf(const CommandShape& command, const std::vecto
 
 std::vector<std::string> namesOf(const std::vector<CommandShape>& commands) {
     std::vector<std::string> names;
+    names.reserve(commands.size());
     for (const CommandShape& command : commands) {
         names.push_back(command.name);
     }

@@ -1,0 +1,3 @@
+# Called by CPack before it packs what was installed.
+execute_process(COMMAND ${CMAKE_CURRENT_LIST_DIR}/finish ${CPACK_TEMPORARY_INSTALL_DIRECTORY} ${CPACK_PACKAGE_VERSION}
+  ${CPACK_PACKAGE_CONTACT} COMMAND_ERROR_IS_FATAL ANY)
