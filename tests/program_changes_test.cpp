@@ -442,6 +442,14 @@ TEST_F(ChangesProgram, BadInputIsOneLineAndChangesNothing) {
     expect({"diff", ".", ".", "HKLM\\NONE"}, "|kz7admin: no such key: HKEY_LOCAL_MACHINE\\NONE\n|2");
     expect({"restore", file("empty.reg", "Windows Registry Editor Version 5.00\n")},
            "|kz7admin: nothing to restore: empty.reg\n|2");
+    const std::string key = "HKEY_LOCAL_MACHINE\\SOFTWARE\\NVQ\\KZ7";
+    expect({"restore", file("part.reg", "REGEDIT4\n[" + key + "\\InstalledCopies\\A]\n")},
+           "|kz7admin: part.reg: only a part of " + key + ": kz7admin import takes it\n|2");
+    expect({"restore", file("cut.reg", "REGEDIT4\n[" + key + "]\n\"a\"=dword:00")},
+           "|kz7admin: cut.reg: the last line has no end: the file was cut off\n|2");
+    for (const auto& words : {Arguments{"undo", "1"}, {"repair"}, {"history", "trim", "--keep", "1"}}) {
+        EXPECT_EQ(store_.run("kz7admin", words).exitCode, 2) << words.front();
+    }
     expect({"apply", "--", "-addKZ7Copy", "A"},
            "|kz7admin: not a command of kz7InstallReg: -addKZ7Copy A (see kz7admin apply --help)\n|2");
     EXPECT_EQ(store_.dump(), "");

@@ -16,6 +16,17 @@ constexpr std::size_t kPage = 1 << 16;  // bytes that are shown at once
 
 }  // namespace
 
+bool Admin::openExisting(bool readOnly) {
+    if (!open(readOnly)) {
+        return false;
+    }
+    const bool isThere = !platform_->storeIsLost();
+    if (!isThere) {
+        fault("no store: " + shownText(platform_->storeName()));
+    }
+    return isThere;
+}
+
 bool Admin::open(bool readOnly, bool missingIsEmpty) {
     readOnly_ = readOnly;
     PlatformOptions options = platformOptions();

@@ -34,6 +34,9 @@ public:
     // registry. `missingIsEmpty`: see PlatformOptions.
     bool open(bool readOnly, bool missingIsEmpty = false);
 
+    // The same for a command that changes only what is there: false, with a message, without a store.
+    bool openExisting(bool readOnly);
+
     // The options of every store that this program opens; each adds its own.
     PlatformOptions platformOptions();
 

@@ -1,7 +1,9 @@
 #include "install/admin/registry_source.h"
 
+#include <algorithm>
 #include <charconv>
 #include <filesystem>
+#include <set>
 
 #include "install/admin/formats/reg_text.h"
 #include "install/admin/input_file.h"
@@ -13,6 +15,20 @@ namespace kz7 {
 namespace {
 
 constexpr std::string_view kStoreMark = "SQLite format 3";
+
+// A key of the product that a text does not name although it names keys below it, or nothing.
+std::string unnamedKey(IRegistryStore& registry, const std::vector<KeyChange>& changes) {
+    std::set<std::string> named;
+    for (const KeyChange& change : changes) {
+        named.insert(walkPlace(fullKeyName(change.name)));
+    }
+    std::vector<KeyStart> starts;
+    findEverything(registry, false, starts);
+    const auto part = std::find_if(starts.begin(), starts.end(), [&](const KeyStart& start) {
+        return !named.contains(walkPlace(fullKeyName(start.name)));
+    });
+    return part == starts.end() ? "" : fullKeyName(part->name);
+}
 
 }  // namespace
 
@@ -48,6 +64,7 @@ Answer RegistrySource::open() {
     std::uint32_t line = 0;
     const Status status = applyChanges(memory_, changes, line);
     registry_ = &memory_;
+    partOf_ = status == kSuccess ? unnamedKey(memory_, changes) : "";
     return status == kSuccess ? kAnswerYes
                               : admin_.fault(compose("cannot read: %s:%u: error %u", {file.shown(), line, status}));
 }
@@ -55,6 +72,9 @@ Answer RegistrySource::open() {
 Answer RegistrySource::examine() {
     if (isCutOff_) {
         return admin_.fault(shownText(place_) + ": the last line has no end: the file was cut off");
+    }
+    if (!partOf_.empty()) {
+        return admin_.fault(compose("%s: only a part of %s: kz7admin import takes it", {shownText(place_), partOf_}));
     }
     std::vector<std::string> damages;
     const Status status = platform_ == nullptr ? kSuccess : platform_->examineStore(damages);

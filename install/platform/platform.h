@@ -90,7 +90,8 @@ public:
     virtual std::unique_ptr<IAssemblyCache> assembliesOn(IRegistryStore& registry) = 0;
 
     // A consistent copy of the whole store as the content of a file; other programs may write meanwhile.
-    // kFileNotFound: no store exists. kRegistryCorrupt: it is damaged. kCallNotImplemented: the store is the registry of the machine.
+    // kFileNotFound: no store exists. kRegistryCorrupt: it is damaged. kCallNotImplemented: the store is the registry of
+    // the machine.
     virtual Status storeImage(std::string&) { return kCallNotImplemented; }
 
     // Whether the store does not exist, or was found to be damaged.

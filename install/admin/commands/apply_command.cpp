@@ -88,7 +88,8 @@ Answer run(Admin& admin, const ApplyOptions& options, std::span<const char* cons
     noteServices(admin.registry(), run.changes, run);
     admin.registry().commit();  // the end of the transaction of the notes
     tellStatus(admin, options, run);
-    return showRun(admin, options, run);
+    const Answer answer = showRun(admin, options, run);
+    return admin.platform().storeFaultTold() ? kAnswerFault : answer;
 }
 
 std::string shownWords(const std::vector<std::string>& words) {

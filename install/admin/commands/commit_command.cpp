@@ -133,7 +133,7 @@ Answer commit(Admin& admin, const Words& words) {
                                                       {shownText(words.instance), std::uint32_t{kMaxInstanceName}}))
                                 : kAnswerFault;
     }
-    if (!admin.open(words.check)) {
+    if (!admin.openExisting(words.check)) {
         return kAnswerFault;
     }
     ConfigurationRequest request;

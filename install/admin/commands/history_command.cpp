@@ -143,7 +143,7 @@ Answer showTrimmed(Admin& admin, const HistoryOptions& options, std::uint32_t re
 
 Answer trim(Admin& admin, const HistoryOptions& options) {
     std::vector<HistoryRun> runs;
-    if (!admin.open(options.check, true)) {
+    if (!admin.openExisting(options.check)) {
         return kAnswerFault;
     }
     if (const Answer listed = listRuns(admin, runs); listed != kAnswerYes) {

@@ -93,7 +93,7 @@ Answer preview(Admin& admin, const RepairOptions& options) {
 }
 
 Answer repair(Admin& admin, RepairOptions options) {
-    if (!admin.open(options.check, true)) {
+    if (!admin.openExisting(options.check)) {
         return kAnswerFault;
     }
     if (const std::string fault = readWords(options.words, options.request); !fault.empty()) {

@@ -58,7 +58,7 @@ Answer takeBack(Admin& admin, const UndoOptions& options, const ChangeSet& chang
 }
 
 Answer undo(Admin& admin, const UndoOptions& options) {
-    if (!admin.open(options.check)) {
+    if (!admin.openExisting(options.check)) {
         return kAnswerFault;
     }
     HistoryRun run;
