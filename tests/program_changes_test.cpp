@@ -447,7 +447,13 @@ TEST_F(ChangesProgram, BadInputIsOneLineAndChangesNothing) {
            "|kz7admin: part.reg: only a part of " + key + ": kz7admin import takes it\n|2");
     expect({"restore", file("cut.reg", "REGEDIT4\n[" + key + "]\n\"a\"=dword:00")},
            "|kz7admin: cut.reg: the last line has no end: the file was cut off\n|2");
-    for (const auto& words : {Arguments{"undo", "1"}, {"repair"}, {"history", "trim", "--keep", "1"}}) {
+    expect({"restore", file("changes.reg", "REGEDIT4\n[-" + key + "]\n")},
+           "|kz7admin: changes.reg: removes keys or values, as no export does: kz7admin import takes it\n|2");
+    for (const auto& words : {Arguments{"undo", "1"},
+                              {"undo", "-1"},
+                              {"history", "trim", "--before", "2026-31-01"},
+                              {"repair"},
+                              {"history", "trim", "--keep", "1"}}) {
         EXPECT_EQ(store_.run("kz7admin", words).exitCode, 2) << words.front();
     }
     expect({"apply", "--", "-addKZ7Copy", "A"},

@@ -103,7 +103,11 @@ Option Command::texts(const std::string& name, std::vector<std::string>& values,
 }
 
 Option Command::number(const std::string& name, std::uint64_t& value, const std::string& description) {
-    return Option(app_->add_option(name, value, description));
+    // CLI11 itself takes "-1" as a very great number.
+    return Option(app_->add_option(name, value, description)).check([](const std::string& text) {
+        const bool isNumber = !text.empty() && text.find_first_not_of("0123456789") == std::string::npos;
+        return std::string(isNumber && text.size() < 20 ? "" : "not a number");
+    });
 }
 
 CommandShape Command::shape() const {

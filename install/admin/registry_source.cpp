@@ -16,6 +16,11 @@ namespace {
 
 constexpr std::string_view kStoreMark = "SQLite format 3";
 
+bool removes(const KeyChange& change) {
+    return change.remove || std::any_of(change.values.begin(), change.values.end(),
+                                        [](const ValueChange& value) { return value.remove; });
+}
+
 // A key of the product that a text does not name although it names keys below it, or nothing.
 std::string unnamedKey(IRegistryStore& registry, const std::vector<KeyChange>& changes) {
     std::set<std::string> named;
@@ -64,6 +69,7 @@ Answer RegistrySource::open() {
     std::uint32_t line = 0;
     const Status status = applyChanges(memory_, changes, line);
     registry_ = &memory_;
+    isChanges_ = std::any_of(changes.begin(), changes.end(), removes);
     partOf_ = status == kSuccess ? unnamedKey(memory_, changes) : "";
     return status == kSuccess ? kAnswerYes
                               : admin_.fault(compose("cannot read: %s:%u: error %u", {file.shown(), line, status}));
@@ -72,6 +78,10 @@ Answer RegistrySource::open() {
 Answer RegistrySource::examine() {
     if (isCutOff_) {
         return admin_.fault(shownText(place_) + ": the last line has no end: the file was cut off");
+    }
+    if (isChanges_) {
+        return admin_.fault(shownText(place_) +
+                            ": removes keys or values, as no export does: kz7admin import takes it");
     }
     if (!partOf_.empty()) {
         return admin_.fault(compose("%s: only a part of %s: kz7admin import takes it", {shownText(place_), partOf_}));

@@ -19,8 +19,8 @@ public:
     // For reading; after admin.open().
     Answer open();
 
-    // Reports why the registry may lack a part of what it had: a damaged store, or a text that was cut off or describes
-    // only keys below one of the product's. After open().
+    // Reports why the registry may lack a part of what it had: a damaged store, or a text that was cut off, describes
+    // changes, or only keys below one of the product's. After open().
     Answer examine();
 
     // Only after open().
@@ -49,6 +49,7 @@ private:
     IRegistryStore* registry_ = nullptr;
     bool isOwn_ = true;
     bool isCutOff_ = false;
+    bool isChanges_ = false;
     std::string partOf_;  // a key of the product
 };
 

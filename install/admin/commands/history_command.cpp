@@ -1,4 +1,6 @@
 #include <algorithm>
+#include <charconv>
+#include <chrono>
 
 #include "install/admin/commands/commands.h"
 #include "install/admin/formats/change_text.h"
@@ -193,6 +195,16 @@ std::string dateFault(const std::string& text) {
     for (std::size_t at = 0; fits && at < text.size(); ++at) {
         fits = kForm[at] == 'd' ? text[at] >= '0' && text[at] <= '9' : text[at] == kForm[at];
     }
+    const auto part = [&](std::size_t at, std::size_t size) {
+        int number = 0;
+        std::from_chars(text.data() + at, text.data() + at + size, number);
+        return number;
+    };
+    using namespace std::chrono;
+    fits = fits && year_month_day(year(part(0, 4)), month(static_cast<unsigned>(part(5, 2))),
+                                  day(static_cast<unsigned>(part(8, 2))))
+                       .ok();
+    fits = fits && (text.size() == 10 || (part(11, 2) < 24 && part(14, 2) < 60 && part(17, 2) < 60));
     return fits ? "" : "not a date of the form 2026-01-31 or 2026-01-31T12:00:00Z";
 }
 

@@ -83,7 +83,7 @@ int putNotice(const std::string& directory, const std::string& kept) {
     name = directory + '/' + name;
     const std::string text = std::string(kMovedTo) + kept.substr(directory.size() + 1) + '\n';
     const OwnedDescriptor file(open(name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
-    const bool isPut = file && writeAll(file.get(), text) && fsync(file.get()) == 0 &&
+    const bool isPut = file && inheritOwner(directory, file) && writeAll(file.get(), text) && fsync(file.get()) == 0 &&
                        rename(name.c_str(), (directory + '/' + kStoreName).c_str()) == 0;
     return isPut ? 0 : errno;
 }
@@ -130,11 +130,12 @@ std::string usualStateDirectory() {
     if (geteuid() == 0) {
         return kMachineStateDirectory;
     }
-    if (const std::string state = environmentText("XDG_STATE_HOME"); !state.empty()) {
+    // A relative directory would be another one, with other programs, wherever the caller happens to be.
+    if (const std::string state = environmentText("XDG_STATE_HOME"); state.starts_with('/')) {
         return state + "/kz7";
     }
     const std::string home = environmentText("HOME");
-    return home.empty() ? std::string{} : home + "/.local/state/kz7";
+    return home.starts_with('/') ? home + "/.local/state/kz7" : std::string{};
 }
 
 int makeFolder(const std::string& path) {
@@ -176,6 +177,16 @@ bool randomName(const std::string& prefix, std::string& name) {
 
 bool unfinishedStoreName(std::string& name) {
     return randomName(unfinishedPrefix(), name);
+}
+
+bool inheritOwner(const std::string& directory, const OwnedDescriptor& file) {
+    struct stat before {};
+    const bool isThere = lstat((directory + '/' + kStoreName).c_str(), &before) == 0 && S_ISREG(before.st_mode);
+    if (!isThere && stat(directory.c_str(), &before) != 0) {
+        return false;
+    }
+    const bool isOwned = geteuid() != 0 || fchown(file.get(), before.st_uid, before.st_gid) == 0;
+    return isOwned && (!isThere || fchmod(file.get(), before.st_mode & 0777) == 0);
 }
 
 int setAside(const std::string& directory, std::string& kept) {

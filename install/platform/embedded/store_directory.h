@@ -27,6 +27,10 @@ int lockFolder(const std::string& path, int milliseconds, OwnedDescriptor& folde
 bool randomName(const std::string& prefix, std::string& name);
 bool unfinishedStoreName(std::string& name);
 
+// Gives a new file the owner and the mode of the store that it replaces; without one, the owner of the directory: a run
+// of root must not lock the user out who owns the store. False: errno is the reason.
+bool inheritOwner(const std::string& directory, const OwnedDescriptor& file);
+
 // Gives a store and its log another name, `registry.db.old` or the next free one; a log without a store too, which
 // would be applied to the next store. `kept` is empty if there is neither. The caller holds the lock of the directory.
 // A file smaller than kSmallestStore is in its place until another store gets it; a call after a process that was killed

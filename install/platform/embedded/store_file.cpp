@@ -279,6 +279,9 @@ StoreFault StoreFile::build(const OwnedDescriptor& folder, sqlite3* content, std
     if (!file) {
         return refused(kCannotOpen, directory_ + '/' + name, errno);
     }
+    if (!inheritOwner(directory_, file)) {
+        return refused(kCannotOpen, directory_ + '/' + name, errno);
+    }
     Connection connection;
     int result = connect(name, SQLITE_OPEN_READWRITE, connection);
     // The schema is written first: in rollback mode a small file is written once, and the switch then only changes its
