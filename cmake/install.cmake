@@ -10,7 +10,8 @@ include(CMakePackageConfigHelpers)
 write_basic_package_version_file(${PROJECT_BINARY_DIR}/kz7ConfigVersion.cmake COMPATIBILITY SameMajorVersion)
 install(FILES cmake/kz7Config.cmake ${PROJECT_BINARY_DIR}/kz7ConfigVersion.cmake
   DESTINATION ${CMAKE_INSTALL_LIBDIR}/cmake/kz7 COMPONENT kz7install-dev)
-install(DIRECTORY examples/consumer examples/installer DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples COMPONENT kz7install-dev)
+install(DIRECTORY examples/consumer examples/installer examples/package DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples
+  COMPONENT kz7install-dev USE_SOURCE_PERMISSIONS)
 
 foreach(section 1 5 7)
   file(GLOB pages CONFIGURE_DEPENDS docs/man/*.${section})

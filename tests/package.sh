@@ -20,6 +20,7 @@ if [ -z "${KZ7_WINE_PREFIX:-}" ]; then
 fi
 programs=$(realpath "$1")
 source=$(realpath "$(dirname "$0")")/package/package.wxs
+example=$(realpath "$(dirname "$0")/../examples/package")
 folder=$(mktemp -d)
 trap 'rm -rf "$folder"' EXIT
 cd "$folder"
@@ -27,25 +28,16 @@ cd "$folder"
 windows_path() { printf 'Z:%s' "${1//\//\\}"; }
 long() { printf '%*s' "$1" '' | sed "s/ /$letter/g"; }
 
-# wixl resolves relative paths only, and writes one type for every action that is not immediate.
-retype() {
-    local type=$1 action
-    shift
-    for action in "$@"; do
-        msibuild package.msi -q "UPDATE CustomAction SET Type=$type WHERE Action='$action'"
-    done
-}
+# wixl resolves relative paths only.
 cp "$programs/kz7actions64.dll" "$programs/kz7_probe.dll" .
 echo installed >file.txt
-wixl -a x64 -D FILE=file.txt -D ACTIONS=kz7actions64.dll -D PROBE=kz7_probe.dll -o package.msi "$source"
-retype 1 Save ProbeChange FailEarly DeleteAt{Cancel,Failure} # immediate
-for exit in Cancel,-2 Failure,-3; do
-    msibuild package.msi -q "UPDATE InstallExecuteSequence SET Sequence=${exit#*,} WHERE Action='DeleteAt${exit%,*}'"
-done
-retype 51 SetDebugProp SetRollbackDeletes TellImmediate TellProbe{RolledBack,Rollback,Deferred,Commit,Committed}
-retype 3073 ProbeDeferred Fail                              # deferred
-retype 3329 ProbeRollback DeleteAtRollback ProbeRolledBack  # rollback
-retype 3585 ProbeCommit DeleteAtCommit ProbeCommitted       # commit
+wixl -a x64 -I "$example" -D FILE=file.txt -D ACTIONS=kz7actions64.dll -D PROBE=kz7_probe.dll -o package.msi "$source"
+"$example/fix_actions" package.msi
+"$example/fix_actions" package.msi immediate ProbeChange FailEarly
+"$example/fix_actions" package.msi property SetDebugProp TellImmediate TellProbe{RolledBack,Rollback,Deferred,Commit,Committed}
+"$example/fix_actions" package.msi deferred ProbeDeferred Fail
+"$example/fix_actions" package.msi rollback ProbeRollback ProbeRolledBack
+"$example/fix_actions" package.msi commit ProbeCommit ProbeCommitted
 
 # Prints the results of one run. The security identifier of the user varies. Consecutive notes of properties that were
 # read or set are one line with their number; those of the calls with null arguments are left out.
