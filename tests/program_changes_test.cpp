@@ -267,10 +267,24 @@ TEST_F(ChangesProgram, CheckReportsRepairCorrectsAndResolveAnswers) {
     expect({"repair", "rubbish"}, "|kz7admin: neither a kind of finding nor a copy: rubbish (see kz7admin check)\n|2");
     expect({"repair", "aliases", "FIRST", "services"},
            "|kz7admin: not a kind of finding: FIRST (see kz7admin repair --help)\n|2");
+    expect({"repair", "aliases", "--copy", "rubbish"},
+           "|kz7admin: neither a kind of finding nor a copy: rubbish (see kz7admin check)\n|2");
     expect({"repair"}, "changed: 9 values, 1 key\n||0");
     expect({"check"}, services + "||1");
     expect({"repair", "services", "OLD"}, "changed: 1 service\n||0");
     expect({"repair", "services"}, "changed: 1 service\n||0");
+
+    // A copy may be called like a kind.
+    ASSERT_EQ(store_.tool({"-addKZ7Copy", "services", "C:\\s"}).exitCode, 0);
+    EXPECT_EQ(store_
+                  .run("kz7admin", {"import", file("half.reg",
+                                                   "REGEDIT4\n[-HKLM\\SOFTWARE\\NVQ\\KZ7\\InstalledCopies"
+                                                   "\\services\\Components]\n")})
+                  .exitCode,
+              0);
+    EXPECT_TRUE(told({"check"}).find("repair: kz7admin repair copies --copy=services") != std::string::npos);
+    expect({"repair", "copies", "services"}, "|kz7admin: services: both a kind of finding and a copy (see --copy)\n|2");
+    expect({"repair", "copies", "--copy=services"}, "changed: 2 values, 1 key\n||0");
     expect({"check"}, "||0");
 }
 

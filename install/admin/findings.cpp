@@ -412,7 +412,14 @@ std::string Finding::why() const {
 
 std::string Finding::repair() const {
     const std::string word = shownText(quotedWord(copy));
-    return fill(kind().repair, word, word);
+    const bool isUnclear = kind().repair.starts_with("kz7admin") && (isRepairWord(copy) || copy.starts_with('-'));
+    return fill(kind().repair, isUnclear ? "--copy=" + word : word, word);
+}
+
+bool isRepairWord(std::string_view word) {
+    return std::any_of(kKinds.begin(), kKinds.end(), [word](const FindingKind& kind) {
+        return !kind.group.empty() && (kind.group == word || kind.name == word);
+    });
 }
 
 std::vector<FindingKind> findingKinds() {

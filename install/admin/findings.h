@@ -76,6 +76,9 @@ struct Finding {
 // All kinds, in the order of Reason.
 std::vector<FindingKind> findingKinds();
 
+// Whether a word names a kind that can be repaired, or a group of them.
+bool isRepairWord(std::string_view word);
+
 // The findings in the order of the table's groups: aliases, copies, services, the rest. With `all`, also those that are
 // shown on request only, for which `files` is asked about locations and programs.
 std::vector<Finding> findFindings(const MachineState& machine, IFileSystem& files, bool all);

@@ -15,20 +15,17 @@ struct RepairOptions : ChangeOptions {
 // Sorts the words into kinds and the name of a copy; the last word may be one. A fault is returned as text.
 std::string readWords(const std::vector<std::string>& words, RepairRequest& request) {
     for (const std::string& word : words) {
-        bool isKind = false;
         for (const FindingKind& kind : findingKinds()) {
             if (!kind.group.empty() && kind.group == word) {
                 request.groups.insert(kind.group);
-                isKind = true;
             } else if (!kind.group.empty() && kind.name == word) {
                 request.kinds.insert(kind.name);
-                isKind = true;
             }
         }
-        if (!isKind && (&word != &words.back() || word.empty())) {
+        if (!isRepairWord(word) && (&word != &words.back() || word.empty() || !request.copy.empty())) {
             return "not a kind of finding: " + shownText(word);
         }
-        request.copy = isKind ? request.copy : word;
+        request.copy = isRepairWord(word) ? request.copy : word;
     }
     return {};
 }
@@ -43,12 +40,16 @@ Status copySavedProperties(Admin& admin, Preview& preview, std::string& key) {
     return status == kSuccess ? preview.fill(keys, key) : status;
 }
 
-// The name of a copy that nothing belongs to is a mistake.
-Answer checkName(Admin& admin, const RepairRequest& request) {
+// The name of a copy that nothing belongs to is a mistake, and so may be a kind that a copy is called.
+Answer checkName(Admin& admin, const RepairOptions& options) {
+    const RepairRequest& request = options.request;
     MachineState machine;
     std::string key;
     if (const Status status = readMachine(admin.registry(), Depth::whole, machine, key); status != kSuccess) {
         return admin.storeFault("cannot read: " + shownText(key), status);
+    }
+    if (request.copy.empty() && options.words.size() > 1 && machine.find(options.words.back()) != nullptr) {
+        return admin.fault(shownText(options.words.back()) + ": both a kind of finding and a copy (see --copy)");
     }
     const bool hasService = std::any_of(machine.services.begin(), machine.services.end(), [&](const ServiceRow& row) {
         return equalsIgnoreCase(row.copy, request.copy);
@@ -99,7 +100,7 @@ Answer repair(Admin& admin, RepairOptions options) {
     if (const std::string fault = readWords(options.words, options.request); !fault.empty()) {
         return admin.fault(fault + " (see kz7admin repair --help)");
     }
-    if (const Answer answer = checkName(admin, options.request); answer != kAnswerYes) {
+    if (const Answer answer = checkName(admin, options); answer != kAnswerYes) {
         return answer;
     }
     if (options.check) {
@@ -125,6 +126,7 @@ void addRepairCommand(Command& program, Admin& admin) {
         "migration is repaired. No program is started.");
     addChangeOptions(command, admin, options);
     command.texts("KIND", options.words, "What to repair; the last word may name a copy");
+    command.text("--copy", options.request.copy, "Only what belongs to this copy, whatever it is called");
     auto on = command.text("--on", options.request.location, "Finish a half-done migration to this location");
     on.isFileName();
     command.flag("--back", options.request.isBack, "Take a half-done migration back").excludes(on);

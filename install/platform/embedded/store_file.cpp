@@ -282,6 +282,24 @@ StoreFault StoreFile::build(const OwnedDescriptor& folder, sqlite3* content, std
     if (!inheritOwner(directory_, file)) {
         return refused(kCannotOpen, directory_ + '/' + name, errno);
     }
+    if (StoreFault fault = fill(name, content); fault.status != kSuccess) {
+        return fault;
+    }
+    // The lock makes this safe on file systems without hard links and without a rename that does not replace.
+    if (fsync(file.get()) != 0 || (errno = setAside(directory_, kept)) != 0) {
+        return refused(kCannotOpen, path_, errno);
+    }
+    if (renameat(folder.get(), name.c_str(), folder.get(), kStoreName) != 0) {
+        const int error = errno;
+        takeBack(directory_, kept);
+        kept.clear();
+        return refused(kCannotOpen, path_, error);
+    }
+    return fsync(folder.get()) == 0 ? StoreFault{} : refused(kCannotOpen, path_, errno);
+}
+
+// Writes a new store.
+StoreFault StoreFile::fill(const std::string& name, sqlite3* content) {
     Connection connection;
     int result = connect(name, SQLITE_OPEN_READWRITE, connection);
     // The schema is written first: in rollback mode a small file is written once, and the switch then only changes its
@@ -294,21 +312,7 @@ StoreFault StoreFile::build(const OwnedDescriptor& folder, sqlite3* content, std
         result = copyDatabase(content, connection.get());
     }
     result = result == SQLITE_OK ? execute(connection.get(), "PRAGMA journal_mode = WAL") : result;
-    if (result != SQLITE_OK) {
-        return explain(connection.get(), result);
-    }
-    connection.reset();
-    // The lock makes this safe on file systems without hard links and without a rename that does not replace.
-    if (fsync(file.get()) != 0 || (errno = setAside(directory_, kept)) != 0) {
-        return refused(kCannotOpen, path_, errno);
-    }
-    if (renameat(folder.get(), name.c_str(), folder.get(), kStoreName) != 0) {
-        const int error = errno;
-        takeBack(directory_, kept);
-        kept.clear();
-        return refused(kCannotOpen, path_, error);
-    }
-    return fsync(folder.get()) == 0 ? StoreFault{} : refused(kCannotOpen, path_, errno);
+    return result == SQLITE_OK ? StoreFault{} : explain(connection.get(), result);
 }
 
 int StoreFile::connect(const std::string& name, int flags, Connection& connection) {

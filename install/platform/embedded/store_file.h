@@ -74,6 +74,7 @@ private:
     StoreFault lockOut(OwnedDescriptor& store) const;
     StoreFault put(const OwnedDescriptor& folder, sqlite3* content, std::string& kept);
     StoreFault build(const OwnedDescriptor& folder, sqlite3* content, std::string& kept);
+    StoreFault fill(const std::string& name, sqlite3* content);
     // Opens the file of that name in the state directory; the connection is set on failure too, for its message.
     int connect(const std::string& name, int flags, Connection& connection);
     StoreFault refused(Status status, const std::string& file, int error) const;
