@@ -1,0 +1,62 @@
+"""Runs kz7admin and maps its JSON to the result of a module."""
+from __future__ import absolute_import, division, print_function
+
+__metaclass__ = type
+
+import json
+import os
+
+# The first version with everything that the modules use.
+NEEDED = '1.0.0'
+
+LOCKED = 170  # another program held the store for 5 seconds
+ATTEMPTS = 3
+
+ARGUMENTS = {
+    'executable': {'type': 'path', 'default': '/usr/bin/kz7admin'},
+    'store': {'type': 'path'},
+}
+
+
+def parsed(text):
+    """The object that a text holds, or an empty one."""
+    try:
+        value = json.loads(text)
+    except ValueError:
+        return {}
+    return value if isinstance(value, dict) else {}
+
+
+def run_kz7admin(module, command, data=None):
+    """Returns the exit code and the object that the command wrote; fails if it could not do its work."""
+    program = module.params['executable']
+    if not os.access(program, os.X_OK):
+        module.fail_json(msg='%s is not there: install the package kz7install, version %s or newer' % (program, NEEDED))
+    words = [program, '--at-least', NEEDED]
+    if module.params['store']:
+        words += ['--store', module.params['store']]
+    for attempt in range(ATTEMPTS):
+        code, output, error = module.run_command(words + command + ['--json'], data=data)
+        result = parsed(output)
+        fault = parsed(error)
+        if LOCKED not in (result.get('status'), fault.get('status')):
+            break
+    if result:
+        return code, result
+    if fault:
+        tries = ' (%d attempts)' % ATTEMPTS if fault.get('status') == LOCKED else ''
+        module.fail_json(msg='kz7admin: %s%s' % (fault.get('error'), tries), rc=code, status=fault.get('status'))
+    # Every version that is new enough answers in JSON.
+    module.fail_json(msg='%s is older than %s, which kz7.install needs: %s' % (program, NEEDED, error.strip()), rc=code)
+
+
+def run_change(module, command, data=None):
+    """The same for a command that changes the store. Honours check mode and diff mode; notes become warnings."""
+    options = ['--check'] * module.check_mode + ['--diff'] * module._diff
+    code, run = run_kz7admin(module, command + options, data)
+    for note in run['notes']:
+        module.warn(note)
+    result = {'changed': run['changed'], 'changes': run['changes'], 'notes': run['notes'], 'status': run['status']}
+    if module._diff and run['changed']:
+        result['diff'] = {'prepared': run.get('diff','')}
+    return code, run, result
