@@ -45,6 +45,7 @@ void appendRows(std::string_view caption, const std::vector<std::string_view>& h
         }
     }
     rows.resize(fitting);
+    html.append("<h3>").append(caption).append("</h3>\n");
     appendTable(caption, headings, rows, html);
     if (fitting < all) {
         html += "<p class=\"note\">" + count(all - fitting) + " more rows are left out.</p>\n";
@@ -79,7 +80,7 @@ void appendFindings(const Fleet& fleet, std::string& html) {
                         count(same.count), count(same.machines.size()), machineNames(fleet, same.machines),
                         cutEscaped(same.example, kLongestText)});
     }
-    appendRows("Findings", {"Kind", "Mark", "Findings", "Machines", "Which", "The first one"}, std::move(rows), html);
+    appendRows("By kind", {"Kind", "Mark", "Findings", "Machines", "Which", "The first one"}, std::move(rows), html);
     html += "</section>\n";
 }
 
@@ -179,7 +180,7 @@ void appendVersions(const Fleet& fleet, std::string& html) {
         }
     }
     const std::size_t left = kLargestPage - std::min(kLargestPage, html.size());
-    appendRows("The copies of each version on each machine", headings, std::move(rows), html, left);
+    appendRows("Copies of each version", headings, std::move(rows), html, left);
     html += "</section>\n";
 }
 

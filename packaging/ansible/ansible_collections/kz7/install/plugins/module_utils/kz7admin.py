@@ -46,8 +46,9 @@ def run_kz7admin(module, command, data=None):
     if fault:
         tries = ' (%d attempts)' % ATTEMPTS if fault.get('status') == LOCKED else ''
         module.fail_json(msg='kz7admin: %s%s' % (fault.get('error'), tries), rc=code, status=fault.get('status'))
-    # Every version that is new enough answers in JSON.
-    module.fail_json(msg='%s is older than %s, which kz7.install needs: %s' % (program, NEEDED, error.strip()), rc=code)
+    # A version that is new enough reports a wrong command line (2) in JSON too.
+    reason = 'is older than %s, which kz7.install needs' % NEEDED if code == 2 else 'ended with %d' % code
+    module.fail_json(msg='%s %s: %s' % (program, reason, error.strip()), rc=code)
 
 
 def run_change(module, command, data=None):
