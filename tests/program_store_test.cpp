@@ -85,7 +85,10 @@ TEST(StoreFaults, ReportsAStoreThatStaysLockedOrCannotBeReached) {
     const std::string before = state.dump();
     sqlite3* writer = executeSql(state.file("registry.db"), "BEGIN IMMEDIATE");
     const ProgramResult result = state.tool({"-removeKZ7Copy", "FIRST"});
+    const ProgramResult refused = state.run("kz7admin", {"repair", "--json"});
     sqlite3_close(writer);
+    EXPECT_EQ(refused.error, "{\"schema\":1,\"error\":\"" + state.file("registry.db") +
+                                 ": stayed locked by another program for 5 seconds\",\"exitCode\":2,\"status\":170}\n");
     EXPECT_EQ(result.exitCode, hostExitCode(kBusy));
     EXPECT_EQ(result.output, "") << "nobody knows whether the copy is there";
     EXPECT_NE(result.error.find("registry.db: stayed locked by another program"), std::string::npos) << result.error;

@@ -43,7 +43,10 @@ bool Admin::open(bool readOnly, bool missingIsEmpty) {
 }
 
 PlatformOptions Admin::platformOptions() {
-    return {.program = std::string(kProgram), .tellFault = [this](const std::string& line) { tell(line); }};
+    return {.program = std::string(kProgram), .tellFault = [this](const std::string& line, Status status) {
+                storeStatus_ = status;
+                tell(line);
+            }};
 }
 
 void Admin::beginRun(bool startsPrograms, std::uint64_t undoes) {
@@ -157,7 +160,11 @@ void Admin::tell(std::string_view message) {
 void Admin::endErrors(int exitCode) {
     if (!told_.empty()) {
         JsonWriter json = beginDocument();
-        json.field("error", told_).field("exitCode", static_cast<std::uint32_t>(exitCode)).end();
+        json.field("error", told_).field("exitCode", static_cast<std::uint32_t>(exitCode));
+        if (storeStatus_ != kSuccess) {
+            json.field("status", storeStatus_);
+        }
+        json.end();
         std::fputs(json.take().c_str(), stderr);
     }
 }

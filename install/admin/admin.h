@@ -101,7 +101,8 @@ private:
     std::unique_ptr<IPlatform> platform_;
     bool readOnly_ = false;
     bool storeTold_ = false;
-    std::string told_;  // with --json
+    std::string told_;               // with --json
+    Status storeStatus_ = kSuccess;  // of the last fault of the store
     bool readerGone_ = false;
 };
 

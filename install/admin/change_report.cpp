@@ -12,10 +12,13 @@ std::string_view withoutLineEnd(std::string_view line) {
     return line.substr(0, line.find_last_not_of('\n') + 1);
 }
 
-Answer showJson(Admin& admin, const ChangeRun& run, bool isCheck) {
+Answer showJson(Admin& admin, const ChangeRun& run, const ChangeOptions& options) {
     JsonWriter json = beginDocument();
-    json.field("check", isCheck).field("changed", !run.changes.empty()).field("status", run.status);
+    json.field("check", options.check).field("changed", !run.changes.empty()).field("status", run.status);
     appendChanges(run.changes, json.field("changes"));
+    if (options.diff) {
+        json.field("diff", changeText(run.changes, false));
+    }
     json.field("programs", run.programs).field("notes", run.notes).field("output", run.output);
     json.field("errors").beginArray();
     for (const ErrorLine& error : run.errors) {
@@ -105,7 +108,7 @@ Answer showPreview(Admin& admin, const ChangeOptions& options, Preview& preview,
 
 Answer showRun(Admin& admin, const ChangeOptions& options, const ChangeRun& run) {
     const Answer written =
-        admin.isJson ? showJson(admin, run, options.check) : admin.write(runText(run, options, admin.output().colours));
+        admin.isJson ? showJson(admin, run, options) : admin.write(runText(run, options, admin.output().colours));
     if (written != kAnswerYes || run.isFailed()) {
         return written != kAnswerYes ? written : kAnswerNo;
     }

@@ -30,8 +30,9 @@ struct PlatformOptions {
     bool plainStreams = false;        // standard input and output are bytes; line ends are not converted
     bool ownProcess = true;           // false: in a library, which must not change the state of the process
 
-    // Gets the line about a fault of the store, without the program's name; empty: it goes to standard error.
-    std::function<void(const std::string&)> tellFault = {};
+    // Gets the line about a fault of the store, without the program's name, and its status; empty: the line goes to
+    // standard error.
+    std::function<void(const std::string&, Status)> tellFault = {};
 };
 
 // The ports of one machine, none of them owned.

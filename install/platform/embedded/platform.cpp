@@ -71,7 +71,7 @@ private:
         return [this](const StoreFault& fault) {
             const std::string line = shownText(fault.file) + ": " + shownText(fault.reason);
             if (!faultTold_ && tellFault_) {
-                tellFault_(line);
+                tellFault_(line, fault.status);
             } else if (!faultTold_) {
                 console_->writeError(program_ + ": " + line + "\n");
             }
@@ -81,7 +81,7 @@ private:
     }
 
     std::string program_;
-    std::function<void(const std::string&)> tellFault_;
+    std::function<void(const std::string&, Status)> tellFault_;
     bool byDefault_;
     bool faultTold_ = false;
     bool isDamaged_ = false;

@@ -45,7 +45,7 @@ private:
     void tellBusy() {
         const std::string line = "%ProgramData%\\KZ7\\lock: stayed locked by another program for 5 seconds";
         if (!faultTold_ && tellFault_) {
-            tellFault_(line);
+            tellFault_(line, kBusy);
         } else if (!faultTold_) {
             console_->writeError(program_ + ": " + line + "\n");
         }
@@ -53,7 +53,7 @@ private:
     }
 
     std::string program_;
-    std::function<void(const std::string&)> tellFault_;
+    std::function<void(const std::string&, Status)> tellFault_;
     bool faultTold_ = false;
     std::unique_ptr<IConsole> console_ = windowsConsole();
     std::unique_ptr<IDebugOutput> debugOutput_ =

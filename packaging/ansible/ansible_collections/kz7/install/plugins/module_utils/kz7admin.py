@@ -59,5 +59,5 @@ def run_change(module, command, data=None):
         module.warn(note)
     result = {'changed': run['changed'], 'changes': run['changes'], 'notes': run['notes'], 'status': run['status']}
     if module._diff and run['changed']:
-        result['diff'] = {'prepared': run.get('diff','')}
+        result['diff'] = {'prepared': run['diff']}
     return code, run, result
