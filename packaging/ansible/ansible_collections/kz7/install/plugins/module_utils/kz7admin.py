@@ -45,7 +45,7 @@ def run_kz7admin(module, command, data=None):
         return code, result
     if fault:
         tries = ' (%d attempts)' % ATTEMPTS if fault.get('status') == LOCKED else ''
-        module.fail_json(msg='kz7admin: %s%s' % (fault.get('error'), tries), rc=code, status=fault.get('status'))
+        module.fail_json(msg='kz7admin: %s%s' % (fault.get('error'), tries), rc=code)
     # A version that is new enough reports a wrong command line (2) in JSON too.
     reason = 'is older than %s, which kz7.install needs' % NEEDED if code == 2 else 'ended with %d' % code
     module.fail_json(msg='%s %s: %s' % (program, reason, error.strip()), rc=code)
