@@ -229,44 +229,43 @@ std::string zshQuoted(std::string_view text, std::string_view special) {
     return quoted;
 }
 
-void appendZshOption(const OptionShape& option, std::string& specifications) {
+void appendZshOption(const OptionShape& option, std::string& rules) {
     const std::string sources = sourcesOf(option);
     const std::string description = zshQuoted(option.description, "[]:\\");
     for (const std::string& name : option.names) {
-        specifications += compose(" \\\n        '%s[%s]", {name, description});
-        specifications +=
-            option.takesValue ? compose(":%s: _kz7admin_list %s'", {name.substr(2), sources}) : std::string("'");
+        rules += compose(" \\\n        '%s[%s]", {name, description});
+        rules += option.takesValue ? compose(":%s: _kz7admin_list %s'", {name.substr(2), sources}) : std::string("'");
     }
 }
 
-void appendZshArgument(const OptionShape& argument, std::size_t& place, std::string& specifications) {
+void appendZshArgument(const OptionShape& argument, std::size_t& place, std::string& rules) {
     std::string sources = sourcesOf(argument);
     do {
         const std::string source = sources.substr(0, sources.find(' '));
         sources.erase(0, source.size() + 1);
         const bool isLast = argument.isRepeated && sources.empty();
-        specifications += compose(" \\\n        '%s:%s: _kz7admin_list %s'",
-                                  {isLast ? "*" : std::to_string(++place), argument.names.back(), source});
+        rules += compose(" \\\n        '%s:%s: _kz7admin_list %s'",
+                         {isLast ? "*" : std::to_string(++place), argument.names.back(), source});
     } while (!sources.empty());
 }
 
 void appendZsh(const CommandShape& command, const std::string& function, const std::vector<OptionShape>& common,
                std::string& script) {
-    std::string specifications;
+    std::string rules;
     std::string sources;
     std::size_t place = 0;
     for (const OptionShape& option : optionsOf(command, common)) {
         if (!option.isArgument) {
-            appendZshOption(option, specifications);
+            appendZshOption(option, rules);
         } else if (command.commands.empty()) {
-            appendZshArgument(option, place, specifications);
+            appendZshArgument(option, place, rules);
         } else {
             sources = sourcesOf(option);
         }
     }
     script += function + "() {\n";
     if (command.commands.empty()) {
-        script += "    _arguments -S" + specifications + "\n}\n";
+        script += "    _arguments -S" + rules + "\n}\n";
         return;
     }
     script += "    local state line context curcontext=$curcontext\n    local -A opt_args\n    local -a subcommands=(";
@@ -276,8 +275,8 @@ void appendZsh(const CommandShape& command, const std::string& function, const s
     script += compose(
         ")\n%s    _arguments -C%s \\\n        '1: : _kz7admin_first %s' '*:: :->rest'\n"
         "    [[ $state != rest ]] || (( ! $+functions[%s_$words[1]] )) || %s_$words[1]\n}\n",
-        {command.name == "kz7admin" ? "    local -a kz7_words=(\"${words[@]}\")\n" : "", specifications, sources,
-         function, function});
+        {command.name == "kz7admin" ? "    local -a kz7_words=(\"${words[@]}\")\n" : "", rules, sources, function,
+         function});
     for (const CommandShape& below : command.commands) {
         appendZsh(below, function + '_' + below.name, common, script);
     }
