@@ -77,7 +77,7 @@ constexpr std::array kStatuses = {
     StatusExplanation{kGeneralFailure,         "general failure",             false, "A device or resource failed in a way that has no number.", kRuntime},
     StatusExplanation{kEndOfFile,              "end of file",                 false, "Nothing is left to read.", "Give the input that is asked for."},
     StatusExplanation{kFileExists,             "file exists",                 false, "The file to write exists.", "Choose another name, or --force."},
-    StatusExplanation{kInvalidParameter,       "invalid parameter",           true,  "The command line is wrong, with the usage; without it, a name that the registry or the service manager does not accept.", "Compare the command with the usage and with the commands in README.md."},
+    StatusExplanation{kInvalidParameter,       "invalid parameter",           true,  "The command line is wrong, with the usage; without it, a name that the registry or the service manager does not accept.", "Compare the command with the usage and with kz7InstallReg(1)."},
     StatusExplanation{kBrokenPipe,             "broken pipe",                 false, "Every writer of a pipe that is read has ended.", kRuntime},
     StatusExplanation{kDiskFull,               "disk full",                   true,  "The disk is full. On the embedded store nothing of the run is on disk.", "Free space and run the command again."},
     StatusExplanation{kCallNotImplemented,     "not implemented",             false, "This host has no such operation.", kBug},

@@ -219,7 +219,7 @@ void appendBash(const CommandShape& command, const std::string& path, const std:
     }
 }
 
-// A text in quotation marks; those of a specification escape the characters that separate its parts.
+// A text in quotation marks; the characters that separate the parts of a rule are escaped.
 std::string zshQuoted(std::string_view text, std::string_view special) {
     std::string quoted;
     for (const char character : text) {

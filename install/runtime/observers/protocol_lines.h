@@ -1,5 +1,5 @@
 // The lines that the machine stream writes to a front end, and the answers that it reads, as pure functions.
-// docs/protocol.md has the grammar.
+// docs/man/kz7-progress.7 has the grammar.
 #pragma once
 
 #include <string_view>
