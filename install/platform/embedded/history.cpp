@@ -50,10 +50,11 @@ std::string hostName() {
 }
 
 bool hasTables(sqlite3* connection) {
-    std::int64_t count = 0;
-    return queryNumber(connection, "SELECT count(*) FROM sqlite_master WHERE name IN ('run', 'runpart')", count) ==
-               SQLITE_OK &&
-           count == 2;
+    const auto has = [connection](const char* table) {
+        return sqlite3_table_column_metadata(connection, "main", table, nullptr, nullptr, nullptr, nullptr, nullptr,
+                                             nullptr) == SQLITE_OK;
+    };
+    return has("run") && has("runpart");
 }
 
 struct flock byteOf(std::uint64_t number) {
@@ -97,25 +98,35 @@ int removeBefore(sqlite3* connection, std::int64_t number) {
     return result == SQLITE_DONE ? SQLITE_OK : result;
 }
 
+// What the table of parts holds.
+struct Parts {
+    std::int64_t last = 0;     // its number
+    std::int64_t total = 0;    // bytes of all that were ever written
+    std::int64_t removed = 0;  // bytes of those that are not kept any more
+};
+
+int readParts(sqlite3* connection, Parts& parts) {
+    Once last(connection,
+              "SELECT id, total, (SELECT total - length(changes) FROM runpart ORDER BY id LIMIT 1) FROM runpart"
+              " ORDER BY id DESC LIMIT 1");
+    const int result = last.query().step();
+    if (result == SQLITE_ROW) {
+        parts = {last.query().number(0), last.query().number(1), last.query().number(2)};
+    }
+    return result == SQLITE_ROW || result == SQLITE_DONE ? SQLITE_OK : result;
+}
+
 // Leaves the newest runs, as many as fit.
-int removeOldest(sqlite3* connection, std::int64_t newest) {
-    const int result = removeBefore(connection, newest - kMostRuns + 1);
-    if (result != SQLITE_OK) {
+int removeOldest(sqlite3* connection, std::int64_t newest, const Parts& parts) {
+    // Numbers ascend from 1.
+    const int result = newest > kMostRuns ? removeBefore(connection, newest - kMostRuns + 1) : SQLITE_OK;
+    if (result != SQLITE_OK || parts.total - parts.removed <= kMostBytes) {
         return result;
     }
-    std::int64_t bytes = 0;
-    if (queryNumber(connection,
-                    "SELECT (SELECT total FROM runpart ORDER BY id DESC LIMIT 1) -"
-                    " (SELECT total - length(changes) FROM runpart ORDER BY id LIMIT 1)",
-                    bytes) != SQLITE_OK ||
-        bytes <= kMostBytes) {
-        return SQLITE_OK;
-    }
-    Once first(connection,
-               "SELECT run FROM runpart WHERE total - length(changes) >="
-               " (SELECT total FROM runpart ORDER BY id DESC LIMIT 1) - ? ORDER BY id LIMIT 1");
-    return first.query().bind(kMostBytes).step() == SQLITE_ROW ? removeBefore(connection, first.query().number(0))
-                                                               : SQLITE_OK;
+    Once first(connection, "SELECT run FROM runpart WHERE total - length(changes) >= ? ORDER BY id LIMIT 1");
+    return first.query().bind(parts.total - kMostBytes).step() == SQLITE_ROW
+               ? removeBefore(connection, first.query().number(0))
+               : SQLITE_OK;
 }
 
 }  // namespace
@@ -146,31 +157,43 @@ int EmbeddedHistory::write(sqlite3* connection, const ChangeCounts& counts) {
     if (part_.size() > static_cast<std::size_t>(kMostBytes)) {
         return SQLITE_OK;
     }
-    int result = execute(connection, kHistoryTables);
+    int result = hasTables(connection) ? SQLITE_OK : execute(connection, kHistoryTables);
+    Parts parts;
+    result = result == SQLITE_OK ? readParts(connection, parts) : result;
     bool isThere = number_ != 0;
-    result = result == SQLITE_OK && isThere ? writeRun(connection, counts, isThere) : result;
-    result = result == SQLITE_OK && !isThere ? addRun(connection) : result;
-    result = result == SQLITE_OK && !isThere ? writeRun(connection, counts, isThere) : result;
+    result = result == SQLITE_OK && isThere ? updateRun(connection, counts, isThere) : result;
+    ++parts.last;
+    parts.total += static_cast<std::int64_t>(part_.size());
+    result = result == SQLITE_OK && !isThere ? addRun(connection, counts, parts.last) : result;
     if (result == SQLITE_OK) {
-        Once add(connection,
-                 "INSERT INTO runpart (run, total, changes) SELECT ?, length(part) + coalesce((SELECT total FROM"
-                 " runpart ORDER BY id DESC LIMIT 1), 0), part FROM (SELECT ? AS part)");
-        result = add.query().bind(static_cast<std::int64_t>(number_)).bindBytes(part_).step();
+        Once add(connection, "INSERT INTO runpart (id, run, total, changes) VALUES (?, ?, ?, ?)");
+        const auto number = static_cast<std::int64_t>(number_);
+        result = add.query().bind(parts.last).bind(number).bind(parts.total).bindBytes(part_).step();
+        result = result == SQLITE_DONE ? removeOldest(connection, number, parts) : result;
     }
-    result = result == SQLITE_DONE ? removeOldest(connection, static_cast<std::int64_t>(number_)) : result;
     // Tables of that name that are not ours: the run is more important than its entry.
     return result == SQLITE_ERROR ? SQLITE_OK : result;
 }
 
-int EmbeddedHistory::addRun(sqlite3* connection) {
-    Once add(
-        connection,
-        "INSERT INTO run (parent, undoes, begun, ended, user, host, program, arguments, outside, nvalues, nkeys,"
-        " nservices, firstpart) SELECT ?, ?, ?, 0, ?, ?, ?, ?, '', 0, 0, 0, coalesce(max(id), 0) + 1 FROM runpart");
+// A run that starts no programs has one commit point, which ends it.
+std::int64_t EmbeddedHistory::ended() const {
+    return start_.startsPrograms ? 0 : std::time(nullptr);
+}
+
+int EmbeddedHistory::addRun(sqlite3* connection, const ChangeCounts& counts, std::int64_t part) {
+    Once add(connection,
+             "INSERT INTO run (ended, status, nvalues, nkeys, nservices, outside, parent, undoes, begun, user, host,"
+             " program, arguments, firstpart) VALUES (?1, iif(?1, 0, NULL), ?, ?, ?, ?, ?, ?, ?, ?, ?, ?, ?, ?)");
+    const std::string outside = joinTexts(outside_);
     const std::string user = std::to_string(geteuid());
     const std::string host = hostName();
     const std::string arguments = joinTexts(start_.arguments);
     const int result = add.query()
+                           .bind(ended())
+                           .bind(static_cast<std::int64_t>(counts.values))
+                           .bind(static_cast<std::int64_t>(counts.keys))
+                           .bind(static_cast<std::int64_t>(counts.services))
+                           .bind(std::string_view(outside))
                            .bind(static_cast<std::int64_t>(parentOf(connection)))
                            .bind(static_cast<std::int64_t>(start_.undoes))
                            .bind(begun_)
@@ -178,6 +201,7 @@ int EmbeddedHistory::addRun(sqlite3* connection) {
                            .bind(std::string_view(host))
                            .bind(std::string_view(start_.program))
                            .bind(std::string_view(arguments))
+                           .bind(part)
                            .step();
     if (result != SQLITE_DONE) {
         return result;
@@ -192,16 +216,13 @@ int EmbeddedHistory::addRun(sqlite3* connection) {
     return SQLITE_OK;
 }
 
-// A run that starts no programs has one commit point, which ends it.
-int EmbeddedHistory::writeRun(sqlite3* connection, const ChangeCounts& counts, bool& isThere) {
+int EmbeddedHistory::updateRun(sqlite3* connection, const ChangeCounts& counts, bool& isThere) {
     Once update(connection,
-                start_.startsPrograms
-                    ? "UPDATE run SET nvalues = ?, nkeys = ?, nservices = ?, outside = ?, ended = 0, status = NULL"
-                      " WHERE number = ?"
-                    : "UPDATE run SET nvalues = ?, nkeys = ?, nservices = ?, outside = ?, ended = unixepoch(),"
-                      " status = 0 WHERE number = ?");
+                "UPDATE run SET ended = ?1, status = iif(?1, 0, NULL), nvalues = ?, nkeys = ?, nservices = ?,"
+                " outside = ? WHERE number = ?");
     const std::string outside = joinTexts(outside_);
     const int result = update.query()
+                           .bind(ended())
                            .bind(static_cast<std::int64_t>(counts.values))
                            .bind(static_cast<std::int64_t>(counts.keys))
                            .bind(static_cast<std::int64_t>(counts.services))

@@ -25,8 +25,9 @@ public:
 
 private:
     int write(sqlite3* connection, const ChangeCounts& counts);
-    int addRun(sqlite3* connection);
-    int writeRun(sqlite3* connection, const ChangeCounts& counts, bool& isThere);
+    std::int64_t ended() const;
+    int addRun(sqlite3* connection, const ChangeCounts& counts, std::int64_t part);
+    int updateRun(sqlite3* connection, const ChangeCounts& counts, bool& isThere);
     bool isLocked(std::uint64_t number);
     std::uint64_t parentOf(sqlite3* connection);
 

@@ -316,6 +316,8 @@ StoreFault StoreFile::fill(const std::string& name, sqlite3* content) {
 }
 
 int StoreFile::connect(const std::string& name, int flags, Connection& connection) {
+    // Statistics would take a lock at each allocation. Must precede the first use of SQLite, and fails after it.
+    sqlite3_config(SQLITE_CONFIG_MEMSTATUS, 0);
     std::string path = directory_ + '/' + name;
     const char* system = nullptr;
     if (isTooLong(directory_)) {

@@ -31,43 +31,48 @@ void addValues(TouchedRows::Key& key, std::vector<KeyValue>& values) {
 }  // namespace
 
 // The name and the class as the store has them. The last name of a key that does not exist is taken as it is given.
-std::string ChangeRecorder::spell(const KeyName& name, bool exists, std::string& keyClass) {
-    if (name.path.empty()) {
-        return fullKeyName(name);
-    }
+const ChangeRecorder::Spelling& ChangeRecorder::spell(const KeyName& name, bool exists) {
     const std::string place = walkPlace(fullKeyName(name));
     // Deliberate: a key that the run deletes and creates again keeps its first spelling.
     if (const auto known = spelled_.find(place); known != spelled_.end()) {
-        keyClass = known->second.keyClass;
-        return known->second.name;
+        return known->second;
+    }
+    if (name.path.empty()) {
+        return spelled_.try_emplace(place, Spelling{fullKeyName(name), {}}).first->second;
     }
     const KeyName parent = parentOf(name);
-    const std::string last = name.path.substr(parent.path.empty() ? 0 : parent.path.size() + 1);
-    std::string ignored;
-    Spelling spelling{spell(parent, true, ignored) + '\\', {}};
-    Subkey found{last, {}};
+    const std::string above = spell(parent, true).name + '\\';
+    // All at once: a search for each of them would take quadratic time.
+    std::vector<Subkey> subkeys;
     if (exists) {
         OwnedKey key(registry_);
         Status status = registry_.openKey(parent.root, parent.path, kKeyWalk | kKeyOpenLink, key.receive());
-        status = status == kSuccess ? reader_.subkey(key.get(), last, found) : status;
+        status = status == kSuccess ? reader_.subkeysInOrder(key.get(), subkeys) : status;
         keep(isNotFound(status) ? kSuccess : status);
-        if (status != kSuccess) {
-            found = {last, {}};
-        }
     }
-    spelling.name += found.name;
-    spelling.keyClass = std::move(found.keyClass);
-    keyClass = spelling.keyClass;
-    return spelled_.emplace(place, std::move(spelling)).first->second.name;
+    for (Subkey& subkey : subkeys) {
+        const std::string full = above + subkey.name;
+        spelled_.try_emplace(walkPlace(full), Spelling{full, std::move(subkey.keyClass)});
+    }
+    const std::size_t cut = name.path.find_last_of('\\') + 1;
+    return spelled_.try_emplace(place, Spelling{above + name.path.substr(cut), {}}).first->second;
 }
 
 ChangeRecorder::Key& ChangeRecorder::note(const KeyName& name, bool exists) {
     bool isNew = false;
     Key& key = rows_.key(fullKeyName(name), isNew);
     if (isNew) {
-        key.name = spell(name, exists, key.classBefore);
-        key.classNow = key.classBefore;
         key.before = key.now = exists;
+    }
+    return key;
+}
+
+// Most keys that a run writes to stay as they are, and their names are not needed.
+ChangeRecorder::Key& ChangeRecorder::named(const KeyName& name, Key& key) {
+    if (!std::exchange(key.isNamed, true)) {
+        const Spelling& spelling = spell(name, key.before);
+        key.name = spelling.name;
+        key.classBefore = key.classNow = spelling.keyClass;
     }
     return key;
 }
@@ -117,7 +122,7 @@ Status ChangeRecorder::createKey(const KeyName& name, std::string_view keyClass,
     std::vector<Key*> keys;
     const std::vector<KeyName> missing = missingKeys(name);
     for (auto key = missing.rbegin(); key != missing.rend(); ++key) {
-        keys.push_back(&note(*key, false));
+        keys.push_back(&named(*key, false));
         rows_.create(*keys.back(), {});
     }
     rows_.create(*keys.back(), keyClass);
@@ -137,15 +142,22 @@ Status ChangeRecorder::createKey(const KeyName& name, std::string_view keyClass,
     return status;
 }
 
+Status ChangeRecorder::open(const KeyName& name, const Key& key) {
+    if (open_ && opened_ == &key) {
+        return kSuccess;
+    }
+    opened_ = &key;
+    return registry_.openKey(name.root, name.path, kKeyWalk | kKeyOpenLink, open_.receive());
+}
+
 // Notes the values of a key that exists.
 void ChangeRecorder::list(const KeyName& name, Key& key) {
     if (std::exchange(key.isListed, true)) {
         return;
     }
-    OwnedKey opened(registry_);
     std::vector<KeyValue> values;
-    Status status = registry_.openKey(name.root, name.path, kKeyWalk | kKeyOpenLink, opened.receive());
-    status = status == kSuccess ? reader_.values(opened.get(), values) : status;
+    Status status = open(name, key);
+    status = status == kSuccess ? reader_.valuesInOrder(open_.get(), values) : status;
     keep(status);
     addValues(key, values);
 }
@@ -156,9 +168,10 @@ Status ChangeRecorder::deleteKey(const KeyName& name, Call call) {
     if (!isRecorded(name) || !exists(name)) {
         return call();
     }
-    Key& key = note(name, true);
+    Key& key = named(name, true);
     if (key.before) {
         list(name, key);
+        rest();
     }
     if (journal_ != nullptr) {
         write({&key}, TouchedForm::removal);
@@ -177,12 +190,8 @@ ChangeRecorder::Row& ChangeRecorder::beforeValue(const KeyName& name, Key& key, 
     if (known != nullptr) {
         return *known;
     }
-    Status status = kSuccess;
-    if (!open_ || opened_ != &key) {
-        opened_ = &key;
-        status = registry_.openKey(name.root, name.path, kKeyQueryValue | kKeyOpenLink, open_.receive());
-    }
     std::optional<ValueState> state;
+    Status status = open(name, key);
     status = status == kSuccess ? reader_.value(open_.get(), value, state) : status;
     keep(status);
     if (state) {
@@ -202,18 +211,21 @@ Status ChangeRecorder::changeValue(Place& place, std::string_view value, std::op
     }
     Key& key = *place.key;
     Row& row = beforeValue(place.name, key, value);
+    if (row.current() == now) {
+        return call();
+    }
+    named(place.name, key);
     const bool wasTouched = row.isTouched;
-    const bool isChange = row.current() != now;
     std::optional<ValueState> previous = std::move(row.now);
     rows_.set(key, row, std::move(now));
-    if (journal_ != nullptr && isChange) {
+    if (journal_ != nullptr) {
         write(key, row);
     }
     const Status status = call();
     if (status != kSuccess) {
         row.isTouched = wasTouched;
         row.now = std::move(previous);
-        if (journal_ != nullptr && isChange) {
+        if (journal_ != nullptr) {
             write(key, row);
         }
     }
@@ -226,7 +238,7 @@ void ChangeRecorder::beforeTree(const KeyName& name) {
     if (!exists(name)) {
         missing_ = missingKeys(name);
         for (const KeyName& key : missing_) {
-            note(key, false);
+            named(key, false);
         }
         return;
     }
@@ -239,7 +251,8 @@ void ChangeRecorder::beforeTree(const KeyName& name) {
     for (KeyRecord& record : tree) {
         bool isNew = false;
         Key& key = rows_.key(record.name, isNew);
-        if (isNew) {
+        if (!std::exchange(key.isNamed, true)) {
+            key.name = record.name;
             key.classBefore = key.classNow = record.keyClass;
             key.before = key.now = true;
         }
@@ -258,11 +271,11 @@ void ChangeRecorder::expectTree(const KeyName& name, bool isDeletion, const std:
         return;
     }
     for (const KeyName& missing : missing_) {
-        Key& key = note(missing, false);
+        Key& key = named(missing, false);
         rows_.create(key, {});
         keys.insert(keys.begin(), &key);
     }
-    Key& key = note(name, true);
+    Key& key = named(name, true);
     for (const ServiceValue& value : expected) {
         rows_.set(key, key.row(value.name), ValueState{value.type, value.data});
     }
@@ -277,14 +290,14 @@ void ChangeRecorder::afterTree(const KeyName& name, bool isDeleted) {
     rows_.visitTree(fullKeyName(name), [&](Key& key) { rows_.remove(key); });
     OwnedKey opened(registry_);
     for (const KeyName& missing : std::exchange(missing_, {})) {
-        rows_.exists(note(missing, false), registry_.openKey(missing.root, missing.path, kKeyQueryValue | kKeyOpenLink,
+        rows_.exists(named(missing, false), registry_.openKey(missing.root, missing.path, kKeyQueryValue | kKeyOpenLink,
                                                              opened.receive()) == kSuccess);
     }
     if (isDeleted) {
         return;
     }
     // Its name is known: a search among all services for each of them would take quadratic time.
-    const Key& top = note(name, false);
+    const Key& top = named(name, false);
     KeyStart start{name, top.classNow};
     parseKeyName(top.name, start.name);
     Snapshot tree;
@@ -294,6 +307,7 @@ void ChangeRecorder::afterTree(const KeyName& name, bool isDeleted) {
     for (const KeyRecord& record : tree) {
         bool isNew = false;
         Key& key = rows_.key(record.name, isNew);
+        key.isNamed = true;
         key.classNow = record.keyClass;
         rows_.exists(key, true);
         for (const KeyValue& value : record.values) {
@@ -319,7 +333,7 @@ Status ChangeRecorder::changeTree(const KeyName& name, bool isDeletion, const st
     if (journal_ != nullptr) {
         std::vector<const Key*> keys;
         for (auto key = missing.rbegin(); key != missing.rend(); ++key) {
-            keys.push_back(&note(*key, false));
+            keys.push_back(&named(*key, false));
         }
         rows_.visitTree(fullKeyName(name), [&](const Key& key) { keys.push_back(&key); });
         write(keys, TouchedForm::whole);
@@ -443,7 +457,7 @@ private:
     std::unordered_map<KeyHandle, ChangeRecorder::Place> open_;
 };
 
-// A service is recorded as the key of its record, which every service manager keeps in the same place.
+// The system's service manager changes more than its operations name: the key of the service's record is compared.
 class RecordedPorts::Services final : public IServiceManager {
 public:
     Services(IServiceManager& real, ChangeRecorder& recorder) : real_(real), recorder_(recorder) {}
@@ -575,8 +589,12 @@ RecordedPorts::RecordedPorts(const Ports& real, const RecordOptions& options)
     : history_(real.history != nullptr && real.history->isOn() ? real.history : nullptr),
       recorder_(*real.registry, options, history_),
       ports_(real),
-      registry_(std::make_unique<Registry>(*real.registry, recorder_, history_, options.holdsCommits)),
-      services_(std::make_unique<Services>(*real.services, recorder_)) {
+      registry_(std::make_unique<Registry>(*real.registry, recorder_, history_, options.holdsCommits)) {
+    if (options.wholeServices) {
+        services_ = std::make_unique<ServiceRecords>(*registry_, *real.files);
+    } else {
+        services_ = std::make_unique<Services>(*real.services, recorder_);
+    }
     ports_.registry = registry_.get();
     ports_.services = services_.get();
     if (options.wholeServices || history_ != nullptr) {

@@ -14,7 +14,7 @@
 namespace kz7 {
 
 struct RecordOptions {
-    bool wholeServices = false;  // else a service is its configuration only
+    bool wholeServices = false;  // services are records of the registry; else a service is its configuration only
     bool holdsCommits = false;   // the commits of the run succeed and do nothing: the caller commits
     bool everyKey = false;       // the history gets all keys, not only those of the product
 };
@@ -63,10 +63,17 @@ public:
 private:
     using Key = TouchedRows::Key;
     using Row = TouchedRows::Row;
+    struct Spelling {
+        std::string name;  // full
+        std::string keyClass;
+    };
 
     bool isRecorded(const KeyName& name) const { return !onlyProduct_ || isProductKey(name); }
-    std::string spell(const KeyName& name, bool exists, std::string& keyClass);
+    const Spelling& spell(const KeyName& name, bool exists);
     Key& note(const KeyName& name, bool exists);
+    Key& named(const KeyName& name, Key& key);
+    Key& named(const KeyName& name, bool exists) { return named(name, note(name, exists)); }
+    Status open(const KeyName& name, const Key& key);
     bool exists(const KeyName& name);
     void list(const KeyName& name, Key& key);
     Row& beforeValue(const KeyName& name, Key& key, std::string_view value);
@@ -86,10 +93,6 @@ private:
     const Key* opened_ = nullptr;
     Status status_ = kSuccess;
     TouchedRows rows_;
-    struct Spelling {
-        std::string name;  // full
-        std::string keyClass;
-    };
     std::unordered_map<std::string, Spelling> spelled_;  // by place
     std::vector<KeyName> missing_;                       // above and with a tree that is being changed
 };
@@ -123,7 +126,7 @@ private:
     class Assemblies;
     class Programs;
     std::unique_ptr<Registry> registry_;
-    std::unique_ptr<Services> services_;
+    std::unique_ptr<IServiceManager> services_;
     std::unique_ptr<Assemblies> assemblies_;
     std::unique_ptr<Programs> programs_;
 };

@@ -72,11 +72,15 @@ Status KeyReader::valueAt(KeyHandle key, std::uint32_t index, KeyValue& found) {
 }
 
 Status KeyReader::subkeys(KeyHandle key, std::vector<Subkey>& found) {
-    const Status status = all(found, [&](std::uint32_t index, Subkey& subkey) { return subkeyAt(key, index, subkey); });
+    const Status status = subkeysInOrder(key, found);
     if (status == kSuccess) {
         sortByName(found);
     }
     return status;
+}
+
+Status KeyReader::subkeysInOrder(KeyHandle key, std::vector<Subkey>& found) {
+    return all(found, [&](std::uint32_t index, Subkey& subkey) { return subkeyAt(key, index, subkey); });
 }
 
 Status KeyReader::values(KeyHandle key, std::vector<KeyValue>& found) {

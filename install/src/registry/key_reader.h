@@ -42,6 +42,7 @@ public:
     Status values(KeyHandle key, std::vector<KeyValue>& found);
 
     // The same in registry order.
+    Status subkeysInOrder(KeyHandle key, std::vector<Subkey>& found);
     Status valuesInOrder(KeyHandle key, std::vector<KeyValue>& found);
 
     // Opens a key, not what it may link to, and reads its values and the names of its subkeys.

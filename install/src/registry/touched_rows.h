@@ -35,6 +35,7 @@ public:
         bool before = false;  // whether it exists
         bool now = false;
         bool wasRemoved = false;  // at any time: it may have been created again with another class
+        bool isNamed = false;     // as the store spells it, and with its class
         bool isListed = false;    // all values that existed before have a row
         bool isChanged = false;   // since the last part was taken
         bool isKept = false;      // in a part that was taken
