@@ -26,6 +26,15 @@ bool isWord(const std::string& text) {
 Answer listRuns(Admin& admin, std::vector<HistoryRun>& runs) {
     IHistory* const history = admin.platform().history();
     const Status status = history == nullptr ? kSuccess : history->list(runs);
+    for (HistoryRun& run : runs) {
+        HistoryChanges kept;
+        // A run that was killed before its end or a commit point has not counted its rows.
+        if (run.state != RunState::ended && run.counts.isEmpty() && history->read(run.number, kept) == kSuccess) {
+            TouchedRows rows;
+            std::all_of(kept.parts.begin(), kept.parts.end(), [&](const std::string& part) { return rows.add(part); });
+            run.counts = rows.counts();
+        }
+    }
     return status == kSuccess ? kAnswerYes : admin.storeFault("cannot read the history", status);
 }
 
@@ -89,7 +98,7 @@ Answer readRun(Admin& admin, const HistoryRun& run, ChangeSet& changes) {
 
 Answer readInverse(Admin& admin, const HistoryRun& run, ChangeSet& changes) {
     const Answer read = readRun(admin, run, changes);
-    changes = inverse(changes);
+    changes = inverse(std::move(changes));
     std::erase_if(changes, isRunState);
     return read;
 }

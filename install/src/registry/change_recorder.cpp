@@ -21,8 +21,9 @@ bool isRoot(KeyHandle key) {
 
 // The values that the run has not touched yet, as they are before it.
 void addValues(TouchedRows::Key& key, std::vector<KeyValue>& values) {
+    const bool isNew = key.rows.empty();
     for (KeyValue& value : values) {
-        if (key.find(value.name) == nullptr) {
+        if (isNew || key.find(value.name) == nullptr) {
             key.add(std::move(value));
         }
     }
@@ -69,11 +70,18 @@ ChangeRecorder::Key& ChangeRecorder::note(const KeyName& name, bool exists) {
 
 // Most keys that a run writes to stay as they are, and their names are not needed.
 ChangeRecorder::Key& ChangeRecorder::named(const KeyName& name, Key& key) {
-    if (!std::exchange(key.isNamed, true)) {
-        const Spelling& spelling = spell(name, key.before);
-        key.name = spelling.name;
-        key.classBefore = key.classNow = spelling.keyClass;
+    if (std::exchange(key.isNamed, true)) {
+        return key;
     }
+    const KeyName parent = parentOf(name);
+    if (const Key* const above = key.before ? nullptr : rows_.find(fullKeyName(parent));
+        above != nullptr && above->isNamed) {
+        key.name = above->name + name.path.substr(parent.path.size());
+        return key;
+    }
+    const Spelling& spelling = spell(name, key.before);
+    key.name = spelling.name;
+    key.classBefore = key.classNow = spelling.keyClass;
     return key;
 }
 
@@ -160,6 +168,8 @@ void ChangeRecorder::list(const KeyName& name, Key& key) {
     status = status == kSuccess ? reader_.valuesInOrder(open_.get(), values) : status;
     keep(status);
     addValues(key, values);
+    // A handle with a place in an enumeration makes each deletion slower.
+    rest();
 }
 
 template <typename Call>
@@ -171,7 +181,6 @@ Status ChangeRecorder::deleteKey(const KeyName& name, Call call) {
     Key& key = named(name, true);
     if (key.before) {
         list(name, key);
-        rest();
     }
     if (journal_ != nullptr) {
         write({&key}, TouchedForm::removal);
@@ -291,7 +300,7 @@ void ChangeRecorder::afterTree(const KeyName& name, bool isDeleted) {
     OwnedKey opened(registry_);
     for (const KeyName& missing : std::exchange(missing_, {})) {
         rows_.exists(named(missing, false), registry_.openKey(missing.root, missing.path, kKeyQueryValue | kKeyOpenLink,
-                                                             opened.receive()) == kSuccess);
+                                                              opened.receive()) == kSuccess);
     }
     if (isDeleted) {
         return;

@@ -4,6 +4,7 @@
 #include <array>
 #include <map>
 #include <set>
+#include <unordered_map>
 
 #include "install/platform/service_records.h"
 #include "install/platform/text.h"
@@ -107,25 +108,45 @@ public:
         }
         const KeyName name = nameOf(key);
         name_ = key;
+        listed_.reset();
         return registry_.openKey(name.root, name.path, kKeyWalk | kKeyOpenLink, key_.receive());
     }
 
+    // Reads all values at once: faster where each of them will be asked for.
+    Status list() {
+        if (listed_) {
+            return kSuccess;
+        }
+        std::vector<KeyValue> values;
+        const Status status = reader_.valuesInOrder(key_.get(), values);
+        if (status == kSuccess) {
+            listed_.emplace();
+            for (KeyValue& value : values) {
+                listed_->try_emplace(foldUpper(value.name), ValueState{value.type, std::move(value.data)});
+            }
+        }
+        return status;
+    }
+
     Status value(std::string_view name, std::optional<ValueState>& state) {
-        return reader_.value(key_.get(), name, state);
+        if (!listed_) {
+            return reader_.value(key_.get(), name, state);
+        }
+        const auto found = listed_->find(foldUpper(name));
+        state = found == listed_->end() ? std::nullopt : std::optional(found->second);
+        return kSuccess;
     }
 
     // Whether the open key has exactly that many values and subkeys.
     Status has(std::size_t values, std::size_t subkeys, bool& exactly) {
-        std::vector<KeyValue> allValues;
-        std::vector<Subkey> allSubkeys;
-        Status status = reader_.values(key_.get(), allValues);
-        if (status == kSuccess) {
-            status = reader_.subkeys(key_.get(), allSubkeys);
-        }
-        std::erase_if(allValues, [&](const KeyValue& value) {
-            return isRunState({Change::Kind::value, name_, {}, value.name, {}, {}});
-        });
-        exactly = allValues.size() == values && allSubkeys.size() == subkeys;
+        std::vector<Subkey> found;
+        Status status = list();
+        status = status == kSuccess ? reader_.subkeysInOrder(key_.get(), found) : status;
+        const auto isCounted = [&](const auto& value) {
+            return !isRunState({Change::Kind::value, name_, {}, value.first, {}, {}});
+        };
+        exactly = status == kSuccess && found.size() == subkeys &&
+                  static_cast<std::size_t>(std::count_if(listed_->begin(), listed_->end(), isCounted)) == values;
         return status;
     }
 
@@ -134,6 +155,7 @@ private:
     KeyReader reader_;
     OwnedKey key_;
     std::string name_;
+    std::optional<std::unordered_map<std::string, ValueState>> listed_;  // by folded name
 };
 
 // How many values and subkeys of each removed key are removed with it.
@@ -190,7 +212,8 @@ Status isAsBefore(RowReader& reader, const Change& change, const Contents& conte
         return kSuccess;
     }
     std::optional<ValueState> state;
-    status = reader.value(change.name, state);
+    status = removed.isRemoved ? reader.list() : kSuccess;
+    status = status == kSuccess ? reader.value(change.name, state) : status;
     if (state && !wholeServices && !serviceOf(change.key).empty()) {
         state->type = serviceType(change.name, state->type);
     }
@@ -231,6 +254,13 @@ private:
     OwnedKey key_;
     std::string name_;
 };
+
+// A removed key takes its values along, so the changes of those before it need not be made one by one.
+ChangeSet::const_iterator afterItsValues(ChangeSet::const_iterator change, ChangeSet::const_iterator end) {
+    const auto next = std::find_if(
+        change, end, [&](const Change& other) { return other.isKey() || other.after || other.key != change->key; });
+    return next != end && next->kind == Change::Kind::keyRemoved && next->key == change->key ? next : change;
+}
 
 // The values of a service's record that are its configuration, each with what stands for one that is missing.
 class ServiceValues {
@@ -369,15 +399,15 @@ ChangeSet difference(const Snapshot& before, const Snapshot& after) {
     return changes;
 }
 
-ChangeSet inverse(const ChangeSet& changes) {
-    ChangeSet inverted(changes.rbegin(), changes.rend());
-    for (Change& change : inverted) {
+ChangeSet inverse(ChangeSet changes) {
+    std::reverse(changes.begin(), changes.end());
+    for (Change& change : changes) {
         std::swap(change.before, change.after);
         if (change.isKey()) {
             change.kind = change.kind == Change::Kind::keyCreated ? Change::Kind::keyRemoved : Change::Kind::keyCreated;
         }
     }
-    return inverted;
+    return changes;
 }
 
 Status findConflicts(IRegistryStore& registry, bool wholeServices, const ChangeSet& changes,
@@ -403,6 +433,7 @@ Status applyChangeSet(IRegistryStore& registry, IServiceManager* services, const
     ChangeWriter writer(registry);
     for (auto change = changes.begin(); status == kSuccess && change != changes.end(); ++change) {
         if (services == nullptr || serviceOf(change->key).empty()) {
+            change = key == change->key ? change : afterItsValues(change, changes.end());
             key = change->key;
             status = writer.apply(*change);
         }

@@ -38,7 +38,7 @@ using Snapshot = std::vector<KeyRecord>;
 ChangeSet difference(const Snapshot& before, const Snapshot& after);
 
 // What takes the changes back.
-ChangeSet inverse(const ChangeSet& changes);
+ChangeSet inverse(ChangeSet changes);
 
 // The changes whose row is not in its state before any more. That of a removed key includes that it has no other values
 // and subkeys than those that are removed with it; the run state of a service does not count. On failure `key` names
