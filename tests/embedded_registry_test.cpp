@@ -9,6 +9,7 @@
 #include <filesystem>
 #include <utility>
 
+#include "install/platform/embedded/history.h"
 #include "install/platform/text.h"
 #include "install/src/registry/registry_access.h"
 #include "tests/support/registry_dump.h"
@@ -108,6 +109,41 @@ TEST_F(EmbeddedStore, TheLogDoesNotGrowWithoutLimit) {
         ASSERT_EQ(registry.commit(), kSuccess);
     }
     EXPECT_LT(std::filesystem::file_size(directory_.path() + "/state/registry.db-wal"), std::size_t{400} * 1024);
+}
+
+// A thousand runs, and as many of them as fit into 256 MiB.
+TEST(EmbeddedHistory, KeepsTheNewestRuns) {
+    const auto listener = [](const StoreFault& fault) { ADD_FAILURE() << fault.reason; };
+    EmbeddedRegistry registry({}, false, listener, {.inMemory = true});
+    EmbeddedHistory history(registry);
+    const auto run = [&](std::size_t bytes) {
+        history.begin({.program = "test", .arguments = {}});
+        history.append(std::string(bytes, 'x'));
+        EXPECT_EQ(history.settle({.values = 1}), kSuccess);
+        EXPECT_EQ(registry.commit(), kSuccess);
+        history.end(kSuccess);
+    };
+    const auto expectRuns = [&](std::uint64_t first, std::uint64_t last) {
+        std::vector<HistoryRun> runs;
+        HistoryChanges kept;
+        ASSERT_EQ(history.list(runs), kSuccess);
+        ASSERT_EQ(runs.size(), last - first + 1);
+        EXPECT_EQ(runs.front().number, first);
+        EXPECT_EQ(runs.back().number, last);
+        EXPECT_EQ(history.read(first - 1, kept), kSuccess);
+        EXPECT_TRUE(kept.parts.empty());
+        EXPECT_EQ(history.read(first, kept), kSuccess);
+        EXPECT_EQ(kept.parts.size(), 1U);
+    };
+    for (int each = 0; each < 1005; ++each) {
+        run(100);
+    }
+    expectRuns(6, 1005);
+    constexpr std::size_t kMiB = std::size_t{1} << 20;
+    for (const std::size_t size : {100 * kMiB, 100 * kMiB, 100 * kMiB, 56 * kMiB, 257 * kMiB}) {
+        run(size);
+    }
+    expectRuns(1007, 1009);
 }
 
 }  // namespace

@@ -423,6 +423,40 @@ TEST_F(ChangesProgram, TakeRunsBackAndDoThemAgain) {
     expect({"diff", "@3", "."}, "|kz7admin: no such run: 3 (see kz7admin history)\n|1");
     ASSERT_EQ(store_.tool({"-removeKZ7Copy", "FIRST"}).exitCode, 0);
     EXPECT_NE(told({"history", "FIRST"}).find("5    "), std::string::npos);
+
+    // What a run changed, made elsewhere.
+    const StateDirectory other;
+    const std::string reg = file("run5.reg", store_.run("kz7admin", {"history", "show", "5", "--reg"}).output);
+    ASSERT_EQ(store_.run("kz7admin", {"undo", "5"}).exitCode, 0);
+    other.copyFrom(store_);
+    ASSERT_EQ(store_.run("kz7admin", {"undo", "6"}).exitCode, 0);
+    EXPECT_EQ(other.run("kz7admin", {"import", reg}).exitCode, 0);
+    expect({"diff", ".", other.path()}, "||0");
+
+    expect({"history", "trim", "--before", "2001-01-01"}, "unchanged\n||0");
+    expect({"history", "trim", "--before", "2999-01-01T00:00:00Z"}, "removed: 4 runs\n||0");
+    expect({"history"}, "|kz7admin: no run is recorded: registry.db\n|1");
+}
+
+// Programs that a run starts see it in progress, and their own runs name it.
+TEST_F(ChangesProgram, RunsOfARunAreTakenBackOnTheirOwn) {
+    const auto state = [&] { return store_.run("kz7admin", {"export"}).output; };
+    ASSERT_EQ(store_.tool(kAddFirst).exitCode, 0);
+    const std::string first = state();
+    const std::string seen = files_.path() + "/seen";
+    const std::string child = files_.path() + "/child";
+    const std::string hook = "KZ7_SAMPLE_HOOK=" + programPath("kz7admin") + " undo 2 2>" + seen + "; [ -e " + child +
+                             " ] || " + programPath("kz7InstallReg") + " -addKZ7Copy CHILD 'C:\\child' >" + child;
+    ASSERT_EQ(store_.tool({"-v9", KZ7_SAMPLE}, {{hook}, {}}).exitCode, 0);
+    EXPECT_EQ(contents(seen), "kz7admin: run 2 is in progress\n");
+    EXPECT_NE(told({"history", "show", "3"}).find("\nstarted by run 2\n"), std::string::npos);
+    // A service that runs goes as well.
+    const std::string service = "HKEY_LOCAL_MACHINE\\SYSTEM\\CurrentControlSet\\Services\\KZ7MGMTSVC_CHILD";
+    const std::string running = "REGEDIT4\n[" + service + "]\n\"CurrentState\"=dword:4\n";
+    ASSERT_EQ(store_.run("kz7admin", {"import", file("running.reg", running)}).exitCode, 0);
+    EXPECT_EQ(store_.run("kz7admin", {"undo", "3"}).exitCode, 0);
+    EXPECT_NE(told({"undo", "2"}).find("not taken back: run 3, kz7InstallReg"), std::string::npos);
+    EXPECT_EQ(state(), first);
 }
 
 TEST_F(ChangesProgram, BadInputIsOneLineAndChangesNothing) {

@@ -104,10 +104,13 @@ TEST(StoreFaults, ReportsAStoreThatStaysLockedOrCannotBeReached) {
 
 // The keys below a service's key are deleted with it. The tree is deeper than any path and any stack.
 TEST(DeepStores, AServiceWithADeepTreeOrACycleBelowIt) {
-    constexpr const char* kBelow =
-        "INSERT INTO key (parent, fold, name, class) SELECT id, 'A', 'A', '' FROM key WHERE fold = 'KZ7MGMTSVC_FIRST';"
-        "WITH RECURSIVE n (i) AS (VALUES (1) UNION ALL SELECT i + 1 FROM n WHERE i < 20000)"
-        " INSERT INTO key (parent, fold, name, class) SELECT (SELECT max(id) FROM key) + i - 1, 'A', 'A', '' FROM n";
+    const auto deepTree = [](const std::string& fold, int depth) {
+        return "INSERT INTO key (parent, fold, name, class) SELECT max(id), 'A', 'A', '' FROM key WHERE fold = '" +
+               fold + "'; WITH RECURSIVE n (i) AS (VALUES (1) UNION ALL SELECT i + 1 FROM n WHERE i < " +
+               std::to_string(depth) +
+               ") INSERT INTO key (parent, fold, name, class) SELECT (SELECT max(id) FROM key) + i - 1, 'A', 'A', ''"
+               " FROM n";
+    };
     constexpr const char* kCycle =
         "UPDATE key SET parent = (SELECT id FROM key WHERE fold = 'KZ7MGMTSVC_FIRST') WHERE id = 1";
     const StateDirectory state;
@@ -117,9 +120,16 @@ TEST(DeepStores, AServiceWithADeepTreeOrACycleBelowIt) {
     ASSERT_EQ(state.tool({"-removeKZ7Copy", "FIRST"}).exitCode, 0);
     const std::string removed = state.dump();
     ASSERT_EQ(state.tool(kAddFirst).exitCode, 0);
-    sqlite3_close(executeSql(state.file("registry.db"), kBelow));
+    sqlite3_close(executeSql(state.file("registry.db"), deepTree("KZ7MGMTSVC_FIRST", 20000).c_str()));
     const ProgramResult deep = state.tool({"-removeKZ7Copy", "FIRST"});
     EXPECT_EQ(deep.exitCode, 0) << deep.error;
+    EXPECT_EQ(state.dump(), removed);
+
+    // The same below a key of the product, with less stack.
+    ASSERT_EQ(state.tool(kAddFirst).exitCode, 0);
+    sqlite3_close(executeSql(state.file("registry.db"), deepTree("GLOBAL_PROFILE", 2000).c_str()));
+    const std::string command = "ulimit -s 256; exec " + programPath("kz7InstallReg") + " -removeKZ7Copy FIRST";
+    EXPECT_EQ(runProgram({"/bin/bash", "-c", command}, {{"KZ7_STATE_DIR=" + state.path()}, {}}).exitCode, 0);
     EXPECT_EQ(state.dump(), removed);
 
     sqlite3_close(executeSql(cyclic.file("registry.db"), kCycle));

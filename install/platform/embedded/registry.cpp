@@ -378,10 +378,17 @@ Status EmbeddedRegistry::child(KeyId parent, std::string_view fold, KeyId& id) {
         id = known.id;
         return kSuccess;
     }
+    if (missing_.transaction == transaction_ && missing_.parent == parent && missing_.fold == fold) {
+        return kFileNotFound;
+    }
     Query find = query(Sql::findKey);
     const int result = find.bind(parent).bind(fold).step();
+    if (result == SQLITE_DONE) {
+        missing_ = {transaction_, parent, 0, std::string(fold)};
+        return kFileNotFound;
+    }
     if (result != SQLITE_ROW) {
-        return result == SQLITE_DONE ? kFileNotFound : fail(result);
+        return fail(result);
     }
     if (const Status status = checkBelow(find.number(0)); status != kSuccess) {
         return status;
@@ -399,6 +406,7 @@ Status EmbeddedRegistry::addChild(KeyId parent, std::string_view name, std::stri
     }
     id = sqlite3_last_insert_rowid(connection_.get());
     firstNew_ = firstNew_ == 0 ? id : firstNew_;
+    missing_ = {};
     remember(parent, fold, id);
     subkeyAdded(parent, fold);
     // A new key has no values yet.

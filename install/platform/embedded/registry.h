@@ -172,6 +172,7 @@ private:
     std::vector<OpenKey> open_;  // the roots first
     std::vector<std::uint32_t> free_;
     std::array<KnownSubkey, 256> known_;
+    KnownSubkey missing_;  // the one that was last looked up in vain; usually it is created next
     KeyId childless_ = 0;  // the key that was last seen to have no subkey
     std::array<KnownPath, 4> knownPaths_;
     std::size_t nextKnownPath_ = 0;

@@ -31,32 +31,54 @@ void addValues(TouchedRows::Key& key, std::vector<KeyValue>& values) {
 
 }  // namespace
 
-// The name and the class as the store has them. The last name of a key that does not exist is taken as it is given.
-const ChangeRecorder::Spelling& ChangeRecorder::spell(const KeyName& name, bool exists) {
-    const std::string place = walkPlace(fullKeyName(name));
-    // Deliberate: a key that the run deletes and creates again keeps its first spelling.
-    if (const auto known = spelled_.find(place); known != spelled_.end()) {
-        return known->second;
-    }
-    if (name.path.empty()) {
-        return spelled_.try_emplace(place, Spelling{fullKeyName(name), {}}).first->second;
-    }
-    const KeyName parent = parentOf(name);
-    const std::string above = spell(parent, true).name + '\\';
-    // All at once: a search for each of them would take quadratic time.
+// Keeps the spelling of all keys below an open one: a search for each of them would take quadratic time.
+void ChangeRecorder::spellBelow(KeyHandle key, const std::string& fullName) {
     std::vector<Subkey> subkeys;
-    if (exists) {
-        OwnedKey key(registry_);
-        Status status = registry_.openKey(parent.root, parent.path, kKeyWalk | kKeyOpenLink, key.receive());
-        status = status == kSuccess ? reader_.subkeysInOrder(key.get(), subkeys) : status;
-        keep(isNotFound(status) ? kSuccess : status);
-    }
+    const Status status = reader_.subkeysInOrder(key, subkeys);
+    keep(isNotFound(status) ? kSuccess : status);
     for (Subkey& subkey : subkeys) {
-        const std::string full = above + subkey.name;
+        const std::string full = fullName + '\\' + subkey.name;
         spelled_.try_emplace(walkPlace(full), Spelling{full, std::move(subkey.keyClass)});
     }
-    const std::size_t cut = name.path.find_last_of('\\') + 1;
-    return spelled_.try_emplace(place, Spelling{above + name.path.substr(cut), {}}).first->second;
+}
+
+// The name and the class as the store has them. The last name of a key that does not exist is taken as it is given.
+// Begins at the deepest key above that is known, and opens each key below the handle of the one above: a tree may be
+// deeper than a path is long, or than the stack.
+const ChangeRecorder::Spelling& ChangeRecorder::spell(const KeyName& name, bool exists) {
+    const std::string given = fullKeyName(name);
+    const std::string place = walkPlace(given);
+    const std::size_t root = given.size() - name.path.size() - (name.path.empty() ? 0 : 1);
+    spelled_.try_emplace(place.substr(0, root), Spelling{given.substr(0, root), {}});
+    std::size_t end = place.size();
+    // Deliberate: a key that the run deletes and creates again keeps its first spelling.
+    auto known = spelled_.find(place);
+    while (known == spelled_.end()) {
+        end = place.rfind('\0', end - 1);
+        known = spelled_.find(place.substr(0, end));
+    }
+    OwnedKey key(registry_);
+    Status status = end == place.size()
+                        ? kSuccess
+                        : registry_.openKey(name.root, name.path.substr(0, end > root ? end - root - 1 : 0),
+                                            kKeyWalk | kKeyOpenLink, key.receive());
+    while (end != place.size()) {
+        const std::size_t next = std::min(place.find('\0', end + 1), place.size());
+        const std::string above = known->second.name;
+        const std::string last = given.substr(end + 1, next - end - 1);
+        keep(isNotFound(status) ? kSuccess : status);
+        if (status == kSuccess && (exists || next != place.size())) {
+            spellBelow(key.get(), above);
+        }
+        if (status == kSuccess && next != place.size()) {
+            OwnedKey below(registry_);
+            status = registry_.openKey(key.get(), last, kKeyWalk | kKeyOpenLink, below.receive());
+            key = std::move(below);
+        }
+        known = spelled_.try_emplace(place.substr(0, next), Spelling{above + '\\' + last, {}}).first;
+        end = next;
+    }
+    return known->second;
 }
 
 ChangeRecorder::Key& ChangeRecorder::note(const KeyName& name, bool exists) {
@@ -172,20 +194,27 @@ void ChangeRecorder::list(const KeyName& name, Key& key) {
     rest();
 }
 
-template <typename Call>
-Status ChangeRecorder::deleteKey(const KeyName& name, Call call) {
+template <typename Open, typename Call>
+Status ChangeRecorder::deleteKey(const KeyName& name, Open open, Call call) {
     rest();
-    if (!isRecorded(name) || !exists(name)) {
+    if (!isRecorded(name)) {
         return call();
     }
+    Status status = open(open_);
+    if (isNotFound(status)) {
+        return call();
+    }
+    keep(status);
     Key& key = named(name, true);
+    opened_ = &key;
     if (key.before) {
         list(name, key);
     }
+    rest();
     if (journal_ != nullptr) {
         write({&key}, TouchedForm::removal);
     }
-    const Status status = call();
+    status = call();
     if (status == kSuccess) {
         rows_.remove(key);
     } else if (journal_ != nullptr) {
@@ -395,7 +424,12 @@ public:
         return real_.enumerateValue(key, index, name, type, data);
     }
     Status deleteKey(KeyHandle parent, std::string_view path, AccessMask view) override {
-        return recorder_.deleteKey(nameOf(parent, path, view), [&] { return real_.deleteKey(parent, path, view); });
+        // A path from the root would be followed through each key of a deep tree.
+        const auto open = [&](OwnedKey& key) {
+            return real_.openKey(parent, path, view | kKeyWalk | kKeyOpenLink, key.receive());
+        };
+        return recorder_.deleteKey(nameOf(parent, path, view), open,
+                                   [&] { return real_.deleteKey(parent, path, view); });
     }
     Status commit() override {
         recorder_.rest();
@@ -466,7 +500,7 @@ private:
     std::unordered_map<KeyHandle, ChangeRecorder::Place> open_;
 };
 
-// The system's service manager changes more than its operations name: the key of the service's record is compared.
+// A service is recorded as the key of its record, which every service manager keeps in the same place.
 class RecordedPorts::Services final : public IServiceManager {
 public:
     Services(IServiceManager& real, ChangeRecorder& recorder) : real_(real), recorder_(recorder) {}
@@ -598,12 +632,8 @@ RecordedPorts::RecordedPorts(const Ports& real, const RecordOptions& options)
     : history_(real.history != nullptr && real.history->isOn() ? real.history : nullptr),
       recorder_(*real.registry, options, history_),
       ports_(real),
-      registry_(std::make_unique<Registry>(*real.registry, recorder_, history_, options.holdsCommits)) {
-    if (options.wholeServices) {
-        services_ = std::make_unique<ServiceRecords>(*registry_, *real.files);
-    } else {
-        services_ = std::make_unique<Services>(*real.services, recorder_);
-    }
+      registry_(std::make_unique<Registry>(*real.registry, recorder_, history_, options.holdsCommits)),
+      services_(std::make_unique<Services>(*real.services, recorder_)) {
     ports_.registry = registry_.get();
     ports_.services = services_.get();
     if (options.wholeServices || history_ != nullptr) {

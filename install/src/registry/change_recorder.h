@@ -14,7 +14,7 @@
 namespace kz7 {
 
 struct RecordOptions {
-    bool wholeServices = false;  // services are records of the registry; else a service is its configuration only
+    bool wholeServices = false;  // else a service is its configuration only
     bool holdsCommits = false;   // the commits of the run succeed and do nothing: the caller commits
     bool everyKey = false;       // the history gets all keys, not only those of the product
 };
@@ -47,8 +47,8 @@ public:
     // Each makes a change by `call` and records it.
     template <typename Call>
     Status createKey(const KeyName& name, std::string_view keyClass, Call call);
-    template <typename Call>
-    Status deleteKey(const KeyName& name, Call call);
+    template <typename Open, typename Call>
+    Status deleteKey(const KeyName& name, Open open, Call call);
     template <typename Call>
     Status changeValue(Place& place, std::string_view value, std::optional<ValueState> now, Call call);
 
@@ -69,6 +69,7 @@ private:
     };
 
     bool isRecorded(const KeyName& name) const { return !onlyProduct_ || isProductKey(name); }
+    void spellBelow(KeyHandle key, const std::string& fullName);
     const Spelling& spell(const KeyName& name, bool exists);
     Key& note(const KeyName& name, bool exists);
     Key& named(const KeyName& name, Key& key);
@@ -126,7 +127,7 @@ private:
     class Assemblies;
     class Programs;
     std::unique_ptr<Registry> registry_;
-    std::unique_ptr<IServiceManager> services_;
+    std::unique_ptr<Services> services_;
     std::unique_ptr<Assemblies> assemblies_;
     std::unique_ptr<Programs> programs_;
 };
