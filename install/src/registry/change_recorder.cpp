@@ -64,18 +64,19 @@ const ChangeRecorder::Spelling& ChangeRecorder::spell(const KeyName& name, bool 
                                             kKeyWalk | kKeyOpenLink, key.receive());
     while (end != place.size()) {
         const std::size_t next = std::min(place.find('\0', end + 1), place.size());
-        const std::string above = known->second.name;
+        std::string full = known->second.name;
         const std::string last = given.substr(end + 1, next - end - 1);
         keep(isNotFound(status) ? kSuccess : status);
         if (status == kSuccess && (exists || next != place.size())) {
-            spellBelow(key.get(), above);
+            spellBelow(key.get(), full);
         }
         if (status == kSuccess && next != place.size()) {
             OwnedKey below(registry_);
             status = registry_.openKey(key.get(), last, kKeyWalk | kKeyOpenLink, below.receive());
             key = std::move(below);
         }
-        known = spelled_.try_emplace(place.substr(0, next), Spelling{above + '\\' + last, {}}).first;
+        full.append(1, '\\').append(last);
+        known = spelled_.try_emplace(place.substr(0, next), Spelling{std::move(full), {}}).first;
         end = next;
     }
     return known->second;

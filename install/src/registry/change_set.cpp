@@ -112,29 +112,17 @@ public:
         return registry_.openKey(name.root, name.path, kKeyWalk | kKeyOpenLink, key_.receive());
     }
 
-    // Reads all values at once: faster where each of them will be asked for.
-    Status list() {
-        if (listed_) {
-            return kSuccess;
-        }
-        std::vector<KeyValue> values;
-        const Status status = reader_.valuesInOrder(key_.get(), values);
-        if (status == kSuccess) {
-            listed_.emplace();
-            for (KeyValue& value : values) {
-                listed_->try_emplace(foldUpper(value.name), ValueState{value.type, std::move(value.data)});
-            }
-        }
-        return status;
-    }
-
-    Status value(std::string_view name, std::optional<ValueState>& state) {
-        if (!listed_) {
+    // With `all`, all values are read at once: faster where each of them will be asked for.
+    Status value(std::string_view name, bool all, std::optional<ValueState>& state) {
+        if (!all) {
             return reader_.value(key_.get(), name, state);
         }
-        const auto found = listed_->find(foldUpper(name));
-        state = found == listed_->end() ? std::nullopt : std::optional(found->second);
-        return kSuccess;
+        const Status status = list();
+        if (status == kSuccess) {
+            const auto found = listed_->find(foldUpper(name));
+            state = found == listed_->end() ? std::nullopt : std::optional(found->second);
+        }
+        return status;
     }
 
     // Whether the open key has exactly that many values and subkeys.
@@ -151,6 +139,18 @@ public:
     }
 
 private:
+    Status list() {
+        std::vector<KeyValue> values;
+        const Status status = listed_ ? kSuccess : reader_.valuesInOrder(key_.get(), values);
+        if (status == kSuccess && !listed_) {
+            listed_.emplace();
+            for (KeyValue& value : values) {
+                listed_->try_emplace(foldUpper(value.name), ValueState{value.type, std::move(value.data)});
+            }
+        }
+        return status;
+    }
+
     IRegistryStore& registry_;
     KeyReader reader_;
     OwnedKey key_;
@@ -212,8 +212,7 @@ Status isAsBefore(RowReader& reader, const Change& change, const Contents& conte
         return kSuccess;
     }
     std::optional<ValueState> state;
-    status = removed.isRemoved ? reader.list() : kSuccess;
-    status = status == kSuccess ? reader.value(change.name, state) : status;
+    status = reader.value(change.name, removed.isRemoved, state);
     if (state && !wholeServices && !serviceOf(change.key).empty()) {
         state->type = serviceType(change.name, state->type);
     }
@@ -338,7 +337,7 @@ Status readConfiguration(RowReader& reader, const std::string& key, ServiceValue
     Status status = reader.open(key);
     for (const std::string_view name : kServiceValues) {
         std::optional<ValueState> state;
-        status = status == kSuccess ? reader.value(name, state) : status;
+        status = status == kSuccess ? reader.value(name, false, state) : status;
         values.set(name, state);
     }
     return status;
