@@ -83,12 +83,12 @@ def main():
             all=dict(type='bool', default=False),
             fail=dict(type='bool', default=False)),
         supports_check_mode=True)
-    copy = [module.params['copy']] if module.params['copy'] else []
+    copy = module.params['copy']
     if module.params['repair']:
-        code, run, result = run_change(module, ['repair'] + module.params['kinds'] + copy)
+        code, run, result = run_change(module, ['repair'] + module.params['kinds'] + (['--copy', copy] if copy else []))
         texts = run['notes']
     else:
-        code, run = run_kz7admin(module, ['check'] + ['--all'] * module.params['all'] + copy)
+        code, run = run_kz7admin(module, ['check'] + ['--all'] * module.params['all'] + ([copy] if copy else []))
         result = {'changed': False, 'findings': run['findings']}
         texts = ['%(what)s: %(why)s' % finding for finding in run['findings'] if finding['mark'] == 'fault']
     result['in_order'] = code == 0
