@@ -137,6 +137,9 @@ TEST_F(AdminProgram, ReadsAStoreWhoseDirectoryItMayNotWrite) {
         // The whole store is still in its log.
         EXPECT_EQ(result.exitCode, missing == "-wal"s ? 1 : 0) << missing << result.error;
         EXPECT_EQ(result.output == whole, missing != "-wal"s) << missing;
+        for (const char* const command : {"check", "facts", "report"}) {
+            EXPECT_EQ(admin({command}, {.environment = {}, .inChild = asOther}).exitCode, 0) << command;
+        }
     }
     ASSERT_EQ(chmod(store_.file("registry.db").c_str(), 0), 0);
     EXPECT_EQ(admin({"tree"}, {.environment = {}, .inChild = asOther}).error,

@@ -260,6 +260,12 @@ TEST_F(ChangesProgram, CheckReportsRepairCorrectsAndResolveAnswers) {
     expect({"check", "NONE"}, "|kz7admin: no such copy: NONE (see kz7admin copies)\n|1");
     expect({"copies", "--default", "--columns", "name,location", "--format", "tsv", "--version", "[9.7,9.8)"},
            "FIRST\tC:\\b\n|kz7admin: store registry.db\n|0");
+    const std::string removed =
+        R"({"name":"SECOND","view":"32-bit","version":"9.7.800.0","location":"C:\\KZ7\\second"})"
+        "\n";
+    EXPECT_TRUE(
+        told({"copies", "--view", "32-bit", "--valid", "--format", "jsonl", "--columns", "location,name,view,version"})
+            .ends_with(removed + "||0"));
     expect({"copies", "--version", "[9.8"}, "|kz7admin: not a range of versions: [9.8 (write [9.7,9.8) or 9.7)\n|2");
 
     expect({"repair", "--check", "aliases"}, "would change: 8 values\n||0");
@@ -286,6 +292,25 @@ TEST_F(ChangesProgram, CheckReportsRepairCorrectsAndResolveAnswers) {
     expect({"repair", "copies", "services"}, "|kz7admin: services: both a kind of finding and a copy (see --copy)\n|2");
     expect({"repair", "copies", "--copy=services"}, "changed: 2 values, 1 key\n||0");
     expect({"check"}, "||0");
+
+    // A migration that was killed after its backup.
+    const StateDirectory half;
+    ASSERT_EQ(half.tool({"-v8", "C:\\8"}).exitCode, 0);
+    const std::string backup = file("half.reg",
+                                    "Windows Registry Editor Version 5.00\n"
+                                    "[HKLM\\SOFTWARE\\NVQ\\KZ7BackupV8\\PROFILES]\n\"v\"=\"8\"\n");
+    ASSERT_EQ(half.run("kz7admin", {"import", backup}).exitCode, 0);
+    const auto migration = [&](Arguments words) {
+        words.insert(words.begin(), {"--store", half.path(), "repair", "migration"});
+        return told(words);
+    };
+    EXPECT_TRUE(migration({}).starts_with("! not repaired: half-migration: "));
+    EXPECT_EQ(migration({"--on", KZ7_SAMPLE}), "changed: 53 values, 30 keys\n||0");
+    expect({"--store", half.path(), "check"},
+           "no-service: copy kz7build: the service KZ7MGMTSVC_kz7build does not exist; repair: kz7admin repair "
+           "services kz7build\n||1");
+    ASSERT_EQ(half.run("kz7admin", {"undo", "3"}).exitCode, 0);
+    EXPECT_EQ(migration({"--back"}), "changed: 2 values, 2 keys\n||0");
 }
 
 // One row for each error line and each status of the sources.

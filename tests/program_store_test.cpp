@@ -86,6 +86,9 @@ TEST(StoreFaults, ReportsAStoreThatStaysLockedOrCannotBeReached) {
     sqlite3* writer = executeSql(state.file("registry.db"), "BEGIN IMMEDIATE");
     const ProgramResult result = state.tool({"-removeKZ7Copy", "FIRST"});
     const ProgramResult refused = state.run("kz7admin", {"repair", "--json"});
+    for (const char* const command : {"check", "copies", "facts", "report", "repair --check"}) {
+        EXPECT_EQ(state.shell(std::string("kz7admin ") + command).exitCode, 0) << command;
+    }
     sqlite3_close(writer);
     EXPECT_EQ(refused.error, "{\"schema\":1,\"error\":\"" + state.file("registry.db") +
                                  ": stayed locked by another program for 5 seconds\",\"exitCode\":2,\"status\":170}\n");
@@ -100,6 +103,21 @@ TEST(StoreFaults, ReportsAStoreThatStaysLockedOrCannotBeReached) {
     EXPECT_NE(nowhere.exitCode, 0);
     EXPECT_NE(nowhere.error.find("kz7InstallReg: " + below + ": Not a directory\n"), std::string::npos)
         << nowhere.error;
+}
+
+TEST(StoreFaults, ADamagedStoreThatCanBeReadIsAFinding) {
+    const StateDirectory state;
+    ASSERT_EQ(state.tool(kAddFirst).exitCode, 0);
+    sqlite3_close(executeSql(state.file("registry.db"),
+                             "CREATE TABLE lost (a); INSERT INTO lost VALUES (1); PRAGMA writable_schema = ON;"
+                             "DELETE FROM sqlite_schema WHERE name = 'lost'"));
+    const ProgramResult check = state.run("kz7admin", {"check"});
+    EXPECT_EQ(check.exitCode, 1);
+    EXPECT_TRUE(check.output.starts_with("damaged-store: store " + state.file("registry.db") + ": Page ")) << check;
+    for (const char* const command : {"facts", "report"}) {
+        EXPECT_NE(state.run("kz7admin", {command}).output.find("damaged-store"), std::string::npos) << command;
+    }
+    EXPECT_EQ(state.run("kz7admin", {"repair"}), (ProgramResult{0, "unchanged\n", ""}));
 }
 
 // The keys below a service's key are deleted with it. The tree is deeper than any path and any stack.

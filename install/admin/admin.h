@@ -48,7 +48,7 @@ public:
     void beginRun(bool startsPrograms = false, std::uint64_t undoes = 0);
     void endRun(int result);
 
-    // With --json, writes what was told as one object on standard error.
+    // With --json, writes the lines for standard error as one object.
     void endErrors(int exitCode);
 
     // The properties of standard output.

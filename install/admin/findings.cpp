@@ -164,7 +164,7 @@ public:
         }
         checkMigration();
         for (const std::string& damage : machine_.damages) {
-            add({Reason::storeDamaged, {}, {}, kNative, damage});
+            add({Reason::storeDamaged, {}, machine_.store, kNative, damage});
         }
         for (const InterruptedRun& run : machine_.interruptedRuns) {
             add({Reason::runInterrupted, {}, run.number, kNative, run.command});

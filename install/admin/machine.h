@@ -84,7 +84,8 @@ struct MachineState {
     std::vector<std::string> savedProperties;            // the keys below HKEY_USERS
     bool hasBackup = false;                              // of a migration
     bool hasMarker = false;                              // of version 9, in the product's own components
-    std::vector<std::string> damages;                    // of the store, if it was examined
+    std::string store;                                   // its name, if it was examined
+    std::vector<std::string> damages;                    // of the store
     std::vector<InterruptedRun> interruptedRuns;         // those that nobody took back or repeated; the same
 
     const CopyRow* find(std::string_view name) const;

@@ -20,6 +20,7 @@ Answer openWholeMachine(Admin& admin, MachineState& machine) {
     if (const Answer read = openMachine(admin, Depth::whole, machine); read != kAnswerYes) {
         return read;
     }
+    machine.store = admin.platform().storeName();
     if (const Status status = admin.platform().examineStore(machine.damages); status != kSuccess) {
         return admin.storeFault("cannot examine store", status);
     }

@@ -396,6 +396,10 @@ int StoreFile::examine(sqlite3* connection, std::vector<std::string>& damages) {
     std::vector<std::string> lines;
     int result = queryTexts(connection, "PRAGMA integrity_check(10)", lines);
     std::erase(lines, "ok");
+    for (std::string& line : lines) {
+        constexpr std::string_view kHeading = "*** in database main ***\n";
+        line.erase(0, line.starts_with(kHeading) ? kHeading.size() : 0);
+    }
     if (result == SQLITE_OK && lines.empty()) {
         result = queryTexts(connection, kExamination, lines);
     }
