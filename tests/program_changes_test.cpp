@@ -463,14 +463,15 @@ TEST_F(ChangesProgram, TakeRunsBackAndDoThemAgain) {
     expect({"history"}, "|kz7admin: no run is recorded: registry.db\n|1");
 }
 
-// Programs that a run starts see it in progress, and their own runs name it.
+// Programs that a run starts see it in progress and cannot trim it, and their own runs name it.
 TEST_F(ChangesProgram, RunsOfARunAreTakenBackOnTheirOwn) {
     const auto state = [&] { return store_.run("kz7admin", {"export"}).output; };
     ASSERT_EQ(store_.tool(kAddFirst).exitCode, 0);
     const std::string first = state();
     const std::string seen = files_.path() + "/seen";
     const std::string child = files_.path() + "/child";
-    const std::string hook = "KZ7_SAMPLE_HOOK=" + programPath("kz7admin") + " undo 2 2>" + seen + "; [ -e " + child +
+    const std::string hook = "KZ7_SAMPLE_HOOK=" + programPath("kz7admin") + " undo 2 2>" + seen + "; " +
+                             programPath("kz7admin") + " history trim --keep 0 >" + seen + ".out; [ -e " + child +
                              " ] || " + programPath("kz7InstallReg") + " -addKZ7Copy CHILD 'C:\\child' >" + child;
     ASSERT_EQ(store_.tool({"-v9", KZ7_SAMPLE}, {{hook}, {}}).exitCode, 0);
     EXPECT_EQ(contents(seen), "kz7admin: run 2 is in progress\n");

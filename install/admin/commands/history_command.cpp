@@ -127,7 +127,8 @@ Answer showOne(Admin& admin, const HistoryOptions& options) {
 std::uint64_t firstLeft(const std::vector<HistoryRun>& runs, const HistoryOptions& options) {
     const auto first = std::find_if(runs.begin(), runs.end(), [&](const HistoryRun& run) {
         const auto left = static_cast<std::uint64_t>(&runs.back() - &run) + 1;
-        return options.before.empty() ? left <= options.keep : utcTime(run.begun) >= options.before;
+        const bool isKept = options.before.empty() ? left <= options.keep : utcTime(run.begun) >= options.before;
+        return isKept || run.state == RunState::running;  // it will add to its entry
     });
     return first == runs.end() ? runs.back().number + 1 : first->number;
 }

@@ -9,6 +9,7 @@
 #include <charconv>
 #include <cstdlib>
 #include <ctime>
+#include <functional>
 #include <utility>
 
 namespace kz7 {
@@ -85,17 +86,26 @@ HistoryRun runOf(const Query& row) {
     return run;
 }
 
-// Both tables, up to the run before `number`.
-int removeBefore(sqlite3* connection, std::int64_t number) {
-    Once runs(connection, "DELETE FROM run WHERE number < ?");
-    int result = runs.query().bind(number).step();
-    if (result == SQLITE_DONE && sqlite3_changes(connection) != 0) {
-        result = execute(connection,
-                         "DELETE FROM runpart WHERE id < coalesce((SELECT firstpart FROM run ORDER BY number LIMIT 1),"
-                         " (SELECT max(id) + 1 FROM runpart))");
-        return result;
+using IsRunning = std::function<bool(std::uint64_t)>;
+
+// Both tables, up to the run before `number`. A run in progress stays, with all that are newer: it will add to its
+// entry.
+int removeBefore(sqlite3* connection, std::int64_t number, const IsRunning& isRunning) {
+    Once unended(connection, "SELECT number FROM run WHERE number < ? AND status IS NULL ORDER BY number");
+    unended.query().bind(number);
+    bool isCapped = false;
+    while (!isCapped && unended.query().step() == SQLITE_ROW) {
+        isCapped = isRunning(static_cast<std::uint64_t>(unended.query().number(0)));
+        number = isCapped ? unended.query().number(0) : number;
     }
-    return result == SQLITE_DONE ? SQLITE_OK : result;
+    Once runs(connection, "DELETE FROM run WHERE number < ?");
+    const int result = runs.query().bind(number).step();
+    if (result != SQLITE_DONE || sqlite3_changes(connection) == 0) {
+        return result == SQLITE_DONE ? SQLITE_OK : result;
+    }
+    return execute(connection,
+                   "DELETE FROM runpart WHERE id < coalesce((SELECT firstpart FROM run ORDER BY number LIMIT 1),"
+                   " (SELECT max(id) + 1 FROM runpart))");
 }
 
 // What the table of parts holds.
@@ -117,15 +127,15 @@ int readParts(sqlite3* connection, Parts& parts) {
 }
 
 // Leaves the newest runs, as many as fit.
-int removeOldest(sqlite3* connection, std::int64_t newest, const Parts& parts) {
+int removeOldest(sqlite3* connection, std::int64_t newest, const Parts& parts, const IsRunning& isRunning) {
     // Numbers ascend from 1.
-    const int result = newest > kMostRuns ? removeBefore(connection, newest - kMostRuns + 1) : SQLITE_OK;
+    const int result = newest > kMostRuns ? removeBefore(connection, newest - kMostRuns + 1, isRunning) : SQLITE_OK;
     if (result != SQLITE_OK || parts.total - parts.removed <= kMostBytes) {
         return result;
     }
     Once first(connection, "SELECT run FROM runpart WHERE total - length(changes) >= ? ORDER BY id LIMIT 1");
     return first.query().bind(parts.total - kMostBytes).step() == SQLITE_ROW
-               ? removeBefore(connection, first.query().number(0))
+               ? removeBefore(connection, first.query().number(0), isRunning)
                : SQLITE_OK;
 }
 
@@ -169,7 +179,9 @@ int EmbeddedHistory::write(sqlite3* connection, const ChangeCounts& counts) {
         Once add(connection, "INSERT INTO runpart (id, run, total, changes) VALUES (?, ?, ?, ?)");
         const auto number = static_cast<std::int64_t>(number_);
         result = add.query().bind(parts.last).bind(number).bind(parts.total).bindBytes(part_).step();
-        result = result == SQLITE_DONE ? removeOldest(connection, number, parts) : result;
+        result = result == SQLITE_DONE
+                     ? removeOldest(connection, number, parts, [this](std::uint64_t run) { return isLocked(run); })
+                     : result;
     }
     // Tables of that name that are not ours: the run is more important than its entry.
     return result == SQLITE_ERROR ? SQLITE_OK : result;
@@ -209,7 +221,8 @@ int EmbeddedHistory::addRun(sqlite3* connection, const ChangeCounts& counts, std
     number_ = static_cast<std::uint64_t>(sqlite3_last_insert_rowid(connection));
     if (start_.startsPrograms) {
         setenv(kRunVariable, std::to_string(number_).c_str(), 1);
-        locks_.receive() = open((registry_.path() + "-runs").c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0600);
+        locks_.receive() =
+            open((registry_.path() + "-runs").c_str(), O_RDWR | O_CREAT | O_NONBLOCK | O_NOFOLLOW | O_CLOEXEC, 0600);
         struct flock lock = byteOf(number_);
         fcntl(locks_.get(), F_OFD_SETLK, &lock);
     }
@@ -248,7 +261,8 @@ std::uint64_t EmbeddedHistory::parentOf(sqlite3* connection) {
 }
 
 bool EmbeddedHistory::isLocked(std::uint64_t number) {
-    const OwnedDescriptor file(open((registry_.path() + "-runs").c_str(), O_RDONLY | O_CLOEXEC));
+    const OwnedDescriptor file(
+        open((registry_.path() + "-runs").c_str(), O_RDONLY | O_NONBLOCK | O_NOFOLLOW | O_CLOEXEC));
     struct flock lock = byteOf(number);
     lock.l_type = F_WRLCK;
     return file && fcntl(file.get(), F_OFD_GETLK, &lock) == 0 && lock.l_type != F_UNLCK;
@@ -324,7 +338,9 @@ Status EmbeddedHistory::read(std::uint64_t number, HistoryChanges& changes) {
 
 Status EmbeddedHistory::trim(std::uint64_t number) {
     return registry_.use([&](sqlite3* connection) {
-        return hasTables(connection) ? removeBefore(connection, static_cast<std::int64_t>(number)) : SQLITE_OK;
+        return hasTables(connection) ? removeBefore(connection, static_cast<std::int64_t>(number),
+                                                    [this](std::uint64_t run) { return isLocked(run); })
+                                     : SQLITE_OK;
     });
 }
 
