@@ -42,7 +42,7 @@ constexpr std::array kKinds = {
     FindingKind{Reason::migrationUnfinished,"half-migration",    "migration",  Mark::fault,      true,  "SOFTWARE\\NVQ\\KZ7BackupV8", "holds a version-8 registry, but no migrated copy exists: -v9 did not end", "kz7admin repair migration --on LOCATION, or --back"},
     FindingKind{Reason::migrationIgnored,   "half-migration",    "migration",  Mark::fault,      true,  "SOFTWARE\\NVQ\\KZ7BackupV8", "is next to the marker of version 9: -v9 would not use it", "kz7admin repair migration --on LOCATION, or --back"},
     FindingKind{Reason::storeDamaged,       "damaged-store",     "",           Mark::fault,      true,  "store %s",             "%s",                                                        "bring a backup back as docs/troubleshooting.md describes"},
-    FindingKind{Reason::runInterrupted,     "interrupted-run",   "",           Mark::fault,      true,  "run %s",               "%s did not end",                                            "kz7admin undo, or the same command again"},
+    FindingKind{Reason::runInterrupted,     "interrupted-run",   "",           Mark::fault,      true,  "run %s",               "%s did not end",                                            "kz7admin undo %s, or the same command again"},
     FindingKind{Reason::versionOrder,       "text-order",        "",           Mark::note,       true,  "versions %s",          "%s is above %s, because versions are compared as texts",    "none; see docs/deliberate.md"},
     FindingKind{Reason::nameOrder,          "text-order",        "",           Mark::note,       false, "names %s",             "%s is after %s, because names are compared as texts; of equal versions the later name gets the aliases", "none; see docs/deliberate.md"},
     FindingKind{Reason::copyRemoved,        "removed-copy",      "",           Mark::deliberate, false, "copy %s (%s view)",    "was removed; 32-bit programs may still use its key",        "none; see docs/deliberate.md"},
@@ -411,7 +411,7 @@ std::string Finding::why() const {
 }
 
 std::string Finding::repair() const {
-    const std::string word = shownText(quotedWord(copy));
+    const std::string word = shownText(quotedWord(copy.empty() ? subject : copy));
     const bool isUnclear = kind().repair.starts_with("kz7admin") && (isRepairWord(copy) || copy.starts_with('-'));
     return fill(kind().repair, isUnclear ? "--copy=" + word : word, word);
 }

@@ -91,15 +91,16 @@ public:
     virtual std::unique_ptr<IAssemblyCache> assembliesOn(IRegistryStore& registry) = 0;
 
     // A consistent copy of the whole store as the content of a file; other programs may write meanwhile.
-    // kFileNotFound: no store exists. kRegistryCorrupt: it is damaged. kCallNotImplemented: the store is the registry of
-    // the machine.
+    // kFileNotFound: no store exists. kRegistryCorrupt: it is damaged. kCallNotImplemented: the store is the registry
+    // of the machine.
     virtual Status storeImage(std::string&) { return kCallNotImplemented; }
 
     // Whether the store does not exist, or was found to be damaged.
     virtual bool storeIsLost() { return false; }
 
     // Replaces the store by a new one that `fill` writes, or creates a missing one. The old file is renamed to `kept`,
-    // which is empty without one; also after a failure that comes later. kBusy: another program has the store open. Faults are reported on standard error.
+    // which is empty without one; also after a failure that comes later. kBusy: another program has the store open.
+    // Faults are reported on standard error.
     virtual Status replaceStore(const std::function<Status(IRegistryStore&)>&, std::string& /*kept*/) {
         return kCallNotImplemented;
     }

@@ -33,8 +33,8 @@ bool inheritOwner(const std::string& directory, const OwnedDescriptor& file);
 
 // Gives a store and its log another name, `registry.db.old` or the next free one; a log without a store too, which
 // would be applied to the next store. `kept` is empty if there is neither. The caller holds the lock of the directory.
-// A file smaller than kSmallestStore is in its place until another store gets it; a call after a process that was killed
-// meanwhile goes on. 0 or an error number, and then nothing has changed.
+// A file smaller than kSmallestStore is in its place until another store gets it; a call after a process that was
+// killed meanwhile goes on. 0 or an error number, and then nothing has changed.
 int setAside(const std::string& directory, std::string& kept);
 
 // Gives them their first names again.
