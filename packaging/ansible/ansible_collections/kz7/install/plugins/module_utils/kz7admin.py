@@ -27,8 +27,11 @@ def parsed(text):
     return value if isinstance(value, dict) else {}
 
 
-def run_kz7admin(module, command, data=None):
-    """Returns the exit code and the object that the command wrote; fails if it could not do its work."""
+def run_kz7admin(module, command, names=()):
+    """Returns the exit code and the object that the command wrote; fails if it could not do its work.
+
+    `names` come from the user and are no options, whatever they begin with.
+    """
     program = module.params['executable']
     if not os.access(program, os.X_OK):
         module.fail_json(msg='%s is not there: install the package kz7install, version %s or newer' % (program, NEEDED))
@@ -36,7 +39,7 @@ def run_kz7admin(module, command, data=None):
     if module.params['store']:
         words += ['--store', module.params['store']]
     for attempt in range(ATTEMPTS):
-        code, output, error = module.run_command(words + command + ['--json'], data=data)
+        code, output, error = module.run_command(words + command + ['--json', '--'] + list(names))
         result = parsed(output)
         fault = parsed(error)
         if LOCKED not in (result.get('status'), fault.get('status')):
@@ -51,10 +54,10 @@ def run_kz7admin(module, command, data=None):
     module.fail_json(msg='%s %s: %s' % (program, reason, error.strip()), rc=code)
 
 
-def run_change(module, command, data=None):
+def run_change(module, command, names=()):
     """The same for a command that changes the store. Honours check mode and diff mode; notes become warnings."""
     options = ['--check'] * module.check_mode + ['--diff'] * module._diff
-    code, run = run_kz7admin(module, command + options, data)
+    code, run = run_kz7admin(module, command + options, names)
     for note in run['notes']:
         module.warn(note)
     result = {'changed': run['changed'], 'changes': run['changes'], 'notes': run['notes'], 'status': run['status']}

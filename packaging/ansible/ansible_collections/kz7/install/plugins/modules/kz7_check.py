@@ -85,10 +85,11 @@ def main():
         supports_check_mode=True)
     copy = module.params['copy']
     if module.params['repair']:
-        code, run, result = run_change(module, ['repair'] + module.params['kinds'] + (['--copy', copy] if copy else []))
+        code, run, result = run_change(module, ['repair'] + (['--copy=' + copy] if copy else []),
+                                       names=module.params['kinds'])
         texts = run['notes']
     else:
-        code, run = run_kz7admin(module, ['check'] + ['--all'] * module.params['all'] + ([copy] if copy else []))
+        code, run = run_kz7admin(module, ['check'] + ['--all'] * module.params['all'], names=[copy] if copy else [])
         result = {'changed': False, 'findings': run['findings']}
         texts = ['%(what)s: %(why)s' % finding for finding in run['findings'] if finding['mark'] == 'fault']
     result['in_order'] = code == 0

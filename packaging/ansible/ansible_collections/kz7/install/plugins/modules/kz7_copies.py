@@ -75,6 +75,7 @@ status:
 '''
 
 import json
+import os
 
 from ansible.module_utils.basic import AnsibleModule
 from ansible_collections.kz7.install.plugins.module_utils.kz7admin import ARGUMENTS, run_change
@@ -93,11 +94,15 @@ def main():
             services=dict(type='bool', default=False)),
         supports_check_mode=True)
     wanted = [{field: value for field, value in copy.items() if value is not None} for copy in module.params['copies']]
-    command = ['ensure', '--from', '-']
+    # Not on standard input, which an older kz7admin does not read.
+    path = os.path.join(module.tmpdir, 'copies.json')
+    with open(path, 'w') as file:
+        json.dump({'copies': wanted}, file)
+    command = ['ensure', '--from', path]
     for parameter, option in (('prune', '--prune'), ('prune_all', '--all'), ('services', '--services')):
         if module.params[parameter]:
             command.append(option)
-    code, run, result = run_change(module, command, json.dumps({'copies': wanted}))
+    code, run, result = run_change(module, command)
     if code != 0:
         module.fail_json(msg='; '.join(error['text'] for error in run['errors']) or 'kz7admin ensure failed', **result)
     module.exit_json(**result)
