@@ -185,6 +185,24 @@ private:
         return record.depth <= 1 && isKey && std::all_of(record.values.begin(), record.values.end(), isRow);
     }
 
+    // Through the port; what the port cannot change goes to `changes`.
+    Status repairService(const Finding& finding, Report& report, ChangeSet& changes) {
+        if (finding.reason == Reason::serviceWithoutCopy) {
+            return deleteServiceByName(*ports_.services, finding.subject);
+        }
+        const CopyRow* const copy = machine_.find(finding.copy);
+        const std::string location = copy == nullptr ? std::string{} : copy->shown().location;
+        if (finding.reason != Reason::copyWithoutService) {
+            addServiceChange(finding, *copy, changes);
+        } else if (!location.empty()) {
+            const Status status =
+                registerManagementService(registry_, *ports_.services, report, location, finding.copy, false);
+            // No service can have the name of some copies; the finding remains.
+            return status == kInvalidName ? kSuccess : status;
+        }
+        return kSuccess;
+    }
+
     Status repairServices() {
         Status status = kSuccess;
         ChangeSet changes;
@@ -195,17 +213,7 @@ private:
                 continue;
             }
             key_ = finding->subject;
-            const CopyRow* const copy = machine_.find(finding->copy);
-            const std::string location = copy == nullptr ? std::string{} : copy->shown().location;
-            if (finding->reason == Reason::serviceWithoutCopy) {
-                status = deleteServiceByName(*ports_.services, finding->subject);
-            } else if (finding->reason != Reason::copyWithoutService) {
-                addServiceChange(*finding, *copy, changes);
-            } else if (!location.empty()) {
-                status = registerManagementService(registry_, *ports_.services, report, location, finding->copy, false);
-                // No service can have the name of some copies; the finding remains.
-                status = status == kInvalidName ? kSuccess : status;
-            }
+            status = repairService(*finding, report, changes);
         }
         return status == kSuccess
                    ? applyChangeSet(registry_, servicesAreRows_ ? nullptr : ports_.services, changes, key_)

@@ -19,12 +19,12 @@ ARGUMENTS = {
 
 
 def parsed(text):
-    """The object that a text holds, or an empty one."""
+    """The object that kz7admin wrote, or an empty one."""
     try:
         value = json.loads(text)
-    except ValueError:
+    except (ValueError, RuntimeError):
         return {}
-    return value if isinstance(value, dict) else {}
+    return value if isinstance(value, dict) and value.get('schema') == 1 else {}
 
 
 def run_kz7admin(module, command, names=()):
@@ -33,7 +33,7 @@ def run_kz7admin(module, command, names=()):
     `names` come from the user and are no options, whatever they begin with.
     """
     program = module.params['executable']
-    if not os.access(program, os.X_OK):
+    if not os.path.isfile(program) or not os.access(program, os.X_OK):
         module.fail_json(msg='%s is not there: install the package kz7install, version %s or newer' % (program, NEEDED))
     words = [program, '--at-least', NEEDED]
     if module.params['store']:
@@ -44,7 +44,7 @@ def run_kz7admin(module, command, names=()):
         fault = parsed(error)
         if LOCKED not in (result.get('status'), fault.get('status')):
             break
-    if result:
+    if result and code in (0, 1):
         return code, result
     if fault:
         tries = ' (%d attempts)' % ATTEMPTS if fault.get('status') == LOCKED else ''
