@@ -1,6 +1,6 @@
 # What `cmake --install` installs, in two components: the programs, and what developers of installers need.
 install(TARGETS kz7InstallReg kz7admin RUNTIME COMPONENT kz7install)
-install(DIRECTORY docs/ DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT kz7install
+install(DIRECTORY docs DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT kz7install
   FILES_MATCHING PATTERN *.md PATTERN *.json PATTERN *.png PATTERN man EXCLUDE)
 install(FILES CHANGELOG.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT kz7install)
 
@@ -29,6 +29,9 @@ if(NOT WIN32)
     DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions COMPONENT kz7install)
   install(FILES ${PROJECT_BINARY_DIR}/completions/zsh RENAME _kz7admin
     DESTINATION ${CMAKE_INSTALL_DATADIR}/zsh/vendor-completions COMPONENT kz7install)
+  install(DIRECTORY packaging/ansible/ansible_collections DESTINATION ${CMAKE_INSTALL_DATADIR}/ansible/collections
+    COMPONENT kz7install PATTERN __pycache__ EXCLUDE)
+  install(DIRECTORY examples/fleet DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples COMPONENT kz7install USE_SOURCE_PERMISSIONS)
   install(PROGRAMS packaging/systemd/log_check DESTINATION ${CMAKE_INSTALL_LIBEXECDIR}/kz7install COMPONENT kz7install)
   install(FILES packaging/systemd/kz7-check.service packaging/systemd/kz7-check.timer
     DESTINATION lib/systemd/system COMPONENT kz7install)
@@ -40,6 +43,7 @@ if(WIN32)
 else()
   set(system_libraries "-pthread -ldl -lm")
 endif()
+file(RELATIVE_PATH includes_from_pc ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig ${CMAKE_INSTALL_FULL_INCLUDEDIR})
 configure_file(cmake/kz7.pc.in kz7.pc @ONLY)
 install(FILES ${PROJECT_BINARY_DIR}/kz7.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT kz7install-dev)
 include(packaging/cpack.cmake)

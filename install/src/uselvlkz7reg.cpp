@@ -120,6 +120,7 @@ private:
 
 std::vector<std::string_view> toolOptions() {
     std::vector<std::string_view> words;
+    words.reserve(std::size(kOptions));
     for (const OptionRow& option : kOptions) {
         words.push_back(option.word);
     }
