@@ -55,8 +55,8 @@ for shell in bash zsh; do
         zpty -w -n terminal "kz7admin $typed"$'\t\n'
         zpty -r terminal output '*<<*>>*'
         arguments=${${output##*<<}%%>>*}
-        if [[ ${arguments%/} != $expected ]]; then
-            print -r "$shell: $typed<Tab>: $arguments, expected $expected"
+        if [[ ${arguments%/} != $expected || $output == *"$shell: "* ]]; then
+            print -r "$shell: $typed<Tab>: $arguments, expected $expected: $output"
             failed=1
         fi
     done

@@ -87,7 +87,7 @@ _kz7admin() {
         _kz7admin_list "${options// /,}"
     else
         read -ra places <<<"$arguments"
-        if [[ ${places[-1]:-} == ... ]] && ((count > ${#places[@]} - 2)); then
+        if [[ $arguments == *'... ' ]] && ((count > ${#places[@]} - 2)); then
             count=$((${#places[@]} - 2))
         fi
         _kz7admin_list "${places[count]:-}"
