@@ -119,7 +119,7 @@ Answer apply(Admin& admin, const ApplyOptions& options) {
 }  // namespace
 
 void addApplyCommand(Command& program, Admin& admin) {
-    auto command = program.add("apply", "Run a command of kz7InstallReg, or show what it would do");
+    auto command = program.add("apply", "Run a kz7InstallReg command, or show what it would do");
     auto& options = command.answerWith(admin, apply);
     addChangeOptions(command, admin, options);
     command.flag("--no-level", options.noLevel, "With --check, load no level library");

@@ -232,7 +232,7 @@ void addTrim(Command& history, Admin& admin, HistoryOptions& options) {
 }  // namespace
 
 void addHistoryCommand(Command& program, Admin& admin) {
-    auto command = program.add("history", "Show the runs that changed the store, and what each changed");
+    auto command = program.add("history", "Show the recorded runs, and what each changed");
     auto& options = command.answerWith(admin, showHistory);
     command.text("NAME", options.copy, "Only the runs that changed this copy");
     command.json(admin);

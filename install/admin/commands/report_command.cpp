@@ -125,7 +125,7 @@ void addReportCommand(Command& program, Admin& admin) {
     auto& options = command.answerWith(admin, report);
     auto file = command.text("-o,--output", options.file, "The file to make; without: standard output");
     file.isFileName();
-    command.texts("--fleet", options.fleet, "Describe many machines instead, by files that facts wrote there");
+    command.texts("--fleet", options.fleet, "Describe many machines, by what facts wrote there");
     command.flag("--force", options.force, "Replace an existing file").needs(file);
     command.json(admin, "Write JSON about the file for programs").needs(file);
 }
