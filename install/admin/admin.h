@@ -89,11 +89,11 @@ public:
     // Writes a whole file that the command line names, which is `what`: under another name first, never through a link,
     // never over a file of a store. checkFile() tells beforehand whether the name can be used.
     Answer checkFile(std::string_view what, const std::string& file);
+    Answer findFile(std::string_view what, const std::string& file, std::string& path);  // the same with the path
     Answer writeFile(std::string_view what, const std::string& file, std::string_view content, bool replace);
 
 private:
     struct Showing;
-    Answer findFile(std::string_view what, const std::string& file, std::string& path);
 
     Answer selectKeys(const std::string& key, std::vector<KeyStart>& starts);
     Status showKey(const KeyRecord& record, Showing& showing);

@@ -35,6 +35,18 @@ std::string unnamedKey(IRegistryStore& registry, const std::vector<KeyChange>& c
     return part == starts.end() ? "" : fullKeyName(part->name);
 }
 
+// Why a text may not be the whole of an export, or nothing.
+std::string doubtOf(IRegistryStore& registry, const std::vector<KeyChange>& changes, bool isCutOff) {
+    if (isCutOff) {
+        return "the last line has no end: the file was cut off";
+    }
+    if (std::any_of(changes.begin(), changes.end(), removes)) {
+        return "removes keys or values, as no export does: kz7admin import takes it";
+    }
+    const std::string part = unnamedKey(registry, changes);
+    return part.empty() ? part : "only a part of " + part + ": kz7admin import takes it";
+}
+
 }  // namespace
 
 Answer RegistrySource::open() {
@@ -60,7 +72,7 @@ Answer RegistrySource::open() {
         return openStore(&PlatformOptions::backup);
     }
     using namespace std::string_view_literals;
-    isCutOff_ = !file.bytes().ends_with('\n') && !file.bytes().ends_with("\n\0"sv);
+    const bool isCutOff = !file.bytes().ends_with('\n') && !file.bytes().ends_with("\n\0"sv);
     std::vector<KeyChange> changes;
     TextFault bad;
     if (!parseRegText(file.bytes(), changes, bad)) {
@@ -69,22 +81,14 @@ Answer RegistrySource::open() {
     std::uint32_t line = 0;
     const Status status = applyChanges(memory_, changes, line);
     registry_ = &memory_;
-    isChanges_ = std::any_of(changes.begin(), changes.end(), removes);
-    partOf_ = status == kSuccess ? unnamedKey(memory_, changes) : "";
+    doubt_ = status == kSuccess ? doubtOf(memory_, changes, isCutOff) : "";
     return status == kSuccess ? kAnswerYes
                               : admin_.fault(compose("cannot read: %s:%u: error %u", {file.shown(), line, status}));
 }
 
 Answer RegistrySource::examine() {
-    if (isCutOff_) {
-        return admin_.fault(shownText(place_) + ": the last line has no end: the file was cut off");
-    }
-    if (isChanges_) {
-        return admin_.fault(shownText(place_) +
-                            ": removes keys or values, as no export does: kz7admin import takes it");
-    }
-    if (!partOf_.empty()) {
-        return admin_.fault(compose("%s: only a part of %s: kz7admin import takes it", {shownText(place_), partOf_}));
+    if (!doubt_.empty()) {
+        return admin_.fault(shownText(place_) + ": " + doubt_);
     }
     std::vector<std::string> damages;
     const Status status = platform_ == nullptr ? kSuccess : platform_->examineStore(damages);

@@ -48,9 +48,7 @@ private:
     MemoryRegistry memory_;                // of a file
     IRegistryStore* registry_ = nullptr;
     bool isOwn_ = true;
-    bool isCutOff_ = false;
-    bool isChanges_ = false;
-    std::string partOf_;  // a key of the product
+    std::string doubt_;  // why a text may not be a whole export
 };
 
 }  // namespace kz7

@@ -61,11 +61,8 @@ Answer findLog(Admin& admin, const Words& words, ConfigurationRequest& request) 
     if (words.logFile.empty()) {
         status = admin.platform().ownFolder(request.logFile);
         request.logFile.append("\\").append(kLogFileName);
-    } else {
-        if (const Answer free = admin.checkFile("log", words.logFile); free != kAnswerYes) {
-            return free;
-        }
-        status = files.productPath(words.logFile, request.logFile);
+    } else if (const Answer found = admin.findFile("log", words.logFile, request.logFile); found != kAnswerYes) {
+        return found;
     }
     if (status == kSuccess && !fitsCharacters(request.logFile, kPathSize - 1)) {
         status = kFilenameExceedsRange;

@@ -11,7 +11,6 @@ namespace {
 
 struct CompletionOptions {
     std::string shell;
-    bool json = false;
     const Command* program = nullptr;
 };
 
@@ -295,10 +294,10 @@ Answer printCompletion(Admin& admin, const CompletionOptions& options) {
         appendZsh(program, "_kz7admin", program.options, script);
         script += kZshEnd;
     }
-    if (options.json) {
-        JsonWriter json;
-        json.beginObject().field("schema", std::uint64_t{1}).field("shell", options.shell);
-        script = json.field("script", script).end().take();
+    if (admin.isJson) {
+        JsonWriter json = beginDocument();
+        json.field("shell", options.shell).field("script", script);
+        return admin.writeJson(json);
     }
     return admin.write(script, Admin::Form::document);
 }
@@ -310,7 +309,7 @@ void addCompletionCommand(Command& program, Admin& admin) {
     auto& options = command.answerWith(admin, printCompletion);
     options.program = &program;
     command.text("SHELL", options.shell, "bash or zsh").isRequired().isOneOf({"bash", "zsh"});
-    command.flag("--json", options.json, "Write JSON for programs");
+    command.json(admin);
 }
 
 }  // namespace kz7

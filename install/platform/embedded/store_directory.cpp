@@ -202,12 +202,11 @@ int setAside(const std::string& directory, std::string& kept) {
     }
     if (error != 0) {
         takeBack(directory, kept);
-        kept.clear();
     }
     return error;
 }
 
-void takeBack(const std::string& directory, const std::string& kept) {
+void takeBack(const std::string& directory, std::string& kept) {
     if (kept.empty()) {
         return;
     }
@@ -219,6 +218,7 @@ void takeBack(const std::string& directory, const std::string& kept) {
     if (rename(kept.c_str(), store.c_str()) == 0) {
         unlink(kept.c_str());
     }
+    kept.clear();
 }
 
 void removeUnfinishedStores(const std::string& path) {

@@ -37,8 +37,8 @@ bool inheritOwner(const std::string& directory, const OwnedDescriptor& file);
 // killed meanwhile goes on. 0 or an error number, and then nothing has changed.
 int setAside(const std::string& directory, std::string& kept);
 
-// Gives them their first names again.
-void takeBack(const std::string& directory, const std::string& kept);
+// Gives them their first names again; `kept` is empty then.
+void takeBack(const std::string& directory, std::string& kept);
 
 // Removes what builders of a store have left in a directory. The caller holds its lock, so all of them are dead.
 void removeUnfinishedStores(const std::string& path);

@@ -292,7 +292,6 @@ StoreFault StoreFile::build(const OwnedDescriptor& folder, sqlite3* content, std
     if (renameat(folder.get(), name.c_str(), folder.get(), kStoreName) != 0) {
         const int error = errno;
         takeBack(directory_, kept);
-        kept.clear();
         return refused(kCannotOpen, path_, error);
     }
     return fsync(folder.get()) == 0 ? StoreFault{} : refused(kCannotOpen, path_, errno);
