@@ -42,6 +42,12 @@ TEST(StoreFaults, BadStoresEndWithAStatusAndOneLineThatNamesTheFile) {
              std::filesystem::remove(path);
              mkfifo(path.c_str(), 0600);
          }, kCannotOpen, "is not a regular file"},
+        {"a pipe for its journal", [](const std::string& path) { mkfifo((path + "-journal").c_str(), 0600); },
+         kCannotOpen, "-journal: is not a regular file"},
+        {"a link for its log", [](const std::string& path) {
+             std::filesystem::remove(path + "-wal");
+             std::filesystem::create_symlink("/dev/zero", path + "-wal");
+         }, kCannotOpen, "-wal: is not a regular file"},
     };
     // clang-format on
     const Arguments commands[] = {
@@ -53,11 +59,12 @@ TEST(StoreFaults, BadStoresEndWithAStatusAndOneLineThatNamesTheFile) {
         // Moves the whole store to the one file that is damaged.
         sqlite3_close(executeSql(path, "PRAGMA wal_checkpoint(TRUNCATE)"));
         row.spoil(path);
+        const std::string said = path + (row.said[0] == '-' ? "" : ": ") + row.said;
         ProgramResult result;
         for (const Arguments& command : commands) {
             result = state.tool(command);
             EXPECT_EQ(result.exitCode, hostExitCode(row.status)) << row.why << " " << command[0];
-            EXPECT_NE(result.error.find("kz7InstallReg: " + path + ": " + row.said), std::string::npos) << result.error;
+            EXPECT_NE(result.error.find("kz7InstallReg: " + said), std::string::npos) << result.error;
             EXPECT_EQ(result.error.find("kz7InstallReg: "), result.error.rfind("kz7InstallReg: ")) << result.error;
         }
         EXPECT_TRUE(result.error.ends_with(
@@ -73,7 +80,7 @@ TEST(StoreFaults, BadStoresEndWithAStatusAndOneLineThatNamesTheFile) {
                                          {"repair"},
                                          {"repair", "--check"}}) {
             const ProgramResult refused = state.run("kz7admin", command);
-            EXPECT_EQ(refused.error, "kz7admin: " + path + ": " + row.said + "\n") << row.why << command[0];
+            EXPECT_EQ(refused.error, "kz7admin: " + said + "\n") << row.why << command[0];
             EXPECT_EQ(refused.exitCode, 2) << row.why << command[0];
         }
     }

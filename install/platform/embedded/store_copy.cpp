@@ -27,7 +27,12 @@ std::array<std::int64_t, 4> stampOf(const std::string& path) {
 
 // 0 or an error number.
 int copyFile(const std::string& from, const std::string& to) {
-    const OwnedDescriptor source(open(from.c_str(), O_RDONLY | O_CLOEXEC));
+    // Does not wait for the writer of a pipe.
+    const OwnedDescriptor source(open(from.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC));
+    struct stat found {};
+    if (source && fstat(source.get(), &found) == 0 && !S_ISREG(found.st_mode)) {
+        return EINVAL;
+    }
     const OwnedDescriptor target(source ? open(to.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_NOFOLLOW | O_CLOEXEC, 0600)
                                         : -1);
     if (!target) {

@@ -85,9 +85,24 @@ bool hasLog(std::string path) {
     return access((path + "-wal").c_str(), F_OK) == 0;
 }
 
-bool isReadableFile(const std::string& path) {
+bool isRegular(const std::string& path) {
     struct stat found {};
-    return stat(path.c_str(), &found) == 0 && S_ISREG(found.st_mode) && access(path.c_str(), R_OK) == 0;
+    return stat(path.c_str(), &found) == 0 && S_ISREG(found.st_mode);
+}
+
+// One of the files that SQLite keeps next to a store, if it is there and is not a file: SQLite would wait for the
+// writer of a pipe. Empty otherwise.
+std::string irregularNeighbour(const std::string& store) {
+    std::error_code missing;
+    const std::string target = std::filesystem::canonical(store, missing).string();
+    for (const char* suffix : {"-journal", "-wal", "-shm"}) {
+        std::string neighbour = (missing ? store : target) + suffix;
+        struct stat found {};
+        if (lstat(neighbour.c_str(), &found) == 0 && !S_ISREG(found.st_mode)) {
+            return neighbour;
+        }
+    }
+    return {};
 }
 
 }  // namespace
@@ -158,7 +173,8 @@ StoreFault StoreFile::openForReading(Connection& connection) {
     fault = open(SQLITE_OPEN_READONLY, connection);
     // A log is read through a shared-memory file, which cannot always be created.
     const bool refused = fault.status == kCannotOpen || fault.status == kAccessDenied;
-    return refused && isReadableFile(path_) ? openCopy(connection) : fault;
+    const bool canCopy = isRegular(path_) && access(path_.c_str(), R_OK) == 0 && irregularNeighbour(path_).empty();
+    return refused && canCopy ? openCopy(connection) : fault;
 }
 
 StoreFault StoreFile::checkDirectory() const {
@@ -337,6 +353,9 @@ StoreFault StoreFile::open(int flags, Connection& connection) {
     struct stat found {};
     if (stat(path_.c_str(), &found) == 0 && !S_ISREG(found.st_mode)) {
         return {kCannotOpen, path_, "is not a regular file"};
+    }
+    if (const std::string neighbour = irregularNeighbour(path_); !neighbour.empty()) {
+        return {kCannotOpen, neighbour, "is not a regular file"};
     }
     // SQLite would take its pages from a log next to it.
     if (S_ISREG(found.st_mode) && found.st_size > 0 && found.st_size < kSmallestStore) {
