@@ -154,8 +154,9 @@ public:
 
     Status trim(std::uint64_t number) override {
         Status status = open(false);
-        for (const JournalFile& file : status == kSuccess ? files() : std::vector<JournalFile>{}) {
-            if (file.number < number && DeleteFileW(nameOf(file.number).c_str()) == FALSE) {
+        const std::vector<JournalFile> all = status == kSuccess ? files() : std::vector<JournalFile>{};
+        for (const JournalFile& file : all) {
+            if (file.number < number && !drop(file.number, file.number == all.back().number)) {
                 status = GetLastError() == ERROR_SHARING_VIOLATION ? status : GetLastError();
             }
         }
@@ -270,8 +271,15 @@ private:
     void remove() {
         if (file_) {
             file_.reset();
-            DeleteFileW(nameOf(run_.number).c_str());
+            drop(run_.number, true);
         }
+    }
+
+    // The newest journal stays as an empty file, which is no run, so that no later run gets its number. False:
+    // GetLastError() is the reason.
+    static bool drop(std::uint64_t number, bool isNewest) {
+        return isNewest ? openTrustedFile(nameOf(number), GENERIC_WRITE, FILE_SHARE_READ, TRUNCATE_EXISTING) != nullptr
+                        : DeleteFileW(nameOf(number).c_str()) != FALSE;
     }
 
     static void removeOldest() {
@@ -281,7 +289,7 @@ private:
         for (auto file = all.rbegin(); file != all.rend(); ++file) {
             bytes += file->size;
             if (++kept > kMostRuns || bytes > kMostBytes) {
-                DeleteFileW(nameOf(file->number).c_str());
+                drop(file->number, file == all.rbegin());
             }
         }
     }
