@@ -52,4 +52,8 @@ std::string textFromNarrow(std::string_view narrow);
 // A character that the code page lacks becomes the closest one.
 std::string narrowFromText(std::string_view text);
 
+// A value's name in the upper case in which this machine's registry compares it: Windows folds letters beyond ASCII
+// too.
+std::string foldValueName(std::string_view name);
+
 }  // namespace kz7

@@ -1,5 +1,6 @@
 // Texts are UTF-8 here, but may contain other bytes.
 #include "install/platform/encoding.h"
+#include "install/platform/text.h"
 
 namespace kz7 {
 namespace {
@@ -71,6 +72,10 @@ std::string textFromNarrow(std::string_view narrow) {
 
 std::string narrowFromText(std::string_view text) {
     return std::string(text);
+}
+
+std::string foldValueName(std::string_view name) {
+    return foldUpper(name);
 }
 
 }  // namespace kz7

@@ -7,6 +7,9 @@
 
 #include "install/platform/windows/wide_text.h"
 
+// The registry's own upper case.
+extern "C" WCHAR NTAPI RtlUpcaseUnicodeChar(WCHAR character);
+
 namespace kz7 {
 namespace {
 
@@ -104,6 +107,14 @@ std::string narrowFromText(std::string_view text) {
     }
     appendNarrow(std::u16string_view(utf16).substr(begin), narrow);
     return narrow;
+}
+
+std::string foldValueName(std::string_view name) {
+    std::u16string upper = utf16FromText(name);
+    for (char16_t& unit : upper) {
+        unit = static_cast<char16_t>(RtlUpcaseUnicodeChar(static_cast<wchar_t>(unit)));
+    }
+    return textFromUtf16(upper);
 }
 
 }  // namespace kz7

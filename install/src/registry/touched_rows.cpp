@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <set>
 
+#include "install/platform/encoding.h"
 #include "install/platform/text.h"
 
 namespace kz7 {
@@ -117,15 +118,16 @@ std::vector<std::size_t> orderOf(const TouchedRows::Key& key) {
 }  // namespace
 
 TouchedRows::Row* TouchedRows::Key::find(std::string_view value) {
-    if (rows.size() <= kFewRows) {
+    const bool isAscii = std::all_of(value.begin(), value.end(), [](char c) { return (c & 0x80) == 0; });
+    if (rows.size() <= kFewRows && isAscii) {
         const auto found =
             std::find_if(rows.begin(), rows.end(), [&](const Row& row) { return equalsIgnoreCase(row.name, value); });
         return found == rows.end() ? nullptr : &*found;
     }
     for (std::size_t place = byFold_.size(); place < rows.size(); ++place) {
-        byFold_.emplace(foldUpper(rows[place].name), place);
+        byFold_.emplace(foldValueName(rows[place].name), place);
     }
-    const auto found = byFold_.find(foldUpper(value));
+    const auto found = byFold_.find(foldValueName(value));
     return found == byFold_.end() ? nullptr : &rows[found->second];
 }
 

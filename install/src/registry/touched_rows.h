@@ -49,7 +49,8 @@ public:
         void add(KeyValue&& existing);
 
     private:
-        std::unordered_map<std::string, std::size_t> byFold_;  // only of keys with many rows; may lag behind them
+        std::unordered_map<std::string, std::size_t>
+            byFold_;  // of many rows, or for a name beyond ASCII; may lag behind
     };
 
     // The key of that full name, and whether it had no entry before.
