@@ -12,7 +12,7 @@ work=$(mktemp -d)
 trap 'rm -rf $work' EXIT
 cd $work
 export KZ7_STATE_DIR=$work/state PATH=$programs:$PATH TERM=dumb HOME=$work ZDOTDIR=$work
-for copy in FIRST 'SECOND copy'; do kz7InstallReg -addKZ7Copy $copy 'C:\KZ7'; done >/dev/null
+for copy in FIRST 'SECOND=a:b copy'; do kz7InstallReg -addKZ7Copy $copy 'C:\KZ7'; done >/dev/null
 kz7admin repair >/dev/null
 KZ7_STATE_DIR=$work/elsewhere kz7InstallReg -addKZ7Copy OTHER 'C:\KZ7' >/dev/null
 touch setup.rsp
@@ -23,11 +23,15 @@ rows=(
     'copies --fo'                         'copies|--format'
     'copies --format ts'                  'copies|--format|tsv'
     'copies F'                            'copies|FIRST'
-    'check S'                             'check|SECOND copy'
+    'check S'                             'check|SECOND=a:b copy'
+    'check SECOND=a:'                     'check|SECOND=a:b copy'
+    'check "SECOND=a:b '                  'check|SECOND=a:b copy'
     'commit --copy F'                     'commit|--copy|FIRST'
+    'repair --copy=SECOND='               'repair|--copy=SECOND=a:b copy'
     'commit --response-file se'           'commit|--response-file|setup.rsp'
     'copies --store elsew'                'copies|--store|elsewhere'
     '--store elsewhere copies '           '--store|elsewhere|copies|OTHER'
+    '--store=elsewhere copies '           '--store=elsewhere|copies|OTHER'
     'resolve 9.7.800.'                    'resolve|9.7.800.0'
     'undo 2'                              'undo|2'
     'repair orph'                         'repair|orphan-service'

@@ -57,12 +57,22 @@ _kz7admin_list() { # sources, separated by commas
 }
 
 _kz7admin() {
-    local word option='' ended='' command='' commands options values arguments index count=0 store=() items=() places
+    local word last quote='' option='' ended='' command='' commands options values arguments index
+    local line=$COMP_LINE words=() count=0 store=() items=() places
+    for word in "${COMP_WORDS[@]:0:COMP_CWORD + 1}"; do # parts of words: bash splits them at ":" and "=", too
+        if [[ ${#words[@]} == 0 || $line == [[:blank:]]* ]]; then
+            words+=("$word")
+        elif [[ ${words[-1]} == --* && $word == = ]]; then
+            words+=('')
+        else
+            words[-1]+=$word
+        fi
+        line=${line#*"$word"}
+    done
     _kz7admin_shape ''
-    for ((index = 1; index < COMP_CWORD; ++index)); do
-        word=${COMP_WORDS[index]}
+    for word in "${words[@]:1:${#words[@]} - 2}"; do
         if [[ -n $option ]]; then
-            [[ $word != = ]] || continue
+            word=${word//[\"\'\\]/}
             [[ $option != --store ]] || store=(--store "${word/#\~\//$HOME/}")
             option=
         elif [[ -z $ended && $word == -- ]]; then
@@ -76,10 +86,14 @@ _kz7admin() {
             ((++count))
         fi
     done
-    word=${COMP_WORDS[COMP_CWORD]}
+    word=${words[-1]}
+    last=${COMP_WORDS[COMP_CWORD]}
+    [[ $last != [:=@]* ]] || last=
+    if [[ $word == [\"\']* ]]; then
+        quote=${word:0:1} word=${word:1} last=${last#[\"\']}
+    fi
     COMPREPLY=()
     if [[ -n $option ]]; then
-        [[ $word != = ]] || word=
         places=${values#*" $option="}
         _kz7admin_list "${places%% *}"
     elif [[ -z $ended && $word == -* ]]; then
@@ -93,9 +107,14 @@ _kz7admin() {
         ((count > 0)) || _kz7admin_list "${commands// /,}"
     fi
     for index in "${items[@]}"; do
-        printf -v index %q "$index"
+        if [[ -z $quote ]]; then
+            printf -v index %q "$index"
+        elif [[ $index == *[\"\'\\\$\`!]* ]]; then
+            continue
+        fi
         [[ $index != "$word"* ]] || COMPREPLY+=("$index")
     done
+    COMPREPLY=("${COMPREPLY[@]#"${word%"$last"}"}") # readline replaces the last part only
 }
 
 _kz7admin_shape() { # command
@@ -112,7 +131,7 @@ constexpr std::string_view kZsh = R"sh(#compdef kz7admin
 # Completions of kz7admin, printed by `kz7admin completion zsh`.
 _kz7admin_list() { # sources, separated by commas
     local source
-    local -a found store
+    local -a found store=(${(Q)${(M)kz7_words:#--store=*}})
     local -i at=${kz7_words[(I)--store]}
     (( at == 0 )) || store=(--store ${${(Q)kz7_words[at + 1]}/#\~\//$HOME/})
     for source in ${(s:,:)1}; do
@@ -232,7 +251,7 @@ void appendZshOption(const OptionShape& option, std::string& rules) {
     const std::string sources = sourcesOf(option);
     const std::string description = zshQuoted(option.description, "[]:\\");
     for (const std::string& name : option.names) {
-        rules += compose(" \\\n        '%s[%s]", {name, description});
+        rules += compose(" \\\n        '%s%s[%s]", {name, option.takesValue ? "=" : "", description});
         rules += option.takesValue ? compose(":%s: _kz7admin_list %s'", {name.substr(2), sources}) : std::string("'");
     }
 }
