@@ -112,10 +112,11 @@ TEST_F(AdminProgram, ReportsMissingKeysAndFaults) {
         {{"rubbish"},             2, "", adminError("unexpected argument: rubbish (see --help)")},
         {{"export", "--json", "--utf16"}, 2, "", R"x({"schema":1,"error":"--utf16 excludes --json (see --help)","exitCode":2}
 )x"},
+        {{"--at-least", "1..0", "explain", "0"}, 2, "", adminError("--at-least: not a version: 1..0 (see --help)")},
         {{"tree", "--store="},    2, "", adminError("--store: 1 required TEXT missing (see --help)")},
         {{"copies", "--store", "/dev/null"},  2, "", adminError("/dev/null: Not a directory")},
         {{"aliases", "--store", "/none/such"}, 2, "", adminError("/none/such: No such file or directory")},
-        {{"import"},              2, "", adminError("FILE is required (see --help)")},
+        {{"--at-least", "1.0.0.0", "import"}, 2, "", adminError("FILE is required (see --help)")},
     };
     // clang-format on
     for (const auto& row : rows) {

@@ -247,15 +247,17 @@ TEST_F(ChangesProgram, CheckReportsRepairCorrectsAndResolveAnswers) {
     const ProgramResult fleet =
         store_.run("kz7admin", {"report", "--fleet", file("<b>.json", facts),
                                 file("one.json", std::string(facts).replace(facts.find("9.7.800.0"), 1, "\\udcff")),
-                                file("two.json", facts), file("none.json", "[")});
+                                file("two.json", facts), file("none.json", "["),
+                                file("some.json", R"({"schema":1,"copies":[{}],"findings":[],"programs":[]})")});
     for (const char* const part :
-         {"<th scope=\"row\">&lt;b&gt;</th>", "x&lt;script&gt;", "; without usable facts: 1<br>",
+         {"<th scope=\"row\">&lt;b&gt;</th>", "x&lt;script&gt;", "; without usable facts: 2<br>",
           "<th scope=\"row\">one</th><td>copy FIRST is \\udcff.7.800.0 at C:\\b, most have 9.7.800.0 at C:\\b</td>"}) {
         EXPECT_NE(fleet.output.find(part), std::string::npos) << part << fleet.output;
     }
     EXPECT_EQ(fleet.output.find("<script"), std::string::npos);
     EXPECT_EQ(fleet.error + std::to_string(fleet.exitCode),
-              "kz7admin: " + files_.path() + "/none.json: not what kz7admin facts writes\n1");
+              "kz7admin: " + files_.path() + "/none.json: not what kz7admin facts writes\nkz7admin: " + files_.path() +
+                  "/some.json: not what kz7admin facts writes\n1");
     expect({"report", "--fleet", "a/x.json", "x"}, "|kz7admin: two files for one machine: a/x.json and x\n|2");
     expect({"check", "NONE"}, "|kz7admin: no such copy: NONE (see kz7admin copies)\n|1");
     expect({"copies", "--default", "--columns", "name,location", "--format", "tsv", "--version", "[9.7,9.8)"},

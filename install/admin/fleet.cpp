@@ -46,6 +46,16 @@ std::string textOf(const json& object, const char* field) {
     return found != object.end() && found->is_string() ? found->get<std::string>() : std::string{};
 }
 
+// Whether the field is a list of objects with these texts.
+bool isListOf(const json& object, const char* field, std::initializer_list<const char*> texts) {
+    const json list = object.value(field, json());
+    return list.is_array() && std::all_of(list.begin(), list.end(), [&](const json& item) {
+               return item.is_object() && std::all_of(texts.begin(), texts.end(), [&](const char* text) {
+                          return item.value(text, json()).is_string();
+                      });
+           });
+}
+
 bool isYes(const json& object, const char* field) {
     return object.is_object() && object.value(field, json()) == true;
 }
@@ -69,7 +79,7 @@ void readCopies(const json& facts, FleetMachine& machine) {
             addTrait("default copy", name, machine);
         }
     }
-    for (const json& program : facts.value("programs", json())) {
+    for (const json& program : facts["programs"]) {
         if (textOf(program, "name") == "kz7admin") {
             addTrait("kz7admin", textOf(program, "version"), machine);
         }
@@ -79,7 +89,7 @@ void readCopies(const json& facts, FleetMachine& machine) {
 void readFindings(const json& facts, std::size_t machine, Fleet& fleet) {
     for (const json& finding : facts["findings"]) {
         const std::string mark = textOf(finding, "mark");
-        if (!finding.is_object() || mark == "deliberate" || mark == "absent") {
+        if (mark == "deliberate" || mark == "absent") {
             continue;
         }
         FleetFindings& same = fleet.findings[textOf(finding, "kind")];
@@ -101,8 +111,9 @@ FleetMachine& Fleet::add(std::string name, std::string_view facts) {
     FleetMachine& machine = machines.emplace_back();
     machine.name = std::move(name);
     const json document = json::parse(withoutLoneSurrogates(facts), nullptr, false);
-    const auto isList = [&](const char* field) { return document.contains(field) && document[field].is_array(); };
-    if (!document.is_object() || !isList("copies") || !isList("findings")) {
+    if (!document.is_object() || !isListOf(document, "copies", {"name", "view", "version", "location"}) ||
+        !isListOf(document, "findings", {"kind", "mark", "what", "why", "repair"}) ||
+        !isListOf(document, "programs", {"name", "version"})) {
         machine.fault = "not what kz7admin facts writes";
     } else if (document.value("schema", json()) != 1) {
         machine.fault = "a newer version of kz7admin wrote it";

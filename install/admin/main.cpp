@@ -22,11 +22,20 @@ constexpr const char* kFooter =
     "wrong; 3 with --detailed-exitcode: done, and something changed. front exits as\n"
     "its program does.\n";
 
+bool isVersion(const std::string& text) {
+    return !text.empty() && text.find_first_not_of("0123456789.") == std::string::npos && text.front() != '.' &&
+           text.back() != '.' && text.find("..") == std::string::npos;
+}
+
+// Without the zeros at the end: 1.0 is 1.0.0.
 std::vector<unsigned long> numbersOf(const std::string& version) {
     std::vector<unsigned long> numbers;
     std::istringstream parts(version);
     for (std::string part; std::getline(parts, part, '.');) {
         numbers.push_back(std::strtoul(part.c_str(), nullptr, 10));
+    }
+    while (!numbers.empty() && numbers.back() == 0) {
+        numbers.pop_back();
     }
     return numbers;
 }
@@ -34,7 +43,7 @@ std::vector<unsigned long> numbersOf(const std::string& version) {
 // The check of a version that the caller needs. Nothing is done by a program that is older.
 CLI::Validator notOlder() {
     return {[](const std::string& needed) {
-                if (needed.empty() || needed.find_first_not_of("0123456789.") != std::string::npos) {
+                if (!isVersion(needed)) {
                     return "not a version: " + shownText(needed);
                 }
                 const bool isOlder = numbersOf(KZ7_VERSION) < numbersOf(needed);
