@@ -30,11 +30,11 @@ if(NOT WIN32)
   install(FILES ${PROJECT_BINARY_DIR}/completions/zsh RENAME _kz7admin
     DESTINATION ${CMAKE_INSTALL_DATADIR}/zsh/vendor-completions COMPONENT kz7install)
   install(DIRECTORY packaging/ansible/ansible_collections DESTINATION ${CMAKE_INSTALL_DATADIR}/ansible/collections
-    COMPONENT kz7install PATTERN __pycache__ EXCLUDE)
+    COMPONENT kz7install PATTERN __pycache__ EXCLUDE PATTERN *.in EXCLUDE)
+  configure_file(packaging/ansible/ansible_collections/kz7/install/galaxy.yml.in galaxy.yml @ONLY)
+  install(FILES ${PROJECT_BINARY_DIR}/galaxy.yml COMPONENT kz7install
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/ansible/collections/ansible_collections/kz7/install)
   install(DIRECTORY examples/fleet DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples COMPONENT kz7install USE_SOURCE_PERMISSIONS)
-  install(PROGRAMS packaging/systemd/log_check DESTINATION ${CMAKE_INSTALL_LIBEXECDIR}/kz7install COMPONENT kz7install)
-  install(FILES packaging/systemd/kz7-check.service packaging/systemd/kz7-check.timer
-    DESTINATION lib/systemd/system COMPONENT kz7install)
 endif()
 
 if(WIN32)
