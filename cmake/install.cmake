@@ -2,6 +2,7 @@
 install(TARGETS kz7InstallReg kz7admin RUNTIME COMPONENT kz7install)
 install(DIRECTORY docs DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT kz7install
   FILES_MATCHING PATTERN *.md PATTERN *.json PATTERN *.png PATTERN man EXCLUDE)
+install(DIRECTORY examples/fleet DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples COMPONENT kz7install USE_SOURCE_PERMISSIONS)
 install(FILES CHANGELOG.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT kz7install)
 
 install(TARGETS kz7runtime EXPORT kz7Targets COMPONENT kz7install-dev FILE_SET HEADERS COMPONENT kz7install-dev)
@@ -34,7 +35,6 @@ if(NOT WIN32)
   configure_file(packaging/ansible/ansible_collections/kz7/install/galaxy.yml.in galaxy.yml @ONLY)
   install(FILES ${PROJECT_BINARY_DIR}/galaxy.yml COMPONENT kz7install
     DESTINATION ${CMAKE_INSTALL_DATADIR}/ansible/collections/ansible_collections/kz7/install)
-  install(DIRECTORY examples/fleet DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples COMPONENT kz7install USE_SOURCE_PERMISSIONS)
 endif()
 
 if(WIN32)
