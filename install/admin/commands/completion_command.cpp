@@ -60,7 +60,7 @@ _kz7admin() {
     local word last quote='' option='' ended='' command='' commands options values arguments index
     local line=$COMP_LINE words=() count=0 store=() items=() places
     for word in "${COMP_WORDS[@]:0:COMP_CWORD + 1}"; do # parts of words: bash splits them at ":" and "=", too
-        if [[ ${#words[@]} == 0 || $line == [[:blank:]]* ]]; then
+        if [[ ${#words[@]} == 0 || $line == [[:space:]]* ]]; then
             words+=("$word")
         elif [[ ${words[-1]} == --* && $word == = ]]; then
             words+=('')
