@@ -33,8 +33,8 @@ if(NOT KZ7_PROGRAMS)
 endif()
 
 if(WIN32)
-  # They need no installed runtime library.
-  target_link_options(kz7_options INTERFACE -static)
+  # They need no installed runtime library, and the time of a link is no part of its result.
+  target_link_options(kz7_options INTERFACE -static -Wl,--no-insert-timestamp)
 elseif(NOT KZ7_SANITIZERS)
   # A shared libstdc++ adds half a millisecond to every start; a fully static program could not load a level library.
   target_link_options(kz7_options INTERFACE -static-libstdc++ -static-libgcc)
