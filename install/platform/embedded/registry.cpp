@@ -15,6 +15,8 @@ constexpr std::int64_t kUsersId = 2;
 constexpr std::int64_t kNoKey = -1;  // the caller's key while it does not exist; it has no subkeys
 constexpr std::uint32_t kRoots = 3;  // the first slots of the open keys
 constexpr std::uint32_t kUserSlot = 2;
+constexpr std::size_t kFewSubkeys = 64;
+constexpr std::size_t kReadAhead = 64;  // rows of the statements that read ahead
 constexpr std::int64_t kPageSize = 4096;
 constexpr std::int64_t kLogLimit = std::int64_t{256} * 1024;  // size of the log that a run may leave to the next one
 
@@ -120,6 +122,7 @@ Status EmbeddedRegistry::begin() {
     ++transaction_;
     childless_ = 0;
     placed_ = {};
+    newKeys_ = {};
     return kSuccess;
 }
 
@@ -349,8 +352,11 @@ Status EmbeddedRegistry::lookUp(OpenKey& open) {
 
 // Deliberate: only a write creates the caller's key; a read must not change the store.
 Status EmbeddedRegistry::makeUser(OpenKey& open) {
+    if (open.id != kNoKey) {
+        return kSuccess;
+    }
     const std::string name = userName();
-    return open.id == kNoKey ? addChild(kUsersId, name, name, {}, open.id) : kSuccess;
+    return addChild(kUsersId, name, name, {}, open.id);
 }
 
 // The roots have no parent. In a damaged store where one has, walks of the tree would never end. Other cycles cannot be
@@ -381,6 +387,11 @@ Status EmbeddedRegistry::child(KeyId parent, std::string_view fold, KeyId& id) {
     if (missing_.transaction == transaction_ && missing_.parent == parent && missing_.fold == fold) {
         return kFileNotFound;
     }
+    for (const NewKey& key : newKeys_) {
+        if (key.id == parent && std::find(key.subkeys.begin(), key.subkeys.end(), fold) == key.subkeys.end()) {
+            return kFileNotFound;
+        }
+    }
     Query find = query(Sql::findKey);
     const int result = find.bind(parent).bind(fold).step();
     if (result == SQLITE_DONE) {
@@ -409,8 +420,16 @@ Status EmbeddedRegistry::addChild(KeyId parent, std::string_view name, std::stri
     missing_ = {};
     remember(parent, fold, id);
     subkeyAdded(parent, fold);
-    // A new key has no values yet.
+    // A new key has no values and no subkeys yet.
     placed_ = {Placed{id, 0}, placed_[0]};
+    for (NewKey& key : newKeys_) {
+        if (key.id == parent && key.subkeys.size() == kFewSubkeys) {
+            key.id = 0;
+        } else if (key.id == parent) {
+            key.subkeys.emplace_back(fold);
+        }
+    }
+    newKeys_[newKeys_[0].id == parent ? 1 : 0] = {id, {}};
     return kSuccess;
 }
 
@@ -457,6 +476,17 @@ void EmbeddedRegistry::subkeyDeleted(const Found& gone) {
     }
 }
 
+const EmbeddedRegistry::KnownPath* EmbeddedRegistry::knownPath(KeyId parent, std::string_view path) const {
+    const auto* const found = std::find_if(knownPaths_.begin(), knownPaths_.end(), [&](const KnownPath& known) {
+        return known.transaction == transaction_ && known.parent == parent && known.path == path;
+    });
+    return found == knownPaths_.end() || path.empty() ? nullptr : &*found;
+}
+
+void EmbeddedRegistry::rememberPath(KeyId parent, std::string_view path, KeyId id) {
+    knownPaths_[nextKnownPath_++ % knownPaths_.size()] = {transaction_, parent, id, std::string(path)};
+}
+
 Status EmbeddedRegistry::find(KeyHandle parent, std::string_view path, AccessMask access, bool create,
                               std::string_view keyClass, Found& found) {
     if (const Status status = checkKeyPath(path); status != kSuccess) {
@@ -473,6 +503,14 @@ Status EmbeddedRegistry::find(KeyHandle parent, std::string_view path, AccessMas
     const std::string plain = plainKeyPath(parent, path, access);
     std::string_view rest = plain;
     std::string_view name;
+    // A run opens many keys below the same one.
+    const std::size_t end = plain.find_last_of('\\');
+    const std::string_view above = std::string_view(plain).substr(0, end == std::string::npos ? 0 : end);
+    const KnownPath* const known = knownPath(base->id, above);
+    if (known != nullptr) {
+        found.id = known->id;
+        rest.remove_prefix(end);
+    }
     while (takeName(rest, name)) {
         found.parent = found.id;
         found.fold = foldUpper(name);
@@ -485,6 +523,9 @@ Status EmbeddedRegistry::find(KeyHandle parent, std::string_view path, AccessMas
             return status;
         }
     }
+    if (known == nullptr && !above.empty() && end + 1 != plain.size()) {
+        rememberPath(base->id, above, found.parent);
+    }
     return found.id == kNoKey ? kFileNotFound : kSuccess;
 }
 
@@ -494,13 +535,10 @@ Status EmbeddedRegistry::openKey(KeyHandle parent, std::string_view path, Access
         return status;
     }
     const KeyId below = base->id;
-    if ((access & kKeyView32) == 0) {
-        for (const KnownPath& known : knownPaths_) {
-            if (known.transaction == transaction_ && known.parent == below && known.path == path) {
-                key = giveOut(known.id, access);
-                return kSuccess;
-            }
-        }
+    const KnownPath* const known = (access & kKeyView32) == 0 ? knownPath(below, path) : nullptr;
+    if (known != nullptr) {
+        key = giveOut(known->id, access);
+        return kSuccess;
     }
     Found found;
     const Status status = find(parent, path, access, false, {}, found);
@@ -508,7 +546,7 @@ Status EmbeddedRegistry::openKey(KeyHandle parent, std::string_view path, Access
         return status;
     }
     if ((access & kKeyView32) == 0) {
-        knownPaths_[nextKnownPath_++ % knownPaths_.size()] = {transaction_, below, found.id, std::string(path)};
+        rememberPath(below, path, found.id);
     }
     key = giveOut(found.id, access);
     return kSuccess;
@@ -669,13 +707,15 @@ Status EmbeddedRegistry::enumerateKey(KeyHandle key, std::uint32_t index, Buffer
         place.next += skip;
     } else {
         std::vector<Subkey> rows;
-        if (const Status status = readAhead(*open, skip, rows); status != kSuccess) {
+        const bool isAtEnd = place.isLast && !place.ahead.empty();
+        if (const Status status = isAtEnd ? kSuccess : readAhead(*open, skip, rows); status != kSuccess) {
             return status;
         }
         if (rows.empty()) {
             childless_ = index == 0 ? open->id : childless_;
             return kNoMoreItems;
         }
+        place.isLast = rows.size() < kReadAhead;
         place.ahead = std::move(rows);
         place.next = 0;
     }
@@ -695,9 +735,12 @@ Status EmbeddedRegistry::enumerateValueName(OpenKey& open, std::uint32_t index, 
         values.next += skip;
     } else {
         std::vector<ValueName> rows;
-        if (const Status status = readAhead(open, skip, rows); status != kSuccess || rows.empty()) {
+        const bool isAtEnd = values.isLast && !values.ahead.empty();
+        if (const Status status = isAtEnd ? kSuccess : readAhead(open, skip, rows);
+            status != kSuccess || rows.empty()) {
             return status != kSuccess ? status : kNoMoreItems;
         }
+        values.isLast = rows.size() < kReadAhead;
         values.ahead = std::move(rows);
         values.next = 0;
     }
@@ -718,7 +761,7 @@ Status EmbeddedRegistry::enumerateWholeValue(OpenKey& open, std::uint32_t index,
     if (result != SQLITE_ROW) {
         return result == SQLITE_DONE ? kNoMoreItems : fail(result);
     }
-    open.values = {index, next.number(0), {}, 0};
+    open.values = {index, next.number(0), {}, 0, false};
     const Status named = giveName(next.bytes(1), name);
     const auto found = static_cast<ValueType>(next.number(2));
     const Status given = giveData(found, next.bytes(3), data);

@@ -77,6 +77,7 @@ private:
         std::string fold;           // empty: before the first
         std::vector<Subkey> ahead;  // read ahead; the item at `next` is the next one
         std::size_t next = 0;
+        bool isLast = false;  // no item follows those read ahead
     };
     struct ValueName {
         std::int64_t place = 0;
@@ -88,6 +89,7 @@ private:
         std::int64_t place = 0;
         std::vector<ValueName> ahead;  // read ahead if no data are requested; the item at `next` is the current one
         std::size_t next = 0;
+        bool isLast = false;
     };
     struct OpenKey {
         bool used = false;
@@ -118,6 +120,11 @@ private:
         KeyId key = 0;
         std::int64_t highest = 0;
     };
+    // A key that this transaction created, with all subkeys that it got, while they are few.
+    struct NewKey {
+        KeyId id = 0;
+        std::vector<std::string> subkeys;  // folded
+    };
     // The result of resolving a path.
     struct Found {
         KeyId id = 0;
@@ -144,6 +151,8 @@ private:
     Status addChild(KeyId parent, std::string_view name, std::string_view fold, std::string_view keyClass, KeyId& id);
     Status find(KeyHandle parent, std::string_view path, AccessMask access, bool create, std::string_view keyClass,
                 Found& found);
+    const KnownPath* knownPath(KeyId parent, std::string_view path) const;
+    void rememberPath(KeyId parent, std::string_view path, KeyId id);
     KnownSubkey& knownSlot(KeyId parent, std::string_view fold);
     void remember(KeyId parent, std::string_view fold, KeyId id);
     Status readAhead(const OpenKey& open, std::uint32_t skip, std::vector<Subkey>& rows);
@@ -174,9 +183,10 @@ private:
     std::array<KnownSubkey, 256> known_;
     KnownSubkey missing_;  // the one that was last looked up in vain; usually it is created next
     KeyId childless_ = 0;  // the key that was last seen to have no subkey
-    std::array<KnownPath, 4> knownPaths_;
+    std::array<KnownPath, 8> knownPaths_;
     std::size_t nextKnownPath_ = 0;
     std::array<Placed, 2> placed_;  // the last one first
+    std::array<NewKey, 2> newKeys_;
 };
 
 }  // namespace kz7
