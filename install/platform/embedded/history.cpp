@@ -17,6 +17,7 @@ namespace {
 
 constexpr const char* kRunVariable = "KZ7_RUN";  // for the programs that a run starts: its number
 constexpr std::int64_t kMostRuns = 1000;
+constexpr std::int64_t kRemovedAtOnce = 25;  // runs; the removal of each on its own would slow every run down
 constexpr std::int64_t kMostBytes = std::int64_t{256} << 20;
 
 // A statement that is used once.
@@ -110,18 +111,15 @@ int removeBefore(sqlite3* connection, std::int64_t number, const IsRunning& isRu
 
 // What the table of parts holds.
 struct Parts {
-    std::int64_t last = 0;     // its number
-    std::int64_t total = 0;    // bytes of all that were ever written
-    std::int64_t removed = 0;  // bytes of those that are not kept any more
+    std::int64_t last = 0;   // its number
+    std::int64_t total = 0;  // bytes of all that were ever written
 };
 
 int readParts(sqlite3* connection, Parts& parts) {
-    Once last(connection,
-              "SELECT id, total, (SELECT total - length(changes) FROM runpart ORDER BY id LIMIT 1) FROM runpart"
-              " ORDER BY id DESC LIMIT 1");
+    Once last(connection, "SELECT id, total FROM runpart ORDER BY id DESC LIMIT 1");
     const int result = last.query().step();
     if (result == SQLITE_ROW) {
-        parts = {last.query().number(0), last.query().number(1), last.query().number(2)};
+        parts = {last.query().number(0), last.query().number(1)};
     }
     return result == SQLITE_ROW || result == SQLITE_DONE ? SQLITE_OK : result;
 }
@@ -129,8 +127,9 @@ int readParts(sqlite3* connection, Parts& parts) {
 // Leaves the newest runs, as many as fit.
 int removeOldest(sqlite3* connection, std::int64_t newest, const Parts& parts, const IsRunning& isRunning) {
     // Numbers ascend from 1.
-    const int result = newest > kMostRuns ? removeBefore(connection, newest - kMostRuns + 1, isRunning) : SQLITE_OK;
-    if (result != SQLITE_OK || parts.total - parts.removed <= kMostBytes) {
+    const bool isFull = newest > kMostRuns && newest % kRemovedAtOnce == 0;
+    const int result = isFull ? removeBefore(connection, newest - kMostRuns + 1, isRunning) : SQLITE_OK;
+    if (result != SQLITE_OK || parts.total <= kMostBytes) {
         return result;
     }
     Once first(connection, "SELECT run FROM runpart WHERE total - length(changes) >= ? ORDER BY id LIMIT 1");
