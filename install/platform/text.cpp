@@ -101,8 +101,10 @@ std::string foldUpper(std::string_view text) {
 }
 
 bool equalsIgnoreCase(std::string_view left, std::string_view right) {
-    return left.size() == right.size() && std::equal(left.begin(), left.end(), right.begin(),
-                                                     [](char a, char b) { return foldUpper(a) == foldUpper(b); });
+    // Most texts that are compared are spelled alike.
+    return left == right ||
+           (left.size() == right.size() && std::equal(left.begin(), left.end(), right.begin(),
+                                                      [](char a, char b) { return foldUpper(a) == foldUpper(b); }));
 }
 
 void appendHex(std::uint64_t number, int digits, std::string& text) {

@@ -50,18 +50,17 @@ KeyName typedKeyName(std::string_view text) {
 }
 
 std::string fullKeyName(const KeyName& name) {
+    const auto* const root =
+        std::find_if(kRoots.begin(), kRoots.end(), [&](const Root& known) { return known.handle == name.root; });
+    const std::string_view rootName = root == kRoots.end() ? std::string_view{} : root->name;
     std::string text;
-    for (const Root& root : kRoots) {
-        if (root.handle == name.root) {
-            text = root.name;
-        }
-    }
-    return name.path.empty() ? text : text + '\\' + name.path;
+    text.reserve(rootName.size() + 1 + name.path.size());
+    return text.append(rootName).append(name.path.empty() ? "" : "\\").append(name.path);
 }
 
 std::string walkPlace(std::string_view fullName) {
-    std::string place = foldUpper(fullName);
-    std::replace(place.begin(), place.end(), '\\', '\0');
+    std::string place(fullName);
+    std::transform(place.begin(), place.end(), place.begin(), [](char c) { return c == '\\' ? '\0' : foldUpper(c); });
     return place;
 }
 
@@ -77,7 +76,7 @@ bool isProductKey(const KeyName& name) {
                (name.path.size() > key.size() && (isPrefix || name.path[common] == '\\'));
     };
     return name.root == KeyHandle::localMachine &&
-           (covers(kAssemblyRecords) || std::any_of(kProductKeys.begin(), kProductKeys.end(), covers));
+           (std::any_of(kProductKeys.begin(), kProductKeys.end(), covers) || covers(kAssemblyRecords));
 }
 
 }  // namespace kz7

@@ -8,6 +8,7 @@ namespace kz7 {
 namespace {
 
 constexpr std::size_t kRoomLimit = std::size_t{1} << 31;
+constexpr std::size_t kNameRoom = kBytesOfCharacter * std::size_t{kMaxValueName + 1};
 
 template <typename Named>
 void sortByName(std::vector<Named>& items) {
@@ -33,6 +34,8 @@ Status KeyReader::grow(std::string& room, Read read) {
         if (status != kMoreData || room.size() >= kRoomLimit) {
             return status;
         }
+        // The name may be what does not fit.
+        name_.resize(kNameRoom);
         room.resize(std::min(std::max<std::size_t>(2 * room.size(), data.size), kRoomLimit));
     }
 }
@@ -54,7 +57,7 @@ Status KeyReader::all(std::vector<Item>& found, Read read) {
 
 Status KeyReader::subkeyAt(KeyHandle key, std::uint32_t index, Subkey& found) {
     return grow(class_, [&](Buffer& keyClass) {
-        Buffer name(name_.get(), kNameRoom);
+        Buffer name(name_.data(), static_cast<std::uint32_t>(name_.size()));
         const Status status = registry_.enumerateKey(key, index, name, &keyClass);
         found = {std::string(name.view()), std::string(keyClass.view())};
         return status;
@@ -63,7 +66,7 @@ Status KeyReader::subkeyAt(KeyHandle key, std::uint32_t index, Subkey& found) {
 
 Status KeyReader::valueAt(KeyHandle key, std::uint32_t index, KeyValue& found) {
     return grow(data_, [&](Buffer& data) {
-        Buffer name(name_.get(), kNameRoom);
+        Buffer name(name_.data(), static_cast<std::uint32_t>(name_.size()));
         ValueType type{};
         const Status status = registry_.enumerateValue(key, index, name, &type, &data);
         found = {std::string(name.view()), type, std::string(data.view())};

@@ -67,9 +67,7 @@ private:
     Status valueAt(KeyHandle key, std::uint32_t index, KeyValue& found);
 
     IRegistryStore& registry_;
-    // Bytes of a name in any narrow encoding; not initialized, because many readers read one value only.
-    static constexpr std::uint32_t kNameRoom = 4 * (kMaxValueName + 1);
-    std::unique_ptr<char[]> name_ = std::make_unique_for_overwrite<char[]>(kNameRoom);
+    std::string name_ = std::string(1024, '\0');
     std::string class_ = std::string(256, '\0');
     std::string data_ = std::string(4096, '\0');
 };
