@@ -25,15 +25,15 @@ std::vector<WantedCopy> copies(std::int64_t count) {
 
 // As the command does it, without the reading of its file.
 std::size_t ensure(IPlatform& platform, const std::vector<WantedCopy>& wanted) {
-    MemoryConsole console;
+    SilentConsole console;
     Ports ports = platform.ports();
     ports.console = &console;
     RecordedPorts recorded(ports, {.wholeServices = true, .holdsCommits = true});
     Ensurer ensurer(recorded.ports(), true, {});
     require(ensurer.plan(wanted).empty() && ensurer.make(wanted) == kSuccess);
-    const std::size_t changes = recorded.changes().size();
+    const ChangeCounts counts = recorded.counts();
     require(recorded.commit() == kSuccess);
-    return changes;
+    return counts.values;
 }
 
 Snapshot readProduct(IRegistryStore& registry) {

@@ -14,7 +14,7 @@ std::string_view withoutLineEnd(std::string_view line) {
 
 Answer showJson(Admin& admin, const ChangeRun& run, const ChangeOptions& options) {
     JsonWriter json = beginDocument();
-    json.field("check", options.check).field("changed", !run.changes.empty()).field("status", run.status);
+    json.field("check", options.check).field("changed", !run.counts.isEmpty()).field("status", run.status);
     appendChanges(run.changes, json.field("changes"));
     if (options.diff) {
         json.field("diff", changeText(run.changes, false));
@@ -40,7 +40,7 @@ std::string runText(const ChangeRun& run, const ChangeOptions& options, bool isC
     for (const Change& change : run.conflicts) {
         text += markedLine('!', shownRow(change), isColoured);
     }
-    return text + changeSummary(run.changes, options.check ? "would change" : "changed") + '\n';
+    return text + changeSummary(run.counts, options.check ? "would change" : "changed") + '\n';
 }
 
 }  // namespace
@@ -61,8 +61,16 @@ bool ChangeRun::isFailed() const {
     return status != kSuccess || !conflicts.empty() || hasFailure(errors);
 }
 
-void takeChanges(const RecordedPorts& recorded, ChangeRun& run) {
-    run.changes = recorded.changes();
+void ChangeRun::set(ChangeSet all) {
+    counts = countChanges(all);
+    changes = std::move(all);
+}
+
+void takeChanges(const Admin& admin, const ChangeOptions& options, const RecordedPorts& recorded, ChangeRun& run) {
+    run.counts = recorded.counts();
+    if (options.diff || admin.isJson) {
+        run.changes = recorded.changes();
+    }
     if (const Status status = recorded.status(); status != kSuccess) {
         run.notes.push_back(compose("some changes are not shown: their keys could not be read: error %u", {status}));
     }
@@ -75,9 +83,10 @@ Answer makeChanges(Admin& admin, const Ports& ports, const ChangeSet& changes) {
     return status == kSuccess ? kAnswerYes : admin.storeFault("cannot change: " + shownText(key), status);
 }
 
-Answer commitRun(Admin& admin, RecordedPorts& recorded, const std::string& name, ChangeRun& run) {
-    takeChanges(recorded, run);
+Answer commitRun(Admin& admin, const ChangeOptions& options, RecordedPorts& recorded, const std::string& name,
+                 ChangeRun& run) {
     const Status status = recorded.commit();
+    takeChanges(admin, options, recorded, run);
     return status == kSuccess ? kAnswerYes : admin.storeFault("cannot save changes: " + name, status);
 }
 
@@ -95,7 +104,7 @@ void takeErrorLines(const std::string& text, ChangeRun& run) {
 }
 
 Answer showPreview(Admin& admin, const ChangeOptions& options, Preview& preview, ChangeRun& run) {
-    run.changes = preview.changes();
+    run.set(preview.changes());
     run.programs = preview.programs();
     run.output = preview.console().output;
     if (!admin.isJson) {
@@ -112,7 +121,7 @@ Answer showRun(Admin& admin, const ChangeOptions& options, const ChangeRun& run)
     if (written != kAnswerYes || run.isFailed()) {
         return written != kAnswerYes ? written : kAnswerNo;
     }
-    return options.detailedExitCode && !run.changes.empty() ? kAnswerChanged : kAnswerYes;
+    return options.detailedExitCode && !run.counts.isEmpty() ? kAnswerChanged : kAnswerYes;
 }
 
 }  // namespace kz7

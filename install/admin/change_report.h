@@ -23,7 +23,8 @@ void addChangeOptions(Command& command, Admin& admin, ChangeOptions& options, co
 // What a run did, or would do.
 struct ChangeRun {
     Status status = kSuccess;  // of the flow
-    ChangeSet changes;
+    ChangeCounts counts;
+    ChangeSet changes;                  // empty if only their number is shown
     std::string heading;                // text for people that comes first
     std::vector<std::string> programs;  // command lines, not started
     std::vector<std::string> notes;     // what stays otherwise than one may expect
@@ -33,16 +34,19 @@ struct ChangeRun {
 
     // A flow may print failures and succeed.
     bool isFailed() const;
+
+    void set(ChangeSet all);
 };
 
 // The changes that were recorded, with a note if some of the states before could not be read.
-void takeChanges(const RecordedPorts& recorded, ChangeRun& run);
+void takeChanges(const Admin& admin, const ChangeOptions& options, const RecordedPorts& recorded, ChangeRun& run);
 
 // Makes changes on the ports of a run.
 Answer makeChanges(Admin& admin, const Ports& ports, const ChangeSet& changes);
 
 // Commits a run that holds its commits, and takes its changes.
-Answer commitRun(Admin& admin, RecordedPorts& recorded, const std::string& name, ChangeRun& run);
+Answer commitRun(Admin& admin, const ChangeOptions& options, RecordedPorts& recorded, const std::string& name,
+                 ChangeRun& run);
 
 // Adds what a run that keeps no list of its error lines wrote on standard error.
 void takeErrorLines(const std::string& text, ChangeRun& run);

@@ -206,7 +206,7 @@ private:
     Status repairServices() {
         Status status = kSuccess;
         ChangeSet changes;
-        MemoryConsole lines;
+        SilentConsole lines;
         Report report(lines);
         for (auto finding = findings_.begin(); status == kSuccess && finding != findings_.end(); ++finding) {
             if (finding->kind().group != "services" || !request_.covers(*finding)) {
@@ -295,7 +295,7 @@ private:
         if (status != kSuccess || request_.isBack) {
             return status;
         }
-        MemoryConsole lines;
+        SilentConsole lines;
         Report report(lines);
         MemoryRegistry noServices;
         ServiceRecords unregistered(noServices, *ports_.files);

@@ -82,10 +82,10 @@ Answer run(Admin& admin, const ApplyOptions& options, std::span<const char* cons
     RecordedPorts recorded(ports, {.wholeServices = admin.platform().storeIsOwn()});
     ChangeRun run;
     run.status = runTool(recorded.ports(), arguments, &run.errors);
-    takeChanges(recorded, run);
+    takeChanges(admin, options, recorded, run);
     run.output = kept.output;
     shown.endLine();
-    noteServices(admin.registry(), run.changes, run);
+    noteServices(admin.registry(), recorded.changes(), run);
     admin.registry().commit();  // the end of the transaction of the notes
     tellStatus(admin, options, run);
     const Answer answer = showRun(admin, options, run);

@@ -114,7 +114,7 @@ Answer run(Admin& admin, const Words& words, ConfigurationRequest request) {
     }
     ChangeRun run;
     run.status = outcome.notSet == 0 ? kSuccess : kParameterNotSet;
-    takeChanges(recorded, run);
+    takeChanges(admin, words, recorded, run);
     run.output = kept.output;
     takeErrorLines(kept.error, run);
     run.heading = compose("%s: %u set, %u not set; the log is %s\n",

@@ -55,7 +55,7 @@ Answer diff(Admin& admin, const DiffOptions& options) {
     } else if (options.reg) {
         written = admin.write(regTextHeader() + changeRegText(changes), Admin::Form::document);
     } else {
-        written = admin.write(options.stat ? changeSummary(changes, "differ") + '\n'
+        written = admin.write(options.stat ? changeSummary(countChanges(changes), "differ") + '\n'
                                            : changeText(changes, admin.output().colours));
     }
     return written != kAnswerYes || changes.empty() ? written : kAnswerNo;

@@ -49,11 +49,11 @@ Answer ensure(Admin& admin, const EnsureOptions& options) {
             return filled;
         }
         const Answer answer = ensureOn(admin, options, wanted, preview.ports(), run);
-        run.changes = preview.changes();
+        run.set(preview.changes());
         return answer == kAnswerYes ? showRun(admin, options, run) : answer;
     }
     admin.beginRun();
-    MemoryConsole lines;
+    SilentConsole lines;
     Ports ports = admin.platform().ports();
     ports.console = &lines;
     const bool isOwn = admin.platform().storeIsOwn();
@@ -62,7 +62,7 @@ Answer ensure(Admin& admin, const EnsureOptions& options) {
         return answer;
     }
     if (!isOwn || run.status == kSuccess) {
-        if (const Answer answer = commitRun(admin, recorded, file.shown(), run); answer != kAnswerYes) {
+        if (const Answer answer = commitRun(admin, options, recorded, file.shown(), run); answer != kAnswerYes) {
             return answer;
         }
     }

@@ -97,7 +97,7 @@ std::string runText(const HistoryRun& run, const ChangeSet& changes, bool withCh
     for (const std::string& outside : run.outside) {
         text += markedLine('!', shownText(outside), isColoured);
     }
-    return text + changeSummary(changes) + '\n';
+    return text + changeSummary(countChanges(changes)) + '\n';
 }
 
 Answer showOne(Admin& admin, const HistoryOptions& options) {

@@ -33,7 +33,7 @@ Answer preview(Admin& admin, const ImportOptions& options, const InputFile& file
         return answer;
     }
     ChangeRun run;
-    run.changes = preview.changes();
+    run.set(preview.changes());
     return showRun(admin, options, run);
 }
 
@@ -60,7 +60,7 @@ Answer importFile(Admin& admin, const ImportOptions& options) {
         return answer;
     }
     ChangeRun run;
-    takeChanges(recorded, run);
+    takeChanges(admin, options, recorded, run);
     std::size_t values = 0;
     for (const KeyChange& change : changes) {
         values += change.values.size();

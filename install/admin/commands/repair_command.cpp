@@ -89,7 +89,7 @@ Answer preview(Admin& admin, const RepairOptions& options) {
     }
     ChangeRun run;
     const Answer answer = repairOn(admin, options, preview.ports(), run);
-    run.changes = preview.changes();
+    run.set(preview.changes());
     return answer == kAnswerYes ? showRun(admin, options, run) : answer;
 }
 
@@ -111,7 +111,7 @@ Answer repair(Admin& admin, RepairOptions options) {
                            {.wholeServices = admin.platform().storeIsOwn(), .holdsCommits = true});
     ChangeRun run;
     Answer answer = repairOn(admin, options, recorded.ports(), run);
-    answer = answer == kAnswerYes ? commitRun(admin, recorded, "repair", run) : answer;
+    answer = answer == kAnswerYes ? commitRun(admin, options, recorded, "repair", run) : answer;
     return answer == kAnswerYes ? showRun(admin, options, run) : answer;
 }
 

@@ -65,14 +65,14 @@ Answer restoreKeys(Admin& admin, const RestoreOptions& options, RegistrySource& 
         Preview preview(admin.platform(), false);
         answer = fillPreview(admin, preview);
         answer = answer == kAnswerYes ? makeChanges(admin, preview.ports(), changes) : answer;
-        run.changes = preview.changes();
+        run.set(preview.changes());
         return answer == kAnswerYes ? showRun(admin, options, run) : answer;
     }
     admin.beginRun();
     RecordedPorts recorded(admin.platform().ports(),
                            {.wholeServices = admin.platform().storeIsOwn(), .holdsCommits = true});
     answer = makeChanges(admin, recorded.ports(), changes);
-    answer = answer == kAnswerYes ? commitRun(admin, recorded, shownText(options.file), run) : answer;
+    answer = answer == kAnswerYes ? commitRun(admin, options, recorded, shownText(options.file), run) : answer;
     return answer == kAnswerYes ? showRun(admin, options, run) : answer;
 }
 
@@ -89,7 +89,7 @@ Answer restoreStore(Admin& admin, const RestoreOptions& options, RegistrySource&
         return read;
     }
     ChangeRun run;
-    run.changes = difference(before, wanted);
+    run.set(difference(before, wanted));
     if (run.changes.empty()) {
         return nothingToRestore(admin, options);
     }

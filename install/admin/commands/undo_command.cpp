@@ -85,6 +85,7 @@ Answer undo(Admin& admin, const UndoOptions& options) {
         admin.tell("cannot take back run " + std::to_string(run.number) + ": " + since(admin, run.number));
         return showRun(admin, options, shown);
     }
+    shown.counts = countChanges(shown.changes);
     if (!options.check) {
         answer = takeBack(admin, options, shown.changes);
     }

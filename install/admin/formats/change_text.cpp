@@ -201,8 +201,7 @@ std::string changeText(const ChangeSet& changes, bool isColoured) {
     return text + serviceText(changes, isColoured);
 }
 
-std::string changeSummary(const ChangeSet& changes, std::string_view verb) {
-    const ChangeCounts counts = countChanges(changes);
+std::string changeSummary(const ChangeCounts& counts, std::string_view verb) {
     std::string summary;
     for (const auto& [count, what] :
          {std::pair(counts.values, "value"), {counts.keys, "key"}, {counts.services, "service"}}) {

@@ -19,7 +19,7 @@ std::string shownRow(const Change& change);
 std::string markedLine(char mark, const std::string& text, bool isColoured);
 
 // "changed: 27 values, 12 keys, 1 service" or "unchanged"; `verb` stands before the colon.
-std::string changeSummary(const ChangeSet& changes, std::string_view verb = "changed");
+std::string changeSummary(const ChangeCounts& counts, std::string_view verb = "changed");
 
 // A JSON array; docs/json.md has the fields.
 void appendChanges(const ChangeSet& changes, JsonWriter& json);

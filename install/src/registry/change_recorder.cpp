@@ -10,9 +10,10 @@
 namespace kz7 {
 namespace {
 
-KeyName parentOf(const KeyName& name) {
-    const std::size_t end = name.path.find_last_of('\\');
-    return {name.root, end == std::string::npos ? std::string{} : name.path.substr(0, end)};
+// The name up to the last separator; empty without one.
+std::string_view parentOf(std::string_view name) {
+    const std::size_t end = name.rfind('\\');
+    return name.substr(0, end == std::string_view::npos ? 0 : end);
 }
 
 bool isRoot(KeyHandle key) {
@@ -96,10 +97,9 @@ ChangeRecorder::Key& ChangeRecorder::named(const KeyName& name, Key& key) {
     if (std::exchange(key.isNamed, true)) {
         return key;
     }
-    const KeyName parent = parentOf(name);
-    if (const Key* const above = key.before ? nullptr : rows_.find(fullKeyName(parent));
+    if (const Key* const above = key.before ? nullptr : rows_.find(parentOf(key.name));
         above != nullptr && above->isNamed) {
-        key.name = above->name + name.path.substr(parent.path.size());
+        key.name.replace(0, above->name.size(), above->name);
         return key;
     }
     const Spelling& spelling = spell(name, key.before);
@@ -108,12 +108,12 @@ ChangeRecorder::Key& ChangeRecorder::named(const KeyName& name, Key& key) {
     return key;
 }
 
-bool ChangeRecorder::exists(const KeyName& name) {
-    if (const Key* const known = rows_.find(fullKeyName(name)); known != nullptr) {
+bool ChangeRecorder::exists(KeyHandle root, std::string_view path, std::string_view fullName) {
+    if (const Key* const known = rows_.find(fullName); known != nullptr) {
         return known->now;
     }
     OwnedKey key(registry_);
-    const Status status = registry_.openKey(name.root, name.path, kKeyQueryValue | kKeyOpenLink, key.receive());
+    const Status status = registry_.openKey(root, path, kKeyQueryValue | kKeyOpenLink, key.receive());
     keep(isNotFound(status) ? kSuccess : status);
     return !isNotFound(status);
 }
@@ -121,8 +121,13 @@ bool ChangeRecorder::exists(const KeyName& name) {
 // The key and those above it that do not exist, the highest last.
 std::vector<KeyName> ChangeRecorder::missingKeys(const KeyName& name) {
     std::vector<KeyName> missing = {name};
-    for (KeyName key = parentOf(name); !key.path.empty() && !exists(key); key = parentOf(key)) {
-        missing.push_back(key);
+    const std::string full = fullKeyName(name);
+    std::string_view path = parentOf(name.path);
+    std::string_view fullName = parentOf(full);
+    while (!path.empty() && !exists(name.root, path, fullName)) {
+        missing.push_back({name.root, std::string(path)});
+        path = parentOf(path);
+        fullName = parentOf(fullName);
     }
     return missing;
 }
@@ -146,20 +151,20 @@ void ChangeRecorder::write(const Key& key, const Row& row) {
 }
 
 template <typename Call>
-Status ChangeRecorder::createKey(const KeyName& name, std::string_view keyClass, Call call) {
-    if (!isRecorded(name)) {
+Status ChangeRecorder::createKey(Place& place, std::string_view keyClass, Call call) {
+    if (!isRecorded(place.name)) {
         return call();
     }
     std::vector<Key*> keys;
-    const std::vector<KeyName> missing = missingKeys(name);
+    const std::vector<KeyName> missing = missingKeys(place.name);
     for (auto key = missing.rbegin(); key != missing.rend(); ++key) {
         keys.push_back(&named(*key, false));
         rows_.create(*keys.back(), {});
     }
-    rows_.create(*keys.back(), keyClass);
-    const std::vector<const Key*> created(keys.begin(), keys.end());
+    place.key = keys.back();
+    rows_.create(*place.key, keyClass);
     if (journal_ != nullptr) {
-        write(created, TouchedForm::step);
+        write({keys.begin(), keys.end()}, TouchedForm::step);
     }
     const Status status = call();
     if (status != kSuccess) {
@@ -167,7 +172,7 @@ Status ChangeRecorder::createKey(const KeyName& name, std::string_view keyClass,
             key->now = false;
         }
         if (journal_ != nullptr) {
-            write(created, TouchedForm::step);
+            write({keys.begin(), keys.end()}, TouchedForm::step);
         }
     }
     return status;
@@ -224,24 +229,32 @@ Status ChangeRecorder::deleteKey(const KeyName& name, Open open, Call call) {
     return status;
 }
 
-ChangeRecorder::Row& ChangeRecorder::beforeValue(const KeyName& name, Key& key, std::string_view value) {
+// Null for a value that is to stay as it is.
+ChangeRecorder::Row* ChangeRecorder::beforeValue(const KeyName& name, Key& key, std::string_view value,
+                                                 const std::optional<ValueState>& now) {
     Row* const known = key.isListed || !key.before ? &key.row(value) : key.find(value);
     if (known != nullptr) {
-        return *known;
+        return known->current() == now ? nullptr : known;
     }
     std::optional<ValueState> state;
     Status status = open(name, key);
     status = status == kSuccess ? reader_.value(open_.get(), value, state) : status;
     keep(status);
+    if (state == now) {
+        return nullptr;
+    }
     if (state) {
         // The only way to find out how the store spells the name.
         list(name, key);
     }
-    return key.row(value);
+    return &key.row(value);
 }
 
 template <typename Call>
 Status ChangeRecorder::changeValue(Place& place, std::string_view value, std::optional<ValueState> now, Call call) {
+    if (place.key == nullptr) {
+        place.key = rows_.find(fullKeyName(place.name));
+    }
     if (place.key == nullptr) {
         if (!isRecorded(place.name)) {
             return call();
@@ -249,23 +262,23 @@ Status ChangeRecorder::changeValue(Place& place, std::string_view value, std::op
         place.key = &note(place.name, true);
     }
     Key& key = *place.key;
-    Row& row = beforeValue(place.name, key, value);
-    if (row.current() == now) {
+    Row* const row = beforeValue(place.name, key, value, now);
+    if (row == nullptr) {
         return call();
     }
     named(place.name, key);
-    const bool wasTouched = row.isTouched;
-    std::optional<ValueState> previous = std::move(row.now);
-    rows_.set(key, row, std::move(now));
+    const bool wasTouched = row->isTouched;
+    std::optional<ValueState> previous = std::move(row->now);
+    rows_.set(key, *row, std::move(now));
     if (journal_ != nullptr) {
-        write(key, row);
+        write(key, *row);
     }
     const Status status = call();
     if (status != kSuccess) {
-        row.isTouched = wasTouched;
-        row.now = std::move(previous);
+        row->isTouched = wasTouched;
+        row->now = std::move(previous);
         if (journal_ != nullptr) {
-            write(key, row);
+            write(key, *row);
         }
     }
     return status;
@@ -274,7 +287,7 @@ Status ChangeRecorder::changeValue(Place& place, std::string_view value, std::op
 void ChangeRecorder::beforeTree(const KeyName& name) {
     rest();
     missing_.clear();
-    if (!exists(name)) {
+    if (!exists(name.root, name.path, fullKeyName(name))) {
         missing_ = missingKeys(name);
         for (const KeyName& key : missing_) {
             named(key, false);
@@ -388,21 +401,21 @@ public:
 
     Status openKey(KeyHandle parent, std::string_view path, AccessMask access, KeyHandle& key) override {
         const Status status = real_.openKey(parent, path, access, key);
-        return status == kSuccess ? opened(nameOf(parent, path, access), key) : status;
+        return status == kSuccess ? opened({nameOf(parent, path, access), nullptr}, key) : status;
     }
     Status createKey(KeyHandle parent, std::string_view path, std::string_view keyClass, AccessMask access,
                      KeyHandle& key) override {
-        const KeyName name = nameOf(parent, path, access);
+        ChangeRecorder::Place place{nameOf(parent, path, access), nullptr};
         Status status = real_.openKey(parent, path, access, key);
         if (isNotFound(status)) {
-            status = recorder_.createKey(name, keyClass,
+            status = recorder_.createKey(place, keyClass,
                                          [&] { return real_.createKey(parent, path, keyClass, access, key); });
         } else if (status != kSuccess) {
             const Status unread = status;
             status = real_.createKey(parent, path, keyClass, access, key);
             recorder_.keep(status == kSuccess ? unread : kSuccess);
         }
-        return status == kSuccess ? opened(name, key) : status;
+        return status == kSuccess ? opened(std::move(place), key) : status;
     }
     Status closeKey(KeyHandle key) override {
         open_.erase(key);
@@ -454,15 +467,16 @@ public:
         return status;
     }
 
-    ChangeSet changes() const {
+    template <typename Read>
+    auto read(Read read) const {
         if (holdsCommits_) {
-            return recorder_.rows().changes();
+            return read(recorder_.rows());
         }
         TouchedRows rows;
         for (const std::string& part : saved_) {
             rows.add(part);
         }
-        return rows.changes();
+        return read(rows);
     }
 
 private:
@@ -480,15 +494,16 @@ private:
             name = open->second.name;
         }
         const std::string plain = plainKeyPath(parent, path, access);
+        name.path.reserve(name.path.size() + 1 + plain.size());
         std::string_view rest = plain;
         for (std::string_view part; takeName(rest, part);) {
             name.path.append(name.path.empty() ? "" : "\\").append(part);
         }
         return name;
     }
-    Status opened(KeyName name, KeyHandle key) {
+    Status opened(ChangeRecorder::Place place, KeyHandle key) {
         if (!isRoot(key)) {
-            open_.insert_or_assign(key, ChangeRecorder::Place{std::move(name), nullptr});
+            open_.insert_or_assign(key, std::move(place));
         }
         return kSuccess;
     }
@@ -660,7 +675,11 @@ Status RecordedPorts::commit() {
 }
 
 ChangeSet RecordedPorts::changes() const {
-    return registry_->changes();
+    return registry_->read([](const TouchedRows& rows) { return rows.changes(); });
+}
+
+ChangeCounts RecordedPorts::counts() const {
+    return registry_->read([](const TouchedRows& rows) { return rows.counts(); });
 }
 
 }  // namespace kz7

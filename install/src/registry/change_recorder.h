@@ -46,7 +46,7 @@ public:
 
     // Each makes a change by `call` and records it.
     template <typename Call>
-    Status createKey(const KeyName& name, std::string_view keyClass, Call call);
+    Status createKey(Place& place, std::string_view keyClass, Call call);
     template <typename Open, typename Call>
     Status deleteKey(const KeyName& name, Open open, Call call);
     template <typename Call>
@@ -75,9 +75,9 @@ private:
     Key& named(const KeyName& name, Key& key);
     Key& named(const KeyName& name, bool exists) { return named(name, note(name, exists)); }
     Status open(const KeyName& name, const Key& key);
-    bool exists(const KeyName& name);
+    bool exists(KeyHandle root, std::string_view path, std::string_view fullName);
     void list(const KeyName& name, Key& key);
-    Row& beforeValue(const KeyName& name, Key& key, std::string_view value);
+    Row* beforeValue(const KeyName& name, Key& key, std::string_view value, const std::optional<ValueState>& now);
     std::vector<KeyName> missingKeys(const KeyName& name);
     void beforeTree(const KeyName& name);
     void expectTree(const KeyName& name, bool isDeletion, const std::vector<ServiceValue>& expected);
@@ -112,8 +112,10 @@ public:
     // Commits what was done, where the run's own commits do nothing.
     Status commit();
 
-    // What was changed up to the last commit that succeeded; with `holdsCommits`, up to now.
+    // What was changed up to the last commit that succeeded; with `holdsCommits`, up to now. Counting takes far less
+    // than listing.
     ChangeSet changes() const;
+    ChangeCounts counts() const;
 
     // As that of a recorder.
     Status status() const { return recorder_.status(); }

@@ -124,11 +124,14 @@ TouchedRows::Row* TouchedRows::Key::find(std::string_view value) {
             std::find_if(rows.begin(), rows.end(), [&](const Row& row) { return equalsIgnoreCase(row.name, value); });
         return found == rows.end() ? nullptr : &*found;
     }
-    for (std::size_t place = byFold_.size(); place < rows.size(); ++place) {
-        byFold_.emplace(foldValueName(rows[place].name), place);
+    if (byFold_ == nullptr) {
+        byFold_ = std::make_unique<Places>();
     }
-    const auto found = byFold_.find(foldValueName(value));
-    return found == byFold_.end() ? nullptr : &rows[found->second];
+    for (std::size_t place = byFold_->size(); place < rows.size(); ++place) {
+        byFold_->emplace(foldValueName(rows[place].name), place);
+    }
+    const auto found = byFold_->find(foldValueName(value));
+    return found == byFold_->end() ? nullptr : &rows[found->second];
 }
 
 TouchedRows::Row& TouchedRows::Key::row(std::string_view value) {
@@ -147,23 +150,45 @@ void TouchedRows::Key::add(KeyValue&& existing) {
     added.before = ValueState{existing.type, std::move(existing.data)};
 }
 
+TouchedRows::Key* TouchedRows::recent(std::string_view fullName) {
+    for (Key* const key : recent_) {
+        if (key != nullptr && key->name == fullName) {
+            return key;
+        }
+    }
+    return nullptr;
+}
+
 TouchedRows::Key* TouchedRows::find(std::string_view fullName) {
+    if (Key* const known = recent(fullName); known != nullptr) {
+        return known;
+    }
     const auto found = keys_.find(walkPlace(fullName));
-    return found == keys_.end() ? nullptr : &found->second;
+    if (found == keys_.end()) {
+        return nullptr;
+    }
+    recent_[1] = &found->second;
+    return recent_[1];
 }
 
 // Walks meet keys in their order, so the next one usually comes right after the last one.
 TouchedRows::Key& TouchedRows::key(std::string_view fullName, bool& isNew) {
+    if (Key* const known = recent(fullName); known != nullptr) {
+        isNew = false;
+        return *known;
+    }
     const std::size_t count = keys_.size();
     last_ = keys_.try_emplace(last_ == keys_.end() ? last_ : std::next(last_), walkPlace(fullName));
     isNew = keys_.size() != count;
     if (isNew) {
         last_->second.name = fullName;
     }
-    return last_->second;
+    recent_[0] = &last_->second;
+    return *recent_[0];
 }
 
 void TouchedRows::change(Key& key) {
+    counted_.reset();
     if (!std::exchange(key.isChanged, true)) {
         changed_.push_back(&key);
     }
@@ -212,6 +237,13 @@ ChangeSet TouchedRows::changes() const {
 }
 
 ChangeCounts TouchedRows::counts() const {
+    if (!counted_) {
+        counted_ = count();
+    }
+    return *counted_;
+}
+
+ChangeCounts TouchedRows::count() const {
     ChangeCounts counts;
     std::set<std::string> services;
     for (const auto& [place, key] : keys_) {

@@ -1,7 +1,9 @@
 // The rows that a run touches, each as it was before and as it is now, and the bytes that keep them in the history.
 #pragma once
 
+#include <array>
 #include <map>
+#include <memory>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -21,8 +23,8 @@ public:
     struct Row {
         std::string name;
         std::optional<ValueState> before;
-        bool isTouched = false;         // else it is as before
         std::optional<ValueState> now;  // of a touched row
+        bool isTouched = false;         // else it is as before
         bool isKept = false;            // in a part that was taken
 
         const std::optional<ValueState>& current() const { return isTouched ? now : before; }
@@ -49,8 +51,8 @@ public:
         void add(KeyValue&& existing);
 
     private:
-        std::unordered_map<std::string, std::size_t>
-            byFold_;  // of many rows, or for a name beyond ASCII; may lag behind
+        using Places = std::unordered_map<std::string, std::size_t>;
+        std::unique_ptr<Places> byFold_;  // of many rows, or for a name beyond ASCII; may lag behind
     };
 
     // The key of that full name, and whether it had no entry before.
@@ -87,10 +89,15 @@ public:
 
 private:
     void change(Key& key);
+    ChangeCounts count() const;
+    Key* recent(std::string_view fullName);
 
     std::map<std::string, Key> keys_;  // by their place in a walk
     std::map<std::string, Key>::iterator last_ = keys_.end();
+    std::array<Key*, 2> recent_ =
+        {};  // the one that was noted last, and the one that was searched last: often its parent
     std::vector<Key*> changed_;
+    mutable std::optional<ChangeCounts> counted_;  // since the last change
 };
 
 // One key with some of its rows in the form of the history: all that is known of it, a step that leaves its other rows
