@@ -28,7 +28,7 @@ public:
         libraries_.libraries["C:\\a\\bin\\kz7install64.dll"]["sqleGetLevelInfo"] =
             reinterpret_cast<LibraryFunction>(levelOfCopy);
         files_.add("C:\\a\\bin\\kz7mgmtsvc.exe");
-        assemblies_.files = {"kz7nmpx.dll"};
+        files_.add("C:\\a\\bin\\kz7nmpx.dll");
     }
     explicit RandomMachine(unsigned seed) : RandomMachine() {
         random_.seed(seed);

@@ -32,7 +32,7 @@ void installAt(Machine& machine, const std::string& location) {
     const std::string folder = location + "\\bin\\";
     machine.libraries_.libraries[folder + "kz7install64.dll"]["sqleGetLevelInfo"] =
         reinterpret_cast<LibraryFunction>(&sampleLevel);
-    machine.assemblies_.files = {"kz7nmpdata.dll"};
+    machine.files_.add(folder + "kz7nmpdata.dll");
     machine.files_.add(folder + "kz7nmpgac32.exe");
     for (const char* program : {"kz7nmpgac32.exe", "kz7nmpcfg.exe", "kz7nmpcfg_32.exe"}) {
         machine.processes_.addProgram(folder + program, {.output = "not to be seen", .error = "nor this"});

@@ -10,7 +10,7 @@
 
 #include "install/admin/formats/json_text.h"
 #include "install/platform/platform.h"
-#include "install/platform/shown_text.h"
+#include "install/platform/text.h"
 #include "install/src/registry/key_walk.h"
 
 namespace kz7 {

@@ -6,7 +6,6 @@
 #include <set>
 
 #include "install/admin/copy_location.h"
-#include "install/platform/shown_text.h"
 #include "install/platform/text.h"
 #include "install/src/add_copy.h"
 #include "install/src/registry/change_set.h"

@@ -7,7 +7,6 @@
 #include <unordered_map>
 
 #include "install/platform/service_manager.h"
-#include "install/platform/shown_text.h"
 #include "install/platform/text.h"
 #include "install/src/add_copy.h"
 #include "install/src/services/management_service.h"

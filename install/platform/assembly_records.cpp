@@ -12,8 +12,6 @@ std::string recordLevel(std::string_view level) {
     return compose(",level=\"%s\",generation=\"", {level});
 }
 
-}  // namespace
-
 bool isProviderFile(std::string_view file) {
     constexpr std::string_view kBegin = "kz7nmp";
     constexpr std::string_view kEnd = ".dll";
@@ -21,18 +19,29 @@ bool isProviderFile(std::string_view file) {
            equalsIgnoreCase(file.substr(file.size() - kEnd.size()), kEnd);
 }
 
-Status recordProviders(IRegistryStore& registry, std::string_view location, std::string_view level,
-                       FrameworkGenerations generations, const std::vector<std::string>& files) {
+}  // namespace
+
+std::vector<std::string> providerFiles(IFileSystem& files, std::string_view location, std::string& folder) {
+    folder = compose(location.ends_with('\\') ? "%sbin\\" : "%s\\bin\\", {location});
+    std::vector<std::string> names;
+    files.listFiles(folder, names);
+    std::erase_if(names, [](const std::string& name) { return !isProviderFile(name); });
+    return names;
+}
+
+Status AssemblyRecords::registerProviders(std::string_view location, std::string_view level,
+                                          FrameworkGenerations generations) {
+    std::string folder;
+    const std::vector<std::string> files = providerFiles(files_, location, folder);
     if (files.empty()) {
         return kSuccess;
     }
-    OwnedKey key(registry);
-    Status status = registry.createKey(KeyHandle::localMachine, kAssemblyRecords, {}, kKeyFull, key.receive());
+    OwnedKey key(registry_);
+    Status status = registry_.createKey(KeyHandle::localMachine, kAssemblyRecords, {}, kKeyFull, key.receive());
     if (!succeeded(status)) {
         return status;
     }
     const std::string levelText = recordLevel(level);
-    const std::string folder = compose(location.ends_with('\\') ? "%sbin\\" : "%s\\bin\\", {location});
     for (const std::string& file : files) {
         const std::string path = folder + file + '\0';
         for (const FrameworkGenerations generation : {kFramework2, kFramework4}) {
@@ -40,19 +49,19 @@ Status recordProviders(IRegistryStore& registry, std::string_view location, std:
                 continue;
             }
             const Status set =
-                registry.setValue(key.get(), compose("%s%s%u\"", {file, levelText, generation}), ValueType::sz, path);
+                registry_.setValue(key.get(), compose("%s%s%u\"", {file, levelText, generation}), ValueType::sz, path);
             status = succeeded(status) ? set : status;
         }
     }
     return status;
 }
 
-Status dropProviders(IRegistryStore& registry, std::string_view level) {
+Status AssemblyRecords::deregisterProviders(std::string_view level) {
     if (level.empty()) {
         return kSuccess;
     }
-    OwnedKey key(registry);
-    Status status = registry.openKey(KeyHandle::localMachine, kAssemblyRecords, kKeyFull, key.receive());
+    OwnedKey key(registry_);
+    Status status = registry_.openKey(KeyHandle::localMachine, kAssemblyRecords, kKeyFull, key.receive());
     if (!succeeded(status)) {
         return isNotFound(status) ? kSuccess : status;
     }
@@ -60,7 +69,7 @@ Status dropProviders(IRegistryStore& registry, std::string_view level) {
     TextBuffer<kRecordNameRoom> name;
     const std::string levelText = recordLevel(level);
     std::uint32_t index = 0;
-    while (succeeded(status = registry.enumerateValue(key.get(), index, name, nullptr, nullptr))) {
+    while (succeeded(status = registry_.enumerateValue(key.get(), index, name, nullptr, nullptr))) {
         ++index;
         const std::string_view text = name.text();
         if (text.find(levelText) != std::string_view::npos) {
@@ -69,7 +78,7 @@ Status dropProviders(IRegistryStore& registry, std::string_view level) {
     }
     status = isEndOfItems(status) ? kSuccess : status;
     for (const std::string& record : names) {
-        const Status deleted = registry.deleteValue(key.get(), record);
+        const Status deleted = registry_.deleteValue(key.get(), record);
         status = succeeded(status) ? deleted : status;
     }
     return status;

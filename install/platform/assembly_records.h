@@ -1,5 +1,5 @@
-// The assembly cache of a host without the framework: records in the registry store, one value per provider
-// file, level and generation, written in the store's own transaction.
+// The assembly cache of a host without the framework: records in any registry store, one value per provider file, level
+// and generation.
 #pragma once
 
 #include <string>
@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "install/platform/assembly_cache.h"
+#include "install/platform/file_system.h"
 #include "install/platform/registry_store.h"
 
 namespace kz7 {
@@ -14,15 +15,22 @@ namespace kz7 {
 // The key of the records, below HKEY_LOCAL_MACHINE.
 inline constexpr std::string_view kAssemblyRecords = "SOFTWARE\\Classes\\Installer\\Assemblies\\Global";
 
-// Whether a file of a bin folder is a data provider.
-bool isProviderFile(std::string_view file);
+// The names of the data providers in a location's bin folder; `folder` is its path with a separator at the end. Empty
+// for a folder that is missing or cannot be read.
+std::vector<std::string> providerFiles(IFileSystem& files, std::string_view location, std::string& folder);
 
-// Records every file for every generation in `generations`; the data is the path of the file. Without files the key is
-// not created either.
-Status recordProviders(IRegistryStore& registry, std::string_view location, std::string_view level,
-                       FrameworkGenerations generations, const std::vector<std::string>& files);
+class AssemblyRecords final : public IAssemblyCache {
+public:
+    // Writes through the registry, in its transaction.
+    AssemblyRecords(IRegistryStore& registry, IFileSystem& files) : registry_(registry), files_(files) {}
 
-// Deletes the records of that level. Succeeds if no record has that level and if the level is empty.
-Status dropProviders(IRegistryStore& registry, std::string_view level);
+    Status deregisterProviders(std::string_view level) override;
+    Status registerProviders(std::string_view location, std::string_view level,
+                             FrameworkGenerations generations) override;
+
+private:
+    IRegistryStore& registry_;
+    IFileSystem& files_;
+};
 
 }  // namespace kz7

@@ -1,5 +1,5 @@
-// The console port: the C library's standard output and standard error of this process. They are not the
-// process's standard-handle slots: redirecting a slot never redirects what is written here.
+// The ports for the console and the debugger: the C library's standard output and standard error of this process. They
+// are not the process's standard-handle slots: redirecting a slot never redirects what is written here.
 #pragma once
 
 #include <memory>
@@ -29,5 +29,20 @@ public:
 
 // The streams of the C library, on every host.
 std::unique_ptr<IConsole> standardConsole();
+
+// Diagnostic texts that are not for the console.
+class IDebugOutput {
+public:
+    virtual ~IDebugOutput() = default;
+
+    // Sends one message; cannot fail. If KZ7_DEBUG=1 is set the message is also written to standard error.
+    virtual void write(std::string_view text) = 0;
+
+    // False if nobody can see the messages, so that a caller with many of them need not compose them.
+    virtual bool isHeard() const { return true; }
+};
+
+// `debugger` passes a text to the debugger of this host; null on a host without one.
+std::unique_ptr<IDebugOutput> hostDebugOutput(IConsole& console, void (*debugger)(std::string_view text));
 
 }  // namespace kz7

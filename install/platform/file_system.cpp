@@ -6,9 +6,22 @@
 
 namespace kz7 {
 
-bool fitsPattern(std::string_view name, std::string_view pattern) {
-    return std::equal(name.begin(), name.end(), pattern.begin(), pattern.end(),
-                      [](char a, char b) { return b == '?' || foldUpper(a) == foldUpper(b); });
+Status findFile(IFileSystem& files, std::string_view pattern, std::string& name) {
+    const std::string_view wanted = pattern.substr(pattern.find_last_of("\\/") + 1);
+    std::vector<std::string> names;
+    if (const Status status = files.listFiles(pattern.substr(0, pattern.size() - wanted.size()), names);
+        status != kSuccess) {
+        return status;
+    }
+    const auto found = std::find_if(names.begin(), names.end(), [wanted](const std::string& each) {
+        return std::equal(each.begin(), each.end(), wanted.begin(), wanted.end(),
+                          [](char a, char b) { return b == '?' || foldUpper(a) == foldUpper(b); });
+    });
+    if (found == names.end()) {
+        return kFileNotFound;
+    }
+    name = std::move(*found);
+    return kSuccess;
 }
 
 }  // namespace kz7

@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "install/platform/owned_handle.h"
 #include "install/platform/status.h"
@@ -43,9 +44,8 @@ public:
     // names a link, a folder or a device.
     virtual Status writeFile(std::string_view path, std::string_view content, bool replace) = 0;
 
-    // Finds the first file, in name order, that matches a pattern: a path whose last name may contain '?' for any one
-    // character. `name` is without the folder. kFileNotFound: no file matches.
-    virtual Status findFile(std::string_view pattern, std::string& name) = 0;
+    // The names of the files in a folder, sorted. kFileNotFound: the folder does not exist.
+    virtual Status listFiles(std::string_view folder, std::vector<std::string>& names) = 0;
 
     // Converts a path as users of this host write it; a relative one starts in the current directory.
     // kInvalidName: no product path exists for it.
@@ -63,7 +63,8 @@ struct FileTraits {
 };
 using OwnedFile = OwnedHandle<FileTraits>;
 
-// Matches a name against a pattern of the same length in which '?' stands for any character; ignores case.
-bool fitsPattern(std::string_view name, std::string_view pattern);
+// Finds the first file, in name order, that matches a pattern: a path whose last name may contain '?' for any one
+// character. Ignores case. `name` is without the folder. kFileNotFound: no file matches.
+Status findFile(IFileSystem& files, std::string_view pattern, std::string& name);
 
 }  // namespace kz7

@@ -8,7 +8,6 @@
 
 #include "install/platform/assembly_cache.h"
 #include "install/platform/console.h"
-#include "install/platform/debug_output.h"
 #include "install/platform/file_system.h"
 #include "install/platform/history.h"
 #include "install/platform/host_information.h"
@@ -84,8 +83,8 @@ public:
     // Whether the store has only data of these programs. False: it is the registry of the machine.
     virtual bool storeIsOwn() { return true; }
 
-    // Whether a fault of the store was reported on standard error, so that callers do not report it again.
-    virtual bool storeFaultTold() { return false; }
+    // Whether a fault of the store was reported, so that callers do not report it again.
+    bool storeFaultTold() const { return faultTold_; }
 
     // The assembly cache of this machine as it would act on another registry, without a change to the machine.
     virtual std::unique_ptr<IAssemblyCache> assembliesOn(IRegistryStore& registry) = 0;
@@ -112,7 +111,25 @@ public:
     virtual bool isStoreFile(const std::string&) { return false; }
 
 protected:
+    explicit IPlatform(const PlatformOptions& options = {})
+        : program_(options.program), tellFault_(options.tellFault) {}
+
+    // Reports the first fault of the store; the others follow from it.
+    void tellFault(const std::string& line, Status status) {
+        if (!faultTold_ && tellFault_) {
+            tellFault_(line, status);
+        } else if (!faultTold_) {
+            console().writeError(program_ + ": " + line + "\n");
+        }
+        faultTold_ = true;
+    }
+
     Ports ports_;
+    bool faultTold_ = false;
+
+private:
+    std::string program_;
+    std::function<void(const std::string&, Status)> tellFault_;
 };
 
 std::unique_ptr<IPlatform> hostPlatform(const PlatformOptions& options);

@@ -72,6 +72,13 @@ std::size_t takeUnits(std::string_view& text) {
     return takeCharacter(text) < 0x10000 ? 1 : 2;
 }
 
+bool steersTerminal(char32_t character) {
+    return character < 0x20 || (character >= 0x7F && character < 0xA0) || isSurrogate(character) ||
+           character == 0x061C || character == 0x200E || character == 0x200F ||
+           (character >= 0x2028 && character <= 0x202E) || (character >= 0x2066 && character <= 0x2069) ||
+           character == 0xFEFF;
+}
+
 }  // namespace
 
 std::size_t textLength(std::string_view text) {
@@ -170,6 +177,24 @@ std::size_t composeInto(char* room, std::size_t size, std::string_view pattern, 
         length += piece.size();
     });
     return length;
+}
+
+std::string shownText(std::string_view foreign) {
+    const std::u16string utf16 = utf16FromText(foreign);
+    std::u16string shown;
+    for (std::u16string_view rest = utf16; !rest.empty();) {
+        const char32_t character = takeUtf16(rest);
+        if (!steersTerminal(character)) {
+            appendUtf16(shown, character);
+            continue;
+        }
+        // A byte that is no character shows as the byte it is.
+        const bool isByte = character < 0x80 || isSurrogate(character);
+        std::string escape = isByte ? "\\x" : "\\u";
+        appendHex(character, isByte ? 2 : 4, escape);
+        shown.append(escape.begin(), escape.end());
+    }
+    return textFromUtf16(shown);
 }
 
 }  // namespace kz7

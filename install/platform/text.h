@@ -99,4 +99,7 @@ std::string compose(std::string_view pattern, std::initializer_list<Insert> inse
 // without an insert becomes empty; an insert without a placeholder is ignored.
 std::size_t composeInto(char* room, std::size_t size, std::string_view pattern, std::span<const Insert> inserts);
 
+// Foreign text for a terminal, with control characters, and characters that change the direction of writing, escaped.
+std::string shownText(std::string_view foreign);
+
 }  // namespace kz7

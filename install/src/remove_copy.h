@@ -2,7 +2,7 @@
 // management service.
 #pragma once
 
-#include "install/platform/debug_output.h"
+#include "install/platform/console.h"
 #include "install/platform/registry_store.h"
 #include "install/platform/service_manager.h"
 #include "install/src/registry/report.h"

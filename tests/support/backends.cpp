@@ -29,7 +29,7 @@ public:
 
     IPlatform& platform() override { return platform_; }
     std::string folder() override { return "C:\\contract"; }
-    void addProvider() override { platform_.assemblies_.files.emplace_back("kz7nmpdata.dll"); }
+    void addProvider() override { platform_.files_.add(folder() + "\\bin\\kz7nmpdata.dll"); }
     void reading(const std::string& input, const std::function<void()>& body) override {
         platform_.terminal_.input = input;
         body();

@@ -8,7 +8,6 @@
 
 #include "install/admin/formats/reg_text.h"
 #include "install/admin/formats/value_type.h"
-#include "install/platform/shown_text.h"
 #include "install/platform/text.h"
 
 namespace kz7 {

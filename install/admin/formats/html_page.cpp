@@ -1,6 +1,5 @@
 #include "install/admin/formats/html_page.h"
 
-#include "install/platform/shown_text.h"
 #include "install/platform/text.h"
 
 namespace kz7 {

@@ -3,7 +3,6 @@
 #include <array>
 #include <cstdio>
 
-#include "install/platform/shown_text.h"
 #include "install/platform/text.h"
 
 namespace kz7 {

@@ -2,7 +2,6 @@
 
 #include <algorithm>
 
-#include "install/platform/shown_text.h"
 #include "install/platform/text.h"
 
 namespace kz7 {

@@ -32,16 +32,16 @@ public:
     }
 };
 
-// False: errno is the reason, and some bytes may have been written.
-inline bool writeAll(int descriptor, std::string_view bytes) {
+// Returns what is left after a failure; errno is its reason.
+inline std::string_view writeAll(int descriptor, std::string_view bytes) {
     while (!bytes.empty()) {
         const ssize_t written = ::write(descriptor, bytes.data(), bytes.size());
         if (written == -1 && errno != EINTR) {
-            return false;
+            break;
         }
         bytes.remove_prefix(written == -1 ? 0 : static_cast<std::size_t>(written));
     }
-    return true;
+    return bytes;
 }
 
 }  // namespace kz7

@@ -54,7 +54,7 @@ Status statusOf(int error) {
 int writeNewFile(int folder, const std::string& name, std::string_view content) {
     const OwnedDescriptor file(
         openat(folder, name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
-    return file && writeAll(file.get(), content) && fsync(file.get()) == 0 ? 0 : errno;
+    return file && writeAll(file.get(), content).empty() && fsync(file.get()) == 0 ? 0 : errno;
 }
 
 // Renames a file in its folder. 0 or an error number.
@@ -132,16 +132,9 @@ public:
     }
 
     Status write(FileHandle file, std::string_view data, std::uint32_t& written) override {
-        const int descriptor = files_.find(file);
-        written = 0;
-        while (written < data.size()) {
-            const ssize_t count = ::write(descriptor, data.data() + written, data.size() - written);
-            if (count == -1 && errno != EINTR) {
-                return statusOf(errno);
-            }
-            written += count == -1 ? 0 : static_cast<std::uint32_t>(count);
-        }
-        return kSuccess;
+        const std::string_view left = writeAll(files_.find(file), data);
+        written = static_cast<std::uint32_t>(data.size() - left.size());
+        return left.empty() ? kSuccess : statusOf(errno);
     }
 
     Status closeFile(FileHandle file) override {
@@ -183,26 +176,19 @@ public:
         return error == 0 ? kSuccess : statusOf(error);
     }
 
-    Status findFile(std::string_view pattern, std::string& name) override {
-        const std::string host = hostPath(pattern, stateDirectory_);
-        const std::size_t folder = host.find_last_of('/');
-        if (folder == std::string::npos) {
-            return kFileNotFound;
-        }
-        std::vector<std::string> names;
-        if (const int error = namesIn(host.substr(0, folder + 1), names); error != 0) {
+    Status listFiles(std::string_view folder, std::vector<std::string>& names) override {
+        const std::string host = hostPath(folder, stateDirectory_);
+        std::vector<std::string> found;
+        if (const int error = namesIn(host, found); error != 0) {
             return statusOf(error);
         }
-        const auto first = std::find_if(names.begin(), names.end(), [&](const std::string& found) {
-            return fitsPattern(found, std::string_view(host).substr(folder + 1));
+        std::erase_if(found, [&](const std::string& name) {
+            struct stat entry {};
+            return stat((host + '/' + name).c_str(), &entry) != 0 || !S_ISREG(entry.st_mode);
         });
-        if (first == names.end()) {
-            return kFileNotFound;
-        }
-        name = std::move(*first);
+        names = std::move(found);
         return kSuccess;
     }
-
     Status productPath(std::string_view hostPath, std::string& path) override {
         std::error_code error;
         std::string whole = std::filesystem::absolute(hostPath, error).string();

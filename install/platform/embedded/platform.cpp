@@ -8,11 +8,12 @@
 #include <cstdlib>
 #include <filesystem>
 
+#include "install/platform/assembly_records.h"
 #include "install/platform/embedded/history.h"
 #include "install/platform/embedded/ports.h"
 #include "install/platform/embedded/registry.h"
 #include "install/platform/service_records.h"
-#include "install/platform/shown_text.h"
+#include "install/platform/text.h"
 
 namespace kz7 {
 namespace {
@@ -27,14 +28,13 @@ std::string absolute(const std::string& directory) {
 class EmbeddedPlatform final : public IPlatform {
 public:
     explicit EmbeddedPlatform(const PlatformOptions& options)
-        : program_(options.program),
-          tellFault_(options.tellFault),
+        : IPlatform(options),
           byDefault_(options.stateDirectory.empty() && std::getenv("KZ7_STATE_DIR") == nullptr),
           directory_(absolute(options.stateDirectory.empty() ? usualStateDirectory() : options.stateDirectory)),
           registry_(directory_, options.readOnly, listener(), {options.backup, options.missingIsEmpty}) {
-        ports_ = {&registry_,        &services_,       console_.get(),  debugOutput_.get(),
-                  files_.get(),      processes_.get(), threads_.get(),  libraries_.get(),
-                  assemblies_.get(), host_.get(),      terminal_.get(), &history_};
+        ports_ = {&registry_,   &services_,       console_.get(),  debugOutput_.get(),
+                  files_.get(), processes_.get(), threads_.get(),  libraries_.get(),
+                  &assemblies_, host_.get(),      terminal_.get(), &history_};
     }
 
     const std::string& directory() const { return directory_; }
@@ -43,10 +43,9 @@ public:
         return makeFolder(directory_) != 0 ? kPathNotFound : files_->productPath(directory_, path);
     }
     std::string storeName() override { return registry_.path(); }
-    bool storeFaultTold() override { return faultTold_; }
 
     std::unique_ptr<IAssemblyCache> assembliesOn(IRegistryStore& registry) override {
-        return embeddedAssemblies(registry, directory_);
+        return std::make_unique<AssemblyRecords>(registry, *files_);
     }
     Status storeImage(std::string& image) override { return registry_.image(image); }
     bool storeIsLost() override { return isDamaged_ || !registry_.exists(); }
@@ -69,21 +68,12 @@ public:
 private:
     EmbeddedRegistry::FaultListener listener() {
         return [this](const StoreFault& fault) {
-            const std::string line = shownText(fault.file) + ": " + shownText(fault.reason);
-            if (!faultTold_ && tellFault_) {
-                tellFault_(line, fault.status);
-            } else if (!faultTold_) {
-                console_->writeError(program_ + ": " + line + "\n");
-            }
-            faultTold_ = true;
+            tellFault(shownText(fault.file) + ": " + shownText(fault.reason), fault.status);
             isDamaged_ = isDamaged_ || fault.status == kRegistryCorrupt || fault.status == kNotRegistryFile;
         };
     }
 
-    std::string program_;
-    std::function<void(const std::string&, Status)> tellFault_;
     bool byDefault_;
-    bool faultTold_ = false;
     bool isDamaged_ = false;
     std::string directory_;
     std::unique_ptr<IConsole> console_ = standardConsole();
@@ -95,7 +85,7 @@ private:
     std::unique_ptr<IProcessHost> processes_ = embeddedProcesses(directory_);
     std::unique_ptr<IThreads> threads_ = embeddedThreads();
     std::unique_ptr<ILibraryLoader> libraries_ = embeddedLibraries(directory_);
-    std::unique_ptr<IAssemblyCache> assemblies_ = embeddedAssemblies(registry_, directory_);
+    AssemblyRecords assemblies_{registry_, *files_};
     std::unique_ptr<IHostInformation> host_ = embeddedHost();
     std::unique_ptr<ITerminal> terminal_ = embeddedTerminal();
 };

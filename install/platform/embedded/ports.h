@@ -17,9 +17,6 @@ std::unique_ptr<IProcessHost> embeddedProcesses(std::string stateDirectory);
 std::unique_ptr<IThreads> embeddedThreads();
 std::unique_ptr<ILibraryLoader> embeddedLibraries(std::string stateDirectory);
 
-// Records of the provider files in a location's bin folder, in the registry.
-std::unique_ptr<IAssemblyCache> embeddedAssemblies(IRegistryStore& registry, std::string stateDirectory);
-
 std::unique_ptr<IHostInformation> embeddedHost();
 std::unique_ptr<ITerminal> embeddedTerminal();
 

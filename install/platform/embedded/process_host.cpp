@@ -284,16 +284,8 @@ public:
     }
 
     Status write(StreamHandle stream, std::string_view data) override {
-        const int descriptor = streams_.find(stream);
         const WithoutPipeSignal guard;
-        while (!data.empty()) {
-            const ssize_t count = ::write(descriptor, data.data(), data.size());
-            if (count == -1 && errno != EINTR) {
-                return statusOf(errno);
-            }
-            data.remove_prefix(count == -1 ? 0 : static_cast<std::size_t>(count));
-        }
-        return kSuccess;
+        return writeAll(streams_.find(stream), data).empty() ? kSuccess : statusOf(errno);
     }
 
     Status closeStream(StreamHandle stream) override { return streams_.take(stream) ? kSuccess : kInvalidHandle; }

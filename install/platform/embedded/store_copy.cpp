@@ -44,7 +44,8 @@ int copyFile(const std::string& from, const std::string& to) {
         if (count == 0) {
             return 0;
         }
-        if (count < 0 ? errno != EINTR : !writeAll(target.get(), {piece.data(), static_cast<std::size_t>(count)})) {
+        if (count < 0 ? errno != EINTR
+                      : !writeAll(target.get(), {piece.data(), static_cast<std::size_t>(count)}).empty()) {
             return errno;
         }
     }

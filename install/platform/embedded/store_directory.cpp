@@ -83,8 +83,8 @@ int putNotice(const std::string& directory, const std::string& kept) {
     name = directory + '/' + name;
     const std::string text = std::string(kMovedTo) + kept.substr(directory.size() + 1) + '\n';
     const OwnedDescriptor file(open(name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
-    const bool isPut = file && inheritOwner(directory, file) && writeAll(file.get(), text) && fsync(file.get()) == 0 &&
-                       rename(name.c_str(), (directory + '/' + kStoreName).c_str()) == 0;
+    const bool isPut = file && inheritOwner(directory, file) && writeAll(file.get(), text).empty() &&
+                       fsync(file.get()) == 0 && rename(name.c_str(), (directory + '/' + kStoreName).c_str()) == 0;
     return isPut ? 0 : errno;
 }
 

@@ -9,7 +9,7 @@
 #include "install/platform/buffer.h"
 #include "install/platform/process_host.h"
 #include "install/platform/service_manager.h"
-#include "install/platform/shown_text.h"
+#include "install/platform/text.h"
 
 namespace kz7 {
 

@@ -101,7 +101,7 @@ KZ7_INTERCEPTED(InterceptedServices, IServiceManager, "services",
 KZ7_INTERCEPTED(InterceptedConsole, IConsole, "console",
     KZ7_1(writeOutput) KZ7_1(writeError) KZ7_1(writeDocument) KZ7_0(flush))
 KZ7_INTERCEPTED(InterceptedFiles, IFileSystem, "files",
-    KZ7_1(probe) KZ7_2(readFile) KZ7_3(writeFile) KZ7_2(openForAppend) KZ7_3(write) KZ7_1(closeFile) KZ7_2(findFile) KZ7_2(productPath)
+    KZ7_1(probe) KZ7_2(readFile) KZ7_3(writeFile) KZ7_2(openForAppend) KZ7_3(write) KZ7_1(closeFile) KZ7_2(listFiles) KZ7_2(productPath)
     KZ7_1(shownPath))
 KZ7_INTERCEPTED(InterceptedProcesses, IProcessHost, "processes",
     KZ7_2(getSlot) KZ7_2(setSlot) KZ7_2(createPipe) KZ7_2(duplicate) KZ7_2(read) KZ7_2(write) KZ7_1(closeStream)

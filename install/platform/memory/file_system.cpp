@@ -1,5 +1,7 @@
 #include "install/platform/memory/file_system.h"
 
+#include <algorithm>
+
 #include "install/platform/text.h"
 
 namespace kz7 {
@@ -100,15 +102,19 @@ Status MemoryFileSystem::writeFile(std::string_view path, std::string_view conte
     return status == kFileNotFound ? kBadPathname : status;
 }
 
-Status MemoryFileSystem::findFile(std::string_view pattern, std::string& name) {
-    const std::string key = keyOf(pattern);
+Status MemoryFileSystem::listFiles(std::string_view folder, std::vector<std::string>& names) {
+    const std::string key = keyOf(folder);
+    if (!files_.contains(key)) {
+        return kFileNotFound;
+    }
+    names.clear();
     for (const auto& [path, file] : files_) {
-        if (fitsPattern(path, key) && path.find_last_of('\\') == key.find_last_of('\\')) {
-            name = file->name;
-            return kSuccess;
+        if (!file->isFolder && path.substr(0, path.find_last_of('\\')) == key) {
+            names.push_back(file->name);
         }
     }
-    return kFileNotFound;
+    std::sort(names.begin(), names.end());
+    return kSuccess;
 }
 
 void MemoryFileSystem::add(std::string_view path, std::string_view content) {

@@ -18,7 +18,7 @@ public:
     Status write(FileHandle file, std::string_view data, std::uint32_t& written) override;
     Status closeFile(FileHandle file) override;
     Status writeFile(std::string_view path, std::string_view content, bool replace) override;
-    Status findFile(std::string_view pattern, std::string& name) override;
+    Status listFiles(std::string_view folder, std::vector<std::string>& names) override;
     Status productPath(std::string_view hostPath, std::string& path) override;
     std::string shownPath(std::string_view path) override { return std::string(path); }
 

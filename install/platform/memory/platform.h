@@ -1,6 +1,7 @@
 // A whole machine in memory. Its ports are public members, so that tests can set them up and read them.
 #pragma once
 
+#include "install/platform/assembly_records.h"
 #include "install/platform/memory/file_system.h"
 #include "install/platform/memory/process_host.h"
 #include "install/platform/memory/registry.h"
@@ -26,9 +27,7 @@ public:
     std::string storeName() override { return "memory"; }
 
     std::unique_ptr<IAssemblyCache> assembliesOn(IRegistryStore& registry) override {
-        auto assemblies = std::make_unique<MemoryAssemblyCache>(registry);
-        assemblies->files = assemblies_.files;
-        return assemblies;
+        return std::make_unique<AssemblyRecords>(registry, files_);
     }
 
     MemoryRegistry registry_;
@@ -39,7 +38,7 @@ public:
     MemoryProcessHost processes_;
     MemoryThreads threads_;
     MemoryLibraryLoader libraries_;
-    MemoryAssemblyCache assemblies_{registry_};
+    AssemblyRecords assemblies_{registry_, files_};
     MemoryHost host_;
     MemoryTerminal terminal_;
 };

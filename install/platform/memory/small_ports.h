@@ -6,9 +6,7 @@
 #include <string>
 #include <vector>
 
-#include "install/platform/assembly_records.h"
 #include "install/platform/console.h"
-#include "install/platform/debug_output.h"
 #include "install/platform/host_information.h"
 #include "install/platform/library_loader.h"
 #include "install/platform/registry_path.h"
@@ -159,23 +157,6 @@ public:
 
 private:
     std::uint64_t last_ = 0;
-};
-
-// The records of a host without the framework.
-class MemoryAssemblyCache final : public IAssemblyCache {
-public:
-    explicit MemoryAssemblyCache(IRegistryStore& registry) : registry_(registry) {}
-
-    Status deregisterProviders(std::string_view level) override { return dropProviders(registry_, level); }
-    Status registerProviders(std::string_view location, std::string_view level,
-                             FrameworkGenerations generations) override {
-        return recordProviders(registry_, location, level, generations, files);
-    }
-
-    std::vector<std::string> files;  // the provider files of every location
-
-private:
-    IRegistryStore& registry_;
 };
 
 }  // namespace kz7

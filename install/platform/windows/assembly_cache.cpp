@@ -10,8 +10,8 @@
 #include <string>
 #include <vector>
 
+#include "install/platform/assembly_records.h"
 #include "install/platform/windows/native_handle.h"
-#include "install/platform/windows/paths.h"
 #include "install/platform/windows/wide_text.h"
 
 namespace kz7 {
@@ -137,26 +137,6 @@ Status uninstall(::IAssemblyCache& cache, const std::wstring& name) {
     return result == S_FALSE && stays ? kBusy : statusOf(result);
 }
 
-// Empty for a location that depends on the current directory.
-std::vector<std::wstring> providerFiles(std::string_view location) {
-    const std::string folder = std::string(location) + (location.ends_with('\\') ? "bin\\" : "\\bin\\");
-    std::vector<std::wstring> files;
-    if (!isAbsolutePath(folder)) {
-        return files;
-    }
-    WIN32_FIND_DATAW found;
-    const FileSearch search = owned<FileSearch>(FindFirstFileW(WideText(folder + "kz7nmp*.dll").c_str(), &found));
-    if (!search) {
-        return files;
-    }
-    do {
-        if ((found.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) == 0) {
-            files.push_back(WideText(folder).c_str() + std::wstring(found.cFileName));
-        }
-    } while (FindNextFileW(search.get(), &found) != 0);
-    return files;
-}
-
 // Keeps the first failure of several steps that are all taken.
 void keepFirst(Status& first, Status status) {
     if (succeeded(first)) {
@@ -168,7 +148,7 @@ void keepFirst(Status& first, Status status) {
 // registering fails.
 class WindowsAssemblyCache final : public IAssemblyCache {
 public:
-    explicit WindowsAssemblyCache(bool isPreview) : isPreview_(isPreview) {}
+    WindowsAssemblyCache(IFileSystem& files, bool isPreview) : files_(files), isPreview_(isPreview) {}
 
     Status deregisterProviders(std::string_view level) override {
         if (level.empty()) {
@@ -193,7 +173,8 @@ public:
     }
 
     Status registerProviders(std::string_view location, std::string_view, FrameworkGenerations generations) override {
-        const std::vector<std::wstring> files = providerFiles(location);
+        std::string folder;
+        const std::vector<std::string> files = providerFiles(files_, location, folder);
         if (files.empty()) {
             return kSuccess;
         }
@@ -209,21 +190,22 @@ public:
                 keepFirst(result, opened);
                 continue;
             }
-            for (const std::wstring& file : isPreview_ ? std::vector<std::wstring>{} : files) {
-                keepFirst(result, statusOf(cache->InstallAssembly(0, file.c_str(), nullptr)));
+            for (const std::string& file : isPreview_ ? std::vector<std::string>{} : files) {
+                keepFirst(result, statusOf(cache->InstallAssembly(0, WideText(folder + file).c_str(), nullptr)));
             }
         }
         return result;
     }
 
 private:
+    IFileSystem& files_;
     bool isPreview_;
 };
 
 }  // namespace
 
-std::unique_ptr<IAssemblyCache> windowsAssemblies(bool isPreview) {
-    return std::make_unique<WindowsAssemblyCache>(isPreview);
+std::unique_ptr<IAssemblyCache> windowsAssemblies(IFileSystem& files, bool isPreview) {
+    return std::make_unique<WindowsAssemblyCache>(files, isPreview);
 }
 
 }  // namespace kz7

@@ -4,6 +4,7 @@
 #include <io.h>
 #include <windows.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdlib>
 #include <string>
@@ -189,31 +190,26 @@ public:
         return status;
     }
 
-    Status findFile(std::string_view pattern, std::string& name) override {
-        if (namesNothing(pattern)) {
+    Status listFiles(std::string_view folder, std::vector<std::string>& names) override {
+        if (namesNothing(folder)) {
             return kFileNotFound;
         }
-        const std::string_view names = pattern.substr(pattern.find_last_of("\\/:") + 1);
         WIN32_FIND_DATAW found{};
-        const FileSearch search = owned<FileSearch>(FindFirstFileW(WideText(pattern).c_str(), &found));
+        const FileSearch search =
+            owned<FileSearch>(FindFirstFileW(WideText(std::string(folder) + "\\*").c_str(), &found));
         if (!search) {
             return GetLastError() == ERROR_PATH_NOT_FOUND ? kFileNotFound : GetLastError();
         }
-        // For the system a "?" also matches no character.
-        std::string first;
+        std::vector<std::string> files;
         do {
-            const std::string each = textFromWide(found.cFileName);
-            if (fitsPattern(each, names) && (first.empty() || each < first)) {
-                first = each;
+            if ((found.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) == 0) {
+                files.push_back(textFromWide(found.cFileName));
             }
         } while (FindNextFileW(search.get(), &found) != FALSE);
-        if (first.empty()) {
-            return kFileNotFound;
-        }
-        name = std::move(first);
+        std::sort(files.begin(), files.end());
+        names = std::move(files);
         return kSuccess;
     }
-
     Status productPath(std::string_view hostPath, std::string& path) override {
         std::string whole = wholePath(hostPath);
         if (namesNothing(whole)) {

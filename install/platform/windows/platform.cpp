@@ -17,8 +17,7 @@ namespace {
 class WindowsPlatform final : public IPlatform {
 public:
     explicit WindowsPlatform(const PlatformOptions& options)
-        : program_(options.program),
-          tellFault_(options.tellFault),
+        : IPlatform(options),
           // The library in an installer changes keys of one user only.
           lock_(options.ownProcess && !options.readOnly, [this] { tellBusy(); }) {
         ports_ = {registry_.get(),   services_.get(),  console_.get(),  debugOutput_.get(),
@@ -38,23 +37,11 @@ public:
     }
     std::string storeName() override { return "the registry of this machine"; }
     bool storeIsOwn() override { return false; }
-    std::unique_ptr<IAssemblyCache> assembliesOn(IRegistryStore&) override { return windowsAssemblies(true); }
-    bool storeFaultTold() override { return faultTold_; }
+    std::unique_ptr<IAssemblyCache> assembliesOn(IRegistryStore&) override { return windowsAssemblies(*files_, true); }
 
 private:
-    void tellBusy() {
-        const std::string line = "%ProgramData%\\KZ7\\lock: stayed locked by another program for 5 seconds";
-        if (!faultTold_ && tellFault_) {
-            tellFault_(line, kBusy);
-        } else if (!faultTold_) {
-            console_->writeError(program_ + ": " + line + "\n");
-        }
-        faultTold_ = true;
-    }
+    void tellBusy() { tellFault("%ProgramData%\\KZ7\\lock: stayed locked by another program for 5 seconds", kBusy); }
 
-    std::string program_;
-    std::function<void(const std::string&, Status)> tellFault_;
-    bool faultTold_ = false;
     std::unique_ptr<IConsole> console_ = windowsConsole();
     std::unique_ptr<IDebugOutput> debugOutput_ =
         hostDebugOutput(*console_, [](std::string_view text) { OutputDebugStringW(WideText(text).c_str()); });
@@ -65,7 +52,7 @@ private:
     std::unique_ptr<IProcessHost> processes_ = windowsProcesses();
     std::unique_ptr<IThreads> threads_ = windowsThreads();
     std::unique_ptr<ILibraryLoader> libraries_ = windowsLibraries();
-    std::unique_ptr<IAssemblyCache> assemblies_ = windowsAssemblies(false);
+    std::unique_ptr<IAssemblyCache> assemblies_ = windowsAssemblies(*files_, false);
     std::unique_ptr<IHostInformation> host_ = windowsHost();
     std::unique_ptr<ITerminal> terminal_ = windowsTerminal();
     std::unique_ptr<IHistory> history_ = windowsHistory(*debugOutput_);

@@ -18,7 +18,7 @@ std::unique_ptr<IThreads> windowsThreads();
 std::unique_ptr<ILibraryLoader> windowsLibraries();
 
 // `isPreview`: opens the caches and leaves them as they are.
-std::unique_ptr<IAssemblyCache> windowsAssemblies(bool isPreview);
+std::unique_ptr<IAssemblyCache> windowsAssemblies(IFileSystem& files, bool isPreview);
 
 std::unique_ptr<IHostInformation> windowsHost();
 std::unique_ptr<ITerminal> windowsTerminal();

@@ -4,7 +4,7 @@
 #include <array>
 #include <new>
 
-#include "install/platform/shown_text.h"
+#include "install/platform/text.h"
 #include "install/runtime/observers/external_output_pipe.h"
 
 namespace kz7 {

@@ -148,7 +148,7 @@ void URELogObserver::lookForClusterLog(std::string_view folder) {
     std::string pattern(folder.substr(0, folder.size() - 1));
     pattern += (ure_.mode & kModeRemove) != 0 ? "\\uninstallSAM.????.log" : "\\installSAM.????.log";
     std::string name;
-    ure_.ports.files.findFile(pattern, name);
+    findFile(ure_.ports.files, pattern, name);
 }
 
 void URELogObserver::writeFunction(std::string_view text) {

@@ -6,7 +6,7 @@
 #include <string>
 #include <string_view>
 
-#include "install/platform/debug_output.h"
+#include "install/platform/console.h"
 #include "install/platform/registry_store.h"
 #include "install/platform/text.h"
 

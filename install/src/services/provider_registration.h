@@ -6,7 +6,7 @@
 #include <string_view>
 
 #include "install/platform/assembly_cache.h"
-#include "install/platform/debug_output.h"
+#include "install/platform/console.h"
 #include "install/platform/file_system.h"
 #include "install/platform/library_loader.h"
 #include "install/platform/process_host.h"
