@@ -17,13 +17,8 @@
 namespace kz7 {
 namespace {
 
-constexpr std::size_t kReadPiece = std::size_t{64} * 1024;
 constexpr DWORD kWithoutOurRights = SECURITY_SQOS_PRESENT | SECURITY_IDENTIFICATION;
 constexpr std::size_t kWritePiece = 1 << 30;
-
-HANDLE native(FileHandle file) {
-    return reinterpret_cast<HANDLE>(static_cast<std::uintptr_t>(file));
-}
 
 bool namesNothing(std::string_view path) {
     return !isAbsolutePath(path) || path.find('\0') != std::string_view::npos;
@@ -102,17 +97,11 @@ public:
             return GetLastError() == ERROR_PATH_NOT_FOUND ? kFileNotFound : GetLastError();
         }
         std::string read;
-        DWORD count = 0;
-        do {
-            const std::size_t length = read.size();
-            read.resize(length + kReadPiece);
-            if (ReadFile(file.get(), read.data() + length, kReadPiece, &count, nullptr) == FALSE) {
-                return GetLastError();
-            }
-            read.resize(length + count);
-        } while (count != 0);
-        content = std::move(read);
-        return kSuccess;
+        const Status status = readAll(file.get(), read);
+        if (status == kSuccess) {
+            content = std::move(read);
+        }
+        return status;
     }
 
     Status openForAppend(std::string_view path, FileHandle& file) override {
@@ -147,20 +136,19 @@ public:
             information.nNumberOfLinks != 1 || !liesAt(opened.get(), whole)) {
             return kAccessDenied;
         }
-        file = FileHandle{reinterpret_cast<std::uintptr_t>(opened.release())};
+        file = portHandle<FileHandle>(opened.release());
         return kSuccess;
     }
 
     Status write(FileHandle file, std::string_view data, std::uint32_t& written) override {
         DWORD count = 0;
-        const BOOL taken = WriteFile(native(file), data.data(), static_cast<DWORD>(data.size()), &count, nullptr);
+        const Status status =
+            statusOfCall(WriteFile(native(file), data.data(), static_cast<DWORD>(data.size()), &count, nullptr));
         written = count;
-        return taken != FALSE ? kSuccess : GetLastError();
+        return status;
     }
 
-    Status closeFile(FileHandle file) override {
-        return CloseHandle(native(file)) != FALSE ? kSuccess : GetLastError();
-    }
+    Status closeFile(FileHandle file) override { return statusOfCall(CloseHandle(native(file))); }
 
     Status writeFile(std::string_view path, std::string_view content, bool replace) override {
         const std::string target(path);
@@ -177,7 +165,7 @@ public:
             return GetLastError();
         }
         OwnedFile file(*this);
-        file.receive() = FileHandle{reinterpret_cast<std::uintptr_t>(opened)};
+        file.receive() = portHandle<FileHandle>(opened);
         Status status = writeAll(file.get(), content);
         file.reset();
         const DWORD how = MOVEFILE_WRITE_THROUGH | (replace ? DWORD{MOVEFILE_REPLACE_EXISTING} : 0);
@@ -230,7 +218,7 @@ private:
             }
             content.remove_prefix(written);
         }
-        return FlushFileBuffers(native(file)) != FALSE ? kSuccess : GetLastError();
+        return statusOfCall(FlushFileBuffers(native(file)));
     }
 };
 

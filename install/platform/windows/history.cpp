@@ -38,20 +38,6 @@ std::string environmentName(BOOL(WINAPI* call)(LPWSTR, LPDWORD)) {
     });
 }
 
-bool readAll(HANDLE file, std::string& bytes) {
-    std::string room(std::size_t{1} << 16, '\0');
-    for (;;) {
-        DWORD count = 0;
-        if (ReadFile(file, room.data(), static_cast<DWORD>(room.size()), &count, nullptr) == FALSE) {
-            return false;
-        }
-        if (count == 0) {
-            return true;
-        }
-        bytes.append(room.data(), count);
-    }
-}
-
 struct JournalFile {
     std::uint64_t number = 0;
     std::uint64_t size = 0;
@@ -208,7 +194,7 @@ private:
     static bool read(const HistoryRun& run, std::string& bytes) {
         const NativeHandle file =
             openTrustedFile(nameOf(run.number), FILE_READ_DATA, FILE_SHARE_READ | FILE_SHARE_WRITE, OPEN_EXISTING);
-        return file && readAll(file.get(), bytes);
+        return file && readAll(file.get(), bytes) == kSuccess;
     }
 
     // A run keeps others from writing to its journal.

@@ -1,9 +1,13 @@
-// RAII owners of Windows handles.
+// Windows handles: their owners, those of the ports, and the status of a call.
 #pragma once
 
 #include <windows.h>
 
+#include <cstdint>
 #include <memory>
+#include <string>
+
+#include "install/platform/status.h"
 
 namespace kz7 {
 
@@ -31,5 +35,31 @@ struct FreeLocal {
     void operator()(void* memory) const { LocalFree(memory); }
 };
 using LocalMemory = std::unique_ptr<void, FreeLocal>;
+
+// The handle of the system in a port's handle, and back.
+template <typename Handle>
+HANDLE native(Handle handle) {
+    return reinterpret_cast<HANDLE>(static_cast<std::uintptr_t>(handle));
+}
+template <typename Handle>
+Handle portHandle(HANDLE handle) {
+    return Handle{reinterpret_cast<std::uintptr_t>(handle)};
+}
+
+// The status of a call that returns FALSE on failure.
+inline Status statusOfCall(BOOL result) {
+    return result != FALSE ? kSuccess : GetLastError();
+}
+
+// Reads an open file to its end.
+inline Status readAll(HANDLE file, std::string& bytes) {
+    std::string room(std::size_t{1} << 16, '\0');
+    for (DWORD count = 1; count != 0; bytes.append(room, 0, count)) {
+        if (ReadFile(file, room.data(), static_cast<DWORD>(room.size()), &count, nullptr) == FALSE) {
+            return GetLastError();
+        }
+    }
+    return kSuccess;
+}
 
 }  // namespace kz7

@@ -9,25 +9,12 @@
 
 #include "install/platform/command_line.h"
 #include "install/platform/registry_path.h"
+#include "install/platform/windows/native_handle.h"
 #include "install/platform/windows/paths.h"
 #include "install/platform/windows/wide_text.h"
 
 namespace kz7 {
 namespace {
-
-template <typename Handle>
-HANDLE native(Handle handle) {
-    return reinterpret_cast<HANDLE>(static_cast<std::uintptr_t>(handle));
-}
-
-template <typename Handle>
-Handle portHandle(HANDLE handle) {
-    return Handle{reinterpret_cast<std::uintptr_t>(handle)};
-}
-
-Status judged(BOOL succeeded) {
-    return succeeded != FALSE ? kSuccess : GetLastError();
-}
 
 DWORD slotNumber(StandardSlot slot) {
     return slot == StandardSlot::output ? STD_OUTPUT_HANDLE : STD_ERROR_HANDLE;
@@ -135,10 +122,11 @@ public:
         SIZE_T size = 0;
         InitializeProcThreadAttributeList(nullptr, 1, 0, &size);
         room_.resize(size);
-        status_ = judged(InitializeProcThreadAttributeList(list(), 1, 0, &size));
+        status_ = statusOfCall(InitializeProcThreadAttributeList(list(), 1, 0, &size));
         isMade_ = status_ == kSuccess;
         if (isMade_ && !handles_.empty()) {
-            status_ = judged(UpdateProcThreadAttribute(list(), 0, PROC_THREAD_ATTRIBUTE_HANDLE_LIST, handles_.data(),
+            status_ =
+                statusOfCall(UpdateProcThreadAttribute(list(), 0, PROC_THREAD_ATTRIBUTE_HANDLE_LIST, handles_.data(),
                                                        handles_.size() * sizeof(HANDLE), nullptr, nullptr));
         }
     }
@@ -173,14 +161,14 @@ public:
     }
 
     Status setSlot(StandardSlot slot, StreamHandle stream) override {
-        return judged(SetStdHandle(slotNumber(slot), native(stream)));
+        return statusOfCall(SetStdHandle(slotNumber(slot), native(stream)));
     }
 
     Status createPipe(StreamHandle& readEnd, StreamHandle& writeEnd) override {
         SECURITY_ATTRIBUTES inherited{sizeof inherited, nullptr, TRUE};
         HANDLE reading = nullptr;
         HANDLE writing = nullptr;
-        const Status status = judged(CreatePipe(&reading, &writing, &inherited, 0));
+        const Status status = statusOfCall(CreatePipe(&reading, &writing, &inherited, 0));
         if (status == kSuccess) {
             readEnd = portHandle<StreamHandle>(reading);
             writeEnd = portHandle<StreamHandle>(writing);
@@ -190,8 +178,8 @@ public:
 
     Status duplicate(StreamHandle stream, StreamHandle& copy) override {
         HANDLE handle = nullptr;
-        const Status status = judged(DuplicateHandle(GetCurrentProcess(), native(stream), GetCurrentProcess(), &handle,
-                                                     0, FALSE, DUPLICATE_SAME_ACCESS));
+        const Status status = statusOfCall(DuplicateHandle(GetCurrentProcess(), native(stream), GetCurrentProcess(),
+                                                           &handle, 0, FALSE, DUPLICATE_SAME_ACCESS));
         if (status == kSuccess) {
             copy = portHandle<StreamHandle>(handle);
         }
@@ -200,7 +188,7 @@ public:
 
     Status read(StreamHandle stream, Buffer& data) override {
         DWORD count = 0;
-        const Status status = judged(ReadFile(native(stream), data.data, data.capacity, &count, nullptr));
+        const Status status = statusOfCall(ReadFile(native(stream), data.data, data.capacity, &count, nullptr));
         if (status == kSuccess) {
             data.size = count;
         }
@@ -209,10 +197,10 @@ public:
 
     Status write(StreamHandle stream, std::string_view data) override {
         DWORD count = 0;
-        return judged(WriteFile(native(stream), data.data(), static_cast<DWORD>(data.size()), &count, nullptr));
+        return statusOfCall(WriteFile(native(stream), data.data(), static_cast<DWORD>(data.size()), &count, nullptr));
     }
 
-    Status closeStream(StreamHandle stream) override { return judged(CloseHandle(native(stream))); }
+    Status closeStream(StreamHandle stream) override { return statusOfCall(CloseHandle(native(stream))); }
 
     Status startProcess(const ProcessStart& start, ProcessInformation& started) override {
         const std::vector<CommandReading> readings = commandReadings(start.commandLine);
@@ -238,7 +226,7 @@ public:
         startup.lpAttributeList = inherited.list();
         WideText commandLine(start.commandLine);  // CreateProcess() writes into it
         PROCESS_INFORMATION information{};
-        const Status status = judged(CreateProcessW(
+        const Status status = statusOfCall(CreateProcessW(
             nullptr, commandLine.data(), nullptr, nullptr, inherited.any() ? TRUE : FALSE,
             NORMAL_PRIORITY_CLASS | CREATE_UNICODE_ENVIRONMENT | EXTENDED_STARTUPINFO_PRESENT, search.environment(),
             directory.empty() ? nullptr : WideText(directory).c_str(), &startup.StartupInfo, &information));
@@ -262,14 +250,14 @@ public:
 
     Status exitCode(ProcessHandle process, std::uint32_t& code) override {
         DWORD found = 0;
-        const Status status = judged(GetExitCodeProcess(native(process), &found));
+        const Status status = statusOfCall(GetExitCodeProcess(native(process), &found));
         if (status == kSuccess) {
             code = found;
         }
         return status;
     }
 
-    Status closeProcess(ProcessHandle process) override { return judged(CloseHandle(native(process))); }
+    Status closeProcess(ProcessHandle process) override { return statusOfCall(CloseHandle(native(process))); }
 
     Status shortPath(std::string_view path, Buffer& shortened) override {
         const WideText wide(path);

@@ -3,6 +3,7 @@
 #include <windows.h>
 
 #include "install/platform/windows/change_lock.h"
+#include "install/platform/windows/native_handle.h"
 #include "install/platform/windows/wide_text.h"
 
 namespace kz7 {
@@ -21,10 +22,6 @@ Status opened(SC_HANDLE made, ServiceHandle& handle) {
     }
     handle = static_cast<ServiceHandle>(reinterpret_cast<std::uint64_t>(made));
     return kSuccess;
-}
-
-Status done(BOOL result) {
-    return result ? kSuccess : GetLastError();
 }
 
 class WindowsServiceManager final : public IServiceManager {
@@ -68,24 +65,26 @@ public:
     }
 
     Status changeStartType(ServiceHandle service, ServiceStart start) override {
-        return done(ChangeServiceConfigW(native(service), SERVICE_NO_CHANGE, static_cast<DWORD>(start),
-                                         SERVICE_NO_CHANGE, nullptr, nullptr, nullptr, nullptr, nullptr, nullptr,
-                                         nullptr));
+        return statusOfCall(ChangeServiceConfigW(native(service), SERVICE_NO_CHANGE, static_cast<DWORD>(start),
+                                                 SERVICE_NO_CHANGE, nullptr, nullptr, nullptr, nullptr, nullptr,
+                                                 nullptr, nullptr));
     }
 
     Status configureService(ServiceHandle service, const ServiceDefinition& definition) override {
         const WideText displayName(definition.displayName);
         const WideText program(definition.programPath);
-        return done(ChangeServiceConfigW(native(service), definition.type, static_cast<DWORD>(definition.start),
-                                         definition.errorControl, program.c_str(), nullptr, nullptr, nullptr, nullptr,
-                                         nullptr, displayName.c_str()));
+        return statusOfCall(ChangeServiceConfigW(native(service), definition.type, static_cast<DWORD>(definition.start),
+                                                 definition.errorControl, program.c_str(), nullptr, nullptr, nullptr,
+                                                 nullptr, nullptr, displayName.c_str()));
     }
 
-    Status startService(ServiceHandle service) override { return done(StartServiceW(native(service), 0, nullptr)); }
+    Status startService(ServiceHandle service) override {
+        return statusOfCall(StartServiceW(native(service), 0, nullptr));
+    }
 
     Status stopService(ServiceHandle service) override {
         SERVICE_STATUS answered{};
-        return done(ControlService(native(service), SERVICE_CONTROL_STOP, &answered));
+        return statusOfCall(ControlService(native(service), SERVICE_CONTROL_STOP, &answered));
     }
 
     Status waitForStop(ServiceHandle service, std::uint32_t milliseconds) override {
@@ -105,16 +104,16 @@ public:
 
     Status queryState(ServiceHandle service, ServiceState& state) override {
         SERVICE_STATUS answered{};
-        const Status status = done(QueryServiceStatus(native(service), &answered));
+        const Status status = statusOfCall(QueryServiceStatus(native(service), &answered));
         if (status == kSuccess) {
             state = static_cast<ServiceState>(answered.dwCurrentState);
         }
         return status;
     }
 
-    Status deleteService(ServiceHandle service) override { return done(DeleteService(native(service))); }
+    Status deleteService(ServiceHandle service) override { return statusOfCall(DeleteService(native(service))); }
 
-    Status closeHandle(ServiceHandle handle) override { return done(CloseServiceHandle(native(handle))); }
+    Status closeHandle(ServiceHandle handle) override { return statusOfCall(CloseServiceHandle(native(handle))); }
 
 private:
     ChangeLock& lock_;

@@ -3,12 +3,10 @@
 #include <process.h>
 #include <windows.h>
 
+#include "install/platform/windows/native_handle.h"
+
 namespace kz7 {
 namespace {
-
-HANDLE native(ThreadHandle thread) {
-    return reinterpret_cast<HANDLE>(static_cast<std::uintptr_t>(thread));
-}
 
 unsigned __stdcall enter(void* record) {
     ThreadStart::run(record);
@@ -35,9 +33,7 @@ public:
         return WaitForSingleObject(native(thread), INFINITE) == WAIT_OBJECT_0 ? kSuccess : GetLastError();
     }
 
-    Status closeThread(ThreadHandle thread) override {
-        return CloseHandle(native(thread)) != FALSE ? kSuccess : GetLastError();
-    }
+    Status closeThread(ThreadHandle thread) override { return statusOfCall(CloseHandle(native(thread))); }
 };
 
 }  // namespace
