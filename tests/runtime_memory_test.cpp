@@ -5,11 +5,11 @@
 #include <map>
 #include <set>
 
-#include "install/platform/intercept/fault_counter.h"
 #include "install/runtime/config_handler.h"
 #include "install/runtime/install_process.h"
 #include "install/runtime/installer_properties.h"
 #include "install/runtime/observers/display_observer.h"
+#include "tests/support/call_observer.h"
 #include "tests/support/failing_new.h"
 #include "tests/support/runtime_machine.h"
 

@@ -8,12 +8,12 @@
 #include <filesystem>
 #include <thread>
 
-#include "install/platform/intercept/ports.h"
 #include "install/platform/windows/run_journal.h"
 #include "install/src/registry/key_walk.h"
 #include "install/src/registry/registry_access.h"
 #include "install/src/services/management_service.h"
 #include "tests/support/backends.h"
+#include "tests/support/intercepted_ports.h"
 #include "tests/support/reg_text_store.h"
 
 extern "C" NTSTATUS NTAPI NtDeleteKey(HANDLE);

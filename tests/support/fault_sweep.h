@@ -7,8 +7,7 @@
 #include <optional>
 #include <string>
 
-#include "install/platform/intercept/fault_counter.h"
-#include "install/platform/intercept/ports.h"
+#include "tests/support/intercepted_ports.h"
 #include "tests/support/machine.h"
 
 namespace kz7::test {

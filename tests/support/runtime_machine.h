@@ -10,12 +10,12 @@
 #include <string>
 #include <utility>
 
-#include "install/platform/intercept/ports.h"
 #include "install/platform/memory/installer_session.h"
 #include "install/platform/memory/platform.h"
 #include "install/runtime/observers/observers_end.h"
 #include "install/runtime/runtime_ports.h"
 #include "install/runtime/ure.h"
+#include "tests/support/intercepted_ports.h"
 
 namespace kz7::test {
 

@@ -7,11 +7,11 @@
 #include <type_traits>
 
 #include "install/platform/installer_session.h"
-#include "install/platform/intercept/argument_text.h"
-#include "install/platform/intercept/call_observer.h"
 #include "install/platform/platform.h"
+#include "tests/support/argument_text.h"
+#include "tests/support/call_observer.h"
 
-namespace kz7 {
+namespace kz7::test {
 
 // The common part of the decorators.
 template <typename Port>
@@ -168,4 +168,4 @@ private:
     InterceptedTerminal terminal_;
 };
 
-}  // namespace kz7
+}  // namespace kz7::test

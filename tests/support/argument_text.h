@@ -11,7 +11,7 @@
 #include "install/platform/service_manager.h"
 #include "install/platform/text.h"
 
-namespace kz7 {
+namespace kz7::test {
 
 inline std::string quotedText(std::string_view text) {
     return '"' + shownText(text) + '"';
@@ -51,4 +51,4 @@ std::string argumentText(const std::remove_reference_t<Parameter>& argument, boo
     }
 }
 
-}  // namespace kz7
+}  // namespace kz7::test
