@@ -5,8 +5,8 @@
 #include <string>
 #include <vector>
 
+#include "install/admin/front/command_words.h"
 #include "install/admin/front/front.h"
-#include "install/platform/command_line.h"
 #include "tests/support/machine.h"
 
 namespace kz7::test {

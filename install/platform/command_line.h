@@ -23,13 +23,6 @@ std::vector<CommandReading> commandReadings(std::string_view commandLine);
 // literal one.
 std::vector<std::string> splitArguments(std::string_view arguments);
 
-// The command line that splits into these words, the program first.
-std::string joinArguments(const std::vector<std::string>& words);
-
-// Whether these words reach the program unchanged. The command interpreter that runs a batch file interprets
-// quotation marks, percent signs, line ends and other control characters before the file gets them.
-bool canPassWords(const std::vector<std::string>& words);
-
 // Whether a program is a name without folder or drive, which is searched for.
 bool isBareName(std::string_view program);
 

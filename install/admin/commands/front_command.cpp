@@ -1,6 +1,7 @@
 #include <memory>
 
 #include "install/admin/commands/commands.h"
+#include "install/admin/front/command_words.h"
 #include "install/admin/front/front.h"
 #include "install/platform/command_line.h"
 #include "install/platform/memory/small_ports.h"

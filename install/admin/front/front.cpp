@@ -8,7 +8,7 @@
 #include <new>
 #include <numeric>
 
-#include "install/platform/command_line.h"
+#include "install/admin/front/command_words.h"
 #include "install/platform/encoding.h"
 #include "install/platform/text.h"
 
