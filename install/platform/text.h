@@ -75,16 +75,6 @@ private:
     std::size_t length_ = 0;                         // bytes
 };
 
-// Takes a character off a text that is not empty and returns the columns that it takes on a terminal: 0 for a combining
-// mark, 2 for a wide character of East Asia and for most emoji. A byte that is not part of a character takes one.
-std::uint32_t takeColumns(std::string_view& text);
-
-std::uint32_t columnsOf(std::string_view text);
-
-// Takes the next line of at most `columns` columns off a text, broken at a blank if it has one; with 0 columns it
-// is not broken.
-std::string_view takeWrappedLine(std::string_view& text, std::uint32_t columns);
-
 // Appends the last `digits` hexadecimal digits of a number, in lower case.
 void appendHex(std::uint64_t number, int digits, std::string& text);
 

@@ -5,6 +5,7 @@
 #include <string_view>
 
 #include "install/platform/text.h"
+#include "install/runtime/observers/text_columns.h"
 
 namespace kz7 {
 namespace {

@@ -3,6 +3,7 @@
 #include <algorithm>
 
 #include "install/platform/text.h"
+#include "install/runtime/observers/text_columns.h"
 
 namespace kz7 {
 namespace {

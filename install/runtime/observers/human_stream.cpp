@@ -6,6 +6,7 @@
 
 #include "install/platform/text.h"
 #include "install/runtime/observers/external_output_pipe.h"
+#include "install/runtime/observers/text_columns.h"
 
 namespace kz7 {
 namespace {
