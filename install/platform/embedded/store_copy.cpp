@@ -1,6 +1,7 @@
 #include "install/platform/embedded/store_copy.h"
 
 #include <fcntl.h>
+#include <sys/sendfile.h>
 #include <sys/stat.h>
 
 #include <array>
@@ -13,6 +14,7 @@ namespace kz7 {
 namespace {
 
 constexpr int kTries = 20;
+constexpr std::size_t kMostAtOnce = 0x7FFFF000;  // bytes of one call
 constexpr const char* kLogSuffix = "-wal";
 constexpr const char* kSuffixes[] = {"", kLogSuffix, "-shm", "-journal"};
 
@@ -38,17 +40,11 @@ int copyFile(const std::string& from, const std::string& to) {
     if (!target) {
         return errno;
     }
-    std::vector<char> piece(std::size_t{1} << 16);
-    for (;;) {
-        const ssize_t count = read(source.get(), piece.data(), piece.size());
-        if (count == 0) {
-            return 0;
-        }
-        if (count < 0 ? errno != EINTR
-                      : !writeAll(target.get(), {piece.data(), static_cast<std::size_t>(count)}).empty()) {
-            return errno;
-        }
-    }
+    ssize_t count = 0;
+    do {
+        count = sendfile(target.get(), source.get(), nullptr, kMostAtOnce);
+    } while (count > 0 || (count == -1 && errno == EINTR));
+    return count == 0 ? 0 : errno;
 }
 
 }  // namespace
