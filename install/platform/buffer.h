@@ -29,26 +29,23 @@ struct Buffer {
     bool refused = false;    // the data exceed the limit
 };
 
-// Room for that many bytes, texts included.
-template <std::uint32_t Bytes>
-struct FixedBuffer : Buffer {
-    FixedBuffer() : Buffer(nullptr, Bytes) { data = room_.data(); }
-    FixedBuffer(const FixedBuffer&) = delete;
-    FixedBuffer& operator=(const FixedBuffer&) = delete;
+// A buffer with its room.
+template <std::uint32_t Bytes, std::uint32_t Limit>
+struct RoomBuffer : Buffer {
+    RoomBuffer() : Buffer(nullptr, Bytes, Limit) { data = room_.data(); }
+    RoomBuffer(const RoomBuffer&) = delete;
+    RoomBuffer& operator=(const RoomBuffer&) = delete;
 
 private:
     std::array<char, Bytes> room_{};
 };
 
+// Room for that many bytes, texts included.
+template <std::uint32_t Bytes>
+using FixedBuffer = RoomBuffer<Bytes, Bytes>;
+
 // Room for a text of that many characters with its NUL, or for as many bytes of other data.
 template <std::uint32_t Characters>
-struct TextBuffer : Buffer {
-    TextBuffer() : Buffer(nullptr, kBytesOfCharacter * Characters, Characters) { data = room_.data(); }
-    TextBuffer(const TextBuffer&) = delete;
-    TextBuffer& operator=(const TextBuffer&) = delete;
-
-private:
-    std::array<char, std::size_t{kBytesOfCharacter} * Characters> room_{};
-};
+using TextBuffer = RoomBuffer<kBytesOfCharacter * Characters, Characters>;
 
 }  // namespace kz7

@@ -55,13 +55,7 @@ public:
     virtual std::string shownPath(std::string_view path) = 0;
 };
 
-struct FileTraits {
-    using Port = IFileSystem;
-    using Handle = FileHandle;
-    static constexpr Handle kNone = FileHandle::none;
-    static void close(Port& port, Handle file) { port.closeFile(file); }
-};
-using OwnedFile = OwnedHandle<FileTraits>;
+using OwnedFile = OwnedHandle<PortTraits<IFileSystem, FileHandle, &IFileSystem::closeFile>>;
 
 // Finds the first file, in name order, that matches a pattern: a path whose last name may contain '?' for any one
 // character. Ignores case. `name` is without the folder. kFileNotFound: no file matches.

@@ -96,12 +96,6 @@ public:
 // The session of the handle that a custom action was called with; the installer keeps owning it. Windows only.
 std::unique_ptr<IInstallerSession> hostInstallerSession(std::uint32_t installation);
 
-struct SessionTraits {
-    using Port = IInstallerSession;
-    using Handle = SessionHandle;
-    static constexpr Handle kNone = SessionHandle::none;
-    static void close(Port& port, Handle handle) { port.closeHandle(handle); }
-};
-using OwnedSessionHandle = OwnedHandle<SessionTraits>;
+using OwnedSessionHandle = OwnedHandle<PortTraits<IInstallerSession, SessionHandle, &IInstallerSession::closeHandle>>;
 
 }  // namespace kz7

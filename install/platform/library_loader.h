@@ -30,12 +30,6 @@ public:
     virtual Status free(LibraryHandle library) = 0;
 };
 
-struct LibraryTraits {
-    using Port = ILibraryLoader;
-    using Handle = LibraryHandle;
-    static constexpr Handle kNone = LibraryHandle::none;
-    static void close(Port& port, Handle library) { port.free(library); }
-};
-using OwnedLibrary = OwnedHandle<LibraryTraits>;
+using OwnedLibrary = OwnedHandle<PortTraits<ILibraryLoader, LibraryHandle, &ILibraryLoader::free>>;
 
 }  // namespace kz7

@@ -50,4 +50,13 @@ private:
     Handle handle_ = Traits::kNone;
 };
 
+// The traits of a handle that an operation of its port closes.
+template <typename PortType, typename HandleType, auto closeOperation>
+struct PortTraits {
+    using Port = PortType;
+    using Handle = HandleType;
+    static constexpr Handle kNone = Handle::none;
+    static void close(Port& port, Handle handle) { (port.*closeOperation)(handle); }
+};
+
 }  // namespace kz7

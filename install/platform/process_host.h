@@ -86,12 +86,6 @@ public:
     virtual Status shortPath(std::string_view path, Buffer& shortened) = 0;
 };
 
-struct StreamTraits {
-    using Port = IProcessHost;
-    using Handle = StreamHandle;
-    static constexpr Handle kNone = StreamHandle::none;
-    static void close(Port& port, Handle stream) { port.closeStream(stream); }
-};
-using OwnedStream = OwnedHandle<StreamTraits>;
+using OwnedStream = OwnedHandle<PortTraits<IProcessHost, StreamHandle, &IProcessHost::closeStream>>;
 
 }  // namespace kz7

@@ -116,12 +116,6 @@ public:
     virtual Status commit() = 0;
 };
 
-struct KeyTraits {
-    using Port = IRegistryStore;
-    using Handle = KeyHandle;
-    static constexpr Handle kNone = KeyHandle::none;
-    static void close(Port& port, Handle key) { port.closeKey(key); }
-};
-using OwnedKey = OwnedHandle<KeyTraits>;
+using OwnedKey = OwnedHandle<PortTraits<IRegistryStore, KeyHandle, &IRegistryStore::closeKey>>;
 
 }  // namespace kz7

@@ -100,12 +100,6 @@ public:
     virtual Status closeHandle(ServiceHandle handle) = 0;
 };
 
-struct ServiceTraits {
-    using Port = IServiceManager;
-    using Handle = ServiceHandle;
-    static constexpr Handle kNone = ServiceHandle::none;
-    static void close(Port& port, Handle handle) { port.closeHandle(handle); }
-};
-using OwnedService = OwnedHandle<ServiceTraits>;
+using OwnedService = OwnedHandle<PortTraits<IServiceManager, ServiceHandle, &IServiceManager::closeHandle>>;
 
 }  // namespace kz7
