@@ -51,25 +51,13 @@ std::vector<ServiceValue> serviceValues(const ServiceDefinition& definition,
     return values;
 }
 
-ServiceHandle ServiceRecords::giveOut(std::string recordPath, std::uint32_t access) {
-    const ServiceHandle handle{lastHandle_ + 1};
-    open_[handle] = {std::move(recordPath), access};
-    ++lastHandle_;
-    return handle;
-}
-
-ServiceRecords::Open* ServiceRecords::slotOf(ServiceHandle handle) {
-    const auto found = open_.find(handle);
-    return found == open_.end() ? nullptr : &found->second;
-}
-
 Status ServiceRecords::managerOf(ServiceHandle handle) {
-    const Open* open = slotOf(handle);
+    const Open* open = open_.find(handle);
     return open == nullptr || !open->recordPath.empty() ? kInvalidHandle : kSuccess;
 }
 
 Status ServiceRecords::recordOf(ServiceHandle handle, std::uint32_t needed, OwnedKey& record) {
-    const Open* open = slotOf(handle);
+    const Open* open = open_.find(handle);
     if (open == nullptr || open->recordPath.empty()) {
         return kInvalidHandle;
     }
@@ -85,7 +73,7 @@ Status ServiceRecords::recordOf(ServiceHandle handle, std::uint32_t needed, Owne
 }
 
 Status ServiceRecords::openManager(std::uint32_t access, ServiceHandle& manager) {
-    manager = giveOut({}, access);
+    manager = open_.give({{}, access});
     return kSuccess;
 }
 
@@ -114,7 +102,7 @@ Status ServiceRecords::createService(ServiceHandle manager, const ServiceDefinit
     }
     status = status == kSuccess ? writeRecord(registry_, record.get(), definition) : status;
     if (status == kSuccess) {
-        service = giveOut(path, kServiceAllAccess);
+        service = open_.give({path, kServiceAllAccess});
     }
     return status;
 }
@@ -139,7 +127,7 @@ Status ServiceRecords::openService(ServiceHandle manager, std::string_view name,
     if (status != kSuccess) {
         return isNotFound(status) ? kServiceDoesNotExist : status;
     }
-    service = giveOut(path, access);
+    service = open_.give({path, access});
     return kSuccess;
 }
 
@@ -237,7 +225,7 @@ Status ServiceRecords::deleteService(ServiceHandle service) {
     if (status != kSuccess) {
         return status;
     }
-    const std::string path = slotOf(service)->recordPath;
+    const std::string path = open_.find(service)->recordPath;
     status = deleteRecord(path);
     if (status == kSuccess) {
         for (auto& [handle, open] : open_) {
@@ -248,7 +236,7 @@ Status ServiceRecords::deleteService(ServiceHandle service) {
 }
 
 Status ServiceRecords::closeHandle(ServiceHandle handle) {
-    return open_.erase(handle) != 0 ? kSuccess : kInvalidHandle;
+    return open_.close(handle) ? kSuccess : kInvalidHandle;
 }
 
 }  // namespace kz7

@@ -3,12 +3,12 @@
 #pragma once
 
 #include <initializer_list>
-#include <map>
 #include <string>
 #include <string_view>
 #include <vector>
 
 #include "install/platform/file_system.h"
+#include "install/platform/handle_table.h"
 #include "install/platform/registry_store.h"
 #include "install/platform/service_manager.h"
 
@@ -55,8 +55,6 @@ private:
         bool deleted = false;
     };
 
-    ServiceHandle giveOut(std::string recordPath, std::uint32_t access);
-    Open* slotOf(ServiceHandle handle);
     Status managerOf(ServiceHandle handle);
     // The record of a handle that has the required rights.
     Status recordOf(ServiceHandle handle, std::uint32_t needed, OwnedKey& record);
@@ -66,8 +64,7 @@ private:
 
     IRegistryStore& registry_;
     IFileSystem& files_;
-    std::map<ServiceHandle, Open> open_;
-    std::uint64_t lastHandle_ = 0;
+    HandleTable<ServiceHandle, Open> open_;
 };
 
 }  // namespace kz7

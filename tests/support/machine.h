@@ -24,7 +24,7 @@ public:
     ~Machine() override {
         EXPECT_EQ(registry_.openHandles(), 0U);
         EXPECT_EQ(processes_.openHandles() + threads_.openHandles(), 0U);
-        EXPECT_TRUE(libraries_.loaded.empty());
+        EXPECT_EQ(libraries_.loaded.size(), 0U);
         EXPECT_LE(services_.openHandles(), servicesLeftOpen);
     }
 

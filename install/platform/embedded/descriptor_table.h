@@ -3,10 +3,10 @@
 #pragma once
 
 #include <cstdint>
-#include <map>
 #include <mutex>
 
 #include "install/platform/embedded/descriptor.h"
+#include "install/platform/handle_table.h"
 
 namespace kz7 {
 
@@ -15,39 +15,32 @@ template <class Handle>
 class DescriptorTable {
 public:
     // Handles up to `taken` are reserved.
-    explicit DescriptorTable(std::uint64_t taken = 0) : last_(taken) {}
+    explicit DescriptorTable(std::uint64_t taken = 0) : open_(taken) {}
 
     Handle give(OwnedDescriptor descriptor) {
         const std::lock_guard<std::mutex> held(lock_);
-        const Handle handle{last_ + 1};
-        open_.emplace(handle, std::move(descriptor));
-        ++last_;
-        return handle;
+        return open_.give(std::move(descriptor));
     }
 
     // -1 if the handle is not in the table; system calls refuse that descriptor.
     int find(Handle handle) {
         const std::lock_guard<std::mutex> held(lock_);
-        const auto found = open_.find(handle);
-        return found != open_.end() ? found->second.get() : -1;
+        const OwnedDescriptor* const found = open_.find(handle);
+        return found != nullptr ? found->get() : -1;
     }
 
     // Removes a descriptor from the table and returns it.
     OwnedDescriptor take(Handle handle) {
         const std::lock_guard<std::mutex> held(lock_);
-        const auto found = open_.find(handle);
-        OwnedDescriptor taken;
-        if (found != open_.end()) {
-            taken = std::move(found->second);
-            open_.erase(found);
-        }
+        OwnedDescriptor* const found = open_.find(handle);
+        OwnedDescriptor taken = found != nullptr ? std::move(*found) : OwnedDescriptor();
+        open_.close(handle);
         return taken;
     }
 
 private:
     std::mutex lock_;
-    std::map<Handle, OwnedDescriptor> open_;
-    std::uint64_t last_;
+    HandleTable<Handle, OwnedDescriptor> open_;
 };
 
 }  // namespace kz7

@@ -17,7 +17,6 @@
 #include <climits>
 #include <csignal>
 #include <cstdlib>
-#include <map>
 #include <memory>
 #include <string>
 #include <utility>
@@ -306,7 +305,7 @@ public:
     }
 
     Status waitProcess(ProcessHandle process, std::uint32_t milliseconds) override {
-        Child* child = childOf(process);
+        Child* child = children_.find(process);
         if (child == nullptr) {
             return kInvalidHandle;
         }
@@ -320,7 +319,7 @@ public:
     }
 
     Status exitCode(ProcessHandle process, std::uint32_t& code) override {
-        Child* child = childOf(process);
+        Child* child = children_.find(process);
         if (child == nullptr) {
             return kInvalidHandle;
         }
@@ -333,14 +332,14 @@ public:
     }
 
     Status closeProcess(ProcessHandle process) override {
-        Child* child = childOf(process);
+        Child* child = children_.find(process);
         if (child == nullptr) {
             return kInvalidHandle;
         }
         if (takeEnding(*child, WNOHANG) == kWaitTimedOut) {
             collectLater(child->id);
         }
-        children_.erase(process);
+        children_.close(process);
         return kSuccess;
     }
 
@@ -352,11 +351,6 @@ private:
         bool ended = false;
         std::uint32_t exitCode = kExitCodeRunning;
     };
-
-    Child* childOf(ProcessHandle process) {
-        const auto found = children_.find(process);
-        return found != children_.end() ? &found->second : nullptr;
-    }
 
     Status takeEnding(Child& child, int options) {
         if (child.ended) {
@@ -405,11 +399,11 @@ private:
             }
         }
         // The entry is made first, so that no running child is without one.
-        const ProcessHandle process{++lastProcess_};
-        Child& child = children_[process];
+        const ProcessHandle process = children_.give({});
+        Child& child = *children_.find(process);
         const int error = plan.run(child.id, file.c_str(), directory, argv.data());
         if (error != 0) {
-            children_.erase(process);
+            children_.close(process);
             return isNoProgram(error) ? kFileNotFound : statusOf(error);
         }
         const auto id = static_cast<std::uint32_t>(child.id);
@@ -420,8 +414,7 @@ private:
     std::string stateDirectory_;
     std::array<StreamHandle, 2> slots_;
     DescriptorTable<StreamHandle> streams_;
-    std::map<ProcessHandle, Child> children_;
-    std::uint64_t lastProcess_ = 0;
+    HandleTable<ProcessHandle, Child> children_;
 };
 
 }  // namespace

@@ -8,7 +8,8 @@
 #include <algorithm>
 #include <climits>
 #include <csignal>
-#include <map>
+
+#include "install/platform/handle_table.h"
 
 namespace kz7 {
 namespace {
@@ -29,45 +30,44 @@ public:
         if (makeThreadAttributes(stackBytes, attributes) != 0) {
             return kOutOfMemory;
         }
-        const ThreadHandle handle{lastId_ + 1};
-        Thread& entry = threads_[handle];
+        const ThreadHandle handle = threads_.give({});
         const auto enter = [](void* given) -> void* {
             ThreadStart::run(given);
             return nullptr;
         };
-        const int error = pthread_create(&entry.id, &attributes, enter, record.get());
+        const int error = pthread_create(&threads_.find(handle)->id, &attributes, enter, record.get());
         pthread_attr_destroy(&attributes);
         if (error != 0) {
-            threads_.erase(handle);
+            threads_.close(handle);
             return kTooManyThreads;
         }
         static_cast<void>(record.release());
-        id = ++lastId_;
+        id = static_cast<std::uint32_t>(handle);
         thread = handle;
         return kSuccess;
     }
 
     Status waitThread(ThreadHandle thread) override {
-        const auto found = threads_.find(thread);
-        if (found == threads_.end()) {
+        Thread* const found = threads_.find(thread);
+        if (found == nullptr) {
             return kInvalidHandle;
         }
-        if (!found->second.joined && pthread_join(found->second.id, nullptr) != 0) {
+        if (!found->joined && pthread_join(found->id, nullptr) != 0) {
             return kInvalidHandle;
         }
-        found->second.joined = true;
+        found->joined = true;
         return kSuccess;
     }
 
     Status closeThread(ThreadHandle thread) override {
-        const auto found = threads_.find(thread);
-        if (found == threads_.end()) {
+        Thread* const found = threads_.find(thread);
+        if (found == nullptr) {
             return kInvalidHandle;
         }
-        if (!found->second.joined) {
-            pthread_detach(found->second.id);
+        if (!found->joined) {
+            pthread_detach(found->id);
         }
-        threads_.erase(found);
+        threads_.close(thread);
         return kSuccess;
     }
 
@@ -77,8 +77,7 @@ private:
         bool joined = false;
     };
 
-    std::map<ThreadHandle, Thread> threads_;
-    std::uint32_t lastId_ = 0;
+    HandleTable<ThreadHandle, Thread> threads_;
 };
 
 }  // namespace

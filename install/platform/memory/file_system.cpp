@@ -62,26 +62,25 @@ Status MemoryFileSystem::openForAppend(std::string_view path, FileHandle& file) 
     if (files_.at(key)->isFolder) {
         return kAccessDenied;
     }
-    file = FileHandle{++lastHandle_};
-    open_.emplace(file, files_.at(key));
+    file = open_.give(files_.at(key));
     return kSuccess;
 }
 
 Status MemoryFileSystem::write(FileHandle file, std::string_view data, std::uint32_t& written) {
     written = 0;
-    const auto found = open_.find(file);
-    if (found == open_.end()) {
+    const auto* const open = open_.find(file);
+    if (open == nullptr) {
         return kInvalidHandle;
     }
     const std::string_view taken = data.substr(0, room);
-    found->second->content += taken;
+    (*open)->content += taken;
     room -= taken.size();
     written = static_cast<std::uint32_t>(taken.size());
     return taken.size() == data.size() ? kSuccess : kDiskFull;
 }
 
 Status MemoryFileSystem::closeFile(FileHandle file) {
-    return open_.erase(file) != 0 ? kSuccess : kInvalidHandle;
+    return open_.close(file) ? kSuccess : kInvalidHandle;
 }
 
 Status MemoryFileSystem::writeFile(std::string_view path, std::string_view content, bool replace) {
@@ -96,7 +95,7 @@ Status MemoryFileSystem::writeFile(std::string_view path, std::string_view conte
     OwnedFile file(*this);
     const Status status = openForAppend(path, file.receive());
     if (status == kSuccess) {
-        open_.at(file.get())->content = content;
+        (*open_.find(file.get()))->content = content;
         room -= content.size();
     }
     return status == kFileNotFound ? kBadPathname : status;

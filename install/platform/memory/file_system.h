@@ -7,6 +7,7 @@
 #include <string>
 
 #include "install/platform/file_system.h"
+#include "install/platform/handle_table.h"
 
 namespace kz7 {
 
@@ -43,8 +44,7 @@ private:
     };
 
     std::map<std::string, std::shared_ptr<File>> files_;  // and folders, by folded path
-    std::map<FileHandle, std::shared_ptr<File>> open_;
-    std::uint64_t lastHandle_ = 0;
+    HandleTable<FileHandle, std::shared_ptr<File>> open_;
 };
 
 }  // namespace kz7

@@ -20,38 +20,32 @@ Status MemoryProcessHost::setSlot(StandardSlot slot, StreamHandle stream) {
     return kSuccess;
 }
 
-StreamHandle MemoryProcessHost::giveOut(Stream stream) {
-    const StreamHandle handle{++lastToken_};
-    streams_.emplace(handle, std::move(stream));
-    return handle;
-}
-
 Status MemoryProcessHost::createPipe(StreamHandle& readEnd, StreamHandle& writeEnd) {
     const auto pipe = std::make_shared<Pipe>();
     const auto reader = std::make_shared<End>();
     const auto writer = std::make_shared<End>();
     pipe->readers = reader;
     pipe->writers = writer;
-    readEnd = giveOut({pipe, reader});
-    writeEnd = giveOut({pipe, writer});
+    readEnd = streams_.give({pipe, reader});
+    writeEnd = streams_.give({pipe, writer});
     return kSuccess;
 }
 
 Status MemoryProcessHost::duplicate(StreamHandle stream, StreamHandle& copy) {
-    const auto found = streams_.find(stream);
-    if (found == streams_.end()) {
+    const Stream* const found = streams_.find(stream);
+    if (found == nullptr) {
         return kInvalidHandle;
     }
-    copy = giveOut(found->second);
+    copy = streams_.give(*found);
     return kSuccess;
 }
 
 Status MemoryProcessHost::read(StreamHandle stream, Buffer& data) {
-    const auto found = streams_.find(stream);
-    if (found == streams_.end()) {
+    const Stream* const found = streams_.find(stream);
+    if (found == nullptr) {
         return kInvalidHandle;
     }
-    Pipe& pipe = *found->second.pipe;
+    Pipe& pipe = *found->pipe;
     if (pipe.bytes.empty()) {
         return pipe.writers.expired() ? kBrokenPipe : kWaitTimedOut;
     }
@@ -61,11 +55,11 @@ Status MemoryProcessHost::read(StreamHandle stream, Buffer& data) {
 }
 
 Status MemoryProcessHost::write(StreamHandle stream, std::string_view data) {
-    const auto found = streams_.find(stream);
-    if (found == streams_.end()) {
+    const Stream* const found = streams_.find(stream);
+    if (found == nullptr) {
         return kInvalidHandle;
     }
-    Pipe& pipe = *found->second.pipe;
+    Pipe& pipe = *found->pipe;
     if (pipe.readers.expired()) {
         return kPipeClosing;
     }
@@ -74,7 +68,7 @@ Status MemoryProcessHost::write(StreamHandle stream, std::string_view data) {
 }
 
 Status MemoryProcessHost::closeStream(StreamHandle stream) {
-    return streams_.erase(stream) != 0 ? kSuccess : kInvalidHandle;
+    return streams_.close(stream) ? kSuccess : kInvalidHandle;
 }
 
 const ScriptedProgram* MemoryProcessHost::find(std::string_view commandLine) const {
@@ -96,43 +90,41 @@ Status MemoryProcessHost::startProcess(const ProcessStart& start, ProcessInforma
     Child child{program->exitCode, program->runsOn, {}};
     for (const auto& [stream, text] : {std::pair{start.output, &program->output}, {start.error, &program->error}}) {
         write(stream, *text);
-        const auto found = streams_.find(stream);
-        if (program->runsOn && found != streams_.end()) {
-            child.held.push_back(found->second);
+        const Stream* const found = streams_.find(stream);
+        if (program->runsOn && found != nullptr) {
+            child.held.push_back(*found);
         }
     }
-    const ProcessHandle process{++lastToken_};
-    children_.emplace(process, std::move(child));
-    const auto id = static_cast<std::uint32_t>(lastToken_);
+    const ProcessHandle process = children_.give(std::move(child));
+    const auto id = static_cast<std::uint32_t>(process);
     information = {process, ProcessHandle::none, id, id};
     return kSuccess;
 }
 
 Status MemoryProcessHost::waitProcess(ProcessHandle process, std::uint32_t milliseconds) {
-    const auto found = children_.find(process);
-    if (found == children_.end()) {
+    Child* const child = children_.find(process);
+    if (child == nullptr) {
         return kInvalidHandle;
     }
-    Child& child = found->second;
-    if (child.runsOn && milliseconds != kInfiniteWait) {
+    if (child->runsOn && milliseconds != kInfiniteWait) {
         return kWaitTimedOut;
     }
-    child.runsOn = false;
-    child.held.clear();
+    child->runsOn = false;
+    child->held.clear();
     return kSuccess;
 }
 
 Status MemoryProcessHost::exitCode(ProcessHandle process, std::uint32_t& code) {
-    const auto found = children_.find(process);
-    if (found == children_.end()) {
+    const Child* const child = children_.find(process);
+    if (child == nullptr) {
         return kInvalidHandle;
     }
-    code = found->second.runsOn ? kExitCodeRunning : found->second.exitCode;
+    code = child->runsOn ? kExitCodeRunning : child->exitCode;
     return kSuccess;
 }
 
 Status MemoryProcessHost::closeProcess(ProcessHandle process) {
-    return children_.erase(process) != 0 ? kSuccess : kInvalidHandle;
+    return children_.close(process) ? kSuccess : kInvalidHandle;
 }
 
 Status MemoryProcessHost::shortPath(std::string_view path, Buffer& shortened) {

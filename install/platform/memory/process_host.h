@@ -9,6 +9,7 @@
 #include <string>
 #include <vector>
 
+#include "install/platform/handle_table.h"
 #include "install/platform/process_host.h"
 
 namespace kz7 {
@@ -65,13 +66,11 @@ private:
     };
 
     const ScriptedProgram* find(std::string_view commandLine) const;
-    StreamHandle giveOut(Stream stream);
 
     std::map<std::string, ScriptedProgram> programs_;  // by upper-cased path
     std::array<StreamHandle, 2> slots_{StreamHandle{1}, StreamHandle{2}};
-    std::map<StreamHandle, Stream> streams_;
-    std::map<ProcessHandle, Child> children_;
-    std::uint64_t lastToken_ = 2;
+    HandleTable<StreamHandle, Stream> streams_{2};
+    HandleTable<ProcessHandle, Child> children_;
 };
 
 }  // namespace kz7

@@ -18,7 +18,7 @@ MemoryRegistry::MemoryRegistry()
     : machine_(std::make_shared<Node>()),
       users_(std::make_shared<Node>()),
       noUser_(std::make_shared<Node>()),
-      lastHandle_(kFirstHandle) {}
+      open_(kFirstHandle) {}
 
 std::vector<MemoryRegistry::NodePointer>::iterator MemoryRegistry::lowerBound(Node& parent, std::string_view fold) {
     return std::lower_bound(parent.subkeys.begin(), parent.subkeys.end(), fold,
@@ -56,17 +56,17 @@ Status MemoryRegistry::nodeOf(KeyHandle handle, AccessMask needed, NodePointer& 
         default:
             break;
     }
-    const auto open = open_.find(handle);
-    if (open == open_.end()) {
+    const OpenKey* const open = open_.find(handle);
+    if (open == nullptr) {
         return kInvalidHandle;
     }
-    if (open->second.node->deleted) {
+    if (open->node->deleted) {
         return kKeyDeleted;
     }
-    if ((open->second.access & needed) != needed) {
+    if ((open->access & needed) != needed) {
         return kAccessDenied;
     }
-    node = open->second.node;
+    node = open->node;
     return kSuccess;
 }
 
@@ -89,17 +89,11 @@ MemoryRegistry::NodePointer MemoryRegistry::writable(const NodePointer& node) {
     return node == noUser_ ? child(*users_, kCallersSid, true) : node;
 }
 
-KeyHandle MemoryRegistry::giveOut(NodePointer node, AccessMask access) {
-    const auto handle = static_cast<KeyHandle>(++lastHandle_);
-    open_.emplace(handle, OpenKey{std::move(node), grantedAccess(access)});
-    return handle;
-}
-
 Status MemoryRegistry::openKey(KeyHandle parent, std::string_view path, AccessMask access, KeyHandle& key) {
     NodePointer node;
     const Status status = find(parent, path, access, node);
     if (status == kSuccess) {
-        key = giveOut(std::move(node), access);
+        key = open_.give({std::move(node), grantedAccess(access)});
     }
     return status;
 }
@@ -120,14 +114,14 @@ Status MemoryRegistry::createKey(KeyHandle parent, std::string_view path, std::s
         node->keyClass = keyClass;
     }
     if (status == kSuccess) {
-        key = giveOut(std::move(node), access);
+        key = open_.give({std::move(node), grantedAccess(access)});
     }
     return status;
 }
 
 Status MemoryRegistry::closeKey(KeyHandle key) {
     const bool isRoot = key == KeyHandle::localMachine || key == KeyHandle::users || key == KeyHandle::currentUser;
-    return isRoot || open_.erase(key) != 0 ? kSuccess : kInvalidHandle;
+    return isRoot || open_.close(key) ? kSuccess : kInvalidHandle;
 }
 
 Status MemoryRegistry::nodeForValue(KeyHandle key, AccessMask needed, std::string_view name, NodePointer& node) {

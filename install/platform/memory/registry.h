@@ -7,6 +7,7 @@
 #include <string>
 #include <vector>
 
+#include "install/platform/handle_table.h"
 #include "install/platform/registry_store.h"
 
 namespace kz7 {
@@ -63,13 +64,11 @@ private:
     Status nodeOf(KeyHandle handle, AccessMask needed, NodePointer& node);
     Status nodeForValue(KeyHandle key, AccessMask needed, std::string_view name, NodePointer& node);
     Status find(KeyHandle parent, std::string_view path, AccessMask access, NodePointer& node);
-    KeyHandle giveOut(NodePointer node, AccessMask access);
 
     NodePointer machine_;
     NodePointer users_;
     NodePointer noUser_;  // represents the caller's key while it does not exist
-    std::map<KeyHandle, OpenKey> open_;
-    std::uint64_t lastHandle_;
+    HandleTable<KeyHandle, OpenKey> open_;
     std::uint64_t lastPlace_ = 0;
     std::size_t commits_ = 0;
 };

@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "install/platform/console.h"
+#include "install/platform/handle_table.h"
 #include "install/platform/host_information.h"
 #include "install/platform/library_loader.h"
 #include "install/platform/registry_path.h"
@@ -96,32 +97,30 @@ class MemoryThreads final : public IThreads {
 public:
     Status startThread(std::unique_ptr<ThreadStart>& record, std::uint32_t, std::uint32_t& id,
                        ThreadHandle& thread) override {
-        id = ++lastId_;
-        thread = ThreadHandle{lastId_};
-        threads_.emplace(thread, std::move(record));
+        thread = threads_.give(std::move(record));
+        id = static_cast<std::uint32_t>(thread);
         return kSuccess;
     }
     Status waitThread(ThreadHandle thread) override {
-        const auto found = threads_.find(thread);
-        if (found == threads_.end()) {
+        auto* const found = threads_.find(thread);
+        if (found == nullptr) {
             return kInvalidHandle;
         }
-        if (found->second != nullptr) {
-            ThreadStart::run(found->second.release());
+        if (*found != nullptr) {
+            ThreadStart::run(found->release());
         }
         return kSuccess;
     }
     Status closeThread(ThreadHandle thread) override {
         const Status status = waitThread(thread);
-        threads_.erase(thread);
+        threads_.close(thread);
         return status;
     }
 
     std::size_t openHandles() const { return threads_.size(); }
 
 private:
-    std::map<ThreadHandle, std::unique_ptr<ThreadStart>> threads_;  // null: it has run
-    std::uint32_t lastId_ = 0;
+    HandleTable<ThreadHandle, std::unique_ptr<ThreadStart>> threads_;  // null: it has run
 };
 
 // Entry points of this program, by the path of their library and their name.
@@ -134,29 +133,25 @@ public:
         if (found == libraries.end()) {
             return kModuleNotFound;
         }
-        library = static_cast<LibraryHandle>(++last_);
-        loaded.emplace(library, &found->second);
+        library = loaded.give(&found->second);
         return kSuccess;
     }
     Status resolve(LibraryHandle library, std::string_view name, LibraryFunction& function) override {
-        const auto open = loaded.find(library);
-        if (open == loaded.end()) {
+        const Entries* const* const open = loaded.find(library);
+        if (open == nullptr) {
             return kInvalidHandle;
         }
-        const auto entry = open->second->find(std::string(name));
-        if (entry == open->second->end()) {
+        const auto entry = (*open)->find(std::string(name));
+        if (entry == (*open)->end()) {
             return kProcedureNotFound;
         }
         function = entry->second;
         return kSuccess;
     }
-    Status free(LibraryHandle library) override { return loaded.erase(library) == 1 ? kSuccess : kInvalidHandle; }
+    Status free(LibraryHandle library) override { return loaded.close(library) ? kSuccess : kInvalidHandle; }
 
-    std::map<std::string, Entries> libraries;        // by path
-    std::map<LibraryHandle, const Entries*> loaded;  // and not freed yet
-
-private:
-    std::uint64_t last_ = 0;
+    std::map<std::string, Entries> libraries;           // by path
+    HandleTable<LibraryHandle, const Entries*> loaded;  // and not freed yet
 };
 
 }  // namespace kz7
