@@ -487,6 +487,24 @@ void EmbeddedRegistry::rememberPath(KeyId parent, std::string_view path, KeyId i
     knownPaths_[nextKnownPath_++ % knownPaths_.size()] = {transaction_, parent, id, std::string(path)};
 }
 
+// Follows the names of a path from the key that is found so far.
+Status EmbeddedRegistry::descend(std::string_view rest, bool create, std::string_view keyClass, Found& found) {
+    std::string_view name;
+    while (takeName(rest, name)) {
+        found.parent = found.id;
+        found.fold = foldUpper(name);
+        Status status = child(found.parent, found.fold, found.id);
+        if (isNotFound(status) && create) {
+            const bool last = rest.find_first_not_of('\\') == std::string_view::npos;
+            status = addChild(found.parent, name, found.fold, last ? keyClass : std::string_view{}, found.id);
+        }
+        if (status != kSuccess) {
+            return status;
+        }
+    }
+    return kSuccess;
+}
+
 Status EmbeddedRegistry::find(KeyHandle parent, std::string_view path, AccessMask access, bool create,
                               std::string_view keyClass, Found& found) {
     if (const Status status = checkKeyPath(path); status != kSuccess) {
@@ -502,7 +520,6 @@ Status EmbeddedRegistry::find(KeyHandle parent, std::string_view path, AccessMas
     found.id = base->id;
     const std::string plain = plainKeyPath(parent, path, access);
     std::string_view rest = plain;
-    std::string_view name;
     // A run opens many keys below the same one.
     const std::size_t end = plain.find_last_of('\\');
     const std::string_view above = std::string_view(plain).substr(0, end == std::string::npos ? 0 : end);
@@ -511,17 +528,8 @@ Status EmbeddedRegistry::find(KeyHandle parent, std::string_view path, AccessMas
         found.id = known->id;
         rest.remove_prefix(end);
     }
-    while (takeName(rest, name)) {
-        found.parent = found.id;
-        found.fold = foldUpper(name);
-        Status status = child(found.parent, found.fold, found.id);
-        if (isNotFound(status) && create) {
-            const bool last = rest.find_first_not_of('\\') == std::string_view::npos;
-            status = addChild(found.parent, name, found.fold, last ? keyClass : std::string_view{}, found.id);
-        }
-        if (status != kSuccess) {
-            return status;
-        }
+    if (const Status status = descend(rest, create, keyClass, found); status != kSuccess) {
+        return status;
     }
     if (known == nullptr && !above.empty() && end + 1 != plain.size()) {
         rememberPath(base->id, above, found.parent);
@@ -693,6 +701,26 @@ Status EmbeddedRegistry::readAhead(const OpenKey& open, std::uint32_t skip, std:
     return result == SQLITE_DONE ? kSuccess : fail(result);
 }
 
+// Makes the item that is `skip` behind the current one the next of those read ahead.
+template <typename Place>
+Status EmbeddedRegistry::advance(const OpenKey& open, Place& place, std::uint32_t skip) {
+    if (place.next + skip < place.ahead.size()) {
+        place.next += skip;
+        return kSuccess;
+    }
+    if (place.isLast && !place.ahead.empty()) {
+        return kNoMoreItems;
+    }
+    decltype(place.ahead) rows;
+    if (const Status status = readAhead(open, skip, rows); status != kSuccess || rows.empty()) {
+        return status != kSuccess ? status : kNoMoreItems;
+    }
+    place.isLast = rows.size() < kReadAhead;
+    place.ahead = std::move(rows);
+    place.next = 0;
+    return kSuccess;
+}
+
 Status EmbeddedRegistry::enumerateKey(KeyHandle key, std::uint32_t index, Buffer& name, Buffer* keyClass) {
     OpenKey* open = nullptr;
     if (const Status status = keyOf(key, kKeyEnumerateSubkeys, open); status != kSuccess) {
@@ -702,22 +730,9 @@ Status EmbeddedRegistry::enumerateKey(KeyHandle key, std::uint32_t index, Buffer
     if (index < place.index) {
         place = {};
     }
-    const std::uint32_t skip = index - place.index;
-    if (place.next + skip < place.ahead.size()) {
-        place.next += skip;
-    } else {
-        std::vector<Subkey> rows;
-        const bool isAtEnd = place.isLast && !place.ahead.empty();
-        if (const Status status = isAtEnd ? kSuccess : readAhead(*open, skip, rows); status != kSuccess) {
-            return status;
-        }
-        if (rows.empty()) {
-            childless_ = index == 0 ? open->id : childless_;
-            return kNoMoreItems;
-        }
-        place.isLast = rows.size() < kReadAhead;
-        place.ahead = std::move(rows);
-        place.next = 0;
+    if (const Status status = advance(*open, place, index - place.index); status != kSuccess) {
+        childless_ = status == kNoMoreItems && index == 0 ? open->id : childless_;
+        return status;
     }
     const Subkey& found = place.ahead[place.next];
     place.index = index;
@@ -730,19 +745,8 @@ Status EmbeddedRegistry::enumerateKey(KeyHandle key, std::uint32_t index, Buffer
 
 Status EmbeddedRegistry::enumerateValueName(OpenKey& open, std::uint32_t index, Buffer& name, ValueType* type) {
     ValuePlace& values = open.values;
-    const std::uint32_t skip = index - values.index;
-    if (values.next + skip < values.ahead.size()) {
-        values.next += skip;
-    } else {
-        std::vector<ValueName> rows;
-        const bool isAtEnd = values.isLast && !values.ahead.empty();
-        if (const Status status = isAtEnd ? kSuccess : readAhead(open, skip, rows);
-            status != kSuccess || rows.empty()) {
-            return status != kSuccess ? status : kNoMoreItems;
-        }
-        values.isLast = rows.size() < kReadAhead;
-        values.ahead = std::move(rows);
-        values.next = 0;
+    if (const Status status = advance(open, values, index - values.index); status != kSuccess) {
+        return status;
     }
     const ValueName& found = values.ahead[values.next];
     values.index = index;

@@ -149,6 +149,7 @@ private:
     Status child(KeyId parent, std::string_view fold, KeyId& id);
     Status nextPlace(KeyId key, std::int64_t& place);
     Status addChild(KeyId parent, std::string_view name, std::string_view fold, std::string_view keyClass, KeyId& id);
+    Status descend(std::string_view rest, bool create, std::string_view keyClass, Found& found);
     Status find(KeyHandle parent, std::string_view path, AccessMask access, bool create, std::string_view keyClass,
                 Found& found);
     const KnownPath* knownPath(KeyId parent, std::string_view path) const;
@@ -157,6 +158,8 @@ private:
     void remember(KeyId parent, std::string_view fold, KeyId id);
     Status readAhead(const OpenKey& open, std::uint32_t skip, std::vector<Subkey>& rows);
     Status readAhead(const OpenKey& open, std::uint32_t skip, std::vector<ValueName>& rows);
+    template <typename Place>
+    Status advance(const OpenKey& open, Place& place, std::uint32_t skip);
     // Only names and types are read ahead: data would be copied for callers that stop early.
     Status enumerateValueName(OpenKey& open, std::uint32_t index, Buffer& name, ValueType* type);
     Status enumerateWholeValue(OpenKey& open, std::uint32_t index, Buffer& name, ValueType* type, Buffer& data);
