@@ -17,6 +17,7 @@ constexpr std::string_view kClassComment = ";class=\"";
 constexpr std::string_view kBlanks = " \t";
 constexpr std::size_t kBytesOfLine = 24;
 constexpr char32_t kEscaped = 0xDC00;
+constexpr char32_t kShifted = 0x100;
 
 bool isControl(char32_t character) {
     return character < 0x20 || (character >= 0x7F && character < 0xA0);
@@ -27,16 +28,36 @@ bool isEscape(char32_t character) {
     return character >= kEscaped && character < kEscaped + 0x80;
 }
 
-// UTF-8 without ASCII's control characters, which would end a line or steer a terminal.
+bool isLeading(char32_t character) {
+    return isSurrogate(character) && character < kEscaped;
+}
+
+// UTF-8 without ASCII's control characters, which would end a line or steer a terminal. One behind leading surrogates,
+// with which its own surrogate would form a pair, travels as U+0100 + character, and a mark is before them.
 std::string nameText(std::string_view name) {
     const std::u16string utf16 = utf16FromText(name);
     std::string text;
+    std::size_t beforeLeading = std::string::npos;  // the place of that mark
     for (std::u16string_view rest = utf16; !rest.empty();) {
         const char32_t character = takeUtf16(rest);
-        if (isEscape(character)) {
-            appendUtf8(text, kEscaped);
+        const bool isAsciiControl = character < 0x20 || character == 0x7F;
+        if (isLeading(character)) {
+            beforeLeading = std::min(beforeLeading, text.size());
+            appendUtf8(text, character);
+            continue;
         }
-        appendUtf8(text, character < 0x20 || character == 0x7F ? kEscaped + character : character);
+        if (isAsciiControl && beforeLeading != std::string::npos) {
+            std::string mark;
+            appendUtf8(mark, kEscaped);
+            text.insert(beforeLeading, mark);
+            appendUtf8(text, kShifted + character);
+        } else {
+            if (isEscape(character)) {
+                appendUtf8(text, kEscaped);
+            }
+            appendUtf8(text, isAsciiControl ? kEscaped + character : character);
+        }
+        beforeLeading = std::string::npos;
     }
     return text;
 }
@@ -212,12 +233,24 @@ private:
 
     bool ended() { return atEnd() || fail("there is more on the line than its value"); }
 
+    // Appends the leading surrogates that begin with a character, and the control character behind them.
+    static void takeShifted(char32_t character, std::string_view& utf8, std::u16string& utf16) {
+        do {
+            appendUtf16(utf16, character);
+        } while (takeUtf8(utf8, character) && isLeading(character));
+        if (!isLeading(character)) {
+            appendUtf16(utf16, character > kShifted && character < kShifted + 0x80 ? character - kShifted : character);
+        }
+    }
+
     // The text of the ports, with the control characters that travelled as surrogates.
     static std::string plain(std::string_view utf8) {
         std::u16string utf16;
         bool literal = false;
         for (char32_t character = 0; takeUtf8(utf8, character); literal = !literal && character == kEscaped) {
-            if (!isEscape(character)) {
+            if (literal && isLeading(character)) {
+                takeShifted(character, utf8, utf16);
+            } else if (!isEscape(character)) {
                 appendUtf16(utf16, character);
             } else if (literal || character != kEscaped) {
                 appendUtf16(utf16, literal ? character : character - kEscaped);
