@@ -137,7 +137,7 @@ public:
     Status turn(bool) override { return kSuccess; }
     void begin(const HistoryStart&) override {}
     bool takesEachChange() override { return takesEach_; }
-    Status append(std::string_view part) override {
+    Status append(std::string part) override {
         EXPECT_TRUE(rows.add(part));
         return kSuccess;
     }

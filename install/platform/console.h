@@ -25,6 +25,9 @@ public:
 
     // Returns the first failure of standard output so far: kPipeClosing if the reader has closed the pipe.
     virtual Status flush() = 0;
+
+    // Whether all texts are dropped, so that none need be composed.
+    virtual bool isSilent() const { return false; }
 };
 
 // The streams of the C library, on every host.

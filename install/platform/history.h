@@ -68,7 +68,7 @@ public:
     // Whether each change is passed to append() before it is made; else changes are passed before the commit point that
     // makes them final.
     virtual bool takesEachChange() = 0;
-    virtual Status append(std::string_view part) = 0;
+    virtual Status append(std::string part) = 0;
 
     // Called before each commit point with the changes of the run up to it.
     virtual Status settle(const ChangeCounts& counts) = 0;

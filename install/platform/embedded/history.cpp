@@ -145,8 +145,8 @@ void EmbeddedHistory::begin(const HistoryStart& run) {
     begun_ = std::time(nullptr);
 }
 
-Status EmbeddedHistory::append(std::string_view part) {
-    part_ = part;
+Status EmbeddedHistory::append(std::string part) {
+    part_ = std::move(part);
     return kSuccess;
 }
 

@@ -15,7 +15,7 @@ public:
     Status turn(bool) override { return kCallNotImplemented; }
     void begin(const HistoryStart& run) override;
     bool takesEachChange() override { return false; }
-    Status append(std::string_view part) override;
+    Status append(std::string part) override;
     Status settle(const ChangeCounts& counts) override;
     void note(std::string_view outside) override { outside_.emplace_back(outside); }
     void end(Status status) override;

@@ -384,7 +384,9 @@ Status EmbeddedRegistry::child(KeyId parent, std::string_view fold, KeyId& id) {
         id = known.id;
         return kSuccess;
     }
-    if (missing_.transaction == transaction_ && missing_.parent == parent && missing_.fold == fold) {
+    if (std::any_of(missing_.begin(), missing_.end(), [&](const KnownSubkey& missing) {
+            return missing.transaction == transaction_ && missing.parent == parent && missing.fold == fold;
+        })) {
         return kFileNotFound;
     }
     for (const NewKey& key : newKeys_) {
@@ -395,7 +397,7 @@ Status EmbeddedRegistry::child(KeyId parent, std::string_view fold, KeyId& id) {
     Query find = query(Sql::findKey);
     const int result = find.bind(parent).bind(fold).step();
     if (result == SQLITE_DONE) {
-        missing_ = {transaction_, parent, 0, std::string(fold)};
+        missing_ = {KnownSubkey{transaction_, parent, 0, std::string(fold)}, std::move(missing_[0])};
         return kFileNotFound;
     }
     if (result != SQLITE_ROW) {
@@ -417,7 +419,9 @@ Status EmbeddedRegistry::addChild(KeyId parent, std::string_view name, std::stri
     }
     id = sqlite3_last_insert_rowid(connection_.get());
     firstNew_ = firstNew_ == 0 ? id : firstNew_;
-    missing_ = {};
+    for (KnownSubkey& missing : missing_) {
+        missing.transaction = missing.parent == parent && missing.fold == fold ? 0 : missing.transaction;
+    }
     remember(parent, fold, id);
     subkeyAdded(parent, fold);
     // A new key has no values and no subkeys yet.

@@ -184,8 +184,8 @@ private:
     std::vector<OpenKey> open_;  // the roots first
     std::vector<std::uint32_t> free_;
     std::array<KnownSubkey, 256> known_;
-    KnownSubkey missing_;  // the one that was last looked up in vain; usually it is created next
-    KeyId childless_ = 0;  // the key that was last seen to have no subkey
+    std::array<KnownSubkey, 2> missing_;  // looked up in vain, in either view of a copy; usually created next
+    KeyId childless_ = 0;                 // the key that was last seen to have no subkey
     std::array<KnownPath, 8> knownPaths_;
     std::size_t nextKnownPath_ = 0;
     std::array<Placed, 2> placed_;  // the last one first

@@ -46,6 +46,7 @@ public:
     Status writeOutput(std::string_view) override { return kSuccess; }
     Status writeError(std::string_view) override { return kSuccess; }
     Status flush() override { return kSuccess; }
+    bool isSilent() const override { return true; }
 };
 
 class MemoryDebugOutput final : public IDebugOutput {

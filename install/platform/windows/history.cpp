@@ -76,7 +76,7 @@ public:
     bool takesEachChange() override { return true; }
 
     // The run goes on without its record.
-    Status append(std::string_view part) override {
+    Status append(std::string part) override {
         if (!hasFailed_ && (file_ || create())) {
             write(writer_.record(JournalRecord::change, part));
         }

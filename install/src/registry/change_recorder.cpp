@@ -141,13 +141,13 @@ void ChangeRecorder::write(const std::vector<const Key*>& keys, TouchedForm form
         }
         appendTouched(*key, rows, form, part);
     }
-    journal_->append(part);
+    journal_->append(std::move(part));
 }
 
 void ChangeRecorder::write(const Key& key, const Row& row) {
     std::string part;
     appendTouched(key, {&row}, TouchedForm::step, part);
-    journal_->append(part);
+    journal_->append(std::move(part));
 }
 
 template <typename Call>
@@ -455,7 +455,9 @@ public:
         std::string part = recorder_.rows().takePart();
         Status status = kSuccess;
         if (history_ != nullptr) {
-            status = history_->takesEachChange() || part.empty() ? kSuccess : history_->append(part);
+            status = history_->takesEachChange() || part.empty()
+                         ? kSuccess
+                         : history_->append(holdsCommits_ ? std::move(part) : part);
             status = status == kSuccess ? history_->settle(recorder_.rows().counts()) : status;
         }
         // Ends the transaction in any case.
@@ -648,8 +650,12 @@ RecordedPorts::RecordedPorts(const Ports& real, const RecordOptions& options)
     : history_(real.history != nullptr && real.history->isOn() ? real.history : nullptr),
       recorder_(*real.registry, options, history_),
       ports_(real),
-      registry_(std::make_unique<Registry>(*real.registry, recorder_, history_, options.holdsCommits)),
-      services_(std::make_unique<Services>(*real.services, recorder_)) {
+      registry_(std::make_unique<Registry>(*real.registry, recorder_, history_, options.holdsCommits)) {
+    if (options.wholeServices) {
+        services_ = std::make_unique<ServiceRecords>(*registry_, *real.files);
+    } else {
+        services_ = std::make_unique<Services>(*real.services, recorder_);
+    }
     ports_.registry = registry_.get();
     ports_.services = services_.get();
     if (options.wholeServices || history_ != nullptr) {

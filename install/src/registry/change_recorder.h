@@ -14,9 +14,10 @@
 namespace kz7 {
 
 struct RecordOptions {
-    bool wholeServices = false;  // else a service is its configuration only
-    bool holdsCommits = false;   // the commits of the run succeed and do nothing: the caller commits
-    bool everyKey = false;       // the history gets all keys, not only those of the product
+    // The machine keeps its services as records in this registry alone; else a service is its configuration only.
+    bool wholeServices = false;
+    bool holdsCommits = false;  // the commits of the run succeed and do nothing: the caller commits
+    bool everyKey = false;      // the history gets all keys, not only those of the product
 };
 
 // Keeps every row that a run touches as it was before and as it is now. What others change meanwhile is not recorded.
@@ -129,7 +130,7 @@ private:
     class Assemblies;
     class Programs;
     std::unique_ptr<Registry> registry_;
-    std::unique_ptr<Services> services_;
+    std::unique_ptr<IServiceManager> services_;
     std::unique_ptr<Assemblies> assemblies_;
     std::unique_ptr<Programs> programs_;
 };

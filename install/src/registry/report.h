@@ -49,7 +49,9 @@ public:
     IConsole& console() { return console_; }
 
     void line(std::string_view pattern, std::initializer_list<Insert> inserts = {}) {
-        console_.writeOutput(compose(pattern, inserts));
+        if (!console_.isSilent()) {
+            console_.writeOutput(compose(pattern, inserts));
+        }
     }
 
     void error(const ErrorText& text, std::initializer_list<Insert> inserts = {}) {
