@@ -453,18 +453,19 @@ public:
     Status save() {
         recorder_.rest();
         std::string part = recorder_.rows().takePart();
+        if (!holdsCommits_) {
+            saved_.push_back(part);
+        }
         Status status = kSuccess;
         if (history_ != nullptr) {
-            status = history_->takesEachChange() || part.empty()
-                         ? kSuccess
-                         : history_->append(holdsCommits_ ? std::move(part) : part);
+            status = history_->takesEachChange() || part.empty() ? kSuccess : history_->append(std::move(part));
             status = status == kSuccess ? history_->settle(recorder_.rows().counts()) : status;
         }
         // Ends the transaction in any case.
         const Status committed = real_.commit();
         status = status == kSuccess ? committed : status;
-        if (status == kSuccess && !holdsCommits_) {
-            saved_.push_back(std::move(part));
+        if (status != kSuccess && !holdsCommits_) {
+            saved_.pop_back();
         }
         return status;
     }
