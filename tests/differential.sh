@@ -83,7 +83,7 @@ foretell() {
     [ "$program" = kz7InstallReg ] || return 0
     local admin=()
     while [ "$1" != -- ]; do admin+=("$1"); shift; done
-    "${admin[@]}" export >before.reg 2>/dev/null || true
+    "${admin[@]}" export >before.reg 2>before.error || true
     [ -s before.reg ] || echo 'Windows Registry Editor Version 5.00' >before.reg
     { "${admin[@]}" apply --check --diff "$@" 2>/dev/null || true; } | product_lines >foretold
 }
@@ -92,7 +92,7 @@ compare_foretold() {
     { "$@" diff before.reg . 2>/dev/null || true; } | product_lines >changed
     if ! diff -u foretold changed >difference; then
         echo 'FAILED: check mode foretold something else than'
-        cat difference
+        cat difference before.error
         failed=$((failed + 1))
     fi >&3
 }
