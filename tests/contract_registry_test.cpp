@@ -130,6 +130,8 @@ TEST_P(RegistryContract, NamesOrderAndEnumerationFollowTheContract) {
          "set b = 0; set c = 0; set d = 0; value 0 = b; unset b = 0; value 0 = c; value 1 = d; set e = 0; value 2 = e; "
          "set f = 0; value 3 = f; value 4 = <259>; value 1 = d; unset c = 0; value 1 = e; value 2 = f; value 0 = d; "
          "unset f = 0; value 2 = <259>; value 1 = e; commit = 0; value 1 = e"},
+        {"a value that takes the place of the last ones is enumerated",
+         "set a = 0; set b = 0; commit = 0; unset a = 0; value 0 = b; unset b = 0; set c = 0; value 0 = c"},
         {"subkeys enumerate by name",
          "make b = 0; make _x = 0; make A = 0; make Z1 = 0; make aa = 0; make 1 = 0; keys = " + keyOrder},
         {"values enumerate in insertion order",

@@ -460,6 +460,13 @@ TEST_F(ChangesProgram, TakeRunsBackAndDoThemAgain) {
     EXPECT_EQ(other.run("kz7admin", {"import", reg}).exitCode, 0);
     expect({"diff", ".", other.path()}, "||0");
 
+    // The key of a user that the first write made goes, too.
+    const StateDirectory empty;
+    const std::string own = file("own.reg", "REGEDIT4\n\n[HKEY_CURRENT_USER]\n\"a\"=\"1\"\n\n[HKEY_CURRENT_USER\\Q]\n");
+    EXPECT_EQ(empty.run("kz7admin", {"import", own}).exitCode, 0);
+    EXPECT_EQ(empty.run("kz7admin", {"undo", "1"}).exitCode, 0);
+    EXPECT_EQ(empty.run("kz7admin", {"export"}).exitCode, 1);
+
     expect({"history", "trim", "--before", "2001-01-01"}, "unchanged\n||0");
     expect({"history", "trim", "--before", "2999-01-01T00:00:00Z"}, "removed: 4 runs\n||0");
     expect({"history"}, "|kz7admin: no run is recorded: registry.db\n|1");

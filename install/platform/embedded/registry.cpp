@@ -635,6 +635,9 @@ Status EmbeddedRegistry::setValue(KeyHandle key, std::string_view name, ValueTyp
     for (OpenKey& other : open_) {
         if (other.used && other.id == open->id) {
             other.values.ahead.clear();
+            if (place < other.values.place) {
+                other.values = {};
+            }
         }
     }
     return result == SQLITE_DONE ? kSuccess : fail(result);

@@ -124,8 +124,10 @@ std::vector<KeyName> ChangeRecorder::missingKeys(const KeyName& name) {
     const std::string full = fullKeyName(name);
     std::string_view path = parentOf(name.path);
     std::string_view fullName = parentOf(full);
-    while (!path.empty() && !exists(name.root, path, fullName)) {
+    bool isRootNext = name.path.empty();
+    while (!isRootNext && !exists(name.root, path, fullName)) {
         missing.push_back({name.root, std::string(path)});
+        isRootNext = path.empty();
         path = parentOf(path);
         fullName = parentOf(fullName);
     }

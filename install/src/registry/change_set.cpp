@@ -170,7 +170,9 @@ Contents removedContents(const ChangeSet& changes) {
     Contents contents;
     for (const Change& change : changes) {
         if (change.kind == Change::Kind::keyRemoved) {
-            ++contents[foldUpper(change.key.substr(0, change.key.find_last_of('\\')))].subkeys;
+            if (const std::size_t end = change.key.find_last_of('\\'); end != std::string::npos) {
+                ++contents[foldUpper(change.key.substr(0, end))].subkeys;
+            }
             contents[foldUpper(change.key)].isRemoved = true;
         } else if (!change.isKey() && change.before && !isRunState(change)) {
             ++contents[foldUpper(change.key)].values;
